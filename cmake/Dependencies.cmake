@@ -1,0 +1,28 @@
+# What the system calls and does not contain. All of it are Debian packages: scripts/dependencies.txt.
+find_package(PkgConfig REQUIRED)
+find_package(Threads REQUIRED)
+
+pkg_check_modules(GIO REQUIRED IMPORTED_TARGET gio-2.0)
+pkg_check_modules(TINYXML REQUIRED IMPORTED_TARGET tinyxml)
+pkg_check_modules(SWRESAMPLE REQUIRED IMPORTED_TARGET libswresample libavutil)
+pkg_check_modules(SNDFILE REQUIRED IMPORTED_TARGET sndfile)
+pkg_check_modules(FLAC REQUIRED IMPORTED_TARGET flac)
+pkg_check_modules(VORBIS REQUIRED IMPORTED_TARGET vorbisenc vorbisfile vorbis ogg)
+pkg_check_modules(MPG123 REQUIRED IMPORTED_TARGET libmpg123)
+pkg_check_modules(TAGLIB REQUIRED IMPORTED_TARGET taglib)
+pkg_check_modules(PNG REQUIRED IMPORTED_TARGET libpng)
+
+find_path(LAME_INCLUDE_DIR lame/lame.h REQUIRED)
+find_library(LAME_LIBRARY mp3lame REQUIRED)
+add_library(LAME::lame INTERFACE IMPORTED)
+target_include_directories(LAME::lame INTERFACE ${LAME_INCLUDE_DIR})
+target_link_libraries(LAME::lame INTERFACE ${LAME_LIBRARY})
+
+find_package(CLI11 REQUIRED)
+if(TONEWRIGHT_TESTS)
+    find_package(GTest REQUIRED)
+endif()
+if(TONEWRIGHT_BENCHMARKS)
+    find_package(benchmark REQUIRED)
+    pkg_check_modules(ICU REQUIRED IMPORTED_TARGET icu-uc)
+endif()

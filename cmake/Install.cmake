@@ -1,0 +1,1 @@
+# Grows with the tree: what is installed where.

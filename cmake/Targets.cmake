@@ -1,0 +1,65 @@
+# The kinds of target that the system consists of.
+include(GoogleTest)
+
+set(TONEWRIGHT_LIBRARY_DIR ${CMAKE_BINARY_DIR}/lib)
+set(CMAKE_RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/bin)
+set(CMAKE_LIBRARY_OUTPUT_DIRECTORY ${TONEWRIGHT_LIBRARY_DIR})
+
+# tw_sources(VARIABLE [FOLDER...]): the sources of the calling folder (or of those below it).
+macro(tw_sources variable)
+    set(folders ${ARGN})
+    if(NOT folders)
+        set(folders .)
+    endif()
+    set(${variable})
+    foreach(folder ${folders})
+        file(GLOB found CONFIGURE_DEPENDS ${CMAKE_CURRENT_SOURCE_DIR}/${folder}/*.cpp ${CMAKE_CURRENT_SOURCE_DIR}/${folder}/*.h)
+        list(APPEND ${variable} ${found})
+    endforeach()
+endmacro()
+
+# tw_library(NAME FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library, also known as tw::NAME.
+function(tw_library name)
+    cmake_parse_arguments(arg "" "" "FOLDERS;PUBLIC;PRIVATE" ${ARGN})
+    tw_sources(sources ${arg_FOLDERS})
+    add_library(${name} SHARED ${sources})
+    add_library(tw::${name} ALIAS ${name})
+    target_include_directories(${name} PUBLIC $<BUILD_INTERFACE:${CMAKE_SOURCE_DIR}/src>)
+    target_link_libraries(${name} PUBLIC ${arg_PUBLIC} PRIVATE ${arg_PRIVATE} Threads::Threads)
+    target_precompile_headers(${name} PRIVATE <algorithm> <cstdint> <cstring> <memory> <string> <vector>)
+    set_target_properties(
+        ${name}
+        PROPERTIES VERSION ${PROJECT_VERSION}
+                   SOVERSION ${PROJECT_VERSION_MAJOR}
+                   BUILD_RPATH_USE_ORIGIN ON
+                   INSTALL_RPATH "$ORIGIN"
+    )
+endfunction()
+
+# tw_test(NAME [PRIVATE lib...] [LABELS label...]): one test binary of the calling folder's sources.
+function(tw_test name)
+    cmake_parse_arguments(arg "" "" "PRIVATE;LABELS" ${ARGN})
+    tw_sources(sources)
+    add_executable(${name} ${sources})
+    target_link_libraries(${name} PRIVATE ${arg_PRIVATE} GTest::gmock GTest::gtest_main)
+    target_include_directories(${name} PRIVATE ${CMAKE_SOURCE_DIR}/tests)
+    target_compile_definitions(${name} PRIVATE TONEWRIGHT_TEST_DATA="${CMAKE_SOURCE_DIR}/tests/data")
+    target_precompile_headers(${name} PRIVATE <gtest/gtest.h> <string> <vector>)
+    gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 PROPERTIES TIMEOUT 600 LABELS "${name};${arg_LABELS}")
+endfunction()
+
+# tw_benchmark(NAME lib...): one Google Benchmark binary of the calling folder's sources.
+function(tw_benchmark name)
+    tw_sources(sources)
+    add_executable(${name} ${sources})
+    target_link_libraries(${name} PRIVATE ${ARGN} benchmark::benchmark benchmark::benchmark_main)
+endfunction()
+
+# tw_plugin(NAME lib...): a media plug-in of the calling folder's sources, found beside the front library.
+function(tw_plugin name)
+    tw_sources(sources)
+    add_library(${name} MODULE ${sources})
+    set_target_properties(${name} PROPERTIES PREFIX "" INSTALL_RPATH "$ORIGIN/..")
+    target_link_libraries(${name} PRIVATE tw::sonora2 tw::plugin_support ${ARGN})
+    set_property(GLOBAL APPEND PROPERTY TONEWRIGHT_PLUGINS ${name})
+endfunction()

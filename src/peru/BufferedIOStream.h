@@ -1,0 +1,41 @@
+// A queue of bytes between a writer and a reader.
+#pragma once
+
+#include "peru/MemoryManager.h"
+
+#include <deque>
+
+namespace peru {
+
+// First in, first out, over pooled blocks. Not locked.
+class PERU_API CBufferedIOStream : public CObject, public IIOStream {
+public:
+    explicit CBufferedIOStream(const P<IMemoryManager>& memoryManager);
+    ~CBufferedIOStream() override;
+
+    void close() override;
+    P<IURI> getURI() const override;
+    bool isAtEnd() override; // nothing is there now
+    void read(void* buffer,
+              int64_t size) override; // throws CEndOfStreamError and takes nothing when less is there
+    int64_t readSome(void* buffer, int64_t size) override; // never waits
+    void skip(int64_t size) override;
+    void write(const void* buffer, int64_t size) override; // copies
+    void flush() override;
+
+    // Appends a block without copying it; the caller leaves its bytes alone from then on.
+    void append(const P<IMemoryBlock>& block);
+    void clear();
+    int64_t getAvailable() const { return m_available; }
+    int64_t getTotalWritten() const { return m_totalWritten; }
+
+private:
+    P<IMemoryManager> m_memoryManager;
+    std::deque<P<IMemoryBlock>> m_blocks;
+    int64_t m_readOffset = 0; // within the first block
+    int64_t m_available = 0;
+    int64_t m_totalWritten = 0;
+    bool m_closed = false;
+};
+
+} // namespace peru

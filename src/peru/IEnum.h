@@ -1,0 +1,40 @@
+// Enumerators, in place of iterators.
+#pragma once
+
+#include "peru/Object.h"
+
+#include <cstdint>
+
+namespace peru {
+
+// getNext past the end throws CEndOfEnumError.
+class PERU_API IConstEnum : public virtual IBase {
+public:
+    virtual bool hasMore() const = 0;
+    virtual int32_t getCount() const = 0; // of the whole collection
+    virtual PC<IBase> getNextConst() = 0;
+    virtual void reset() = 0;
+};
+
+class PERU_API IEnum : public virtual IConstEnum {
+public:
+    virtual P<IBase> getNext() = 0;
+};
+
+// A typed view of an enumerator.
+template <class T> class WEnum {
+public:
+    WEnum() = default;
+    WEnum(P<IEnum> elements) : m_elements(std::move(elements)) {}
+
+    bool hasMore() const { return m_elements && m_elements->hasMore(); }
+    int32_t getCount() const { return m_elements ? m_elements->getCount() : 0; }
+    P<T> getNext() { return P<T>(m_elements->getNext()); }
+    void reset() { m_elements->reset(); }
+    const P<IEnum>& getEnum() const { return m_elements; }
+
+private:
+    P<IEnum> m_elements;
+};
+
+} // namespace peru

@@ -1,0 +1,88 @@
+// Pooled memory blocks.
+#pragma once
+
+#include "peru/IMutex.h"
+#include "peru/ISerializable.h"
+#include "peru/Object.h"
+
+#include <array>
+#include <vector>
+
+namespace peru {
+
+// A growable byte block with size and capacity. The size is the count of valid bytes.
+class PERU_API IMemoryBlock : public virtual IBase, public virtual ISerializable {
+public:
+    virtual uint8_t* getData() = 0;
+    virtual const uint8_t* getData() const = 0;
+    virtual int64_t getSize() const = 0;
+    virtual int64_t getCapacity() const = 0;
+    // Keeps the bytes that are there; grows the capacity where needed. New bytes are not cleared.
+    virtual void setSize(int64_t size) = 0;
+};
+
+// Hands out blocks by size, reusing released ones. Safe from any thread.
+class PERU_API IMemoryManager : public virtual IBase {
+public:
+    // A block of that size with at least that capacity; its bytes are not cleared.
+    virtual P<IMemoryBlock> getBlock(int64_t size) = 0;
+};
+
+class PERU_API CMemoryBlockBase : public CObject, public IMemoryBlock {
+public:
+    ~CMemoryBlockBase() override;
+    uint8_t* getData() override { return m_data; }
+    const uint8_t* getData() const override { return m_data; }
+    int64_t getSize() const override { return m_size; }
+    int64_t getCapacity() const override { return m_capacity; }
+    void setSize(int64_t size) override;
+    // The size as int32, then the bytes.
+    void writeTo(const P<IDataOutStream>& stream) const override;
+    void readFrom(const P<IDataInStream>& stream) override;
+
+protected:
+    explicit CMemoryBlockBase(int64_t capacity);
+
+    uint8_t* m_data = nullptr;
+    int64_t m_size = 0;
+    int64_t m_capacity = 0;
+};
+
+// A block of its own.
+class PERU_API CMemoryBlock : public CMemoryBlockBase {
+public:
+    explicit CMemoryBlock(int64_t size = 0);
+};
+
+class CMemoryManager;
+
+// A block that goes back to its manager's free list with its last release.
+class PERU_API CCachedMemoryBlock : public CMemoryBlockBase {
+public:
+    void destroy() override;
+
+private:
+    friend class CMemoryManager;
+    CCachedMemoryBlock(const P<CMemoryManager>& manager, int64_t capacity);
+    P<CMemoryManager> m_manager; // held while the block is out, empty while it waits
+};
+
+class PERU_API CMemoryManager : public CObject, public IMemoryManager {
+public:
+    // At most `cachedBlocks` released blocks of each size class are kept.
+    explicit CMemoryManager(int cachedBlocks = 30);
+    ~CMemoryManager() override;
+    P<IMemoryBlock> getBlock(int64_t size) override;
+    int64_t getCachedBytes() const; // what waits for reuse
+
+private:
+    friend class CCachedMemoryBlock;
+    void takeBack(CCachedMemoryBlock* block);
+
+    static constexpr int kSizeClasses = 40; // powers of two
+    int m_cachedBlocks;
+    P<IMutex> m_mutex; // guards the free lists
+    std::array<std::vector<CCachedMemoryBlock*>, kSizeClasses> m_free;
+};
+
+} // namespace peru

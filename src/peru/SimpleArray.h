@@ -1,0 +1,65 @@
+// Growing arrays of values.
+#pragma once
+
+#include <algorithm>
+#include <cstddef>
+#include <memory>
+#include <utility>
+
+namespace peru {
+
+// When count + 1 exceeds the capacity, it becomes max(count + 1, capacity + step). Removing an element
+// shifts the rest down and keeps the order. The elements are destroyed when the array goes.
+template <class E> class TSimpleArray {
+public:
+    explicit TSimpleArray(size_t capacity = 0, size_t step = 16) : m_step(step) { reserve(capacity); }
+    TSimpleArray(const TSimpleArray&) = delete;
+    TSimpleArray& operator=(const TSimpleArray&) = delete;
+    ~TSimpleArray() {
+        clear();
+        std::allocator<E>().deallocate(m_elements, m_capacity);
+    }
+
+    void add(E element) {
+        if (m_count + 1 > m_capacity) reserve(std::max(m_count + 1, m_capacity + m_step));
+        std::construct_at(m_elements + m_count, std::move(element));
+        ++m_count;
+    }
+    void removeAt(size_t index) {
+        std::move(m_elements + index + 1, m_elements + m_count, m_elements + index);
+        std::destroy_at(m_elements + --m_count);
+    }
+    void clear() {
+        while (m_count > 0) std::destroy_at(m_elements + --m_count);
+    }
+
+    size_t getCount() const { return m_count; }
+    size_t getCapacity() const { return m_capacity; }
+    E& operator[](size_t index) { return m_elements[index]; }
+    const E& operator[](size_t index) const { return m_elements[index]; }
+    E* begin() { return m_elements; }
+    E* end() { return m_elements + m_count; }
+    const E* begin() const { return m_elements; }
+    const E* end() const { return m_elements + m_count; }
+
+private:
+    void reserve(size_t capacity) {
+        if (capacity <= m_capacity) return;
+        E* elements = std::allocator<E>().allocate(capacity);
+        std::uninitialized_move_n(m_elements, m_count, elements);
+        std::destroy_n(m_elements, m_count);
+        std::allocator<E>().deallocate(m_elements, m_capacity);
+        m_elements = elements;
+        m_capacity = capacity;
+    }
+
+    E* m_elements = nullptr;
+    size_t m_capacity = 0;
+    size_t m_count = 0;
+    size_t m_step;
+};
+
+// Named apart where the destruction of the elements is what the array is for: arrays of handles.
+template <class E> using TCleaningSimpleArray = TSimpleArray<E>;
+
+} // namespace peru

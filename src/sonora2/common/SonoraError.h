@@ -1,0 +1,15 @@
+// The framework's exception.
+#pragma once
+
+#include "peru/Errors.h"
+#include "sonora2/Api.h"
+
+namespace sonora2::common {
+
+// Every failure that the framework reports itself; its only payload is the message.
+class SONORA2_API CSonoraError : public peru::CError {
+    PERU_EXCEPTION(CSonoraError)
+    explicit CSonoraError(const peru::CStringArg& message);
+};
+
+} // namespace sonora2::common
