@@ -1,0 +1,9 @@
+#!/usr/bin/env bash
+# Builds and runs every test. Arguments go to ctest: scripts/test.sh -R Strings
+# TONEWRIGHT_PRESET=asan or tsan runs the same tests under a sanitizer.
+set -euo pipefail
+
+cd "$(dirname "$0")/.."
+preset=${TONEWRIGHT_PRESET:-release}
+scripts/build.sh "$preset"
+exec ctest --preset "$preset" -j "$(nproc)" "$@"
