@@ -1,0 +1,45 @@
+// What the file classes of this platform share: descriptors, paths of URIs, texts of errors.
+#pragma once
+
+#include "peru/IURI.h"
+
+#include <string>
+#include <utility>
+
+namespace peru::posix {
+
+// Owns a file descriptor.
+class CFileHandle {
+public:
+    explicit CFileHandle(int descriptor = -1) noexcept : m_descriptor(descriptor) {}
+    CFileHandle(CFileHandle&& other) noexcept : m_descriptor(std::exchange(other.m_descriptor, -1)) {}
+    CFileHandle& operator=(CFileHandle&& other) noexcept {
+        std::swap(m_descriptor, other.m_descriptor);
+        return *this;
+    }
+    ~CFileHandle() { close(); }
+
+    bool isOpen() const { return m_descriptor >= 0; }
+    int get() const { return m_descriptor; }
+    // False when the system reports a write error that it had kept back.
+    bool close() noexcept;
+
+private:
+    int m_descriptor;
+};
+
+// The bytes of the URI's path, without a trailing "/", so that a call on a link means the link. Throws
+// CURITypeNotSupportedError when the URI names nothing on this machine's disks.
+std::string toPath(const P<IURI>& uri);
+// The same, empty in place of the error.
+std::string tryToPath(const P<IURI>& uri);
+// A folder's URI ends in "/".
+P<IURI> toURI(const std::string& path);
+P<IURI> toFolderURI(std::string path);
+
+// The path for a message; the URI's text where it has no path.
+P<IString> getShownName(const P<IURI>& uri);
+// The system's own text for an errno value.
+P<IString> getSystemText(int error);
+
+} // namespace peru::posix
