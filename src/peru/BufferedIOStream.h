@@ -10,14 +10,15 @@ namespace peru {
 // First in, first out, over pooled blocks. Not locked.
 class PERU_API CBufferedIOStream : public CObject, public IIOStream {
 public:
+    // Without a manager the stream makes one of its own.
     explicit CBufferedIOStream(const P<IMemoryManager>& memoryManager);
     ~CBufferedIOStream() override;
 
-    void close() override;
+    void close() override; // drops what is queued
     P<IURI> getURI() const override;
     bool isAtEnd() override; // nothing is there now
-    void read(void* buffer,
-              int64_t size) override; // throws CEndOfStreamError and takes nothing when less is there
+    // Throws CEndOfStreamError and takes nothing when less is there; so does skip.
+    void read(void* buffer, int64_t size) override;
     int64_t readSome(void* buffer, int64_t size) override; // never waits
     void skip(int64_t size) override;
     void write(const void* buffer, int64_t size) override; // copies
@@ -30,6 +31,9 @@ public:
     int64_t getTotalWritten() const { return m_totalWritten; }
 
 private:
+    void checkOpen() const;
+    void takeOut(uint8_t* target, int64_t size); // a null target drops the bytes
+
     P<IMemoryManager> m_memoryManager;
     std::deque<P<IMemoryBlock>> m_blocks;
     int64_t m_readOffset = 0; // within the first block

@@ -6,14 +6,13 @@
 #include "peru/Object.h"
 
 #include <array>
-#include <vector>
 
 namespace peru {
 
 // A growable byte block with size and capacity. The size is the count of valid bytes.
 class PERU_API IMemoryBlock : public virtual IBase, public virtual ISerializable {
 public:
-    virtual uint8_t* getData() = 0;
+    virtual uint8_t* getData() = 0; // aligned to 64 bytes; changes when the block grows
     virtual const uint8_t* getData() const = 0;
     virtual int64_t getSize() const = 0;
     virtual int64_t getCapacity() const = 0;
@@ -36,7 +35,8 @@ public:
     int64_t getSize() const override { return m_size; }
     int64_t getCapacity() const override { return m_capacity; }
     void setSize(int64_t size) override;
-    // The size as int32, then the bytes.
+    // The size as int32, then the bytes. Writing throws CInvalidArgError where the size does not fit;
+    // reading takes memory only as the bytes arrive, whatever size the stream claims.
     void writeTo(const P<IDataOutStream>& stream) const override;
     void readFrom(const P<IDataInStream>& stream) override;
 
@@ -59,12 +59,15 @@ class CMemoryManager;
 // A block that goes back to its manager's free list with its last release.
 class PERU_API CCachedMemoryBlock : public CMemoryBlockBase {
 public:
+    ~CCachedMemoryBlock() override;
     void destroy() override;
 
 private:
     friend class CMemoryManager;
     CCachedMemoryBlock(const P<CMemoryManager>& manager, int64_t capacity);
-    P<CMemoryManager> m_manager; // held while the block is out, empty while it waits
+
+    P<CMemoryManager> m_manager;          // held while the block is out, empty while it waits
+    CCachedMemoryBlock* m_next = nullptr; // in the free list
 };
 
 class PERU_API CMemoryManager : public CObject, public IMemoryManager {
@@ -79,10 +82,19 @@ private:
     friend class CCachedMemoryBlock;
     void takeBack(CCachedMemoryBlock* block);
 
-    static constexpr int kSizeClasses = 40; // powers of two
+    // Powers of two from 64 bytes to 16 MiB. Larger blocks are rare and go back to the system.
+    static constexpr int64_t kSmallestBlock = 64;
+    static constexpr int kSizeClasses = 19;
+    static constexpr int64_t kLargestCachedBlock = kSmallestBlock << (kSizeClasses - 1);
+
+    struct SFreeList {
+        CCachedMemoryBlock* first = nullptr; // last released first: its bytes are still in the cache
+        int count = 0;
+    };
+
     int m_cachedBlocks;
-    P<IMutex> m_mutex; // guards the free lists
-    std::array<std::vector<CCachedMemoryBlock*>, kSizeClasses> m_free;
+    P<IMutex> m_mutex; // guards the free lists; nothing is allocated or freed under it
+    std::array<SFreeList, kSizeClasses> m_free;
 };
 
 } // namespace peru

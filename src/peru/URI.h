@@ -4,6 +4,10 @@
 #include "peru/IURI.h"
 #include "peru/Object.h"
 
+#include <memory>
+#include <string>
+#include <vector>
+
 namespace peru {
 
 class PERU_API CURI : public CObject, public IURI {
@@ -13,9 +17,10 @@ public:
     static constexpr const char* kQuerySet = ";:,/?@&=+$"; // also the fragment's
     static constexpr const char* kUserInfoSet = ";:,&=+$";
 
-    // Parses a complete URI. Throws CURIFormatError.
+    // Parses a complete URI. %XX sequences that are there stay as they are. Throws CURIFormatError.
     explicit CURI(const CStringArg& text);
-    // Builds from unescaped parts. The port text must be empty or a decimal number, else CURIFormatError.
+    // Builds from unescaped parts: a "%" in them becomes "%25". The port text must be empty or a decimal
+    // number, else CURIFormatError. A path without a leading "/" gets one where a host is given.
     CURI(const CStringArg& scheme, const CStringArg& host, const CStringArg& port, const CStringArg& userInfo,
          const CStringArg& path, const CStringArg& query, const CStringArg& fragment);
     CURI(const CURI& other);
@@ -65,8 +70,10 @@ public:
 
 private:
     struct SParts;
-    CURI(SParts&& parts);
-    SParts* m_parts; // immutable after construction
+    explicit CURI(SParts&& parts);
+    P<IURI> makeWithPath(std::vector<std::string> segments, bool absolute, bool directory) const;
+
+    std::shared_ptr<const SParts> m_parts; // shared by copies
 };
 
 } // namespace peru
