@@ -13,7 +13,9 @@ enum class EOpenMode {
     append,    // opened or made; writing starts at its end
 };
 
-// The get forms throw; the try forms answer an empty handle for a URI that the factory does not know.
+// The get forms throw. The try forms answer an empty handle for a URI that the factory does not know, and
+// where there is nothing by that name; what is there and cannot be opened throws from both. Factories derive
+// from CStreamFactory, which needs few of these.
 class PERU_API IStreamFactory : public virtual IBase {
 public:
     virtual P<IInStream> getInStream(const P<IURI>& uri) = 0;
@@ -39,7 +41,8 @@ public:
 };
 
 // Asks its factories in the order of registration; the throwing forms throw CURITypeNotSupportedError when
-// none knows the URI. Safe from any thread: one mutex is held for the walk, a factory's open included.
+// none knows the URI, and CFileNotFoundError for a file that does not exist. Safe from any thread: one mutex
+// is held for the walk, a factory's open included.
 class PERU_API IStreamManager : public virtual IStreamFactory {
 public:
     virtual void addFactory(const P<IStreamFactory>& factory) = 0;
