@@ -22,4 +22,7 @@ public:
 
 PERU_API P<IPathes> getPathes();
 
+// What a message shows for a URI: its path for display, or its text where it has none.
+PERU_API P<IString> getShownName(const P<IURI>& uri);
+
 } // namespace peru

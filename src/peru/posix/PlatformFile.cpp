@@ -35,12 +35,6 @@ P<IURI> toFolderURI(std::string path) {
     return toURI(path);
 }
 
-P<IString> getShownName(const P<IURI>& uri) {
-    if (!uri) return CString::empty();
-    P<IString> path = getPathes()->toPlatformPath(uri, true);
-    return path->getDataSize() > 0 ? path : uri->getAsString();
-}
-
 P<IString> getSystemText(int error) {
     return CString::fromUTF8(std::generic_category().message(error));
 }

@@ -37,8 +37,6 @@ std::string tryToPath(const P<IURI>& uri);
 P<IURI> toURI(const std::string& path);
 P<IURI> toFolderURI(std::string path);
 
-// The path for a message; the URI's text where it has no path.
-P<IString> getShownName(const P<IURI>& uri);
 // The system's own text for an errno value.
 P<IString> getSystemText(int error);
 

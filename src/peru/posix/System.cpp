@@ -2,6 +2,7 @@
 
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
+#include "peru/IPathes.h"
 #include "peru/IStringLocalizer.h"
 #include "peru/posix/FileOperations.h"
 #include "peru/posix/FileVersion.h"

@@ -1,0 +1,7 @@
+#include "peru/FileTimes.h"
+
+namespace peru {
+
+CFileTimes::~CFileTimes() = default;
+
+} // namespace peru
