@@ -1,0 +1,49 @@
+// The audio format over an encoder.
+#pragma once
+
+#include "sonora2/common/IAudioFormat.h"
+#include "sonora2/common/ISonoraContext.h"
+#include "support/Encoder.h"
+
+#include <memory>
+
+namespace sonora2::plugins {
+
+// Opening makes or replaces the file once the encoder has accepted its settings; closing completes it, also
+// in the middle of a job. A failure to write is thrown by the write that meets it or at last by close().
+// Quality and bit rates are taken while closed. Each opening starts the file anew.
+class CEncoderFormat : public peru::CObject, public common::IAudioFormat {
+public:
+    // Closed. `makeEncoder` gives a fresh encoder for each opening.
+    using EncoderFactory = std::unique_ptr<IEncoder> (*)(const SMediaFile& file);
+    CEncoderFormat(const P<peru::IString>& pluginName, const SMediaFile& file, EncoderFactory makeEncoder,
+                   const SPcmFormat& format);
+    ~CEncoderFormat() override; // closes without a word
+
+    bool isOpened() override { return m_output != nullptr; }
+    void open() override; // nothing on an open format
+    void close() override;
+    P<peru::IURI> getURI() override { return m_file.uri; }
+    P<peru::IString> getPluginName() override { return m_pluginName; }
+    int64_t getEstimatedSizeBytes(double fDuration) override;
+
+    int getSampleRate() override { return m_settings.format.rate; }
+    int getChannelCount() override { return m_settings.format.channels; }
+    int getBytesPerSample() override { return m_settings.format.bytesPerSample; }
+    void setAudioQuality(double fQuality) override; // what lies outside 0.0 to 1.0 is moved inside
+    void setAudioBitRate(int nNominal, int nMin, int nMax) override;
+    void writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) override;
+
+private:
+    void requireClosed(const char* doing) const;
+
+    P<peru::IString> m_pluginName;
+    SMediaFile m_file;
+    EncoderFactory m_makeEncoder;
+    SEncoderSettings m_settings;
+    std::unique_ptr<COutputFile> m_output; // while open
+    std::unique_ptr<IEncoder> m_encoder;   // writes to the output
+    bool m_failed = false;                 // a write has thrown: nothing is to be finished
+};
+
+} // namespace sonora2::plugins

@@ -1,0 +1,47 @@
+// The file that a plug-in reads or writes, and the shape of the sound in it.
+#pragma once
+
+#include "peru/IURI.h"
+#include "peru/StringFormat.h"
+#include "sonora2/common/SonoraError.h"
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace sonora2::plugins {
+
+using peru::P;
+
+// Interleaved PCM as chunks carry it: 8 bit unsigned, 16, 24 and 32 bit signed little-endian.
+struct SPcmFormat {
+    int rate = 0; // frames per second
+    int channels = 0;
+    int bytesPerSample = 0;
+
+    int frameBytes() const { return channels * bytesPerSample; }
+    bool operator==(const SPcmFormat&) const = default;
+};
+
+struct SMediaFile {
+    P<peru::IURI> uri;
+    std::string path; // bytes of the platform path; empty when the URI names no local file
+
+    explicit SMediaFile(const P<peru::IURI>& uri);
+
+    // Which of the known extensions (lower case) the file's name means. A job may write under a temporary
+    // name: an unknown ending is looked through ("x.aiff.part", "x.aiffpart"). Without any match the
+    // first of them.
+    std::string getExtension(const std::vector<std::string>& known) const;
+
+    P<peru::IString> getDisplayName() const; // for messages
+};
+
+// Throws CSonoraError; `text` is a format of CStringFormat.
+template <class... Args> [[noreturn]] void fail(const char* text, const Args&... args) {
+    throw common::CSonoraError(peru::format(text, args...));
+}
+// The same for a failed call of the system: "<doing> <file>: <reason>", such as "could not open".
+[[noreturn]] void failSystem(const char* doing, const SMediaFile& file, int errorNumber);
+
+} // namespace sonora2::plugins

@@ -1,0 +1,78 @@
+// The plug-in object that every plug-in library delivers.
+#pragma once
+
+#include "sonora2/common/ISonoraContext.h"
+#include "sonora2/common/ISonoraPlugin.h"
+#include "support/Decoder.h"
+#include "support/EncoderFormat.h"
+
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace sonora2::plugins {
+
+using Extensions = std::vector<std::string>; // lower case, without the point
+
+// A plug-in for sound files. The author overrides one or both factories:
+//
+//   class CMyPlugin : public CPluginBase {
+//   public:
+//       explicit CMyPlugin(const P<common::ISonoraContext>& context)
+//           : CPluginBase(context, "sonora2_my", {"my"}, {"my"}) {}
+//   protected:
+//       std::unique_ptr<IDecoder> createDecoder(const SMediaFile& file) override;
+//       CEncoderFormat::EncoderFactory getEncoderFactory() override;
+//   };
+//   SONORA2_PLUGIN(CMyPlugin)
+//
+// Declines whatever is no sound, no local file, or no format that it can give or take.
+class CPluginBase : public peru::CObject, public common::ISonoraPlugin {
+public:
+    P<peru::IString> getPluginName() override { return m_name; }
+    int getValidTypes() override;
+    P<common::IPluginExtensions> getValidExtensions(int nTypes) override;
+    // The source comes closed. It has been open once when parameters are given, since only the file tells
+    // whether they can be met; what that throws is thrown.
+    P<common::ISource> tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
+                                       const SSourceParams* pParams) override;
+    P<common::IFormat> tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
+                                       const SFormatParams* pParams) override;
+    P<peru::IBase> tryCreateObject(const P<peru::IURI>& uri, const SObjectParams* pParams) override;
+
+protected:
+    CPluginBase(const P<common::ISonoraContext>& context, const char* name, Extensions readExtensions,
+                Extensions writeExtensions);
+    ~CPluginBase() override;
+
+    // Empty: the plug-in does not read this. Opens nothing.
+    virtual std::unique_ptr<IDecoder> createDecoder(const SMediaFile& file);
+    // Null: the plug-in does not write.
+    virtual CEncoderFormat::EncoderFactory getEncoderFactory();
+    // Whether the URI can be served at all; local files by default.
+    virtual bool serves(const SMediaFile& file);
+
+    const P<common::ISonoraContext>& getContext() const { return m_context; }
+
+private:
+    P<common::ISonoraContext> m_context;
+    P<peru::IString> m_name;
+    Extensions m_readExtensions;
+    Extensions m_writeExtensions;
+};
+
+// Defines the entry point of a plug-in library. No exception crosses it: a plug-in that cannot be made is
+// an empty one.
+#define SONORA2_PLUGIN(Class)                                                                                \
+    extern "C" __attribute__((visibility("default"))) void sonora2_pluginCreate(                             \
+        const ::peru::P<::sonora2::common::ISonoraContext>& context,                                         \
+        ::peru::P<::sonora2::common::ISonoraPlugin>& plugin) {                                               \
+        try {                                                                                                \
+            plugin = ::peru::make<Class>(context);                                                           \
+        } catch (...) {                                                                                      \
+            plugin.reset();                                                                                  \
+        }                                                                                                    \
+    }                                                                                                        \
+    static_assert(true)
+
+} // namespace sonora2::plugins
