@@ -13,6 +13,13 @@ using peru::P;
 // filtered too: the caller decides whether a converter is needed at all. One thread at a time.
 class SONORA2_API CSampleRateConverter : public peru::CObject {
 public:
+    // Mixes the channels of a frame into planes; see ChannelConverters.h.
+    class CChannelConverter;
+
+    // Frames that one call gives at most. Where the input would give more, the rest of it waits for the
+    // next call: nothing is lost.
+    static constexpr int kMaxOutputFrames = 96000;
+
     // Bytes per sample: 1 to 4 in, 1 or 2 out. Without a memory manager the converter makes its own.
     // With planarOutput the chunks hold plane after plane in place of interleaved frames.
     CSampleRateConverter(int srcRate, int srcChannels, int srcBytes, int dstRate, int dstChannels,
@@ -27,7 +34,8 @@ public:
     uint32_t getOutputPosition() const;  // frames handed out so far
 
     // Null data or size 0 flushes: one second of silence is pushed through the filter. A chunk of fewer
-    // frames than the filter needs gives a chunk of size 0, and its samples wait. Throws peru::CError.
+    // frames than the filter needs gives a chunk of size 0, and its samples wait. Bytes behind the last whole
+    // frame are dropped. Throws peru::CError, after which the converter is not to be used further.
     P<audio::IAudioChunk> convert(const void* data, int size);
 
 private:

@@ -1,0 +1,40 @@
+// The framework's log as an XML document.
+#pragma once
+
+#include "peru/IMutex.h"
+#include "peru/Object.h"
+#include "sonora2/common/ILogManager.h"
+
+#include <memory>
+
+class TiXmlDocument;
+
+namespace peru {
+class IURI;
+}
+
+namespace sonora2::common {
+
+// The root "textlog" holds one "logentry" a message, with its time (UTC) and its severity as attributes. The
+// document stays in memory until it is asked for; of a process that logs for days the newest entries are
+// kept.
+class SONORA2_API CLogManager : public peru::CObject, public ILogManager {
+public:
+    static constexpr int kKeptEntries = 10000;
+
+    CLogManager();
+    ~CLogManager() override;
+
+    void log(int32_t severity, const P<peru::IString>& text) override;
+    void logException(const peru::CException& exception) override; // at the worst severity
+
+    P<peru::IString> getDocument() const;       // as UTF-8 text
+    void save(const P<peru::IURI>& file) const; // replaces the file; throws CException
+
+private:
+    P<peru::IMutex> m_mutex; // guards the document and the count
+    std::unique_ptr<TiXmlDocument> m_document;
+    int m_entries = 0;
+};
+
+} // namespace sonora2::common

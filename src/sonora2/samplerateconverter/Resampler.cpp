@@ -1,0 +1,82 @@
+#include "sonora2/samplerateconverter/Resampler.h"
+
+extern "C" {
+#include <libavutil/channel_layout.h>
+#include <libavutil/opt.h>
+#include <libswresample/swresample.h>
+}
+
+#include <algorithm>
+#include <memory>
+
+namespace sonora2::samplerateconverter {
+
+namespace {
+
+constexpr int kMaxRatio = 1024;
+constexpr int kOutputMargin = 64;
+
+struct SContextDeleter {
+    void operator()(SwrContext* context) const { swr_free(&context); }
+};
+
+} // namespace
+
+struct SResampler {
+    std::unique_ptr<SwrContext, SContextDeleter> context;
+    int64_t inRate;
+    int64_t outRate;
+    int64_t margin; // output samples that the history may add to what a call's own input gives
+};
+
+SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShift, int linear,
+                          double cutoff) {
+    if (outRate <= 0 || inRate <= 0 || outRate / inRate >= kMaxRatio || inRate / outRate >= kMaxRatio)
+        return nullptr;
+    AVChannelLayout mono = AV_CHANNEL_LAYOUT_MONO;
+    SwrContext* made = nullptr;
+    if (swr_alloc_set_opts2(&made, &mono, AV_SAMPLE_FMT_S16P, outRate, &mono, AV_SAMPLE_FMT_S16P, inRate, 0,
+                            nullptr) < 0)
+        return nullptr;
+    std::unique_ptr<SwrContext, SContextDeleter> context(made);
+    // All that shapes the sound is set here, since the library's defaults are other ones. The flag makes it
+    // filter equal rates too.
+    const bool accepted = av_opt_set_sample_fmt(made, "internal_sample_fmt", AV_SAMPLE_FMT_S16P, 0) >= 0 &&
+                          av_opt_set(made, "flags", "+res", 0) >= 0 &&
+                          av_opt_set(made, "resampler", "swr", 0) >= 0 &&
+                          av_opt_set_int(made, "filter_size", filterSize, 0) >= 0 &&
+                          av_opt_set_int(made, "phase_shift", phaseShift, 0) >= 0 &&
+                          av_opt_set_int(made, "linear_interp", linear, 0) >= 0 &&
+                          av_opt_set_int(made, "exact_rational", 0, 0) >= 0 &&
+                          av_opt_set_double(made, "cutoff", cutoff, 0) >= 0 &&
+                          av_opt_set(made, "filter_type", "kaiser", 0) >= 0 &&
+                          av_opt_set_double(made, "kaiser_beta", 9.0, 0) >= 0;
+    if (!accepted || swr_init(made) < 0) return nullptr;
+
+    // At its start the filter waits for two lengths of itself and then gives them out at once.
+    const int64_t taps = filterSize * ((std::max(inRate, outRate) + int64_t{outRate} - 1) / outRate);
+    const int64_t margin = 2 * taps * outRate / inRate + kOutputMargin;
+    return std::make_unique<SResampler>(SResampler{std::move(context), inRate, outRate, margin}).release();
+}
+
+int resamplerRun(SResampler* resampler, int16_t* dst, const int16_t* src, int* consumed, int srcSize,
+                 int dstSize) {
+    // The library holds back what its output cannot take, and would do so without bound: it is given no more
+    // than fits. The room that it is told stays near what will come, since it grows slow with a large one.
+    const int64_t room = std::max<int64_t>(dstSize - resampler->margin, 0);
+    const int64_t fitting = room * resampler->inRate / resampler->outRate;
+    const int taken = static_cast<int>(std::min<int64_t>(srcSize, fitting));
+    const int64_t expected = taken * resampler->outRate / resampler->inRate + resampler->margin;
+    uint8_t* out = reinterpret_cast<uint8_t*>(dst);
+    const uint8_t* in = reinterpret_cast<const uint8_t*>(src);
+    const int made = swr_convert(resampler->context.get(), &out,
+                                 static_cast<int>(std::min<int64_t>(dstSize, expected)), &in, taken);
+    *consumed = made < 0 ? 0 : taken;
+    return made < 0 ? -1 : made;
+}
+
+void resamplerClose(SResampler* resampler) {
+    std::unique_ptr<SResampler> closed(resampler);
+}
+
+} // namespace sonora2::samplerateconverter
