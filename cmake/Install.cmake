@@ -12,7 +12,7 @@ install(
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
 )
 install(
-    TARGETS peru sonora2
+    TARGETS peru sonora2 zvr_lang
     EXPORT tonewright-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
 )
@@ -43,6 +43,7 @@ foreach(library peru sonora2)
     )
 endforeach()
 
+file(RELATIVE_PATH TONEWRIGHT_PC_TO_PREFIX /prefix/${CMAKE_INSTALL_LIBDIR}/pkgconfig /prefix)
 configure_file(cmake/tonewright.pc.in tonewright.pc @ONLY)
 install(
     FILES ${CMAKE_BINARY_DIR}/tonewright.pc

@@ -1,0 +1,129 @@
+#!/usr/bin/env python3
+"""Whole jobs beside their peers, in one run: processor time, wall time and peak memory as ratios.
+
+Called by scripts/bench.sh; takes the build folder. A ratio below 1 means that we need less than the peer.
+"""
+
+import argparse
+import os
+import pathlib
+import shutil
+import subprocess
+import sys
+import time
+
+SOUNDS = sorted(pathlib.Path("/usr/share/sounds/alsa").glob("*.wav")) + sorted(
+    pathlib.Path("/usr/share/sounds/freedesktop/stereo").glob("*.oga")
+)
+RATE = 44100
+
+
+def run(command):
+    """Processor seconds, wall seconds and peak resident KiB of one run."""
+    start = time.perf_counter()
+    with open(os.devnull, "r+b") as null:
+        process = subprocess.Popen(command, stdin=null, stdout=null, stderr=null)
+        _, status, usage = os.wait4(process.pid, 0)
+        process.returncode = os.waitstatus_to_exitcode(status)
+    wall = time.perf_counter() - start
+    if process.returncode != 0:
+        sys.exit(f"failed ({process.returncode}): {' '.join(map(str, command))}")
+    return usage.ru_utime + usage.ru_stime, wall, usage.ru_maxrss
+
+
+def best(results):
+    """The least of each figure: what the job costs without the neighbours' noise."""
+    return tuple(min(column) for column in zip(*results))
+
+
+def make_material(work, minutes):
+    """Real recordings one after the other, repeated to the wanted length, over quiet noise."""
+    wav = work / "material.wav"
+    if not wav.exists():
+        parts = []
+        for i, sound in enumerate(SOUNDS):
+            part = work / f"part{i}.wav"
+            subprocess.run(["ffmpeg", "-v", "error", "-y", "-i", sound, "-ar", str(RATE), "-ac", "2", part], check=True)
+            parts.append(part)
+        once = work / "once.wav"
+        subprocess.run(["sox", *parts, "-b", "16", once], check=True)
+        seconds = float(subprocess.check_output(["soxi", "-D", once]))
+        subprocess.run(["sox", once, wav, "repeat", str(int(minutes * 60 / seconds) + 1), "trim", "0", str(minutes * 60)], check=True)
+        for part in parts + [once]:
+            part.unlink()
+    for name, command in {
+        "material.flac": ["flac", "-s", "-f", wav, "-o"],
+        "material.mp3": ["lame", "--silent", "-b", "192", wav],
+        "material.ogg": ["oggenc", "-Q", "-q", "5", wav, "-o"],
+    }.items():
+        if not (work / name).exists():
+            subprocess.run([*command, work / name], check=True)
+    return wav
+
+
+def sparse_silence(path, seconds):
+    """A WAV of silence that takes no room on the disk."""
+    size = seconds * RATE * 4
+    header = b"RIFF" + (size + 36).to_bytes(4, "little") + b"WAVEfmt " + (16).to_bytes(4, "little")
+    header += (1).to_bytes(2, "little") + (2).to_bytes(2, "little") + RATE.to_bytes(4, "little")
+    header += (RATE * 4).to_bytes(4, "little") + (4).to_bytes(2, "little") + (16).to_bytes(2, "little")
+    header += b"data" + size.to_bytes(4, "little")
+    with open(path, "wb") as file:
+        file.write(header)
+        file.truncate(len(header) + size)
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__)
+    parser.add_argument("build", type=pathlib.Path)
+    parser.add_argument("--minutes", type=int, default=10, help="length of the material")
+    parser.add_argument("--repeat", type=int, default=3, help="runs of each job, interleaved with its peer")
+    parser.add_argument("--only", default="", help="jobs whose name holds this text")
+    arguments = parser.parse_args()
+
+    host = arguments.build / "bin/tonewright"
+    work = arguments.build / f"bench-{arguments.minutes}min"
+    work.mkdir(exist_ok=True)
+    wav = make_material(work, arguments.minutes)
+    ours = lambda *options: [host, "convert", "--force", "--quiet", *options]
+    out = lambda name: work / name
+    rate48 = "aresample=48000:filter_size=16:phase_shift=10:linear_interp=0:exact_rational=0:cutoff=1.0:filter_type=kaiser:kaiser_beta=9"
+
+    jobs = [
+        ("WAV to FLAC", ours(wav, "-o", out("o.flac")), "flac", ["flac", "-s", "-f", "-5", wav, "-o", out("p.flac")]),
+        ("WAV to MP3, CBR 192", ours(wav, "-o", out("o.mp3"), "--bitrate", "192000"), "lame", ["lame", "--silent", "-b", "192", wav, out("p.mp3")]),
+        ("WAV to MP3, VBR", ours(wav, "-o", out("v.mp3"), "--quality", "0.8"), "lame", ["lame", "--silent", "-V", "2", wav, out("pv.mp3")]),
+        ("WAV to Ogg Vorbis", ours(wav, "-o", out("o.ogg"), "--quality", "0.5"), "oggenc", ["oggenc", "-Q", "-q", "5", wav, "-o", out("p.ogg")]),
+        ("FLAC to WAV", ours(work / "material.flac", "-o", out("f.wav")), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", work / "material.flac", out("pf.wav")]),
+        ("MP3 to WAV", ours(work / "material.mp3", "-o", out("m.wav")), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", work / "material.mp3", out("pm.wav")]),
+        ("WAV 44.1 to 48 kHz", ours(wav, "-o", out("r.wav"), "--rate", "48000"), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", wav, "-af", rate48, out("pr.wav")]),
+    ]
+    print(f"{'job':24} {'peer':8} {'CPU':>6} {'wall':>6} {'x real time':>12} {'peak MiB':>9} {'peer MiB':>9}")
+    for name, our_command, peer, peer_command in jobs:
+        if arguments.only.lower() not in name.lower():
+            continue
+        pairs = [(run(our_command), run(peer_command)) for _ in range(arguments.repeat)]
+        mine, theirs = best([a for a, _ in pairs]), best([b for _, b in pairs])
+        print(
+            f"{name:24} {peer:8} {mine[0] / theirs[0]:6.2f} {mine[1] / theirs[1]:6.2f} "
+            f"{arguments.minutes * 60 / mine[1]:12.0f} {mine[2] / 1024:9.1f} {theirs[2] / 1024:9.1f}",
+            flush=True,
+        )
+
+    if not arguments.only:
+        print("\nPeak memory by length, WAV to FLAC:")
+        for title, seconds in (("1 minute", 60), ("6 hours", 6 * 3600)):
+            silence = out("silence.wav")
+            sparse_silence(silence, seconds)
+            _, wall, peak = run(ours(silence, "-o", out("silence.flac")))
+            print(f"  {title:10} {peak / 1024:6.1f} MiB in {wall:.2f} s")
+            silence.unlink()
+    for leftover in ("o.flac", "p.flac", "o.mp3", "p.mp3", "v.mp3", "pv.mp3", "o.ogg", "p.ogg", "f.wav", "pf.wav", "m.wav", "pm.wav", "r.wav", "pr.wav", "silence.flac"):
+        (work / leftover).unlink(missing_ok=True)
+
+
+if __name__ == "__main__":
+    for tool in ("flac", "lame", "oggenc", "ffmpeg", "sox"):
+        if not shutil.which(tool):
+            sys.exit(f"{tool} is missing: run scripts/setup.sh")
+    main()

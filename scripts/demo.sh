@@ -1,0 +1,36 @@
+#!/usr/bin/env bash
+# The first thing to run: sets up, builds, and converts real recordings into four formats.
+# Leaves the results in the folder given, or in build/demo.
+set -euo pipefail
+
+cd "$(dirname "$0")/.."
+scripts/build.sh release tonewright_host companions plugins
+tonewright=build/release/bin/tonewright
+target=${1:-build/demo}
+mkdir -p "$target"
+
+recordings=(
+    /usr/share/sounds/alsa/{Front_Center,Front_Left,Rear_Right}.wav
+    /usr/share/sounds/freedesktop/stereo/{alarm-clock-elapsed,phone-incoming-call}.oga
+)
+for format in flac mp3 ogg wav; do
+    "$tonewright" convert "${recordings[@]}" --to "$format" --directory "$target" --force --json
+done | python3 -c '
+import json, os, sys
+
+print("%-28s %-12s %9s %10s %14s" % ("file", "codec", "seconds", "bytes", "x real time"))
+for line in sys.stdin:
+    event = json.loads(line)
+    if event["event"] == "done":
+        speed = event["duration"] / max(event["seconds"], 1e-6)
+        name = os.path.basename(event["output"])
+        print("%-28s %-12s %9.2f %10d %14.0f" % (name, event["codec"], event["duration"], event["bytes"], speed))
+'
+cat <<TEXT
+
+The files lie in $target. Go on with:
+  $tonewright --help
+  $tonewright convert YOUR.flac -o YOUR.mp3 --quality 0.8
+  $tonewright info $target/*
+  $tonewright waveform $target/Front_Center.flac -o wave.png
+TEXT

@@ -1,0 +1,27 @@
+#!/usr/bin/env bash
+# Installs into a folder of its own, builds a ten-line C host by pkg-config and by the CMake package, and converts
+# a file with each: run.sh BUILD_DIR SOURCE_DIR CMAKE
+set -euo pipefail
+
+build=$1 source=$2 cmake=$3
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+"$cmake" --install "$build" --prefix "$work/usr" >"$work/install.log"
+
+export PKG_CONFIG_PATH=$work/usr/lib/pkgconfig
+read -ra flags < <(pkg-config --cflags --libs tonewright)
+cc -std=c11 -Wall -Wextra -Werror "$source/host.c" -o "$work/by-pkg-config" "${flags[@]}" "-Wl,-rpath,$work/usr/lib"
+
+"$cmake" -S "$source/host" -B "$work/build" -G Ninja "-DCMAKE_PREFIX_PATH=$work/usr" >"$work/configure.log"
+"$cmake" --build "$work/build" >"$work/build.log" || { cat "$work/build.log"; exit 1; }
+
+sox -n -r 44100 -c 2 -b 16 "$work/tone.wav" synth 1 sine 440
+for host in "$work/by-pkg-config" "$work/build/host"; do
+    rm -f "$work/tone.flac"
+    (cd "$work" && env -u TONEWRIGHT_PLUGIN_PATH -u TONEWRIGHT_COMPANION_PATH "$host" tone.wav tone.flac)
+    flac -t -s "$work/tone.flac"
+done
+
+# The installed program finds everything it needs by itself.
+"$work/usr/bin/tonewright" convert --force "$work/tone.wav" -o "$work/tone.flac"
+flac -t -s "$work/tone.flac"
