@@ -1,0 +1,122 @@
+#include "sonora2_l3codec/Mp3Encoder.h"
+
+#include "support/Pcm.h"
+
+#include <algorithm>
+#include <cstdarg>
+#include <iterator>
+#include <new>
+
+namespace sonora2::plugins {
+
+namespace {
+
+constexpr double kDefaultQuality = 0.8; // V2
+constexpr int kRates[] = {8000, 11025, 12000, 16000, 22050, 24000, 32000, 44100, 48000};
+
+float toVbrQuality(double quality) {
+    return static_cast<float>(std::clamp((1.0 - quality) * 10, 0.0, 9.999));
+}
+
+bool isAverage(const SEncoderSettings& settings) {
+    const int nominal = settings.nominalBitRate;
+    return (settings.minBitRate > 0 && settings.minBitRate != nominal) ||
+           (settings.maxBitRate > 0 && settings.maxBitRate != nominal);
+}
+
+} // namespace
+
+// The codec would resample other rates by itself, and drop channels beyond the second.
+bool CMp3Encoder::accepts(const SPcmFormat& format) const {
+    return format.channels <= 2 &&
+           std::find(std::begin(kRates), std::end(kRates), format.rate) != std::end(kRates);
+}
+
+void CMp3Encoder::open(COutputFile& file, const SEncoderSettings& settings) {
+    m_file = &file;
+    m_format = settings.format;
+    m_encoder.reset(lame_init());
+    lame_t encoder = m_encoder.get();
+    if (!encoder) throw std::bad_alloc();
+    const auto ignore = [](const char*, va_list) {};
+    lame_set_errorf(encoder, ignore);
+    lame_set_debugf(encoder, ignore);
+    lame_set_msgf(encoder, ignore);
+
+    lame_set_num_channels(encoder, m_format.channels);
+    lame_set_in_samplerate(encoder, m_format.rate);
+    lame_set_out_samplerate(encoder, m_format.rate); // else low bit rates would change it
+    if (m_format.channels == 1) lame_set_mode(encoder, MONO);
+    lame_set_write_id3tag_automatic(encoder, 0);
+    if (settings.nominalBitRate > 0 && !isAverage(settings)) {
+        lame_set_brate(encoder, settings.nominalBitRate / 1000);
+    } else if (settings.nominalBitRate > 0) {
+        lame_set_VBR(encoder, vbr_abr);
+        lame_set_VBR_mean_bitrate_kbps(encoder, settings.nominalBitRate / 1000);
+    } else {
+        lame_set_VBR(encoder, vbr_default);
+        lame_set_VBR_quality(encoder, toVbrQuality(settings.quality.value_or(kDefaultQuality)));
+    }
+    if (isAverage(settings)) {
+        if (settings.minBitRate > 0) lame_set_VBR_min_bitrate_kbps(encoder, settings.minBitRate / 1000);
+        if (settings.maxBitRate > 0) lame_set_VBR_max_bitrate_kbps(encoder, settings.maxBitRate / 1000);
+    }
+    if (lame_init_params(encoder) < 0)
+        fail("could not write %s: MP3 has no mode for %d Hz, %d channels and these bit rates",
+             file.getFile().getDisplayName(), m_format.rate, m_format.channels);
+}
+
+void CMp3Encoder::write(const uint8_t* pcm, int frames) {
+    // The bound that the codec's documentation gives.
+    m_encoded.resize(static_cast<size_t>(frames) * 5 / 4 + 7200);
+    const int capacity = static_cast<int>(m_encoded.size());
+    const bool stereo = m_format.channels == 2;
+    if (m_format.bytesPerSample == 2) {
+        auto* samples = reinterpret_cast<short*>(const_cast<uint8_t*>(pcm)); // is not written to
+        writeEncoded(
+            stereo
+                ? lame_encode_buffer_interleaved(m_encoder.get(), samples, frames, m_encoded.data(), capacity)
+                : lame_encode_buffer(m_encoder.get(), samples, nullptr, frames, m_encoded.data(), capacity));
+        return;
+    }
+    m_samples.resize(static_cast<size_t>(frames) * static_cast<size_t>(m_format.channels));
+    pcm::unpackFloat(pcm, m_format.bytesPerSample, m_samples.data(), m_samples.size());
+    writeEncoded(stereo ? lame_encode_buffer_interleaved_ieee_float(m_encoder.get(), m_samples.data(), frames,
+                                                                    m_encoded.data(), capacity)
+                        : lame_encode_buffer_ieee_float(m_encoder.get(), m_samples.data(), nullptr, frames,
+                                                        m_encoded.data(), capacity));
+}
+
+void CMp3Encoder::finish() {
+    m_encoded.resize(7200);
+    writeEncoded(lame_encode_flush(m_encoder.get(), m_encoded.data(), static_cast<int>(m_encoded.size())));
+
+    // The first frame was left empty for what is known only now: length, delay, and the seek table.
+    size_t size = lame_get_lametag_frame(m_encoder.get(), nullptr, 0);
+    if (size == 0) return;
+    m_encoded.resize(size);
+    size = lame_get_lametag_frame(m_encoder.get(), m_encoded.data(), m_encoded.size());
+    m_file->seek(0);
+    m_file->write(m_encoded.data(), size);
+}
+
+void CMp3Encoder::writeEncoded(int bytes) {
+    if (bytes < 0)
+        fail("could not write %s: the MP3 encoder failed with %d", m_file->getFile().getDisplayName(), bytes);
+    m_file->write(m_encoded.data(), static_cast<size_t>(bytes));
+}
+
+int64_t CMp3Encoder::estimateBytes(double seconds, const SEncoderSettings& settings) const {
+    double bitRate = settings.nominalBitRate;
+    if (bitRate <= 0) {
+        // What V9 to V0 come to for stereo at 44.1 kHz, in kbit/s.
+        static constexpr double kBitRates[] = {65, 85, 100, 115, 130, 165, 175, 190, 225, 245, 260};
+        const double tenths = settings.quality.value_or(kDefaultQuality) * 10;
+        const int below = std::min(static_cast<int>(tenths), static_cast<int>(std::size(kBitRates)) - 2);
+        bitRate = (kBitRates[below] + (tenths - below) * (kBitRates[below + 1] - kBitRates[below])) * 1000;
+        bitRate *= settings.format.channels == 1 ? 0.6 : 1.0;
+    }
+    return static_cast<int64_t>(seconds * bitRate / 8);
+}
+
+} // namespace sonora2::plugins

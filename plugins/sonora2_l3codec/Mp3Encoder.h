@@ -1,0 +1,37 @@
+// Writes MP3 with libmp3lame.
+#pragma once
+
+#include "support/Encoder.h"
+
+#include <lame/lame.h>
+#include <memory>
+#include <vector>
+
+namespace sonora2::plugins {
+
+// A nominal bit rate alone makes a constant one; with a minimum or maximum beside it, an average one within
+// these limits. Otherwise the bit rate varies by quality: 1.0 is the encoder's V0, 0.0 its V9; V2 unless
+// told.
+class CMp3Encoder : public IEncoder {
+public:
+    bool accepts(const SPcmFormat& format) const override;
+    void open(COutputFile& file, const SEncoderSettings& settings) override;
+    void write(const uint8_t* pcm, int frames) override;
+    void finish() override;
+    int64_t estimateBytes(double seconds, const SEncoderSettings& settings) const override;
+
+private:
+    struct SClose {
+        void operator()(lame_t encoder) const { lame_close(encoder); }
+    };
+
+    void writeEncoded(int bytes);
+
+    COutputFile* m_file = nullptr;
+    SPcmFormat m_format;
+    std::unique_ptr<lame_global_flags, SClose> m_encoder;
+    std::vector<float> m_samples;
+    std::vector<unsigned char> m_encoded;
+};
+
+} // namespace sonora2::plugins
