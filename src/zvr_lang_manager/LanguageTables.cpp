@@ -750,8 +750,12 @@ constexpr SCountryRow kCountries[] = {
 
 } // namespace
 
-std::span<const SLanguageRow> getLanguageTable() { return kLanguages; }
+std::span<const SLanguageRow> getLanguageTable() {
+    return kLanguages;
+}
 
-std::span<const SCountryRow> getCountryTable() { return kCountries; }
+std::span<const SCountryRow> getCountryTable() {
+    return kCountries;
+}
 
 } // namespace zvr_lang
