@@ -17,8 +17,8 @@ set(CMAKE_C_FLAGS_RELWITHDEBINFO "-O3 -g -DNDEBUG")
 
 add_compile_options(-Wall -Wextra -Wpedantic -Werror -Wshadow=local -Wnon-virtual-dtor -Wno-unused-parameter)
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
-    # Interfaces have protected, virtual destructors; GCC 12 reports false positives inside the library.
-    add_compile_options(-Wno-maybe-uninitialized $<$<COMPILE_LANGUAGE:CXX>:-Wno-non-virtual-dtor>)
+    # Interfaces have protected, virtual destructors; GCC 12 reports false positives inside its library.
+    add_compile_options(-Wno-maybe-uninitialized -Wno-restrict $<$<COMPILE_LANGUAGE:CXX>:-Wno-non-virtual-dtor>)
 endif()
 
 if(TONEWRIGHT_SANITIZERS)
