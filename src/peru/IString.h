@@ -5,6 +5,7 @@
 
 #include <string>
 #include <string_view>
+#include <type_traits>
 
 namespace peru {
 
@@ -23,47 +24,65 @@ struct SStringPos {
 inline constexpr SStringPos kStringBegin{0, 0};
 inline constexpr SStringPos kStringEnd{-1, -1};
 
+// Encoded text and what is known of it.
+struct SStringView {
+    const ICharEncoding* encoding;
+    uint32_t encodingId;
+    int32_t byteSize;
+    const uint8_t* data;
+    int32_t length;  // characters, -1 when nobody has counted them
+    bool wellFormed; // known to have no malformed bytes; never set while the length is not counted
+};
+
 // A text argument in any of its forms, without allocation: a string object, a zero-terminated Latin-1
 // pointer, a zero-terminated wide pointer (wchar_t or char16_t), or encoded bytes. It refers to its text
 // and lives for one call. A null pointer is an empty text.
 class PERU_API CStringArg {
 public:
     CStringArg(const IString& string);
-    CStringArg(const P<IString>& string); // an empty handle is an empty text
+    CStringArg(const P<IString>& string) : CStringArg(static_cast<const IString*>(string.get())) {}
+    // clang-format off
     template <class S>
-        requires std::is_base_of_v<IString, S> CStringArg(const P<S>& string)
-            : CStringArg(static_cast<const IString*>(string.get())) {}
+        requires std::is_base_of_v<IString, S>
+    CStringArg(const P<S>& string) : CStringArg(static_cast<const IString*>(string.get())) {}
+        // clang-format on
         CStringArg(const char* latin1);
         CStringArg(const wchar_t* wide);
         CStringArg(const char16_t* wide);
+        CStringArg(std::nullptr_t) : CStringArg(static_cast<const char*>(nullptr)) {}
         CStringArg(const ICharEncoding& encoding, const void* data, int32_t byteSize);
+        explicit CStringArg(const SStringView& view) : m_view(view) {}
 
         const ICharEncoding& getEncoding() const {
-            return *m_encoding;
+            return *m_view.encoding;
         }
         uint32_t getEncodingId() const {
-            return m_encodingId;
+            return m_view.encodingId;
         }
         const uint8_t* getData() const {
-            return m_data;
+            return m_view.data;
         }
         int32_t getByteSize() const {
-            return m_byteSize;
+            return m_view.byteSize;
         }
         // Characters; counted on first use where the form did not tell.
-        int32_t getLength() const;
+        int32_t getLength() const {
+            return getView().length;
+        }
         bool isEmpty() const {
-            return m_byteSize == 0 || getLength() == 0;
+            return m_view.byteSize == 0 || getLength() == 0;
+        }
+        // With the length counted.
+        const SStringView& getView() const {
+            if (m_view.length < 0) count();
+            return m_view;
         }
 
     private:
-        CStringArg(const IString* string);
+        CStringArg(const IString* string); // null is an empty text
+        void count() const;
 
-        const ICharEncoding* m_encoding;
-        uint32_t m_encodingId;
-        int32_t m_byteSize;
-        mutable int32_t m_length;
-        const uint8_t* m_data;
+        mutable SStringView m_view;
 };
 
 // Ordering, implemented by strings.
@@ -79,8 +98,8 @@ public:
 class PERU_API IString : public virtual IComparable {
 public:
     // --- Positions ---
-    virtual SStringPos getPosition(int32_t index) const = 0; // kStringEnd outside the string
-    // Moves by `count` characters, backwards when negative; past either end is kStringEnd.
+    virtual SStringPos getPosition(int32_t index) const = 0; // kStringEnd where there is no character
+    // Moves by `count` characters, backwards when negative; kStringEnd where there is no character.
     virtual SStringPos movePosition(SStringPos pos, int32_t count) const = 0;
     // The character at `pos`, which moves on; 0 at the end, where `pos` becomes kStringEnd.
     virtual char32_t getCharAndAdvance(SStringPos& pos) const = 0;
@@ -106,7 +125,9 @@ public:
     virtual bool endsWith(const CStringArg& suffix) const = 0;
 
     // --- Finding ---
-    // The first (find) or last (findLast) match that lies wholly between start and end.
+    // The first (find) or last (findLast) match that lies wholly between start and end. An empty text is
+    // found at the start, or last at the end. Text in the code page cannot be searched from its end: that
+    // throws CMethodNotImplementedError.
     virtual SStringPos find(const CStringArg& text, SStringPos start = kStringBegin,
                             SStringPos end = kStringEnd) const = 0;
     virtual SStringPos findLast(const CStringArg& text, SStringPos start = kStringBegin,
@@ -157,6 +178,7 @@ public:
     virtual const uint8_t* getData() const = 0; // encoded bytes, valid while the string lives
     virtual int32_t getDataSize() const = 0;    // bytes, without the terminator
     virtual bool isTerminated() const = 0;
+    virtual SStringView getView() const = 0; // all of it in one call
 };
 
 // Concatenation in every mix of string objects and literals.

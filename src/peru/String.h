@@ -4,6 +4,8 @@
 #include "peru/IString.h"
 #include "peru/Object.h"
 
+#include <atomic>
+
 namespace peru {
 
 // How a string comes by its bytes.
@@ -25,6 +27,7 @@ public:
 
     // The shared empty string.
     static P<IString> empty();
+    static P<IString> fromView(const SStringView& view); // a copy
     static P<IString> fromUTF8(std::string_view bytes);
     static P<IString> fromUTF16(const char16_t* text, int32_t length = -1);
     // The bytes of the string in UTF-8; bytes of a UTF-8 string come back as they are, malformed or not.
@@ -94,37 +97,70 @@ public:
     const uint8_t* getData() const override { return m_data; }
     int32_t getDataSize() const override { return m_byteSize; }
     bool isTerminated() const override { return m_terminated; }
+    SStringView getView() const override {
+        return {m_encoding.get(), m_encodingId, m_byteSize, m_data, m_length, m_wellFormed};
+    }
+
+    // A string that adopts a terminated block from std::malloc; `length` -1 is counted.
+    static P<IString> adopt(const P<ICharEncoding>& encoding, uint8_t* block, int32_t byteSize,
+                            int32_t length = -1, bool wellFormed = false);
+
+protected:
+    // Refers to text whose length is counted.
+    CString(const P<ICharEncoding>& encoding, const SStringView& view, bool terminated);
+    // The string whose bytes these are: slices of a slice hold on to the root.
+    virtual P<const IString> getSliceRoot() const;
 
 private:
+    SStringPos getEnd() const { return {m_length, m_byteSize}; }
+    // With an index from 0 to the length and the offset that belongs to it.
+    SStringPos resolve(SStringPos pos) const;
+    SStringView getRange(SStringPos start, SStringPos end) const; // of resolved positions
+    P<IString> getSlice(SStringPos start, SStringPos end) const;
+    SStringPos findView(const SStringView& text, SStringPos start, SStringPos end) const;
+    SStringPos findLastView(const SStringView& text, SStringPos start, SStringPos end) const;
+    P<IString> edit(SStringPos start, SStringPos end, const SStringView& text) const;
+    template <class F> P<IString> trimBy(F&& isTrimmed) const;
+    P<IString> mapCase(char32_t (*map)(char32_t)) const;
+    P<IString> convertTo(const P<ICharEncoding>& encoding, char32_t substitute) const;
+
     const uint8_t* m_data;
     int32_t m_byteSize; // without the terminator
     bool m_terminated;  // a terminator in the encoding's form follows the data
     bool m_owner;
     P<ICharEncoding> m_encoding;
     int32_t m_length; // characters; known from construction onwards
+    // What falls out of counting, and the hash once it was asked for (0 before).
+    bool m_wellFormed;
+    uint32_t m_encodingId;
+    mutable std::atomic<uint32_t> m_hash{0};
 };
 
 // The concrete classes add their encoding only. `length` counts characters' units, -1 up to the terminator.
 class PERU_API CLatin1String : public CString {
 public:
+    using Unit = char;
     explicit CLatin1String(const char* text, int32_t length = -1,
                            EStringStorage storage = EStringStorage::copy);
 };
 
 class PERU_API CUTF8String : public CString {
 public:
+    using Unit = char;
     explicit CUTF8String(const char* text, int32_t length = -1,
                          EStringStorage storage = EStringStorage::copy);
 };
 
 class PERU_API CUTF16String : public CString {
 public:
+    using Unit = char16_t;
     explicit CUTF16String(const char16_t* text, int32_t length = -1,
                           EStringStorage storage = EStringStorage::copy);
 };
 
 class PERU_API CUTF32String : public CString {
 public:
+    using Unit = char32_t;
     explicit CUTF32String(const char32_t* text, int32_t length = -1,
                           EStringStorage storage = EStringStorage::copy);
 };
@@ -132,6 +168,7 @@ public:
 // The platform's wide character, which is 32 bits wide on Linux.
 class PERU_API CWCharString : public CString {
 public:
+    using Unit = wchar_t;
     explicit CWCharString(const wchar_t* text, int32_t length = -1,
                           EStringStorage storage = EStringStorage::copy);
 };
@@ -139,14 +176,21 @@ public:
 // Text in the code page of the C runtime's locale.
 class PERU_API CCPString : public CString {
 public:
+    using Unit = char;
     explicit CCPString(const char* text, int32_t length = -1, EStringStorage storage = EStringStorage::copy);
 };
 
 // The shared empty instance of each string class: character type and class.
-template <class C, class S> class TNullString {
+template <class C, class S> class PERU_API TNullString {
 public:
     static const P<IString>& get();
 };
+extern template class TNullString<char, CLatin1String>;
+extern template class TNullString<unsigned char, CCPString>;
+extern template class TNullString<unsigned char, CUTF16String>;
+extern template class TNullString<unsigned char, CUTF8String>;
+extern template class TNullString<unsigned int, CUTF32String>;
+extern template class TNullString<wchar_t, CWCharString>;
 
 // A string from a pointer; a null pointer gives the shared empty string and allocates nothing.
 PERU_API P<IString> newString(const char* latin1);
@@ -161,9 +205,12 @@ PERU_API P<IString> operator""_s(const char* text, size_t length);
 // A part of another string: shares its bytes and keeps it alive.
 class PERU_API CStringSlice : public CString {
 public:
-    CStringSlice(const P<const IString>& parent, int32_t offset, int32_t byteSize, int32_t length,
-                 bool terminated);
+    // A view of bytes of the parent, with its length counted.
+    CStringSlice(const P<const IString>& parent, const SStringView& view, bool terminated);
     ~CStringSlice() override;
+
+protected:
+    P<const IString> getSliceRoot() const override { return m_parent; }
 
 private:
     P<const IString> m_parent;

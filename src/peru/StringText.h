@@ -1,0 +1,78 @@
+// What the string operations share: knowledge about encoded text, typed access, and re-encoding.
+#pragma once
+
+#include "peru/CharEncodingRules.h"
+#include "peru/IString.h"
+
+#include <algorithm>
+#include <utility>
+
+namespace peru::text {
+
+// Bytes per character when every character is one code unit and nothing is malformed, else 0. Needs a
+// counted length.
+inline int32_t getFixedWidth(const SStringView& view) {
+    int32_t unit = getUnitSize(view.encodingId);
+    return unit != 0 && view.length * unit == view.byteSize ? unit : 0;
+}
+
+// Fixed-width text as an array of its code units, aligned or not.
+template <class U> struct SUnits {
+    const uint8_t* data;
+    U operator[](int32_t i) const {
+        U unit;
+        std::memcpy(&unit, data + static_cast<ptrdiff_t>(i) * static_cast<ptrdiff_t>(sizeof(U)), sizeof(U));
+        return unit;
+    }
+    SUnits operator+(int32_t i) const {
+        return {data + static_cast<ptrdiff_t>(i) * static_cast<ptrdiff_t>(sizeof(U))};
+    }
+};
+
+// Calls `f` with the units of a fixed-width text.
+template <class F> decltype(auto) withUnits(const SStringView& view, int32_t width, F&& f) {
+    switch (width) {
+    case 1:
+        return f(SUnits<uint8_t>{view.data});
+    case 2:
+        return f(SUnits<uint16_t>{view.data});
+    default:
+        return f(SUnits<uint32_t>{view.data});
+    }
+}
+
+// Fills in length and wellFormed.
+void count(SStringView& view);
+
+// Byte offset of a character in counted text, `index` from 0 to the length; the byte size for the length.
+int32_t getOffset(const SStringView& view, int32_t index);
+// Characters in well-formed text before a byte offset at which a character starts.
+int32_t countWellFormed(const SStringView& view, int32_t byteSize);
+// The first `length` characters.
+SStringView clip(const SStringView& view, int32_t length);
+
+// Negative, zero or positive by code point; counted texts.
+int compare(const SStringView& a, const SStringView& b);
+bool equals(const SStringView& a, const SStringView& b);
+int compareIgnoreCase(const SStringView& a, const SStringView& b);
+bool startsWith(const SStringView& text, const SStringView& prefix);
+
+// Bytes that counted text needs in another encoding; -1 when a character cannot be encoded there. Malformed
+// bytes need none, except that malformed UTF-8 counts as not encodable in Latin-1: an edit then results in
+// UTF-8, which carries the bytes on.
+int64_t getEncodedSize(const ICharEncoding& encoding, const SStringView& text);
+// Writes so many bytes.
+void encode(const ICharEncoding& encoding, const SStringView& text, uint8_t* out);
+
+// The text in another encoding as a string of its own, terminated; `substitute` stands for what cannot be
+// encoded.
+P<IString> convert(const P<ICharEncoding>& encoding, const SStringView& text, char32_t substitute);
+
+// A block for a string of so many bytes and its terminator. Throws std::bad_alloc, also above 2 GB.
+uint8_t* allocate(const ICharEncoding& encoding, int64_t byteSize);
+
+char32_t toLower(char32_t ch);
+char32_t toUpper(char32_t ch);
+bool isWhiteSpace(char32_t ch);
+
+} // namespace peru::text
