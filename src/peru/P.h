@@ -13,6 +13,13 @@ namespace peru {
 // Throws CCastError; out of line, so that handles need not know the error tree.
 [[noreturn]] PERU_API void throwCastError(const IBase* object, const std::type_info& target);
 
+namespace detail {
+template <class U, class T>
+concept UpcastableTo = std::is_convertible_v<U*, T*>;
+template <class U, class T>
+concept UnrelatedTo = !std::is_convertible_v<U*, T*>;
+} // namespace detail
+
 // Strong handle, one word, may be empty. A copy costs one atomic increment, a move nothing.
 //
 // A raw pointer given to the constructor is adopted: its first count passes to the handle, as `new`
@@ -37,18 +44,12 @@ public:
     }
     P(P&& other) noexcept : m_object(std::exchange(other.m_object, nullptr)) {}
 
-    template <class U>
-        requires std::is_convertible_v<U*, T*> P(const P<U>& other)
-    noexcept : m_object(other.get()) {
+    template <detail::UpcastableTo<T> U> P(const P<U>& other) noexcept : m_object(other.get()) {
         if (m_object) m_object->addRef();
     }
-    template <class U>
-        requires std::is_convertible_v<U*, T*> P(P<U>&& other)
-    noexcept : m_object(other.detach()) {}
+    template <detail::UpcastableTo<T> U> P(P<U>&& other) noexcept : m_object(other.detach()) {}
 
-    template <class U>
-        requires(!std::is_convertible_v<U*, T*>)
-    explicit P(const P<U>& other) {
+    template <detail::UnrelatedTo<T> U> explicit P(const P<U>& other) {
         if (!other) return;
         m_object = dynamic_cast<T*>(other.get());
         if (!m_object) throwCastError(other.get(), typeid(T));

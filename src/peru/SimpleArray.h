@@ -25,7 +25,10 @@ public:
         std::construct_at(m_elements + m_count, std::move(element));
         ++m_count;
     }
+    // The element dies last, when the array is whole again: it may be a handle whose object changes the
+    // array.
     void removeAt(size_t index) {
+        E removed = std::move(m_elements[index]);
         std::move(m_elements + index + 1, m_elements + m_count, m_elements + index);
         std::destroy_at(m_elements + --m_count);
     }
