@@ -5,7 +5,10 @@
 #include "peru/Object.h"
 
 #include <deque>
+#include <memory>
+#include <thread>
 #include <unordered_map>
+#include <vector>
 
 namespace peru {
 
@@ -43,11 +46,13 @@ public:
         CMutexLock lock(factory->m_mutex);
         if (IPtrHolder* holder = factory->find(key)) return *static_cast<P<T>*>(holder->getPtr());
         P<T> object = create();
-        factory->enter(key, new CPtrHolderImpl<T>(object));
+        factory->enter(key, std::make_unique<CPtrHolderImpl<T>>(object));
         return object;
     }
 
-    // Destroys all singletons, last made first. The factory stays: what is asked for later is made anew.
+    // Destroys all singletons, last made first. The factory stays: what is asked for later is made anew, and
+    // what is asked for meanwhile dies with the rest. The mutex is free while a singleton dies, so that it
+    // may wait for threads which need other singletons.
     static void shutdown();
 
 protected:
@@ -55,14 +60,25 @@ protected:
     ~CGlobalObjFactory() override;
 
 private:
+    struct SEntry {
+        const SKey* key;
+        IPtrHolder* holder;
+    };
+    struct SDying {
+        SEntry entry;
+        std::thread::id thread;
+    };
+
     static P<CGlobalObjFactory> instance();
     IPtrHolder* find(const SKey& key) const;
-    void enter(const SKey& key, IPtrHolder* holder);
+    void enter(const SKey& key, std::unique_ptr<IPtrHolder> holder);
     void clear();
 
-    P<IMutex> m_mutex; // guards both members below, and is held while a singleton is made
+    P<IMutex> m_mutex; // guards the members below, and is held while a singleton is made
     std::unordered_map<const SKey*, IPtrHolder*> m_holders;
-    std::deque<IPtrHolder*> m_creationOrder;
+    std::deque<SEntry> m_creationOrder;
+    // A singleton that asks for itself while it dies gets itself; for other threads it is gone.
+    std::vector<SDying> m_dying;
 
     friend struct SGlobalObjFactoryCell;
 };
