@@ -1,0 +1,170 @@
+#include "peru/Errors.h"
+
+#include "peru/ClassName.h"
+#include "peru/IStringLocalizer.h"
+#include "peru/IURI.h"
+
+namespace peru {
+
+namespace {
+
+// A string of its own in the encoding of the text.
+P<IString> ownText(const CStringArg& text, const char* whenEmpty = "") {
+    if (text.isEmpty()) return newString(whenEmpty);
+    auto* encoding = const_cast<ICharEncoding*>(&text.getEncoding());
+    return make<CString>(P<ICharEncoding>::share(encoding), text.getData(), text.getByteSize());
+}
+
+P<IString> describe(const P<IBase>& object) {
+    return object ? object->getObjectDesc() : newString("unknown object");
+}
+
+P<IString> uriText(const P<IURI>& uri) {
+    P<IString> text = uri ? uri->getAsString() : nullptr;
+    return text && !text->isEmpty() ? text : newString("<uri unknown>");
+}
+
+P<IString> withObject(const CStringArg& description, const P<IBase>& object) {
+    if (description.isEmpty()) return describe(object);
+    return ownText(description)->replace("%OBJECTDESC%", describe(object));
+}
+
+// One text for a known URI and another for an unknown one.
+P<IString> byURI(const P<IURI>& uri, const char* key, const char* text, const char* generalKey,
+                 const char* generalText) {
+    return uri ? localize(key, text) : localize(generalKey, generalText);
+}
+
+P<IString> streamText(const char* general, const char* withURI, const P<IURI>& uri) {
+    if (!uri) return newString(general);
+    return newString(withURI) + " (uri: '" + uri->getAsString() + "').";
+}
+
+} // namespace
+
+PERU_EXCEPTION_IMPL(CError)
+CError::CError(const CStringArg& description, const CStringArg& title)
+    : CException(ownText(description, "Unspecified error"), ownText(title, "Error")) {}
+
+PERU_EXCEPTION_IMPL(CObjectError)
+CObjectError::CObjectError(const CStringArg& description, const P<IBase>& object, const std::type_info* type,
+                           const CStringArg& title)
+    : CError(withObject(description, object), title.isEmpty() ? CStringArg("Object error") : title),
+      m_object(object), m_type(type) {
+    if (!m_type && object) {
+        const IBase& known = *object;
+        m_type = &typeid(known);
+    }
+}
+
+PERU_EXCEPTION_IMPL(CCastError)
+CCastError::CCastError(const P<IBase>& object, const std::type_info& source, const std::type_info& target)
+    : CObjectError(newString("Error casting a '") + getClassName(source).c_str() + "' object to '" +
+                       getClassName(target).c_str() + "'",
+                   object, &source, "Cast error") {}
+
+PERU_EXCEPTION_IMPL(CInvalidObjectStateError)
+CInvalidObjectStateError::CInvalidObjectStateError(const CStringArg& detail, const P<IBase>& object)
+    : CObjectError(
+          (newString("The object is in an invalid state (") + describe(object) + "): ")->concat(detail),
+          object) {}
+
+PERU_EXCEPTION_IMPL(CEndOfEnumError)
+CEndOfEnumError::CEndOfEnumError(const P<IBase>& object)
+    : CInvalidObjectStateError(localize("peru.CEndOfEnumError.desc", "end of enumeration already reached"),
+                               object) {}
+
+PERU_EXCEPTION_IMPL(CInvalidArgError)
+CInvalidArgError::CInvalidArgError(const CStringArg& argument, const CStringArg& method,
+                                   const P<IBase>& object)
+    : CObjectError(newString("An invalid argument was passed to method '") +
+                       ownText(method, "unspecified method") + "' of '" + describe(object) +
+                       "': " + ownText(argument, "unspecified argument"),
+                   object) {}
+
+PERU_EXCEPTION_IMPL(CMethodNotImplementedError)
+CMethodNotImplementedError::CMethodNotImplementedError(const CStringArg& method, const P<IBase>& object)
+    : CObjectError(newString("Method not implemented (") + describe(object) +
+                       "): " + ownText(method, "unspecified method."),
+                   object) {}
+
+PERU_EXCEPTION_IMPL(CParseError)
+CParseError::CParseError(const CStringArg& description) : CError(description, "Parse error") {}
+
+PERU_EXCEPTION_IMPL(CInvalidVolumeIDError)
+CInvalidVolumeIDError::CInvalidVolumeIDError(const CStringArg& id)
+    : CError(newString("Invalid volume id: ")->concat(id), "Invalid Volume ID Error") {}
+
+PERU_EXCEPTION_IMPL(CNoSuchObjectError)
+CNoSuchObjectError::CNoSuchObjectError()
+    : CError(localize("peru.CNoSuchObjectError.desc", "No such object.")) {}
+
+PERU_EXCEPTION_IMPL(CReadOnlyError)
+CReadOnlyError::CReadOnlyError(const CStringArg& objectDescription)
+    : CError(localize("peru.readOnlyErrorObjectDesc",
+                      "The object (%DESC%) is read-only and cannot be changed.",
+                      {{"%DESC%", objectDescription}})) {}
+
+PERU_EXCEPTION_IMPL(CAbortedError)
+CAbortedError::CAbortedError() : CError("") {}
+
+PERU_EXCEPTION_IMPL(CFinishedError)
+CFinishedError::CFinishedError() : CError("") {}
+
+PERU_EXCEPTION_IMPL(CURIError)
+CURIError::CURIError(const CStringArg& description, const P<IURI>& uri, const CStringArg& title)
+    : CError(ownText(description)->replace("%URI%", uriText(uri)), title), m_uri(uri) {}
+
+PERU_EXCEPTION_IMPL(CURIFormatError)
+CURIFormatError::CURIFormatError(const P<IURI>& uri)
+    : CURIError(byURI(uri, "peru.CURIFormatError.Desc", "The URI ('%URI%') has an invalid format.",
+                      "peru.CURIFormatError.GeneralDesc", "The URI has an invalid format."),
+                uri) {}
+CURIFormatError::CURIFormatError(const CStringArg& uriText)
+    : CURIError(localize("peru.CURIFormatError.Desc", "The URI ('%URI%') has an invalid format.",
+                         {{"%URI%", uriText}}),
+                nullptr) {}
+
+PERU_EXCEPTION_IMPL(CURITypeNotSupportedError)
+CURITypeNotSupportedError::CURITypeNotSupportedError(const P<IURI>& uri)
+    : CURIError(byURI(uri, "peru.CURITypeNotSupportedError.Desc",
+                      "This type of URI ('%URI%') is not supported.",
+                      "peru.CURITypeNotSupportedError.GeneralDesc", "This type URI is not supported."),
+                uri) {}
+
+PERU_EXCEPTION_IMPL(CFileError)
+CFileError::CFileError(const CStringArg& description, const P<IURI>& file, const CStringArg& title)
+    : CURIError(ownText(description)->replace("%FILE%", uriText(file)), file, title) {}
+
+PERU_EXCEPTION_IMPL(CFileNotFoundError)
+CFileNotFoundError::CFileNotFoundError(const P<IURI>& file)
+    : CFileError(byURI(file, "peru.CFileNotFoundError.Desc", "The file '%FILE%' was not found.",
+                       "peru.CFileNotFoundError.GeneralDesc", "The file was not found."),
+                 file) {}
+
+PERU_EXCEPTION_IMPL(CFileAccessDeniedError)
+CFileAccessDeniedError::CFileAccessDeniedError(const P<IURI>& file)
+    : CFileError(localize("peru.CFileAccessDeniedError.Desc", "The access of the file '%FILE%' was denied."),
+                 file) {}
+
+PERU_EXCEPTION_IMPL(CFileFormatNotSupportedError)
+CFileFormatNotSupportedError::CFileFormatNotSupportedError(const P<IURI>& file)
+    : CFileError(byURI(file, "peru.CFileFormatNotSupportedError.Desc",
+                       "The format of file '%FILE%' is not supported.",
+                       "peru.CFileFormatNotSupportedError.Desc.FileUnknown",
+                       "The file format is not supported."),
+                 file) {}
+
+PERU_EXCEPTION_IMPL(CStreamError)
+CStreamError::CStreamError(const CStringArg& description, const P<IURI>& uri, const CStringArg& title)
+    : CURIError(description, uri, title) {}
+
+PERU_EXCEPTION_IMPL(CStreamClosedError)
+CStreamClosedError::CStreamClosedError(const P<IURI>& uri)
+    : CStreamError(streamText("The stream has been closed.", "The stream has been closed", uri), uri) {}
+
+PERU_EXCEPTION_IMPL(CEndOfStreamError)
+CEndOfStreamError::CEndOfStreamError(const P<IURI>& uri)
+    : CStreamError(streamText("Unexpected end of data stream.", "Unexpected end of data stream", uri), uri) {}
+
+} // namespace peru
