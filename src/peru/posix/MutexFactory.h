@@ -1,11 +1,22 @@
-// Mutexes of the platform.
+// Makes the locks of this platform.
 #pragma once
 
 #include "peru/IMutex.h"
+#include "peru/Object.h"
+
+namespace peru {
+
+// A mutex without a request to the global object factory, whose own mutex this is.
+PERU_API P<IMutex> createPlainMutex();
+
+} // namespace peru
 
 namespace peru::posix {
 
-// A re-entrant mutex of this process, made without asking for any global object. Throws std::bad_alloc.
-PERU_API P<IMutex> createPlainMutex();
+class CMutexFactory : public CObject, public IMutexFactory {
+public:
+    P<IMutex> createMutex() override;
+    P<IMutex> createGlobalMutex(const P<IString>& name) override;
+};
 
 } // namespace peru::posix

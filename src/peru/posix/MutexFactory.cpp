@@ -1,0 +1,31 @@
+#include "peru/posix/MutexFactory.h"
+
+#include "peru/GlobalObjFactory.h"
+#include "peru/posix/GlobalMutexImpl.h"
+#include "peru/posix/MutexImpl.h"
+
+namespace peru::posix {
+
+P<IMutex> CMutexFactory::createMutex() {
+    return make<CMutexImpl>();
+}
+
+P<IMutex> CMutexFactory::createGlobalMutex(const P<IString>& name) {
+    return make<CGlobalMutexImpl>(name);
+}
+
+} // namespace peru::posix
+
+namespace peru {
+
+P<IMutex> createPlainMutex() {
+    return make<posix::CMutexImpl>();
+}
+
+P<IMutexFactory> getMutexFactory() {
+    static const CGlobalObjFactory::SKey key;
+    return CGlobalObjFactory::get<IMutexFactory>(
+        key, [] { return P<IMutexFactory>(make<posix::CMutexFactory>()); });
+}
+
+} // namespace peru
