@@ -6,8 +6,12 @@
 
 namespace peru::posix {
 
-P<IMutex> CMutexFactory::createMutex() {
+P<IMutex> createPlainMutex() {
     return make<CMutexImpl>();
+}
+
+P<IMutex> CMutexFactory::createMutex() {
+    return createPlainMutex();
 }
 
 P<IMutex> CMutexFactory::createGlobalMutex(const P<IString>& name) {
@@ -17,10 +21,6 @@ P<IMutex> CMutexFactory::createGlobalMutex(const P<IString>& name) {
 } // namespace peru::posix
 
 namespace peru {
-
-P<IMutex> createPlainMutex() {
-    return make<posix::CMutexImpl>();
-}
 
 P<IMutexFactory> getMutexFactory() {
     static const CGlobalObjFactory::SKey key;

@@ -4,14 +4,10 @@
 #include "peru/IMutex.h"
 #include "peru/Object.h"
 
-namespace peru {
+namespace peru::posix {
 
 // A mutex without a request to the global object factory, whose own mutex this is.
 PERU_API P<IMutex> createPlainMutex();
-
-} // namespace peru
-
-namespace peru::posix {
 
 class CMutexFactory : public CObject, public IMutexFactory {
 public:
