@@ -1,0 +1,48 @@
+// Fans the program's messages out.
+#pragma once
+
+#include "peru/IMutex.h"
+#include "peru/LogBase.h"
+
+#include <unordered_map>
+
+namespace peru {
+
+// Holds its mutex while it calls a sink: the order of locks is manager, then sink. A sink that throws ends
+// the call. A sink may itself be a manager; it is known by its identity.
+class PERU_API CLogManager : public CLogBase, public ILogManager {
+public:
+    CLogManager();
+    ~CLogManager() override;
+
+    // Areas have no source: the sinks that take everything are told.
+    void enterArea(const P<IString>& name) override;
+    void leaveArea(const P<IString>& name) override;
+    // The sinks of the message's source first, then those that take everything.
+    void write(const SLogMessage& message) override;
+
+    // Throws CInvalidArgError for an empty log and for the manager itself.
+    void addLog(const P<ILog>& log, const P<IString>& source) override;
+    bool removeLog(const P<ILog>& log, const P<IString>& source) override;
+
+    // Sources with a sink of their own.
+    size_t getSourceCount() const;
+
+private:
+    class CLogList;
+    struct SHash {
+        size_t operator()(const P<IString>& text) const { return text->getHash(); }
+    };
+    struct SEqual {
+        bool operator()(const P<IString>& a, const P<IString>& b) const { return a->equals(b); }
+    };
+
+    P<IMutex> m_mutex; // guards all below
+    P<CLogList> m_logs;
+    std::unordered_map<P<IString>, P<CLogList>, SHash, SEqual> m_logsBySource;
+    // Areas that the sinks were told of. Who heard of an entry hears of the leaving, also when the level
+    // was raised in between, since the depth would never come back.
+    std::vector<P<IString>> m_areas;
+};
+
+} // namespace peru
