@@ -152,10 +152,12 @@ TONEWRIGHT_API int32_t TONEWRIGHT_InitStartup(void);
 TONEWRIGHT_API int32_t TONEWRIGHT_InitGui(const char16_t* a, const char16_t* b, const char16_t* c,
                                           int32_t flag, const char16_t* userDataPath, const char16_t* f);
 
-/* Names the crash reports: application, version, and the folder where report and dump are written. The texts
- * are copied. May be called before TONEWRIGHT_InitStartup; the last call counts. */
-TONEWRIGHT_API void TONEWRIGHT_Init_Crashhandler(const char16_t* application, const char16_t* version,
-                                                 const char16_t* folder);
+/* Installs the crash handler for the whole process: on a fatal signal or an exception that leaves a thread it
+ * writes a text report and a minidump, then goes on to the handlers that stood before. `application` is the
+ * host's name and version, `report` the path of the report, `dump` that of the dump without its ".dmp". May
+ * be called before TONEWRIGHT_InitStartup; another call changes the names. */
+TONEWRIGHT_API void TONEWRIGHT_Init_Crashhandler(const char16_t* application, const char16_t* report,
+                                                 const char16_t* dump);
 
 /* Tells that the host's main window is shown. No effect. Result: 0. */
 TONEWRIGHT_API uint8_t TONEWRIGHT_OnWindowShown(TONEWRIGHT_WindowHandle window);
@@ -164,8 +166,8 @@ TONEWRIGHT_API uint8_t TONEWRIGHT_OnWindowShown(TONEWRIGHT_WindowHandle window);
  * destroyed, and no other thread may be inside the library. Harmless when not started. */
 TONEWRIGHT_API void TONEWRIGHT_DeInitAll(void);
 
-/* Sets the language of the interface, as "en-US" or "de". Null is ignored; an unknown text is logged and
- * leaves the language as it was. */
+/* Sets the language of the interface: language and country, as "en-US" or "deu-AT". Null is ignored; an
+ * unknown text is logged and leaves the language as it was. */
 TONEWRIGHT_API void TONEWRIGHT_SetLanguageID(const char16_t* language);
 
 /* Writes the feature record: its size as a 32-bit number, which is 9, and five flags of one byte. `buffer`

@@ -1,0 +1,93 @@
+#include "tonewright/App.h"
+
+#include "peru/Errors.h"
+#include "peru/GlobalObjFactory.h"
+#include "peru/ILog.h"
+#include "peru/ISystem.h"
+#include "peru/URI.h"
+#include "sonora2/audio/SonoraContextAudio.h"
+#include "tonewright/SonoraLogManagerProxy.h"
+
+namespace tonewright {
+
+using sonora2::common::CPluginHandler;
+using sonora2::common::ISonoraContext;
+
+namespace {
+
+// What the flag words switch on is the plug-ins' matter.
+constexpr uint64_t kReadFlags = 0x23E8;
+constexpr uint64_t kWriteFlags = 0x3C8;
+
+constexpr const char* kProductFolder = "Zelvanor Tonewright 4/";
+
+bool fail(const char* text) {
+    peru::getLogManager()->info(peru::CString::fromUTF8("tonewright_shared"), text);
+    return false;
+}
+
+} // namespace
+
+CApp::CApp() : m_userDataPath(peru::CString::empty()) {}
+CApp::~CApp() = default;
+
+P<CApp> CApp::get() {
+    static const peru::CGlobalObjFactory::SKey kKey;
+    return peru::CGlobalObjFactory::get<CApp>(kKey, [] { return P<CApp>(new CApp); });
+}
+
+void CApp::throwNotStarted() const {
+    throw peru::CInvalidObjectStateError("TONEWRIGHT_InitStartup has not been called or has failed",
+                                         P<peru::IBase>::share(const_cast<CApp*>(this)));
+}
+
+bool CApp::init() {
+    if (m_cancelAutoplay) return true;
+    const P<peru::ISystem> system = peru::getSystem();
+    const P<peru::IURI> executable = system->getMainExecutableFile();
+    if (!executable) return fail("CApp::init could not get main executable file");
+    m_programFolder = executable->getParent();
+    if (!m_programFolder) return fail("CApp::init could not parent folder of main executable file");
+    m_productDataFolder = peru::make<peru::CURI>("", "", "", "", kProductFolder, "", "")
+                              ->resolveAgainst(system->getDataFolder());
+
+    m_logProxy = peru::make<CSonoraLogManagerProxy>();
+    // In order of preference.
+    m_readContext =
+        makeContext(kReadFlags, {"sonora2_flac", "sonora2_decmpa", "sonora2_vorbis", "sonora2_wav",
+                                 "sonora2_wmf", "sonora2_dsgraph", "sonora2_discio"});
+    if (!m_readContext) return fail("CApp::init could not create SonoraReadContext");
+    m_readPluginHandler = peru::make<CPluginHandler>(m_readContext, false);
+    if (!m_readPluginHandler) return fail("CApp::init could not create SonoraReadPluginHandler");
+
+    m_writeContext = makeContext(
+        kWriteFlags, {"sonora2_flac", "sonora2_l3codec", "sonora2_vorbis", "sonora2_wav", "sonora2_wmf"});
+    if (!m_writeContext) return fail("CApp::init could not create SonoraWriteContext");
+    m_writePluginHandler = peru::make<CPluginHandler>(m_writeContext, false);
+    if (!m_writePluginHandler) return fail("CApp::init could not create SonoraWritePluginHandler");
+
+    m_serviceLock = peru::getMutexFactory()->createMutex();
+    m_driveChanged = nullptr;
+    m_cancelAutoplay = peru::make<cap::CCancelAutoplay2>();
+    return true;
+}
+
+P<ISonoraContext> CApp::makeContext(uint64_t flags, std::initializer_list<const char*> plugins) const {
+    P<ISonoraContext> context = peru::make<sonora2::audio::CSonoraContextAudio>();
+    context->setLogManager(m_logProxy);
+    context->setFlags(flags);
+    for (const char* name : plugins) context->addPluginName(name);
+    context->setSwitchB(true);
+    return context;
+}
+
+void CApp::shutdown() {
+    m_driveChanged = nullptr;
+    m_readPluginHandler.reset();
+    m_writePluginHandler.reset();
+    m_readContext.reset();
+    m_writeContext.reset();
+    m_cancelAutoplay.reset();
+}
+
+} // namespace tonewright

@@ -1,0 +1,135 @@
+#include "peru/Errors.h"
+#include "peru/StringFormat.h"
+#include "sonora2/common/SampleReader.h"
+#include "tonewright/exports/AppReference.h"
+#include "tonewright/exports/Barrier.h"
+#include "tonewright/exports/Handles.h"
+
+#include <cmath>
+#include <cstring>
+#include <limits>
+
+using namespace tonewright;
+using namespace tonewright::exports;
+using sonora2::common::IAudioSource;
+
+namespace {
+
+constexpr int kStepsPerBlock = 100;
+constexpr float kSampleScale = 3.0517578125e-05f; // 1 / 32768
+
+// Frames from one step of a wave-form to the next. Throws CError for a step that is no whole frame, or that
+// is more than one chunk can hold.
+int getFramesPerStep(IAudioSource& source, double secondsPerStep) {
+    const double frames = source.getSampleRate() * secondsPerStep;
+    const int limit = std::numeric_limits<int32_t>::max() / (2 * source.getChannelCount());
+    if (frames >= 1.0 && frames < limit) return static_cast<int>(frames);
+    throw peru::CError(peru::format(
+        "TONEWRIGHT_AudioSource_FetchStreamSamples: a step of %g seconds cannot be taken", secondsPerStep));
+}
+
+// True when the reader came to its end, false when the callback ended it.
+bool fetchSamples(TONEWRIGHT_Handle handle, const P<IAudioSource>& source,
+                  TONEWRIGHT_SamplesCallback callback, double secondsPerStep, void* user) {
+    const P<sonora2::common::ISonoraContext> context = requireApp()->getReadContext();
+    const int channels = source->getChannelCount();
+    if (channels < 1) throw peru::CError("TONEWRIGHT_AudioSource_FetchStreamSamples: a source of no channel");
+    const int blockSize = channels * kStepsPerBlock;
+    const int framesPerStep = getFramesPerStep(*source, secondsPerStep);
+    const P<peru::IMemoryBlock> block = context->getMemoryManager()->getBlock(
+        static_cast<int64_t>(blockSize) * static_cast<int64_t>(sizeof(float)));
+    auto* samples = reinterpret_cast<float*>(block->getData());
+    const size_t frameBytes = static_cast<size_t>(channels) * sizeof(int16_t);
+
+    auto reader = peru::make<sonora2::common::CSampleReader>(context, source);
+    const double duration = source->getDuration();
+    int filled = 0;
+    while (reader->hasSamples()) {
+        const P<sonora2::audio::IAudioChunk> chunk = reader->getSamples(framesPerStep);
+        if (!chunk || chunk->getSize() < frameBytes) continue;
+        const uint8_t* frame = chunk->getData();
+        for (int channel = 0; channel < channels; ++channel, frame += sizeof(int16_t)) {
+            int16_t sample;
+            std::memcpy(&sample, frame, sizeof(sample));
+            samples[filled++] = static_cast<float>(sample) * kSampleScale;
+        }
+        if (filled < blockSize) continue;
+        const double fraction = duration > 0.0 ? chunk->getTimestamp() / duration : 0.0;
+        if (!callback(handle, fraction, samples, blockSize, user)) return false;
+        filled = 0;
+    }
+    return true;
+}
+
+} // namespace
+
+TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromURI(const char16_t* uri, int32_t sampleRate,
+                                                      int32_t channelCount, int32_t bytesPerSample,
+                                                      int32_t keepOpened) {
+    return barrier<TONEWRIGHT_Handle>(nullptr, [&] {
+        return wrap(requireApp()->getReadPluginHandler()->createAudioSource(
+            toURI(uri), sampleRate, channelCount, bytesPerSample, keepOpened != 0));
+    });
+}
+
+TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromEditorXml(const char16_t*, int32_t, int32_t, int32_t) {
+    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_CreateAudioSourceFromEditorXml", nullptr);
+}
+
+TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSoureFromAudioInDevice(TONEWRIGHT_Handle, int32_t, int32_t, int32_t) {
+    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_CreateAudioSoureFromAudioInDevice", nullptr);
+}
+
+uint8_t TONEWRIGHT_AudioSource_IsOpened(TONEWRIGHT_Handle source) {
+    return barrier<uint8_t>(0, [&]() -> uint8_t {
+        peru::CMutexLock lock(requireApp()->getServiceLock());
+        const P<IAudioSource> object = unwrap<IAudioSource>(source);
+        return object && object->isOpened() ? 1 : 0;
+    });
+}
+
+int32_t TONEWRIGHT_AudioSource_Open(TONEWRIGHT_Handle source) {
+    return barrier<int32_t>(TONEWRIGHT_AUDIO_FAILED, [&] {
+        peru::CMutexLock lock(requireApp()->getServiceLock());
+        const P<IAudioSource> object = unwrap<IAudioSource>(source);
+        if (!object) return TONEWRIGHT_AUDIO_FAILED;
+        object->open();
+        return TONEWRIGHT_OK;
+    });
+}
+
+int32_t TONEWRIGHT_AudioSource_Close(TONEWRIGHT_Handle source) {
+    return barrier<int32_t>(TONEWRIGHT_AUDIO_FAILED, [&] {
+        peru::CMutexLock lock(requireApp()->getServiceLock());
+        const P<IAudioSource> object = unwrap<IAudioSource>(source);
+        if (!object) return TONEWRIGHT_AUDIO_FAILED;
+        object->close();
+        return TONEWRIGHT_OK;
+    });
+}
+
+double TONEWRIGHT_AudioSource_GetDuration(TONEWRIGHT_Handle source) {
+    return barrier<double>(-1.0, [&] {
+        peru::CMutexLock lock(requireApp()->getServiceLock());
+        const P<IAudioSource> object = unwrap<IAudioSource>(source);
+        return object ? object->getDuration() : -1.0;
+    });
+}
+
+// No source of this library records, so that there is none to which these two would apply.
+void TONEWRIGHT_AudioSource_SetRecordingCallback(TONEWRIGHT_Handle, TONEWRIGHT_RecordingCallback) {}
+
+void TONEWRIGHT_AudioSource_SetRecordingVolumeCallback(TONEWRIGHT_Handle,
+                                                       TONEWRIGHT_RecordingVolumeCallback) {}
+
+uint8_t TONEWRIGHT_AudioSource_FetchStreamSamples(TONEWRIGHT_Handle source,
+                                                  TONEWRIGHT_SamplesCallback callback, double secondsPerStep,
+                                                  void* user) {
+    return barrier<uint8_t>(0, [&]() -> uint8_t {
+        const P<IAudioSource> object = unwrap<IAudioSource>(source);
+        if (!object || !callback) return 0;
+        if (!object->isOpened()) object->open();
+        if (object->getBytesPerSample() != 2) return 0;
+        return fetchSamples(source, object, callback, secondsPerStep, user) ? 1 : 0;
+    });
+}

@@ -1,0 +1,48 @@
+#include "tonewright/exports/AppReference.h"
+
+using namespace tonewright::exports;
+
+TONEWRIGHT_WindowHandle TONEWRIGHT_CreateCoverEditorHandle(TONEWRIGHT_WindowHandle, const char16_t*,
+                                                           TONEWRIGHT_CoverEditorCallback) {
+    return notAvailable<TONEWRIGHT_WindowHandle>("TONEWRIGHT_CreateCoverEditorHandle", 0);
+}
+
+void TONEWRIGHT_ReleaseCoverEditorHandle(TONEWRIGHT_WindowHandle) {}
+
+bool TONEWRIGHT_EMBEDDEDCOVEREDITOR_NewProject(int32_t) {
+    return notAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_NewProject", false);
+}
+
+bool TONEWRIGHT_EMBEDDEDCOVEREDITOR_GotoNextPage() {
+    return notAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_GotoNextPage", false);
+}
+
+bool TONEWRIGHT_EMBEDDEDCOVEREDITOR_GotoPrevPage() {
+    return notAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_GotoPrevPage", false);
+}
+
+bool TONEWRIGHT_EMBEDDEDCOVEREDITOR_CanGotoNextPage() {
+    return notAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_CanGotoNextPage", false);
+}
+
+bool TONEWRIGHT_EMBEDDEDCOVEREDITOR_IsLastPage() {
+    return notAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_IsLastPage", false);
+}
+
+bool TONEWRIGHT_EMBEDDEDCOVEREDITOR_IsFirstPage() {
+    return notAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_IsFirstPage", false);
+}
+
+int32_t TONEWRIGHT_EMBEDDEDCOVEREDITOR_GetTotalPageCount() {
+    return notAvailable<int32_t>("TONEWRIGHT_EMBEDDEDCOVEREDITOR_GetTotalPageCount", 0);
+}
+
+int32_t TONEWRIGHT_EMBEDDEDCOVEREDITOR_GetCurrentPageIndex() {
+    return notAvailable<int32_t>("TONEWRIGHT_EMBEDDEDCOVEREDITOR_GetCurrentPageIndex", 0);
+}
+
+void TONEWRIGHT_EMBEDDEDCOVEREDITOR_SetBackgroundColor(int32_t, int32_t, int32_t) {}
+
+void TONEWRIGHT_EMBEDDEDCOVEREDITOR_ShowHelp() {}
+
+void TONEWRIGHT_EMBEDDEDCOVEREDITOR_Idle() {}

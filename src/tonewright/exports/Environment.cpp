@@ -1,0 +1,51 @@
+#include "peru/ILog.h"
+#include "tonewright/exports/AppReference.h"
+#include "tonewright/exports/Barrier.h"
+#include "tonewright/exports/Handles.h"
+
+using namespace tonewright;
+using namespace tonewright::exports;
+using sonora2::common::IPluginExtensions;
+
+void TONEWRIGHT_InitDiscio(uint8_t /*flag*/) {
+    logNotAvailable("TONEWRIGHT_InitDiscio");
+}
+
+void TONEWRIGHT_SetTempExtension(const char16_t* extension) {
+    barrier([&] { requireApp()->getWritePluginHandler()->setURISuffix(toString(extension)); });
+}
+
+void TONEWRIGHT_SetDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback) {
+    barrier([&] {
+        requireApp()->setDriveChangedCallback(callback);
+        if (callback) logNotAvailable("TONEWRIGHT_SetDriveChangedCallback");
+    });
+}
+
+void TONEWRIGHT_AddProxyLogManager(TONEWRIGHT_Handle log) {
+    const P<peru::ILogManager> proxy = unwrap<peru::ILogManager>(log);
+    const P<peru::ILogManager> manager = peru::getLogManager();
+    // The manager itself as its own proxy would write in a circle.
+    if (proxy && !(proxy == manager)) manager->addLog(proxy, peru::CString::empty());
+}
+
+void TONEWRIGHT_RemoveProxyLogManager(TONEWRIGHT_Handle log) {
+    if (const P<peru::ILogManager> proxy = unwrap<peru::ILogManager>(log))
+        peru::getLogManager()->removeLog(proxy, peru::CString::empty());
+}
+
+TONEWRIGHT_Handle TONEWRIGHT_getValidCodecExtensions(int32_t types) {
+    return barrier<TONEWRIGHT_Handle>(
+        nullptr, [&] { return wrap(requireApp()->getReadPluginHandler()->getValidExtensions(types)); });
+}
+
+int32_t TONEWRIGHT_getExtensionCount(TONEWRIGHT_Handle extensions) {
+    const P<IPluginExtensions> list = unwrap<IPluginExtensions>(extensions);
+    return list ? list->getCount() : 0;
+}
+
+TONEWRIGHT_Handle TONEWRIGHT_getExtension(TONEWRIGHT_Handle extensions, int32_t index) {
+    const P<IPluginExtensions> list = unwrap<IPluginExtensions>(extensions);
+    if (!list || index < 0 || index >= list->getCount()) return nullptr;
+    return wrapText(list->getExtension(index));
+}
