@@ -62,9 +62,9 @@ SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShif
 int resamplerRun(SResampler* resampler, int16_t* dst, const int16_t* src, int* consumed, int srcSize,
                  int dstSize) {
     // The library holds back what its output cannot take, and would do so without bound: it is given no more
-    // than fits. The room that it is told stays near what will come, since it grows slow with a large one.
-    const int64_t room = std::max<int64_t>(dstSize - resampler->margin, 0);
-    const int64_t fitting = room * resampler->inRate / resampler->outRate;
+    // than fits, beside the little that it waited for at its start. The room that it is told stays near what
+    // will come, since it grows slow with a large one.
+    const int64_t fitting = dstSize * resampler->inRate / resampler->outRate;
     const int taken = static_cast<int>(std::min<int64_t>(srcSize, fitting));
     const int64_t expected = taken * resampler->outRate / resampler->inRate + resampler->margin;
     uint8_t* out = reinterpret_cast<uint8_t*>(dst);
