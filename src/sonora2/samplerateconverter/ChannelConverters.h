@@ -9,7 +9,7 @@
 namespace sonora2::samplerateconverter {
 
 // Channel order is front left, front right, centre, then the rest. Stateless.
-class CSampleRateConverter::CChannelConverter : public peru::CObject {
+class SONORA2_API CSampleRateConverter::CChannelConverter : public peru::CObject {
 public:
     static constexpr int kMaxChannels = 6;
     using SourcePointers = std::array<const int16_t*, kMaxChannels>; // the first sample of each channel
