@@ -1,0 +1,167 @@
+// A source and a format that do what a test wrote down for them, and tell what was done to them.
+#pragma once
+
+#include "peru/Errors.h"
+#include "sonora2/audio/AudioChunk.h"
+#include "sonora2/common/IAudioFormat.h"
+#include "sonora2/common/IAudioSource.h"
+#include "sonora2/common/IEncodeListener.h"
+
+#include <cstring>
+#include <deque>
+#include <functional>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace tests {
+
+using peru::P;
+
+inline P<sonora2::audio::CAudioChunk> makeChunk(double timestamp, const std::string& bytes) {
+    P<peru::IMemoryBlock> block = peru::make<peru::CMemoryBlock>(static_cast<int64_t>(bytes.size()));
+    std::memcpy(block->getData(), bytes.data(), bytes.size());
+    return peru::make<sonora2::audio::CAudioChunk>(timestamp, block);
+}
+
+inline std::string bytesOf(const P<sonora2::audio::IAudioChunk>& chunk) {
+    return std::string(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
+}
+
+// Bytes that differ along the whole length, so that a lost or doubled one shows.
+inline std::string patternBytes(size_t count) {
+    std::string bytes(count, '\0');
+    for (size_t i = 0; i < count; ++i) bytes[i] = static_cast<char>((i * 2654435761u) >> 13);
+    return bytes;
+}
+
+// Delivers its media in the given cuts (bytes), over and over; a cut of 0 gives an empty chunk.
+class CScriptedSource : public peru::CObject, public sonora2::common::IAudioSource {
+public:
+    int rate = 44100;
+    int channels = 2;
+    int bytesPerSample = 2;
+    double chunkTimestamp = 77.0; // told by every chunk
+    std::string media;
+    std::vector<size_t> cuts{1000};
+    bool emptyBeforeEnd = false;       // answers empty handles although it is not at its end
+    std::deque<bool> eofAnswers;       // taken first where there are any
+    std::function<void()> beforeChunk; // may throw
+    std::function<void()> beforeClose;
+
+    int opens = 0;
+    int closes = 0;
+
+    bool isOpened() override { return m_opened; }
+    void open() override {
+        ++opens;
+        m_opened = true;
+        m_position = 0;
+    }
+    void close() override {
+        ++closes;
+        if (beforeClose) beforeClose();
+        m_opened = false;
+    }
+    void skipToTime(double) override {}
+    double getDuration() override {
+        return static_cast<double>(media.size()) / (channels * bytesPerSample) / rate;
+    }
+    int getBufferStatus() override { return 100; }
+    bool isEOF() override {
+        if (eofAnswers.empty()) return m_position >= media.size();
+        const bool answer = eofAnswers.front();
+        eofAnswers.pop_front();
+        return answer;
+    }
+    void setStartTime(double) override {}
+    double getStartTime() override { return 0.0; }
+    P<peru::IURI> getURI() override { return nullptr; }
+    P<peru::IString> getPluginName() override { return peru::CString::empty(); }
+    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override { return nullptr; }
+    void setAudioStream(int) override {}
+    P<sonora2::audio::IAudioChunk> getNextAudioChunk() override {
+        if (beforeChunk) beforeChunk();
+        if (emptyBeforeEnd || m_position >= media.size()) return nullptr;
+        const size_t size = std::min(cuts[m_cut++ % cuts.size()], media.size() - m_position);
+        m_position += size;
+        return makeChunk(chunkTimestamp, media.substr(m_position - size, size));
+    }
+    // A decoder knows its format only while it is opened.
+    int getSampleRate() override { return m_opened ? rate : 0; }
+    int getChannelCount() override { return m_opened ? channels : 0; }
+    int getBytesPerSample() override { return m_opened ? bytesPerSample : 0; }
+
+private:
+    bool m_opened = false;
+    size_t m_position = 0;
+    size_t m_cut = 0;
+};
+
+class CScriptedFormat : public peru::CObject, public sonora2::common::IAudioFormat {
+public:
+    std::function<void()> beforeWrite; // may throw
+    std::function<void()> beforeClose;
+
+    std::string written;
+    std::vector<size_t> sizes;
+    std::vector<double> timestamps;
+    int opens = 0;
+    int closes = 0;
+
+    bool isOpened() override { return m_opened; }
+    void open() override {
+        ++opens;
+        m_opened = true;
+    }
+    void close() override {
+        ++closes;
+        if (beforeClose) beforeClose();
+        m_opened = false;
+    }
+    P<peru::IURI> getURI() override { return nullptr; }
+    P<peru::IString> getPluginName() override { return peru::CString::empty(); }
+    int64_t getEstimatedSizeBytes(double) override { return 0; }
+    int getSampleRate() override { return 44100; }
+    int getChannelCount() override { return 2; }
+    int getBytesPerSample() override { return 2; }
+    void setAudioQuality(double) override {}
+    void setAudioBitRate(int, int, int) override {}
+    void writeAudioChunk(const P<sonora2::audio::IAudioChunk>& chunk) override {
+        if (beforeWrite) beforeWrite();
+        written += bytesOf(chunk);
+        sizes.push_back(chunk->getSize());
+        timestamps.push_back(chunk->getTimestamp());
+    }
+
+private:
+    bool m_opened = false;
+};
+
+// Keeps what it hears; answers false from a fraction on.
+class CScriptedListener : public peru::CObject, public sonora2::common::IEncodeListener {
+public:
+    double stopFrom = 2.0;
+    std::function<void()> onCall;
+    std::vector<double> fractions;
+    std::vector<int32_t> integers;
+
+    bool onProgress(double fraction, int32_t reserved) override {
+        fractions.push_back(fraction);
+        integers.push_back(reserved);
+        if (onCall) onCall();
+        return fraction < stopFrom;
+    }
+};
+
+// The description of the peru exception that the call throws; nothing when it throws none.
+inline std::optional<std::string> errorOf(const std::function<void()>& call) {
+    try {
+        call();
+    } catch (const peru::CException& exception) {
+        return peru::CString::toStdString(exception.getDescription());
+    }
+    return std::nullopt;
+}
+
+} // namespace tests
