@@ -17,6 +17,16 @@ bool hasDrive(std::string_view path) {
     return path.size() >= 2 && path[1] == ':';
 }
 
+// In UTF-16, by the bytes: the platform counts also what the strict decoder of strings would pass over.
+size_t countUnits(std::string_view utf8) {
+    size_t units = 0;
+    for (char ch : utf8) {
+        auto byte = static_cast<uint8_t>(ch);
+        if ((byte & 0xC0) != 0x80) units += byte >= 0xF0 ? 2 : 1;
+    }
+    return units;
+}
+
 bool startsWithIgnoreCase(std::string_view text, std::string_view prefix) {
     return CString::fromUTF8(text.substr(0, prefix.size()))->equalsIgnoreCase(CString::fromUTF8(prefix));
 }
@@ -32,7 +42,7 @@ P<IString> toWindowsPath(const P<IURI>& uri, bool knowsLongForm) {
     std::replace(path.begin(), path.end(), '/', '\\');
 
     P<IString> text = CString::fromUTF8(path);
-    if (CString::toStdU16String(text).size() < kWindowsPathLimit) return text;
+    if (countUnits(path) < kWindowsPathLimit) return text;
     if (knowsLongForm && path.starts_with(kUNCStart))
         return CString::fromUTF8(std::string(kLongPrefix) + std::string(kLongUNCPrefix) +
                                  path.substr(kUNCStart.size()));

@@ -75,12 +75,9 @@ P<IString> CPathes::toPlatformPath(const P<IURI>& uri, bool forDisplay) {
 }
 
 P<IURI> CPathes::fromPlatformPath(const CStringArg& path) {
-    std::string bytes = CString::toStdString(path);
-    if (bytes.starts_with('/')) return make<CURI>("file", "", "", "", CString::fromUTF8(bytes), "", "");
-    // A colon before the first "/" would make the first segment read as a scheme, two slashes as a host.
-    std::string first = bytes.substr(0, bytes.find('/'));
-    P<IString> rest = CURI::escape(CString::fromUTF8(bytes.substr(first.size())), CURI::kPathSet);
-    return make<CURI>(CURI::escape(CString::fromUTF8(first), ";,@&=+$")->concat(rest));
+    P<IString> bytes = CString::fromUTF8(CString::toStdString(path));
+    const char* scheme = bytes->getDataSize() > 0 && bytes->getData()[0] == '/' ? "file" : "";
+    return make<CURI>(scheme, "", "", "", bytes, "", "");
 }
 
 P<IString> CPathes::join(const CStringArg& folder, const CStringArg& fileName) {

@@ -1,0 +1,171 @@
+#include "peru/ISystem.h"
+
+#include "support/Environment.h"
+#include "support/Files.h"
+#include "support/TempFolder.h"
+
+#include "peru/URI.h"
+
+#include <dlfcn.h>
+#include <fcntl.h>
+#include <set>
+#include <sys/stat.h>
+
+using namespace peru;
+using tests::CEnvironment;
+using tests::CTempFolder;
+using tests::text;
+using tests::toPath;
+using tests::toURI;
+namespace fs = std::filesystem;
+
+namespace {
+
+size_t countEntries(const fs::path& folder) {
+    return static_cast<size_t>(std::distance(fs::directory_iterator(folder), fs::directory_iterator()));
+}
+
+} // namespace
+
+TEST(System, FindsTheUsersFoldersByTheirRules) {
+    CEnvironment home("HOME", "/home/user");
+    struct SCase {
+        const char* variable;
+        P<IURI> (ISystem::*get)();
+        const char* fallback;
+    };
+    for (const SCase& c : {SCase{"XDG_DATA_HOME", &ISystem::getDataFolder, "/home/user/.local/share/"},
+                           SCase{"XDG_CONFIG_HOME", &ISystem::getConfigurationFolder, "/home/user/.config/"},
+                           SCase{"TMPDIR", &ISystem::getTemporaryFolder, "/tmp/"}}) {
+        auto get = [&] { return toPath((getSystem().get()->*c.get)()); };
+        CEnvironment set(c.variable, "/some/where");
+        EXPECT_EQ(get(), "/some/where/");
+        for (const char* value : {static_cast<const char*>(nullptr), "", "not/absolute"}) {
+            CEnvironment unusable(c.variable, value);
+            EXPECT_EQ(get(), c.fallback);
+        }
+    }
+}
+
+TEST(System, KnowsTheRunningProgram) {
+    EXPECT_EQ(toPath(getSystem()->getMainExecutableFile()), fs::read_symlink("/proc/self/exe"));
+    EXPECT_EQ(toPath(getSystem()->getProgramFileFolder()),
+              fs::read_symlink("/proc/self/exe").parent_path().string() + "/");
+}
+
+TEST(System, SearchesTheListThenTheLibraryThenTheInstallation) {
+    CEnvironment list("TW_TEST_PATH", "/one::relative:/two/:/one/");
+    Dl_info library;
+    ASSERT_NE(dladdr(reinterpret_cast<void*>(&peru::getSystem), &library), 0);
+    std::string folder = fs::canonical(library.dli_fname).parent_path().string();
+    std::vector<std::string> found;
+    for (const P<IURI>& uri : getSystem()->getSearchFolders("TW_TEST_PATH", "share/tonewright"))
+        found.push_back(toPath(uri));
+    ASSERT_EQ(found.size(), 4u);
+    EXPECT_EQ(found[0], "/one/");
+    EXPECT_EQ(found[1], "/two/");
+    EXPECT_EQ(found[2], folder + "/");
+    EXPECT_EQ(found[3], fs::path(folder).parent_path().string() + "/share/tonewright/");
+    EXPECT_EQ(getSystem()->getSearchFolders("TW_TEST_NOT_SET", nullptr).size(), 1u);
+}
+
+TEST(System, MakesNamesThatNobodyElseHas) {
+    CTempFolder folder;
+    std::set<std::string> names;
+    for (int i = 0; i < 50; ++i) {
+        names.insert(
+            toPath(getSystem()->createUniqueFile(toURI(folder.path()), "a b", i % 2 ? ".wav" : "wav")));
+        names.insert(toPath(getSystem()->createUniqueFolder(toURI(folder.path()), "d")));
+    }
+    EXPECT_EQ(names.size(), 100u);
+    EXPECT_EQ(countEntries(folder.path()), 100u);
+    for (const std::string& name : names) {
+        struct stat status;
+        ASSERT_EQ(stat(name.c_str(), &status), 0);
+        EXPECT_EQ(status.st_mode & 0777, name.ends_with('/') ? 0700u : 0600u);
+        EXPECT_TRUE(name.ends_with('/') || name.ends_with(".wav"));
+        EXPECT_FALSE(name.ends_with("..wav"));
+    }
+}
+
+TEST(System, RefusesUniqueNamesWithoutAPlace) {
+    CTempFolder folder;
+    P<IURI> missing = toURI(folder / "missing");
+    EXPECT_EQ(tests::errorOf([&] { getSystem()->createUniqueFile(missing, "a", ""); }),
+              "Error creating unique file name.");
+    EXPECT_EQ(tests::errorOf([&] { getSystem()->createUniqueFolder(missing, "a"); }),
+              "Error creating unique folder name.");
+    EXPECT_THROW(getSystem()->createUniqueFile(toURI(folder.path()), "../a", ""), CFileError);
+    EXPECT_EQ(countEntries(folder.path()), 0u);
+}
+
+TEST(System, CopiesBytesModeAndTimes) {
+    CTempFolder folder;
+    std::string bytes;
+    for (int i = 0; i < 700000; ++i) bytes += static_cast<char>(i * 7);
+    fs::path source = folder.write("source", bytes);
+    fs::path copy = folder / "copy";
+    ASSERT_EQ(chmod(source.c_str(), 0754), 0);
+    const timespec times[2] = {{1000000000, 123456789}, {1100000000, 987654321}};
+    ASSERT_EQ(utimensat(AT_FDCWD, source.c_str(), times, 0), 0);
+
+    getSystem()->copyFile(toURI(source), toURI(copy));
+    EXPECT_TRUE(tests::readFile(copy) == bytes);
+    struct stat status;
+    ASSERT_EQ(stat(copy.c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 07777, 0754u);
+    EXPECT_EQ(status.st_mtim.tv_sec, 1100000000);
+    EXPECT_EQ(status.st_mtim.tv_nsec, 987654321);
+
+    // A file whose size the kernel does not tell.
+    getSystem()->copyFile(toURI("/proc/self/status"), toURI(folder / "status"));
+    EXPECT_NE(tests::readFile(folder / "status").find("VmRSS"), std::string::npos);
+}
+
+TEST(System, NeverReplacesAndLeavesNoHalfCopy) {
+    CTempFolder folder;
+    P<IURI> source = toURI(folder.write("a", "new"));
+    P<IURI> taken = toURI(folder.write("b", "old"));
+    P<IURI> missing = toURI(folder / "missing");
+    std::string names = "'" + toPath(source) + "' to '" + toPath(taken) + "'";
+    EXPECT_EQ(tests::errorOf([&] { getSystem()->copyFile(source, taken); }),
+              "Error copying file " + names + ". The file already exists.");
+    EXPECT_EQ(tests::errorOf([&] { getSystem()->moveFile(source, taken); }),
+              "Error moving file " + names + ".");
+    EXPECT_EQ(tests::errorOf([&] { getSystem()->moveFolder(source, taken); }),
+              "Error moving folder " + names + ".");
+    EXPECT_EQ(tests::errorOf([&] { getSystem()->copyFile(missing, toURI(folder / "c")); }),
+              "Error copying file '" + toPath(missing) + "' to '" + (folder / "c").string() +
+                  "' (No such file or directory).");
+    // Fails in its first read, after the destination was made.
+    EXPECT_THROW(getSystem()->copyFile(toURI("/proc/self/mem"), toURI(folder / "c")), CFileError);
+    fs::create_symlink(folder / "nowhere", folder / "link");
+    EXPECT_THROW(getSystem()->copyFile(source, toURI(folder / "link")), CFileError);
+    EXPECT_THROW(getSystem()->copyFile(toURI(folder.path()), toURI(folder / "c")), CFileError);
+    ASSERT_EQ(mkfifo((folder / "pipe").c_str(), 0600), 0);
+    EXPECT_THROW(getSystem()->copyFile(toURI(folder / "pipe"), toURI(folder / "c")), CFileError);
+    EXPECT_THROW(getSystem()->copyFile(make<CURI>("http://host/a"), toURI(folder / "c")),
+                 CURITypeNotSupportedError);
+    EXPECT_EQ(tests::readFile(folder / "b"), "old");
+    EXPECT_EQ(countEntries(folder.path()), 4u);
+}
+
+TEST(System, MovesByName) {
+    CTempFolder folder;
+    fs::create_directory(folder / "d");
+    folder.write("d/a", "1");
+    getSystem()->moveFolder(toURI(folder / "d/"), toURI(folder / "e/"));
+    getSystem()->moveFile(toURI(folder / "e/a"), toURI(folder / "b"));
+    EXPECT_EQ(tests::readFile(folder / "b"), "1");
+    EXPECT_FALSE(fs::exists(folder / "d"));
+    fs::create_directory(folder / "empty");
+    EXPECT_THROW(getSystem()->moveFolder(toURI(folder / "e"), toURI(folder / "empty")), CFileError);
+    EXPECT_TRUE(fs::exists(folder / "e"));
+}
+
+TEST(System, TellsTheVersionOfALibrary) {
+    std::string version = text(getSystem()->getLibraryVersion("libgio-2.0.so.0"));
+    EXPECT_TRUE(version.starts_with("0.")) << version;
+    EXPECT_EQ(text(getSystem()->getLibraryVersion("libc.so.6")), "6");
+    EXPECT_EQ(text(getSystem()->getLibraryVersion("libnone.so.1")), "");
+}

@@ -1,0 +1,37 @@
+// Between the paths of tests and the URIs of the system.
+#pragma once
+
+#include "peru/Errors.h"
+#include "peru/IPathes.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <string>
+
+namespace tests {
+
+inline peru::P<peru::IURI> toURI(const std::filesystem::path& path) {
+    return peru::getPathes()->fromPlatformPath(peru::CString::fromUTF8(path.string()));
+}
+
+inline std::string toPath(const peru::P<peru::IURI>& uri) {
+    return peru::CString::toStdString(peru::getPathes()->toPlatformPath(uri));
+}
+
+inline std::string text(const peru::P<peru::IString>& string) {
+    return peru::CString::toStdString(string);
+}
+
+// The description of the error that the operation throws; a failure of the test when it throws none.
+template <class Operation> std::string errorOf(Operation operation) {
+    try {
+        operation();
+    } catch (const peru::CException& error) {
+        return text(error.getDescription());
+    }
+    ADD_FAILURE() << "no error was thrown";
+    return {};
+}
+
+} // namespace tests
