@@ -16,6 +16,7 @@
 #include <cstdlib>
 #include <fcntl.h>
 #include <filesystem>
+#include <gio/gio.h>
 #include <sys/stat.h>
 #include <unistd.h>
 

@@ -1,23 +1,30 @@
-// Owners of what GIO hands out.
+// Owners of what GIO hands out. GIO's headers stay out of here, so that who uses such a class does not need
+// them.
 #pragma once
 
-#include <gio/gio.h>
+#include "peru/Api.h"
+
 #include <memory>
+
+typedef struct _GError GError;
+typedef struct _GFile GFile;
+typedef struct _GFileEnumerator GFileEnumerator;
+typedef struct _GFileInfo GFileInfo;
 
 namespace peru::posix {
 
-struct SGObjectRelease {
-    void operator()(void* object) const { g_object_unref(object); }
+struct PERU_API SGObjectRelease {
+    void operator()(void* object) const;
 };
 template <class T> using TGObject = std::unique_ptr<T, SGObjectRelease>;
 
-struct SGMemoryRelease {
-    void operator()(void* memory) const { g_free(memory); }
+struct PERU_API SGMemoryRelease {
+    void operator()(void* memory) const;
 };
 using CGText = std::unique_ptr<char, SGMemoryRelease>;
 
-struct SGErrorRelease {
-    void operator()(GError* error) const { g_error_free(error); }
+struct PERU_API SGErrorRelease {
+    void operator()(GError* error) const;
 };
 using CGError = std::unique_ptr<GError, SGErrorRelease>;
 

@@ -5,6 +5,8 @@
 #include "peru/posix/FileTimes.h"
 #include "peru/posix/PlatformFile.h"
 
+#include <gio/gio.h>
+
 namespace peru::posix {
 namespace {
 
