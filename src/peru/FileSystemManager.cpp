@@ -268,6 +268,11 @@ void CFileSystemManager::moveFile(const SRoute& route, const P<IFileObject>& obj
 }
 
 void CFileSystemManager::moveFolder(const SRoute& route, const P<IFileObject>& folder) {
+    auto failToCreate = [&route] {
+        throwRouteError("peru.CFileSystemManager.MoveFolderFailed.CreateFolder",
+                        "Error moving folder '%SRC%' to '%DEST%'. Could not create the folder.", route.source,
+                        route.destination, route.destination);
+    };
     auto fail = [&route](const CException& error) {
         throwRouteError("peru.CFileSystemManager.MoveFolderFailed",
                         "Error moving folder '%SRC%' to '%DEST%'.", route.source, route.destination,
@@ -277,6 +282,8 @@ void CFileSystemManager::moveFolder(const SRoute& route, const P<IFileObject>& f
         throwRouteError("peru.CFileSystemManager.MoveFolderFailed.FolderExists",
                         "Error moving folder '%SRC%' to '%DEST%'. The folder already exists.", route.source,
                         route.destination, route.destination);
+    P<IURI> parent = route.destination->getParent();
+    if (parent && !parent->getPath()->isEmpty() && !isFolder(parent)) failToCreate();
     bool within = route.from == route.to;
     try {
         if (within && route.from->tryMove(route.source, route.destination)) return;
@@ -291,9 +298,7 @@ void CFileSystemManager::moveFolder(const SRoute& route, const P<IFileObject>& f
         else
             route.to->createFolder(route.destination);
     } catch (const CException&) {
-        throwRouteError("peru.CFileSystemManager.MoveFolderFailed.CreateFolder",
-                        "Error moving folder '%SRC%' to '%DEST%'. Could not create the folder.", route.source,
-                        route.destination, route.destination);
+        failToCreate();
     }
     try {
         try {
