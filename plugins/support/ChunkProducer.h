@@ -29,6 +29,7 @@ public:
 
 private:
     P<audio::IAudioChunk> nextConverted();
+    int readOwn(uint8_t* pcm, int frames);
     P<audio::IAudioChunk> makeChunk(P<peru::IMemoryBlock> block, int64_t frames);
 
     P<peru::IMemoryManager> m_memory;
@@ -40,10 +41,13 @@ private:
     int64_t m_position = 0; // delivered frame that comes next
     int64_t m_origin = 0;
 
+    bool m_ended = false; // the decoder has no more
+    int64_t m_read = 0;   // own frame that the decoder reads next
+
     // Only while converting.
     bool m_converting;
     P<samplerateconverter::CSampleRateConverter> m_converter;
-    int64_t m_read = 0; // own frame that the decoder reads next
+    int m_ownChunkFrames = 0;
     int64_t m_drop = 0; // converted frames to throw away: the run-up of a seek
     bool m_flushed = false;
 };

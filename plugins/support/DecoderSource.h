@@ -37,13 +37,12 @@ public:
     P<audio::IAudioStreamInfos> getAudioStreamInfos() override;
     void setAudioStream(int nAudioIndex) override; // 0 only
     P<audio::IAudioChunk> getNextAudioChunk() override;
-    int getSampleRate() override { return getDelivered().rate; }
-    int getChannelCount() override { return getDelivered().channels; }
-    int getBytesPerSample() override { return getDelivered().bytesPerSample; }
+    int getSampleRate() override { return m_delivered.rate; }
+    int getChannelCount() override { return m_delivered.channels; }
+    int getBytesPerSample() override { return m_delivered.bytesPerSample; }
 
 private:
-    SPcmFormat resolveWanted(const SPcmFormat& own) const;
-    const SPcmFormat& getDelivered() const;
+    bool openDecoder(); // false when its format cannot become the wanted one
     void requireOpened() const;
     int64_t toFrame(double seconds) const;
     void restartAt(int64_t frame); // a delivered frame of the whole file

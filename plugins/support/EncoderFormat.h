@@ -35,11 +35,12 @@ public:
     void writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) override;
 
 private:
-    void requireClosed(const char* doing) const;
+    void requireClosed(const char* what) const;
 
     P<peru::IString> m_pluginName;
     SMediaFile m_file;
     EncoderFactory m_makeEncoder;
+    std::unique_ptr<IEncoder> m_estimator; // never opened
     SEncoderSettings m_settings;
     std::unique_ptr<COutputFile> m_output; // while open
     std::unique_ptr<IEncoder> m_encoder;   // writes to the output

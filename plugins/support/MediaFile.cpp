@@ -3,6 +3,8 @@
 #include "peru/IPathes.h"
 
 #include <algorithm>
+#include <cerrno>
+#include <filesystem>
 #include <system_error>
 
 namespace sonora2::plugins {
@@ -30,6 +32,18 @@ std::string SMediaFile::getExtension(const std::vector<std::string>& known) cons
 
 P<peru::IString> SMediaFile::getDisplayName() const {
     return path.empty() ? uri->getAsString() : peru::CString::fromUTF8(path);
+}
+
+InputFile openForReading(const SMediaFile& file) {
+    std::error_code error;
+    // A pipe would block, and a codec needs to go back and forth.
+    const std::filesystem::file_status status = std::filesystem::status(file.path, error);
+    if (error) failSystem("could not open", file, error.value());
+    if (std::filesystem::is_directory(status)) failSystem("could not open", file, EISDIR);
+    if (!std::filesystem::is_regular_file(status)) fail("%s is no file", file.getDisplayName());
+    InputFile input(std::fopen(file.path.c_str(), "rbe")); // closed in programs that are started meanwhile
+    if (!input) failSystem("could not open", file, errno);
+    return input;
 }
 
 void failSystem(const char* doing, const SMediaFile& file, int errorNumber) {

@@ -6,6 +6,8 @@
 #include "sonora2/common/SonoraError.h"
 
 #include <cstdint>
+#include <cstdio>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -36,6 +38,13 @@ struct SMediaFile {
 
     P<peru::IString> getDisplayName() const; // for messages
 };
+
+struct SFileCloser {
+    void operator()(std::FILE* file) const { std::fclose(file); }
+};
+using InputFile = std::unique_ptr<std::FILE, SFileCloser>;
+// Opens an ordinary file for a codec library, by stream or by the descriptor under it. Throws CSonoraError.
+InputFile openForReading(const SMediaFile& file);
 
 // Throws CSonoraError; `text` is a format of CStringFormat.
 template <class... Args> [[noreturn]] void fail(const char* text, const Args&... args) {

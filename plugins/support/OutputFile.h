@@ -7,8 +7,8 @@
 
 namespace sonora2::plugins {
 
-// Buffered writing with random access. Nothing on disk changes before the first flush: what an existing
-// file held is lost only when there is something to put in its place. A failure is thrown as a CSonoraError
+// Buffered writing with random access. Nothing that is there is touched before commit() or the first
+// bytes that no longer fit the buffer. A failure is thrown as a CSonoraError
 // that names the file and the reason and is kept: every later operation that writes throws it again, so that
 // a codec library that swallows it (or cannot be thrown through) loses nothing.
 class COutputFile {
@@ -22,8 +22,8 @@ public:
     void seek(int64_t position);
     int64_t tell() const { return m_position + static_cast<int64_t>(m_fill); }
     int64_t getSize() const; // highest byte written so far
-    void flush();
-    void close(); // flushes; throws also what an earlier operation failed with
+    void commit();           // empties what was there before; an encoder has taken its settings
+    void close();            // flushes; throws also what an earlier operation failed with
 
     // For callbacks of C libraries, which no exception may cross: false on failure, which is kept.
     bool tryWrite(const void* data, size_t size) noexcept;
@@ -31,7 +31,7 @@ public:
     void throwFailure() const; // what has failed so far, if anything
 
     // Closes and takes back a file that this object has made; one that was there before stays as it was,
-    // as long as nothing was flushed.
+    // as long as nothing was committed.
     void discard() noexcept;
 
     const SMediaFile& getFile() const { return m_file; }

@@ -25,6 +25,7 @@ public:
     int getFill() const;  // percent; 100 also when nothing more is to be read
 
 private:
+    void startThread();
     static void runThread(peru::IBase* owner, void* argument);
     void run();
     // One step of the producer; false behind the last one. The lock is not held.
@@ -32,8 +33,7 @@ private:
 
     CChunkProducer& m_producer;
     const size_t m_limit;
-    bool m_started = false;
-    P<peru::IThread> m_thread;
+    P<peru::IThread> m_thread; // consumer's side only
 
     mutable std::mutex m_mutex; // guards all below
     std::condition_variable m_filled;

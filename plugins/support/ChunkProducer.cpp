@@ -1,0 +1,152 @@
+#include "support/ChunkProducer.h"
+
+#include "sonora2/audio/AudioChunk.h"
+
+#include <algorithm>
+#include <cstring>
+#include <numeric>
+#include <utility>
+
+namespace sonora2::plugins {
+
+namespace {
+
+constexpr int kChunkFrames = 8192;
+constexpr int kChunkBytes = 256 * 1024; // wide formats get fewer frames
+// Own frames that the filter is run through before the first one that is wanted behind a seek; in downward
+// conversions it is as many times longer as the rate falls. Its length is 16 samples a side.
+constexpr int64_t kRunUp = 64;
+// Beyond these there is no filter.
+constexpr int kMaxRatio = 1024;
+constexpr int kMaxRate = 1 << 24;
+
+// round(value * numerator / denominator) for values of any file that fits a disk.
+int64_t scale(int64_t value, int64_t numerator, int64_t denominator) {
+    const int64_t whole = value / denominator;
+    const int64_t rest = value % denominator;
+    return whole * numerator + (rest * numerator + denominator / 2) / denominator;
+}
+
+} // namespace
+
+CChunkProducer::CChunkProducer(const P<common::ISonoraContext>& context, IDecoder& decoder,
+                               const SDecodedMedia& media, const SPcmFormat& wanted)
+    : m_memory(context->getMemoryManager()), m_decoder(decoder), m_media(media), m_wanted(wanted),
+      m_total(countDelivered(media, wanted)), m_converting(!(media.format == wanted)) {
+    m_chunkFrames = std::clamp(kChunkBytes / wanted.frameBytes(), 1, kChunkFrames);
+    if (m_converting) {
+        // Own frames that give about that many delivered ones.
+        const int64_t own = scale(m_chunkFrames, media.format.rate, wanted.rate);
+        m_ownChunkFrames = static_cast<int>(std::clamp<int64_t>(own, 64, kChunkFrames));
+    }
+}
+
+bool CChunkProducer::canDeliver(const SPcmFormat& own, const SPcmFormat& wanted) {
+    if (own == wanted) return true;
+    const auto [low, high] = std::minmax(own.rate, wanted.rate);
+    if (high / low >= kMaxRatio || high > kMaxRate) return false;
+    return (wanted.bytesPerSample == 1 || wanted.bytesPerSample == 2) &&
+           samplerateconverter::CSampleRateConverter::canConvert(own.channels, wanted.channels);
+}
+
+int64_t CChunkProducer::countDelivered(const SDecodedMedia& media, const SPcmFormat& wanted) {
+    return scale(media.frames, wanted.rate, media.format.rate);
+}
+
+void CChunkProducer::seek(int64_t frame) {
+    m_position = std::clamp<int64_t>(frame, 0, m_total);
+    m_ended = false;
+    int64_t own = m_position;
+    if (m_converting) {
+        // The filter's phase comes round every `ownPeriod` frames: started there, a new converter gives what
+        // the old one would have given, as soon as its filter is full.
+        const int64_t common = std::gcd(m_media.format.rate, m_wanted.rate);
+        const int64_t ownPeriod = m_media.format.rate / common;
+        const int64_t runUp = kRunUp * (1 + m_media.format.rate / m_wanted.rate);
+        const int64_t at = scale(m_position, m_media.format.rate, m_wanted.rate);
+        own = std::max<int64_t>(0, at - runUp) / ownPeriod * ownPeriod;
+        m_drop = m_position - own / ownPeriod * (m_wanted.rate / common);
+        m_converter.reset();
+        m_flushed = false;
+    }
+    if (own == m_read) return;
+    m_decoder.seek(own);
+    m_read = own;
+}
+
+P<audio::IAudioChunk> CChunkProducer::next() {
+    if (m_ended || m_position >= m_total) return nullptr;
+    if (m_converting) return nextConverted();
+    const int wanted = static_cast<int>(std::min<int64_t>(m_chunkFrames, m_total - m_position));
+    const int64_t frameBytes = m_wanted.frameBytes();
+    P<peru::IMemoryBlock> block = m_memory->getBlock(wanted * frameBytes);
+    const int frames = readOwn(block->getData(), wanted);
+    if (frames == 0) return nullptr;
+    block->setSize(frames * frameBytes);
+    return makeChunk(std::move(block), frames);
+}
+
+P<audio::IAudioChunk> CChunkProducer::nextConverted() {
+    const int64_t frameBytes = m_wanted.frameBytes();
+    if (!m_converter) {
+        m_converter = peru::make<samplerateconverter::CSampleRateConverter>(
+            m_media.format.rate, m_media.format.channels, m_media.format.bytesPerSample, m_wanted.rate,
+            m_wanted.channels, m_wanted.bytesPerSample, m_memory);
+    }
+    const int ownFrameBytes = m_media.format.frameBytes();
+    while (m_position < m_total) {
+        P<audio::IAudioChunk> converted;
+        if (m_flushed) return nullptr; // the silence behind the end is used up
+        P<peru::IMemoryBlock> own = m_memory->getBlock(int64_t{m_ownChunkFrames} * ownFrameBytes);
+        const int64_t left = m_media.frames - m_read;
+        const int frames =
+            left > 0 ? readOwn(own->getData(), static_cast<int>(std::min<int64_t>(m_ownChunkFrames, left)))
+                     : 0;
+        if (frames == 0) {
+            m_flushed = true;
+            m_ended = false; // the filter still holds the last frames
+            if (m_read < m_media.frames)
+                m_total = std::min(m_total, scale(m_read, m_wanted.rate, m_media.format.rate));
+            if (m_position >= m_total) return nullptr;
+            converted = m_converter->convert(nullptr, 0);
+        } else {
+            converted = m_converter->convert(own->getData(), frames * ownFrameBytes);
+        }
+        P<peru::IMemoryBlock> block = converted->getMemoryBlock();
+        int64_t count = block->getSize() / frameBytes;
+        const int64_t dropped = std::min(count, m_drop);
+        m_drop -= dropped;
+        count = std::min(count - dropped, m_total - m_position);
+        if (count == 0) continue;
+        if (dropped > 0)
+            std::memmove(block->getData(), block->getData() + dropped * frameBytes,
+                         static_cast<size_t>(count * frameBytes));
+        block->setSize(count * frameBytes);
+        return makeChunk(std::move(block), count);
+    }
+    return nullptr;
+}
+
+int CChunkProducer::readOwn(uint8_t* pcm, int frames) {
+    // A decoder may give less than asked for; chunks are filled all the same, unless the file ends.
+    int filled = 0;
+    const int frameBytes = m_media.format.frameBytes();
+    while (filled < frames) {
+        const int count = m_decoder.read(pcm + int64_t{filled} * frameBytes, frames - filled);
+        if (count <= 0) {
+            m_ended = true;
+            break;
+        }
+        filled += count;
+        m_read += count;
+    }
+    return filled;
+}
+
+P<audio::IAudioChunk> CChunkProducer::makeChunk(P<peru::IMemoryBlock> block, int64_t frames) {
+    const double timestamp = static_cast<double>(m_position - m_origin) / m_wanted.rate;
+    m_position += frames;
+    return peru::make<audio::CAudioChunk>(timestamp, std::move(block));
+}
+
+} // namespace sonora2::plugins

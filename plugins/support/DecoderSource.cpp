@@ -1,0 +1,154 @@
+#include "support/DecoderSource.h"
+
+#include "peru/Errors.h"
+#include "sonora2/audio/AudioStreamInfos.h"
+
+#include <algorithm>
+#include <cmath>
+#include <utility>
+
+namespace sonora2::plugins {
+
+namespace {
+
+// What is read ahead at most: a second, and no more than this.
+constexpr int64_t kReadAheadBytes = 512 * 1024;
+
+size_t getReadAheadChunks(const SPcmFormat& format, int chunkFrames) {
+    const int64_t second = format.rate;
+    const int64_t frames = std::min<int64_t>(second, kReadAheadBytes / format.frameBytes());
+    return static_cast<size_t>(frames / chunkFrames);
+}
+
+} // namespace
+
+CDecoderSource::CDecoderSource(const P<common::ISonoraContext>& context, const P<peru::IString>& pluginName,
+                               const SMediaFile& file, std::unique_ptr<IDecoder> decoder,
+                               const SPcmFormat& wanted)
+    : m_context(context), m_pluginName(pluginName), m_file(file), m_wanted(wanted),
+      m_decoder(std::move(decoder)) {}
+
+CDecoderSource::~CDecoderSource() {
+    m_readAhead.reset();
+    m_producer.reset();
+}
+
+bool CDecoderSource::probe() {
+    const bool deliverable = openDecoder();
+    m_decoder->close();
+    return deliverable;
+}
+
+void CDecoderSource::open() {
+    if (isOpened()) return;
+    if (!openDecoder()) {
+        m_decoder->close();
+        const SPcmFormat& own = m_media.format;
+        fail("%s has %d channels of %d bytes, which cannot be converted to %d channels of %d bytes",
+             m_file.getDisplayName(), own.channels, own.bytesPerSample, m_delivered.channels,
+             m_delivered.bytesPerSample);
+    }
+    try {
+        m_producer = std::make_unique<CChunkProducer>(m_context, *m_decoder, m_media, m_delivered);
+        restartAt(toFrame(m_startTime));
+    } catch (...) {
+        close();
+        throw;
+    }
+}
+
+void CDecoderSource::close() {
+    if (!isOpened()) return;
+    m_readAhead.reset();
+    m_producer.reset();
+    m_decoder->close();
+}
+
+void CDecoderSource::skipToTime(double fTimestamp) {
+    requireOpened();
+    restartAt(toFrame(m_startTime + std::max(fTimestamp, 0.0)));
+}
+
+double CDecoderSource::getDuration() {
+    if (m_delivered.rate == 0) return 0.0;
+    const int64_t start = toFrame(m_startTime);
+    if (start == 0) return static_cast<double>(m_media.frames) / m_media.format.rate;
+    return static_cast<double>(m_total - start) / m_delivered.rate;
+}
+
+int CDecoderSource::getBufferStatus() {
+    if (!isOpened()) return 0;
+    if (isEOF()) return 100;
+    return m_readAhead ? m_readAhead->getFill() : 0;
+}
+
+bool CDecoderSource::isEOF() {
+    if (!isOpened() || m_delivering >= m_total) return true;
+    return m_readAhead && m_readAhead->isEnded();
+}
+
+void CDecoderSource::setStartTime(double fStartTime) {
+    if (!(fStartTime >= 0.0)) fail("%g is no start time for %s", fStartTime, m_file.getDisplayName());
+    m_startTime = fStartTime;
+    if (isOpened()) restartAt(toFrame(m_startTime));
+}
+
+P<audio::IAudioStreamInfos> CDecoderSource::getAudioStreamInfos() {
+    auto infos = peru::make<audio::CAudioStreamInfos>();
+    infos->add(peru::make<audio::CAudioInfo>(0));
+    return infos;
+}
+
+void CDecoderSource::setAudioStream(int nAudioIndex) {
+    if (nAudioIndex != 0) fail("%s has no audio stream %d", m_file.getDisplayName(), nAudioIndex);
+}
+
+P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {
+    requireOpened();
+    if (isEOF()) return nullptr;
+    if (!m_readAhead) {
+        m_readAhead = std::make_unique<CReadAhead>(
+            *m_producer, getReadAheadChunks(m_delivered, m_producer->getChunkFrames()));
+    }
+    P<audio::IAudioChunk> chunk = m_readAhead->next();
+    if (chunk) m_delivering += chunk->getSize() / static_cast<uint32_t>(m_delivered.frameBytes());
+    return chunk;
+}
+
+bool CDecoderSource::openDecoder() {
+    m_media = m_decoder->open();
+    const SPcmFormat& own = m_media.format;
+    const bool sound = own.rate > 0 && own.channels > 0 && own.bytesPerSample >= 1 &&
+                       own.bytesPerSample <= 4 && m_media.frames >= 0;
+    if (!sound) {
+        m_decoder->close();
+        fail("%s: %d channels at %d Hz are no sound", m_file.getDisplayName(), own.channels, own.rate);
+    }
+    const auto choose = [](int wanted, int ownValue) { return wanted > 0 ? wanted : ownValue; };
+    m_delivered = {choose(m_wanted.rate, own.rate), choose(m_wanted.channels, own.channels),
+                   choose(m_wanted.bytesPerSample, own.bytesPerSample)};
+    m_total = CChunkProducer::countDelivered(m_media, m_delivered);
+    return CChunkProducer::canDeliver(own, m_delivered);
+}
+
+void CDecoderSource::requireOpened() const {
+    if (!m_producer) fail("%s is not opened for reading", m_file.getDisplayName());
+}
+
+int64_t CDecoderSource::toFrame(double seconds) const {
+    // Times of frames come back as what they were, in spite of their rounding; others are moved to the next.
+    const double frame = seconds * m_delivered.rate;
+    if (!(frame > 0.0)) return 0;
+    if (frame >= static_cast<double>(m_total)) return m_total;
+    const double nearest = std::nearbyint(frame);
+    return static_cast<int64_t>(std::fabs(frame - nearest) < 1e-3 ? nearest : std::ceil(frame));
+}
+
+void CDecoderSource::restartAt(int64_t frame) {
+    m_readAhead.reset();
+    m_producer->setOrigin(toFrame(m_startTime));
+    m_producer->seek(frame);
+    m_delivering = frame;
+}
+
+} // namespace sonora2::plugins

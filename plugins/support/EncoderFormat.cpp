@@ -1,0 +1,96 @@
+#include "support/EncoderFormat.h"
+
+#include <algorithm>
+#include <cmath>
+#include <utility>
+
+namespace sonora2::plugins {
+
+CEncoderFormat::CEncoderFormat(const P<peru::IString>& pluginName, const SMediaFile& file,
+                               EncoderFactory makeEncoder, const SPcmFormat& format)
+    : m_pluginName(pluginName), m_file(file), m_makeEncoder(makeEncoder), m_estimator(makeEncoder(file)) {
+    m_settings.format = format;
+}
+
+CEncoderFormat::~CEncoderFormat() {
+    try {
+        CEncoderFormat::close();
+    } catch (...) {
+        // Who wants to know calls close().
+    }
+}
+
+void CEncoderFormat::open() {
+    if (isOpened()) return;
+    auto output = std::make_unique<COutputFile>(m_file);
+    auto encoder = m_makeEncoder(m_file);
+    try {
+        encoder->open(*output, m_settings);
+        output->commit();
+    } catch (...) {
+        encoder.reset();
+        output->discard();
+        throw;
+    }
+    m_output = std::move(output);
+    m_encoder = std::move(encoder);
+    m_failed = false;
+}
+
+void CEncoderFormat::close() {
+    const std::unique_ptr<COutputFile> output = std::move(m_output);
+    const std::unique_ptr<IEncoder> encoder = std::move(m_encoder);
+    // A failed write has been told, and what lies behind it cannot be completed.
+    if (!output || m_failed) return;
+    encoder->finish();
+    output->close();
+}
+
+int64_t CEncoderFormat::getEstimatedSizeBytes(double fDuration) {
+    if (!(fDuration > 0.0)) fDuration = 0.0;
+    return m_estimator->estimateBytes(fDuration, m_settings);
+}
+
+void CEncoderFormat::setAudioQuality(double fQuality) {
+    requireClosed("the quality");
+    if (std::isnan(fQuality)) fail("the quality for %s is not a number", m_file.getDisplayName());
+    m_settings.quality = std::clamp(fQuality, 0.0, 1.0);
+}
+
+void CEncoderFormat::setAudioBitRate(int nNominal, int nMin, int nMax) {
+    requireClosed("the bit rate");
+    if (nNominal < 0 || nMin < 0 || nMax < 0 || (nMax > 0 && (nMin > nMax || nNominal > nMax)) ||
+        (nNominal > 0 && nMin > nNominal))
+        fail("the bit rates %d (at least %d, at most %d) for %s contradict each other", nNominal, nMin, nMax,
+             m_file.getDisplayName());
+    m_settings.nominalBitRate = nNominal;
+    m_settings.minBitRate = nMin;
+    m_settings.maxBitRate = nMax;
+}
+
+void CEncoderFormat::writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) {
+    if (!isOpened()) fail("%s is not opened for writing", m_file.getDisplayName());
+    if (m_failed) {
+        m_output->throwFailure();
+        fail("%s cannot be written on after a failure", m_file.getDisplayName());
+    }
+    if (!pAudioChunk || pAudioChunk->getSize() == 0) return;
+    const uint32_t frameBytes = static_cast<uint32_t>(m_settings.format.frameBytes());
+    const uint32_t size = pAudioChunk->getSize();
+    if (size % frameBytes != 0)
+        fail("%d bytes of audio for %s are not whole frames of %d bytes", size, m_file.getDisplayName(),
+             frameBytes);
+    try {
+        m_encoder->write(pAudioChunk->getData(), static_cast<int>(size / frameBytes));
+        m_output->throwFailure();
+    } catch (...) {
+        m_failed = true;
+        throw;
+    }
+}
+
+void CEncoderFormat::requireClosed(const char* what) const {
+    if (m_output) fail("%s cannot be changed while %s is being written", what, m_file.getDisplayName());
+}
+
+} // namespace sonora2::plugins

@@ -1,0 +1,110 @@
+#include "support/ReadAhead.h"
+
+#include <algorithm>
+#include <exception>
+#include <utility>
+
+namespace sonora2::plugins {
+
+CReadAhead::CReadAhead(CChunkProducer& producer, size_t limit)
+    : m_producer(producer), m_limit(std::max<size_t>(limit, 2)) {}
+
+CReadAhead::~CReadAhead() {
+    if (!m_thread) return;
+    {
+        std::lock_guard lock(m_mutex);
+        m_stopping = true;
+    }
+    m_drained.notify_one();
+    m_thread->wait();
+}
+
+P<audio::IAudioChunk> CReadAhead::next() {
+    if (!m_thread) {
+        // Nobody else is here yet. When the system has no thread to give, decoding goes on in place.
+        P<audio::IAudioChunk> chunk;
+        if (!m_ended && produce(chunk, m_error))
+            startThread();
+        else
+            m_ended = true;
+        if (!chunk && m_error) std::exchange(m_error, nullptr)->raise();
+        return chunk;
+    }
+    P<audio::IAudioChunk> chunk;
+    P<peru::CException> error;
+    bool drained = false;
+    {
+        std::unique_lock lock(m_mutex);
+        m_filled.wait(lock, [this] { return !m_chunks.empty() || m_ended; });
+        if (m_chunks.empty()) {
+            error = std::exchange(m_error, nullptr);
+        } else {
+            chunk = std::move(m_chunks.front());
+            m_chunks.pop_front();
+            drained = m_chunks.size() == m_limit / 2;
+        }
+    }
+    // Woken at half of the queue, the thread decodes several chunks a turn.
+    if (drained) m_drained.notify_one();
+    if (error) error->raise();
+    return chunk;
+}
+
+bool CReadAhead::isEnded() const {
+    std::lock_guard lock(m_mutex);
+    return m_ended && m_chunks.empty() && !m_error;
+}
+
+int CReadAhead::getFill() const {
+    std::lock_guard lock(m_mutex);
+    return m_ended ? 100 : static_cast<int>(100 * std::min(m_chunks.size(), m_limit) / m_limit);
+}
+
+void CReadAhead::startThread() {
+    try {
+        peru::SThreadBody body;
+        body.function = &CReadAhead::runThread;
+        body.argument = this;
+        m_thread = peru::getThreadManager()->createThread(body);
+    } catch (const peru::CException&) {
+        m_thread.reset();
+    }
+}
+
+void CReadAhead::runThread(peru::IBase*, void* argument) {
+    static_cast<CReadAhead*>(argument)->run();
+}
+
+void CReadAhead::run() {
+    for (bool more = true; more;) {
+        P<audio::IAudioChunk> chunk;
+        P<peru::CException> error;
+        more = produce(chunk, error);
+        std::unique_lock lock(m_mutex);
+        if (chunk) m_chunks.push_back(std::move(chunk));
+        if (!more) {
+            m_error = std::move(error);
+            m_ended = true;
+        }
+        m_filled.notify_one();
+        if (more && m_chunks.size() >= m_limit)
+            m_drained.wait(lock, [this] { return m_stopping || m_chunks.size() <= m_limit / 2; });
+        if (m_stopping) return;
+    }
+}
+
+bool CReadAhead::produce(P<audio::IAudioChunk>& chunk, P<peru::CException>& error) noexcept {
+    try {
+        chunk = m_producer.next();
+        return static_cast<bool>(chunk);
+    } catch (const peru::CException& thrown) {
+        error = thrown.clone();
+    } catch (const std::exception& thrown) {
+        error = common::CSonoraError(thrown.what()).clone();
+    } catch (...) {
+        error = common::CSonoraError("unknown exception").clone();
+    }
+    return false;
+}
+
+} // namespace sonora2::plugins
