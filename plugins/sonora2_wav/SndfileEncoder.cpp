@@ -1,0 +1,145 @@
+#include "sonora2_wav/SndfileEncoder.h"
+
+#include "support/Pcm.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <cstdio>
+
+namespace sonora2::plugins::wav {
+
+namespace {
+
+constexpr int64_t kFourGiB = int64_t{1} << 32;
+
+sf_count_t getLength(void* file) {
+    return static_cast<COutputFile*>(file)->getSize();
+}
+
+sf_count_t seekTo(sf_count_t offset, int whence, void* context) {
+    COutputFile* file = static_cast<COutputFile*>(context);
+    const int64_t base = whence == SEEK_SET ? 0 : whence == SEEK_CUR ? file->tell() : file->getSize();
+    file->trySeek(base + offset);
+    return file->tell();
+}
+
+sf_count_t readNothing(void*, sf_count_t, void*) {
+    return 0; // the file is only written
+}
+
+sf_count_t writeBytes(const void* data, sf_count_t size, void* file) {
+    return static_cast<COutputFile*>(file)->tryWrite(data, static_cast<size_t>(size)) ? size : 0;
+}
+
+sf_count_t getPosition(void* file) {
+    return static_cast<COutputFile*>(file)->tell();
+}
+
+} // namespace
+
+// A row per extension. The header is what the library puts around the samples when nothing but samples is
+// written; sizes are rounded up to `alignment`.
+struct CSndfileEncoder::SContainer {
+    const char* extension;
+    int format;
+    bool signed8;
+    bool below4GiB; // the sizes in its header have 32 bits
+    int headerBytes;
+    int alignment;
+};
+
+const CSndfileEncoder::SContainer& CSndfileEncoder::findContainer(const std::string& extension) {
+    static constexpr std::array<SContainer, 8> kContainers{{
+        {"aif", SF_FORMAT_AIFF, true, true, 54, 2},
+        {"aiff", SF_FORMAT_AIFF, true, true, 54, 2},
+        {"aifc", SF_FORMAT_AIFF | SF_ENDIAN_LITTLE, true, true, 54, 2},
+        {"au", SF_FORMAT_AU, true, true, 24, 1},
+        {"snd", SF_FORMAT_AU, true, true, 24, 1},
+        {"caf", SF_FORMAT_CAF, true, false, 4096, 1},
+        {"w64", SF_FORMAT_W64, false, false, 104, 8},
+        {"rf64", SF_FORMAT_RF64, false, false, 104, 1},
+    }};
+    const auto found = std::ranges::find(kContainers, extension, &SContainer::extension);
+    return found != kContainers.end() ? *found : kContainers.front();
+}
+
+CSndfileEncoder::CSndfileEncoder(const std::string& extension) : m_container(findContainer(extension)) {}
+
+SF_INFO CSndfileEncoder::describe(const SPcmFormat& format) const {
+    constexpr std::array<int, 3> kWidths{SF_FORMAT_PCM_16, SF_FORMAT_PCM_24, SF_FORMAT_PCM_32};
+    SF_INFO info{};
+    info.samplerate = format.rate;
+    info.channels = format.channels;
+    info.format = m_container.format;
+    if (format.bytesPerSample == 1)
+        info.format |= m_container.signed8 ? SF_FORMAT_PCM_S8 : SF_FORMAT_PCM_U8;
+    else
+        info.format |= kWidths[static_cast<size_t>(format.bytesPerSample - 2)];
+    // 8 bit samples have no byte order, and some containers take none for them.
+    if (format.bytesPerSample == 1) info.format &= ~SF_FORMAT_ENDMASK;
+    return info;
+}
+
+bool CSndfileEncoder::accepts(const SPcmFormat& format) const {
+    const SF_INFO info = describe(format);
+    return sf_format_check(&info) != 0;
+}
+
+void CSndfileEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
+    m_file = &file;
+    m_format = settings.format;
+    m_bytes = 0;
+    SF_VIRTUAL_IO io{getLength, seekTo, readNothing, writeBytes, getPosition};
+    SF_INFO info = describe(m_format);
+    m_handle.reset(sf_open_virtual(&io, SFM_WRITE, &info, &file));
+    file.throwFailure();
+    if (!m_handle)
+        fail("could not write %s: %s", file.getFile().getDisplayName(),
+             peru::CString::fromUTF8(sf_strerror(nullptr)));
+    m_swapped = sf_command(m_handle.get(), SFC_RAW_DATA_NEEDS_ENDSWAP, nullptr, 0) == SF_TRUE;
+}
+
+void CSndfileEncoder::write(const uint8_t* pcm, int frames) {
+    const int64_t bytes = int64_t{frames} * m_format.frameBytes();
+    const size_t samples = static_cast<size_t>(frames) * m_format.channels;
+    if (m_container.below4GiB && m_bytes + bytes + m_container.headerBytes >= kFourGiB)
+        fail("%s would grow beyond 4 GiB, which its format cannot hold", m_file->getFile().getDisplayName());
+    SNDFILE* handle = m_handle.get();
+    bool written = false;
+    if (m_format.bytesPerSample == 1 && m_container.signed8) {
+        m_signed8.assign(pcm, pcm + bytes);
+        pcm::flipSign8(m_signed8.data(), m_signed8.size());
+        written = sf_write_raw(handle, m_signed8.data(), bytes) == bytes;
+    } else if (m_format.bytesPerSample == 1 || !m_swapped) {
+        written = sf_write_raw(handle, pcm, bytes) == bytes;
+    } else if (m_format.bytesPerSample == 2) {
+        written = sf_writef_short(handle, reinterpret_cast<const short*>(pcm), frames) == frames;
+    } else if (m_format.bytesPerSample == 4) {
+        written = sf_writef_int(handle, reinterpret_cast<const int*>(pcm), frames) == frames;
+    } else {
+        m_integers.resize(samples);
+        pcm::unpack(pcm, 3, m_integers.data(), samples);
+        for (int32_t& sample : m_integers) sample <<= 8;
+        written = sf_writef_int(handle, m_integers.data(), frames) == frames;
+    }
+    m_bytes += bytes;
+    if (written) return;
+    m_file->throwFailure();
+    fail("could not write %s: %s", m_file->getFile().getDisplayName(),
+         peru::CString::fromUTF8(sf_strerror(handle)));
+}
+
+void CSndfileEncoder::finish() {
+    if (sf_close(m_handle.release()) == 0) return;
+    m_file->throwFailure();
+    fail("could not complete %s", m_file->getFile().getDisplayName());
+}
+
+int64_t CSndfileEncoder::estimateBytes(double seconds, const SEncoderSettings& settings) const {
+    const int64_t samples = std::llround(seconds * settings.format.rate) * settings.format.frameBytes();
+    const int64_t alignment = m_container.alignment;
+    return m_container.headerBytes + (samples + alignment - 1) / alignment * alignment;
+}
+
+} // namespace sonora2::plugins::wav

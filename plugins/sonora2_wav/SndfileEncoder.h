@@ -1,0 +1,38 @@
+// Writes the plain sound containers other than WAV.
+#pragma once
+
+#include "sonora2_wav/SndfileDecoder.h"
+#include "support/Encoder.h"
+
+#include <string>
+
+namespace sonora2::plugins::wav {
+
+class CSndfileEncoder : public IEncoder {
+public:
+    // An extension of AIFF, AIFC, AU, CAF, W64 or RF64.
+    explicit CSndfileEncoder(const std::string& extension);
+
+    bool accepts(const SPcmFormat& format) const override;
+    void open(COutputFile& file, const SEncoderSettings& settings) override;
+    void write(const uint8_t* pcm, int frames) override;
+    void finish() override;
+    int64_t estimateBytes(double seconds, const SEncoderSettings& settings) const override; // exact
+
+private:
+    struct SContainer;
+
+    static const SContainer& findContainer(const std::string& extension);
+    SF_INFO describe(const SPcmFormat& format) const;
+
+    const SContainer& m_container;
+    SPcmFormat m_format;
+    COutputFile* m_file = nullptr;
+    SndfileHandle m_handle;
+    bool m_swapped = false; // the container's byte order is not ours
+    int64_t m_bytes = 0;    // of samples so far
+    std::vector<int32_t> m_integers;
+    std::vector<uint8_t> m_signed8;
+};
+
+} // namespace sonora2::plugins::wav
