@@ -1,0 +1,56 @@
+// Writes FLAC.
+#pragma once
+
+#include "support/Encoder.h"
+
+#include <FLAC/stream_encoder.h>
+
+#include <vector>
+
+namespace sonora2::plugins::flac {
+
+// The quality is the compression level, 0.0 to 1.0 for 0 to 8; the sound is the same at each. Without one it
+// is 5. The file has a seek table, and room for tags, so that setting them later does not move the sound.
+class CFlacEncoder : public IEncoder {
+public:
+    CFlacEncoder();
+    ~CFlacEncoder() override;
+
+    bool accepts(const SPcmFormat& format) const override;
+    void open(COutputFile& file, const SEncoderSettings& settings) override;
+    void write(const uint8_t* pcm, int frames) override;
+    void finish() override;
+    int64_t estimateBytes(double seconds, const SEncoderSettings& settings) const override;
+
+private:
+    struct SDeleter {
+        void operator()(FLAC__StreamEncoder* encoder) const { FLAC__stream_encoder_delete(encoder); }
+    };
+    struct SSeekPoint {
+        int64_t frame;
+        int64_t offset; // bytes behind the first frame's header
+        uint32_t frames;
+    };
+
+    static FLAC__StreamEncoderWriteStatus onWrite(const FLAC__StreamEncoder* encoder, const FLAC__byte data[],
+                                                  size_t size, uint32_t samples, uint32_t frame, void* self);
+    static FLAC__StreamEncoderSeekStatus onSeek(const FLAC__StreamEncoder* encoder, FLAC__uint64 position,
+                                                void* self);
+    static FLAC__StreamEncoderTellStatus onTell(const FLAC__StreamEncoder* encoder, FLAC__uint64* position,
+                                                void* self);
+    void addSeekPoint(int64_t offset, uint32_t frames);
+    void writeSeekTable();
+    [[noreturn]] void failEncoding();
+
+    std::unique_ptr<FLAC__StreamEncoder, SDeleter> m_encoder;
+    COutputFile* m_file = nullptr; // null outside a job: nothing is written then
+    SPcmFormat m_format;
+    std::vector<int32_t> m_planes;
+    std::vector<SSeekPoint> m_seekPoints;
+    int64_t m_seekSpacing = 0;     // frames
+    int64_t m_seekTableStart = -1; // where the points lie in the file
+    int64_t m_soundStart = -1;
+    int64_t m_encoded = 0; // frames
+};
+
+} // namespace sonora2::plugins::flac
