@@ -1,10 +1,10 @@
 #include "peru/GlobalObjFactory.h"
 
 #include "peru/posix/MutexFactory.h"
+#include "peru/posix/ThreadManager.h"
 
 #include <algorithm>
 #include <atomic>
-#include <chrono>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
@@ -55,8 +55,8 @@ CGlobalObjFactory& SGlobalObjFactoryCell::access() {
             construct();
             break;
         }
-        // Not through the thread manager, which is one of the factory's own objects.
-        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        // A manager of our own: the shared one is among the objects that the factory is to hold.
+        make<posix::CThreadManager>()->sleep(1);
     }
     return *factory;
 }

@@ -17,7 +17,7 @@ namespace detail {
 template <class U, class T>
 concept UpcastableTo = std::is_convertible_v<U*, T*>;
 template <class U, class T>
-concept UnrelatedTo = !std::is_convertible_v<U*, T*>;
+concept UnrelatedTo = !std::is_convertible_v<U*, T*> && (std::is_const_v<T> || !std::is_const_v<U>);
 } // namespace detail
 
 // Strong handle, one word, may be empty. A copy costs one atomic increment, a move nothing.

@@ -1,0 +1,231 @@
+#include "peru/Array.h"
+#include "peru/Errors.h"
+#include "peru/FrailArray.h"
+#include "peru/IInterfaceQuery.h"
+
+#include <gtest/gtest.h>
+
+#include <functional>
+#include <thread>
+#include <vector>
+
+namespace peru {
+
+namespace {
+
+class INamed : public virtual IBase {
+public:
+    virtual int getNumber() const = 0;
+};
+
+class IOther : public virtual IBase {};
+
+// Tells of its destruction.
+class CProbe : public CObject, public INamed {
+public:
+    explicit CProbe(int& destructions, std::function<void(CProbe&)> atEnd = {})
+        : m_destructions(destructions), m_atEnd(std::move(atEnd)) {}
+    ~CProbe() override {
+        ++m_destructions;
+        if (m_atEnd) m_atEnd(*this);
+    }
+    int getNumber() const override { return 7; }
+
+private:
+    int& m_destructions;
+    std::function<void(CProbe&)> m_atEnd;
+};
+
+// Stands for others, as a buffered stream stands for the file below it.
+class CRelay : public CObject, public IInterfaceQuery {
+public:
+    SInterfaceQueryResult queryInterface(const std::type_info&) override { return m_answer; }
+    SInterfaceQueryResult m_answer;
+};
+
+class CNamedRelay : public CRelay, public INamed {
+public:
+    explicit CNamedRelay(int number) : m_number(number) {}
+    int getNumber() const override { return m_number; }
+
+private:
+    int m_number;
+};
+
+} // namespace
+
+static_assert(sizeof(P<INamed>) == sizeof(void*) && sizeof(PC<INamed>) == sizeof(void*));
+static_assert(std::is_convertible_v<P<CProbe>, P<INamed>> && !std::is_convertible_v<P<INamed>, P<IOther>>);
+static_assert(std::is_constructible_v<P<IOther>, P<INamed>> && !std::is_convertible_v<INamed*, P<INamed>>);
+static_assert(std::is_convertible_v<P<CProbe>, PC<INamed>> &&
+              !std::is_constructible_v<P<INamed>, PC<INamed>>);
+
+TEST(Handle, DestroysWithTheLastOne) {
+    int destroyed = 0;
+    P<CProbe> first = make<CProbe>(destroyed);
+    P<CProbe>& alias = first;
+    first = alias;
+    P<INamed> second = first;
+    PC<INamed> constant = second;
+    P<IBase> shared = P<IBase>::share(first.get());
+    second = std::move(second);
+    EXPECT_EQ(second->getNumber(), 7);
+    first = nullptr;
+    shared.reset();
+    second = P<INamed>();
+    EXPECT_EQ(destroyed, 0);
+    EXPECT_EQ(constant->getNumber(), 7);
+    PC<INamed> moved = std::move(constant);
+    EXPECT_FALSE(constant);
+    moved = PC<INamed>();
+    EXPECT_EQ(destroyed, 1);
+}
+
+TEST(Handle, MovesOverItsOwnLastOwner) {
+    // The old object holds the handle that the new one comes from.
+    struct CNode : CObject {
+        P<CNode> next;
+    };
+    P<CNode> list = make<CNode>();
+    list->next = make<CNode>();
+    CNode* second = list->next.get();
+    list = std::move(list->next);
+    EXPECT_EQ(list.get(), second);
+}
+
+TEST(Handle, RefusesAnInterfaceThatTheObjectLacks) {
+    int destroyed = 0;
+    {
+        P<IBase> object = make<CProbe>(destroyed);
+        EXPECT_EQ(P<INamed>(object)->getNumber(), 7);
+        EXPECT_FALSE(P<IOther>(P<INamed>()));
+        EXPECT_FALSE(tryCast<IOther>(object));
+        try {
+            P<IOther> other(object);
+            FAIL();
+        } catch (const CCastError& error) {
+            EXPECT_EQ(CString::toStdString(error.getDescription()),
+                      "Error casting a 'peru::(anonymous namespace)::CProbe' object to "
+                      "'peru::(anonymous namespace)::IOther'");
+            EXPECT_EQ(CString::toStdString(error.getTitle()), "Cast error");
+            EXPECT_EQ(error.getObject(), object);
+        }
+        EXPECT_EQ(destroyed, 0);
+    }
+    EXPECT_EQ(destroyed, 1);
+}
+
+TEST(Object, SurvivesReferencesTakenWhileItDies) {
+    int destroyed = 0;
+    make<CProbe>(destroyed, [](CProbe& probe) {
+        for (int i = 0; i < 3; ++i) P<IBase> stray = P<IBase>::share(&probe);
+    });
+    EXPECT_EQ(destroyed, 1);
+}
+
+TEST(Object, CountsFromSeveralThreads) {
+    int destroyed = 0;
+    P<CProbe> probe = make<CProbe>(destroyed);
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 4; ++i)
+        threads.emplace_back([own = probe] {
+            for (int k = 0; k < 20000; ++k) P<INamed> copy = own;
+        });
+    probe.reset();
+    for (std::thread& thread : threads) thread.join();
+    threads.clear();
+    EXPECT_EQ(destroyed, 1);
+}
+
+TEST(Object, IsDescribedByItsDynamicClass) {
+    P<IBase> object = make<CArray>();
+    EXPECT_EQ(CString::toStdString(object->getObjectDesc()), "peru::CArray object");
+}
+
+TEST(Frail, HoldsOnlyWithItsFlag) {
+    int destroyed = 0;
+    P<CProbe> probe = make<CProbe>(destroyed);
+    PFrail<INamed> loose(probe.get(), false);
+    PFrail<INamed> counted(probe.get(), true);
+    EXPECT_EQ(loose, counted);
+    PFrail<INamed> copy = counted;
+    counted = loose;
+    EXPECT_FALSE(counted.isCounted());
+    probe.reset();
+    EXPECT_EQ(destroyed, 0);
+    copy = PFrail<INamed>();
+    EXPECT_EQ(destroyed, 1);
+}
+
+TEST(FrailArray, KeepsItsOrderOverRemovals) {
+    int destroyed = 0;
+    std::vector<P<CProbe>> probes;
+    P<TFrailArray<INamed>> list = make<TFrailArray<INamed>>();
+    for (int i = 0; i < 10; ++i) {
+        probes.push_back(make<CProbe>(destroyed));
+        list->add(probes.back().get());
+    }
+    EXPECT_TRUE(list->remove(probes[3].get()));
+    EXPECT_FALSE(list->remove(probes[3].get()));
+    std::vector<INamed*> left;
+    for (size_t i = 0; list->at(i); ++i) left.push_back(list->at(i));
+    ASSERT_EQ(left.size(), 9u);
+    for (size_t i = 0; i < left.size(); ++i) EXPECT_EQ(left[i], probes[i < 3 ? i : i + 1].get());
+}
+
+TEST(FrailArray, StandsAListenerThatLeavesWhileItDies) {
+    int destroyed = 0;
+    P<TFrailArray<INamed>> list = make<TFrailArray<INamed>>();
+    P<CProbe> second = make<CProbe>(destroyed);
+    P<CProbe> third = make<CProbe>(destroyed);
+    list->addCounted(make<CProbe>(destroyed, [&](CProbe&) { list->remove(second.get()); }));
+    list->add(second.get());
+    list->add(third.get());
+    EXPECT_TRUE(list->remove(list->at(0)));
+    EXPECT_EQ(destroyed, 1);
+    ASSERT_EQ(list->getCount(), 1u);
+    EXPECT_EQ(list->at(0), third.get());
+}
+
+TEST(SimpleArray, GrowsByItsStep) {
+    TSimpleArray<int> array(0, 4);
+    std::vector<size_t> capacities;
+    for (int i = 0; i < 9; ++i) {
+        array.add(i);
+        capacities.push_back(array.getCapacity());
+    }
+    EXPECT_EQ(capacities, (std::vector<size_t>{4, 4, 4, 4, 8, 8, 8, 8, 12}));
+    TSimpleArray<int> stepless(2, 0);
+    for (int i = 0; i < 3; ++i) stepless.add(i);
+    EXPECT_EQ(stepless.getCapacity(), 3u);
+}
+
+TEST(InterfaceCast, AsksDelegateThenObjectThenParts) {
+    auto named = [](int number) { return make<CNamedRelay>(number); };
+    P<CRelay> bottom = make<CRelay>();
+    bottom->m_answer.aggregated = {P<IBase>(), P<IBase>(make<CRelay>()), P<IBase>(named(1)),
+                                   P<IBase>(named(2))};
+    EXPECT_EQ(interfaceCast<INamed>(bottom)->getNumber(), 1);
+
+    P<CNamedRelay> own = named(3);
+    own->m_answer.aggregated = {P<IBase>(named(4))};
+    EXPECT_EQ(interfaceCast<INamed>(own)->getNumber(), 3);
+    own->m_answer.delegate = bottom;
+    EXPECT_EQ(interfaceCast<INamed>(own)->getNumber(), 1);
+
+    EXPECT_FALSE(interfaceCast<IOther>(own));
+    EXPECT_FALSE(interfaceCast<IOther>(nullptr));
+}
+
+TEST(InterfaceCast, EndsInACycle) {
+    P<CRelay> top = make<CRelay>();
+    P<CRelay> bottom = make<CRelay>();
+    top->m_answer.delegate = bottom;
+    bottom->m_answer.delegate = top;
+    bottom->m_answer.aggregated = {P<IBase>(top), P<IBase>(make<CNamedRelay>(5))};
+    EXPECT_FALSE(interfaceCast<IOther>(top));
+    EXPECT_EQ(interfaceCast<INamed>(top)->getNumber(), 5);
+    bottom->m_answer = {};
+}
+
+} // namespace peru
