@@ -19,6 +19,7 @@ target_include_directories(LAME::lame INTERFACE ${LAME_INCLUDE_DIR})
 target_link_libraries(LAME::lame INTERFACE ${LAME_LIBRARY})
 
 find_package(CLI11 REQUIRED)
+find_package(nlohmann_json REQUIRED)
 if(TONEWRIGHT_TESTS)
     find_package(GTest REQUIRED)
 endif()

@@ -1,0 +1,20 @@
+// Ctrl-C.
+#pragma once
+
+namespace host {
+
+// From now on SIGINT and SIGTERM ask for a clean end; a second one ends the program at once.
+void watchForCancel();
+// Any thread.
+bool isCancelled();
+
+// What the program tells its caller.
+enum EExitCode {
+    kExitSuccess = 0,
+    kExitFailure = 1, // at least one file failed
+    kExitUsage = 2,
+    kExitNoLibrary = 4, // the library is missing or cannot be started
+    kExitCancelled = 130,
+};
+
+} // namespace host

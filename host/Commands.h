@@ -1,0 +1,44 @@
+// The commands of the program. Each answers an exit code.
+#pragma once
+
+#include "Library.h"
+#include "Progress.h"
+
+#include <optional>
+
+namespace host {
+
+struct SConvertOptions {
+    std::vector<std::filesystem::path> inputs;
+    std::filesystem::path output;    // of a single input
+    std::string extension;           // or one beside each input
+    std::filesystem::path directory; // ... or in this folder
+    std::optional<int> rate;
+    std::optional<int> channels;
+    std::optional<int> bits;
+    std::optional<double> quality; // 0.0 to 1.0
+    int bitRate = 0;               // bits per second
+    int minBitRate = 0;
+    int maxBitRate = 0;
+    int jobs = 1;
+    bool force = false;
+    EOutput show = EOutput::normal;
+};
+
+struct SWaveformOptions {
+    std::filesystem::path input;
+    std::filesystem::path output;
+    int width = 1200;
+    int height = 300;
+    bool force = false;
+};
+
+int convert(CLibrary& library, const SConvertOptions& options);
+int showInfo(CLibrary& library, const std::vector<std::filesystem::path>& files, bool json);
+int listFormats(CLibrary& library, bool json);
+int drawWaveform(CLibrary& library, const SWaveformOptions& options);
+
+// "tonewright: FILE: REASON" on standard error.
+void printFailure(const std::filesystem::path& file, const std::string& reason);
+
+} // namespace host

@@ -1,0 +1,204 @@
+#include "AudioFile.h"
+#include "Cancel.h"
+#include "Commands.h"
+#include "HostLog.h"
+#include "Text.h"
+
+#include <algorithm>
+#include <atomic>
+#include <set>
+#include <stdexcept>
+#include <thread>
+#include <unistd.h>
+
+namespace host {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+// The callback has no word of its own for the caller, but it is called on the thread that encodes.
+struct SRunning {
+    CProgress* progress;
+    CProgress::Job job;
+    bool stopped = false;
+};
+thread_local SRunning* t_running = nullptr;
+
+bool onProgress(double fraction, int32_t) {
+    t_running->progress->advance(t_running->job, std::clamp(fraction, 0.0, 1.0));
+    t_running->stopped = isCancelled();
+    return !t_running->stopped;
+}
+
+std::string reasonOr(const std::string& otherwise) {
+    std::string reason = CHostLog::takeReason();
+    return reason.empty() ? otherwise : reason;
+}
+
+// Messages name the file that the user knows.
+std::string withoutTemporary(std::string reason, const COutputPlace& place, const fs::path& output) {
+    const std::string& temporary = place.getTemporary().native();
+    for (const std::string& shown : {fs::absolute(temporary).native(), temporary})
+        if (const size_t at = reason.find(shown); at != std::string::npos)
+            reason.replace(at, shown.size(), output.native());
+    return reason;
+}
+
+class CConverter {
+public:
+    CConverter(CLibrary& library, const SConvertOptions& options, CProgress& progress)
+        : m_library(library), m_options(options), m_progress(progress),
+          m_temporaryEnding(".part" + std::to_string(::getpid())) {
+        m_library.SetTempExtension(
+            std::u16string(m_temporaryEnding.begin(), m_temporaryEnding.end()).c_str());
+    }
+
+    // True when the file was made. Any thread.
+    bool run(const fs::path& input, const fs::path& output);
+
+private:
+    struct SEnds {
+        CHandle source;
+        CHandle format;
+        SSampleFormat samples;
+    };
+
+    void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
+    SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
+    std::vector<SSampleFormat> listCandidates(const SSampleFormat& own) const;
+
+    CLibrary& m_library;
+    const SConvertOptions& m_options;
+    CProgress& m_progress;
+    std::string m_temporaryEnding;
+};
+
+// The wanted format first, then what most targets can hold. What the user asked for is never given up.
+std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) const {
+    std::vector<SSampleFormat> candidates;
+    const auto add = [&](int rate, int channels, int bytes) {
+        const SSampleFormat candidate{m_options.rate.value_or(rate), m_options.channels.value_or(channels),
+                                      m_options.bits ? *m_options.bits / 8 : bytes};
+        if (std::find(candidates.begin(), candidates.end(), candidate) == candidates.end())
+            candidates.push_back(candidate);
+    };
+    // The next rate that a limited codec may take: upwards before downwards.
+    std::vector<int> rates{own.rate};
+    for (int rate : {8000, 11025, 16000, 22050, 32000, 44100, 48000})
+        if (rate > own.rate) rates.push_back(rate);
+    if (rates.size() == 1) rates.push_back(own.rate % 11025 == 0 ? 44100 : 48000);
+    for (int rate : rates)
+        for (int channels : {own.channels, 2, 1})
+            for (int bytes : {own.bytesPerSample, 2})
+                if (channels <= own.channels) add(rate, channels, bytes);
+    // Whatever is converted comes out with 16 bits (or 8).
+    const bool wide = m_options.bits && *m_options.bits > 16;
+    std::erase_if(candidates, [&](const SSampleFormat& candidate) {
+        return !wide && candidate != own && candidate.bytesPerSample > 2;
+    });
+    return candidates;
+}
+
+CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& temporary,
+                                       const fs::path& output) {
+    const std::u16string inputURI = toURI(input), outputURI = toURI(temporary);
+    const double quality = m_options.quality ? std::max(*m_options.quality, 1e-9) : 0.0; // 0.0 means unset
+    bool isWritable = false;
+    for (const SSampleFormat& samples : listCandidates(readSampleFormat(input))) {
+        CHostLog::takeReason();
+        CHandle format(m_library.CreateAudioFormatFromURI(outputURI.c_str(), samples.rate, samples.channels,
+                                                          samples.bytesPerSample, quality, m_options.bitRate,
+                                                          m_options.minBitRate, m_options.maxBitRate));
+        if (!format) continue;
+        isWritable = true;
+        CHandle source(m_library.CreateAudioSourceFromURI(inputURI.c_str(), samples.rate, samples.channels,
+                                                          samples.bytesPerSample, 1));
+        if (source) return {std::move(source), std::move(format), samples};
+        // A file that cannot be read at all is not tried in every other shape.
+        if (std::string reason = CHostLog::takeReason(); !reason.empty()) throw std::runtime_error(reason);
+    }
+    if (isWritable) throw std::runtime_error("No plug-in reads this file in the wanted format");
+    throw std::runtime_error("No plug-in writes " + output.filename().string() + " in the wanted format");
+}
+
+void CConverter::convert(const fs::path& input, const fs::path& output, CProgress::Job job) {
+    const auto started = std::chrono::steady_clock::now();
+    checkInput(input);
+    if (isSameFile(input, output)) throw std::runtime_error("Input and output are the same file");
+    COutputPlace place(output, m_temporaryEnding, m_options.force);
+
+    SEnds ends = openEnds(input, place.getTemporary(), output);
+    const double duration = m_library.AudioSource_GetDuration(ends.source.get());
+    CHandle encoder(m_library.CreateAudioEncoder(ends.source.get(), ends.format.get()));
+    SRunning running{&m_progress, job};
+    t_running = &running;
+    m_library.AudioEncoder_SetCallback(encoder.get(), onProgress);
+    const int32_t result = m_library.AudioEncoder_Encode(encoder.get());
+    t_running = nullptr;
+    encoder.reset();
+    ends = {};
+
+    if (running.stopped) return m_progress.cancel(job);
+    if (result != TONEWRIGHT_OK)
+        throw std::runtime_error(withoutTemporary(reasonOr("The conversion failed"), place, output));
+    const uint64_t bytes = fs::file_size(place.getTemporary());
+    place.commit();
+    const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
+    m_progress.finish(job, {duration, elapsed.count(), bytes, codecName(output)});
+}
+
+bool CConverter::run(const fs::path& input, const fs::path& output) {
+    const CProgress::Job job = m_progress.start(input, output, nlohmann::json::object());
+    try {
+        convert(input, output, job);
+        return !isCancelled();
+    } catch (const std::exception& error) {
+        m_progress.fail(job, error.what());
+        return false;
+    }
+}
+
+fs::path chooseOutput(const SConvertOptions& options, const fs::path& input) {
+    if (!options.output.empty()) return options.output;
+    fs::path name = input.filename();
+    name.replace_extension(options.extension);
+    return (options.directory.empty() ? input.parent_path() : options.directory) / name;
+}
+
+} // namespace
+
+int convert(CLibrary& library, const SConvertOptions& options) {
+    CProgress progress(options.show);
+    CConverter converter(library, options, progress);
+
+    std::atomic<size_t> next{0};
+    std::atomic<bool> failed{false};
+    std::set<fs::path> outputs;
+    std::mutex mutex; // guards outputs
+    const auto work = [&] {
+        for (size_t i; !isCancelled() && (i = next++) < options.inputs.size();) {
+            const fs::path output = chooseOutput(options, options.inputs[i]);
+            bool isFirst = false;
+            {
+                std::lock_guard lock(mutex);
+                isFirst = outputs.insert(fs::absolute(output).lexically_normal()).second;
+            }
+            if (!isFirst) {
+                progress.fail(progress.start(options.inputs[i], output, nlohmann::json::object()),
+                              "Another input is converted to " + output.string() + " already");
+                failed = true;
+            } else if (!converter.run(options.inputs[i], output)) {
+                failed = true;
+            }
+        }
+    };
+    std::vector<std::thread> others;
+    const size_t threads = std::min<size_t>(static_cast<size_t>(options.jobs), options.inputs.size());
+    for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
+    work();
+    for (std::thread& thread : others) thread.join();
+    return isCancelled() ? kExitCancelled : failed ? kExitFailure : kExitSuccess;
+}
+
+} // namespace host

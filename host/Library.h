@@ -1,0 +1,69 @@
+// The library's functions, loaded at run time.
+#pragma once
+
+#include <tonewright/tonewright.h>
+
+namespace host {
+
+// Named as they are exported, without the prefix.
+#define HOST_FUNCTIONS(X)                                                                                    \
+    X(InitStartup)                                                                                           \
+    X(DeInitAll)                                                                                             \
+    X(SetTempExtension)                                                                                      \
+    X(AddProxyLogManager)                                                                                    \
+    X(RemoveProxyLogManager)                                                                                 \
+    X(getValidCodecExtensions)                                                                               \
+    X(getExtensionCount)                                                                                     \
+    X(getExtension)                                                                                          \
+    X(CreateAudioSourceFromURI)                                                                              \
+    X(AudioSource_GetDuration)                                                                               \
+    X(AudioSource_FetchStreamSamples)                                                                        \
+    X(CreateAudioFormatFromURI)                                                                              \
+    X(CreateAudioEncoder)                                                                                    \
+    X(AudioEncoder_Encode)                                                                                   \
+    X(AudioEncoder_SetCallback)
+
+// Started by the constructor, ended by the destructor; one at a time.
+class CLibrary {
+public:
+    // Takes $TONEWRIGHT_LIBRARY where that is set, else the library this program was built or installed
+    // with. Throws std::runtime_error with the loader's reason.
+    CLibrary();
+    ~CLibrary();
+    CLibrary(const CLibrary&) = delete;
+    CLibrary& operator=(const CLibrary&) = delete;
+
+#define HOST_DECLARE(name) decltype(&::TONEWRIGHT_##name) name = nullptr;
+    HOST_FUNCTIONS(HOST_DECLARE)
+#undef HOST_DECLARE
+
+private:
+    void* m_module = nullptr;
+};
+
+// Ends its handle.
+class CHandle {
+public:
+    CHandle() = default;
+    explicit CHandle(TONEWRIGHT_Handle handle) : m_handle(handle) {}
+    CHandle(CHandle&& other) noexcept : m_handle(other.m_handle) { other.m_handle = nullptr; }
+    CHandle& operator=(CHandle&& other) noexcept {
+        TONEWRIGHT_Handle handle = other.m_handle;
+        other.m_handle = nullptr;
+        reset(handle);
+        return *this;
+    }
+    ~CHandle() { reset(); }
+
+    void reset(TONEWRIGHT_Handle handle = nullptr) {
+        TONEWRIGHT_DestroyHandle(m_handle);
+        m_handle = handle;
+    }
+    TONEWRIGHT_Handle get() const { return m_handle; }
+    explicit operator bool() const { return m_handle != nullptr; }
+
+private:
+    TONEWRIGHT_Handle m_handle = nullptr;
+};
+
+} // namespace host

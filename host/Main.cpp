@@ -1,0 +1,140 @@
+// tonewright: converts sound files, tells about them and draws them.
+#include "Cancel.h"
+#include "Commands.h"
+#include "HostLog.h"
+
+#include <CLI/CLI.hpp>
+#include <cstdio>
+#include <functional>
+#include <limits>
+#include <thread>
+
+namespace {
+
+using namespace host;
+
+const std::map<std::string, int32_t> kLogLevels{
+    {"trace", peru::kLogTrace},     {"debug", peru::kLogDebug},
+    {"info", peru::kLogInfo},       {"warning", peru::kLogWarning},
+    {"error", peru::kLogException}, {"off", std::numeric_limits<int32_t>::max()}};
+
+using Run = std::function<int(CLibrary&)>;
+
+void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
+    CLI::App* command = app.add_subcommand(
+        "convert", "Convert sound files. Rate, channels and width stay those of the input unless told\n"
+                   "otherwise or the target cannot hold them. Nothing is replaced without --force;\n"
+                   "a file that fails is told and the next one goes on.");
+    command->add_option("IN", options.inputs, "Files to convert")->required();
+    auto* output = command->add_option("-o,--output", options.output,
+                                       "File to write; its extension selects the format (one input only)");
+    auto* to = command->add_option("--to", options.extension,
+                                   "Extension of the files to write, such as flac, beside the inputs");
+    output->excludes(to);
+    command->add_option("--directory", options.directory, "Folder for the files of --to")
+        ->needs(to)
+        ->check(CLI::ExistingDirectory);
+    command->add_option("--rate", options.rate, "Sample rate in Hz")->check(CLI::Range(1, 768000));
+    command->add_option("--channels", options.channels, "Number of channels")->check(CLI::Range(1, 32));
+    command->add_option("--bits", options.bits, "Bits per sample")->check(CLI::IsMember({8, 16, 24, 32}));
+    command
+        ->add_option("--quality", options.quality,
+                     "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression")
+        ->check(CLI::Range(0.0, 1.0));
+    const auto units = CLI::AsNumberWithUnit(std::map<std::string, int>{{"k", 1000}},
+                                             CLI::AsNumberWithUnit::CASE_INSENSITIVE);
+    auto* bitRate =
+        command->add_option("--bitrate", options.bitRate, "Bits per second, such as 192k")->transform(units);
+    command->add_option("--min-bitrate", options.minBitRate, "Least bits per second")
+        ->transform(units)
+        ->needs(bitRate);
+    command->add_option("--max-bitrate", options.maxBitRate, "Most bits per second")
+        ->transform(units)
+        ->needs(bitRate);
+    options.jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
+    command->add_option("-j,--jobs", options.jobs, "Files at a time")
+        ->capture_default_str()
+        ->check(CLI::Range(1, 256));
+    command->add_flag("-f,--force", options.force, "Replace existing files");
+    auto* json = command->add_flag_callback(
+        "--json", [&] { options.show = EOutput::json; }, "Events as JSON, one a line");
+    command
+        ->add_flag_callback(
+            "-q,--quiet", [&] { options.show = EOutput::quiet; }, "Tell failures only")
+        ->excludes(json);
+    command->callback([&, command] {
+        if (options.output.empty() == options.extension.empty())
+            throw CLI::RequiredError("Either --output or --to");
+        if (!options.output.empty() && options.inputs.size() != 1)
+            throw CLI::ValidationError("--output", "takes one input; use --to for several");
+        run = [&](CLibrary& library) { return convert(library, options); };
+    });
+}
+
+void addInfo(CLI::App& app, std::vector<std::filesystem::path>& files, bool& json, Run& run) {
+    CLI::App* command = app.add_subcommand("info", "Tell duration, rate, channels and width of sound files.");
+    command->add_option("FILE", files, "Files to look at")->required();
+    command->add_flag("--json", json, "One JSON object a line");
+    command->callback([&] { run = [&](CLibrary& library) { return showInfo(library, files, json); }; });
+}
+
+void addFormats(CLI::App& app, bool& json, Run& run) {
+    CLI::App* command = app.add_subcommand("formats", "List the file extensions that can be read.");
+    command->add_flag("--json", json, "One JSON object");
+    command->callback([&] { run = [&](CLibrary& library) { return listFormats(library, json); }; });
+}
+
+void addWaveform(CLI::App& app, SWaveformOptions& options, Run& run) {
+    CLI::App* command = app.add_subcommand(
+        "waveform", "Draw a sound file as a PNG picture: peaks and, darker, their root mean square.");
+    command->add_option("IN", options.input, "File to draw")->required();
+    command->add_option("-o,--output", options.output, "PNG file to write")->required();
+    command->add_option("--width", options.width, "Width in pixels")
+        ->capture_default_str()
+        ->check(CLI::Range(16, 32767));
+    command->add_option("--height", options.height, "Height in pixels")
+        ->capture_default_str()
+        ->check(CLI::Range(16, 32767));
+    command->add_flag("-f,--force", options.force, "Replace an existing file");
+    command->callback([&] { run = [&](CLibrary& library) { return drawWaveform(library, options); }; });
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    CLI::App app("Converts sound files, tells about them and draws them.", "tonewright");
+    app.set_version_flag("--version", "tonewright " TONEWRIGHT_VERSION);
+    app.require_subcommand(1);
+    app.get_formatter()->column_width(28);
+    int32_t printLevel = std::numeric_limits<int32_t>::max();
+    app.add_option("--log-level", printLevel,
+                   "Print the library's log from this level on: trace, debug, info, warning, error or off")
+        ->transform(CLI::CheckedTransformer(kLogLevels, CLI::ignore_case).description(""));
+    app.footer("Exit codes: 0 all well, 1 a file failed, 2 wrong arguments, 4 the library is missing, 130 "
+               "stopped by Ctrl-C.");
+
+    SConvertOptions convertOptions;
+    SWaveformOptions waveformOptions;
+    std::vector<std::filesystem::path> infoFiles;
+    bool json = false;
+    Run run;
+    addConvert(app, convertOptions, run);
+    addInfo(app, infoFiles, json, run);
+    addFormats(app, json, run);
+    addWaveform(app, waveformOptions, run);
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError& error) {
+        return app.exit(error) == 0 ? kExitSuccess : kExitUsage;
+    }
+
+    try {
+        watchForCancel();
+        CLibrary library;
+        CHostLog log(library, printLevel);
+        return run(library);
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "tonewright: %s\n", error.what());
+        return kExitNoLibrary;
+    }
+}

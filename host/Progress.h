@@ -1,0 +1,69 @@
+// What a user sees of running jobs.
+#pragma once
+
+#include <chrono>
+#include <filesystem>
+#include <mutex>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <vector>
+
+namespace host {
+
+enum class EOutput {
+    normal, // bars on a terminal, else plain lines
+    quiet,  // failures only
+    json,   // one event a line on standard output
+};
+
+struct SJobResult {
+    double duration = 0; // seconds of sound
+    double elapsed = 0;  // seconds it took
+    uint64_t bytes = 0;
+    std::string codec;
+};
+
+// Any thread. Bars go to standard error, results to standard output, failures to standard error; with JSON
+// everything goes to standard output.
+class CProgress {
+public:
+    explicit CProgress(EOutput output);
+    ~CProgress();
+
+    using Job = size_t;
+    Job start(const std::filesystem::path& input, const std::filesystem::path& output,
+              const nlohmann::json& details);
+    void advance(Job job, double fraction);
+    void finish(Job job, const SJobResult& result);
+    void fail(Job job, const std::string& reason);
+    void cancel(Job job);
+
+private:
+    using Clock = std::chrono::steady_clock;
+
+    struct SJob {
+        std::filesystem::path input;
+        std::filesystem::path output;
+        double fraction = 0;
+        Clock::time_point started;
+        Clock::time_point told;
+        bool running = true;
+    };
+
+    void emit(Job job, const char* event, nlohmann::json details);
+    void eraseBars();
+    void drawBars();
+    std::string drawBar(const SJob& job, size_t width) const;
+
+    EOutput m_output;
+    bool m_bars;
+    std::mutex m_mutex; // guards all below and both streams
+    std::vector<SJob> m_jobs;
+    size_t m_drawn = 0; // lines of bars on the screen
+    Clock::time_point m_lastDrawn;
+};
+
+// Names need not be valid UTF-8: what is not becomes U+FFFD.
+std::string toLine(const nlohmann::json& value);
+
+} // namespace host

@@ -1,0 +1,133 @@
+#include "Text.h"
+
+#include <array>
+#include <cctype>
+#include <cstdio>
+
+namespace host {
+
+namespace {
+
+bool isPlain(unsigned char c) {
+    return std::isalnum(c) || std::string_view("/-_.~").find(static_cast<char>(c)) != std::string_view::npos;
+}
+
+int hexDigit(char c) {
+    if (c >= '0' && c <= '9') return c - '0';
+    if (c >= 'A' && c <= 'F') return c - 'A' + 10;
+    if (c >= 'a' && c <= 'f') return c - 'a' + 10;
+    return -1;
+}
+
+void appendUTF8(std::string& text, char32_t c) {
+    if (c < 0x80) {
+        text += static_cast<char>(c);
+    } else if (c < 0x800) {
+        text += static_cast<char>(0xC0 | c >> 6);
+        text += static_cast<char>(0x80 | (c & 0x3F));
+    } else if (c < 0x10000) {
+        text += static_cast<char>(0xE0 | c >> 12);
+        text += static_cast<char>(0x80 | (c >> 6 & 0x3F));
+        text += static_cast<char>(0x80 | (c & 0x3F));
+    } else {
+        text += static_cast<char>(0xF0 | c >> 18);
+        text += static_cast<char>(0x80 | (c >> 12 & 0x3F));
+        text += static_cast<char>(0x80 | (c >> 6 & 0x3F));
+        text += static_cast<char>(0x80 | (c & 0x3F));
+    }
+}
+
+} // namespace
+
+std::u16string toURI(const std::filesystem::path& path) {
+    static constexpr char kDigits[] = "0123456789ABCDEF";
+    std::u16string uri = u"file://";
+    for (unsigned char c : std::filesystem::absolute(path).native()) {
+        if (isPlain(c)) {
+            uri += static_cast<char16_t>(c);
+            continue;
+        }
+        uri += u'%';
+        uri += static_cast<char16_t>(kDigits[c >> 4]);
+        uri += static_cast<char16_t>(kDigits[c & 15]);
+    }
+    return uri;
+}
+
+std::string toUTF8(std::u16string_view text) {
+    std::string result;
+    result.reserve(text.size());
+    for (size_t i = 0; i < text.size(); ++i) {
+        char32_t c = text[i];
+        if (c >= 0xD800 && c < 0xE000) {
+            const bool paired =
+                c < 0xDC00 && i + 1 < text.size() && text[i + 1] >= 0xDC00 && text[i + 1] < 0xE000;
+            c = paired ? 0x10000 + ((c - 0xD800) << 10) + (text[++i] - 0xDC00) : 0xFFFD;
+        }
+        appendUTF8(result, c);
+    }
+    return result;
+}
+
+std::string toPrintable(std::string_view text) {
+    std::string result;
+    for (unsigned char c : text) {
+        if (c >= 0x20 && c != 0x7F) {
+            result += static_cast<char>(c);
+            continue;
+        }
+        std::array<char, 8> escaped;
+        std::snprintf(escaped.data(), escaped.size(), "\\x%02x", c);
+        result += escaped.data();
+    }
+    return result;
+}
+
+std::string withPaths(std::string_view message) {
+    static constexpr std::string_view kScheme = "file:///";
+    std::string result;
+    while (!message.empty()) {
+        const size_t start = message.find(kScheme);
+        result += message.substr(0, start);
+        if (start == std::string_view::npos) break;
+        message.remove_prefix(start + kScheme.size() - 1); // keeps the path's slash
+        while (!message.empty() &&
+               (isPlain(static_cast<unsigned char>(message[0])) ||
+                std::string_view("%:@&=+$,;!*'()").find(message[0]) != std::string_view::npos)) {
+            const bool escaped = message[0] == '%' && message.size() > 2 && hexDigit(message[1]) >= 0 &&
+                                 hexDigit(message[2]) >= 0;
+            // A quote, a colon or a bracket behind the name belongs to the sentence.
+            if (!escaped && std::string_view("':,;)").find(message[0]) != std::string_view::npos &&
+                (message.size() == 1 || !isPlain(static_cast<unsigned char>(message[1]))))
+                break;
+            result +=
+                escaped ? static_cast<char>(hexDigit(message[1]) << 4 | hexDigit(message[2])) : message[0];
+            message.remove_prefix(escaped ? 3 : 1);
+        }
+    }
+    return result;
+}
+
+std::string formatDuration(double seconds) {
+    const long long tenths = static_cast<long long>(seconds * 10 + 0.5);
+    std::array<char, 48> text;
+    if (tenths >= 36000)
+        std::snprintf(text.data(), text.size(), "%lld:%02lld:%02lld.%lld", tenths / 36000, tenths / 600 % 60,
+                      tenths / 10 % 60, tenths % 10);
+    else
+        std::snprintf(text.data(), text.size(), "%lld:%02lld.%lld", tenths / 600, tenths / 10 % 60,
+                      tenths % 10);
+    return text.data();
+}
+
+std::string formatSize(uint64_t bytes) {
+    static constexpr const char* kUnits[] = {"B", "kB", "MB", "GB", "TB"};
+    double value = static_cast<double>(bytes);
+    size_t unit = 0;
+    for (; value >= 1000 && unit + 1 < std::size(kUnits); ++unit) value /= 1000;
+    std::array<char, 32> text;
+    std::snprintf(text.data(), text.size(), unit == 0 ? "%.0f %s" : "%.1f %s", value, kUnits[unit]);
+    return text.data();
+}
+
+} // namespace host

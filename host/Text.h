@@ -1,0 +1,23 @@
+// Texts across the boundary.
+#pragma once
+
+#include <filesystem>
+#include <string>
+#include <string_view>
+
+namespace host {
+
+// The "file:" URI of a path, relative ones from the current folder. Every byte that is not plain ASCII in a
+// name is escaped, so that names need not be valid UTF-8.
+std::u16string toURI(const std::filesystem::path& path);
+// Unpaired surrogates become U+FFFD.
+std::string toUTF8(std::u16string_view text);
+// For a line on a terminal: control characters are shown as \xNN.
+std::string toPrintable(std::string_view text);
+// "file:" URIs within a message as the paths they stand for.
+std::string withPaths(std::string_view message);
+
+std::string formatDuration(double seconds); // 1:02:03.4
+std::string formatSize(uint64_t bytes);     // 1.2 MB
+
+} // namespace host

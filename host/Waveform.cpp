@@ -1,0 +1,161 @@
+#include "AudioFile.h"
+#include "Cancel.h"
+#include "Commands.h"
+#include "HostLog.h"
+#include "Text.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <memory>
+#include <png.h>
+#include <stdexcept>
+#include <unistd.h>
+
+namespace host {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+struct SColour {
+    uint8_t red, green, blue;
+};
+constexpr SColour kBackground{255, 255, 255}, kAxis{200, 205, 212}, kPeak{116, 160, 214},
+    kLoudness{33, 84, 150};
+
+// Steps for each column of the picture; the library delivers them in blocks of a hundred, and drops what
+// does not fill the last one.
+constexpr int kStepsPerColumn = 200;
+
+// What one column of one channel shows.
+struct SColumn {
+    float low = 0;
+    float high = 0;
+    double squares = 0;
+    size_t count = 0;
+
+    void add(float sample) {
+        low = count ? std::min(low, sample) : sample;
+        high = count ? std::max(high, sample) : sample;
+        squares += static_cast<double>(sample) * sample;
+        ++count;
+    }
+};
+
+struct SWave {
+    int channels;
+    int width;
+    double stepsPerColumn;
+    size_t steps = 0;
+    std::vector<SColumn> columns; // channel after channel
+
+    void add(const float* samples, int32_t count) {
+        for (int32_t i = 0; i + channels <= count; i += channels, ++steps) {
+            const int column =
+                std::min(static_cast<int>(static_cast<double>(steps) / stepsPerColumn), width - 1);
+            for (int channel = 0; channel < channels; ++channel)
+                columns[static_cast<size_t>(channel * width + column)].add(samples[i + channel]);
+        }
+    }
+};
+
+bool onSamples(TONEWRIGHT_Handle, double, const float* samples, int32_t count, void* user) {
+    static_cast<SWave*>(user)->add(samples, count);
+    return !isCancelled();
+}
+
+class CPicture {
+public:
+    CPicture(int width, int height)
+        : m_width(width), m_height(height),
+          m_pixels(static_cast<size_t>(width) * static_cast<size_t>(height), kBackground) {}
+
+    void drawColumn(int x, int top, int bottom, SColour colour) {
+        for (int y = std::max(top, 0); y <= std::min(bottom, m_height - 1); ++y)
+            m_pixels[static_cast<size_t>(y) * static_cast<size_t>(m_width) + static_cast<size_t>(x)] = colour;
+    }
+
+    void write(const fs::path& file) const {
+        png_image image = {};
+        image.version = PNG_IMAGE_VERSION;
+        image.width = static_cast<png_uint_32>(m_width);
+        image.height = static_cast<png_uint_32>(m_height);
+        image.format = PNG_FORMAT_RGB;
+        if (!png_image_write_to_file(&image, file.c_str(), 0, m_pixels.data(), 0, nullptr))
+            throw std::runtime_error(std::string("The picture could not be written: ") + image.message);
+    }
+
+private:
+    int m_width;
+    int m_height;
+    std::vector<SColour> m_pixels;
+};
+
+// One strip for each channel: peaks in a light colour, the root mean square over them in a dark one.
+CPicture draw(const SWave& wave, int height) {
+    CPicture picture(wave.width, height);
+    for (int channel = 0; channel < wave.channels; ++channel) {
+        const int top = height * channel / wave.channels, bottom = height * (channel + 1) / wave.channels - 1;
+        const double middle = (top + bottom) / 2.0, scale = (bottom - top) / 2.0 * 0.95;
+        const auto y = [&](double value) { return static_cast<int>(std::lround(middle - value * scale)); };
+        for (int x = 0; x < wave.width; ++x) {
+            picture.drawColumn(x, y(0), y(0), kAxis);
+            const SColumn& column = wave.columns[static_cast<size_t>(channel * wave.width + x)];
+            if (column.count == 0) continue;
+            picture.drawColumn(x, y(column.high), y(column.low), kPeak);
+            const double loudness = std::sqrt(column.squares / static_cast<double>(column.count));
+            picture.drawColumn(x, y(std::min<double>(loudness, column.high)),
+                               y(std::max<double>(-loudness, column.low)), kLoudness);
+        }
+    }
+    return picture;
+}
+
+void drawFile(CLibrary& library, const SWaveformOptions& options) {
+    checkInput(options.input);
+    COutputPlace place(options.output, ".part" + std::to_string(::getpid()), options.force);
+    SSampleFormat samples = readSampleFormat(options.input);
+    CHostLog::takeReason();
+    const auto createSource = [&](int channels) {
+        return CHandle(
+            library.CreateAudioSourceFromURI(toURI(options.input).c_str(), samples.rate, channels, 2, 1));
+    };
+    CHandle source = createSource(samples.channels);
+    if (!source && samples.channels > 2) source = createSource(samples.channels = 2);
+    const double duration = source ? library.AudioSource_GetDuration(source.get()) : -1;
+    if (duration < 0) {
+        const std::string reason = CHostLog::takeReason();
+        throw std::runtime_error(reason.empty() ? "No plug-in reads this file" : reason);
+    }
+
+    const double frames = duration * samples.rate;
+    const double step =
+        std::max(std::floor(frames / (static_cast<double>(options.width) * kStepsPerColumn)), 1.0);
+    SWave wave{samples.channels, options.width, std::max(frames / step / options.width, 1e-9), 0, {}};
+    wave.columns.resize(static_cast<size_t>(wave.channels) * static_cast<size_t>(wave.width));
+    // Half a frame more, so that the library's truncation arrives at the whole number meant.
+    const bool complete = library.AudioSource_FetchStreamSamples(source.get(), onSamples,
+                                                                 (step + 0.5) / samples.rate, &wave) != 0;
+    if (isCancelled()) return;
+    if (!complete) {
+        const std::string reason = CHostLog::takeReason();
+        throw std::runtime_error(reason.empty() ? "The samples could not be read" : reason);
+    }
+    draw(wave, options.height).write(place.getTemporary());
+    place.commit();
+}
+
+} // namespace
+
+int drawWaveform(CLibrary& library, const SWaveformOptions& options) {
+    try {
+        drawFile(library, options);
+        return isCancelled() ? kExitCancelled : kExitSuccess;
+    } catch (const std::exception& error) {
+        printFailure(options.input, error.what());
+        return kExitFailure;
+    }
+}
+
+} // namespace host
