@@ -18,6 +18,11 @@ macro(tw_sources variable)
     endforeach()
 endmacro()
 
+# A symbol that nobody defines is an error of the build and not of the first call. Sanitizers bring theirs later.
+if(NOT TONEWRIGHT_SANITIZERS)
+    set(TONEWRIGHT_LINK_STRICTLY -Wl,--no-undefined)
+endif()
+
 # tw_library(NAME FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library, also known as tw::NAME.
 function(tw_library name)
     cmake_parse_arguments(arg "" "" "FOLDERS;PUBLIC;PRIVATE" ${ARGN})
@@ -30,6 +35,7 @@ function(tw_library name)
     add_library(tw::${name} ALIAS ${name})
     target_include_directories(${name} PUBLIC $<BUILD_INTERFACE:${CMAKE_SOURCE_DIR}/src>)
     target_link_libraries(${name} PUBLIC ${arg_PUBLIC} PRIVATE ${arg_PRIVATE} Threads::Threads)
+    target_link_options(${name} PRIVATE ${TONEWRIGHT_LINK_STRICTLY})
     target_precompile_headers(${name} PRIVATE <algorithm> <cstdint> <cstring> <memory> <string> <vector>)
     set_target_properties(
         ${name}

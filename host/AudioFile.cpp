@@ -6,14 +6,14 @@
 #include <fcntl.h>
 #include <stdexcept>
 #include <sys/stat.h>
-#include <taglib/tbytevector.h>
-#include <taglib/tstring.h>
-#include <taglib/aiffproperties.h>
-#include <taglib/audioproperties.h>
+#include <unistd.h>
+
+// First, since the others lean on it.
 #include <taglib/fileref.h>
+
+#include <taglib/aiffproperties.h>
 #include <taglib/flacproperties.h>
 #include <taglib/wavproperties.h>
-#include <unistd.h>
 
 namespace host {
 

@@ -18,6 +18,9 @@ CLibrary::CLibrary() {
     if (!name) throw std::runtime_error("the library has no function TONEWRIGHT_" #name);
     HOST_FUNCTIONS(HOST_RESOLVE)
 #undef HOST_RESOLVE
+}
+
+void CLibrary::start() {
     if (InitStartup() != TONEWRIGHT_OK) throw std::runtime_error("the library could not be started");
 }
 

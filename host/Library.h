@@ -23,13 +23,15 @@ namespace host {
     X(AudioEncoder_Encode)                                                                                   \
     X(AudioEncoder_SetCallback)
 
-// Started by the constructor, ended by the destructor; one at a time.
+// One at a time.
 class CLibrary {
 public:
-    // Takes $TONEWRIGHT_LIBRARY where that is set, else the library this program was built or installed
+    // Loads $TONEWRIGHT_LIBRARY where that is set, else the library this program was built or installed
     // with. Throws std::runtime_error with the loader's reason.
     CLibrary();
-    ~CLibrary();
+    ~CLibrary(); // ends what start() started
+    // Apart from loading, so that a log can be there to hear of it. Throws std::runtime_error.
+    void start();
     CLibrary(const CLibrary&) = delete;
     CLibrary& operator=(const CLibrary&) = delete;
 

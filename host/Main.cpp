@@ -132,6 +132,7 @@ int main(int argc, char** argv) {
         watchForCancel();
         CLibrary library;
         CHostLog log(library, printLevel);
+        library.start();
         return run(library);
     } catch (const std::exception& error) {
         std::fprintf(stderr, "tonewright: %s\n", error.what());

@@ -42,7 +42,8 @@ void appendUTF8(std::string& text, char32_t c) {
 std::u16string toURI(const std::filesystem::path& path) {
     static constexpr char kDigits[] = "0123456789ABCDEF";
     std::u16string uri = u"file://";
-    for (unsigned char c : std::filesystem::absolute(path).native()) {
+    const std::filesystem::path absolute = std::filesystem::absolute(path);
+    for (unsigned char c : absolute.native()) {
         if (isPlain(c)) {
             uri += static_cast<char16_t>(c);
             continue;

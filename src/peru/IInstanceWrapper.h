@@ -16,12 +16,13 @@ public:
     virtual void destroy() = 0;
 };
 
-// Holds a reference on the object behind a handle. No type tag.
+// Holds a reference on the object behind a handle. No type tag. Header only: a host that hands in an object
+// of its own, such as a log, links nothing for it.
 class PERU_API CInstanceWrapper : public IInstanceWrapper {
 public:
     explicit CInstanceWrapper(P<IBase> object) : m_object(std::move(object)) {}
-    ~CInstanceWrapper() override;
-    void destroy() override;
+    ~CInstanceWrapper() override = default;
+    void destroy() override { delete this; }
     const P<IBase>& getObject() const { return m_object; }
 
 private:

@@ -2,12 +2,6 @@
 
 namespace peru {
 
-CInstanceWrapper::~CInstanceWrapper() = default;
-
-void CInstanceWrapper::destroy() {
-    delete this;
-}
-
 CStringInstanceWrapper::CStringInstanceWrapper(const CStringArg& text)
     : m_text(CString::toStdU16String(text)) {}
 
