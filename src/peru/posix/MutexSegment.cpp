@@ -68,13 +68,23 @@ std::string getPath(const std::string& name) {
     return std::string(isPrivateFolder(folder) ? folder : "/dev/shm") + "/" + getFileName(name);
 }
 
-// False when the caller cannot be sure to be the only one in the file.
-bool lockFile(int descriptor) {
-    int result;
-    do result = flock(descriptor, LOCK_EX);
-    while (result != 0 && errno == EINTR);
-    return result == 0;
-}
+// Keeps other makers out. Unlocks by itself, since a mapping keeps the lock alive after the file is closed.
+class CFileLock {
+public:
+    explicit CFileLock(int descriptor) : m_descriptor(descriptor) {
+        do m_locked = flock(m_descriptor, LOCK_EX) == 0;
+        while (!m_locked && errno == EINTR);
+    }
+    ~CFileLock() { flock(m_descriptor, LOCK_UN); }
+    CFileLock(const CFileLock&) = delete;
+    CFileLock& operator=(const CFileLock&) = delete;
+
+    bool isLocked() const { return m_locked; }
+
+private:
+    int m_descriptor;
+    bool m_locked = false;
+};
 
 void readBootId(char (&id)[40]) {
     std::memset(id, 0, sizeof id);
@@ -126,7 +136,9 @@ CMutexSegment::SLayout* CMutexSegment::map(const std::string& path) {
     // No link is followed and only a plain file of the user's own is taken, so that nobody else who may
     // write to the folder can put something in its place.
     CFileHandle file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600));
-    if (!file.isOpen() || !lockFile(file.get())) return nullptr;
+    if (!file.isOpen()) return nullptr;
+    CFileLock lock(file.get());
+    if (!lock.isLocked()) return nullptr;
     struct stat status;
     if (fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode) || status.st_uid != geteuid() ||
         (status.st_mode & 0077) != 0)
