@@ -5,6 +5,7 @@
 #include "peru/IPathes.h"
 #include "peru/MemoryIOStream.h"
 #include "peru/URI.h"
+#include "sonora2/common/EmbeddedMutex.h"
 #include "sonora2/common/LogManager.h"
 #include "sonora2/common/SonoraError.h"
 #include "support/TempFolder.h"
@@ -159,6 +160,28 @@ TEST(SonoraContext, IsReadByManyThreadsWhileItChanges) {
     for (std::thread& reader : readers) reader.join();
 }
 
+TEST(EmbeddedMutex, LocksForAllFacetsAndKeepsItsObject) {
+    P<tests::CScriptedSource> source = make<tests::CScriptedSource>();
+    const auto mutex = make<sonora2::common::CEmbeddedMutex<sonora2::common::ISource>>(source);
+    source.reset();
+    EXPECT_FALSE(mutex->getObject()->isOpened());
+
+    const auto tryElsewhere = [&] {
+        bool locked = false;
+        std::thread([&] {
+            locked = mutex->tryLock();
+            if (locked) mutex->unlock();
+        }).join();
+        return locked;
+    };
+    {
+        peru::CMutexLock lock(mutex);
+        peru::CMutexLock again(mutex); // a call may come back through another facet
+        EXPECT_FALSE(tryElsewhere());
+    }
+    EXPECT_TRUE(tryElsewhere());
+}
+
 // The text of messages comes from files and devices: whatever it holds, the document stays readable.
 TEST(SonoraLog, WritesADocumentThatAnotherReaderUnderstands) {
     const tests::CTempFolder folder;
@@ -167,16 +190,19 @@ TEST(SonoraLog, WritesADocumentThatAnotherReaderUnderstands) {
     log->log(77, CString::fromUTF8("gr\xc3\xbc\xc3\x9f"));
     log->log(0, nullptr);
     log->logException(peru::CError("no <disc>"));
+    log->log(4, CString::fromUTF8(std::string("\x01\0\x1f\xff\xe2\x82\xac\xf0\x9f\x8e\xb5\xef\xbf\xbf", 14)));
     const std::string name = (folder / "log.xml").string();
     log->save(peru::getPathes()->fromPlatformPath(CString::fromUTF8(name)));
 
-    const std::string query = "xmllint --xpath 'concat(name(/*),\"|\",count(//logentry[@time]),\"|\","
-                              "//logentry[1],\"|\",//logentry[1]/@level,\"|\",//logentry[2],\"|\","
-                              "//logentry[2]/@level,\"|\",//logentry[4],\"|\",//logentry[4]/@level)' " +
-                              name + " > " + (folder / "answer").string();
+    const std::string query =
+        "xmllint --xpath 'concat(name(/*),\"|\",count(//logentry[@time]),\"|\","
+        "//logentry[1],\"|\",//logentry[1]/@level,\"|\",//logentry[2],\"|\","
+        "//logentry[2]/@level,\"|\",//logentry[4],\"|\",//logentry[4]/@level,\"|\",//logentry[5])' " +
+        name + " > " + (folder / "answer").string();
     ASSERT_EQ(std::system(query.c_str()), 0);
-    EXPECT_EQ(tests::readFile(folder / "answer"), "textlog|4|a < b & \"c\" > 'd'|2|gr\xc3\xbc\xc3\x9f|77|"
-                                                  "Exception: Type='Error' Message='no <disc>'|0\n");
+    EXPECT_EQ(tests::readFile(folder / "answer"),
+              "textlog|5|a < b & \"c\" > 'd'|2|gr\xc3\xbc\xc3\x9f|77|"
+              "Exception: Type='Error' Message='no <disc>'|0|???\xe2\x82\xac\xf0\x9f\x8e\xb5?\n");
 }
 
 } // namespace

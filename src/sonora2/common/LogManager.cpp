@@ -9,6 +9,7 @@
 #include <tinyxml.h>
 
 #include <chrono>
+#include <string>
 
 namespace sonora2::common {
 
@@ -30,6 +31,27 @@ std::string formatTime(int64_t milliseconds) {
         static_cast<int>(clock.seconds().count()), static_cast<int>(clock.subseconds().count())));
 }
 
+// Messages carry names from files and devices. What XML cannot hold, even escaped, becomes '?', and malformed
+// bytes are left out: one bad name must not spoil the document.
+std::string makeReadable(const P<peru::IString>& text) {
+    std::string readable;
+    if (!text) return readable;
+    for (peru::SStringPos pos = peru::kStringBegin;;) {
+        char32_t ch = text->getCharAndAdvance(pos);
+        if (!pos.isFound()) return readable;
+        const bool allowed = ch == '\t' || ch == '\n' || ch == '\r' || (ch >= 0x20 && ch < 0xd800) ||
+                             (ch >= 0xe000 && ch < 0xfffe) || (ch >= 0x10000 && ch <= 0x10ffff);
+        if (!allowed) ch = '?';
+        if (ch < 0x80) {
+            readable += static_cast<char>(ch);
+            continue;
+        }
+        const int following = ch < 0x800 ? 1 : ch < 0x10000 ? 2 : 3;
+        readable += static_cast<char>((0xff00 >> (following + 1)) | (ch >> (6 * following)));
+        for (int i = following - 1; i >= 0; --i) readable += static_cast<char>(0x80 | (ch >> (6 * i) & 0x3f));
+    }
+}
+
 } // namespace
 
 CLogManager::CLogManager()
@@ -44,7 +66,7 @@ void CLogManager::log(int32_t severity, const P<peru::IString>& text) {
     auto entry = std::make_unique<TiXmlElement>("logentry");
     entry->SetAttribute("time", formatTime(peru::getTimeManager()->getTime()));
     entry->SetAttribute("level", severity);
-    entry->LinkEndChild(std::make_unique<TiXmlText>(CString::toStdString(text)).release());
+    entry->LinkEndChild(std::make_unique<TiXmlText>(makeReadable(text)).release());
 
     CMutexLock lock(m_mutex);
     TiXmlElement* root = m_document->RootElement();
