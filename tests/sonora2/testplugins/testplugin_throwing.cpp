@@ -1,0 +1,21 @@
+// Its entry point throws an exception whose code and text lie in the library, which is unloaded at once.
+#include "peru/Errors.h"
+#include "sonora2/common/ISonoraContext.h"
+#include "sonora2/common/ISonoraPlugin.h"
+
+namespace {
+
+class COwnError : public peru::CError {
+public:
+    COwnError() : peru::CError("never mind") {}
+    peru::P<peru::IString> getDescription() const override {
+        return peru::make<peru::CUTF8String>("no licence", -1, peru::EStringStorage::refer);
+    }
+};
+
+} // namespace
+
+extern "C" SONORA2_API void sonora2_pluginCreate(const peru::P<sonora2::common::ISonoraContext>&,
+                                                 peru::P<sonora2::common::ISonoraPlugin>&) {
+    throw COwnError();
+}

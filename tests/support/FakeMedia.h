@@ -1,0 +1,176 @@
+// Sources, formats and a plug-in whose behaviour a test writes down.
+#pragma once
+
+#include "peru/URI.h"
+#include "sonora2/audio/AudioChunk.h"
+#include "sonora2/common/IAudioFormat.h"
+#include "sonora2/common/IAudioSource.h"
+#include "sonora2/common/ISonoraPlugin.h"
+#include "sonora2/common/PluginExtensions.h"
+
+#include <algorithm>
+#include <atomic>
+#include <functional>
+#include <initializer_list>
+
+namespace tests {
+
+using peru::P;
+
+struct SFakeSource {
+    int rate = 1000;
+    int channels = 2;
+    int bytesPerSample = 2;
+    int64_t frames = 1000;
+    int chunkFrames = 300;
+    std::function<void()> onOpen = [] {};  // may throw
+    std::function<void()> onClose = [] {}; // may throw
+    std::function<void()> onRead = [] {};  // may throw
+    bool staysClosed = false;              // open() does not open
+};
+
+// 16-bit sample of channel c in frame f: (f * 4 + c) wrapped to 15 bits. Other widths are silent.
+class CFakeSource : public peru::CObject, public sonora2::common::IAudioSource {
+public:
+    explicit CFakeSource(SFakeSource script, P<peru::IURI> uri = nullptr)
+        : m_script(std::move(script)), m_uri(std::move(uri)) {
+        ++s_alive;
+    }
+    ~CFakeSource() override { --s_alive; }
+
+    static inline std::atomic<int> s_alive{0};
+    int opens = 0;
+
+    bool isOpened() override { return m_opened; }
+    void open() override {
+        ++opens;
+        m_script.onOpen();
+        m_opened = !m_script.staysClosed;
+        m_position = 0;
+    }
+    void close() override {
+        m_script.onClose();
+        m_opened = false;
+    }
+    void skipToTime(double time) override { m_position = static_cast<int64_t>(time * m_script.rate); }
+    double getDuration() override { return static_cast<double>(m_script.frames) / m_script.rate; }
+    int getBufferStatus() override { return 100; }
+    bool isEOF() override { return m_position >= m_script.frames; }
+    void setStartTime(double) override {}
+    double getStartTime() override { return 0.0; }
+    P<peru::IURI> getURI() override { return m_uri; }
+    P<peru::IString> getPluginName() override { return peru::CString::fromUTF8("fake"); }
+    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override { return nullptr; }
+    void setAudioStream(int) override {}
+    P<sonora2::audio::IAudioChunk> getNextAudioChunk() override {
+        m_script.onRead();
+        if (isEOF()) return nullptr;
+        const int64_t frames = std::min<int64_t>(m_script.chunkFrames, m_script.frames - m_position);
+        P<peru::IMemoryBlock> block =
+            peru::make<peru::CMemoryBlock>(frames * m_script.channels * m_script.bytesPerSample);
+        std::fill_n(block->getData(), block->getSize(), uint8_t{0});
+        auto* samples = reinterpret_cast<int16_t*>(block->getData());
+        for (int64_t f = 0; m_script.bytesPerSample == 2 && f < frames; ++f)
+            for (int c = 0; c < m_script.channels; ++c)
+                *samples++ = static_cast<int16_t>(((m_position + f) * 4 + c) & 0x7fff);
+        const double timestamp = static_cast<double>(m_position) / m_script.rate;
+        m_position += frames;
+        return peru::make<sonora2::audio::CAudioChunk>(timestamp, block);
+    }
+    int getSampleRate() override { return m_script.rate; }
+    int getChannelCount() override { return m_script.channels; }
+    int getBytesPerSample() override { return m_script.bytesPerSample; }
+
+private:
+    SFakeSource m_script;
+    P<peru::IURI> m_uri;
+    bool m_opened = false;
+    int64_t m_position = 0;
+};
+
+// Counts what it is given.
+class CFakeFormat : public peru::CObject, public sonora2::common::IAudioFormat {
+public:
+    explicit CFakeFormat(
+        const sonora2::common::ISonoraPlugin::SFormatParams& params = {},
+        std::function<void()> onWrite = [] {})
+        : params(params), m_onWrite(std::move(onWrite)) {}
+
+    sonora2::common::ISonoraPlugin::SFormatParams params;
+    double quality = -1.0;
+    int bitRates[3] = {-1, -1, -1};
+    int64_t bytes = 0;
+
+    bool isOpened() override { return m_opened; }
+    void open() override { m_opened = true; }
+    void close() override { m_opened = false; }
+    P<peru::IURI> getURI() override { return nullptr; }
+    P<peru::IString> getPluginName() override { return peru::CString::fromUTF8("fake"); }
+    // Carries the settings too, for a test that sees no more of the format than a host does.
+    int64_t getEstimatedSizeBytes(double duration) override {
+        return static_cast<int64_t>(duration * params.nSampleRate * params.nChannelCount *
+                                        params.nBytesPerSample +
+                                    std::max(quality, 0.0) * 10 + std::max(bitRates[1], 0));
+    }
+    int getSampleRate() override { return params.nSampleRate; }
+    int getChannelCount() override { return params.nChannelCount; }
+    int getBytesPerSample() override { return params.nBytesPerSample; }
+    void setAudioQuality(double value) override { quality = value; }
+    void setAudioBitRate(int nominal, int min, int max) override {
+        bitRates[0] = nominal;
+        bitRates[1] = min;
+        bitRates[2] = max;
+    }
+    void writeAudioChunk(const P<sonora2::audio::IAudioChunk>& chunk) override {
+        m_onWrite();
+        bytes += chunk->getSize();
+    }
+
+private:
+    std::function<void()> m_onWrite;
+    bool m_opened = false;
+};
+
+// Makes what its functions make, by default nothing.
+class CFakePlugin : public peru::CObject, public sonora2::common::ISonoraPlugin {
+public:
+    using SourceFactory =
+        std::function<P<sonora2::common::ISource>(const P<peru::IURI>&, const SSourceParams&)>;
+    using FormatFactory =
+        std::function<P<sonora2::common::IFormat>(const P<peru::IURI>&, const SFormatParams&)>;
+
+    CFakePlugin(const char* name, std::initializer_list<const char*> extensions)
+        : m_name(peru::CString::fromUTF8(name)) {
+        for (const char* extension : extensions)
+            m_extensions->addExtension(peru::CString::fromUTF8(extension));
+    }
+
+    SourceFactory makeSource = [](const P<peru::IURI>&, const SSourceParams&) { return nullptr; };
+    FormatFactory makeFormat = [](const P<peru::IURI>&, const SFormatParams&) { return nullptr; };
+    int sourceCalls = 0;
+    int mask = 0; // of the last call
+
+    P<peru::IString> getPluginName() override { return m_name; }
+    int getValidTypes() override { return 0x5B; }
+    P<sonora2::common::IPluginExtensions> getValidExtensions(int) override { return m_extensions; }
+    P<sonora2::common::ISource> tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool,
+                                                const SSourceParams* params) override {
+        ++sourceCalls;
+        mask = nTypes;
+        return makeSource(uri, *params);
+    }
+    P<sonora2::common::IFormat> tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool,
+                                                const SFormatParams* params) override {
+        mask = nTypes;
+        return makeFormat(uri, *params);
+    }
+    P<peru::IBase> tryCreateObject(const P<peru::IURI>&, const SObjectParams* params) override {
+        return params->nSize == 4 ? P<peru::IBase>(m_extensions) : nullptr;
+    }
+
+private:
+    P<peru::IString> m_name;
+    P<sonora2::common::CPluginExtensions> m_extensions = peru::make<sonora2::common::CPluginExtensions>();
+};
+
+} // namespace tests
