@@ -258,8 +258,11 @@ SContext convertContext(const ucontext_t& from) {
 SMemory writeStack(CSafeWriter& out, uintptr_t stackPointer, uintptr_t stackLimit) {
     constexpr uintptr_t kRedZone = 128;
     SMapping stack;
+    // After an overflow the pointer stands in the guard below the stack.
+    constexpr uintptr_t kGuard = 1024 * 1024;
     forEachMapping([&](const SMapping& mapping) {
-        if (mapping.start <= stackPointer && stackPointer < mapping.end) stack = mapping;
+        if (stack.end == 0 && mapping.start < stackPointer + kGuard && stackPointer < mapping.end)
+            stack = mapping;
     });
     if (stack.end == 0) return {};
     if (stackPointer < stackLimit && stackLimit < stack.end) stack.end = stackLimit;

@@ -2,7 +2,9 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <cstdlib>
 #include <string>
+#include <string_view>
 
 namespace peru {
 
@@ -19,7 +21,18 @@ size_t cut(const char* utf8, size_t size, size_t characters) {
     return size;
 }
 
+// Standard error is there for everybody to see, other than a debugger's window: a program with an output of
+// its own switches this off.
+bool isEnabled() {
+    static const bool enabled = [] {
+        const char* setting = std::getenv("TONEWRIGHT_DEBUG_OUTPUT");
+        return !setting || std::string_view(setting) != "0";
+    }();
+    return enabled;
+}
+
 void writeDebugOutput(const char* utf8, size_t size) {
+    if (!isEnabled()) return;
     // One call, so that lines of several threads do not mix.
     std::fwrite(utf8, 1, size, stderr);
 }
@@ -39,6 +52,7 @@ void zvrTrace(const char* file, int line, const char* comment) {
 
 void outputDebugString(const CStringArg& text) {
     std::string utf8 = CString::toStdString(text);
+    if (!utf8.ends_with('\n')) utf8 += '\n';
     writeDebugOutput(utf8.data(), utf8.size());
 }
 

@@ -60,7 +60,8 @@ public:
 
 PERU_API P<ILogManager> getLogManager();
 
-// The debugger trace: one line on the platform's debug output, in release builds too.
+// The debugger trace: one line on the platform's debug output, in release builds too. That output is standard
+// error, unless the environment has TONEWRIGHT_DEBUG_OUTPUT=0.
 PERU_API void zvrTrace(const char* file, int line, const char* comment = nullptr);
 PERU_API void outputDebugString(const CStringArg& text);
 

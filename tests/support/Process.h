@@ -1,0 +1,85 @@
+// Runs programs and says what they did.
+#pragma once
+
+#include <csignal>
+#include <cstdlib>
+#include <fcntl.h>
+#include <string>
+#include <sys/wait.h>
+#include <unistd.h>
+#include <utility>
+#include <vector>
+
+namespace tests {
+
+struct SProcessResult {
+    int exitCode = -1; // 128 and the signal for one that was killed
+    std::string out;
+    std::string err;
+};
+
+// A child whose output goes to two files that are gone from the disk at once. Killed at the end of the block.
+class CProcess {
+public:
+    explicit CProcess(const std::vector<std::string>& command, const std::string& folder = {},
+                      const std::vector<std::pair<std::string, std::string>>& environment = {})
+        : m_out(makeFile()), m_err(makeFile()) {
+        std::vector<char*> arguments;
+        for (const std::string& argument : command) arguments.push_back(const_cast<char*>(argument.c_str()));
+        arguments.push_back(nullptr);
+        m_id = ::fork();
+        if (m_id != 0) return;
+        if (!folder.empty() && ::chdir(folder.c_str()) != 0) ::_exit(126);
+        for (const auto& [name, value] : environment) ::setenv(name.c_str(), value.c_str(), 1);
+        ::dup2(::open("/dev/null", O_RDONLY), 0);
+        ::dup2(m_out, 1);
+        ::dup2(m_err, 2);
+        ::execvp(arguments[0], arguments.data());
+        ::_exit(127);
+    }
+    ~CProcess() {
+        if (m_id > 0) {
+            ::kill(m_id, SIGKILL);
+            wait();
+        }
+        ::close(m_out);
+        ::close(m_err);
+    }
+    CProcess(const CProcess&) = delete;
+    CProcess& operator=(const CProcess&) = delete;
+
+    pid_t getId() const { return m_id; }
+    void signal(int number) const { ::kill(m_id, number); }
+    std::string readOut() const { return read(m_out); }
+
+    SProcessResult wait() {
+        int status = 0;
+        ::waitpid(m_id, &status, 0);
+        m_id = -1;
+        return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), read(m_out), read(m_err)};
+    }
+
+private:
+    static int makeFile() {
+        std::string name = "/tmp/tonewright-output-XXXXXX";
+        const int file = ::mkostemp(name.data(), O_CLOEXEC);
+        ::unlink(name.c_str());
+        return file;
+    }
+    static std::string read(int file) {
+        std::string text(static_cast<size_t>(::lseek(file, 0, SEEK_END)), '\0');
+        if (::pread(file, text.data(), text.size(), 0) < 0) text.clear();
+        return text;
+    }
+
+    int m_out;
+    int m_err;
+    pid_t m_id = -1;
+};
+
+inline SProcessResult run(const std::vector<std::string>& command, const std::string& folder = {},
+                          const std::vector<std::pair<std::string, std::string>>& environment = {}) {
+    return CProcess(command, folder, environment).wait();
+}
+
+} // namespace tests
