@@ -1,0 +1,115 @@
+#include "Library.h"
+
+#include <functional>
+
+namespace {
+
+using namespace tests;
+
+struct SCase {
+    const char* name;
+    std::function<double(TONEWRIGHT_Handle)> call; // every result as a number, null handles as 0
+    double expected;
+};
+
+double number(TONEWRIGHT_Handle handle) {
+    const bool isNull = handle == nullptr;
+    TONEWRIGHT_DestroyHandle(handle);
+    return isNull ? 0 : 1;
+}
+
+bool never(TONEWRIGHT_Handle, double, const float*, int32_t, void*) {
+    ADD_FAILURE() << "called back";
+    return true;
+}
+
+#define CALL(expression) [](TONEWRIGHT_Handle h) { return static_cast<double>(expression); }
+#define VOID(expression)                                                                                     \
+    [](TONEWRIGHT_Handle h) {                                                                                \
+        expression;                                                                                          \
+        return 0.0;                                                                                          \
+    }
+
+const SCase kCases[] = {
+    {"AddProxyLogManager", VOID(TONEWRIGHT_AddProxyLogManager(h)), 0},
+    {"RemoveProxyLogManager", VOID(TONEWRIGHT_RemoveProxyLogManager(h)), 0},
+    {"getExtensionCount", CALL(TONEWRIGHT_getExtensionCount(h)), 0},
+    {"getExtension", CALL(number(TONEWRIGHT_getExtension(h, 0))), 0},
+    {"FromAudioInDevice", CALL(number(TONEWRIGHT_CreateAudioSoureFromAudioInDevice(h, 44100, 2, 2))), 0},
+    {"AudioSource_IsOpened", CALL(TONEWRIGHT_AudioSource_IsOpened(h)), 0},
+    {"AudioSource_Open", CALL(TONEWRIGHT_AudioSource_Open(h)), 3},
+    {"AudioSource_Close", CALL(TONEWRIGHT_AudioSource_Close(h)), 3},
+    {"AudioSource_GetDuration", CALL(TONEWRIGHT_AudioSource_GetDuration(h)), -1},
+    {"SetRecordingCallback", VOID(TONEWRIGHT_AudioSource_SetRecordingCallback(h, nullptr)), 0},
+    {"SetRecordingVolumeCallback", VOID(TONEWRIGHT_AudioSource_SetRecordingVolumeCallback(h, nullptr)), 0},
+    {"FetchStreamSamples", CALL(TONEWRIGHT_AudioSource_FetchStreamSamples(h, never, 0.01, nullptr)), 0},
+    {"AudioFormat_IsOpened", CALL(TONEWRIGHT_AudioFormat_IsOpened(h)), 0},
+    {"AudioFormat_Open", CALL(TONEWRIGHT_AudioFormat_Open(h)), 5},
+    {"AudioFormat_Close", CALL(TONEWRIGHT_AudioFormat_Close(h)), 3},
+    {"GetEstiamtedFileSize", CALL(TONEWRIGHT_AudioFormat_GetEstiamtedFileSize(h, 1.0)), -1},
+    {"CreateAudioEncoder", CALL(number(TONEWRIGHT_CreateAudioEncoder(h, h))), 0},
+    {"AudioEncoder_Encode", CALL(TONEWRIGHT_AudioEncoder_Encode(h)), 10},
+    {"AudioEncoder_SetCallback", CALL(TONEWRIGHT_AudioEncoder_SetCallback(h, nullptr)), 10},
+    {"CreatePlayer", CALL(number(TONEWRIGHT_CreatePlayerFromAudioSource(h))), 0},
+    {"Player_Play", CALL(TONEWRIGHT_Player_Play(h)), 9},
+    {"Player_Pause", CALL(TONEWRIGHT_Player_Pause(h)), 9},
+    {"Player_Stop", CALL(TONEWRIGHT_Player_Stop(h)), 9},
+    {"Player_SetCallback", CALL(TONEWRIGHT_Player_SetCallback(h, nullptr)), 9},
+    {"StoreFileTag", CALL(TONEWRIGHT_StoreFileTag(h)), 8},
+    {"FileTag_GetArtist", CALL(number(TONEWRIGHT_FileTag_GetArtist(h))), 0},
+    {"FileTag_GetYear", CALL(number(TONEWRIGHT_FileTag_GetYear(h))), 0},
+    {"FileTag_SetTitle", VOID(TONEWRIGHT_FileTag_SetTitle(h, u"x")), 0},
+    {"AddTrack", CALL(TONEWRIGHT_AudioCDProject_AddTrackFromAudioSource(h, h, 0)), 4},
+    {"AddFile", CALL(TONEWRIGHT_DataDiscProject_AddFileFromAudioSource(h, u"/a", u"file:///a")), 7},
+    {"Normalize", CALL(TONEWRIGHT_INORMALIZE_processAudioSource(h, -3.0, nullptr)), 3},
+};
+
+void expectAllRefuse(TONEWRIGHT_Handle handle, const char* kind) {
+    for (const SCase& c : kCases) EXPECT_EQ(c.call(handle), c.expected) << c.name << " on " << kind;
+}
+
+class BadHandle : public CLibraryTest {};
+
+TEST_F(BadHandle, NullAndOtherKinds_GiveTheFamilysValue) {
+    expectAllRefuse(nullptr, "null");
+    expectAllRefuse(wrap(nullptr).get(), "a wrapper of nothing");
+    expectAllRefuse(wrap(peru::CString::fromUTF8("x")).get(), "another object");
+    CHandle text(reinterpret_cast<TONEWRIGHT_Handle>(
+        static_cast<peru::IInstanceWrapper*>(new peru::CStringInstanceWrapper(u"x"))));
+    expectAllRefuse(text.get(), "a text");
+}
+
+// Everything that needs the started library, given what would be right.
+void expectNotStarted() {
+    CHandle source = wrap(peru::make<CFakeSource>(SFakeSource()));
+    CHandle format = wrap(peru::make<CFakeFormat>());
+    expectAllRefuse(nullptr, "null, not started");
+    EXPECT_EQ(TONEWRIGHT_InitGui(u"", u"", u"", 0, u"/x", u""), 1);
+    EXPECT_FALSE(TONEWRIGHT_CreateAudioSourceFromURI(u"file:///a.tst", 44100, 2, 2, 0));
+    EXPECT_FALSE(TONEWRIGHT_CreateAudioFormatFromURI(u"file:///a.tst", 44100, 2, 2, 0, 0, 0, 0));
+    EXPECT_FALSE(TONEWRIGHT_CreateAudioEncoder(source.get(), format.get()));
+    EXPECT_EQ(TONEWRIGHT_AudioSource_Open(source.get()), 3);
+    EXPECT_EQ(TONEWRIGHT_AudioSource_GetDuration(source.get()), -1.0);
+    EXPECT_EQ(TONEWRIGHT_AudioSource_FetchStreamSamples(source.get(), never, 0.01, nullptr), 0);
+    EXPECT_FALSE(TONEWRIGHT_getValidCodecExtensions(2));
+    TONEWRIGHT_SetTempExtension(u".part");
+    TONEWRIGHT_SetDriveChangedCallback(nullptr);
+    TONEWRIGHT_SetLanguageID(u"de-AT");
+}
+
+TEST(Start, Functions_FailOutsideOfStartAndEnd) {
+    CPluginFolder plugins;
+    expectNotStarted();
+    TONEWRIGHT_DeInitAll();
+    for (int round = 0; round < 3; ++round) {
+        ASSERT_EQ(TONEWRIGHT_InitStartup(), 0);
+        EXPECT_EQ(TONEWRIGHT_InitStartup(), 0) << "a second start changes nothing";
+        EXPECT_TRUE(CHandle(TONEWRIGHT_CreateAudioSourceFromURI(u"file:///a.tst", 44100, 2, 2, 0)));
+        EXPECT_EQ(TONEWRIGHT_InitGui(u"", nullptr, u"", 1, u"/x", u""), 0);
+        TONEWRIGHT_DeInitAll();
+        expectNotStarted();
+        TONEWRIGHT_DeInitAll();
+    }
+}
+
+} // namespace

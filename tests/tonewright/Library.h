@@ -1,0 +1,103 @@
+// The library started for a test, with a plug-in of the tests in the place of the real ones.
+#pragma once
+
+#include "peru/IInstanceWrapper.h"
+#include "peru/LogManager.h"
+#include "support/FakeMedia.h"
+#include "support/TempFolder.h"
+#include "tonewright/tonewright.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <memory>
+#include <mutex>
+#include <string>
+#include <vector>
+
+namespace tests {
+
+struct SHandleEnd {
+    void operator()(TONEWRIGHT_HandleData* handle) const { TONEWRIGHT_DestroyHandle(handle); }
+};
+using CHandle = std::unique_ptr<TONEWRIGHT_HandleData, SHandleEnd>;
+
+inline CHandle wrap(P<peru::IBase> object) {
+    peru::IInstanceWrapper* wrapper = new peru::CInstanceWrapper(std::move(object));
+    return CHandle(reinterpret_cast<TONEWRIGHT_Handle>(wrapper));
+}
+
+struct SLine {
+    int32_t level;
+    std::string source;
+    std::string text;
+    bool operator==(const SLine&) const = default;
+};
+
+// Keeps what is logged.
+class CLines : public peru::CLogBase {
+public:
+    void enterArea(const P<peru::IString>&) override {}
+    void leaveArea(const P<peru::IString>&) override {}
+    void write(const peru::SLogMessage& message) override {
+        std::scoped_lock lock(m_mutex);
+        m_lines.push_back({message.level, peru::CString::toStdString(message.source),
+                           peru::CString::toStdString(message.text)});
+    }
+    std::vector<SLine> take() {
+        std::scoped_lock lock(m_mutex);
+        return std::exchange(m_lines, {});
+    }
+
+private:
+    std::mutex m_mutex;
+    std::vector<SLine> m_lines;
+};
+
+// The host's own log, added through the exports as a host does it.
+class CHostLog {
+public:
+    CHostLog() {
+        m_manager->addLog(m_lines, peru::CString::empty());
+        TONEWRIGHT_AddProxyLogManager(m_handle.get());
+    }
+    ~CHostLog() { TONEWRIGHT_RemoveProxyLogManager(m_handle.get()); }
+    std::vector<SLine> take() { return m_lines->take(); }
+    TONEWRIGHT_Handle getHandle() const { return m_handle.get(); }
+
+private:
+    P<CLines> m_lines = peru::make<CLines>();
+    P<peru::CLogManager> m_manager = peru::make<peru::CLogManager>();
+    CHandle m_handle = wrap(m_manager);
+};
+
+// Where "sonora2_wav" is the tests' plug-in, and no other is to be found at first.
+class CPluginFolder {
+public:
+    CPluginFolder() {
+        std::filesystem::create_symlink(TEST_PLUGIN, m_folder / "sonora2_wav.so");
+        setenv("TONEWRIGHT_PLUGIN_PATH", m_folder.path().c_str(), 1);
+    }
+    ~CPluginFolder() { unsetenv("TONEWRIGHT_PLUGIN_PATH"); }
+
+private:
+    CTempFolder m_folder;
+};
+
+class CLibraryTest : public testing::Test {
+protected:
+    void SetUp() override {
+        ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK);
+        log = std::make_unique<CHostLog>();
+    }
+    void TearDown() override {
+        log.reset();
+        TONEWRIGHT_DeInitAll();
+    }
+
+    CPluginFolder plugins;
+    std::unique_ptr<CHostLog> log;
+};
+
+} // namespace tests
