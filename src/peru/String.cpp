@@ -82,13 +82,13 @@ CString::CString(const P<ICharEncoding>& encoding, const void* data, int32_t byt
         m_terminated = true;
     }
     m_owner = storage != EStringStorage::refer;
-    SStringView view = getView();
+    SStringView all = view();
     if (m_length < 0) {
-        text::count(view);
-        m_length = view.length;
-        m_wellFormed = view.wellFormed;
+        text::count(all);
+        m_length = all.length;
+        m_wellFormed = all.wellFormed;
     } else {
-        m_wellFormed = text::getFixedWidth(view) != 0;
+        m_wellFormed = text::getFixedWidth(all) != 0;
     }
 }
 
@@ -155,33 +155,21 @@ P<const IString> CString::getSliceRoot() const {
 
 // --- Positions ---
 
-SStringPos CString::resolve(SStringPos pos) const {
-    if (pos.index < 0 || pos.index >= m_length) return getEnd();
-    if (pos.offset < 0 || pos.offset > m_byteSize) pos.offset = text::getOffset(getView(), pos.index);
-    return pos;
-}
-
-SStringView CString::getRange(SStringPos start, SStringPos end) const {
-    SStringView view = getView();
-    if (start.index >= end.index || start.offset > end.offset) end = start;
-    view.data += start.offset;
-    view.byteSize = end.offset - start.offset;
-    view.length = end.index - start.index;
-    return view;
+int32_t CString::getOffset(int32_t index) const {
+    return text::getOffset(view(), index);
 }
 
 SStringPos CString::getPosition(int32_t index) const {
     if (index < 0 || index >= m_length) return kStringEnd;
-    return {index, text::getOffset(getView(), index)};
+    return {index, text::getOffset(view(), index)};
 }
 
 SStringPos CString::movePosition(SStringPos pos, int32_t count) const {
     pos = resolve(pos);
     int64_t index = static_cast<int64_t>(pos.index) + count;
     if (index < 0 || index >= m_length) return kStringEnd;
-    SStringView view = getView();
     int32_t target = static_cast<int32_t>(index);
-    if (text::getFixedWidth(view) != 0 || target < -static_cast<int64_t>(count)) return getPosition(target);
+    if (text::getFixedWidth(view()) != 0 || target < -static_cast<int64_t>(count)) return getPosition(target);
     if (count >= 0) {
         SStringView rest = getRange(pos, getEnd());
         return {target, pos.offset + text::getOffset(rest, count)};

@@ -97,9 +97,7 @@ public:
     const uint8_t* getData() const override { return m_data; }
     int32_t getDataSize() const override { return m_byteSize; }
     bool isTerminated() const override { return m_terminated; }
-    SStringView getView() const override {
-        return {m_encoding.get(), m_encodingId, m_byteSize, m_data, m_length, m_wellFormed};
-    }
+    SStringView getView() const override { return view(); }
 
     // A string that adopts a terminated block from std::malloc; `length` -1 is counted.
     static P<IString> adopt(const P<ICharEncoding>& encoding, uint8_t* block, int32_t byteSize,
@@ -112,10 +110,23 @@ protected:
     virtual P<const IString> getSliceRoot() const;
 
 private:
+    SStringView view() const {
+        return {m_encoding.get(), m_encodingId, m_byteSize, m_data, m_length, m_wellFormed};
+    }
     SStringPos getEnd() const { return {m_length, m_byteSize}; }
     // With an index from 0 to the length and the offset that belongs to it.
-    SStringPos resolve(SStringPos pos) const;
-    SStringView getRange(SStringPos start, SStringPos end) const; // of resolved positions
+    SStringPos resolve(SStringPos pos) const {
+        if (pos.index < 0 || pos.index >= m_length) return getEnd();
+        if (pos.offset < 0 || pos.offset > m_byteSize) pos.offset = getOffset(pos.index);
+        return pos;
+    }
+    int32_t getOffset(int32_t index) const;
+    // Of resolved positions.
+    SStringView getRange(SStringPos start, SStringPos end) const {
+        if (start.index >= end.index || start.offset > end.offset) end = start;
+        return {m_encoding.get(),        m_encodingId, end.offset - start.offset, m_data + start.offset,
+                end.index - start.index, m_wellFormed};
+    }
     P<IString> getSlice(SStringPos start, SStringPos end) const;
     SStringPos findView(const SStringView& text, SStringPos start, SStringPos end) const;
     SStringPos findLastView(const SStringView& text, SStringPos start, SStringPos end) const;

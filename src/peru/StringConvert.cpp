@@ -55,7 +55,7 @@ std::u16string CString::toStdU16String(const CStringArg& arg) {
 
 P<IString> CString::convertTo(const P<ICharEncoding>& encoding, char32_t substitute) const {
     if (encoding->getId() == m_encodingId) return getTerminated();
-    return text::convert(encoding, getView(), substitute);
+    return text::convert(encoding, view(), substitute);
 }
 
 P<IString> CString::toCPString() const {
@@ -79,7 +79,7 @@ P<IString> CString::toLatin1String() const {
 
 P<IString> CString::getTerminated() const {
     if (m_terminated) return P<IString>::share(const_cast<CString*>(this));
-    return fromView(getView());
+    return fromView(view());
 }
 
 int64_t parseInteger(const CStringArg& text, int base) {

@@ -27,7 +27,7 @@ P<IString> CString::edit(SStringPos start, SStringPos end, const SStringView& in
     for (;; raw = false) {
         int64_t needed = raw ? inserted.byteSize : text::getEncodedSize(*m_encoding, inserted);
         if (needed < 0) {
-            P<IString> copy = text::convert(getUTF8CharEncoding(), getView(), '?');
+            P<IString> copy = text::convert(getUTF8CharEncoding(), view(), '?');
             SStringPos from = start.index >= copy->getLength() ? kStringEnd : copy->getPosition(start.index);
             return copy->replaceRange(from, end.index - start.index, CStringArg(inserted));
         }
@@ -83,7 +83,7 @@ P<IString> CString::replace(const CStringArg& search, const CStringArg& replacem
 
     int64_t needed = text::getEncodedSize(*m_encoding, inserted);
     if (needed < 0) {
-        P<IString> copy = text::convert(getUTF8CharEncoding(), getView(), '?');
+        P<IString> copy = text::convert(getUTF8CharEncoding(), view(), '?');
         if (copy->getLength() == m_length)
             return copy->replace(search, replacement, copy->getPosition(start.index),
                                  copy->getPosition(end.index));

@@ -11,19 +11,6 @@ namespace text {
 
 namespace {
 
-// First place of a unit in fixed units, -1 if none. Blocks of 16 are tested without a branch.
-template <class U> int32_t findUnit(SUnits<U> units, int32_t count, U wanted) {
-    int32_t i = 0;
-    for (; i + 16 <= count; i += 16) {
-        uint32_t found = 0;
-        for (int32_t k = 0; k < 16; ++k) found |= units[i + k] == wanted;
-        if (found) break;
-    }
-    for (; i < count; ++i)
-        if (units[i] == wanted) return i;
-    return -1;
-}
-
 template <class U>
 int32_t findUnits(SUnits<U> text, int32_t count, const uint8_t* wanted, int32_t wantedCount) {
     U first = SUnits<U>{wanted}[0];
@@ -32,7 +19,7 @@ int32_t findUnits(SUnits<U> text, int32_t count, const uint8_t* wanted, int32_t 
         int32_t at = findUnit(text + start, count - wantedCount + 1 - start, first);
         if (at < 0) return -1;
         start += at;
-        if (std::memcmp((text + start).data, wanted, wantedSize) == 0) return start;
+        if (wantedCount == 1 || std::memcmp((text + start).data, wanted, wantedSize) == 0) return start;
     }
     return -1;
 }
@@ -81,6 +68,35 @@ public:
             m_size = wanted.byteSize;
             return;
         }
+        // One byte a character on both sides is the same bytes in both encodings; beside UTF-8 with longer
+        // characters that holds for ASCII.
+        if (getFixedWidth(wanted) == 1 && getUnitSize(text.encodingId) == 1 &&
+            (getFixedWidth(text) == 1 || isASCII(wanted))) {
+            m_data = wanted.data;
+            m_size = wanted.byteSize;
+            return;
+        }
+        if (getFixedWidth(wanted) == 1 && text.encodingId == ICharEncoding::kUTF16 &&
+            wanted.length * 2 <= static_cast<int32_t>(sizeof(m_buffer))) {
+            for (; m_size < wanted.length * 2; m_size += 2) {
+                uint16_t unit = wanted.data[m_size / 2];
+                std::memcpy(m_buffer + m_size, &unit, sizeof(unit));
+            }
+            return;
+        }
+        encodeBySteps(text, wanted);
+    }
+
+    EState getState() const { return m_state; }
+    const uint8_t* getData() const { return m_data; }
+    int32_t getSize() const { return m_size; }
+
+private:
+    static bool isASCII(const SStringView& view) {
+        return !hasAny(SUnits<uint8_t>{view.data}, view.byteSize, [](uint8_t byte) { return byte >= 0x80; });
+    }
+
+    void encodeBySteps(const SStringView& text, const SStringView& wanted) {
         CStringWindow window(*wanted.encoding, wanted.data, wanted.byteSize, 0);
         for (char32_t ch, back; window.next(ch);) {
             int32_t end = text.encoding->encodeChar(ch, m_buffer, sizeof(m_buffer), m_size);
@@ -97,11 +113,6 @@ public:
         }
     }
 
-    EState getState() const { return m_state; }
-    const uint8_t* getData() const { return m_data; }
-    int32_t getSize() const { return m_size; }
-
-private:
     EState m_state = ready;
     const uint8_t* m_data = m_buffer;
     int32_t m_size = 0;

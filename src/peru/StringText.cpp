@@ -11,6 +11,28 @@ namespace peru::text {
 
 namespace {
 
+// Units from `pos` on that are one character each, found a block at a time.
+template <class Rules> int32_t skipPlainBlocks(const uint8_t* data, int32_t byteSize, int32_t pos) {
+    if constexpr (std::is_same_v<Rules, SUTF8Rules>) {
+        uint64_t block;
+        for (; byteSize - pos >= 8; pos += 8) {
+            std::memcpy(&block, data + pos, 8);
+            if (block & 0x8080808080808080) break;
+        }
+    } else if constexpr (std::is_same_v<Rules, SUTF16Rules>) {
+        for (; byteSize - pos >= kScanBlock * 2; pos += kScanBlock * 2)
+            if (hasAny(SUnits<uint16_t>{data + pos}, kScanBlock,
+                       [](uint16_t u) { return (u & 0xF800) == 0xD800; }))
+                break;
+    } else if constexpr (std::is_same_v<Rules, SUTF32Rules>) {
+        for (; byteSize - pos >= kScanBlock * 4; pos += kScanBlock * 4)
+            if (hasAny(SUnits<uint32_t>{data + pos}, kScanBlock,
+                       [](uint32_t u) { return u > kMaxCodePoint; }))
+                break;
+    }
+    return pos;
+}
+
 // Over-long forms that the decoder lets pass (U+0040 to U+007F behind 0xC1) make two spellings of one text,
 // so such text does not count as well-formed.
 template <class Rules> void countBy(SStringView& view) {
@@ -18,40 +40,111 @@ template <class Rules> void countBy(SStringView& view) {
     bool wellFormed = true;
     char32_t ignored;
     for (int32_t pos = 0; pos < view.byteSize;) {
-        if constexpr (std::is_same_v<Rules, SUTF8Rules>) {
-            uint64_t block;
-            while (view.byteSize - pos >= 8) {
-                std::memcpy(&block, view.data + pos, 8);
-                if (block & 0x8080808080808080) break;
-                count += 8;
-                pos += 8;
-            }
-            if (pos == view.byteSize) break;
-            wellFormed &= view.data[pos] != 0xC1;
+        int32_t next = skipPlainBlocks<Rules>(view.data, view.byteSize, pos);
+        count += (next - pos) / Rules::kUnit;
+        // What stopped the blocks is near: a run of steps costs less than to look for blocks at every one.
+        int32_t stop = std::min(next + kScanBlock, view.byteSize);
+        for (pos = next; pos < stop;) {
+            if constexpr (std::is_same_v<Rules, SUTF8Rules>) wellFormed &= view.data[pos] != 0xC1;
+            int32_t length = Rules::decode(view.data + pos, view.byteSize - pos, ignored);
+            count += length > 0;
+            wellFormed &= length > 0;
+            pos += length > 0 ? length : Rules::kUnit;
         }
-        int32_t length = Rules::decode(view.data + pos, view.byteSize - pos, ignored);
-        count += length > 0;
-        wellFormed &= length > 0;
-        pos += length > 0 ? length : Rules::kUnit;
     }
     view.length = count;
     view.wellFormed = wellFormed;
 }
 
-template <class Rules> void encodeBy(const SStringView& text, uint8_t* out) {
+// Gives every character of a text to `f` until that returns false.
+template <class F> void forEach(const SStringView& text, F&& f) {
+    bool known = withRules(text.encodingId, [&](auto rules) {
+        using Rules = decltype(rules);
+        char32_t ch;
+        for (int32_t pos = 0; pos < text.byteSize;) {
+            int32_t length = Rules::decode(text.data + pos, text.byteSize - pos, ch);
+            if (length > 0 && !f(ch)) return;
+            pos += length > 0 ? length : Rules::kUnit;
+        }
+    });
+    if (known) return;
     CStringWindow window(*text.encoding, text.data, text.byteSize, 0);
-    for (char32_t ch; window.next(ch);) out += Rules::write(ch, out);
+    for (char32_t ch; window.next(ch);)
+        if (!f(ch)) return;
+}
+
+template <class Rules> void encodeBy(const SStringView& text, uint8_t* out) {
+    forEach(text, [&](char32_t ch) {
+        out += Rules::write(ch, out);
+        return true;
+    });
+}
+
+// The common conversion, eight ASCII characters at a time where there are so many.
+void encodeUTF8AsUTF16(const SStringView& text, uint8_t* out) {
+    const uint8_t* data = text.data;
+    const uint8_t* end = data + text.byteSize;
+    char32_t ch = 0;
+    while (data < end) {
+        uint64_t block;
+        while (end - data >= 8) {
+            std::memcpy(&block, data, 8);
+            if (block & 0x8080808080808080) break;
+            uint16_t units[8];
+            for (int i = 0; i < 8; ++i) units[i] = data[i];
+            std::memcpy(out, units, 16);
+            data += 8;
+            out += 16;
+        }
+        const uint8_t* stop = end - data > 8 ? data + 8 : end;
+        while (data < stop) {
+            int32_t length = 1;
+            if (text.wellFormed && *data < 0xF0) {
+                // What counting has checked need not be checked again.
+                char32_t lead = *data;
+                length = lead < 0x80 ? 1 : lead < 0xE0 ? 2 : 3;
+                uint16_t unit = static_cast<uint16_t>(
+                    length == 1   ? lead
+                    : length == 2 ? (lead & 0x1F) << 6 | (data[1] & 0x3F)
+                                  : (lead & 0x0F) << 12 | (data[1] & 0x3F) << 6 | (data[2] & 0x3F));
+                std::memcpy(out, &unit, sizeof(unit));
+                out += sizeof(unit);
+            } else {
+                length = SUTF8Rules::decode(data, static_cast<int32_t>(end - data), ch);
+                if (length > 0) out += SUTF16Rules::write(ch, out);
+            }
+            data += length > 0 ? length : 1;
+        }
+    }
 }
 
 int64_t getEncodedSizeBySteps(const ICharEncoding& encoding, const SStringView& text) {
-    CStringWindow window(*text.encoding, text.data, text.byteSize, 0);
     int64_t total = 0;
-    for (char32_t ch; window.next(ch);) {
+    bool known = withRules(encoding.getId(), [&](auto rules) {
+        forEach(text, [&](char32_t ch) {
+            int32_t size = decltype(rules)::getSize(ch);
+            total = size == 0 ? -1 : total + size;
+            return size != 0;
+        });
+    });
+    if (known) return total;
+    forEach(text, [&](char32_t ch) {
         int32_t size = encoding.getEncodedSize(ch);
-        if (size == 0) return -1;
-        total += size;
-    }
+        total = size == 0 ? -1 : total + size;
+        return size != 0;
+    });
     return total;
+}
+
+// Of well-formed UTF-8 in UTF-16, -1 when that takes a closer look because of surrogates.
+int64_t getUTF16SizeOfUTF8(const SStringView& text) {
+    int32_t pairs = 0;
+    uint8_t suspect = 0;
+    for (int32_t i = 0; i < text.byteSize; ++i) {
+        pairs += text.data[i] >= 0xF0;
+        suspect |= static_cast<uint8_t>(text.data[i] == 0xED);
+    }
+    return suspect ? -1 : 2 * (static_cast<int64_t>(text.length) + pairs);
 }
 
 template <class A, class B> void widen(SUnits<A> from, int32_t count, uint8_t* out) {
@@ -127,6 +220,9 @@ int64_t getEncodedSize(const ICharEncoding& encoding, const SStringView& text) {
         for (int32_t i = 0; i < text.byteSize; ++i) high += text.data[i] >> 7;
         return static_cast<int64_t>(text.byteSize) + high;
     }
+    if (text.wellFormed && to == ICharEncoding::kUTF32) return static_cast<int64_t>(text.length) * 4;
+    if (text.wellFormed && to == ICharEncoding::kUTF16 && text.encodingId == ICharEncoding::kUTF8)
+        if (int64_t size = getUTF16SizeOfUTF8(text); size >= 0) return size;
     return getEncodedSizeBySteps(encoding, text);
 }
 
@@ -142,16 +238,9 @@ void encode(const ICharEncoding& encoding, const SStringView& text, uint8_t* out
         if (to == ICharEncoding::kUTF32) return widen<uint8_t, uint32_t>(units, text.length, out);
         if (to == ICharEncoding::kLatin1) return widen<uint8_t, uint8_t>(units, text.length, out);
     }
-    switch (to) {
-    case ICharEncoding::kUTF8:
-        return encodeBy<SUTF8Rules>(text, out);
-    case ICharEncoding::kUTF16:
-        return encodeBy<SUTF16Rules>(text, out);
-    case ICharEncoding::kUTF32:
-        return encodeBy<SUTF32Rules>(text, out);
-    case ICharEncoding::kLatin1:
-        return encodeBy<SLatin1Rules>(text, out);
-    }
+    if (to == ICharEncoding::kUTF16 && text.encodingId == ICharEncoding::kUTF8)
+        return encodeUTF8AsUTF16(text, out);
+    if (withRules(to, [&](auto rules) { encodeBy<decltype(rules)>(text, out); })) return;
     CStringWindow window(*text.encoding, text.data, text.byteSize, 0);
     int32_t pos = 0;
     for (char32_t ch; window.next(ch);) pos = encoding.encodeChar(ch, out, INT_MAX, pos);
@@ -171,7 +260,10 @@ P<IString> convert(const P<ICharEncoding>& encoding, const SStringView& text, ch
     if (size >= 0) {
         uint8_t* block = allocate(*encoding, size);
         encode(*encoding, text, block);
-        return CString::adopt(encoding, block, static_cast<int32_t>(size));
+        // Only UTF-8 has characters that are written and not read again.
+        bool known = text.length >= 0 && getUnitSize(encoding->getId()) != 0 &&
+                     (encoding->getId() != ICharEncoding::kUTF8 || size == text.length);
+        return CString::adopt(encoding, block, static_cast<int32_t>(size), known ? text.length : -1, known);
     }
     size = 0;
     int32_t substituteSize = encoding->getEncodedSize(substitute);

@@ -3,6 +3,7 @@
 
 #include "peru/CharEncodingRules.h"
 #include "peru/IString.h"
+#include "peru/StringScan.h"
 
 #include <algorithm>
 #include <utility>
@@ -16,19 +17,6 @@ inline int32_t getFixedWidth(const SStringView& view) {
     return unit != 0 && view.length * unit == view.byteSize ? unit : 0;
 }
 
-// Fixed-width text as an array of its code units, aligned or not.
-template <class U> struct SUnits {
-    const uint8_t* data;
-    U operator[](int32_t i) const {
-        U unit;
-        std::memcpy(&unit, data + static_cast<ptrdiff_t>(i) * static_cast<ptrdiff_t>(sizeof(U)), sizeof(U));
-        return unit;
-    }
-    SUnits operator+(int32_t i) const {
-        return {data + static_cast<ptrdiff_t>(i) * static_cast<ptrdiff_t>(sizeof(U))};
-    }
-};
-
 // Calls `f` with the units of a fixed-width text.
 template <class F> decltype(auto) withUnits(const SStringView& view, int32_t width, F&& f) {
     switch (width) {
@@ -39,6 +27,25 @@ template <class F> decltype(auto) withUnits(const SStringView& view, int32_t wid
     default:
         return f(SUnits<uint32_t>{view.data});
     }
+}
+
+// Calls `f` with the rules of an encoding that has any; false for the code page.
+template <class F> bool withRules(uint32_t encodingId, F&& f) {
+    switch (encodingId) {
+    case ICharEncoding::kUTF8:
+        f(SUTF8Rules());
+        return true;
+    case ICharEncoding::kUTF16:
+        f(SUTF16Rules());
+        return true;
+    case ICharEncoding::kUTF32:
+        f(SUTF32Rules());
+        return true;
+    case ICharEncoding::kLatin1:
+        f(SLatin1Rules());
+        return true;
+    }
+    return false;
 }
 
 // Fills in length and wellFormed.
