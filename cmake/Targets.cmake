@@ -68,6 +68,21 @@ function(tw_benchmark name)
     target_link_libraries(${name} PRIVATE ${ARGN} benchmark::benchmark benchmark::benchmark_main)
 endfunction()
 
+# tw_fuzzer(NAME source... LIBRARIES lib...): a libFuzzer target; its seeds are in fuzz/corpus/NAME. The test runs
+# it over the seeds and a bounded number of inputs made from them, which are kept in the build folder.
+function(tw_fuzzer name)
+    cmake_parse_arguments(arg "" "" "LIBRARIES" ${ARGN})
+    add_executable(${name} ${arg_UNPARSED_ARGUMENTS})
+    target_link_libraries(${name} PRIVATE ${arg_LIBRARIES})
+    target_compile_options(${name} PRIVATE -fsanitize=fuzzer)
+    target_link_options(${name} PRIVATE -fsanitize=fuzzer)
+    set(found ${CMAKE_BINARY_DIR}/corpus/${name})
+    file(MAKE_DIRECTORY ${found})
+    enable_testing()
+    add_test(NAME ${name} COMMAND ${name} -runs=50000 -max_len=4096 ${found} ${CMAKE_SOURCE_DIR}/fuzz/corpus/${name})
+    set_tests_properties(${name} PROPERTIES LABELS fuzz TIMEOUT 600)
+endfunction()
+
 # tw_plugin(NAME lib...): a media plug-in of the calling folder's sources, found beside the front library.
 function(tw_plugin name)
     tw_sources(sources)
