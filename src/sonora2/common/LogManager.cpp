@@ -8,8 +8,10 @@
 
 #include <tinyxml.h>
 
+#include <algorithm>
 #include <chrono>
 #include <string>
+#include <string_view>
 
 namespace sonora2::common {
 
@@ -31,25 +33,33 @@ std::string formatTime(int64_t milliseconds) {
         static_cast<int>(clock.seconds().count()), static_cast<int>(clock.subseconds().count())));
 }
 
-// Messages carry names from files and devices. What XML cannot hold, even escaped, becomes '?', and malformed
-// bytes are left out: one bad name must not spoil the document.
-std::string makeReadable(const P<peru::IString>& text) {
-    std::string readable;
-    if (!text) return readable;
-    for (peru::SStringPos pos = peru::kStringBegin;;) {
-        char32_t ch = text->getCharAndAdvance(pos);
-        if (!pos.isFound()) return readable;
-        const bool allowed = ch == '\t' || ch == '\n' || ch == '\r' || (ch >= 0x20 && ch < 0xd800) ||
-                             (ch >= 0xe000 && ch < 0xfffe) || (ch >= 0x10000 && ch <= 0x10ffff);
-        if (!allowed) ch = '?';
-        if (ch < 0x80) {
-            readable += static_cast<char>(ch);
-            continue;
-        }
-        const int following = ch < 0x800 ? 1 : ch < 0x10000 ? 2 : 3;
-        readable += static_cast<char>((0xff00 >> (following + 1)) | (ch >> (6 * following)));
-        for (int i = following - 1; i >= 0; --i) readable += static_cast<char>(0x80 | (ch >> (6 * i) & 0x3f));
+// Bytes of the well-formed UTF-8 sequence at the start of the text that XML may hold; 0 where there is none.
+// Strings hand out their bytes as they came, so nothing can be taken for granted.
+size_t measureCharacter(std::string_view text) {
+    const auto byte = [&](size_t index) { return static_cast<uint8_t>(text[index]); };
+    const uint8_t lead = byte(0);
+    if (lead < 0x80) return lead >= 0x20 || lead == '\t' || lead == '\n' || lead == '\r' ? 1 : 0;
+    const size_t size = lead >= 0xf0 ? 4 : lead >= 0xe0 ? 3 : 2;
+    if (lead < 0xc2 || lead > 0xf4 || text.size() < size) return 0;
+    char32_t ch = lead & (0xff >> (size + 1));
+    for (size_t i = 1; i < size; ++i) {
+        if ((byte(i) & 0xc0) != 0x80) return 0;
+        ch = ch << 6 | (byte(i) & 0x3f);
     }
+    const char32_t smallest = size == 2 ? 0x80 : size == 3 ? 0x800 : 0x10000;
+    const bool surrogate = ch >= 0xd800 && ch <= 0xdfff;
+    return ch < smallest || ch > 0x10ffff || surrogate || ch == 0xfffe || ch == 0xffff ? 0 : size;
+}
+
+// Messages carry names from files and devices: one bad name must not spoil the document.
+std::string makeReadable(const P<peru::IString>& text) {
+    std::string readable = CString::toStdString(text);
+    for (size_t at = 0; at < readable.size();) {
+        const size_t size = measureCharacter(std::string_view(readable).substr(at));
+        if (size == 0) readable[at] = '?';
+        at += std::max<size_t>(size, 1);
+    }
+    return readable;
 }
 
 } // namespace
