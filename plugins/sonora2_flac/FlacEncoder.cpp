@@ -2,7 +2,6 @@
 
 #include "support/Pcm.h"
 
-#include <FLAC/metadata.h>
 #include <algorithm>
 #include <array>
 #include <cmath>
@@ -28,11 +27,6 @@ constexpr int kHeaderBytes =
     4 + kBlockHeaderBytes + 34 + 2 * kBlockHeaderBytes + kSeekPoints * kSeekPointBytes + kPaddingBytes + 48;
 constexpr double kTypicalRatio = 0.6;
 
-struct SMetadataDeleter {
-    void operator()(FLAC__StreamMetadata* block) const { FLAC__metadata_object_delete(block); }
-};
-using MetadataBlock = std::unique_ptr<FLAC__StreamMetadata, SMetadataDeleter>;
-
 void putBigEndian(uint8_t* at, uint64_t value, int bytes) {
     for (int i = bytes - 1; i >= 0; --i, value >>= 8) at[i] = static_cast<uint8_t>(value);
 }
@@ -56,13 +50,13 @@ void CFlacEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
     m_planes.resize(static_cast<size_t>(kBlockFrames) * m_format.channels);
     m_seekSpacing = int64_t{kSeekSeconds} * m_format.rate;
     m_encoder.reset(FLAC__stream_encoder_new());
-    MetadataBlock seekTable(FLAC__metadata_object_new(FLAC__METADATA_TYPE_SEEKTABLE));
-    MetadataBlock padding(FLAC__metadata_object_new(FLAC__METADATA_TYPE_PADDING));
-    if (!m_encoder || !seekTable || !padding ||
-        !FLAC__metadata_object_seektable_template_append_placeholders(seekTable.get(), kSeekPoints))
+    m_seekTable.reset(FLAC__metadata_object_new(FLAC__METADATA_TYPE_SEEKTABLE));
+    m_padding.reset(FLAC__metadata_object_new(FLAC__METADATA_TYPE_PADDING));
+    if (!m_encoder || !m_seekTable || !m_padding ||
+        !FLAC__metadata_object_seektable_template_append_placeholders(m_seekTable.get(), kSeekPoints))
         throw std::bad_alloc();
-    padding->length = kPaddingBytes;
-    std::array<FLAC__StreamMetadata*, 2> blocks{seekTable.get(), padding.get()};
+    m_padding->length = kPaddingBytes;
+    std::array<FLAC__StreamMetadata*, 2> blocks{m_seekTable.get(), m_padding.get()};
 
     FLAC__StreamEncoder* encoder = m_encoder.get();
     const uint32_t rate = static_cast<uint32_t>(m_format.rate);

@@ -3,6 +3,7 @@
 
 #include "support/Encoder.h"
 
+#include <FLAC/metadata.h>
 #include <FLAC/stream_encoder.h>
 
 #include <vector>
@@ -26,6 +27,10 @@ private:
     struct SDeleter {
         void operator()(FLAC__StreamEncoder* encoder) const { FLAC__stream_encoder_delete(encoder); }
     };
+    struct SBlockDeleter {
+        void operator()(FLAC__StreamMetadata* block) const { FLAC__metadata_object_delete(block); }
+    };
+    using MetadataBlock = std::unique_ptr<FLAC__StreamMetadata, SBlockDeleter>;
     struct SSeekPoint {
         int64_t frame;
         int64_t offset; // bytes behind the first frame's header
@@ -42,6 +47,8 @@ private:
     void writeSeekTable();
     [[noreturn]] void failEncoding();
 
+    MetadataBlock m_seekTable; // the encoder uses both up to its end
+    MetadataBlock m_padding;
     std::unique_ptr<FLAC__StreamEncoder, SDeleter> m_encoder;
     COutputFile* m_file = nullptr; // null outside a job: nothing is written then
     SPcmFormat m_format;

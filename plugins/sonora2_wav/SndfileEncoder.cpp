@@ -53,12 +53,12 @@ const CSndfileEncoder::SContainer& CSndfileEncoder::findContainer(const std::str
     static constexpr std::array<SContainer, 8> kContainers{{
         {"aif", SF_FORMAT_AIFF, true, true, 54, 2},
         {"aiff", SF_FORMAT_AIFF, true, true, 54, 2},
-        {"aifc", SF_FORMAT_AIFF | SF_ENDIAN_LITTLE, true, true, 54, 2},
+        {"aifc", SF_FORMAT_AIFF, true, true, 54, 2},
         {"au", SF_FORMAT_AU, true, true, 24, 1},
         {"snd", SF_FORMAT_AU, true, true, 24, 1},
-        {"caf", SF_FORMAT_CAF, true, false, 4096, 1},
-        {"w64", SF_FORMAT_W64, false, false, 104, 8},
-        {"rf64", SF_FORMAT_RF64, false, false, 104, 1},
+        {"caf", SF_FORMAT_CAF, true, false, 4096, 2},
+        {"w64", SF_FORMAT_W64, false, false, 104, 1},
+        {"rf64", SF_FORMAT_RF64, false, false, 104, 2},
     }};
     const auto found = std::ranges::find(kContainers, extension, &SContainer::extension);
     return found != kContainers.end() ? *found : kContainers.front();
@@ -76,8 +76,6 @@ SF_INFO CSndfileEncoder::describe(const SPcmFormat& format) const {
         info.format |= m_container.signed8 ? SF_FORMAT_PCM_S8 : SF_FORMAT_PCM_U8;
     else
         info.format |= kWidths[static_cast<size_t>(format.bytesPerSample - 2)];
-    // 8 bit samples have no byte order, and some containers take none for them.
-    if (format.bytesPerSample == 1) info.format &= ~SF_FORMAT_ENDMASK;
     return info;
 }
 
@@ -131,9 +129,31 @@ void CSndfileEncoder::write(const uint8_t* pcm, int frames) {
 }
 
 void CSndfileEncoder::finish() {
-    if (sf_close(m_handle.release()) == 0) return;
-    m_file->throwFailure();
-    fail("could not complete %s", m_file->getFile().getDisplayName());
+    if (sf_close(m_handle.release()) != 0) {
+        m_file->throwFailure();
+        fail("could not complete %s", m_file->getFile().getDisplayName());
+    }
+    if (m_bytes % 2 != 0) correctSizes();
+}
+
+// The library counts the byte that fills an odd length as sound: readers would find one sample too many.
+void CSndfileEncoder::correctSizes() {
+    constexpr int kAiffFrames = 22; // places of the counts in the library's headers
+    constexpr int kAiffDataSize = 42;
+    constexpr int kCafDataSize = 4084;
+    const auto put = [this](int64_t at, uint64_t value, int bytes) {
+        std::array<uint8_t, 8> bigEndian{};
+        for (int i = bytes - 1; i >= 0; --i, value >>= 8)
+            bigEndian[static_cast<size_t>(i)] = static_cast<uint8_t>(value);
+        m_file->seek(at);
+        m_file->write(bigEndian.data(), static_cast<size_t>(bytes));
+    };
+    if (m_container.format == SF_FORMAT_AIFF) {
+        put(kAiffFrames, static_cast<uint64_t>(m_bytes / m_format.frameBytes()), 4);
+        put(kAiffDataSize, static_cast<uint64_t>(m_bytes + 8), 4);
+    } else if (m_container.format == SF_FORMAT_CAF) {
+        put(kCafDataSize, static_cast<uint64_t>(m_bytes + 4), 8);
+    }
 }
 
 int64_t CSndfileEncoder::estimateBytes(double seconds, const SEncoderSettings& settings) const {

@@ -23,6 +23,7 @@ private:
     struct SContainer;
 
     static const SContainer& findContainer(const std::string& extension);
+    void correctSizes();
     SF_INFO describe(const SPcmFormat& format) const;
 
     const SContainer& m_container;

@@ -16,9 +16,9 @@ constexpr int kChunkBytes = 256 * 1024; // wide formats get fewer frames
 // Own frames that the filter is run through before the first one that is wanted behind a seek; in downward
 // conversions it is as many times longer as the rate falls. Its length is 16 samples a side.
 constexpr int64_t kRunUp = 64;
-// Beyond these there is no filter.
+// Beyond these lie damaged headers rather than sound.
 constexpr int kMaxRatio = 1024;
-constexpr int kMaxRate = 1 << 24;
+constexpr int kMaxRate = 1 << 20;
 
 // round(value * numerator / denominator) for values of any file that fits a disk.
 int64_t scale(int64_t value, int64_t numerator, int64_t denominator) {

@@ -146,6 +146,7 @@ int64_t CDecoderSource::toFrame(double seconds) const {
 
 void CDecoderSource::restartAt(int64_t frame) {
     m_readAhead.reset();
+    m_delivering = m_total; // at the end, should the seek fail
     m_producer->setOrigin(toFrame(m_startTime));
     m_producer->seek(frame);
     m_delivering = frame;
