@@ -1,0 +1,134 @@
+// Loaded plug-ins, signals, and runs through sources and formats.
+#pragma once
+
+#include "peru/Errors.h"
+#include "peru/IPathes.h"
+#include "plugins/FormatCases.h"
+#include "sonora2/audio/AudioChunk.h"
+#include "sonora2/audio/SonoraContextAudio.h"
+#include "sonora2/common/PluginHandler.h"
+#include "support/TempFolder.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <cstring>
+#include <random>
+#include <set>
+#include <stdexcept>
+#include <string>
+
+namespace tests {
+
+using peru::P;
+using sonora2::common::IAudioFormat;
+using sonora2::common::IAudioSource;
+
+struct SShape {
+    int rate = 44100;
+    int channels = 2;
+    int bytes = 2;
+    int frameBytes() const { return channels * bytes; }
+};
+
+// Standard output of a command; throws when it fails.
+inline std::string run(const std::string& command) {
+    std::FILE* pipe = popen((command + " 2>/dev/null").c_str(), "r");
+    std::string out;
+    char buffer[65536];
+    for (size_t got; (got = std::fread(buffer, 1, sizeof(buffer), pipe)) > 0;) out.append(buffer, got);
+    if (pclose(pipe) != 0) throw std::runtime_error("failed: " + command);
+    return out;
+}
+
+class CPluginTest : public ::testing::Test {
+protected:
+    CPluginTest() : context(peru::make<sonora2::audio::CSonoraContextAudio>()) {
+        context->getBaseDirectories()->setPluginDirectory(
+            peru::getPathes()->fromPlatformPath(TONEWRIGHT_PLUGIN_DIR "/"));
+        std::set<std::string> names;
+        for (const SFormatCase& format : kFormatCases)
+            if (names.insert(format.plugin).second) context->addPluginName(format.plugin);
+        handler = peru::make<sonora2::common::CPluginHandler>(context);
+    }
+
+    static P<peru::IURI> toURI(const std::filesystem::path& path) {
+        return peru::getPathes()->fromPlatformPath(peru::CString::fromUTF8(path.string()));
+    }
+
+    P<IAudioSource> openSource(const std::filesystem::path& path, const SShape& shape) {
+        return handler->createAudioSource(toURI(path), shape.rate, shape.channels, shape.bytes, true);
+    }
+    P<IAudioFormat> makeFormat(const std::filesystem::path& path, const SShape& shape) {
+        return handler->createAudioFormat(toURI(path), shape.rate, shape.channels, shape.bytes);
+    }
+    P<sonora2::audio::IAudioChunk> makeChunk(const std::string& pcm) {
+        P<peru::IMemoryBlock> block = context->getMemoryManager()->getBlock(pcm.size());
+        std::memcpy(block->getData(), pcm.data(), pcm.size());
+        return peru::make<sonora2::audio::CAudioChunk>(0.0, block);
+    }
+
+    // Writes PCM in chunks of changing length.
+    void writeAll(const P<IAudioFormat>& format, const std::string& pcm, const SShape& shape) {
+        format->open();
+        size_t frames = 1;
+        for (size_t at = 0; at < pcm.size(); frames = frames * 7 % 6007) {
+            const size_t size = std::min(pcm.size() - at, frames * shape.frameBytes());
+            format->writeAudioChunk(makeChunk(pcm.substr(at, size)));
+            at += size;
+        }
+        format->close();
+    }
+    void writeFile(const std::filesystem::path& path, const std::string& pcm, const SShape& shape) {
+        P<IAudioFormat> format = makeFormat(path, shape);
+        if (!format) throw std::runtime_error("no plug-in writes " + path.string());
+        writeAll(format, pcm, shape);
+    }
+
+    // All that a source has left, its time line checked.
+    static std::string readAll(const P<IAudioSource>& source, size_t limit = SIZE_MAX) {
+        std::string pcm;
+        const int frameBytes = source->getChannelCount() * source->getBytesPerSample();
+        double time = -1.0;
+        while (pcm.size() < limit && !source->isEOF()) {
+            P<sonora2::audio::IAudioChunk> chunk = source->getNextAudioChunk();
+            if (!chunk) {
+                EXPECT_TRUE(source->isEOF()) << "an empty chunk before the end";
+                break;
+            }
+            if (time >= 0.0) {
+                EXPECT_NEAR(time, chunk->getTimestamp(), 1e-9) << "a hole between chunks";
+            }
+            time = chunk->getTimestamp() +
+                   static_cast<double>(chunk->getSize() / frameBytes) / source->getSampleRate();
+            pcm.append(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
+        }
+        return pcm;
+    }
+
+    CTempFolder folder;
+    P<sonora2::audio::CSonoraContextAudio> context;
+    P<sonora2::common::CPluginHandler> handler; // outlives every source and format of a test
+};
+
+// Sums of slow sines with some noise, full range; every channel differs.
+inline std::string makeMusic(const SShape& shape, int frames) {
+    std::mt19937 random(static_cast<unsigned>(shape.channels * 10 + shape.bytes));
+    std::string pcm;
+    pcm.reserve(static_cast<size_t>(frames) * shape.frameBytes());
+    const double full = std::ldexp(1.0, 8 * shape.bytes - 1) - 1.0;
+    for (int i = 0; i < frames; ++i) {
+        for (int channel = 0; channel < shape.channels; ++channel) {
+            const double t = static_cast<double>(i) / shape.rate;
+            double value = 0.6 * std::sin(2764.6 * t * (channel + 1)) + 0.3 * std::sin(691.0 * t + channel);
+            value += (static_cast<double>(random() % 2001) - 1000.0) * 1e-4;
+            int64_t sample = std::llround(std::clamp(value, -1.0, 1.0) * full);
+            if (i < 2) sample = i == 0 ? static_cast<int64_t>(full) : -static_cast<int64_t>(full) - 1;
+            if (shape.bytes == 1) sample += 128;
+            pcm.append(reinterpret_cast<const char*>(&sample), static_cast<size_t>(shape.bytes));
+        }
+    }
+    return pcm;
+}
+
+} // namespace tests

@@ -1,0 +1,201 @@
+// What is written comes back, in our own eyes and in those of other programs.
+#include "plugins/PluginFixture.h"
+
+#include "sonora2/common/SonoraError.h"
+
+namespace tests {
+
+namespace {
+
+class RoundTrip : public CPluginTest, public ::testing::WithParamInterface<SFormatCase> {
+protected:
+    static constexpr int kFrames = 30011; // odd, and several chunks
+};
+
+// The samples of a file as another program reads them.
+std::string readByPeer(const std::filesystem::path& path, int bytes) {
+    if (path.extension() == ".flac") { // of 32 bits too, which others do not know yet
+        return run("flac -sdc --force-raw-format --endian=little --sign=" +
+                   std::string(bytes == 1 ? "unsigned '" : "signed '") + path.string() + "'");
+    }
+    static const char* const kCoders[] = {"", "u8", "s16le", "s24le", "s32le"};
+    const std::string coder = kCoders[bytes];
+    return run("ffmpeg -v error -i '" + path.string() + "' -f " + coder + " -c:a pcm_" + coder + " -");
+}
+
+TEST_P(RoundTrip, Lossless_IsBitExactInEveryShape) {
+    const SFormatCase& format = GetParam();
+    if (!format.lossless) GTEST_SKIP();
+    for (int bytes : format.widths) {
+        for (int channels : format.channels) {
+            SCOPED_TRACE(std::to_string(bytes) + " bytes, " + std::to_string(channels) + " channels");
+            const SShape shape{44100, channels, bytes};
+            const std::string pcm = makeMusic(shape, kFrames);
+            const auto path = folder / ("x." + std::string(format.extension));
+            P<IAudioFormat> target = makeFormat(path, shape);
+            ASSERT_TRUE(target);
+            const int64_t estimate = target->getEstimatedSizeBytes(kFrames / 44100.0);
+            writeAll(target, pcm, shape);
+            const auto size = static_cast<int64_t>(std::filesystem::file_size(path));
+            if (format.exactEstimate) {
+                EXPECT_EQ(estimate, size);
+            }
+
+            P<IAudioSource> source = openSource(path, shape);
+            ASSERT_TRUE(source);
+            EXPECT_DOUBLE_EQ(kFrames / 44100.0, source->getDuration());
+            EXPECT_TRUE(readAll(source) == pcm);
+            EXPECT_FALSE(source->getNextAudioChunk());
+            // Opened again it starts again.
+            source->close();
+            EXPECT_EQ(channels, source->getChannelCount());
+            source->open();
+            EXPECT_TRUE(readAll(source) == pcm);
+
+            if (channels != 2 && bytes != 2) continue;
+            EXPECT_TRUE(readByPeer(path, bytes) == pcm) << "another program reads something else";
+            if (*format.check) run(std::string(format.check) + " '" + path.string() + "'");
+        }
+    }
+}
+
+TEST_P(RoundTrip, EmptySource_MakesAValidEmptyFile) {
+    const SShape shape;
+    const auto path = folder / ("x." + std::string(GetParam().extension));
+    writeFile(path, "", shape);
+    P<IAudioSource> source = openSource(path, shape);
+    ASSERT_TRUE(source);
+    EXPECT_TRUE(source->isEOF() || !source->getNextAudioChunk());
+    if (*GetParam().check) run(std::string(GetParam().check) + " '" + path.string() + "'");
+}
+
+// The host writes under a temporary name; the container is that of the final one.
+TEST_P(RoundTrip, TemporaryName_DoesNotChangeTheContainer) {
+    const std::string extension = GetParam().extension;
+    handler->setURISuffix("part");
+    const SShape shape{44100, 2, GetParam().widths.back()};
+    const std::string pcm = makeMusic(shape, 5000);
+    const auto path = folder / ("x.y." + extension + "part");
+    writeFile(path, pcm, shape);
+    EXPECT_EQ(GetParam().magic, readFile(path).substr(0, std::strlen(GetParam().magic)));
+    // The same with a point between, which the plug-in alone has to understand.
+    for (int i = 0; i < handler->getPluginCount(); ++i) {
+        if (!handler->getPlugin(i)->getPluginName()->equals(GetParam().plugin)) continue;
+        sonora2::common::ISonoraPlugin::SFormatParams params;
+        params.nSampleRate = shape.rate;
+        params.nChannelCount = shape.channels;
+        params.nBytesPerSample = shape.bytes;
+        const auto pointed = folder / ("x." + extension + ".part");
+        P<IAudioFormat> format(handler->getPlugin(i)->tryCreateFormat(
+            toURI(pointed), sonora2::common::kAudioFormat, true, &params));
+        ASSERT_TRUE(format);
+        writeAll(format, pcm, shape);
+        EXPECT_TRUE(readFile(pointed) == readFile(path));
+    }
+}
+
+TEST_P(RoundTrip, StoppedInTheMiddle_LeavesAValidFile) {
+    const SShape shape;
+    const std::string pcm = makeMusic(shape, kFrames);
+    const auto path = folder / ("x." + std::string(GetParam().extension));
+    {
+        P<IAudioFormat> format = makeFormat(path, shape);
+        format->open();
+        format->writeAudioChunk(makeChunk(pcm.substr(0, 20000 * 4)));
+        // Released without a word, as an encoder does when an exception goes through it.
+    }
+    if (*GetParam().check) run(std::string(GetParam().check) + " '" + path.string() + "'");
+    P<IAudioSource> source = openSource(path, shape);
+    ASSERT_TRUE(source);
+    if (GetParam().lossless) {
+        EXPECT_TRUE(readAll(source) == pcm.substr(0, 20000 * 4));
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Formats, RoundTrip, ::testing::ValuesIn(kFormatCases), printName);
+
+struct SPeerFile {
+    const char* name;
+    const char* command; // makes the file from 24 bit stereo in.wav
+    int bytes;           // as it is to be delivered
+    bool exact;          // the same samples as ffmpeg's own reading
+};
+
+class PeerFile : public CPluginTest, public ::testing::WithParamInterface<SPeerFile> {};
+
+TEST_P(PeerFile, IsReadAsItsOwnProgramReadsIt) {
+    const SPeerFile& file = GetParam();
+    const SShape shape{44100, 2, 3};
+    writeFile(folder / "in.wav", makeMusic(shape, 20011), shape);
+    run("cd '" + folder.path().string() + "' && " + file.command);
+    P<IAudioSource> source = openSource(folder / file.name, {44100, 2, file.bytes});
+    ASSERT_TRUE(source);
+    const std::string pcm = readAll(source);
+    ASSERT_EQ(20011u * 2 * file.bytes, pcm.size());
+    if (file.exact) {
+        EXPECT_TRUE(pcm == readByPeer(folder / file.name, file.bytes));
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Files, PeerFile,
+    ::testing::Values(
+        SPeerFile{"a.wav", "ffmpeg -v error -i in.wav -c:a pcm_u8 a.wav", 1, true},
+        SPeerFile{"b.wav", "ffmpeg -v error -i in.wav -c:a pcm_s32le b.wav", 4, true},
+        SPeerFile{"c.wav", "ffmpeg -v error -i in.wav -c:a pcm_f32le c.wav", 4, true},
+        SPeerFile{"d.wav", "ffmpeg -v error -i in.wav -c:a pcm_f64le d.wav", 4, true},
+        SPeerFile{"e.wav", "ffmpeg -v error -i in.wav -c:a pcm_alaw e.wav", 2, true},
+        SPeerFile{"f.wav", "ffmpeg -v error -i in.wav -c:a pcm_s16le -rf64 always f.wav", 2, true},
+        SPeerFile{"stream.wav", "ffmpeg -v error -i in.wav -f wav -c:a pcm_s16le - > stream.wav", 2, true},
+        SPeerFile{"g.aiff", "sox in.wav -b 8 -D g.aiff", 1, true},
+        SPeerFile{"h.aif", "sox in.wav -b 24 h.aif", 3, true},
+        SPeerFile{"i.caf", "ffmpeg -v error -i in.wav -c:a pcm_s24be i.caf", 3, true},
+        SPeerFile{"j.w64", "sox in.wav -b 16 -D j.w64", 2, true},
+        SPeerFile{"k.snd", "ffmpeg -v error -i in.wav -f au -c:a pcm_s16be k.snd", 2, true},
+        SPeerFile{"l.flac", "flac -s8 in.wav -o l.flac", 3, true},
+        SPeerFile{"m.flac", "ffmpeg -v error -i in.wav -sample_fmt s16 m.flac", 2, true},
+        // Written into a pipe: neither length nor checksum in the header.
+        SPeerFile{"n.flac", "flac -sc in.wav | cat > n.flac", 3, true},
+        SPeerFile{"tagged.flac",
+                  "flac -s in.wav -o tagged.flac && head -c 300 /dev/zero | tr '\\0' T >> tagged.flac", 3,
+                  false}),
+    [](const auto& row) {
+        std::string name = row.param.name;
+        std::ranges::replace(name, '.', '_');
+        return name;
+    });
+
+TEST_F(CPluginTest, FlacSettings_AreThoseOfItsOwnEncoder) {
+    const SShape shape;
+    const std::string pcm = makeMusic(shape, 44100 * 35);
+    const std::string in = (folder / "in.wav").string();
+    writeFile(in, pcm, shape);
+    for (int level : {-1, 0, 5, 8}) { // -1: none was set
+        const auto ours = folder / ("ours" + std::to_string(level) + ".flac");
+        P<IAudioFormat> format = makeFormat(ours, shape);
+        if (level >= 0) format->setAudioQuality(level / 8.0);
+        writeAll(format, pcm, shape);
+        const std::string theirs = (folder / "theirs.flac").string();
+        run("flac -sf" + std::to_string(level < 0 ? 5 : level) + " '" + in + "' -o '" + theirs + "'");
+        const auto frames = [](const std::string& file) {
+            const std::string copy = file + ".bare.flac";
+            std::filesystem::copy_file(file, copy, std::filesystem::copy_options::overwrite_existing);
+            run("metaflac --remove-all --dont-use-padding '" + copy + "'");
+            // What is left before the frames: marker, stream information, and at most a text of the maker.
+            return readFile(copy);
+        };
+        EXPECT_TRUE(frames(ours.string()) == frames(theirs)) << "level " << level;
+        EXPECT_EQ(run("metaflac --show-md5sum '" + theirs + "'"),
+                  run("metaflac --show-md5sum '" + ours.string() + "'"));
+        const auto points = [](const std::string& file) {
+            const std::string table = run("metaflac --list --block-type=SEEKTABLE '" + file + "'");
+            const size_t first = table.find("point 0");
+            return table.substr(first, table.find('\n', table.find("point 3")) - first);
+        };
+        EXPECT_EQ(points(theirs), points(ours.string())) << "level " << level;
+    }
+}
+
+} // namespace
+
+} // namespace tests

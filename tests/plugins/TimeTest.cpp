@@ -1,0 +1,128 @@
+// Seeking, start times, and conversion.
+#include "plugins/PluginFixture.h"
+
+#include "sonora2/common/SonoraError.h"
+
+namespace tests {
+
+namespace {
+
+class Time : public CPluginTest, public ::testing::WithParamInterface<SFormatCase> {
+protected:
+    static constexpr int kFrames = 100003;
+
+    std::filesystem::path writeMusic(const SShape& shape) {
+        const auto path = folder / ("x." + std::string(GetParam().extension));
+        writeFile(path, makeMusic(shape, kFrames), shape);
+        return path;
+    }
+};
+
+TEST_P(Time, RandomSkips_EqualTheUnskippedRun) {
+    const auto path = writeMusic({});
+    // The file's own shape, and conversions with a short and a long period of the filter.
+    for (const SShape& shape : {SShape{}, SShape{48000, 1, 2}, SShape{22051, 2, 1}, SShape{96000, 6, 2}}) {
+        SCOPED_TRACE(std::to_string(shape.rate));
+        P<IAudioSource> source = openSource(path, shape);
+        ASSERT_TRUE(source);
+        const std::string all = readAll(source);
+        const int64_t frames = static_cast<int64_t>(all.size()) / shape.frameBytes();
+        ASSERT_NEAR(static_cast<double>(kFrames) * shape.rate / 44100.0, static_cast<double>(frames), 0.5);
+        std::mt19937 random(7);
+        for (int i = 0; i < 40; ++i) {
+            const int64_t frame = i == 0 ? 0 : i == 1 ? frames - 1 : static_cast<int64_t>(random() % frames);
+            source->skipToTime(static_cast<double>(frame) / shape.rate);
+            ASSERT_FALSE(source->isEOF());
+            P<sonora2::audio::IAudioChunk> first = source->getNextAudioChunk();
+            ASSERT_TRUE(first);
+            EXPECT_NEAR(static_cast<double>(frame) / shape.rate, first->getTimestamp(), 1e-9);
+            std::string pcm(reinterpret_cast<const char*>(first->getData()), first->getSize());
+            pcm += readAll(source, i % 8 == 0 ? SIZE_MAX : 100000);
+            ASSERT_TRUE(all.compare(frame * shape.frameBytes(), pcm.size(), pcm) == 0)
+                << "at frame " << frame;
+        }
+        source->skipToTime(1e9);
+        EXPECT_TRUE(source->isEOF());
+        EXPECT_FALSE(source->getNextAudioChunk());
+        source->skipToTime(0.0);
+        EXPECT_TRUE(readAll(source) == all);
+    }
+}
+
+TEST_P(Time, StartTime_MovesTheBeginning) {
+    const SShape shape;
+    const auto path = writeMusic(shape);
+    P<IAudioSource> source = openSource(path, shape);
+    const std::string all = readAll(source);
+    source->close();
+    const int start = 30001;
+    source->setStartTime(start / 44100.0);
+    source->open();
+    EXPECT_NEAR((kFrames - start) / 44100.0, source->getDuration(), 1e-12);
+    P<sonora2::audio::IAudioChunk> first = source->getNextAudioChunk();
+    EXPECT_EQ(0.0, first->getTimestamp());
+    EXPECT_EQ(0, std::memcmp(first->getData(), all.data() + start * 4, first->getSize()));
+    source->skipToTime(1.0);
+    EXPECT_TRUE(readAll(source) == all.substr((start + 44100) * 4));
+    source->setStartTime(0.0);
+    EXPECT_TRUE(readAll(source) == all);
+    EXPECT_THROW(source->setStartTime(-1.0), sonora2::common::CSonoraError);
+}
+
+// A click stays at its time, whatever the rates; the length is that of the file.
+TEST_P(Time, Conversion_KeepsAClickInPlace) {
+    for (int rate : {48000, 22050, 44100, 96000, 32000}) {
+        SCOPED_TRACE(rate);
+        std::string pcm(kFrames * 4, '\0');
+        const int at = 60000;
+        for (int i = -2; i <= 2; ++i) { // as wide as it has to be for the lowest rate
+            const int16_t height = static_cast<int16_t>(24000 * (3 - std::abs(i)) / 3);
+            for (int channel = 0; channel < 2; ++channel)
+                std::memcpy(&pcm[((at + i) * 2 + channel) * 2], &height, 2);
+        }
+        const auto path = folder / ("click." + std::string(GetParam().extension));
+        writeFile(path, pcm, {});
+        P<IAudioSource> source = openSource(path, {rate, 1, 2});
+        const std::string converted = readAll(source);
+        ASSERT_EQ(std::llround(static_cast<double>(kFrames) * rate / 44100.0), converted.size() / 2);
+        double weight = 0.0;
+        double moment = 0.0;
+        for (size_t i = 0; i < converted.size() / 2; ++i) {
+            int16_t value;
+            std::memcpy(&value, &converted[i * 2], 2);
+            weight += value;
+            moment += static_cast<double>(value) * static_cast<double>(i);
+        }
+        // In frames of the delivered rate.
+        EXPECT_NEAR(at * (rate / 44100.0), moment / weight, 0.75);
+    }
+}
+
+TEST_P(Time, ShapesThatCannotBeHad_AreDeclined) {
+    const auto path = writeMusic({});
+    EXPECT_FALSE(openSource(path, {48000, 2, 3})) << "the converter makes 8 and 16 bits only";
+    EXPECT_FALSE(openSource(path, {44100, 5, 2})) << "there is no matrix";
+    const auto missing = folder / ("missing." + std::string(GetParam().extension));
+    EXPECT_FALSE(openSource(missing, {}));
+}
+
+// The thread that reads ahead is stopped at any moment.
+TEST_P(Time, ClosingWhileReadingAhead_StartsAnew) {
+    const SShape shape;
+    P<IAudioSource> source = openSource(writeMusic(shape), shape);
+    const std::string begin = readAll(source, 1);
+    for (int i = 0; i < 60; ++i) {
+        for (int chunks = i % 4; chunks > 0; --chunks) source->getNextAudioChunk();
+        EXPECT_GE(source->getBufferStatus(), 0);
+        EXPECT_LE(source->getBufferStatus(), 100);
+        source->close();
+        source->open();
+        ASSERT_TRUE(readAll(source, 1) == begin);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Formats, Time, ::testing::ValuesIn(kFormatCases), printName);
+
+} // namespace
+
+} // namespace tests
