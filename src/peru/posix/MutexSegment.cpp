@@ -127,7 +127,9 @@ bool CMutexSegment::prepare(SLayout& layout) {
     int result = pthread_mutex_init(&layout.mutex, &attributes);
     pthread_mutexattr_destroy(&attributes);
     if (result != 0) return false;
-    std::atomic_thread_fence(std::memory_order_release);
+    // Others look at it under the lock of the file; only a maker that is killed here must not have written
+    // the stamp early.
+    std::atomic_signal_fence(std::memory_order_seq_cst);
     layout.stamp = stamp;
     return true;
 }
