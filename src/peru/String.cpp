@@ -16,6 +16,12 @@ namespace {
 
 alignas(4) constexpr unsigned char kZeros[8] = {};
 
+// Bytes of a unit that is cut off at the end. They are left out: an edit would shift all units behind them.
+int32_t getPartialUnit(uint32_t encodingId, int32_t byteSize) {
+    int32_t unit = getUnitSize(encodingId);
+    return unit > 1 ? byteSize % unit : 0;
+}
+
 } // namespace
 
 CStringArg::CStringArg(const IString& string) : m_view(string.getView()) {}
@@ -54,6 +60,7 @@ CStringArg::CStringArg(const ICharEncoding& encoding, const void* data, int32_t 
              false} {
     if (!data) m_view.byteSize = 0;
     if (m_view.byteSize < 0) m_view.byteSize = encoding.getTerminatedLength(m_view.data);
+    m_view.byteSize -= getPartialUnit(m_view.encodingId, m_view.byteSize);
 }
 
 void CStringArg::count() const {
@@ -74,6 +81,10 @@ CString::CString(const P<ICharEncoding>& encoding, const void* data, int32_t byt
     } else if (m_byteSize < 0) {
         m_byteSize = encoding->getTerminatedLength(m_data);
         m_terminated = true;
+    }
+    if (int32_t partial = getPartialUnit(m_encodingId, m_byteSize); partial != 0) {
+        m_byteSize -= partial;
+        m_terminated = false;
     }
     if (storage == EStringStorage::copy) {
         uint8_t* block = text::allocate(*encoding, m_byteSize);

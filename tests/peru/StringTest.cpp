@@ -262,6 +262,12 @@ TEST(String, MalformedBytes_StayInvisible) {
     EXPECT_EQ(CString::toStdU16String(CString::fromUTF8("\xED\xA0\x80")), u"\uFFFD");
 }
 
+TEST(String, UnitCutOffAtTheEnd_IsLeftOut) {
+    P<IString> text = make<CString>(getUTF16CharEncoding(), "a\0b\0c", 5);
+    EXPECT_TRUE(text->concat(u"d")->equals("abd"));
+    EXPECT_TRUE(newString(u"x")->concat(CStringArg(*getUTF16CharEncoding(), "a\0b", 3))->equals("xa"));
+}
+
 TEST(String, ReplaceAbsentText_KeepsTheContent) {
     P<IString> text = newString("abcabc");
     EXPECT_TRUE(text->replace("x", "y")->equals(text));
