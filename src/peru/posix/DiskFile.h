@@ -13,7 +13,7 @@ enum class EAccess { read, write, readWrite };
 
 // One buffer serves reading and writing in turn, so that small values cost a copy and both may be mixed.
 // Failures throw CFileAccessDeniedError or CStreamError; after close everything throws CStreamClosedError.
-class CDiskFile {
+class PERU_API CDiskFile {
 public:
     // Empty when there is no such file, or no folder to make it in. Folders are refused.
     static std::unique_ptr<CDiskFile> tryOpen(const P<IURI>& uri, EAccess access, EOpenMode mode);
