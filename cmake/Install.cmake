@@ -10,11 +10,13 @@ install(
     TARGETS tonewright
     EXPORT tonewright-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
+    INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
 )
 install(
     TARGETS peru sonora2 zvr_lang
     EXPORT tonewright-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
+    INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/tonewright
 )
 get_property(plugins GLOBAL PROPERTY TONEWRIGHT_PLUGINS)
 if(plugins)

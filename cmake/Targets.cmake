@@ -58,7 +58,7 @@ function(tw_test name)
     target_include_directories(${name} PRIVATE ${CMAKE_SOURCE_DIR}/tests)
     target_compile_definitions(${name} PRIVATE TONEWRIGHT_TEST_DATA="${CMAKE_SOURCE_DIR}/tests/data")
     target_precompile_headers(${name} PRIVATE <gtest/gtest.h> <string> <vector>)
-    gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 PROPERTIES TIMEOUT 600 LABELS "${name};${arg_LABELS}")
+    gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 NO_PRETTY_VALUES PROPERTIES TIMEOUT 600 LABELS "${name};${arg_LABELS}")
 endfunction()
 
 # tw_benchmark(NAME lib...): one Google Benchmark binary of the calling folder's sources.
