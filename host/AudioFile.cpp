@@ -1,7 +1,11 @@
 #include "AudioFile.h"
 
+#include "PlainHeader.h"
+
 #include <algorithm>
+#include <atomic>
 #include <cerrno>
+#include <climits>
 #include <cstring>
 #include <fcntl.h>
 #include <stdexcept>
@@ -25,6 +29,16 @@ namespace {
     throw std::runtime_error(std::strerror(error));
 }
 
+// A name at the limit of the file system is cut before its extension, which selects the format, and stays
+// unique by a number.
+fs::path nameTemporary(const fs::path& target, const std::string& ending) {
+    static std::atomic<unsigned> s_count{0};
+    const std::string name = target.filename(), extension = target.extension();
+    if (name.size() + ending.size() <= NAME_MAX) return target.native() + ending;
+    const std::string end = "~" + std::to_string(++s_count) + extension + ending;
+    return target.parent_path() / (name.substr(0, NAME_MAX - std::min<size_t>(end.size(), NAME_MAX)) + end);
+}
+
 int bitsPerSample(const TagLib::AudioProperties& properties) {
     if (auto* wav = dynamic_cast<const TagLib::RIFF::WAV::Properties*>(&properties))
         return wav->bitsPerSample();
@@ -37,6 +51,7 @@ int bitsPerSample(const TagLib::AudioProperties& properties) {
 } // namespace
 
 SSampleFormat readSampleFormat(const fs::path& file) {
+    if (const auto plain = readPlainHeader(file)) return *plain;
     SSampleFormat format;
     TagLib::FileRef reader(file.c_str(), true, TagLib::AudioProperties::Fast);
     if (reader.isNull() || !reader.audioProperties()) return format;
@@ -55,6 +70,10 @@ void checkInput(const fs::path& file) {
     if (!S_ISREG(status.st_mode)) throw std::runtime_error("Is not a regular file");
     if (status.st_size == 0) throw std::runtime_error("The file is empty");
     if (::access(file.c_str(), R_OK) != 0) throwSystem(errno);
+}
+
+std::string describeKind(const fs::path& file) {
+    return file.has_extension() ? file.extension().string() + " files" : "files without an extension";
 }
 
 std::string codecName(const fs::path& file) {
@@ -80,6 +99,10 @@ bool isSameFile(const fs::path& a, const fs::path& b) {
 
 COutputPlace::COutputPlace(const fs::path& target, const std::string& temporaryEnding, bool replace)
     : m_target(target), m_replace(replace) {
+    // The other name in a message is the input's, so that this one has to be told.
+    const auto refuse = [&](const std::string& reason) {
+        throw std::runtime_error(target.string() + " cannot be written: " + reason);
+    };
     std::error_code error;
     if (fs::is_symlink(m_target, error)) {
         const fs::path meant = fs::weakly_canonical(m_target, error);
@@ -87,11 +110,11 @@ COutputPlace::COutputPlace(const fs::path& target, const std::string& temporaryE
     }
     struct stat status;
     if (::stat(m_target.c_str(), &status) == 0) {
-        if (S_ISDIR(status.st_mode)) throwSystem(EISDIR);
-        if (!S_ISREG(status.st_mode)) throw std::runtime_error("Is not a regular file");
-        if (!replace) throw std::runtime_error("The file exists (--force replaces it)");
+        if (S_ISDIR(status.st_mode)) refuse(std::strerror(EISDIR));
+        if (!S_ISREG(status.st_mode)) refuse("Is not a regular file");
+        if (!replace) throw std::runtime_error(target.string() + " exists (--force replaces it)");
     } else if (errno != ENOENT) {
-        throwSystem(errno);
+        refuse(std::strerror(errno));
     }
     const fs::path folder = m_target.has_parent_path() ? m_target.parent_path() : fs::path(".");
     if (::stat(folder.c_str(), &status) != 0)
@@ -100,8 +123,7 @@ COutputPlace::COutputPlace(const fs::path& target, const std::string& temporaryE
     if (::access(folder.c_str(), W_OK | X_OK) != 0)
         throw std::runtime_error("The folder " + folder.string() +
                                  " cannot be written to: " + std::strerror(errno));
-    m_temporary = m_target;
-    m_temporary += temporaryEnding;
+    m_temporary = nameTemporary(m_target, temporaryEnding);
 }
 
 COutputPlace::~COutputPlace() {

@@ -20,6 +20,9 @@ SSampleFormat readSampleFormat(const std::filesystem::path& file);
 // Throws std::runtime_error with the reason when this is no regular file with something in it.
 void checkInput(const std::filesystem::path& file);
 
+// ".xyz files", as a part of a message.
+std::string describeKind(const std::filesystem::path& file);
+
 // Says what the codec of an extension is called.
 std::string codecName(const std::filesystem::path& file);
 
@@ -29,6 +32,8 @@ public:
     // Throws std::runtime_error when the target exists and is not to be replaced, or cannot be replaced.
     // Links are followed.
     COutputPlace(const std::filesystem::path& target, const std::string& temporaryEnding, bool replace);
+    COutputPlace(const COutputPlace&) = delete;
+    COutputPlace& operator=(const COutputPlace&) = delete;
     ~COutputPlace(); // removes the temporary file, unless committed
 
     const std::filesystem::path& getTemporary() const { return m_temporary; }

@@ -16,7 +16,13 @@ void watchForCancel() {
     action.sa_handler = [](int) { g_cancelled = 1; };
     action.sa_flags = static_cast<int>(SA_RESETHAND);
     sigemptyset(&action.sa_mask);
-    for (int signal : {SIGINT, SIGTERM}) sigaction(signal, &action, nullptr);
+    for (int signal : {SIGINT, SIGTERM, SIGHUP}) {
+        struct sigaction old = {};
+        sigaction(signal, nullptr, &old);
+        if (old.sa_handler != SIG_IGN) sigaction(signal, &action, nullptr); // as nohup wants it
+    }
+    // Failures of writing are told where they happen; the temporary files go.
+    for (int ignored : {SIGPIPE, SIGXFSZ}) std::signal(ignored, SIG_IGN);
 }
 
 bool isCancelled() {

@@ -3,7 +3,8 @@
 
 namespace host {
 
-// From now on SIGINT and SIGTERM ask for a clean end; a second one ends the program at once.
+// From now on SIGINT, SIGTERM and SIGHUP ask for a clean end; a second one ends the program at once. A reader
+// of the output that leaves, or a limit of file sizes, ends nothing.
 void watchForCancel();
 // Any thread.
 bool isCancelled();

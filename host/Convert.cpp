@@ -31,18 +31,10 @@ bool onProgress(double fraction, int32_t) {
     return !t_running->stopped;
 }
 
-std::string reasonOr(const std::string& otherwise) {
-    std::string reason = CHostLog::takeReason();
-    return reason.empty() ? otherwise : reason;
-}
-
-// Messages name the file that the user knows.
-std::string withoutTemporary(std::string reason, const COutputPlace& place, const fs::path& output) {
-    const std::string& temporary = place.getTemporary().native();
-    for (const std::string& shown : {fs::absolute(temporary).native(), temporary})
-        if (const size_t at = reason.find(shown); at != std::string::npos)
-            reason.replace(at, shown.size(), output.native());
-    return reason;
+std::string describe(const SSampleFormat& samples) {
+    return std::to_string(samples.rate) + " Hz, " + std::to_string(samples.channels) +
+           (samples.channels == 1 ? " channel and " : " channels and ") +
+           std::to_string(samples.bytesPerSample * 8) + " bits";
 }
 
 class CConverter {
@@ -65,6 +57,10 @@ private:
     };
 
     void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
+    std::string tellWhyNotReadable(const fs::path& input) const;
+    std::string tellWhyNotWritable(const fs::path& input, const std::u16string& outputURI,
+                                   const fs::path& output) const;
+    std::string tellReason(const fs::path& input, const fs::path& temporary, const fs::path& output) const;
     SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
     std::vector<SSampleFormat> listCandidates(const SSampleFormat& own) const;
 
@@ -111,15 +107,49 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
                                                           samples.bytesPerSample, quality, m_options.bitRate,
                                                           m_options.minBitRate, m_options.maxBitRate));
         if (!format) continue;
-        isWritable = true;
         CHandle source(m_library.CreateAudioSourceFromURI(inputURI.c_str(), samples.rate, samples.channels,
                                                           samples.bytesPerSample, 1));
         if (source) return {std::move(source), std::move(format), samples};
         // A file that cannot be read at all is not tried in every other shape.
-        if (std::string reason = CHostLog::takeReason(); !reason.empty()) throw std::runtime_error(reason);
+        if (std::string reason = CHostLog::takeReason(); !reason.empty())
+            throw std::runtime_error(asReason(std::move(reason), input));
+        isWritable = true;
     }
-    if (isWritable) throw std::runtime_error("No plug-in reads this file in the wanted format");
-    throw std::runtime_error("No plug-in writes " + output.filename().string() + " in the wanted format");
+    if (isWritable) throw std::runtime_error(tellWhyNotReadable(input));
+    throw std::runtime_error(tellWhyNotWritable(input, outputURI, output));
+}
+
+// A kind that nobody reads is another matter than a conversion that its reader does not do.
+std::string CConverter::tellWhyNotReadable(const fs::path& input) const {
+    const SSampleFormat own = readSampleFormat(input);
+    const CHandle source(m_library.CreateAudioSourceFromURI(toURI(input).c_str(), own.rate, own.channels,
+                                                            own.bytesPerSample, 0));
+    if (!source) return CHostLog::takeReadReason(input);
+    return "Cannot be converted from " + describe(own) + " to " + describe(listCandidates(own).front());
+}
+
+// An extension that nobody writes is another matter than a sound that it cannot hold.
+std::string CConverter::tellWhyNotWritable(const fs::path& input, const std::u16string& outputURI,
+                                           const fs::path& output) const {
+    const SSampleFormat usual;
+    const CHandle format(m_library.CreateAudioFormatFromURI(outputURI.c_str(), usual.rate, usual.channels,
+                                                            usual.bytesPerSample, 0.0, 0, 0, 0));
+    if (!format) return "No plug-in writes " + describeKind(output);
+    std::string reason = asReason(CHostLog::takeReason(), input);
+    if (!reason.empty()) return reason;
+    return output.string() + " cannot hold " + describe(listCandidates(readSampleFormat(input)).front());
+}
+
+// Messages name the file that the user knows.
+std::string CConverter::tellReason(const fs::path& input, const fs::path& temporary,
+                                   const fs::path& output) const {
+    std::string reason = CHostLog::takeReason();
+    if (reason.empty()) return "The conversion failed";
+    const fs::path absolute = fs::absolute(temporary);
+    for (const std::string& shown : {absolute.lexically_normal().native(), absolute.native()})
+        replaceAll(reason, shown, output.native());
+    replaceAll(reason, m_temporaryEnding, ""); // wherever the name was told in another way
+    return asReason(std::move(reason), input);
 }
 
 void CConverter::convert(const fs::path& input, const fs::path& output, CProgress::Job job) {
@@ -140,8 +170,7 @@ void CConverter::convert(const fs::path& input, const fs::path& output, CProgres
     ends = {};
 
     if (running.stopped) return m_progress.cancel(job);
-    if (result != TONEWRIGHT_OK)
-        throw std::runtime_error(withoutTemporary(reasonOr("The conversion failed"), place, output));
+    if (result != TONEWRIGHT_OK) throw std::runtime_error(tellReason(input, place.getTemporary(), output));
     const uint64_t bytes = fs::file_size(place.getTemporary());
     place.commit();
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
@@ -174,21 +203,21 @@ int convert(CLibrary& library, const SConvertOptions& options) {
 
     std::atomic<size_t> next{0};
     std::atomic<bool> failed{false};
-    std::set<fs::path> outputs;
-    std::mutex mutex; // guards outputs
+    // Which of several inputs has a target is not left to the threads.
+    std::vector<fs::path> outputs;
+    std::vector<bool> isFirst;
+    std::set<fs::path> taken;
+    for (const fs::path& input : options.inputs) {
+        outputs.push_back(chooseOutput(options, input));
+        isFirst.push_back(taken.insert(fs::absolute(outputs.back()).lexically_normal()).second);
+    }
     const auto work = [&] {
         for (size_t i; !isCancelled() && (i = next++) < options.inputs.size();) {
-            const fs::path output = chooseOutput(options, options.inputs[i]);
-            bool isFirst = false;
-            {
-                std::lock_guard lock(mutex);
-                isFirst = outputs.insert(fs::absolute(output).lexically_normal()).second;
-            }
-            if (!isFirst) {
-                progress.fail(progress.start(options.inputs[i], output, nlohmann::json::object()),
-                              "Another input is converted to " + output.string() + " already");
+            if (!isFirst[i]) {
+                progress.fail(progress.start(options.inputs[i], outputs[i], nlohmann::json::object()),
+                              "Another input is converted to " + outputs[i].string() + " already");
                 failed = true;
-            } else if (!converter.run(options.inputs[i], output)) {
+            } else if (!converter.run(options.inputs[i], outputs[i])) {
                 failed = true;
             }
         }

@@ -1,10 +1,12 @@
 #include "HostLog.h"
 
+#include "AudioFile.h"
 #include "Text.h"
 #include "peru/IInstanceWrapper.h"
 
 #include <cstdio>
 #include <string_view>
+#include <utility>
 
 namespace host {
 
@@ -67,6 +69,11 @@ void CHostLog::write(const peru::SLogMessage& message) {
 std::string CHostLog::takeReason() {
     t_isFinal = false;
     return std::exchange(t_reason, {});
+}
+
+std::string CHostLog::takeReadReason(const std::filesystem::path& file) {
+    const std::string reason = takeReason();
+    return reason.empty() ? "No plug-in reads " + describeKind(file) : asReason(reason, file);
 }
 
 } // namespace host

@@ -5,6 +5,7 @@
 #include "peru/ILog.h"
 
 #include <atomic>
+#include <filesystem>
 #include <string>
 
 namespace host {
@@ -19,6 +20,8 @@ public:
     // The last failure that was logged on the calling thread since the last call of this, as a sentence
     // without the library's frame; empty when there was none.
     static std::string takeReason();
+    // The same as it reads behind the name of the file that was to be read.
+    static std::string takeReadReason(const std::filesystem::path& file);
 
     void addRef() const override { m_count.fetch_add(1); }
     void release() const override { m_count.fetch_sub(1); }

@@ -8,6 +8,7 @@
 #include <cstdio>
 #include <set>
 #include <stdexcept>
+#include <utility>
 
 namespace host {
 
@@ -29,10 +30,7 @@ SInfo readInfo(CLibrary& library, const fs::path& file) {
     CHandle source(library.CreateAudioSourceFromURI(toURI(file).c_str(), samples.rate, samples.channels,
                                                     samples.bytesPerSample, 1));
     if (source) info.duration = library.AudioSource_GetDuration(source.get());
-    if (!source || info.duration < 0) {
-        const std::string reason = CHostLog::takeReason();
-        throw std::runtime_error(reason.empty() ? "No plug-in reads this file" : reason);
-    }
+    if (!source || info.duration < 0) throw std::runtime_error(CHostLog::takeReadReason(file));
     return info;
 }
 
@@ -44,13 +42,14 @@ void printFailure(const fs::path& file, const std::string& reason) {
 }
 
 int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
-    bool failed = false;
-    if (!json)
-        std::printf("%11s %7s %8s %5s %10s  %s\n", "duration", "rate", "channels", "bits", "size", "file");
+    bool failed = false, hasHeading = json;
     for (const fs::path& file : files) {
         if (isCancelled()) return kExitCancelled;
         try {
             const SInfo info = readInfo(library, file);
+            if (!std::exchange(hasHeading, true))
+                std::printf("%11s %7s %8s %5s %10s  %s\n", "duration", "rate", "channels", "bits", "size",
+                            "file");
             if (json)
                 std::printf("%s\n", toLine({{"file", file.native()},
                                             {"codec", codecName(file)},

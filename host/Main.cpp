@@ -2,11 +2,15 @@
 #include "Cancel.h"
 #include "Commands.h"
 #include "HostLog.h"
+#include "Text.h"
 
 #include <CLI/CLI.hpp>
+#include <cmath>
 #include <cstdio>
+#include <cstdlib>
 #include <functional>
 #include <limits>
+#include <map>
 #include <thread>
 
 namespace {
@@ -41,15 +45,23 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
         ->add_option("--quality", options.quality,
                      "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression")
         ->check(CLI::Range(0.0, 1.0));
+    command->get_option("--quality")->check([](const std::string& text) {
+        return std::isnan(std::strtod(text.c_str(), nullptr)) ? std::string("is not a number")
+                                                              : std::string();
+    });
+    const CLI::Range bitRates(1, 100'000'000);
     const auto units = CLI::AsNumberWithUnit(std::map<std::string, int>{{"k", 1000}},
                                              CLI::AsNumberWithUnit::CASE_INSENSITIVE);
-    auto* bitRate =
-        command->add_option("--bitrate", options.bitRate, "Bits per second, such as 192k")->transform(units);
+    auto* bitRate = command->add_option("--bitrate", options.bitRate, "Bits per second, such as 192k")
+                        ->transform(units)
+                        ->check(bitRates);
     command->add_option("--min-bitrate", options.minBitRate, "Least bits per second")
         ->transform(units)
+        ->check(bitRates)
         ->needs(bitRate);
     command->add_option("--max-bitrate", options.maxBitRate, "Most bits per second")
         ->transform(units)
+        ->check(bitRates)
         ->needs(bitRate);
     options.jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
     command->add_option("-j,--jobs", options.jobs, "Files at a time")
@@ -67,6 +79,12 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
             throw CLI::RequiredError("Either --output or --to");
         if (!options.output.empty() && options.inputs.size() != 1)
             throw CLI::ValidationError("--output", "takes one input; use --to for several");
+        if (options.extension == "." || options.extension.find('/') != std::string::npos)
+            throw CLI::ValidationError("--to", "takes an extension, such as flac");
+        if (options.minBitRate > options.bitRate)
+            throw CLI::ValidationError("--min-bitrate", "is greater than --bitrate");
+        if (options.maxBitRate > 0 && options.maxBitRate < options.bitRate)
+            throw CLI::ValidationError("--max-bitrate", "is less than --bitrate");
         run = [&](CLibrary& library) { return convert(library, options); };
     });
 }
@@ -99,6 +117,19 @@ void addWaveform(CLI::App& app, SWaveformOptions& options, Run& run) {
     command->callback([&] { run = [&](CLibrary& library) { return drawWaveform(library, options); }; });
 }
 
+// What the commands themselves do not catch is no fault of the library.
+int runCommand(const Run& run, CLibrary& library) {
+    try {
+        return run(library);
+    } catch (const std::exception& failure) {
+        std::error_code error;
+        const bool isGone = std::filesystem::current_path(error).empty();
+        std::fprintf(stderr, "tonewright: %s\n",
+                     isGone ? "The current folder does not exist" : failure.what());
+        return kExitFailure;
+    }
+}
+
 } // namespace
 
 int main(int argc, char** argv) {
@@ -122,6 +153,13 @@ int main(int argc, char** argv) {
     addInfo(app, infoFiles, json, run);
     addFormats(app, json, run);
     addWaveform(app, waveformOptions, run);
+    // Which word was wrong, the parser would not say.
+    const auto isMeant = [&](const CLI::App* command) { return command->check_name(argv[1]); };
+    if (argc > 1 && argv[1][0] != '-' && app.get_subcommands(isMeant).empty()) {
+        std::fprintf(stderr, "No command is called %s\nRun with --help for more information.\n",
+                     toPrintable(argv[1]).c_str());
+        return kExitUsage;
+    }
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
@@ -133,7 +171,7 @@ int main(int argc, char** argv) {
         CLibrary library;
         CHostLog log(library, printLevel);
         library.start();
-        return run(library);
+        return runCommand(run, library);
     } catch (const std::exception& error) {
         std::fprintf(stderr, "tonewright: %s\n", error.what());
         return kExitNoLibrary;

@@ -109,6 +109,24 @@ std::string withPaths(std::string_view message) {
     return result;
 }
 
+void replaceAll(std::string& text, const std::string& what, const std::string& with) {
+    if (what.empty()) return;
+    for (size_t at = 0; (at = text.find(what, at)) != std::string::npos; at += with.size())
+        text.replace(at, what.size(), with);
+}
+
+std::string asReason(std::string message, const std::filesystem::path& about) {
+    const std::filesystem::path absolute = std::filesystem::absolute(about);
+    for (const std::string& name : {absolute.lexically_normal().native(), absolute.native()}) {
+        replaceAll(message, " " + name + ":", ":");
+        replaceAll(message, name, "this file");
+    }
+    if (message.ends_with('.')) message.pop_back();
+    if (!message.empty())
+        message[0] = static_cast<char>(std::toupper(static_cast<unsigned char>(message[0])));
+    return message;
+}
+
 std::string formatDuration(double seconds) {
     const long long tenths = static_cast<long long>(seconds * 10 + 0.5);
     std::array<char, 48> text;

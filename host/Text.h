@@ -16,6 +16,9 @@ std::string toUTF8(std::u16string_view text);
 std::string toPrintable(std::string_view text);
 // "file:" URIs within a message as the paths they stand for.
 std::string withPaths(std::string_view message);
+// A plug-in's reason as it reads behind the name of the file that it is about: that name is not told twice.
+std::string asReason(std::string message, const std::filesystem::path& about);
+void replaceAll(std::string& text, const std::string& what, const std::string& with);
 
 std::string formatDuration(double seconds); // 1:02:03.4
 std::string formatSize(uint64_t bytes);     // 1.2 MB

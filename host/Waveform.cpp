@@ -5,8 +5,10 @@
 #include "Text.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <cmath>
 #include <cstdio>
+#include <cstring>
 #include <memory>
 #include <png.h>
 #include <stdexcept>
@@ -82,8 +84,12 @@ public:
         image.width = static_cast<png_uint_32>(m_width);
         image.height = static_cast<png_uint_32>(m_height);
         image.format = PNG_FORMAT_RGB;
-        if (!png_image_write_to_file(&image, file.c_str(), 0, m_pixels.data(), 0, nullptr))
-            throw std::runtime_error(std::string("The picture could not be written: ") + image.message);
+        const std::unique_ptr<FILE, int (*)(FILE*)> stream(std::fopen(file.c_str(), "wbe"), std::fclose);
+        errno = stream ? 0 : errno;
+        // The system's reason tells more than "Write Error".
+        if (!stream || !png_image_write_to_stdio(&image, stream.get(), 0, m_pixels.data(), 0, nullptr) ||
+            std::fflush(stream.get()) != 0)
+            throw std::runtime_error(errno ? std::strerror(errno) : image.message);
     }
 
 private:
@@ -114,6 +120,8 @@ CPicture draw(const SWave& wave, int height) {
 
 void drawFile(CLibrary& library, const SWaveformOptions& options) {
     checkInput(options.input);
+    if (isSameFile(options.input, options.output))
+        throw std::runtime_error("Input and output are the same file");
     COutputPlace place(options.output, ".part" + std::to_string(::getpid()), options.force);
     SSampleFormat samples = readSampleFormat(options.input);
     CHostLog::takeReason();
@@ -124,10 +132,7 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     CHandle source = createSource(samples.channels);
     if (!source && samples.channels > 2) source = createSource(samples.channels = 2);
     const double duration = source ? library.AudioSource_GetDuration(source.get()) : -1;
-    if (duration < 0) {
-        const std::string reason = CHostLog::takeReason();
-        throw std::runtime_error(reason.empty() ? "No plug-in reads this file" : reason);
-    }
+    if (duration < 0) throw std::runtime_error(CHostLog::takeReadReason(options.input));
 
     const double frames = duration * samples.rate;
     const double step =
@@ -140,9 +145,15 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     if (isCancelled()) return;
     if (!complete) {
         const std::string reason = CHostLog::takeReason();
-        throw std::runtime_error(reason.empty() ? "The samples could not be read" : reason);
+        throw std::runtime_error(reason.empty() ? "The samples could not be read"
+                                                : asReason(reason, options.input));
     }
-    draw(wave, options.height).write(place.getTemporary());
+    const CPicture picture = draw(wave, options.height);
+    try {
+        picture.write(place.getTemporary());
+    } catch (const std::exception& error) {
+        throw std::runtime_error("Could not write " + options.output.string() + ": " + error.what());
+    }
     place.commit();
 }
 
