@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <fcntl.h>
 #include <string>
+#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 #include <utility>
@@ -16,6 +17,7 @@ struct SProcessResult {
     int exitCode = -1; // 128 and the signal for one that was killed
     std::string out;
     std::string err;
+    long peakMemory = 0; // kB resident, of the program and of what it waited for
 };
 
 // A child whose output goes to two files that are gone from the disk at once. Killed at the end of the block.
@@ -54,9 +56,11 @@ public:
 
     SProcessResult wait() {
         int status = 0;
-        ::waitpid(m_id, &status, 0);
+        rusage usage = {};
+        ::wait4(m_id, &status, 0, &usage);
         m_id = -1;
-        return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), read(m_out), read(m_err)};
+        return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), read(m_out), read(m_err),
+                usage.ru_maxrss};
     }
 
 private:
