@@ -1,0 +1,277 @@
+#include "host/Program.h"
+
+#include <sys/stat.h>
+#include <sys/statvfs.h>
+
+using namespace tests;
+
+namespace {
+
+class BadInput : public CProgramTest {
+protected:
+    void expectMessage(const std::string& message, const std::vector<std::string>& parts) {
+        EXPECT_EQ(std::count(message.begin(), message.end(), '\n'), 1) << message;
+        for (const std::string& part : parts)
+            EXPECT_NE(message.find(part), std::string::npos) << message << "lacks " << part;
+    }
+};
+
+class BadOutput : public BadInput {};
+
+} // namespace
+
+TEST_F(BadInput, IsToldByNameAndReason) {
+    folder.write("empty.wav", "");
+    folder.write("text.flac", "This is no sound file, only a text that somebody gave a wrong name.\n");
+    folder.write("header.wav", makeWavHeader({}, 0).substr(0, 20));
+    folder.write("sound.xyz", toWav(makeTone(8000, 1, 16, 0.1)));
+    folder.write("sound", toWav(makeTone(8000, 1, 16, 0.1)));
+    std::filesystem::create_directory(folder / "folder.wav");
+    ASSERT_EQ(::mkfifo((folder / "pipe.wav").c_str(), 0600), 0);
+    const auto before = list();
+    static const struct {
+        const char* input;
+        const char* reason;
+    } kCases[] = {
+        {"missing.wav", "No such file or directory"},
+        {"missing/a.wav", "No such file or directory"},
+        {"empty.wav", "The file is empty"},
+        {"folder.wav", "Is a directory"},
+        {"pipe.wav", "Is not a regular file"},
+        {"/dev/null", "Is not a regular file"},
+        {"empty.wav/a.wav", "Not a directory"},
+        {"text.flac", ""},
+        {"header.wav", ""},
+        {"sound.xyz", "No plug-in reads"},
+        {"sound", "No plug-in reads"},
+    };
+    for (const auto& bad : kCases) {
+        SCOPED_TRACE(bad.input);
+        const std::string start = std::string("tonewright: ") + bad.input + ": ";
+        for (const std::vector<std::string>& command : std::initializer_list<std::vector<std::string>>{
+                 {"convert", bad.input, "-o", "out.aiff"},
+                 {"waveform", bad.input, "-o", "out.png"},
+                 {"info", bad.input},
+             }) {
+            const std::string message = fail(command);
+            expectMessage(message, {start, bad.reason});
+            EXPECT_GT(message.size(), start.size() + 5) << message;
+            // The name is not told twice.
+            EXPECT_EQ(message.find(std::string(bad.input) + ":", start.size()), std::string::npos) << message;
+            EXPECT_EQ(message.find(folder.path().string()), std::string::npos) << message;
+        }
+    }
+    EXPECT_EQ(list(), before);
+}
+
+TEST_F(BadInput, MayBeNoise) {
+    std::mt19937 random(7);
+    std::vector<std::string> command{"convert", "--json", "--directory", "out", "--to", "au"};
+    std::filesystem::create_directory(folder / "out");
+    std::string noise(65536, '\0');
+    std::istringstream extensions(succeed({"formats"}));
+    size_t count = 0;
+    for (std::string extension; std::getline(extensions, extension); ++count) {
+        for (char& byte : noise) byte = static_cast<char>(random());
+        folder.write(extension + "." + extension, noise);
+        command.push_back(extension + "." + extension);
+    }
+    EXPECT_GE(count, 10u);
+    const SProcessResult result = tonewright(command);
+    EXPECT_EQ(result.exitCode, 1) << result.err;
+    size_t errors = 0;
+    for (const nlohmann::json& event : parseLines(result.out)) {
+        errors += event["event"] == "error";
+        // MPEG audio has no header but a few bits that noise has as well.
+        if (event["event"] == "done") {
+            EXPECT_EQ(event["input"].get<std::string>().substr(0, 2), "mp");
+        }
+    }
+    EXPECT_GE(errors, count - 3);
+}
+
+// Damaged files are refused or converted as far as they go: never a crash, a hang, or half a file.
+TEST_F(BadInput, MayBeDamaged) {
+    std::filesystem::create_directory(folder / "out");
+    write("in.wav", makeTone(44100, 2, 16, 0.5));
+    std::vector<std::string> files;
+    std::mt19937 random(42);
+    for (const char* extension : {"wav", "aiff", "flac", "ogg", "mp3"}) {
+        const std::string name = std::string("whole.") + extension;
+        succeed({"convert", "in.wav", "-o", name});
+        const std::string whole = readFile(folder / name);
+        const auto add = [&](const std::string& kind, int number, const std::string& bytes) {
+            files.push_back(extension + kind + std::to_string(number) + "." + extension);
+            folder.write(files.back(), bytes);
+        };
+        for (int i = 0; i < 20; ++i) {
+            // Half of the places lie within the headers.
+            const size_t size = i < 10 ? 1 + static_cast<size_t>(i) * 13 : whole.size() * (i - 9) / 12;
+            add("-cut-", i, whole.substr(0, size));
+            std::string flipped = whole;
+            const size_t range = i < 10 ? std::min<size_t>(whole.size(), 200) : whole.size();
+            for (int flips = 0; flips < 1 + i % 5; ++flips)
+                flipped[random() % range] ^= static_cast<char>(1 << random() % 8);
+            add("-flip-", i, flipped);
+        }
+    }
+    std::vector<std::string> command{"convert", "--json", "--directory", "out", "--to", "w64"};
+    command.insert(command.end(), files.begin(), files.end());
+    const SProcessResult result = tonewright(command);
+    EXPECT_EQ(result.exitCode, 1);
+    EXPECT_EQ(result.err, "");
+    std::set<std::string> expected;
+    size_t ended = 0;
+    for (const nlohmann::json& event : parseLines(result.out)) {
+        if (event["event"] == "done") {
+            ++ended;
+            expected.insert(event["output"].get<std::string>());
+            EXPECT_EQ(event["bytes"], std::filesystem::file_size(folder / event["output"]));
+        } else if (event["event"] == "error") {
+            ++ended;
+            const std::string message = event["message"];
+            EXPECT_GT(message.size(), 5u);
+            for (const char* hidden : {".part", "file://", "\n"})
+                EXPECT_EQ(message.find(hidden), std::string::npos) << message;
+        }
+    }
+    EXPECT_EQ(ended, files.size());
+    std::set<std::string> made;
+    for (const std::string& name : list())
+        if (name.rfind("out/", 0) == 0 && name != "out/") made.insert(name);
+    EXPECT_EQ(made, expected);
+}
+
+TEST_F(BadInput, DoesNotStopTheOthers) {
+    for (const char* good : {"a.wav", "b.wav", "c.wav"}) write(good, makeTone(8000, 1, 16, 0.1));
+    folder.write("bad.wav", "RIFF");
+    const SProcessResult result =
+        tonewright({"convert", "a.wav", "bad.wav", "b.wav", "missing.wav", "c.wav", "--to", "flac"});
+    EXPECT_EQ(result.exitCode, 1);
+    EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 2) << result.err;
+    EXPECT_EQ(list(),
+              (std::set<std::string>{"a.wav", "b.wav", "c.wav", "bad.wav", "a.flac", "b.flac", "c.flac"}));
+}
+
+TEST_F(BadOutput, IsToldByNameAndReason) {
+    write("in.wav", makeTone(44100, 1, 16, 0.1));
+    std::filesystem::create_directory(folder / "folder.flac");
+    folder.write("file", "a file");
+    ASSERT_EQ(::mkfifo((folder / "pipe.flac").c_str(), 0600), 0);
+    const auto before = list();
+    static const struct {
+        const char* output;
+        std::vector<std::string> parts;
+    } kCases[] = {
+        {"missing/out.flac", {"missing", "does not exist"}},
+        {"file/out.flac", {"Not a directory"}},
+        {"folder.flac", {"folder.flac", "Is a directory"}},
+        {"pipe.flac", {"pipe.flac", "Is not a regular file"}},
+        {"out.xyz", {"No plug-in writes .xyz files"}},
+        {"out", {"No plug-in writes files without an extension"}},
+        {"/proc/out.flac", {"/proc"}},
+        {"/sys/out.flac", {"/sys"}},
+        {"in.wav", {"same file"}},
+        {"./folder.flac/../in.wav", {"same file"}},
+    };
+    for (const auto& bad : kCases) {
+        SCOPED_TRACE(bad.output);
+        expectMessage(fail({"convert", "in.wav", "-f", "-o", bad.output}), bad.parts);
+    }
+    for (const auto& [output, part] : std::initializer_list<std::pair<const char*, const char*>>{
+             {"missing/out.png", "does not exist"}, {"folder.flac", "Is a directory"}, {"in.wav", "same"}})
+        expectMessage(fail({"waveform", "in.wav", "-f", "-o", output}), {part});
+    EXPECT_EQ(list(), before);
+    EXPECT_EQ(tonewright({"convert", "in.wav", "--to", "flac", "--directory", "missing"}).exitCode, 2);
+}
+
+TEST_F(BadOutput, LosesNothing) {
+    write("in.wav", makeTone(44100, 1, 16, 0.1));
+    folder.write("bad.wav", "RIFFxxxxWAVEfmt and no more");
+    folder.write("out.flac", "precious");
+    folder.write("out.png", "precious");
+    expectMessage(fail({"convert", "in.wav", "-o", "out.flac"}), {"out.flac", "exists", "--force"});
+    fail({"convert", "bad.wav", "-f", "-o", "out.flac"});
+    expectMessage(fail({"waveform", "in.wav", "-o", "out.png"}), {"out.png", "exists", "--force"});
+    fail({"waveform", "bad.wav", "-f", "-o", "out.png"});
+    EXPECT_EQ(readFile(folder / "out.flac") + readFile(folder / "out.png"), "preciousprecious");
+}
+
+TEST_F(BadOutput, IsReplacedThroughLinksAndKeepsItsMode) {
+    write("in.wav", makeTone(44100, 1, 16, 0.1));
+    std::filesystem::create_directory(folder / "elsewhere");
+    folder.write("elsewhere/out.flac", "old");
+    ASSERT_EQ(::chmod((folder / "elsewhere/out.flac").c_str(), 0640), 0);
+    std::filesystem::create_symlink("elsewhere/out.flac", folder / "link.flac");
+    succeed({"convert", "in.wav", "-f", "-o", "link.flac"});
+    EXPECT_TRUE(std::filesystem::is_symlink(folder / "link.flac"));
+    peer({"flac", "-t", "-s", "elsewhere/out.flac"});
+    struct stat status;
+    ASSERT_EQ(::stat((folder / "elsewhere/out.flac").c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 07777, 0640u);
+    EXPECT_EQ(list(), (std::set<std::string>{"in.wav", "link.flac", "elsewhere/", "elsewhere/out.flac"}));
+}
+
+// A limit of file sizes stands for every failure in the middle of writing.
+TEST_F(BadOutput, MayFailInTheMiddle) {
+    write("in.wav", makeNoise(44100, 2, 16, 200000));
+    for (const char* output : {"out.flac", "out.wav", "out.aiff", "out.ogg", "out.mp3"})
+        for (bool existing : {false, true}) {
+            SCOPED_TRACE(output);
+            if (existing) folder.write(output, "precious");
+            const auto before = list();
+            const SProcessResult result =
+                run({"sh", "-c", "ulimit -f 40; exec timeout -s KILL 60 \"$0\" convert in.wav -f -o \"$1\"",
+                     kProgram, output},
+                    folder.path(), programEnvironment());
+            EXPECT_EQ(result.exitCode, 1) << result.err;
+            expectMessage(result.err, {"tonewright: in.wav: ", output, "File too large"});
+            EXPECT_EQ(result.err.find(".part"), std::string::npos) << result.err;
+            EXPECT_EQ(list(), before);
+            if (existing) {
+                EXPECT_EQ(readFile(folder / output), "precious");
+            }
+        }
+}
+
+TEST_F(BadOutput, MayFillTheDisk) {
+    write("in.wav", makeNoise(44100, 2, 16, 200000));
+    std::filesystem::create_directory(folder / "disk");
+    const std::string script = "mount -t tmpfs -o size=128k none disk || exit 77\n"
+                               "echo precious > disk/out.flac\n"
+                               "timeout -s KILL 60 \"$0\" convert in.wav -f -o disk/out.flac\n"
+                               "echo $?; cat /dev/zero > disk/full 2>&-\n"
+                               "timeout -s KILL 60 \"$0\" waveform in.wav -o disk/out.png\n"
+                               "echo $?; ls -A disk; cat disk/out.flac";
+    const SProcessResult result =
+        run({"unshare", "-rm", "sh", "-c", script, kProgram}, folder.path(), programEnvironment());
+    if (result.out.empty()) GTEST_SKIP() << "no small disk can be mounted here: " << result.err;
+    EXPECT_EQ(result.out, "1\n1\nfull\nout.flac\nprecious\n");
+    EXPECT_EQ(result.err, "tonewright: in.wav: Could not write disk/out.flac: No space left on device\n"
+                          "tonewright: in.wav: Could not write disk/out.png: No space left on device\n");
+    EXPECT_EQ(result.err.find(".part"), std::string::npos) << result.err;
+}
+
+TEST_F(BadOutput, MayHaveNoFolderAnyMore) {
+    const std::string input = (folder / "in.wav").string();
+    write("in.wav", makeTone(8000, 1, 16, 0.1));
+    const SProcessResult result =
+        run({"sh", "-c", "mkdir gone; cd gone; rmdir ../gone; exec \"$0\" convert \"$1\" -o out.flac",
+             kProgram, input},
+            folder.path(), programEnvironment());
+    EXPECT_EQ(result.exitCode, 1);
+    EXPECT_EQ(result.err, "tonewright: The current folder does not exist\n");
+}
+
+TEST_F(BadOutput, BelongsToTheFirstOfTwoInputs) {
+    for (const char* name : {"a", "b", "out"}) std::filesystem::create_directory(folder / name);
+    write("a/x.wav", makeTone(44100, 1, 16, 0.1));
+    write("b/x.wav", makeTone(48000, 1, 16, 0.1));
+    for (int i = 0; i < 5; ++i) {
+        const std::string message =
+            fail({"convert", "-f", "a/x.wav", "b/x.wav", "a/x.wav", "--to", "wav", "--directory", "out"});
+        EXPECT_EQ(std::count(message.begin(), message.end(), '\n'), 2) << message;
+        EXPECT_NE(message.find("tonewright: b/x.wav: "), std::string::npos) << message;
+        EXPECT_EQ(readWav("out/x.wav").rate, 44100);
+    }
+}

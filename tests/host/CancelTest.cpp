@@ -1,0 +1,100 @@
+#include "host/Program.h"
+
+#include <chrono>
+#include <thread>
+
+using namespace tests;
+
+namespace {
+
+class Cancel : public CProgramTest {
+protected:
+    void SetUp() override {
+        // Six hours, of which the disk holds the header only.
+        const SSound silence{44100, 2, 16, {}};
+        const uint32_t bytes = 6 * 3600 * 44100u * 4;
+        folder.write("long.wav", makeWavHeader(silence, bytes));
+        std::filesystem::resize_file(folder / "long.wav", 44 + uint64_t{bytes});
+    }
+    bool hasTemporary() {
+        for (const std::string& name : list())
+            if (name.find(".part") != std::string::npos) return true;
+        return false;
+    }
+    template <class Condition> bool waitFor(Condition condition) {
+        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+        while (!condition()) {
+            if (std::chrono::steady_clock::now() > end) return false;
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        }
+        return true;
+    }
+};
+
+} // namespace
+
+TEST_F(Cancel, LeavesEverythingAsItWas) {
+    folder.write("out.flac", "precious");
+    for (int signal : {SIGINT, SIGTERM, SIGHUP}) {
+        SCOPED_TRACE(signal);
+        CProcess process({kProgram, "convert", "long.wav", "-f", "-o", "out.flac"}, folder.path(),
+                         programEnvironment());
+        ASSERT_TRUE(waitFor([&] { return hasTemporary(); }));
+        process.signal(signal);
+        const SProcessResult result = process.wait();
+        EXPECT_EQ(result.exitCode, 130) << result.err;
+        EXPECT_EQ(result.err, "");
+        EXPECT_EQ(list(), (std::set<std::string>{"long.wav", "out.flac"}));
+        EXPECT_EQ(readFile(folder / "out.flac"), "precious");
+    }
+}
+
+TEST_F(Cancel, IsAnEventAndStartsNothingMore) {
+    for (const char* name : {"a.wav", "b.wav"}) write(name, makeTone(8000, 1, 16, 0.1));
+    CProcess process({kProgram, "convert", "a.wav", "long.wav", "b.wav", "--to", "flac", "--json", "-j", "1"},
+                     folder.path(), programEnvironment());
+    ASSERT_TRUE(waitFor(
+        [&] { return process.readOut().find("\"progress\"") != std::string::npos && hasTemporary(); }));
+    process.signal(SIGINT);
+    const SProcessResult result = process.wait();
+    EXPECT_EQ(result.exitCode, 130) << result.err;
+    const std::vector<nlohmann::json> events = parseLines(result.out);
+    ASSERT_FALSE(events.empty());
+    EXPECT_EQ(events.back()["event"], "cancelled");
+    EXPECT_EQ(events.back()["input"], "long.wav");
+    EXPECT_EQ(list(), (std::set<std::string>{"a.wav", "a.flac", "long.wav", "b.wav"}));
+}
+
+TEST_F(Cancel, StopsEveryThread) {
+    std::vector<std::string> command{kProgram, "convert", "--to", "flac", "--json", "-j", "3"};
+    for (const char* name : {"1.wav", "2.wav", "3.wav"}) {
+        std::filesystem::create_hard_link(folder / "long.wav", folder / name);
+        command.push_back(name);
+    }
+    CProcess process(command, folder.path(), programEnvironment());
+    const auto running = [&] {
+        size_t count = 0;
+        for (const std::string& name : list()) count += name.find(".part") != std::string::npos;
+        return count == 3;
+    };
+    ASSERT_TRUE(waitFor(running));
+    process.signal(SIGINT);
+    const SProcessResult result = process.wait();
+    EXPECT_EQ(result.exitCode, 130) << result.err;
+    size_t cancelled = 0;
+    for (const nlohmann::json& event : parseLines(result.out)) cancelled += event["event"] == "cancelled";
+    EXPECT_EQ(cancelled, 3u);
+    EXPECT_EQ(list(), (std::set<std::string>{"1.wav", "2.wav", "3.wav", "long.wav"}));
+}
+
+TEST_F(Cancel, DoesNotComeFromAReaderThatLeft) {
+    write("in.wav", makeTone(44100, 2, 16, 1));
+    // The first reader ends at once, so that every later line meets a closed pipe.
+    const SProcessResult result = run({"bash", "-c",
+                                       "\"$0\" convert in.wav -o out.flac --json | true; "
+                                       "echo ${PIPESTATUS[0]}",
+                                       kProgram},
+                                      folder.path(), programEnvironment());
+    EXPECT_EQ(result.out, "0\n") << result.err;
+    peer({"flac", "-t", "-s", "out.flac"});
+}

@@ -1,0 +1,275 @@
+#include "host/Program.h"
+
+using namespace tests;
+
+namespace {
+
+class Convert : public CProgramTest {
+protected:
+    nlohmann::json probe(const std::string& file) {
+        return nlohmann::json::parse(
+            peer({"ffprobe", "-v", "error", "-of", "json", "-show_entries",
+                  "stream=codec_name,sample_rate,channels:format=duration,bit_rate", file}));
+    }
+    SSound decodeByPeer(const std::string& file) {
+        peer({"ffmpeg", "-v", "error", "-y", "-i", file, "-c:a", "pcm_s16le", "-f", "wav", "-bitexact",
+              "judge.wav"});
+        // A pipe of the same program would leave the sizes of the header open.
+        return readWav("judge.wav");
+    }
+    int property(const std::string& file, const char* option) {
+        return std::stoi(peer({"metaflac", option, file}));
+    }
+};
+
+} // namespace
+
+TEST_F(Convert, KeepsEverySampleThroughFlac) {
+    std::vector<SSound> sounds;
+    std::vector<std::string> there{"convert", "--to", "flac"},
+        back{"convert", "--to", "wav", "--directory", "back"};
+    std::filesystem::create_directory(folder / "back");
+    for (int bits : {8, 16, 24})
+        for (int channels = 1; channels <= 6; ++channels) {
+            // Not a whole number of blocks.
+            sounds.push_back(makeNoise(channels == 5 ? 96000 : 44100, channels, bits, 10007));
+            const std::string name = describe(sounds.back());
+            write(name + ".wav", sounds.back());
+            there.push_back(name + ".wav");
+            back.push_back(name + ".flac");
+        }
+    succeed(there);
+    succeed(back);
+    for (const SSound& sound : sounds) {
+        SCOPED_TRACE(describe(sound));
+        const std::string flac = describe(sound) + ".flac";
+        peer({"flac", "-t", "-s", "-w", flac});
+        EXPECT_EQ(property(flac, "--show-sample-rate"), sound.rate);
+        EXPECT_EQ(property(flac, "--show-channels"), sound.channels);
+        EXPECT_EQ(property(flac, "--show-bps"), sound.bits);
+        EXPECT_EQ(property(flac, "--show-total-samples"), static_cast<int>(sound.frames()));
+        peer({"flac", "-d", "-s", "-f", "-o", "judge.wav", flac});
+        EXPECT_TRUE(readWav("judge.wav") == sound) << "by the peer";
+        EXPECT_TRUE(readWav("back/" + describe(sound) + ".wav") == sound) << "back again";
+    }
+}
+
+TEST_F(Convert, KeepsEverySampleInPlainContainers) {
+    for (int bits : {16, 24})
+        for (const char* extension : {"wav", "aiff", "w64", "caf", "au"}) {
+            const SSound sound = makeNoise(48000, 2, bits, 5003);
+            SCOPED_TRACE(extension + describe(sound));
+            write("in.wav", sound);
+            succeed({"convert", "in.wav", "-f", "-o", std::string("out.") + extension});
+            succeed({"convert", std::string("out.") + extension, "-f", "-o", "back.wav"});
+            EXPECT_TRUE(readWav("back.wav") == sound);
+        }
+}
+
+TEST_F(Convert, ReadsWhatPeersWrite) {
+    const SSound sound = makeNoise(44100, 2, 16, 20011);
+    write("in.wav", sound);
+    peer({"flac", "-s", "--best", "-o", "peer.flac", "in.wav"});
+    peer({"sox", "in.wav", "peer.aiff"});
+    peer({"sox", "in.wav", "peer.w64"});
+    for (const char* file : {"peer.flac", "peer.aiff", "peer.w64"}) {
+        succeed({"convert", file, "-f", "-o", "out.wav"});
+        EXPECT_TRUE(readWav("out.wav") == sound) << file;
+    }
+}
+
+TEST_F(Convert, WritesWhatPeersRead) {
+    constexpr double kSeconds = 3.3;
+    const SSound tone = makeTone(44100, 2, 16, kSeconds, 500);
+    write("in.wav", tone);
+    static const struct {
+        const char* file;
+        std::vector<std::string> options;
+        const char* codec;
+        double tolerance; // one frame of the codec, in seconds
+        double bitRate;   // expected, or 0
+    } kCases[] = {
+        {"a.flac", {}, "flac", 0, 0},
+        {"a.wav", {}, "pcm_s16le", 0, 0},
+        {"a.aiff", {}, "pcm_s16be", 0, 0},
+        {"a.ogg", {}, "vorbis", 0, 0},
+        {"vbr.mp3", {"--quality", "0.8"}, "mp3", 1152 / 44100.0, 0},
+        {"abr.mp3",
+         {"--bitrate", "160k", "--min-bitrate", "64k", "--max-bitrate", "320k"},
+         "mp3",
+         1152 / 44100.0,
+         0},
+        {"cbr.mp3", {"--bitrate", "192k"}, "mp3", 1152 / 44100.0, 192000},
+    };
+    for (const auto& expected : kCases) {
+        SCOPED_TRACE(expected.file);
+        std::vector<std::string> command{"convert", "in.wav", "-o", expected.file};
+        command.insert(command.end(), expected.options.begin(), expected.options.end());
+        succeed(command);
+
+        const nlohmann::json told = probe(expected.file);
+        EXPECT_EQ(told["streams"][0]["codec_name"], expected.codec);
+        EXPECT_EQ(told["streams"][0]["sample_rate"], "44100");
+        EXPECT_EQ(told["streams"][0]["channels"], 2);
+        EXPECT_NEAR(std::stod(told["format"]["duration"].get<std::string>()), kSeconds,
+                    expected.tolerance * 2 + 1e-4);
+        if (expected.bitRate > 0) {
+            EXPECT_NEAR(std::stod(told["format"]["bit_rate"].get<std::string>()), expected.bitRate,
+                        expected.bitRate / 50);
+        }
+        EXPECT_EQ(peer({"soxi", "-r", expected.file}), "44100\n");
+        EXPECT_EQ(peer({"soxi", "-c", expected.file}), "2\n");
+
+        const SSound heard = decodeByPeer(expected.file);
+        EXPECT_NEAR(heard.seconds(), kSeconds, expected.tolerance + 1e-9);
+        for (int channel : {0, 1}) {
+            EXPECT_NEAR(measureFrequency(heard, channel), 500 * (channel + 1), 2);
+            EXPECT_NEAR(measureLevel(heard, channel), measureLevel(tone, channel), 0.02);
+        }
+        if (expected.codec == std::string("vorbis")) {
+            peer({"oggdec", "-Q", "-o", "judge.wav", expected.file});
+            EXPECT_EQ(readWav("judge.wav").frames(), tone.frames());
+        }
+    }
+}
+
+TEST_F(Convert, MeansWhatTheOptionsSay) {
+    static const struct {
+        SSound input;
+        const char* output;
+        std::vector<std::string> options;
+        int rate, channels, bits; // of what is written; bits 0 where the codec has none
+    } kCases[] = {
+        // Kept as it is wherever the target can hold it
+        {makeTone(48000, 2, 24, 0.4), "a.mp3", {}, 48000, 2, 0},
+        {makeTone(8000, 1, 8, 0.4), "a.wav", {}, 8000, 1, 8},
+        {makeTone(8000, 1, 8, 0.4), "a.mp3", {}, 8000, 1, 0},
+        {makeTone(8000, 1, 8, 0.4), "a.ogg", {}, 8000, 1, 0},
+        {makeTone(96000, 6, 24, 0.2), "a.wav", {}, 96000, 6, 24},
+        {makeTone(96000, 6, 24, 0.2), "a.ogg", {}, 96000, 6, 0},
+        // What it cannot hold becomes something that it can
+        {makeTone(96000, 6, 24, 0.4), "a.mp3", {}, 48000, 2, 0},
+        {makeTone(88200, 2, 16, 0.4), "a.mp3", {}, 44100, 2, 0},
+        {makeTone(11000, 1, 16, 0.4), "a.mp3", {}, 11025, 1, 0},
+        {makeTone(4000, 1, 16, 0.4), "a.mp3", {}, 8000, 1, 0},
+        // As asked
+        {makeTone(44100, 2, 16, 0.4), "a.wav", {"--rate", "22050"}, 22050, 2, 16},
+        {makeTone(44100, 2, 16, 0.4), "a.flac", {"--rate", "48000", "--channels", "1"}, 48000, 1, 16},
+        {makeTone(44100, 1, 16, 0.4), "a.ogg", {"--channels", "2"}, 44100, 2, 0},
+        {makeTone(44100, 2, 16, 0.4), "a.wav", {"--bits", "8"}, 44100, 2, 8},
+        {makeTone(44100, 2, 24, 0.4), "a.flac", {"--bits", "16"}, 44100, 2, 16},
+        {makeTone(44100, 2, 24, 0.4), "a.wav", {"--bits", "24"}, 44100, 2, 24},
+        {makeTone(44100, 2, 24, 0.4), "a.wav", {"--rate", "48000"}, 48000, 2, 16},
+        {makeTone(96000, 6, 24, 0.4), "a.mp3", {"--rate", "32000", "--channels", "1"}, 32000, 1, 0},
+    };
+    for (const auto& expected : kCases) {
+        SCOPED_TRACE(describe(expected.input) + " to " + expected.output + " " +
+                     testing::PrintToString(expected.options));
+        write("in.wav", expected.input);
+        std::vector<std::string> command{"convert", "in.wav", "-f", "-o", expected.output};
+        command.insert(command.end(), expected.options.begin(), expected.options.end());
+        succeed(command);
+        EXPECT_EQ(peer({"soxi", "-r", expected.output}), std::to_string(expected.rate) + "\n");
+        EXPECT_EQ(peer({"soxi", "-c", expected.output}), std::to_string(expected.channels) + "\n");
+        if (expected.bits > 0) {
+            EXPECT_EQ(peer({"soxi", "-b", expected.output}), std::to_string(expected.bits) + "\n");
+        }
+        const SSound heard = decodeByPeer(expected.output);
+        EXPECT_NEAR(heard.seconds(), expected.input.seconds(), 2 * 1152.0 / expected.rate);
+        if (expected.channels == expected.input.channels && heard.channels == expected.channels) {
+            EXPECT_NEAR(measureFrequency(heard, 0), 440, 12);
+        }
+    }
+}
+
+TEST_F(Convert, NeverGivesUpWhatWasAskedFor) {
+    write("in.wav", makeTone(44100, 6, 16, 0.1));
+    for (const std::vector<std::string>& options : std::initializer_list<std::vector<std::string>>{
+             {"--channels", "6"},
+             {"--rate", "7000"},
+             {"--rate", "96000", "--channels", "2"},
+         }) {
+        std::vector<std::string> command{"convert", "in.wav", "-o", "out.mp3"};
+        command.insert(command.end(), options.begin(), options.end());
+        const std::string message = fail(command);
+        EXPECT_NE(message.find("in.wav: "), std::string::npos) << message;
+        EXPECT_NE(message.find("out.mp3"), std::string::npos) << message;
+        EXPECT_EQ(list(), std::set<std::string>{"in.wav"});
+    }
+    fail({"convert", "in.wav", "-o", "out.flac", "--channels", "9"});
+    fail({"convert", "in.wav", "-o", "out.ogg", "--bitrate", "1k"});
+    EXPECT_EQ(list(), std::set<std::string>{"in.wav"});
+}
+
+TEST_F(Convert, ObeysQualityAndBitRate) {
+    write("in.wav", makeNoise(44100, 2, 16, 44100));
+    const auto size = [&](const char* extension, const char* option, const char* value) {
+        const std::string output = std::string("out.") + extension;
+        succeed({"convert", "in.wav", "-f", "-o", output, option, value});
+        return std::filesystem::file_size(folder / output);
+    };
+    EXPECT_LT(size("mp3", "--quality", "0.0") * 5, size("mp3", "--quality", "1.0") * 4);
+    EXPECT_LT(size("ogg", "--quality", "0"), size("ogg", "--quality", "0.9") / 2);
+    EXPECT_NEAR(static_cast<double>(size("mp3", "--bitrate", "64000")), 8000, 800);
+    EXPECT_NEAR(static_cast<double>(size("mp3", "--bitrate", "320K")), 40000, 3000);
+    // Of a sound that can be compressed
+    write("in.wav", makeTone(44100, 2, 16, 2));
+    EXPECT_LT(size("flac", "--quality", "1.0"), size("flac", "--quality", "0.01"));
+}
+
+TEST_F(Convert, TakesManyFilesAtOnce) {
+    std::vector<std::string> command{"convert", "--to", "flac", "--directory", "out", "-j", "4", "--json"};
+    std::filesystem::create_directory(folder / "out");
+    std::filesystem::create_directory(folder / "in");
+    std::vector<SSound> sounds;
+    for (int i = 0; i < 24; ++i) {
+        const std::string name = "in/" + std::to_string(i) + ".take.1.wav";
+        sounds.push_back(makeNoise(8000, 1 + i % 2, 16, 9000, static_cast<uint32_t>(i)));
+        write(name, sounds.back());
+        command.push_back(name);
+    }
+    succeed(command);
+    for (size_t i = 0; i < sounds.size(); ++i) {
+        const std::string name = std::to_string(i) + ".take.1";
+        peer({"flac", "-d", "-s", "-f", "-o", "judge.wav", "out/" + name + ".flac"});
+        EXPECT_TRUE(readWav("judge.wav") == sounds[i]) << name;
+    }
+    // Beside the inputs, and with a point
+    succeed({"convert", "--to", ".aiff", "in/3.take.1.wav", "in/4.take.1.wav", "-j", "1"});
+    EXPECT_TRUE(std::filesystem::exists(folder / "in/3.take.1.aiff"));
+    EXPECT_TRUE(std::filesystem::exists(folder / "in/4.take.1.aiff"));
+}
+
+TEST_F(Convert, TakesSoundsOfAnyLength) {
+    for (size_t frames : {size_t{1}, size_t{2}, size_t{1151}, size_t{4096}, size_t{4097}}) {
+        const SSound sound = makeNoise(44100, 2, 16, frames);
+        SCOPED_TRACE(frames);
+        write("in.wav", sound);
+        succeed({"convert", "in.wav", "-f", "-o", "out.flac"});
+        succeed({"convert", "out.flac", "-f", "-o", "out.wav"});
+        EXPECT_TRUE(readWav("out.wav") == sound);
+        for (const char* lossy : {"out.ogg", "out.mp3"}) {
+            succeed({"convert", "in.wav", "-f", "-o", lossy});
+            succeed({"convert", lossy, "-f", "-o", "out.wav"});
+            EXPECT_NEAR(static_cast<double>(readWav("out.wav").frames()), static_cast<double>(frames), 2304);
+        }
+    }
+}
+
+TEST_F(Convert, NeedsNoMoreMemoryForHoursThanForAMinute) {
+    constexpr long kLimit = 30 * 1024; // kB
+    const SSound silence{8000, 1, 16, {}};
+    for (uint32_t seconds : {60u, 6 * 3600u}) {
+        const uint32_t bytes = seconds * 16000;
+        folder.write("in.wav", makeWavHeader(silence, bytes));
+        std::filesystem::resize_file(folder / "in.wav", 44 + bytes); // a hole takes no disk
+        const SProcessResult result = tonewright({"convert", "in.wav", "-f", "-o", "out.flac"});
+        EXPECT_EQ(result.exitCode, 0) << result.err;
+        EXPECT_EQ(property("out.flac", "--show-total-samples"), static_cast<int>(bytes / 2));
+#ifndef TONEWRIGHT_SANITIZED
+        EXPECT_LT(result.peakMemory, kLimit) << seconds << " seconds";
+#else
+        (void)kLimit;
+#endif
+    }
+}

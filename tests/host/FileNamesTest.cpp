@@ -1,0 +1,78 @@
+#include "host/Program.h"
+
+using namespace tests;
+
+using FileNames = CProgramTest;
+
+// Each is read, written and told by every command.
+TEST_F(FileNames, MayBeAnything) {
+    const SSound sound = makeTone(8000, 1, 16, 0.2);
+    const std::vector<std::string> names = {
+        "two words",
+        "100% %41%zz",
+        "sharp#fragment",
+        "question?query=1&x=2;y",
+        "line\nbreak\ttab",
+        "not \xff\xfe UTF-8 \xc3",
+        "-leading",
+        "--rate",
+        "\xf0\x9f\x8e\xb5 \xe9\x9f\xb3\xe6\xa5\xbd \xc3\xbc",
+        "quote ' \" ` $HOME \\ back",
+        "(brackets) [square] {curly}, comma: colon!",
+        "file:",
+        ".hidden",
+        "a.b.flac",
+        "trailing. ",
+        std::string(200, 'n'),
+        std::string(250, 'n'), // nothing fits behind it
+        std::string(249, 'n') + "m",
+    };
+    std::filesystem::create_directory(folder / "out \xff");
+    std::vector<std::string> command{"convert", "--to", "flac", "--directory", "out \xff", "-j", "3", "--"};
+    std::vector<std::string> files;
+    for (const std::string& name : names) {
+        files.push_back(name + ".wav");
+        write(files.back(), sound);
+        command.push_back(files.back());
+    }
+    for (const std::string& name : names)
+        if (name.size() == 250) std::filesystem::rename(folder / (name + ".wav"), folder / (name + ".au"));
+    for (std::string& file : command)
+        if (file.size() == 254) file.replace(250, 4, ".au");
+    for (const std::string& name : names)
+        if (name.size() == 250)
+            peer({"sox", "-t", "wav", name + ".au", "-t", "au", "x.au"}),
+                std::filesystem::rename(folder / "x.au", folder / (name + ".au"));
+    const std::string out = succeed(command);
+    EXPECT_EQ(static_cast<size_t>(std::count(out.begin(), out.end(), '\n')), names.size());
+    for (const std::string& name : names) {
+        SCOPED_TRACE(name);
+        const std::string flac = "out \xff/" + name + ".flac";
+        succeed({"convert", "-f", "-o", "back.wav", "--", flac});
+        EXPECT_TRUE(readWav("back.wav") == sound);
+        const std::string told = succeed({"info", "--json", "--", flac});
+        EXPECT_EQ(parseLines(told).at(0)["rate"], 8000);
+    }
+    for (const std::string& name : list()) EXPECT_EQ(name.find(".part"), std::string::npos) << name;
+}
+
+TEST_F(FileNames, AreShownOnOneLine) {
+    folder.write("line\nbreak\x1b[2J.wav", "no sound");
+    const std::string message = fail({"info", "line\nbreak\x1b[2J.wav"});
+    EXPECT_EQ(message.find("tonewright: line\\x0abreak\\x1b[2J.wav: "), 0u) << message;
+    EXPECT_EQ(std::count(message.begin(), message.end(), '\n'), 1) << message;
+    // Also where the plug-in names the file, in whatever way
+    folder.write("b\xff 50%25.flac", "no sound at all, and no format of sound either");
+    for (const char* output : {"out.wav", "missing/\xff.wav"}) {
+        const std::string reason = fail({"convert", "b\xff 50%25.flac", "-o", output});
+        EXPECT_EQ(reason.find("tonewright: b\xff 50%25.flac: "), 0u) << reason;
+    }
+}
+
+TEST_F(FileNames, MayBeAbsoluteOrGoUp) {
+    std::filesystem::create_directories(folder / "a/b");
+    write("a/in.wav", makeTone(8000, 1, 16, 0.1));
+    succeed({"convert", "a/b/../in.wav", "-o", "./a/b/../b/out.flac"});
+    succeed({"convert", (folder / "a/in.wav").string(), "--to", "flac"});
+    EXPECT_EQ(readFile(folder / "a/b/out.flac"), readFile(folder / "a/in.flac"));
+}

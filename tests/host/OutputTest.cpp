@@ -1,0 +1,250 @@
+#include "host/Program.h"
+
+#include <png.h>
+
+#include <map>
+
+using namespace tests;
+
+namespace {
+
+class Output : public CProgramTest {
+protected:
+    // On a terminal of its own, with both outputs in one text.
+    std::string onTerminal(const std::string& arguments) {
+        const SProcessResult result =
+            run({"script", "-qec", std::string(kProgram) + " " + arguments, "/dev/null"}, folder.path(),
+                programEnvironment());
+        EXPECT_EQ(result.exitCode, 0) << result.out;
+        return result.out;
+    }
+};
+
+class Waveform : public CProgramTest {
+protected:
+    struct SPicture {
+        png_image header = {};
+        std::vector<uint8_t> pixels; // RGB
+
+        // Pixels of a rectangle that are neither white nor grey.
+        size_t countBlue(int left, int top, int right, int bottom) const {
+            size_t count = 0;
+            for (int y = top; y < bottom; ++y)
+                for (int x = left; x < right; ++x) {
+                    const uint8_t* pixel = &pixels[(static_cast<size_t>(y) * header.width + x) * 3];
+                    count += pixel[2] > pixel[0] + 40;
+                }
+            return count;
+        }
+    };
+
+    SPicture readPicture(const std::string& name) {
+        SPicture picture;
+        picture.header.version = PNG_IMAGE_VERSION;
+        EXPECT_NE(png_image_begin_read_from_file(&picture.header, (folder / name).c_str()), 0);
+        picture.header.format = PNG_FORMAT_RGB;
+        picture.pixels.resize(PNG_IMAGE_SIZE(picture.header));
+        EXPECT_NE(png_image_finish_read(&picture.header, nullptr, picture.pixels.data(), 0, nullptr), 0)
+            << picture.header.message;
+        return picture;
+    }
+};
+
+} // namespace
+
+TEST_F(Output, IsEventsWithJSON) {
+    write("good.wav", makeTone(44100, 2, 16, 1));
+    folder.write("bad.wav", "RIFF");
+    const SProcessResult result =
+        tonewright({"convert", "good.wav", "bad.wav", "--to", "flac", "--json", "-j", "1"});
+    EXPECT_EQ(result.exitCode, 1);
+    EXPECT_EQ(result.err, "");
+    std::vector<std::string> order;
+    double fraction = 0;
+    for (const nlohmann::json& event : parseLines(result.out)) {
+        const std::string kind = event["event"], input = event["input"];
+        EXPECT_EQ(event["output"], input.substr(0, input.find('.')) + ".flac");
+        if (kind == "progress") {
+            EXPECT_GE(event["fraction"].get<double>(), fraction);
+            fraction = event["fraction"];
+            EXPECT_LE(fraction, 1);
+            continue;
+        }
+        order.push_back(kind + " " + input);
+        if (kind == "done") {
+            EXPECT_EQ(event["codec"], "FLAC");
+            EXPECT_NEAR(event["duration"].get<double>(), 1, 1e-9);
+            EXPECT_GT(event["seconds"].get<double>(), 0);
+            EXPECT_EQ(event["bytes"], std::filesystem::file_size(folder / "good.flac"));
+        } else if (kind == "error") {
+            EXPECT_NE(event["message"], "");
+        }
+    }
+    EXPECT_EQ(order, (std::vector<std::string>{"start good.wav", "done good.wav", "start bad.wav",
+                                               "error bad.wav"}));
+}
+
+TEST_F(Output, IsALineForEachFileAndNothingMore) {
+    write("a.wav", makeTone(44100, 2, 16, 90));
+    const std::string line = succeed({"convert", "a.wav", "-o", "a.flac"});
+    EXPECT_EQ(line.find("a.flac: FLAC, 1:30.0, "), 0u) << line;
+    EXPECT_EQ(std::count(line.begin(), line.end(), '\n'), 1) << line;
+    EXPECT_EQ(succeed({"convert", "a.wav", "-q", "-o", "quiet.flac"}), "");
+    const SProcessResult loud = tonewright({"--log-level", "debug", "convert", "a.wav", "-o", "loud.flac"});
+    EXPECT_EQ(loud.exitCode, 0);
+    EXPECT_NE(loud.err, "");
+}
+
+TEST_F(Output, HasABarOnATerminalOnly) {
+    // Ten minutes of silence, long enough for the bar to grow
+    folder.write("a.wav", makeWavHeader({}, 600 * 176400));
+    std::filesystem::resize_file(folder / "a.wav", 44 + 600 * 176400);
+    const std::string shown = onTerminal("convert a.wav -o a.flac");
+    EXPECT_NE(shown.find("[#"), std::string::npos) << shown;
+    EXPECT_NE(shown.find(" %"), std::string::npos) << shown;
+    // Taken away again before the line that stays
+    EXPECT_LT(shown.rfind("\x1b[2K"), shown.find("a.flac: FLAC")) << shown;
+    EXPECT_EQ(onTerminal("convert -q a.wav -o quiet.flac"), "");
+    EXPECT_EQ(onTerminal("convert --json a.wav -o json.flac").find('\x1b'), std::string::npos);
+}
+
+TEST_F(Output, TellsWhatFilesHold) {
+    const std::map<std::string, SSound> sounds = {{"a.wav", makeTone(96000, 6, 24, 0.5)},
+                                                  {"b.flac", makeTone(44100, 1, 16, 1.5)},
+                                                  {"c.ogg", makeTone(48000, 2, 16, 0.75)},
+                                                  {"d.mp3", makeTone(22050, 2, 16, 1)}};
+    std::vector<std::string> command{"info"};
+    for (const auto& [name, sound] : sounds) {
+        write("in.wav", sound);
+        succeed({"convert", "in.wav", "-o", name});
+        command.push_back(name);
+    }
+    const std::string table = succeed(command);
+    EXPECT_EQ(std::count(table.begin(), table.end(), '\n'), 5) << table;
+    command.insert(command.end(), {"--json", "missing.wav"});
+    const SProcessResult result = tonewright(command);
+    EXPECT_EQ(result.exitCode, 1);
+    EXPECT_EQ(result.err, "");
+    const std::vector<nlohmann::json> lines = parseLines(result.out);
+    ASSERT_EQ(lines.size(), 5u);
+    EXPECT_EQ(lines[4]["file"], "missing.wav");
+    EXPECT_EQ(lines[4]["error"], "No such file or directory");
+    static constexpr const char* kCodecs[] = {"WAV", "FLAC", "Ogg Vorbis", "MP3"};
+    size_t i = 0;
+    for (const auto& [name, sound] : sounds) {
+        const nlohmann::json& line = lines[i];
+        EXPECT_EQ(line["file"], name);
+        EXPECT_EQ(line["codec"], kCodecs[i++]);
+        EXPECT_EQ(line["rate"], sound.rate);
+        EXPECT_EQ(line["channels"], sound.channels);
+        EXPECT_EQ(line["bits"], sound.bits);
+        EXPECT_NEAR(line["duration"].get<double>(), sound.seconds(), name == "d.mp3" ? 0.06 : 1e-6);
+        EXPECT_EQ(line["bytes"], std::filesystem::file_size(folder / name));
+        EXPECT_NE(table.find(name), std::string::npos);
+    }
+}
+
+TEST_F(Output, ListsWhatThePluginsRead) {
+    const std::string lines = succeed({"formats"});
+    std::istringstream in(lines);
+    std::set<std::string> names;
+    std::string previous;
+    for (std::string name; std::getline(in, name); previous = name) {
+        EXPECT_LT(previous, name);
+        names.insert(name);
+    }
+    for (const char* name : {"wav", "aiff", "au", "caf", "w64", "flac", "ogg", "mp3"})
+        EXPECT_EQ(names.count(name), 1u) << name;
+    EXPECT_EQ(nlohmann::json::parse(succeed({"formats", "--json"}))["read"].get<std::set<std::string>>(),
+              names);
+}
+
+TEST_F(Output, ExplainsItself) {
+    EXPECT_EQ(succeed({"--version"}).find("tonewright "), 0u);
+    EXPECT_NE(succeed({"--help"}).find("Exit codes"), std::string::npos);
+    for (const char* command : {"convert", "info", "formats", "waveform"})
+        EXPECT_NE(succeed({command, "--help"}).find("--help"), std::string::npos);
+}
+
+TEST_F(Output, RefusesWrongArguments) {
+    write("a.wav", makeTone(8000, 1, 16, 0.1));
+    for (const std::vector<std::string>& arguments : std::initializer_list<std::vector<std::string>>{
+             {},
+             {"transform"},
+             {"convert"},
+             {"convert", "a.wav"},
+             {"convert", "a.wav", "-o", "b.flac", "--to", "flac"},
+             {"convert", "a.wav", "a.wav", "-o", "b.flac"},
+             {"convert", "a.wav", "-o", "b.flac", "--rate", "0"},
+             {"convert", "a.wav", "-o", "b.flac", "--rate", "fast"},
+             {"convert", "a.wav", "-o", "b.flac", "--channels", "-1"},
+             {"convert", "a.wav", "-o", "b.flac", "--bits", "12"},
+             {"convert", "a.wav", "-o", "b.flac", "--quality", "1.1"},
+             {"convert", "a.wav", "-o", "b.flac", "--quality", "nan"},
+             {"convert", "a.wav", "-o", "b.mp3", "--bitrate", "-128k"},
+             {"convert", "a.wav", "-o", "b.mp3", "--bitrate", "0"},
+             {"convert", "a.wav", "-o", "b.mp3", "--bitrate", "99999999k"},
+             {"convert", "a.wav", "-o", "b.mp3", "--min-bitrate", "64k"},
+             {"convert", "a.wav", "-o", "b.mp3", "--bitrate", "64k", "--min-bitrate", "128k"},
+             {"convert", "a.wav", "-o", "b.flac", "-j", "0"},
+             {"convert", "a.wav", "--to", "fl/ac"},
+             {"convert", "a.wav", "--to", "flac", "--directory", "missing"},
+             {"convert", "a.wav", "-o", "b.flac", "--directory", "."},
+             {"convert", "a.wav", "-o", "b.flac", "-q", "--json"},
+             {"convert", "a.wav", "-o", ""},
+             {"info"},
+             {"formats", "more"},
+             {"waveform", "a.wav"},
+             {"waveform", "a.wav", "-o", "a.png", "--width", "1"},
+             {"waveform", "a.wav", "-o", "a.png", "--height", "1000000"},
+             {"--log-level", "shouting", "formats"},
+         }) {
+        const SProcessResult result = tonewright(arguments);
+        EXPECT_EQ(result.exitCode, 2) << testing::PrintToString(arguments) << result.err;
+        EXPECT_EQ(result.out, "");
+        EXPECT_GT(result.err.size(), 10u);
+    }
+    EXPECT_EQ(list(), std::set<std::string>{"a.wav"});
+}
+
+TEST_F(Output, MissesTheLibrary) {
+    for (const char* library : {"/missing/libtonewright.so", "/dev/null"}) {
+        const SProcessResult result =
+            run({kProgram, "formats"}, folder.path(), {{"TONEWRIGHT_LIBRARY", library}});
+        EXPECT_EQ(result.exitCode, 4);
+        EXPECT_EQ(result.err.find("tonewright: cannot load the library: "), 0u) << result.err;
+    }
+}
+
+TEST_F(Waveform, ShowsWhereSoundIs) {
+    // The left channel sounds in its first half only, the right one not at all.
+    SSound sound = makeTone(44100, 2, 16, 2);
+    for (size_t frame = 0; frame < sound.frames(); ++frame) {
+        char* samples = sound.samples.data() + frame * 4;
+        std::fill(samples + (frame < sound.frames() / 2 ? 2 : 0), samples + 4, '\0');
+    }
+    write("in.wav", sound);
+    succeed({"waveform", "in.wav", "-o", "out.png", "--width", "400", "--height", "200"});
+    const SPicture picture = readPicture("out.png");
+    ASSERT_EQ(picture.header.width, 400u);
+    ASSERT_EQ(picture.header.height, 200u);
+    // Half of full scale fills half of the strip, less a margin.
+    EXPECT_NEAR(static_cast<double>(picture.countBlue(0, 0, 200, 100)), 200 * 47, 200 * 4);
+    EXPECT_LE(picture.countBlue(202, 0, 400, 100), 198u); // a line of silence
+    EXPECT_LE(picture.countBlue(0, 100, 400, 200), 400u);
+}
+
+TEST_F(Waveform, IsDrawnOfAnyLength) {
+    for (int frames : {1, 99, 101, 5000, 300000}) {
+        SCOPED_TRACE(frames);
+        write("in.wav", makeNoise(44100, 1, 16, static_cast<size_t>(frames)));
+        succeed({"waveform", "in.wav", "-f", "-o", "out.png"});
+        const SPicture picture = readPicture("out.png");
+        EXPECT_EQ(picture.header.width, 1200u);
+        EXPECT_EQ(picture.header.height, 300u);
+        if (frames < 5000) continue;
+        // Noise of full scale reaches the end; what the library holds back is 100 steps at most.
+        EXPECT_GT(picture.countBlue(0, 0, 1170, 300), 1170u * 300 * (frames > 100000 ? 8 : 1) / 10);
+        EXPECT_GT(picture.countBlue(1150, 0, 1175, 300), 100u);
+    }
+}

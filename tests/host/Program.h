@@ -1,0 +1,85 @@
+// Runs the program under test in a folder of the test's own.
+#pragma once
+
+#include "host/Wav.h"
+#include "support/Process.h"
+#include "support/TempFolder.h"
+
+#include <gtest/gtest.h>
+
+#include <nlohmann/json.hpp>
+
+#include <set>
+#include <string>
+#include <vector>
+
+namespace tests {
+
+constexpr const char* kProgram = TONEWRIGHT_PROGRAM;
+// What a sanitizer ends the program with, which no exit code of its own is.
+constexpr int kSanitizerExit = 99;
+
+inline std::vector<std::pair<std::string, std::string>> programEnvironment() {
+    std::vector<std::pair<std::string, std::string>> environment;
+    for (const char* name : {"ASAN_OPTIONS", "UBSAN_OPTIONS", "TSAN_OPTIONS"}) {
+        const char* old = std::getenv(name);
+        environment.emplace_back(name, (old ? std::string(old) + ":" : std::string()) +
+                                           "exitcode=" + std::to_string(kSanitizerExit));
+    }
+    return environment;
+}
+
+class CProgramTest : public testing::Test {
+protected:
+    // Killed, with exit code 137, after a minute: nothing here takes that long.
+    SProcessResult tonewright(std::vector<std::string> arguments) {
+        arguments.insert(arguments.begin(), {"timeout", "-s", "KILL", "60", kProgram});
+        SProcessResult result = run(arguments, folder.path(), programEnvironment());
+        EXPECT_LE(result.exitCode, 4) << "killed or crashed: " << result.err;
+        return result;
+    }
+    // A run that must succeed and have nothing to complain of.
+    std::string succeed(const std::vector<std::string>& arguments) {
+        const SProcessResult result = tonewright(arguments);
+        EXPECT_EQ(result.exitCode, 0) << result.err;
+        EXPECT_EQ(result.err, "");
+        return result.out;
+    }
+    // A run whose files fail, with the line that names each of them; returns standard error.
+    std::string fail(const std::vector<std::string>& arguments) {
+        const SProcessResult result = tonewright(arguments);
+        EXPECT_EQ(result.exitCode, 1) << result.out << result.err;
+        EXPECT_EQ(result.err.substr(0, 12), "tonewright: ");
+        for (const char* hidden : {".part", "file://", "  "})
+            EXPECT_EQ(result.err.find(hidden), std::string::npos) << result.err;
+        return result.err;
+    }
+    // A peer, which must succeed.
+    std::string peer(const std::vector<std::string>& command) {
+        const SProcessResult result = run(command, folder.path());
+        EXPECT_EQ(result.exitCode, 0) << command[0] << ": " << result.out << result.err;
+        return result.out;
+    }
+
+    void write(const std::string& name, const SSound& sound) { folder.write(name, toWav(sound)); }
+    SSound readWav(const std::string& name) { return parseWav(readFile(folder / name)); }
+    // Everything below the folder, by relative names; folders end in a slash.
+    std::set<std::string> list() {
+        std::set<std::string> names;
+        for (const auto& entry : std::filesystem::recursive_directory_iterator(folder.path()))
+            names.insert(entry.path().lexically_relative(folder.path()).string() +
+                         (entry.is_directory() && !entry.is_symlink() ? "/" : ""));
+        return names;
+    }
+
+    CTempFolder folder;
+};
+
+inline std::vector<nlohmann::json> parseLines(const std::string& text) {
+    std::vector<nlohmann::json> lines;
+    std::istringstream in(text);
+    for (std::string line; std::getline(in, line);) lines.push_back(nlohmann::json::parse(line));
+    return lines;
+}
+
+} // namespace tests
