@@ -70,7 +70,7 @@ int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
             else
                 printFailure(file, error.what());
         }
-        std::fflush(stdout);
+        if (!flushOutput()) break;
     }
     return failed ? kExitFailure : kExitSuccess;
 }
@@ -88,6 +88,7 @@ int listFormats(CLibrary& library, bool json) {
     } else {
         for (const std::string& name : names) std::printf("%s\n", name.c_str());
     }
+    flushOutput();
     return names.empty() ? kExitFailure : kExitSuccess;
 }
 

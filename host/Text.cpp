@@ -2,7 +2,10 @@
 
 #include <array>
 #include <cctype>
+#include <cerrno>
 #include <cstdio>
+#include <cstring>
+#include <stdexcept>
 
 namespace host {
 
@@ -125,6 +128,12 @@ std::string asReason(std::string message, const std::filesystem::path& about) {
     if (!message.empty())
         message[0] = static_cast<char>(std::toupper(static_cast<unsigned char>(message[0])));
     return message;
+}
+
+bool flushOutput() {
+    if (std::fflush(stdout) == 0) return true;
+    if (errno == EPIPE) return false;
+    throw std::runtime_error(std::string("Standard output cannot be written: ") + std::strerror(errno));
 }
 
 std::string formatDuration(double seconds) {

@@ -20,6 +20,10 @@ std::string withPaths(std::string_view message);
 std::string asReason(std::string message, const std::filesystem::path& about);
 void replaceAll(std::string& text, const std::string& what, const std::string& with);
 
+// Of what was printed to standard output. False when its reader has left; throws std::runtime_error when it
+// cannot be written.
+bool flushOutput();
+
 std::string formatDuration(double seconds); // 1:02:03.4
 std::string formatSize(uint64_t bytes);     // 1.2 MB
 
