@@ -100,6 +100,7 @@ TEST_F(BadInput, MayBeDamaged) {
         const std::string name = std::string("whole.") + extension;
         succeed({"convert", "in.wav", "-o", name});
         const std::string whole = readFile(folder / name);
+        ASSERT_GT(whole.size(), 200u);
         const auto add = [&](const std::string& kind, int number, const std::string& bytes) {
             files.push_back(extension + kind + std::to_string(number) + "." + extension);
             folder.write(files.back(), bytes);

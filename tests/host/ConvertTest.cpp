@@ -67,14 +67,32 @@ TEST_F(Convert, KeepsEverySampleInPlainContainers) {
 }
 
 TEST_F(Convert, ReadsWhatPeersWrite) {
-    const SSound sound = makeNoise(44100, 2, 16, 20011);
-    write("in.wav", sound);
-    peer({"flac", "-s", "--best", "-o", "peer.flac", "in.wav"});
-    peer({"sox", "in.wav", "peer.aiff"});
-    peer({"sox", "in.wav", "peer.w64"});
-    for (const char* file : {"peer.flac", "peer.aiff", "peer.w64"}) {
+    for (int bits : {16, 24}) {
+        const SSound sound = makeNoise(32000, bits == 16 ? 1 : 2, bits, 20011);
+        write("in.wav", sound);
+        peer({"flac", "-s", "-f", "--best", "-o", "peer.flac", "in.wav"});
+        for (const char* file : {"peer.aiff", "peer.w64", "peer.au", "peer.caf", "peer.wav"})
+            peer({"sox", "in.wav", file});
+        peer({"ffmpeg", "-v", "error", "-y", "-i", "in.wav", "-c:a", "copy", "-f", "wav", "-rf64", "always",
+              "peer.rf64"});
+        for (const char* file :
+             {"peer.flac", "peer.aiff", "peer.w64", "peer.au", "peer.caf", "peer.wav", "peer.rf64"}) {
+            succeed({"convert", file, "-f", "-o", "out.wav"});
+            EXPECT_TRUE(readWav("out.wav") == sound) << file << " " << bits;
+        }
+    }
+    // What has no width of its own comes with 16 bits.
+    write("in.wav", makeTone(8000, 1, 16, 0.5));
+    peer({"sox", "in.wav", "-e", "mu-law", "peer.au"});
+    peer({"lame", "--quiet", "-b", "64", "in.wav", "peer.mp3"});
+    peer({"ffmpeg", "-v", "error", "-y", "-i", "in.wav", "peer.ogg"});
+    for (const char* file : {"peer.au", "peer.mp3", "peer.ogg"}) {
+        SCOPED_TRACE(file);
         succeed({"convert", file, "-f", "-o", "out.wav"});
-        EXPECT_TRUE(readWav("out.wav") == sound) << file;
+        const SSound heard = readWav("out.wav");
+        EXPECT_EQ(describe(heard), "8000_1ch_16bit");
+        EXPECT_NEAR(heard.seconds(), 0.5, 2 * 1152.0 / 8000);
+        EXPECT_NEAR(measureFrequency(heard, 0), 440, 5);
     }
 }
 

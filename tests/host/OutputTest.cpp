@@ -159,6 +159,16 @@ TEST_F(Output, ListsWhatThePluginsRead) {
               names);
 }
 
+TEST_F(Output, MissesAPlaceForItsText) {
+    write("a.wav", makeTone(8000, 1, 16, 0.1));
+    for (const char* arguments : {"formats", "info a.wav", "info --json a.wav"}) {
+        const SProcessResult result =
+            run({"sh", "-c", std::string(kProgram) + " " + arguments + " > /dev/full"}, folder.path());
+        EXPECT_EQ(result.exitCode, 1);
+        EXPECT_EQ(result.err, "tonewright: Standard output cannot be written: No space left on device\n");
+    }
+}
+
 TEST_F(Output, ExplainsItself) {
     EXPECT_EQ(succeed({"--version"}).find("tonewright "), 0u);
     EXPECT_NE(succeed({"--help"}).find("Exit codes"), std::string::npos);
