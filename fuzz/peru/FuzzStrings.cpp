@@ -36,6 +36,8 @@ void exercise(const P<IString>& a, const P<IString>& b) {
         P<IString> removed = a->replace(b, "");
         require(removed->getLength() < a->getLength());
     }
+    a->replace(a->substring(kStringBegin, a->getPosition(1)), b);
+    a->replaceRange(a->getPosition(a->getLength() / 2), 1, b);
     a->trim();
     a->toUpper();
     a->toLatin1String();

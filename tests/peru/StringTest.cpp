@@ -243,6 +243,16 @@ TEST(String, UnencodableCharacter_TurnsTheResultIntoUTF8) {
 }
 
 // Bytes that this decoder rejects are carried through edits in the same encoding, never made into characters.
+// UTF-16 does not hold a lone surrogate that comes in from UTF-8, and UTF-8 does not read again all that
+// UTF-16 holds.
+TEST(String, TextThatNoEncodingHolds_GetsSubstitutes) {
+    const P<IString> text = newString(u"\u0905-\u0906");
+    const P<IString> surrogate = make<CUTF8String>("abcdefghijklm\xED\xA0\x80");
+    EXPECT_EQ(decode(text->replace("-", surrogate)), U"\u0905abcdefghijklm?\u0906");
+    EXPECT_EQ(decode(text->replaceRange(text->getPosition(1), 1, surrogate)), U"\u0905abcdefghijklm?\u0906");
+    EXPECT_EQ(decode(text + surrogate), U"\u0905-\u0906abcdefghijklm?");
+}
+
 TEST(String, MalformedBytes_StayInvisible) {
     P<IString> smile = CString::fromUTF8("a\xF0\x9F\x98\x80");
     EXPECT_EQ(smile->getLength(), 1);
