@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <cstdlib>
 #include <cwchar>
+#include <new>
 #include <string>
 
 namespace peru {
@@ -138,6 +139,7 @@ P<IString> CString::fromView(const SStringView& view) {
 }
 
 P<IString> CString::fromUTF8(std::string_view bytes) {
+    if (bytes.size() > INT32_MAX) throw std::bad_alloc();
     return make<CUTF8String>(bytes.data(), static_cast<int32_t>(bytes.size()));
 }
 
@@ -285,7 +287,8 @@ CStringSlice::~CStringSlice() = default;
 
 namespace {
 
-constexpr int32_t getByteSize(int32_t length, int32_t unit) {
+int32_t getByteSize(int32_t length, int32_t unit) {
+    if (length > INT32_MAX / unit) throw std::bad_alloc();
     return length < 0 ? -1 : length * unit;
 }
 
