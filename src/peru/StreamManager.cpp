@@ -29,16 +29,20 @@ void CStreamManager::removeFactory(const P<IStreamFactory>& factory) {
 
 void CStreamManager::reportMissing(const P<IURI>& uri) const {
     CMutexLock lock(m_mutex);
-    for (const P<IStreamFactory>& factory : m_factories)
-        if (const P<CStreamFactory> speaking = tryCast<CStreamFactory>(factory)) speaking->reportMissing(uri);
+    for (size_t i = 0; i < m_factories.getCount(); ++i)
+        if (const P<CStreamFactory> speaking = tryCast<CStreamFactory>(m_factories[i]))
+            speaking->reportMissing(uri);
 }
 
 template <class S, class... A> P<S>
 CStreamManager::askEach(P<S> (IStreamFactory::*open)(const P<IURI>&, A...), const P<IURI>& uri, A... mode) {
     if (!uri) throw CInvalidArgError("uri", "IStreamManager");
     CMutexLock lock(m_mutex);
-    for (const P<IStreamFactory>& factory : m_factories)
+    // By index and with a handle of its own: a factory that is asked may enter or remove factories.
+    for (size_t i = 0; i < m_factories.getCount(); ++i) {
+        const P<IStreamFactory> factory = m_factories[i];
         if (P<S> stream = (factory.get()->*open)(uri, mode...)) return stream;
+    }
     return nullptr;
 }
 

@@ -32,7 +32,7 @@ private:
     P<S> askEach(P<S> (IStreamFactory::*open)(const P<IURI>&, A...), const P<IURI>& uri, A... mode);
 
     P<IMutex> m_mutex; // guards the array, and is held while the factories are asked
-    TSimpleArray<P<IStreamFactory>> m_factories;
+    TCleaningSimpleArray<P<IStreamFactory>> m_factories;
 };
 
 } // namespace peru

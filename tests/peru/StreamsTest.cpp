@@ -301,6 +301,27 @@ TEST(StreamManager, AsksInTheOrderOfRegistration) {
     EXPECT_FALSE(manager->tryGetSeekableInStream(uri)); // known, but not in this kind
 }
 
+// Opens nothing itself, but brings the factories that do, and leaves.
+class CBringingFactory : public CStreamFactory {
+public:
+    explicit CBringingFactory(IStreamManager& manager) : m_manager(manager) {}
+    P<IInStream> tryGetInStream(const P<IURI>&) override {
+        m_manager.removeFactory(P<IStreamFactory>::share(this));
+        for (int i = 0; i < 20; ++i) m_manager.addFactory(make<CNamedFactory>("res:x", "brought"));
+        return nullptr;
+    }
+
+private:
+    IStreamManager& m_manager;
+};
+
+TEST(StreamManager, LetsAFactoryChangeTheListWhileItIsAsked) {
+    const P<CStreamManager> manager = make<CStreamManager>();
+    manager->addFactory(make<CBringingFactory>(*manager));
+    const P<IURI> uri = make<CURI>("res:x");
+    EXPECT_EQ(readAll(*manager->getInStream(uri)), "brought");
+}
+
 TEST(StreamManager, TellsMissingFilesFromUnknownKinds) {
     const tests::CTempFolder folder;
     const P<IStreamManager> manager = getStreamManager();
