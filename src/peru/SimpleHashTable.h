@@ -18,6 +18,8 @@ public:
     explicit TSimpleHashTable(size_t size = 17) : m_slots(size > 0 ? size : 1) {}
     TSimpleHashTable(const TSimpleHashTable&) = delete;
     TSimpleHashTable& operator=(const TSimpleHashTable&) = delete;
+    // Node by node: left to themselves the nodes of a long chain would destroy each other recursively.
+    ~TSimpleHashTable() { clear(); }
 
     // Null when the key is not there.
     V* find(const IString& key) const {
