@@ -21,17 +21,18 @@ struct SText {
     const char* text;
 };
 
-constexpr SText kOpenError{"peru.CDiskFile.openError", "The file '%URI%' could not be opened: %REASON%."};
-constexpr SText kReadError{"peru.CDiskFile.readError", "The file '%URI%' could not be read: %REASON%."};
-constexpr SText kWriteError{"peru.CDiskFile.writeError", "The file '%URI%' could not be written: %REASON%."};
+constexpr SText kOpenError{"peru.CDiskFile.openError", "The file '%URI%' could not be opened: %ERRORDESC%."};
+constexpr SText kReadError{"peru.CDiskFile.readError", "The file '%URI%' could not be read: %ERRORDESC%."};
+constexpr SText kWriteError{"peru.CDiskFile.writeError",
+                            "The file '%URI%' could not be written: %ERRORDESC%."};
 constexpr SText kSeekError{"peru.CDiskFile.seekError",
-                           "The position in the file '%URI%' could not be changed: %REASON%."};
+                           "The position in the file '%URI%' could not be changed: %ERRORDESC%."};
 constexpr SText kSizeError{"peru.CDiskFile.sizeError",
-                           "The size of the file '%URI%' could not be read or changed: %REASON%."};
+                           "The size of the file '%URI%' could not be read or changed: %ERRORDESC%."};
 
 [[noreturn]] void raise(const SText& message, int error, const P<IURI>& uri) {
     if (error == EACCES || error == EPERM || error == EROFS) throw CFileAccessDeniedError(uri);
-    throw CStreamError(localize(message.key, message.text, {{"%REASON%", getSystemText(error)}}), uri);
+    throw CStreamError(localize(message.key, message.text, {{"%ERRORDESC%", getSystemText(error)}}), uri);
 }
 
 int getFlags(EAccess access, EOpenMode mode) {
