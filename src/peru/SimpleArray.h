@@ -1,6 +1,8 @@
 // Growing arrays of values.
 #pragma once
 
+#include "peru/Api.h"
+
 #include <algorithm>
 #include <cstddef>
 #include <memory>
@@ -8,11 +10,35 @@
 
 namespace peru {
 
-// When count + 1 exceeds the capacity, it becomes max(count + 1, capacity + step). Removing an element
-// shifts the rest down and keeps the order. The elements are destroyed when the array goes.
-template <class E> class TSimpleArray {
+// What does not depend on the element. When count + 1 exceeds the capacity, it becomes
+// max(count + 1, capacity + step).
+class PERU_API CSimpleArrayTemplateBase {
 public:
-    explicit TSimpleArray(size_t capacity = 0, size_t step = 16) : m_step(step) { reserve(capacity); }
+    size_t getCount() const { return m_count; }
+    size_t getCapacity() const { return m_capacity; }
+
+protected:
+    explicit CSimpleArrayTemplateBase(size_t step) : m_step(step) {}
+    ~CSimpleArrayTemplateBase() = default;
+    // The capacity for one element more.
+    size_t getNextCapacity() const {
+        return m_count < m_capacity ? m_capacity : std::max(m_count + 1, m_capacity + m_step);
+    }
+
+    size_t m_capacity = 0;
+    size_t m_count = 0;
+
+private:
+    size_t m_step;
+};
+
+// Removing an element shifts the rest down and keeps the order. The elements are destroyed when the array
+// goes.
+template <class E> class TSimpleArray : public CSimpleArrayTemplateBase {
+public:
+    explicit TSimpleArray(size_t capacity = 0, size_t step = 16) : CSimpleArrayTemplateBase(step) {
+        reserve(capacity);
+    }
     TSimpleArray(const TSimpleArray&) = delete;
     TSimpleArray& operator=(const TSimpleArray&) = delete;
     ~TSimpleArray() {
@@ -21,7 +47,7 @@ public:
     }
 
     void add(E element) {
-        if (m_count + 1 > m_capacity) reserve(std::max(m_count + 1, m_capacity + m_step));
+        reserve(getNextCapacity());
         std::construct_at(m_elements + m_count, std::move(element));
         ++m_count;
     }
@@ -36,8 +62,6 @@ public:
         while (m_count > 0) std::destroy_at(m_elements + --m_count);
     }
 
-    size_t getCount() const { return m_count; }
-    size_t getCapacity() const { return m_capacity; }
     E& operator[](size_t index) { return m_elements[index]; }
     const E& operator[](size_t index) const { return m_elements[index]; }
     E* begin() { return m_elements; }
@@ -57,12 +81,10 @@ private:
     }
 
     E* m_elements = nullptr;
-    size_t m_capacity = 0;
-    size_t m_count = 0;
-    size_t m_step;
 };
 
 // Named apart where the destruction of the elements is what the array is for: arrays of handles.
 template <class E> using TCleaningSimpleArray = TSimpleArray<E>;
+using CCleaningSimpleArrayTemplateBase = CSimpleArrayTemplateBase;
 
 } // namespace peru
