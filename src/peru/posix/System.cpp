@@ -4,6 +4,7 @@
 #include "peru/GlobalObjFactory.h"
 #include "peru/IPathes.h"
 #include "peru/IStringLocalizer.h"
+#include "peru/RandomNumberGenerator.h"
 #include "peru/posix/FileOperations.h"
 #include "peru/posix/FileVersion.h"
 #include "peru/posix/PlatformFile.h"
@@ -18,7 +19,6 @@
 #include <link.h>
 #include <memory>
 #include <pwd.h>
-#include <random>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -85,10 +85,9 @@ std::string getInstallationPrefix(const std::string& libraryFolder) {
 
 std::string makeUniqueWord() {
     static const char kDigits[] = "0123456789abcdefghijklmnopqrstuvwxyz";
-    std::random_device device;
-    std::uniform_int_distribution<int> digit(0, 35);
+    const P<CMersenneTwisterRandomNumberGenerator> random = getRandomNumberGenerator();
     std::string word;
-    for (int i = 0; i < 12; ++i) word += kDigits[digit(device)];
+    for (int i = 0; i < 12; ++i) word += kDigits[random->getNextBelow(36)];
     return word;
 }
 
