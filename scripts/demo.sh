@@ -4,7 +4,7 @@
 set -euo pipefail
 
 cd "$(dirname "$0")/.."
-scripts/build.sh release tonewright_host companions plugins
+scripts/build.sh release tonewright_host companions/all plugins/all
 tonewright=build/release/bin/tonewright
 target=${1:-build/demo}
 mkdir -p "$target"
