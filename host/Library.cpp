@@ -2,16 +2,32 @@
 
 #include <cstdlib>
 #include <dlfcn.h>
+#include <filesystem>
 #include <stdexcept>
 #include <string>
+#include <system_error>
 
 namespace host {
+
+namespace {
+
+// In a build tree and in an installed one alike the library lies in the neighbouring folder. It is named in
+// full: whoever stands between this program and the loader (a sanitizer does) has a search path of its own.
+std::string findLibrary() {
+    if (const char* chosen = std::getenv("TONEWRIGHT_LIBRARY")) return chosen;
+    std::error_code none;
+    const std::filesystem::path program = std::filesystem::read_symlink("/proc/self/exe", none);
+    const std::filesystem::path beside =
+        program.parent_path().parent_path() / TONEWRIGHT_LIBDIR / TONEWRIGHT_SONAME;
+    return std::filesystem::exists(beside, none) ? beside.string() : TONEWRIGHT_SONAME;
+}
+
+} // namespace
 
 CLibrary::CLibrary() {
     // Messages reach the user through the log; the library need not print them as well.
     ::setenv("TONEWRIGHT_DEBUG_OUTPUT", "0", 0);
-    const char* chosen = std::getenv("TONEWRIGHT_LIBRARY");
-    m_module = ::dlopen(chosen ? chosen : TONEWRIGHT_SONAME, RTLD_NOW | RTLD_LOCAL);
+    m_module = ::dlopen(findLibrary().c_str(), RTLD_NOW | RTLD_LOCAL);
     if (!m_module) throw std::runtime_error(std::string("cannot load the library: ") + ::dlerror());
 #define HOST_RESOLVE(name)                                                                                   \
     name = reinterpret_cast<decltype(name)>(::dlsym(m_module, "TONEWRIGHT_" #name));                         \
