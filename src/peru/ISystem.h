@@ -28,6 +28,9 @@ public:
     virtual void moveFolder(const P<IURI>& source, const P<IURI>& destination) = 0; // within a volume
     // Version of a shared library of the platform, such as "libgio-2.0.so.0"; empty when it is not there.
     virtual P<IString> getLibraryVersion(const CStringArg& libraryName) = 0;
+    // Makes the bytes the whole content of a file, which need not exist. They are written beside it and take
+    // its name once they are on the medium; mode and links stay. Throws CFileError with the file as it was.
+    virtual void replaceFile(const P<IURI>& file, const void* data, int64_t size) = 0;
 };
 
 PERU_API P<ISystem> getSystem();

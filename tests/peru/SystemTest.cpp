@@ -6,9 +6,11 @@
 
 #include "peru/URI.h"
 
+#include <csignal>
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <set>
+#include <sys/resource.h>
 #include <sys/stat.h>
 
 using namespace peru;
@@ -161,6 +163,46 @@ TEST(System, MovesByName) {
     fs::create_directory(folder / "empty");
     EXPECT_THROW(getSystem()->moveFolder(toURI(folder / "e"), toURI(folder / "empty")), CFileError);
     EXPECT_TRUE(fs::exists(folder / "e"));
+}
+
+TEST(System, ReplacesAFileAsAWhole) {
+    CTempFolder folder;
+    const fs::path old = folder.write("old", "something longer");
+    fs::permissions(old, fs::perms::owner_read | fs::perms::owner_write | fs::perms::group_read);
+    fs::create_symlink("old", folder / "link");
+    fs::create_hard_link(old, folder / "second name");
+    getSystem()->replaceFile(toURI(folder / "link"), "new", 3);
+    EXPECT_TRUE(fs::is_symlink(folder / "link"));
+    EXPECT_EQ(tests::readFile(old), "new");
+    EXPECT_EQ(fs::status(old).permissions(),
+              fs::perms::owner_read | fs::perms::owner_write | fs::perms::group_read);
+    EXPECT_EQ(tests::readFile(folder / "second name"), "something longer") << "never written in place";
+    getSystem()->replaceFile(toURI(folder / "fresh"), "", 0);
+    EXPECT_EQ(fs::file_size(folder / "fresh"), 0u);
+    EXPECT_EQ(countEntries(folder.path()), 4u) << "nothing stays beside";
+}
+
+TEST(System, KeepsTheOldFileWhereTheNewOneDoesNotFit) {
+    CTempFolder folder;
+    const fs::path old = folder.write("old", "precious");
+    fs::create_directory(folder / "folder");
+    const std::string large(1 << 20, 'x');
+    const auto size = static_cast<int64_t>(large.size());
+    struct rlimit limit;
+    ASSERT_EQ(getrlimit(RLIMIT_FSIZE, &limit), 0);
+    const struct rlimit small { 4096, limit.rlim_max };
+    const auto before = std::signal(SIGXFSZ, SIG_IGN);
+    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &small), 0);
+    const std::string error =
+        tests::errorOf([&] { getSystem()->replaceFile(toURI(old), large.data(), size); });
+    setrlimit(RLIMIT_FSIZE, &limit);
+    std::signal(SIGXFSZ, before);
+    EXPECT_NE(error.find("old' (File too large)"), std::string::npos) << error;
+    EXPECT_EQ(tests::readFile(old), "precious");
+    EXPECT_THROW(getSystem()->replaceFile(toURI(folder / "folder"), "x", 1), CFileError);
+    EXPECT_THROW(getSystem()->replaceFile(toURI(folder / "nowhere" / "x"), "x", 1), CFileError);
+    EXPECT_THROW(getSystem()->replaceFile(make<CURI>("http://x/y"), "x", 1), CException);
+    EXPECT_EQ(countEntries(folder.path()), 2u);
 }
 
 TEST(System, TellsTheVersionOfALibrary) {

@@ -1,7 +1,5 @@
 #include "peru/posix/FileOperations.h"
 
-#include "peru/posix/PlatformFile.h"
-
 #include <cerrno>
 #include <cstdio>
 #include <fcntl.h>
@@ -49,14 +47,41 @@ int copyBytes(int source, int destination) {
     }
 }
 
+// File systems without modes refuse what they cannot keep.
+int setMode(int file, const struct stat& like) {
+    return ::fchmod(file, like.st_mode & 0777) == 0 || errno == EPERM || errno == ENOTSUP ? 0 : errno;
+}
+
 int fillCopy(int source, int destination, const struct stat& status) {
     if (int error = copyBytes(source, destination)) return error;
     const timespec times[2] = {status.st_atim, status.st_mtim};
-    if (::fchmod(destination, status.st_mode & 0777) != 0) {
-        // File systems without modes refuse what they cannot keep.
-        if (errno != EPERM && errno != ENOTSUP) return errno;
-    }
+    if (int error = setMode(destination, status)) return error;
     return ::futimens(destination, times) == 0 ? 0 : errno;
+}
+
+// What a file that is about to be replaced hands on to its successor.
+int takeOver(int file, const std::string& target) {
+    struct stat status;
+    if (::stat(target.c_str(), &status) != 0) return errno == ENOENT ? 0 : errno;
+    if (S_ISDIR(status.st_mode)) return EISDIR;
+    if (!S_ISREG(status.st_mode)) return EINVAL;
+    if (::access(target.c_str(), W_OK) != 0) return errno;
+    return setMode(file, status);
+}
+
+int fillReplacement(CFileHandle& file, const std::string& beside, const std::string& target, const void* data,
+                    size_t size) {
+    if (int error = takeOver(file.get(), target)) return error;
+    if (int error = writeAll(file.get(), static_cast<const char*>(data), size)) return error;
+    if (::fsync(file.get()) != 0 || !file.close()) return errno;
+    return ::rename(beside.c_str(), target.c_str()) == 0 ? 0 : errno;
+}
+
+// After a power failure the folder may else still tell the old name. No more can be done where it refuses.
+void syncFolderOf(const std::string& file) {
+    const CFileHandle folder(
+        ::open(file.substr(0, file.rfind('/') + 1).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (folder.isOpen()) ::fsync(folder.get());
 }
 
 bool isThere(const std::string& path) {
@@ -90,6 +115,16 @@ int renameWithoutReplacing(const std::string& source, const std::string& destina
     // reports that again.
     if (isThere(destination)) return EEXIST;
     return ::rename(source.c_str(), destination.c_str()) == 0 ? 0 : errno;
+}
+
+int fillAndReplace(CFileHandle file, const std::string& beside, const std::string& target, const void* data,
+                   size_t size) {
+    const int error = fillReplacement(file, beside, target, data, size);
+    if (error == 0)
+        syncFolderOf(target);
+    else
+        ::unlink(beside.c_str());
+    return error;
 }
 
 } // namespace peru::posix

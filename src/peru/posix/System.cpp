@@ -21,6 +21,7 @@
 #include <pwd.h>
 #include <sys/stat.h>
 #include <unistd.h>
+#include <utility>
 
 namespace peru::posix {
 namespace {
@@ -229,6 +230,25 @@ P<IString> CSystem::getLibraryVersion(const CStringArg& libraryName) {
     if (file.empty()) return CString::empty();
     P<CFileVersion> version = CFileVersion::read(toURI(file));
     return version ? version->getVersion() : CString::empty();
+}
+
+void CSystem::replaceFile(const P<IURI>& file, const void* data, int64_t size) {
+    const std::string path = toPath(file);
+    std::string target = getRealPath(path);
+    if (target.empty()) target = path;
+    CFileHandle handle;
+    int error = 0;
+    const std::string beside = createUnique(
+        toFolderURI(getFolderOf(target)), ".new-", "", error, [&handle](const std::string& name) {
+            handle = CFileHandle(::open(name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+            return handle.isOpen() ? 0 : errno;
+        });
+    if (!beside.empty())
+        error = fillAndReplace(std::move(handle), beside, target, data, static_cast<size_t>(size));
+    if (error == 0) return;
+    throw CFileError(localize("peru.CSystem.ReplaceFileFailed", "Error writing file '%FILE%' (%MSG%).",
+                              {{"%FILE%", getShownName(file)}, {"%MSG%", getSystemText(error)}}),
+                     file);
 }
 
 } // namespace peru::posix

@@ -28,6 +28,8 @@ public:
     void moveFile(const P<IURI>& source, const P<IURI>& destination) override;
     void moveFolder(const P<IURI>& source, const P<IURI>& destination) override;
     P<IString> getLibraryVersion(const CStringArg& libraryName) override;
+    // Refuses what is no regular file, and one that the user may not write.
+    void replaceFile(const P<IURI>& file, const void* data, int64_t size) override;
 };
 
 } // namespace peru::posix
