@@ -1,7 +1,7 @@
 #include "sonora2/common/LogManager.h"
 
 #include "peru/Exception.h"
-#include "peru/IStreamManager.h"
+#include "peru/ISystem.h"
 #include "peru/ITimeManager.h"
 #include "peru/IURI.h"
 #include "peru/StringFormat.h"
@@ -102,9 +102,7 @@ P<peru::IString> CLogManager::getDocument() const {
 
 void CLogManager::save(const P<peru::IURI>& file) const {
     const P<peru::IString> text = getDocument();
-    const P<peru::IOutStream> stream = peru::getStreamManager()->getOutStream(file, peru::EOpenMode::create);
-    stream->write(text->getData(), text->getDataSize());
-    stream->close();
+    peru::getSystem()->replaceFile(file, text->getData(), static_cast<int64_t>(text->getDataSize()));
 }
 
 } // namespace sonora2::common

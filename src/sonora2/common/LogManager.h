@@ -28,8 +28,9 @@ public:
     void log(int32_t severity, const P<peru::IString>& text) override;
     void logException(const peru::CException& exception) override; // at the worst severity
 
-    P<peru::IString> getDocument() const;       // as UTF-8 text
-    void save(const P<peru::IURI>& file) const; // replaces the file; throws CException
+    P<peru::IString> getDocument() const; // as UTF-8 text
+    // Replaces the file of the last time, which stays when the new one cannot be written. Throws CFileError.
+    void save(const P<peru::IURI>& file) const;
 
 private:
     P<peru::IMutex> m_mutex; // guards the document and the count
