@@ -114,6 +114,13 @@ TEST_F(AudioEncoder, FinishesTheFilesWhenAnExceptionLeftIt) {
     EXPECT_EQ(format->closes, 1);
 }
 
+TEST_F(AudioEncoder, ClosesWhatItOpenedWhenItCannotBeMade) {
+    source->beforeFormat = [] { throw std::runtime_error("no header"); };
+    EXPECT_THROW(makeEncoder(), std::runtime_error);
+    EXPECT_EQ(source->opens, 1);
+    EXPECT_FALSE(source->isOpened());
+}
+
 TEST_F(AudioEncoder, RefusesAReaderThatContradictsItself) {
     source->media = tests::patternBytes(100 * kFrameBytes);
     const P<CAudioEncoder> encoder = makeEncoder();

@@ -209,6 +209,7 @@ class CPreference : public peru::CObject, public IPluginPreference {
 public:
     P<IString> lookUp(int, const P<IURI>&) override {
         if (name == "throw") throw peru::CError("no memory");
+        if (name == "throw oddly") throw 42;
         return CString::fromUTF8(name);
     }
     void store(int mask, const P<IURI>& u, const P<IString>& plugin) override {
@@ -233,7 +234,7 @@ TEST_F(PluginHandler, Preference_ComesFirstWhateverTheExtension) {
     EXPECT_THAT(preference->stored, IsEmpty());
 
     second->makeSource = [](auto&&...) -> P<ISource> { throw CSonoraError("moved"); };
-    for (const char* name : {"second", "unknown", "", "throw"}) {
+    for (const char* name : {"second", "unknown", "", "throw", "throw oddly"}) {
         preference->name = name;
         preference->stored.clear();
         EXPECT_TRUE(open(*handler, "a.tst")) << name;
@@ -278,6 +279,115 @@ TEST_F(PluginHandler, ValidExtensions_AreTheUnionInPluginOrder) {
     };
     EXPECT_THAT(list(2), ElementsAre("flac", "oga", "ogg", "wav"));
     EXPECT_THAT(list(4 | 2), ElementsAre("bmp", "jpg", "png", "tiff"));
+}
+
+// Tells its name by its size; what is no RGB picture is asked for the one that it becomes.
+class CPicture : public peru::CObject, public ISonoraPicture {
+public:
+    explicit CPicture(P<ISonoraPicture> rgb = nullptr) : m_rgb(std::move(rgb)) {}
+    double getTimestamp() const override { return 0.0; }
+    int getWidth() const override { return 320; }
+    int getHeight() const override { return 200; }
+    bool isFlipped() const override { return false; }
+    P<peru::IMemoryBlock> getRGBBlock(int, int, int, int) override { return nullptr; }
+    void copyRGBRect(uint8_t*, int, int, int, int, int) override {}
+    P<ISonoraPicture> getRGBPicture() override { return m_rgb; }
+    int getPictureType() const override { return kYV12; }
+    P<peru::IMemoryBlock> getImagePlane(int, int, int, int, int) override { return nullptr; }
+    void fillPlaneBlack(int, int, int, int, int) override {}
+    void drawInto(const P<ISonoraPicture>&, int, int, int, int, int, int) override {}
+    P<IString> getPixelShaderName() const override { return CString::empty(); }
+    P<ISonoraPicture> createThumbnail() override { return nullptr; }
+    void writeTo(const P<peru::IDataOutStream>&) const override {}
+    void readFrom(const P<peru::IDataInStream>&) override {}
+
+private:
+    P<ISonoraPicture> m_rgb;
+};
+
+class CVideo : public peru::CObject, public IVideoSource {
+public:
+    double duration = 10.0;
+    std::vector<double> skips;
+    P<ISonoraPicture> picture;
+    std::function<void()> onPicture = [] {}; // may throw
+    int opens = 0;
+
+    bool isOpened() override { return m_opened; }
+    void open() override {
+        ++opens;
+        m_opened = true;
+    }
+    void close() override { m_opened = false; }
+    void skipToTime(double time) override { skips.push_back(time); }
+    double getDuration() override { return m_opened ? duration : 0.0; }
+    int getBufferStatus() override { return 100; }
+    bool isEOF() override { return false; }
+    void setStartTime(double) override {}
+    double getStartTime() override { return 0.0; }
+    P<IURI> getURI() override { return nullptr; }
+    P<IString> getPluginName() override { return CString::empty(); }
+    void setMaxSize(int, int) override {}
+    int getWidth() override { return 0; }
+    int getHeight() override { return 0; }
+    double peekNextPictureTimestamp() override { return 0.0; }
+    P<ISonoraPicture> getNextPicture() override {
+        onPicture();
+        return m_opened ? picture : nullptr;
+    }
+    int getPixelAspectNum() override { return 1; }
+    int getPixelAspectDen() override { return 1; }
+    double getFrameDuration() override { return 0.04; }
+    int getFrameRateNum() override { return 25; }
+    int getFrameRateDen() override { return 1; }
+
+private:
+    bool m_opened = false;
+};
+
+TEST_F(PluginHandler, PreviewImage_IsTakenAtTheTimeAndNeverBehindTheEnd) {
+    struct SCase {
+        double time, duration;
+        std::vector<double> skips;
+    };
+    P<CPluginHandler> handler = makeHandler();
+    P<CFakePlugin> plugin = addPlugin(*handler, "video", {"vid"});
+    const P<ISonoraPicture> rgb = make<CPicture>();
+    for (const SCase& c : std::initializer_list<SCase>{{3.0, 10.0, {3.0}},
+                                                       {10.0, 10.0, {10.0}},
+                                                       {10.5, 10.0, {9.0}},
+                                                       {0.0, 10.0, {}},
+                                                       {-2.0, 10.0, {}},
+                                                       {5.0, 0.5, {}}}) {
+        P<CVideo> video = make<CVideo>();
+        video->duration = c.duration;
+        video->picture = make<CPicture>(rgb);
+        plugin->makeSource = [&](auto&&...) { return video; };
+        int width = -1, height = -1;
+        EXPECT_TRUE(handler->createPreviewImage(uri("file:///a.vid"), c.time, width, height) == rgb);
+        EXPECT_EQ(plugin->mask, 1);
+        EXPECT_EQ(video->skips, c.skips) << c.time << " of " << c.duration;
+        EXPECT_EQ(width, 320);
+        EXPECT_EQ(height, 200);
+        EXPECT_EQ(video->opens, 2) << "once for the test, once for the picture";
+        EXPECT_FALSE(video->isOpened());
+    }
+}
+
+TEST_F(PluginHandler, PreviewImage_LeavesNoSourceOpenWhereThereIsNone) {
+    P<CPluginHandler> handler = makeHandler();
+    P<CFakePlugin> plugin = addPlugin(*handler, "video", {"vid"});
+    P<CVideo> video = make<CVideo>();
+    plugin->makeSource = [&](auto&&...) { return video; };
+    int width = -1, height = -1;
+    EXPECT_FALSE(handler->createPreviewImage(uri("file:///a.other"), 1.0, width, height));
+    EXPECT_FALSE(handler->createPreviewImage(uri("file:///a.vid"), 1.0, width, height));
+    EXPECT_EQ(width, 0);
+    EXPECT_EQ(height, 0);
+    EXPECT_FALSE(video->isOpened());
+    video->onPicture = [] { throw CSonoraError("torn frame"); };
+    EXPECT_THROW(handler->createPreviewImage(uri("file:///a.vid"), 1.0, width, height), CSonoraError);
+    EXPECT_FALSE(video->isOpened());
 }
 
 TEST_F(PluginHandler, CreateCalls_AreSerialised) {

@@ -81,6 +81,15 @@ TEST_F(SampleReader, LeavesAClosedSourceClosed) {
     EXPECT_FALSE(reader->hasSamples());
 }
 
+TEST_F(SampleReader, ClosesWhatItOpenedAlsoAfterAFailure) {
+    source->beforeFormat = [] { throw sonora2::common::CSonoraError("no header"); };
+    for (const bool wasOpened : {false, true}) {
+        if (wasOpened) source->open();
+        EXPECT_EQ(tests::errorOf([&] { makeReader(); }), "no header");
+        EXPECT_EQ(source->isOpened(), wasOpened);
+    }
+}
+
 TEST_F(SampleReader, TellsNoFramesFromNothingLeft) {
     source->media = tests::patternBytes(4000);
     source->open();

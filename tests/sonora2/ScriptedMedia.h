@@ -44,9 +44,10 @@ public:
     double chunkTimestamp = 77.0; // told by every chunk
     std::string media;
     std::vector<size_t> cuts{1000};
-    bool emptyBeforeEnd = false;       // answers empty handles although it is not at its end
-    std::deque<bool> eofAnswers;       // taken first where there are any
-    std::function<void()> beforeChunk; // may throw
+    bool emptyBeforeEnd = false;        // answers empty handles although it is not at its end
+    std::deque<bool> eofAnswers;        // taken first where there are any
+    std::function<void()> beforeChunk;  // may throw
+    std::function<void()> beforeFormat; // may throw
     std::function<void()> beforeClose;
 
     int opens = 0;
@@ -89,7 +90,10 @@ public:
     }
     // A decoder knows its format only while it is opened.
     int getSampleRate() override { return m_opened ? rate : 0; }
-    int getChannelCount() override { return m_opened ? channels : 0; }
+    int getChannelCount() override {
+        if (beforeFormat) beforeFormat();
+        return m_opened ? channels : 0;
+    }
     int getBytesPerSample() override { return m_opened ? bytesPerSample : 0; }
 
 private:

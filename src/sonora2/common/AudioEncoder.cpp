@@ -1,5 +1,6 @@
 #include "sonora2/common/AudioEncoder.h"
 
+#include "sonora2/common/CloseGuard.h"
 #include "sonora2/common/SampleReader.h"
 #include "sonora2/common/SonoraError.h"
 
@@ -32,6 +33,7 @@ CAudioEncoder::CAudioEncoder(const P<ISonoraContext>& context, const P<IAudioSou
     : m_listeners(peru::make<peru::TFrailArray<IEncodeListener>>()), m_source(source), m_format(format),
       m_context(context) {
     const bool wasOpened = m_source->isOpened();
+    const CCloseGuard guard(*m_source, !wasOpened);
     if (!wasOpened) m_source->open();
     m_sampleRate = m_source->getSampleRate();
     m_bytesPerSample = m_source->getBytesPerSample();

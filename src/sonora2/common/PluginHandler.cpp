@@ -5,6 +5,7 @@
 #include "peru/ISystem.h"
 #include "peru/StringFormat.h"
 #include "peru/URI.h"
+#include "sonora2/common/CloseGuard.h"
 #include "sonora2/common/ParameterRecord.h"
 #include "sonora2/common/PluginExtensions.h"
 #include "sonora2/common/PluginModule.h"
@@ -29,6 +30,8 @@ namespace {
 
 constexpr const char* kLibraryNameFormat = "%s.so";
 constexpr const char* kDefaultPlugins[] = {"sonora2_ffmpeg", "sonora2_dsgraph", "sonora2_decmpa"};
+constexpr const char* kPreferenceFailed =
+    "the remembered plugin for %s cannot be told or kept: unknown exception";
 constexpr const char* kImageExtensions[] = {"bmp", "jpg", "png", "tiff"};
 
 bool fileExists(const P<IURI>& file) {
@@ -48,24 +51,6 @@ bool contains(IPluginExtensions& extensions, const P<IString>& key) {
         if (extensions.getExtension(i)->equalsIgnoreCase(key)) return true;
     return false;
 }
-
-// Closes a source when a block is left.
-class CCloseGuard {
-public:
-    explicit CCloseGuard(ISource& source) : m_source(source) {}
-    ~CCloseGuard() {
-        try {
-            if (m_source.isOpened()) m_source.close();
-        } catch (...) {
-            // The picture is there, or an error is already on its way; neither is spoilt by this one.
-        }
-    }
-    CCloseGuard(const CCloseGuard&) = delete;
-    CCloseGuard& operator=(const CCloseGuard&) = delete;
-
-private:
-    ISource& m_source;
-};
 
 } // namespace
 
@@ -173,26 +158,34 @@ void CPluginHandler::log(int32_t severity, const P<IString>& text) const {
     if (P<ILogManager> manager = m_context->getLogManager()) manager->log(severity, text);
 }
 
-P<ISonoraPlugin> CPluginHandler::findPreferred(int mask, const P<IURI>& uri) {
-    if (!m_preference) return nullptr;
+// What the preference does is no reason for a create call to fail.
+template <class Call> void CPluginHandler::askPreference(const P<IURI>& uri, Call call) {
+    if (!m_preference) return;
     try {
-        const P<IString> name = m_preference->lookUp(mask, uri);
-        if (!name || name->isEmpty()) return nullptr;
-        for (const P<ISonoraPlugin>& plugin : m_plugins)
-            if (plugin->getPluginName()->equals(name)) return plugin;
+        call();
     } catch (const peru::CException& e) {
         if (P<ILogManager> manager = m_context->getLogManager()) manager->logException(e);
+    } catch (...) {
+        log(kSeverityWarning, peru::format(kPreferenceFailed, uri->getAsString()));
     }
-    return nullptr;
+}
+
+P<ISonoraPlugin> CPluginHandler::findPreferred(int mask, const P<IURI>& uri) {
+    P<ISonoraPlugin> preferred;
+    askPreference(uri, [&] {
+        const P<IString> name = m_preference->lookUp(mask, uri);
+        if (!name || name->isEmpty()) return;
+        auto isNamed = [&name](const P<ISonoraPlugin>& plugin) {
+            return plugin->getPluginName()->equals(name);
+        };
+        const auto found = std::find_if(m_plugins.begin(), m_plugins.end(), isNamed);
+        if (found != m_plugins.end()) preferred = *found;
+    });
+    return preferred;
 }
 
 void CPluginHandler::storePreferred(int mask, const P<IURI>& uri, ISonoraPlugin& plugin) {
-    if (!m_preference) return;
-    try {
-        m_preference->store(mask, uri, plugin.getPluginName());
-    } catch (const peru::CException& e) {
-        if (P<ILogManager> manager = m_context->getLogManager()) manager->logException(e);
-    }
+    askPreference(uri, [&] { m_preference->store(mask, uri, plugin.getPluginName()); });
 }
 
 // The one walk behind every create call: the remembered plug-in, then each in order that lists the extension.

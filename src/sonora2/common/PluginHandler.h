@@ -59,6 +59,7 @@ private:
     template <class T, class TryCreate>
     P<T> findObject(const P<peru::IURI>& uri, int mask, const STexts& texts, TryCreate tryCreate);
     bool passesOpening(const P<ISource>& source, bool keepOpened) const;
+    template <class Call> void askPreference(const P<peru::IURI>& uri, Call call);
     P<ISonoraPlugin> findPreferred(int mask, const P<peru::IURI>& uri);
     void storePreferred(int mask, const P<peru::IURI>& uri, ISonoraPlugin& plugin);
     P<peru::IString> getLookupKey(const P<peru::IURI>& uri) const;

@@ -2,6 +2,7 @@
 
 #include "peru/StringFormat.h"
 #include "sonora2/audio/AudioChunk.h"
+#include "sonora2/common/CloseGuard.h"
 #include "sonora2/common/SonoraError.h"
 
 #include <algorithm>
@@ -13,6 +14,7 @@ CSampleReader::CSampleReader(const P<ISonoraContext>& context, const P<IAudioSou
     : m_source(source), m_buffer(peru::make<peru::CBufferedIOStream>(context->getMemoryManager())),
       m_context(context) {
     const bool wasOpened = m_source->isOpened();
+    const CCloseGuard guard(*m_source, !wasOpened);
     if (!wasOpened) m_source->open();
     const int bytes = m_source->getBytesPerSample();
     const int channels = m_source->getChannelCount();
