@@ -1,5 +1,7 @@
 #include "Library.h"
+#include "support/Environment.h"
 
+#include <algorithm>
 #include <functional>
 
 namespace {
@@ -95,6 +97,64 @@ void expectNotStarted() {
     TONEWRIGHT_SetTempExtension(u".part");
     TONEWRIGHT_SetDriveChangedCallback(nullptr);
     TONEWRIGHT_SetLanguageID(u"de-AT");
+}
+
+TEST(Start, Startup_TellsItselfAndEachPluginThatFailsInOrder) {
+    CTempFolder folder;
+    const std::vector<std::string> readers{"flac", "decmpa", "vorbis", "wav", "wmf", "dsgraph", "discio"};
+    const std::vector<std::string> writers{"flac", "l3codec", "vorbis", "wav", "wmf"};
+    std::vector<SLine> expected{{2, "tonewright_shared", "TONEWRIGHT_InitStartup"}};
+    for (const auto* names : {&readers, &writers})
+        for (const std::string& name : *names) {
+            const std::string file = "sonora2_" + name + ".so";
+            folder.write(file, "this is no library");
+            expected.push_back({3, "", "Error while loading DLL: Error - could not load plugin: " + file});
+        }
+    CEnvironment path("TONEWRIGHT_PLUGIN_PATH", folder.path().string());
+    CHostLog log;
+    EXPECT_EQ(TONEWRIGHT_InitStartup(), 0);
+    std::vector<SLine> lines = log.take();
+    std::erase_if(lines, [](const SLine& line) { return line.level < 2; }); // the loader's own reasons
+    EXPECT_EQ(lines, expected);
+    TONEWRIGHT_DeInitAll();
+}
+
+TEST(Start, Startup_ThatFailsLateLeavesWhatItHadUntilTheEnd) {
+    CPluginFolder plugins;
+    CTempFolder folder;
+    const std::string companion = folder.write("CancelAutoplay2", "no program").string();
+    {
+        CEnvironment path("TONEWRIGHT_COMPANION_PATH", folder.path().string());
+        CHostLog log;
+        EXPECT_EQ(TONEWRIGHT_InitStartup(), 1);
+        EXPECT_EQ(log.take().back(),
+                  (SLine{5, "", "CCancelAutoplay2: failed to execute \"" + companion + "\""}));
+    }
+    EXPECT_TRUE(CHandle(TONEWRIGHT_CreateAudioSourceFromURI(u"file:///a.tst", 44100, 2, 2, 0)));
+    TONEWRIGHT_DeInitAll();
+    EXPECT_FALSE(TONEWRIGHT_CreateAudioSourceFromURI(u"file:///a.tst", 44100, 2, 2, 0));
+    EXPECT_EQ(TONEWRIGHT_InitStartup(), 0);
+    TONEWRIGHT_DeInitAll();
+}
+
+TEST(Start, End_ReleasesALogThatCameBeforeTheStart) {
+    class CMortalLog : public CLines {
+    public:
+        explicit CMortalLog(bool& isAlive) : m_isAlive(isAlive) { m_isAlive = true; }
+        ~CMortalLog() override { m_isAlive = false; }
+
+    private:
+        bool& m_isAlive;
+    };
+    bool isAlive = false;
+    {
+        P<peru::CLogManager> manager = peru::make<peru::CLogManager>();
+        manager->addLog(peru::make<CMortalLog>(isAlive), peru::CString::empty());
+        TONEWRIGHT_AddProxyLogManager(wrap(manager).get());
+    }
+    EXPECT_TRUE(isAlive);
+    TONEWRIGHT_DeInitAll();
+    EXPECT_FALSE(isAlive);
 }
 
 TEST(Start, Functions_FailOutsideOfStartAndEnd) {

@@ -116,11 +116,14 @@ double TONEWRIGHT_AudioSource_GetDuration(TONEWRIGHT_Handle source) {
     });
 }
 
-// No source of this library records, so that there is none to which these two would apply.
-void TONEWRIGHT_AudioSource_SetRecordingCallback(TONEWRIGHT_Handle, TONEWRIGHT_RecordingCallback) {}
+void TONEWRIGHT_AudioSource_SetRecordingCallback(TONEWRIGHT_Handle, TONEWRIGHT_RecordingCallback) {
+    logNotAvailable("TONEWRIGHT_AudioSource_SetRecordingCallback");
+}
 
 void TONEWRIGHT_AudioSource_SetRecordingVolumeCallback(TONEWRIGHT_Handle,
-                                                       TONEWRIGHT_RecordingVolumeCallback) {}
+                                                       TONEWRIGHT_RecordingVolumeCallback) {
+    logNotAvailable("TONEWRIGHT_AudioSource_SetRecordingVolumeCallback");
+}
 
 uint8_t TONEWRIGHT_AudioSource_FetchStreamSamples(TONEWRIGHT_Handle source,
                                                   TONEWRIGHT_SamplesCallback callback, double secondsPerStep,

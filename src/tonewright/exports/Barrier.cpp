@@ -4,15 +4,26 @@
 
 namespace tonewright::exports {
 
+namespace {
+
+// A log of the host's may throw, and must not keep the text from the debugger.
+void writeToLog(const peru::SLogMessage& message) noexcept {
+    try {
+        peru::getLogManager()->write(message);
+    } catch (...) {
+    }
+}
+
+} // namespace
+
 void reportException(const peru::P<peru::IString>& text, const char* fallback) noexcept {
     try {
         peru::SLogMessage message;
         message.level = peru::kLogError;
         message.source = peru::CString::empty();
         message.text = text && text->getLength() > 0 ? text : peru::CString::fromUTF8(fallback);
-        // The debugger first: a log of the host's may throw.
+        writeToLog(message);
         peru::outputDebugString(message.text);
-        peru::getLogManager()->write(message);
     } catch (...) {
         // Nothing is left that could be told of it.
     }

@@ -1,5 +1,7 @@
 #include "tonewright/exports/AppReference.h"
 
+#include <atomic>
+
 using namespace tonewright::exports;
 
 TONEWRIGHT_WindowHandle TONEWRIGHT_CreateCoverEditorHandle(TONEWRIGHT_WindowHandle, const char16_t*,
@@ -7,7 +9,9 @@ TONEWRIGHT_WindowHandle TONEWRIGHT_CreateCoverEditorHandle(TONEWRIGHT_WindowHand
     return notAvailable<TONEWRIGHT_WindowHandle>("TONEWRIGHT_CreateCoverEditorHandle", 0);
 }
 
-void TONEWRIGHT_ReleaseCoverEditorHandle(TONEWRIGHT_WindowHandle) {}
+void TONEWRIGHT_ReleaseCoverEditorHandle(TONEWRIGHT_WindowHandle) {
+    logNotAvailable("TONEWRIGHT_ReleaseCoverEditorHandle");
+}
 
 bool TONEWRIGHT_EMBEDDEDCOVEREDITOR_NewProject(int32_t) {
     return notAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_NewProject", false);
@@ -41,8 +45,16 @@ int32_t TONEWRIGHT_EMBEDDEDCOVEREDITOR_GetCurrentPageIndex() {
     return notAvailable<int32_t>("TONEWRIGHT_EMBEDDEDCOVEREDITOR_GetCurrentPageIndex", 0);
 }
 
-void TONEWRIGHT_EMBEDDEDCOVEREDITOR_SetBackgroundColor(int32_t, int32_t, int32_t) {}
+void TONEWRIGHT_EMBEDDEDCOVEREDITOR_SetBackgroundColor(int32_t, int32_t, int32_t) {
+    logNotAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_SetBackgroundColor");
+}
 
-void TONEWRIGHT_EMBEDDEDCOVEREDITOR_ShowHelp() {}
+void TONEWRIGHT_EMBEDDEDCOVEREDITOR_ShowHelp() {
+    logNotAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_ShowHelp");
+}
 
-void TONEWRIGHT_EMBEDDEDCOVEREDITOR_Idle() {}
+// A host calls this whenever it has nothing else to do: one line has to serve for all of them.
+void TONEWRIGHT_EMBEDDEDCOVEREDITOR_Idle() {
+    static std::atomic_flag isTold = ATOMIC_FLAG_INIT;
+    if (!isTold.test_and_set()) logNotAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_Idle");
+}

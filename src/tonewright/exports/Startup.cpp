@@ -50,10 +50,9 @@ uint8_t TONEWRIGHT_OnWindowShown(TONEWRIGHT_WindowHandle /*window*/) {
 
 void TONEWRIGHT_DeInitAll() {
     barrier([] {
-        P<CApp> app = exchangeApp(nullptr);
-        if (!app) return;
-        app->shutdown();
-        app.reset(); // the factory's is the last reference, so that the order of its singletons holds
+        if (P<CApp> app = exchangeApp(nullptr)) app->shutdown();
+        // The factory's is now the last reference, so that the order of its singletons holds. Without an
+        // application there may be others, such as the log that a host has added to before the start.
         peru::CGlobalObjFactory::shutdown();
     });
 }
