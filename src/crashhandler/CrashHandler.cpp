@@ -46,7 +46,9 @@ char g_exception[1024] = {};
 SThreadState g_threads[kMaxThreads];
 
 void copyText(char* target, size_t size, const char* text, const char* suffix = "") {
-    std::strncpy(target, text ? text : "", size - std::strlen(suffix) - 1);
+    const size_t room = size - std::strlen(suffix) - 1;
+    std::strncpy(target, text ? text : "", room);
+    target[room] = '\0';
     std::strcat(target, suffix);
 }
 

@@ -4,6 +4,7 @@
 #include <csignal>
 #include <cstdint>
 #include <cstdlib>
+#include <dlfcn.h>
 #include <stdexcept>
 #include <string>
 #include <thread>
@@ -26,10 +27,16 @@ int main(int argc, char** argv) {
     const std::string report = folder + "/report.txt", dump = folder + "/dump";
     const auto wide = [](const std::string& text) { return std::u16string(text.begin(), text.end()); };
     if (kind == "chain") std::signal(SIGSEGV, [](int) { ::_exit(77); });
-    TONEWRIGHT_Init_Crashhandler(u"Crashing 1.0", wide(report).c_str(), wide(dump).c_str());
+    void* library = ::dlopen(LIBRARY, RTLD_NOW | RTLD_LOCAL);
+    if (!library) return 3;
+    const auto install = reinterpret_cast<decltype(&TONEWRIGHT_Init_Crashhandler)>(
+        ::dlsym(library, "TONEWRIGHT_Init_Crashhandler"));
+    install(u"Crashing 1.0", wide(report).c_str(), wide(dump).c_str());
+    if (kind == "unloaded") ::dlclose(library);
     std::thread([] { ::pause(); }).detach();
 
-    if (kind == "segv" || kind == "chain") *reinterpret_cast<volatile int*>(address) = 1;
+    if (kind == "segv" || kind == "chain" || kind == "unloaded")
+        *reinterpret_cast<volatile int*>(address) = 1;
     if (kind == "throw") throw std::runtime_error("nobody catches this");
     if (kind == "overflow") return recurse(1);
     if (kind == "abort") std::abort();
