@@ -161,8 +161,8 @@ namespace {
 
 template <class E> const P<ICharEncoding>& getEncodingObject() {
     static const CGlobalObjFactory::SKey key;
-    static const TPinned<ICharEncoding> pinned(key, [] { return P<ICharEncoding>(make<E>()); });
-    return pinned.get();
+    static constinit TPinned<ICharEncoding> pinned;
+    return pinned.get(key, [] { return P<ICharEncoding>(make<E>()); });
 }
 
 } // namespace

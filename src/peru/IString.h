@@ -151,7 +151,8 @@ public:
     virtual P<IString> trim() const = 0; // white space at both ends
     virtual P<IString> trim(const CStringArg& characters) const = 0;
 
-    // --- Editing; always a new string, in this string's encoding where that holds the result, else UTF-8 ---
+    // --- Editing; a new string, in this string's encoding where that holds the result, else UTF-8. Where
+    // replace and the change of case find nothing to do they answer this string. ---
     virtual P<IString> concat(const CStringArg& text) const = 0;
     virtual P<IString> insert(SStringPos pos, const CStringArg& text) const = 0;
     virtual P<IString> remove(SStringPos pos, int32_t count = -1) const = 0;

@@ -309,11 +309,11 @@ CCPString::CCPString(const char* text, int32_t length, EStringStorage storage)
 
 template <class C, class S> const P<IString>& TNullString<C, S>::get() {
     static const CGlobalObjFactory::SKey key;
-    static const TPinned<IString> pinned(key, [] {
+    static constinit TPinned<IString> pinned;
+    return pinned.get(key, [] {
         auto* text = reinterpret_cast<const typename S::Unit*>(kZeros);
         return P<IString>(make<S>(text, -1, EStringStorage::refer));
     });
-    return pinned.get();
 }
 
 template class TNullString<char, CLatin1String>;

@@ -1,13 +1,17 @@
 #include "peru/GlobalObjFactory.h"
 #include "peru/Errors.h"
+#include "peru/Pinned.h"
 
 #include <gtest/gtest.h>
 
 #include <atomic>
 #include <cstdlib>
+#include <fstream>
 #include <functional>
+#include <iterator>
 #include <string>
 #include <thread>
+#include <unistd.h>
 #include <vector>
 
 namespace peru {
@@ -133,6 +137,42 @@ TEST_F(GlobalObjFactory, LetsADyingSingletonWaitForAThreadThatNeedsOthers) {
 }
 
 // The first access of a process, by many threads at once.
+const P<CSingle>& getPinned() {
+    static const CGlobalObjFactory::SKey key;
+    static constinit TPinned<CSingle> pinned;
+    return pinned.get(key, createSingle<'p'>);
+}
+
+// True when the thread of this process waits for something.
+bool isBlocked(pid_t thread) {
+    std::ifstream file("/proc/self/task/" + std::to_string(thread) + "/stat");
+    const std::string text((std::istreambuf_iterator<char>(file)), {});
+    return text.size() > text.rfind(')') + 2 && text[text.rfind(')') + 2] == 'S';
+}
+
+std::thread g_rival;
+
+// Asks for the pinned one while a second thread, which asked first, waits for the factory.
+P<CSingle> createWithRival() {
+    std::atomic<pid_t> id{0};
+    g_rival = std::thread([&id] {
+        id = ::gettid();
+        getPinned();
+    });
+    while (id == 0 || !isBlocked(id)) std::this_thread::yield();
+    getPinned();
+    return createSingle<'r'>();
+}
+
+TEST_F(GlobalObjFactory, PinsForSeveralThreadsAtOnce) {
+    getSingle<'r', createWithRival>();
+    g_rival.join();
+    EXPECT_EQ(g_made, 2);
+    CGlobalObjFactory::shutdown();
+    EXPECT_EQ(g_deaths, "r") << "what is pinned stays";
+    EXPECT_EQ(getPinned(), getPinned());
+}
+
 TEST_F(GlobalObjFactory, MakesOneObjectForAllThreads) {
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     auto race = [] {
