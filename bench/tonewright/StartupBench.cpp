@@ -41,7 +41,6 @@ int64_t now() {
 }
 
 // --- The measured processes
-// ----------------------------------------------------------------------------------
 
 std::vector<std::pair<std::string, int64_t>> g_marks; // what has just ended, and when
 
@@ -96,13 +95,10 @@ int runParts() {
         loadPlugins(writeContext, "write",
                     {"sonora2_flac", "sonora2_l3codec", "sonora2_vorbis", "sonora2_wav", "sonora2_wmf"});
     const P<peru::IProcessManager> processes = peru::getProcessManager();
-    P<peru::IURI> companion;
-    for (const P<peru::IURI>& folder :
-         peru::getSystem()->getSearchFolders("TONEWRIGHT_COMPANION_PATH", "libexec/tonewright")) {
-        companion = folder->appendPath("CancelAutoplay2");
-        break;
-    }
-    if (!companion) return 1;
+    const std::vector<P<peru::IURI>> folders =
+        peru::getSystem()->getSearchFolders("TONEWRIGHT_COMPANION_PATH", "libexec/tonewright");
+    if (folders.empty()) return 1;
+    const P<peru::IURI> companion = folders.front()->appendPath("CancelAutoplay2");
     const P<peru::IProcess> process =
         processes->start(companion, {CString::fromUTF8(std::to_string(processes->getCurrentProcessId())),
                                      CString::fromUTF8("dummy")});
@@ -113,7 +109,6 @@ int runParts() {
 }
 
 // --- The measuring process
-// -----------------------------------------------------------------------------------
 
 // One step's durations in milliseconds.
 struct SStep {

@@ -7,7 +7,7 @@
 
 namespace sonora2::common {
 
-// Three directories, in search order for plug-ins, companions and data. A setter takes a copy.
+// Where plug-ins, slave programs and data are looked for. A setter takes a copy.
 class SONORA2_API IBaseDirectories : public virtual peru::IBase {
 public:
     virtual P<peru::IURI> getPluginDirectory() = 0;
