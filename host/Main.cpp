@@ -29,21 +29,33 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
         "convert", "Convert sound files. Rate, channels and width stay those of the input unless told\n"
                    "otherwise or the target cannot hold them. Nothing is replaced without --force;\n"
                    "a file that fails is told and the next one goes on.");
-    command->add_option("IN", options.inputs, "Files to convert")->required();
-    auto* output = command->add_option("-o,--output", options.output,
-                                       "File to write; its extension selects the format (one input only)");
-    auto* to = command->add_option("--to", options.extension,
-                                   "Extension of the files to write, such as flac, beside the inputs");
+    command->add_option("IN", options.inputs, "Files to convert")->required()->option_text("...");
+    auto* output = command
+                       ->add_option("-o,--output", options.output,
+                                    "File to write; its extension selects the format (one input only)")
+                       ->option_text("FILE");
+    auto* to = command
+                   ->add_option("--to", options.extension,
+                                "Extension of the files to write, such as flac, beside the inputs")
+                   ->option_text("EXT");
     output->excludes(to);
     command->add_option("--directory", options.directory, "Folder for the files of --to")
+        ->option_text("FOLDER")
         ->needs(to)
         ->check(CLI::ExistingDirectory);
-    command->add_option("--rate", options.rate, "Sample rate in Hz")->check(CLI::Range(1, 768000));
-    command->add_option("--channels", options.channels, "Number of channels")->check(CLI::Range(1, 32));
-    command->add_option("--bits", options.bits, "Bits per sample")->check(CLI::IsMember({8, 16, 24, 32}));
+    command->add_option("--rate", options.rate, "Sample rate in Hz")
+        ->option_text("HZ")
+        ->check(CLI::Range(1, 768000));
+    command->add_option("--channels", options.channels, "Number of channels")
+        ->option_text("N")
+        ->check(CLI::Range(1, 32));
+    command->add_option("--bits", options.bits, "Bits per sample: 8, 16, 24 or 32")
+        ->option_text("N")
+        ->check(CLI::IsMember({8, 16, 24, 32}));
     command
         ->add_option("--quality", options.quality,
                      "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression")
+        ->option_text("Q")
         ->check(CLI::Range(0.0, 1.0));
     command->get_option("--quality")->check([](const std::string& text) {
         return std::isnan(std::strtod(text.c_str(), nullptr)) ? std::string("is not a number")
@@ -53,19 +65,24 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
     const auto units = CLI::AsNumberWithUnit(std::map<std::string, int>{{"k", 1000}},
                                              CLI::AsNumberWithUnit::CASE_INSENSITIVE);
     auto* bitRate = command->add_option("--bitrate", options.bitRate, "Bits per second, such as 192k")
+                        ->option_text("N")
                         ->transform(units)
                         ->check(bitRates);
     command->add_option("--min-bitrate", options.minBitRate, "Least bits per second")
+        ->option_text("N")
         ->transform(units)
         ->check(bitRates)
         ->needs(bitRate);
     command->add_option("--max-bitrate", options.maxBitRate, "Most bits per second")
+        ->option_text("N")
         ->transform(units)
         ->check(bitRates)
         ->needs(bitRate);
     options.jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
-    command->add_option("-j,--jobs", options.jobs, "Files at a time")
-        ->capture_default_str()
+    command
+        ->add_option("-j,--jobs", options.jobs,
+                     "Files at a time; as many as the machine has cores unless told")
+        ->option_text("N")
         ->check(CLI::Range(1, 256));
     command->add_flag("-f,--force", options.force, "Replace existing files");
     auto* json = command->add_flag_callback(
@@ -91,7 +108,7 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
 
 void addInfo(CLI::App& app, std::vector<std::filesystem::path>& files, bool& json, Run& run) {
     CLI::App* command = app.add_subcommand("info", "Tell duration, rate, channels and width of sound files.");
-    command->add_option("FILE", files, "Files to look at")->required();
+    command->add_option("FILE", files, "Files to look at")->required()->option_text("...");
     command->add_flag("--json", json, "One JSON object a line");
     command->callback([&] { run = [&](CLibrary& library) { return showInfo(library, files, json); }; });
 }
@@ -105,13 +122,13 @@ void addFormats(CLI::App& app, bool& json, Run& run) {
 void addWaveform(CLI::App& app, SWaveformOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
         "waveform", "Draw a sound file as a PNG picture: peaks and, darker, their root mean square.");
-    command->add_option("IN", options.input, "File to draw")->required();
-    command->add_option("-o,--output", options.output, "PNG file to write")->required();
-    command->add_option("--width", options.width, "Width in pixels")
-        ->capture_default_str()
+    command->add_option("IN", options.input, "File to draw")->required()->option_text(" ");
+    command->add_option("-o,--output", options.output, "PNG file to write")->required()->option_text("FILE");
+    command->add_option("--width", options.width, "Width in pixels, 1200 unless told")
+        ->option_text("N")
         ->check(CLI::Range(16, 32767));
-    command->add_option("--height", options.height, "Height in pixels")
-        ->capture_default_str()
+    command->add_option("--height", options.height, "Height in pixels, 300 unless told")
+        ->option_text("N")
         ->check(CLI::Range(16, 32767));
     command->add_flag("-f,--force", options.force, "Replace an existing file");
     command->callback([&] { run = [&](CLibrary& library) { return drawWaveform(library, options); }; });
@@ -140,6 +157,7 @@ int main(int argc, char** argv) {
     int32_t printLevel = std::numeric_limits<int32_t>::max();
     app.add_option("--log-level", printLevel,
                    "Print the library's log from this level on: trace, debug, info, warning, error or off")
+        ->option_text("LEVEL")
         ->transform(CLI::CheckedTransformer(kLogLevels, CLI::ignore_case).description(""));
     app.footer("Exit codes: 0 all well, 1 a file failed, 2 wrong arguments, 4 the library is missing, 130 "
                "stopped by Ctrl-C.");

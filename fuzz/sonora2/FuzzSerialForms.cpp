@@ -1,0 +1,57 @@
+// Arbitrary bytes as the serial forms that cross the pipe: each ends with an object or an error of its own,
+// and a context that could not be read is as it was.
+#include "peru/DataStreams.h"
+#include "peru/Errors.h"
+#include "peru/MemoryIOStream.h"
+#include "sonora2/audio/AudioChunk.h"
+#include "sonora2/audio/AudioStreamInfos.h"
+#include "sonora2/audio/SonoraContextAudio.h"
+#include "sonora2/common/PluginExtensions.h"
+
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+
+using namespace peru;
+using namespace sonora2;
+
+namespace {
+
+P<IDataInStream> makeStream(const uint8_t* data, size_t size) {
+    const P<CMemoryBlock> block = make<CMemoryBlock>(static_cast<int64_t>(size));
+    if (size > 0) std::memcpy(block->getData(), data, size);
+    return make<CDataInStream>(make<CMemoryIOStream>(block));
+}
+
+template <class T> bool read(const P<T>& object, const P<IDataInStream>& stream) {
+    try {
+        object->readFrom(stream);
+        return true;
+    } catch (const CException&) {
+        return false;
+    }
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    if (size == 0) return 0;
+    const P<IDataInStream> stream = makeStream(data + 1, size - 1);
+    switch (data[0] % 4) {
+    case 0: {
+        const auto context = make<audio::CSonoraContextAudio>();
+        if (!read(context, stream) && context->getPluginNameCount() != 0) std::abort();
+        break;
+    }
+    case 1:
+        read(make<audio::CAudioStreamInfos>(), stream);
+        break;
+    case 2:
+        read(make<common::CPluginExtensions>(), stream);
+        break;
+    case 3:
+        read(make<audio::CAudioChunk>(0.0, make<CMemoryBlock>()), stream);
+        break;
+    }
+    return 0;
+}
