@@ -91,7 +91,7 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
         ->add_flag_callback(
             "-q,--quiet", [&] { options.show = EOutput::quiet; }, "Tell failures only")
         ->excludes(json);
-    command->callback([&, command] {
+    command->callback([&] {
         if (options.output.empty() == options.extension.empty())
             throw CLI::RequiredError("Either --output or --to");
         if (!options.output.empty() && options.inputs.size() != 1)

@@ -56,7 +56,8 @@ void copyThroughStreams(const P<IURI>& source, const P<IURI>& destination, const
 } // namespace
 
 CFileSystemManager::CFileSystemManager() : m_mutex(getMutexFactory()->createMutex()) {
-    mount(createDiskFileSystem());
+    // Without the mutex: nobody else knows this object, and whoever makes a singleton holds the factory's.
+    m_mounts.push_back({CString::empty(), createDiskFileSystem()});
 }
 
 CFileSystemManager::~CFileSystemManager() = default;
@@ -81,8 +82,12 @@ void CFileSystemManager::unmount(const P<IFileSystem>& fileSystem) {
 P<IFileSystem> CFileSystemManager::getFileSystem(const P<IURI>& uri) {
     if (!uri) return nullptr;
     P<IString> scheme = uri->getScheme();
-    CMutexLock lock(m_mutex);
-    for (const SMount& entry : m_mounts) {
+    std::vector<SMount> mounts; // asked without the mutex: what a file system calls is its own affair
+    {
+        CMutexLock lock(m_mutex);
+        mounts = m_mounts;
+    }
+    for (const SMount& entry : mounts) {
         bool handled =
             entry.scheme->isEmpty() ? entry.fileSystem->handles(uri) : entry.scheme->equalsIgnoreCase(scheme);
         if (handled) return entry.fileSystem;

@@ -55,7 +55,7 @@ private:
     void moveFile(const SRoute& route, const P<IFileObject>& object);
     void moveFolder(const SRoute& route, const P<IFileObject>& folder);
 
-    P<IMutex> m_mutex; // guards m_mounts; no file system is called under it except for `handles`
+    P<IMutex> m_mutex; // guards m_mounts; no file system is called under it
     std::vector<SMount> m_mounts;
 };
 

@@ -5,11 +5,13 @@
 #include "peru/posix/Package.h"
 
 #include <algorithm>
+#include <utility>
 
 namespace peru {
 
-CPackageManager::CPackageManager()
-    : m_mutex(getMutexFactory()->createMutex()), m_listeners(make<TFrailArray<IPackageListener>>()) {}
+CPackageManager::CPackageManager(std::vector<P<IPackage>> known)
+    : m_mutex(getMutexFactory()->createMutex()), m_known(std::move(known)),
+      m_listeners(make<TFrailArray<IPackageListener>>()) {}
 
 CPackageManager::~CPackageManager() = default;
 
@@ -78,10 +80,10 @@ void CPackageManager::removeListener(IPackageListener* listener) {
 P<IPackageManager> getPackageManager() {
     static const CGlobalObjFactory::SKey key;
     return CGlobalObjFactory::get<IPackageManager>(key, [] {
-        P<IPackageManager> manager = make<CPackageManager>();
-        manager->registerPackage(make<CPackage>());
-        manager->registerPackage(make<posix::CPackage>());
-        return manager;
+        // Handed over rather than registered: the factory's mutex is held here, and a package that loads asks
+        // for singletons with the manager's held.
+        std::vector<P<IPackage>> known{make<CPackage>(), make<posix::CPackage>()};
+        return P<IPackageManager>(make<CPackageManager>(std::move(known)));
     });
 }
 

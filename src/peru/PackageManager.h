@@ -9,7 +9,7 @@ namespace peru {
 
 class PERU_API CPackageManager : public CObject, public IPackageManager {
 public:
-    CPackageManager();
+    explicit CPackageManager(std::vector<P<IPackage>> known = {});
     ~CPackageManager() override;
 
     void registerPackage(const P<IPackage>& package) override;
