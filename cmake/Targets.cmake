@@ -78,7 +78,6 @@ function(tw_fuzzer name)
     target_link_options(${name} PRIVATE -fsanitize=fuzzer)
     set(found ${CMAKE_BINARY_DIR}/corpus/${name})
     file(MAKE_DIRECTORY ${found})
-    enable_testing()
     add_test(NAME ${name} COMMAND ${name} -runs=50000 -max_len=4096 -timeout=20 -rss_limit_mb=2048
                                  ${found} ${CMAKE_SOURCE_DIR}/fuzz/corpus/${name})
     set_tests_properties(${name} PROPERTIES LABELS fuzz TIMEOUT 600)

@@ -4,5 +4,5 @@
 set -euo pipefail
 
 cd "$(dirname "$0")/.."
-scripts/build.sh fuzz
+scripts/build.sh fuzz fuzz/all
 exec ctest --preset fuzz -j "$(nproc)" "$@"
