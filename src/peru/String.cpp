@@ -6,7 +6,9 @@
 #include "peru/StringWindow.h"
 
 #include <algorithm>
+#include <climits>
 #include <cstdlib>
+#include <cstring>
 #include <cwchar>
 #include <new>
 #include <string>
@@ -21,6 +23,34 @@ alignas(4) constexpr unsigned char kZeros[8] = {};
 int32_t getPartialUnit(uint32_t encodingId, int32_t byteSize) {
     int32_t unit = getUnitSize(encodingId);
     return unit > 1 ? byteSize % unit : 0;
+}
+
+// Room for a terminator in any encoding.
+constexpr int64_t kTerminatorSize = 4;
+
+size_t getTerminatedSize(int64_t byteSize) {
+    if (byteSize + kTerminatorSize > INT_MAX) throw std::bad_alloc();
+    return static_cast<size_t>(byteSize + kTerminatorSize);
+}
+
+// The encodings of the library live to the end of the process; one that a caller made does not.
+PFrail<ICharEncoding> holdEncoding(const ICharEncoding* encoding, uint32_t id) {
+    const ICharEncoding* shared = nullptr;
+    switch (id) {
+    case ICharEncoding::kUTF8:
+        shared = getUTF8CharEncoding().get();
+        break;
+    case ICharEncoding::kUTF16:
+        shared = getUTF16CharEncoding().get();
+        break;
+    case ICharEncoding::kUTF32:
+        shared = getUTF32CharEncoding().get();
+        break;
+    case ICharEncoding::kLatin1:
+        shared = getLatin1CharEncoding().get();
+        break;
+    }
+    return {const_cast<ICharEncoding*>(encoding), encoding != shared};
 }
 
 } // namespace
@@ -71,8 +101,8 @@ void CStringArg::count() const {
 CString::CString(const P<ICharEncoding>& encoding, const void* data, int32_t byteSize, EStringStorage storage,
                  bool terminated, int32_t length)
     : m_data(static_cast<const uint8_t*>(data)), m_byteSize(byteSize), m_terminated(terminated),
-      m_owner(false), m_encoding(encoding), m_length(length), m_wellFormed(false),
-      m_encodingId(encoding->getId()) {
+      m_owner(false), m_encoding(holdEncoding(encoding.get(), encoding->getId())), m_length(length),
+      m_wellFormed(false), m_encodingId(encoding->getId()) {
     if (!m_data) {
         m_data = kZeros;
         m_byteSize = 0;
@@ -88,43 +118,45 @@ CString::CString(const P<ICharEncoding>& encoding, const void* data, int32_t byt
         m_terminated = false;
     }
     if (storage == EStringStorage::copy) {
-        uint8_t* block = text::allocate(*encoding, m_byteSize);
+        auto* block = static_cast<uint8_t*>(std::malloc(getTerminatedSize(m_byteSize)));
+        if (!block) throw std::bad_alloc();
         if (m_byteSize > 0) std::memcpy(block, m_data, static_cast<size_t>(m_byteSize));
+        std::memset(block + m_byteSize, 0, kTerminatorSize);
         m_data = block;
         m_terminated = true;
     }
     m_owner = storage != EStringStorage::refer;
     SStringView all = view();
-    if (m_length < 0) {
-        text::count(all);
-        m_length = all.length;
-        m_wellFormed = all.wellFormed;
-    } else {
-        m_wellFormed = text::getFixedWidth(all) != 0;
-    }
+    settle(m_length, m_length >= 0 && text::getFixedWidth(all) != 0);
 }
 
-CString::CString(const P<ICharEncoding>& encoding, const SStringView& view, bool terminated)
+CString::CString(const SStringView& view, bool terminated)
     : m_data(view.data), m_byteSize(view.byteSize), m_terminated(terminated), m_owner(false),
-      m_encoding(encoding), m_length(view.length), m_wellFormed(view.wellFormed),
-      m_encodingId(view.encodingId) {}
+      m_encoding(holdEncoding(view.encoding, view.encodingId)), m_length(view.length),
+      m_wellFormed(view.wellFormed), m_encodingId(view.encodingId) {}
 
 CString::~CString() {
     if (m_owner) std::free(const_cast<uint8_t*>(m_data));
 }
 
-P<IString> CString::adopt(const P<ICharEncoding>& encoding, uint8_t* block, int32_t byteSize, int32_t length,
-                          bool wellFormed) {
-    struct SGuard {
-        uint8_t* block;
-        ~SGuard() { std::free(block); }
-    } guard{block};
-    SStringView view{encoding.get(), encoding->getId(), byteSize, block, length, wellFormed};
-    if (length < 0) text::count(view);
-    P<CString> string(new CString(encoding, view, true));
-    string->m_owner = true;
-    guard.block = nullptr;
+P<CString> CString::reserve(const ICharEncoding& encoding, int64_t byteSize) {
+    SRoom room{getTerminatedSize(byteSize)};
+    SStringView view{&encoding, encoding.getId(), static_cast<int32_t>(byteSize), nullptr, 0, false};
+    P<CString> string(new (room) CString(view, true));
+    auto* bytes = reinterpret_cast<uint8_t*>(string.get()) + sizeof(CString);
+    std::memset(bytes + byteSize, 0, kTerminatorSize);
+    string->m_data = bytes;
     return string;
+}
+
+void CString::settle(int32_t length, bool wellFormed) {
+    m_length = length;
+    m_wellFormed = wellFormed;
+    if (length >= 0) return;
+    SStringView all = view();
+    text::count(all);
+    m_length = all.length;
+    m_wellFormed = all.wellFormed;
 }
 
 P<IString> CString::empty() {
@@ -132,10 +164,10 @@ P<IString> CString::empty() {
 }
 
 P<IString> CString::fromView(const SStringView& view) {
-    P<ICharEncoding> encoding = P<ICharEncoding>::share(const_cast<ICharEncoding*>(view.encoding));
-    uint8_t* block = text::allocate(*encoding, view.byteSize);
-    if (view.byteSize > 0) std::memcpy(block, view.data, static_cast<size_t>(view.byteSize));
-    return adopt(encoding, block, view.byteSize, view.length, view.wellFormed);
+    P<CString> string = reserve(*view.encoding, view.byteSize);
+    if (view.byteSize > 0) std::memcpy(string->getRoom(), view.data, static_cast<size_t>(view.byteSize));
+    string->settle(view.length, view.wellFormed);
+    return string;
 }
 
 P<IString> CString::fromUTF8(std::string_view bytes) {
@@ -248,7 +280,7 @@ template <class F> P<IString> CString::trimBy(F&& isTrimmed) const {
     bool forwardOnly = m_encodingId == ICharEncoding::kCodePage;
     bool started = false;
     int32_t index = 0;
-    CStringWindow window(*m_encoding, m_data, m_byteSize, 0);
+    CStringWindow window(*m_encoding.get(), m_data, m_byteSize, 0);
     for (; window.next(ch); ++index) {
         if (started && forwardOnly && end.index < 0) end = {index, window.getOffset()};
         if (isTrimmed(ch)) continue;
@@ -259,7 +291,7 @@ template <class F> P<IString> CString::trimBy(F&& isTrimmed) const {
     }
     if (!started) return getSlice(getEnd(), getEnd());
     if (forwardOnly) return getSlice(start, resolve(end));
-    CStringWindow back(*m_encoding, m_data, m_byteSize, m_byteSize, CStringWindow::backward);
+    CStringWindow back(*m_encoding.get(), m_data, m_byteSize, m_byteSize, CStringWindow::backward);
     while (back.next(ch) && isTrimmed(ch)) end = {end.index - 1, back.getOffset()};
     return getSlice(start, end);
 }
@@ -279,7 +311,7 @@ P<IString> CString::trim(const CStringArg& characters) const {
 }
 
 CStringSlice::CStringSlice(const P<const IString>& parent, const SStringView& view, bool terminated)
-    : CString(parent->getEncoding(), view, terminated), m_parent(parent) {}
+    : CString(view, terminated), m_parent(parent) {}
 
 CStringSlice::~CStringSlice() = default;
 

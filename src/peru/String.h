@@ -5,6 +5,7 @@
 #include "peru/Object.h"
 
 #include <atomic>
+#include <new>
 
 namespace peru {
 
@@ -93,23 +94,36 @@ public:
     bool isEmpty() const override { return m_length == 0; }
     int32_t getLength() const override { return m_length; }
     bool isEncoding(uint32_t id) const override;
-    P<ICharEncoding> getEncoding() const override { return m_encoding; }
+    P<ICharEncoding> getEncoding() const override { return P<ICharEncoding>::share(m_encoding.get()); }
     const uint8_t* getData() const override { return m_data; }
     int32_t getDataSize() const override { return m_byteSize; }
     bool isTerminated() const override { return m_terminated; }
     SStringView getView() const override { return view(); }
 
-    // A string that adopts a terminated block from std::malloc; `length` -1 is counted.
-    static P<IString> adopt(const P<ICharEncoding>& encoding, uint8_t* block, int32_t byteSize,
-                            int32_t length = -1, bool wellFormed = false);
+    // A terminated string whose bytes lie behind the object itself, in one allocation. Who asked for it
+    // writes them (getRoom) and settles the length before anyone else sees the string. Throws std::bad_alloc,
+    // also above 2 GB.
+    static P<CString> reserve(const ICharEncoding& encoding, int64_t byteSize);
+    uint8_t* getRoom() { return const_cast<uint8_t*>(m_data); }
+    void settle(int32_t length = -1, bool wellFormed = false); // -1: counted
+
+    // Without a size at the end: room for bytes may lie behind the object.
+    static void* operator new(size_t size) { return ::operator new(size); }
+    static void operator delete(void* object) { ::operator delete(object); }
 
 protected:
     // Refers to text whose length is counted.
-    CString(const P<ICharEncoding>& encoding, const SStringView& view, bool terminated);
+    CString(const SStringView& view, bool terminated);
     // The string whose bytes these are: slices of a slice hold on to the root.
     virtual P<const IString> getSliceRoot() const;
 
 private:
+    struct SRoom {
+        size_t byteSize;
+    };
+    static void* operator new(size_t size, SRoom room) { return ::operator new(size + room.byteSize); }
+    static void operator delete(void* object, SRoom) { ::operator delete(object); }
+
     SStringView view() const {
         return {m_encoding.get(), m_encodingId, m_byteSize, m_data, m_length, m_wellFormed};
     }
@@ -139,8 +153,8 @@ private:
     int32_t m_byteSize; // without the terminator
     bool m_terminated;  // a terminator in the encoding's form follows the data
     bool m_owner;
-    P<ICharEncoding> m_encoding;
-    int32_t m_length; // characters; known from construction onwards
+    PFrail<ICharEncoding> m_encoding; // the shared encodings outlive all strings and are not counted
+    int32_t m_length;                 // characters; known from construction onwards
     // What falls out of counting, and the hash once it was asked for (0 before).
     bool m_wellFormed;
     uint32_t m_encodingId;

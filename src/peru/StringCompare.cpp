@@ -101,9 +101,16 @@ bool startsWith(const SStringView& text, const SStringView& prefix) {
 
 namespace {
 
-// h = ((h AND 0x0FFFFFFF) << 3) XOR (((h >> 2) XOR c) AND 0x7FFFFFFF): bit 31 is always clear.
+// h = ((h AND 0x0FFFFFFF) << 3) XOR (((h >> 2) XOR c) AND 0x7FFFFFFF). Bit 31 of h and c is always clear,
+// which makes the second AND idle.
 constexpr uint32_t addToHash(uint32_t hash, uint32_t ch) {
-    return ((hash & 0x0FFFFFFF) << 3) ^ (((hash >> 2) ^ ch) & 0x7FFFFFFF);
+    return (hash << 3 & 0x7FFFFFF8) ^ (hash >> 2 ^ ch);
+}
+
+// Two steps in one, so that a step waits for its forerunner half as often: addToHash(addToHash(h, a), b), its
+// shifts multiplied out.
+constexpr uint32_t addToHash(uint32_t hash, uint32_t a, uint32_t b) {
+    return (hash << 6 & 0x7FFFFFC0) ^ (hash << 1 & 0x60000007) ^ (hash >> 4 ^ addToHash(a, b));
 }
 
 // A step is linear over bits, so the hash of two pieces in a row is that of the first, carried on over as
@@ -143,7 +150,8 @@ template <class U> uint32_t hashUnits(text::SUnits<U> units, int32_t count) {
             for (int32_t p = 0; p < 4; ++p) pieces[p] = addToHash(pieces[p], first[p * kHashPiece + k]);
         for (uint32_t piece : pieces) hash = kCarryOver(hash) ^ piece;
     }
-    for (; i < count; ++i) hash = addToHash(hash, units[i]);
+    for (; i + 2 <= count; i += 2) hash = addToHash(hash, units[i], units[i + 1]);
+    if (i < count) hash = addToHash(hash, units[i]);
     return hash;
 }
 
@@ -156,7 +164,7 @@ uint32_t CString::getHash() const {
     if (int32_t width = text::getFixedWidth(all)) {
         hash = text::withUnits(all, width, [&](auto units) { return hashUnits(units, all.length); });
     } else {
-        CStringWindow window(*m_encoding, m_data, m_byteSize, 0);
+        CStringWindow window(*m_encoding.get(), m_data, m_byteSize, 0);
         for (char32_t ch; window.next(ch);) hash = addToHash(hash, ch);
     }
     m_hash.store(hash, std::memory_order_relaxed);

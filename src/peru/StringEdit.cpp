@@ -25,7 +25,7 @@ P<IString> CString::edit(SStringPos start, SStringPos end, const SStringView& in
     bool raw = inserted.encodingId == m_encodingId && !inserted.wellFormed;
     int32_t length = m_length - (end.index - start.index) + inserted.length;
     for (;; raw = false) {
-        int64_t needed = raw ? inserted.byteSize : text::getEncodedSize(*m_encoding, inserted);
+        int64_t needed = raw ? inserted.byteSize : text::getEncodedSize(*m_encoding.get(), inserted);
         if (needed < 0) {
             P<IString> copy = text::convert(getUTF8CharEncoding(), view(), '?');
             // Where UTF-8 would not read again what is here, what is put in gives way.
@@ -36,15 +36,15 @@ P<IString> CString::edit(SStringPos start, SStringPos end, const SStringView& in
         }
         int64_t tail = m_byteSize - end.offset;
         int64_t size = start.offset + needed + tail;
-        uint8_t* block = text::allocate(*m_encoding, size);
-        uint8_t* out = append(block, m_data, start.offset);
+        P<CString> result = reserve(*m_encoding.get(), size);
+        uint8_t* out = append(result->getRoom(), m_data, start.offset);
         if (raw)
             append(out, inserted.data, needed);
         else
-            text::encode(*m_encoding, inserted, out);
+            text::encode(*m_encoding.get(), inserted, out);
         append(out + needed, m_data + end.offset, tail);
         bool known = m_wellFormed && inserted.wellFormed && inserted.encodingId == m_encodingId;
-        P<IString> result = adopt(m_encoding, block, static_cast<int32_t>(size), known ? length : -1, known);
+        result->settle(known ? length : -1, known);
         if (!raw || result->getLength() == length) return result;
     }
 }
@@ -84,7 +84,7 @@ P<IString> CString::replace(const CStringArg& search, const CStringArg& replacem
     }
     if (matches.empty()) return P<IString>::share(const_cast<CString*>(this));
 
-    int64_t needed = text::getEncodedSize(*m_encoding, inserted);
+    int64_t needed = text::getEncodedSize(*m_encoding.get(), inserted);
     if (needed < 0) {
         P<IString> copy = text::convert(getUTF8CharEncoding(), view(), '?');
         if (copy->getLength() == m_length)
@@ -95,32 +95,33 @@ P<IString> CString::replace(const CStringArg& search, const CStringArg& replacem
     }
     int64_t size = m_byteSize;
     for (auto [from, to] : matches) size += needed - (to - from);
-    uint8_t* block = text::allocate(*m_encoding, size);
-    uint8_t* out = block;
+    P<CString> result = reserve(*m_encoding.get(), size);
+    uint8_t* out = result->getRoom();
     int32_t done = 0;
     for (auto [from, to] : matches) {
         out = append(out, m_data + done, from - done);
-        text::encode(*m_encoding, inserted, out);
+        text::encode(*m_encoding.get(), inserted, out);
         out += needed;
         done = to;
     }
     append(out, m_data + done, m_byteSize - done);
-    return adopt(m_encoding, block, static_cast<int32_t>(size));
+    result->settle();
+    return result;
 }
 
 P<IString> CString::mapCase(char32_t (*map)(char32_t)) const {
     std::u32string mapped;
     mapped.reserve(static_cast<size_t>(m_length));
     bool changed = false;
-    CStringWindow window(*m_encoding, m_data, m_byteSize, 0);
+    CStringWindow window(*m_encoding.get(), m_data, m_byteSize, 0);
     for (char32_t ch; window.next(ch);) {
         mapped.push_back(map(ch));
         changed |= mapped.back() != ch;
     }
     if (!changed) return P<IString>::share(const_cast<CString*>(this));
     CStringArg arg(*getUTF32CharEncoding(), mapped.data(), static_cast<int32_t>(mapped.size() * 4));
-    bool fits = text::getEncodedSize(*m_encoding, arg.getView()) >= 0;
-    return text::convert(fits ? m_encoding : getUTF8CharEncoding(), arg.getView(), '?');
+    bool fits = text::getEncodedSize(*m_encoding.get(), arg.getView()) >= 0;
+    return text::convert(fits ? getEncoding() : getUTF8CharEncoding(), arg.getView(), '?');
 }
 
 P<IString> CString::toLower() const {

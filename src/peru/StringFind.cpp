@@ -93,7 +93,10 @@ public:
 
 private:
     static bool isASCII(const SStringView& view) {
-        return !hasAny(SUnits<uint8_t>{view.data}, view.byteSize, [](uint8_t byte) { return byte >= 0x80; });
+        // What is looked for is mostly too short for vectors to pay.
+        for (int32_t i = 0; i < view.byteSize; ++i)
+            if (view.data[i] >= 0x80) return false;
+        return true;
     }
 
     void encodeBySteps(const SStringView& text, const SStringView& wanted) {
@@ -153,7 +156,8 @@ SStringPos findLastBySteps(const SStringView& text, const SStringView& wanted) {
 SStringPos toPlace(const SStringView& text, int32_t offset) {
     if (offset < 0) return kStringEnd;
     int32_t width = getFixedWidth(text);
-    return {width ? offset / width : countWellFormed(text, offset), offset};
+    // A shift: a division would cost as much as finding a place in short text.
+    return {width ? offset >> (width >> 1) : countWellFormed(text, offset), offset};
 }
 
 template <bool last> SStringPos findIn(const SStringView& text, const SStringView& wanted) {

@@ -147,6 +147,20 @@ int64_t getUTF16SizeOfUTF8(const SStringView& text) {
     return suspect ? -1 : 2 * (static_cast<int64_t>(text.length) + pairs);
 }
 
+// Bytes that carry a UTF-8 character on, blockwise so that a lane of the vectors is a byte.
+int32_t countTrails(const uint8_t* data, int32_t byteSize) {
+    int32_t count = 0;
+    int32_t i = 0;
+    for (; byteSize - i >= kScanBlock; i += kScanBlock) {
+        uint8_t trails = 0;
+        for (int32_t k = 0; k < kScanBlock; ++k)
+            trails = static_cast<uint8_t>(trails + SUTF8Rules::isTrail(data[i + k]));
+        count += trails;
+    }
+    for (; i < byteSize; ++i) count += SUTF8Rules::isTrail(data[i]);
+    return count;
+}
+
 template <class A, class B> void widen(SUnits<A> from, int32_t count, uint8_t* out) {
     for (int32_t i = 0; i < count; ++i) {
         B unit = static_cast<B>(from[i]);
@@ -187,8 +201,7 @@ int32_t countWellFormed(const SStringView& view, int32_t byteSize) {
     int32_t count = 0;
     switch (view.encodingId) {
     case ICharEncoding::kUTF8:
-        for (int32_t i = 0; i < byteSize; ++i) count += !SUTF8Rules::isTrail(view.data[i]);
-        return count;
+        return byteSize - countTrails(view.data, byteSize);
     case ICharEncoding::kUTF16:
         for (int32_t i = 0; i < byteSize / 2; ++i)
             count += !SUTF16Rules::isLow(SUnits<uint16_t>{view.data}[i]);
@@ -246,24 +259,16 @@ void encode(const ICharEncoding& encoding, const SStringView& text, uint8_t* out
     for (char32_t ch; window.next(ch);) pos = encoding.encodeChar(ch, out, INT_MAX, pos);
 }
 
-uint8_t* allocate(const ICharEncoding& encoding, int64_t byteSize) {
-    int64_t total = byteSize + encoding.getMaxCharSize();
-    if (total > INT_MAX) throw std::bad_alloc();
-    auto* block = static_cast<uint8_t*>(std::malloc(static_cast<size_t>(total)));
-    if (!block) throw std::bad_alloc();
-    encoding.encodeChar(0, block, static_cast<int32_t>(total), static_cast<int32_t>(byteSize));
-    return block;
-}
-
 P<IString> convert(const P<ICharEncoding>& encoding, const SStringView& text, char32_t substitute) {
     int64_t size = getEncodedSize(*encoding, text);
     if (size >= 0) {
-        uint8_t* block = allocate(*encoding, size);
-        encode(*encoding, text, block);
+        P<CString> string = CString::reserve(*encoding, size);
+        encode(*encoding, text, string->getRoom());
         // Only UTF-8 has characters that are written and not read again.
         bool known = text.length >= 0 && getUnitSize(encoding->getId()) != 0 &&
                      (encoding->getId() != ICharEncoding::kUTF8 || size == text.length);
-        return CString::adopt(encoding, block, static_cast<int32_t>(size), known ? text.length : -1, known);
+        string->settle(known ? text.length : -1, known);
+        return string;
     }
     size = 0;
     int32_t substituteSize = encoding->getEncodedSize(substitute);
@@ -272,13 +277,15 @@ P<IString> convert(const P<ICharEncoding>& encoding, const SStringView& text, ch
         int32_t needed = encoding->getEncodedSize(ch);
         size += needed > 0 ? needed : substituteSize;
     }
-    uint8_t* block = allocate(*encoding, size);
+    P<CString> string = CString::reserve(*encoding, size);
+    uint8_t* block = string->getRoom();
     int32_t pos = 0;
     for (CStringWindow window(*text.encoding, text.data, text.byteSize, 0); window.next(ch);) {
         int32_t next = encoding->encodeChar(ch, block, static_cast<int32_t>(size), pos);
         pos = next > pos ? next : encoding->encodeChar(substitute, block, static_cast<int32_t>(size), pos);
     }
-    return CString::adopt(encoding, block, static_cast<int32_t>(size));
+    string->settle();
+    return string;
 }
 
 } // namespace peru::text

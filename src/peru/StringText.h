@@ -75,9 +75,6 @@ void encode(const ICharEncoding& encoding, const SStringView& text, uint8_t* out
 // encoded.
 P<IString> convert(const P<ICharEncoding>& encoding, const SStringView& text, char32_t substitute);
 
-// A block for a string of so many bytes and its terminator. Throws std::bad_alloc, also above 2 GB.
-uint8_t* allocate(const ICharEncoding& encoding, int64_t byteSize);
-
 char32_t toLower(char32_t ch);
 char32_t toUpper(char32_t ch);
 bool isWhiteSpace(char32_t ch);
