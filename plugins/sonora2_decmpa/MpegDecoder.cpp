@@ -1,48 +1,119 @@
 #include "sonora2_decmpa/MpegDecoder.h"
 
-#include <cerrno>
+#include <cstdio>
 #include <sys/stat.h>
+#include <utility>
 
 namespace sonora2::plugins {
 
 namespace {
 
 constexpr int kBytesPerSample = 2;
-// How much of something else (an unknown tag, damage) may stand before the next frame.
-constexpr long kResyncBytes = 64 * 1024;
+// How much of something else (an unknown tag, damage) may stand before the first frame, and before others.
+constexpr long kFirstFrameBytes = 64 * 1024;
+constexpr long kNextFrameBytes = 16 * 1024 * 1024;
 // Frames decoded before the target of a seek. A frame may refer back to the bits of several earlier ones,
 // and what a seek delivers must be what a run from the start delivers.
 constexpr long kRunUpFrames = 16;
+// Places of frames that are remembered, evenly over the file; in between, headers are followed.
+constexpr long kPlaces = 2048;
+// Every decoder of layer III delivers what it gets that many frames late.
+constexpr long kDecoderDelay = 529;
+// The codec reads each header and each frame by a call of its own.
+constexpr size_t kInputBufferBytes = 64 * 1024;
+
+ssize_t readInput(void* input, void* data, size_t size) {
+    auto* file = static_cast<std::FILE*>(input);
+    const size_t got = fread_unlocked(data, 1, size, file);
+    return got == 0 && ferror_unlocked(file) ? -1 : static_cast<ssize_t>(got);
+}
+
+off_t seekInput(void* input, off_t offset, int whence) {
+    auto* file = static_cast<std::FILE*>(input);
+    return ::fseeko(file, offset, whence) == 0 ? ::ftello(file) : -1;
+}
 
 } // namespace
 
 SDecodedMedia CMpegDecoder::open() {
-    struct stat status;
-    if (::stat(m_file.path.c_str(), &status) != 0) failSystem("could not open", m_file, errno);
-    if (S_ISDIR(status.st_mode)) failSystem("could not open", m_file, EISDIR);
-
+    close();
+    m_input = openForReading(m_file);
+    std::setvbuf(m_input.get(), nullptr, _IOFBF, kInputBufferBytes);
     int error = MPG123_OK;
     m_handle.reset(mpg123_new(nullptr, &error));
     if (!m_handle) fail("could not open %s: %s", m_file.getDisplayName(), mpg123_plain_strerror(error));
     mpg123_handle* handle = m_handle.get();
-    mpg123_param(handle, MPG123_ADD_FLAGS, MPG123_QUIET | MPG123_GAPLESS | MPG123_SKIP_ID3V2, 0);
-    mpg123_param(handle, MPG123_RESYNC_LIMIT, kResyncBytes, 0);
+    mpg123_param(handle, MPG123_ADD_FLAGS, MPG123_QUIET | MPG123_SKIP_ID3V2, 0);
+    // The codec would believe the file's word for its length.
+    mpg123_param(handle, MPG123_REMOVE_FLAGS, MPG123_GAPLESS, 0);
+    mpg123_param(handle, MPG123_RESYNC_LIMIT, kFirstFrameBytes, 0);
     mpg123_param(handle, MPG123_PREFRAMES, kRunUpFrames, 0);
-    mpg123_param(handle, MPG123_INDEX_SIZE, -1, 0); // grows: every frame is found without a search
+    mpg123_param(handle, MPG123_INDEX_SIZE, kPlaces, 0);
+    if (mpg123_replace_reader_handle(handle, readInput, seekInput, nullptr) != MPG123_OK ||
+        mpg123_open_handle(handle, m_input.get()) != MPG123_OK)
+        failWith("could not open");
+    m_format = readFormat();
+    mpg123_param(handle, MPG123_RESYNC_LIMIT, kNextFrameBytes, 0);
+    if (m_scan.identity != identify())
+        scan();
+    else if (mpg123_set_index(handle, m_scan.places.data(), m_scan.framesPerPlace, m_scan.places.size()) !=
+             MPG123_OK)
+        failWith("could not open");
+    seek(0);
+    return {m_format, m_scan.frames};
+}
 
+void CMpegDecoder::close() {
+    m_handle.reset();
+    m_input.reset();
+}
+
+SPcmFormat CMpegDecoder::readFormat() {
+    mpg123_handle* handle = m_handle.get();
     long rate = 0;
     int channels = 0, encoding = 0;
-    if (mpg123_open(handle, m_file.path.c_str()) != MPG123_OK) failWith("could not open");
     if (mpg123_getformat(handle, &rate, &channels, &encoding) != MPG123_OK) failWith("could not open");
     // From here on nothing but this format: a file that changes it is an error and no surprise.
     mpg123_format_none(handle);
     if (mpg123_format(handle, rate, channels, MPG123_ENC_SIGNED_16) != MPG123_OK) failWith("could not open");
-    // Headers may lie about the length and many files have none: the frames are counted.
+    return {static_cast<int>(rate), channels, kBytesPerSample};
+}
+
+CMpegDecoder::SIdentity CMpegDecoder::identify() const {
+    struct stat status;
+    if (::fstat(::fileno(m_input.get()), &status) != 0) return {};
+    return {status.st_dev, status.st_ino, status.st_size, status.st_mtim.tv_sec, status.st_mtim.tv_nsec};
+}
+
+// Headers may lie about the length and many files have none: the frames are counted.
+void CMpegDecoder::scan() {
+    mpg123_handle* handle = m_handle.get();
+    m_scan = {};
+    const off_t told = mpg123_length(handle);
     if (mpg123_scan(handle) != MPG123_OK) failWith("could not open");
-    const off_t frames = mpg123_length(handle);
-    if (frames < 0) failWith("could not open");
-    m_format = {static_cast<int>(rate), channels, kBytesPerSample};
-    return {m_format, frames};
+    const off_t decoded = mpg123_length(handle);
+    if (decoded < 0) failWith("could not open");
+    SScan scan;
+    scan.frames = decoded;
+    long delay = -1, padding = -1;
+    mpg123_getstate(handle, MPG123_ENC_DELAY, &delay, nullptr);
+    mpg123_getstate(handle, MPG123_ENC_PADDING, &padding, nullptr);
+    if (delay >= 0 && padding >= 0) {
+        const int64_t before = delay + kDecoderDelay;
+        // A file that has lost its end has lost the padding first, and one that goes on behind what was told
+        // of has it somewhere within.
+        const int64_t behind = told == decoded && padding > kDecoderDelay ? padding - kDecoderDelay : 0;
+        if (before + behind <= decoded) {
+            scan.start = before;
+            scan.frames = decoded - before - behind;
+        }
+    }
+    off_t* places = nullptr;
+    size_t count = 0;
+    if (mpg123_index(handle, &places, &scan.framesPerPlace, &count) != MPG123_OK) failWith("could not open");
+    scan.places.assign(places, places + count);
+    scan.identity = identify();
+    m_scan = std::move(scan);
 }
 
 int CMpegDecoder::read(uint8_t* pcm, int frames) {
@@ -59,7 +130,8 @@ int CMpegDecoder::read(uint8_t* pcm, int frames) {
 }
 
 void CMpegDecoder::seek(int64_t frame) {
-    if (mpg123_seek(m_handle.get(), frame, SEEK_SET) < 0) failWith("could not find a place in");
+    if (mpg123_seek(m_handle.get(), m_scan.start + frame, SEEK_SET) < 0)
+        failWith("could not find a place in");
 }
 
 void CMpegDecoder::failWith(const char* doing) {

@@ -19,7 +19,7 @@ public:
 
     // Starts at frame 0. Called again after close(): what took long to find out should be kept.
     virtual SDecodedMedia open() = 0;
-    virtual void close() = 0;
+    virtual void close() = 0; // also after an open() that threw; nothing when closed
     // Fills up to `frames` frames and answers how many; fewer are legal, 0 means the end. What could be
     // decoded before a damaged place is delivered before the failure is thrown.
     virtual int read(uint8_t* pcm, int frames) = 0;

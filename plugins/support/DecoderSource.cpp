@@ -116,7 +116,12 @@ P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {
 }
 
 bool CDecoderSource::openDecoder() {
-    m_media = m_decoder->open();
+    try {
+        m_media = m_decoder->open();
+    } catch (...) {
+        m_decoder->close(); // it may have come half way
+        throw;
+    }
     const SPcmFormat& own = m_media.format;
     const bool sound = own.rate > 0 && own.channels > 0 && own.bytesPerSample >= 1 &&
                        own.bytesPerSample <= 4 && m_media.frames >= 0;
