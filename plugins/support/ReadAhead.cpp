@@ -80,13 +80,16 @@ void CReadAhead::run() {
         P<audio::IAudioChunk> chunk;
         P<peru::CException> error;
         more = produce(chunk, error);
-        std::unique_lock lock(m_mutex);
-        if (chunk) m_chunks.push_back(std::move(chunk));
-        if (!more) {
-            m_error = std::move(error);
-            m_ended = true;
+        {
+            std::lock_guard lock(m_mutex);
+            if (chunk) m_chunks.push_back(std::move(chunk));
+            if (!more) {
+                m_error = std::move(error);
+                m_ended = true;
+            }
         }
-        m_filled.notify_one();
+        m_filled.notify_one(); // behind the lock, which the consumer would else wait for at once
+        std::unique_lock lock(m_mutex);
         if (more && m_chunks.size() >= m_limit)
             m_drained.wait(lock, [this] { return m_stopping || m_chunks.size() <= m_limit / 2; });
         if (m_stopping) return;
