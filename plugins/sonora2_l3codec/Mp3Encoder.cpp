@@ -14,6 +14,11 @@ namespace {
 constexpr double kDefaultQuality = 0.8; // V2
 constexpr int kRates[] = {8000, 11025, 12000, 16000, 22050, 24000, 32000, 44100, 48000};
 
+// Whole kbit/s, the codec's unit, in which 0 would leave the choice to it.
+int toKilobits(int bitRate) {
+    return std::max(bitRate / 1000, 1);
+}
+
 float toVbrQuality(double quality) {
     return static_cast<float>(std::clamp((1.0 - quality) * 10, 0.0, 9.999));
 }
@@ -49,17 +54,17 @@ void CMp3Encoder::open(COutputFile& file, const SEncoderSettings& settings) {
     if (m_format.channels == 1) lame_set_mode(encoder, MONO);
     lame_set_write_id3tag_automatic(encoder, 0);
     if (settings.nominalBitRate > 0 && !isAverage(settings)) {
-        lame_set_brate(encoder, settings.nominalBitRate / 1000);
+        lame_set_brate(encoder, toKilobits(settings.nominalBitRate));
     } else if (settings.nominalBitRate > 0) {
         lame_set_VBR(encoder, vbr_abr);
-        lame_set_VBR_mean_bitrate_kbps(encoder, settings.nominalBitRate / 1000);
+        lame_set_VBR_mean_bitrate_kbps(encoder, toKilobits(settings.nominalBitRate));
     } else {
         lame_set_VBR(encoder, vbr_default);
         lame_set_VBR_quality(encoder, toVbrQuality(settings.quality.value_or(kDefaultQuality)));
     }
     if (isAverage(settings)) {
-        if (settings.minBitRate > 0) lame_set_VBR_min_bitrate_kbps(encoder, settings.minBitRate / 1000);
-        if (settings.maxBitRate > 0) lame_set_VBR_max_bitrate_kbps(encoder, settings.maxBitRate / 1000);
+        if (settings.minBitRate > 0) lame_set_VBR_min_bitrate_kbps(encoder, toKilobits(settings.minBitRate));
+        if (settings.maxBitRate > 0) lame_set_VBR_max_bitrate_kbps(encoder, toKilobits(settings.maxBitRate));
     }
     if (lame_init_params(encoder) < 0)
         fail("could not write %s: MP3 has no mode for %d Hz, %d channels and these bit rates",
@@ -79,12 +84,15 @@ void CMp3Encoder::write(const uint8_t* pcm, int frames) {
                 : lame_encode_buffer(m_encoder.get(), samples, nullptr, frames, m_encoded.data(), capacity));
         return;
     }
+    // Full range of 32 bits, whatever the width, as the codec wants its integers.
     m_samples.resize(static_cast<size_t>(frames) * static_cast<size_t>(m_format.channels));
-    pcm::unpackFloat(pcm, m_format.bytesPerSample, m_samples.data(), m_samples.size());
-    writeEncoded(stereo ? lame_encode_buffer_interleaved_ieee_float(m_encoder.get(), m_samples.data(), frames,
-                                                                    m_encoded.data(), capacity)
-                        : lame_encode_buffer_ieee_float(m_encoder.get(), m_samples.data(), nullptr, frames,
-                                                        m_encoded.data(), capacity));
+    pcm::unpack(pcm, m_format.bytesPerSample, m_samples.data(), m_samples.size());
+    const int shift = 32 - 8 * m_format.bytesPerSample;
+    for (int32_t& sample : m_samples) sample <<= shift;
+    writeEncoded(stereo ? lame_encode_buffer_interleaved_int(m_encoder.get(), m_samples.data(), frames,
+                                                             m_encoded.data(), capacity)
+                        : lame_encode_buffer_int(m_encoder.get(), m_samples.data(), nullptr, frames,
+                                                 m_encoded.data(), capacity));
 }
 
 void CMp3Encoder::finish() {

@@ -10,8 +10,8 @@
 namespace sonora2::plugins {
 
 // A nominal bit rate alone makes a constant one; with a minimum or maximum beside it, an average one within
-// these limits. Otherwise the bit rate varies by quality: 1.0 is the encoder's V0, 0.0 its V9; V2 unless
-// told.
+// these limits. Otherwise the bit rate varies by quality: 1.0 is the encoder's V0, 0.0 the least that it has,
+// V9.999; V2 unless told.
 class CMp3Encoder : public IEncoder {
 public:
     bool accepts(const SPcmFormat& format) const override;
@@ -30,7 +30,7 @@ private:
     COutputFile* m_file = nullptr;
     SPcmFormat m_format;
     std::unique_ptr<lame_global_flags, SClose> m_encoder;
-    std::vector<float> m_samples;
+    std::vector<int32_t> m_samples;
     std::vector<unsigned char> m_encoded;
 };
 

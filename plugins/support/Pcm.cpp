@@ -155,10 +155,6 @@ void packPlanesFloat(const float* const planes[], int channels, uint8_t* pcm, in
     });
 }
 
-void unpackFloat(const uint8_t* pcm, int bytesPerSample, float* samples, size_t count) {
-    unpackChannelFloat(pcm, bytesPerSample, 1, samples, count);
-}
-
 void unpackChannelFloat(const uint8_t* pcm, int bytesPerSample, int stride, float* samples, size_t frames) {
     withWidth(bytesPerSample, [&]<int Bytes>() {
         constexpr float kScale = 1.0f / kFullScale<Bytes>;

@@ -23,7 +23,6 @@ void packFloat(const float* samples, uint8_t* pcm, int bytesPerSample, size_t co
 void packPlanesFloat(const float* const planes[], int channels, uint8_t* pcm, int bytesPerSample,
                      size_t frames);
 // Integers of that width to -1.0 (inclusive) to 1.0 (exclusive).
-void unpackFloat(const uint8_t* pcm, int bytesPerSample, float* samples, size_t count);
 void unpackChannelFloat(const uint8_t* pcm, int bytesPerSample, int stride, float* samples, size_t frames);
 
 // Between unsigned and signed 8 bit samples, in place.
