@@ -3,9 +3,6 @@
 #include "sonora2_vorbis/ChannelOrder.h"
 #include "support/Pcm.h"
 
-#include <cerrno>
-#include <cstdio>
-
 namespace sonora2::plugins {
 
 namespace {
@@ -33,12 +30,12 @@ const char* describe(long error) {
 } // namespace
 
 SDecodedMedia CVorbisDecoder::open() {
-    std::FILE* file = std::fopen(m_file.path.c_str(), "rbe");
-    if (!file) failSystem("could not open", m_file, errno);
-    if (const int error = ov_open_callbacks(file, &m_stream, nullptr, 0, OV_CALLBACKS_DEFAULT); error < 0) {
-        std::fclose(file);
+    close();
+    InputFile file = openForReading(m_file);
+    if (const int error = ov_open_callbacks(file.get(), &m_stream, nullptr, 0, OV_CALLBACKS_DEFAULT);
+        error < 0)
         fail("could not open %s: %s", m_file.getDisplayName(), describe(error));
-    }
+    file.release(); // goes with the stream
     m_opened = true;
 
     const vorbis_info* info = ov_info(&m_stream, -1);
