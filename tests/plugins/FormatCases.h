@@ -28,6 +28,8 @@ inline const std::vector<SFormatCase> kFormatCases{
     {"sonora2_wav", "au", true, {1, 2, 3, 4}, {1, 2, 6}, true, ".snd", ""},
     {"sonora2_wav", "caf", true, {1, 2, 3, 4}, {1, 2, 6}, true, "caff", ""},
     {"sonora2_flac", "flac", true, {1, 2, 3, 4}, {1, 2, 6}, false, "fLaC", "flac -st"},
+    {"sonora2_vorbis", "ogg", false, {1, 2, 3, 4}, {1, 2, 6}, false, "OggS", "oggdec -Q -o /dev/null"},
+    {"sonora2_l3codec", "mp3", false, {1, 2, 3, 4}, {1, 2}, false, "\xff", ""},
 };
 
 // Names the instances of a test.

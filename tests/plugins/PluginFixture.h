@@ -49,6 +49,7 @@ protected:
         std::set<std::string> names;
         for (const SFormatCase& format : kFormatCases)
             if (names.insert(format.plugin).second) context->addPluginName(format.plugin);
+        context->addPluginName("sonora2_decmpa"); // reads what another one writes
         handler = peru::make<sonora2::common::CPluginHandler>(context);
     }
 

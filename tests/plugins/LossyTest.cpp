@@ -1,0 +1,249 @@
+// MP3 and Ogg Vorbis beside the programs that know them best.
+#include "plugins/PluginFixture.h"
+
+#include "sonora2/common/SonoraError.h"
+
+#include <functional>
+
+namespace tests {
+
+namespace {
+
+// The samples as another program reads them, 16 bit.
+std::string decodeByPeer(const std::filesystem::path& path) {
+    return run("ffmpeg -v error -i '" + path.string() + "' -f s16le -c:a pcm_s16le -");
+}
+
+// The greatest difference of two samples of 16 bits, where both have one.
+int getDistance(const std::string& a, const std::string& b) {
+    int distance = 0;
+    for (size_t i = 0; i + 1 < std::min(a.size(), b.size()); i += 2) {
+        int16_t x, y;
+        std::memcpy(&x, &a[i], 2);
+        std::memcpy(&y, &b[i], 2);
+        distance = std::max(distance, std::abs(x - y));
+    }
+    return distance;
+}
+
+struct SSetting {
+    const char* name;
+    std::function<void(IAudioFormat&)> apply;
+    const char* lame; // the same for the encoder's own program
+};
+
+const std::vector<SSetting> kMp3Settings{
+    {"unset", [](IAudioFormat&) {}, "-V 2"},
+    {"best", [](IAudioFormat& format) { format.setAudioQuality(1.0); }, "-V 0"},
+    {"least", [](IAudioFormat& format) { format.setAudioQuality(0.0); }, "-V 9.999 --resample 44.1"},
+    {"constant", [](IAudioFormat& format) { format.setAudioBitRate(192000, 0, 0); }, "-b 192"},
+    {"constant, told thrice", [](IAudioFormat& format) { format.setAudioBitRate(96000, 96000, 96000); },
+     "-b 96 --resample 44.1"},
+    {"average", [](IAudioFormat& format) { format.setAudioBitRate(160000, 128000, 192000); },
+     "--abr 160 -b 128 -B 192"},
+};
+
+class Lossy : public CPluginTest {
+protected:
+    void write(const std::filesystem::path& path, const std::string& pcm, const SShape& shape,
+               const std::function<void(IAudioFormat&)>& apply) {
+        P<IAudioFormat> format = makeFormat(path, shape);
+        apply(*format);
+        writeAll(format, pcm, shape);
+    }
+    std::string read(const std::filesystem::path& path, const SShape& shape = {}) {
+        P<IAudioSource> source = openSource(path, shape);
+        if (!source) throw std::runtime_error("cannot read " + path.string());
+        std::string pcm = readAll(source);
+        EXPECT_DOUBLE_EQ(static_cast<double>(pcm.size()) / shape.frameBytes() / shape.rate,
+                         source->getDuration());
+        return pcm;
+    }
+};
+
+TEST_F(Lossy, Mp3AndOgg_KeepTheNumberOfFrames) {
+    for (const char* name : {"x.mp3", "x.ogg"}) {
+        for (const SShape& shape : {SShape{}, SShape{8000, 1, 2}, SShape{48000, 2, 3}, SShape{22050, 1, 1}}) {
+            for (int frames : {1, 2, 63, 575, 576, 577, 1151, 1152, 1153, 2304, 4097, 30011}) {
+                SCOPED_TRACE(std::string(name) + ", " + std::to_string(shape.rate) + " Hz, " +
+                             std::to_string(frames) + " frames");
+                writeFile(folder / name, makeMusic(shape, frames), shape);
+                const SShape delivered{shape.rate, shape.channels, 2};
+                EXPECT_EQ(static_cast<size_t>(frames) * delivered.frameBytes(),
+                          read(folder / name, delivered).size());
+            }
+        }
+    }
+}
+
+TEST_F(Lossy, Mp3Settings_AreThoseOfItsOwnProgram) {
+    for (int bytes : {2, 3}) {
+        const SShape shape{44100, 2, bytes};
+        const std::string pcm = makeMusic(shape, 100003);
+        writeFile(folder / "in.wav", pcm, shape);
+        for (const SSetting& setting : kMp3Settings) {
+            SCOPED_TRACE(std::string(setting.name) + ", " + std::to_string(bytes) + " bytes");
+            write(folder / "ours.mp3", pcm, shape, setting.apply);
+            const std::string theirs = (folder / "theirs.mp3").string();
+            run("lame --silent " + std::string(setting.lame) + " '" + (folder / "in.wav").string() + "' '" +
+                theirs + "'");
+            // Only the notes in the first frame may differ, such as the name of the preset.
+            const std::string a = readFile(folder / "ours.mp3"), b = readFile(theirs);
+            ASSERT_EQ(b.size(), a.size());
+            EXPECT_TRUE(a.substr(2000) == b.substr(2000));
+            const std::string decoded = read(folder / "ours.mp3");
+            EXPECT_EQ(decodeByPeer(folder / "ours.mp3").size(), decoded.size());
+            EXPECT_LE(getDistance(decodeByPeer(folder / "ours.mp3"), decoded), 1);
+        }
+    }
+}
+
+struct SMp3File {
+    const char* name;
+    const char* command; // makes x.mp3 from in.wav; plain.mp3 is what lame makes of it
+    bool exact;          // as long as the recording
+};
+
+TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
+    const SShape shape;
+    const std::string pcm = makeMusic(shape, 100003);
+    writeFile(folder / "in.wav", pcm, shape);
+    const std::string cd = "cd '" + folder.path().string() + "' && ";
+    run(cd + "lame --silent in.wav plain.mp3");
+    const SMp3File files[] = {
+        {"without a tag", "lame --silent -t in.wav x.mp3", false},
+        {"another writer", "ffmpeg -v error -y -i in.wav -b:a 160k x.mp3", true},
+        {"no tag, varying", "lame --silent -t -V 4 in.wav x.mp3", false},
+        {"low rate", "lame --silent --resample 22.05 -b 56 in.wav x.mp3", false},
+        {"a large picture in front",
+         "{ printf 'ID3\\003\\000\\000\\000\\100\\000\\000'; head -c 1048576 /dev/zero | tr '\\0' '\\377'; "
+         "cat plain.mp3; } > x.mp3",
+         true},
+        {"a tag behind", "{ cat plain.mp3; printf TAG; head -c 125 /dev/zero; } > x.mp3", true},
+        {"zeros behind", "{ cat plain.mp3; head -c 300000 /dev/zero; } > x.mp3", true},
+        {"zeros between",
+         "{ lame --silent -t in.wav -; head -c 300000 /dev/zero; lame --silent -t in.wav -; } "
+         "> x.mp3",
+         false},
+        {"cut", "head -c 20000 plain.mp3 > x.mp3", false},
+        {"layer II", "ffmpeg -v error -y -i in.wav -c:a mp2 -f mp2 x.mp3", false},
+    };
+    for (const SMp3File& file : files) {
+        SCOPED_TRACE(file.name);
+        run(cd + file.command);
+        const SShape delivered{file.name == std::string("low rate") ? 22050 : 44100, 2, 2};
+        const std::string ours = read(folder / "x.mp3", delivered);
+        const std::string theirs = decodeByPeer(folder / "x.mp3");
+        if (file.exact) {
+            EXPECT_EQ(pcm.size(), ours.size());
+        } else {
+            EXPECT_NEAR(theirs.size(), ours.size(), 2 * 1152 * 4);
+        }
+        // Behind a gap the first frame lacks what it refers back to, and everybody makes up something else.
+        const size_t first = file.name == std::string("zeros between") ? 90000 * 4 : SIZE_MAX;
+        EXPECT_LE(getDistance(ours.substr(0, first), theirs), 2);
+    }
+}
+
+TEST_F(Lossy, ReopenedMp3_IsTheSameUntilTheFileChanges) {
+    const SShape shape;
+    const auto path = folder / "x.mp3";
+    writeFile(path, makeMusic(shape, 400000), shape);
+    P<IAudioSource> source = openSource(path, shape);
+    const std::string all = readAll(source);
+    for (double time : {0.0, 5.0, 1.5}) {
+        source->close();
+        source->open();
+        source->skipToTime(time);
+        EXPECT_TRUE(readAll(source) == all.substr(static_cast<size_t>(time * 44100) * 4)) << time;
+    }
+    source->close();
+    writeFile(path, makeMusic(shape, 5000), shape);
+    source->open();
+    EXPECT_EQ(5000u * 4, readAll(source).size());
+    EXPECT_DOUBLE_EQ(5000 / 44100.0, source->getDuration());
+}
+
+TEST_F(Lossy, EverySpeakerOfOgg_StaysInItsPlace) {
+    for (int channels = 1; channels <= 8; ++channels) {
+        SCOPED_TRACE(channels);
+        const SShape shape{44100, channels, 2};
+        // Each channel is loud in a second of its own.
+        const int second = 8820;
+        std::string pcm(static_cast<size_t>(second) * channels * shape.frameBytes(), '\0');
+        for (int i = 0; i < second * channels; ++i) {
+            const int16_t value = static_cast<int16_t>(12000 * std::sin(i * 0.01));
+            std::memcpy(&pcm[(static_cast<size_t>(i) * channels + i / second) * 2], &value, 2);
+        }
+        const auto path = folder / "x.ogg";
+        write(path, pcm, shape, [](IAudioFormat& format) { format.setAudioQuality(0.8); });
+        const std::string ours = read(path, shape);
+        ASSERT_EQ(pcm.size(), ours.size());
+        EXPECT_LT(getDistance(pcm, ours), 6000);
+        // The peer orders the speakers of a WAV as we do.
+        run("oggdec -Q '" + path.string() + "' -o '" + (folder / "peer.wav").string() + "'");
+        const std::string theirs = read(folder / "peer.wav", shape);
+        ASSERT_EQ(pcm.size(), theirs.size());
+        if (channels <= 2) {
+            EXPECT_LE(getDistance(theirs, ours), 1);
+        }
+    }
+}
+
+TEST_F(Lossy, OggSettings_AreThoseOfItsOwnProgram) {
+    const SShape shape;
+    const std::string pcm = makeMusic(shape, 200003);
+    writeFile(folder / "in.wav", pcm, shape);
+    const SSetting settings[] = {
+        {"unset", [](IAudioFormat&) {}, "-q 3"},
+        {"best", [](IAudioFormat& format) { format.setAudioQuality(1.0); }, "-q 10"},
+        {"least", [](IAudioFormat& format) { format.setAudioQuality(0.0); }, "-q 0"},
+        {"nominal", [](IAudioFormat& format) { format.setAudioBitRate(128000, 0, 0); }, nullptr},
+        {"limits", [](IAudioFormat& format) { format.setAudioBitRate(128000, 96000, 160000); },
+         "--managed -b 128 -m 96 -M 160"},
+    };
+    for (const SSetting& setting : settings) {
+        SCOPED_TRACE(setting.name);
+        // At once: the codec makes up what was before the first block from what it is given with it.
+        P<IAudioFormat> format = makeFormat(folder / "ours.ogg", shape);
+        setting.apply(*format);
+        format->open();
+        format->writeAudioChunk(makeChunk(pcm));
+        format->close();
+        EXPECT_EQ(pcm.size(), decodeByPeer(folder / "ours.ogg").size());
+        const std::string ours = read(folder / "ours.ogg");
+        EXPECT_EQ(pcm.size(), ours.size());
+        if (!setting.lame) continue;
+        const std::string theirs = (folder / "theirs.ogg").string();
+        run("oggenc -Q " + std::string(setting.lame) + " '" + (folder / "in.wav").string() + "' -o '" +
+            theirs + "'");
+        EXPECT_TRUE(read(theirs) == ours);
+    }
+}
+
+TEST_F(Lossy, ChainedOgg_IsOneRun) {
+    const SShape shape;
+    const std::string one = makeMusic(shape, 50003);
+    const SShape mono{44100, 1, 2};
+    writeFile(folder / "a.ogg", one, shape);
+    writeFile(folder / "b.ogg", one.substr(0, 7001 * 4), shape);
+    writeFile(folder / "c.ogg", makeMusic(mono, 3000), mono);
+    const std::string a = readFile(folder / "a.ogg"), b = readFile(folder / "b.ogg");
+    writeFile(folder / "d.ogg", one, shape); // each stream of a chain has a number of its own
+    const auto path = folder.write("x.ogg", a + b + readFile(folder / "d.ogg"));
+    P<IAudioSource> source = openSource(path, shape);
+    ASSERT_TRUE(source);
+    const std::string all = readAll(source);
+    ASSERT_EQ((50003u * 2 + 7001) * 4, all.size());
+    EXPECT_TRUE(all.substr(57004 * 4) == read(folder / "d.ogg"));
+    for (int frame : {49999, 50003, 50010, 57003, 57004, 100000}) {
+        source->skipToTime(frame / 44100.0);
+        EXPECT_TRUE(readAll(source) == all.substr(static_cast<size_t>(frame) * 4)) << frame;
+    }
+    folder.write("y.ogg", a + readFile(folder / "c.ogg"));
+    EXPECT_FALSE(openSource(folder / "y.ogg", shape)) << "a chain of two formats";
+}
+
+} // namespace
+
+} // namespace tests
