@@ -55,9 +55,8 @@ void CLogManager::write(const SLogMessage& message) {
     CMutexLock lock(m_mutex);
     auto call = [&](ILog& log) { log.write(message); };
     if (message.source && !message.source->isEmpty()) {
-        auto found = m_logsBySource.find(message.source);
-        if (found != m_logsBySource.end()) {
-            P<CLogList> logs = found->second;
+        if (const P<CLogList>* found = m_logsBySource.find(*message.source)) {
+            const P<CLogList> logs = *found;
             logs->forEach(call);
         }
     }
@@ -71,23 +70,23 @@ void CLogManager::addLog(const P<ILog>& log, const P<IString>& source) {
         m_logs->add(log);
         return;
     }
-    P<CLogList>& logs = m_logsBySource[source];
-    if (!logs) logs = make<CLogList>();
+    P<CLogList>* known = m_logsBySource.find(*source);
+    const P<CLogList> logs = known ? *known : m_logsBySource.set(source, make<CLogList>());
     logs->add(log);
 }
 
 bool CLogManager::removeLog(const P<ILog>& log, const P<IString>& source) {
     CMutexLock lock(m_mutex);
     if (!source || source->isEmpty()) return m_logs->remove(log);
-    auto found = m_logsBySource.find(source);
-    if (found == m_logsBySource.end() || !found->second->remove(log)) return false;
-    if (found->second->isEmpty()) m_logsBySource.erase(found);
+    const P<CLogList>* found = m_logsBySource.find(*source);
+    if (!found || !(*found)->remove(log)) return false;
+    if ((*found)->isEmpty()) m_logsBySource.remove(*source);
     return true;
 }
 
 size_t CLogManager::getSourceCount() const {
     CMutexLock lock(m_mutex);
-    return m_logsBySource.size();
+    return m_logsBySource.getCount();
 }
 
 P<ILogManager> getLogManager() {

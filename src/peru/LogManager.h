@@ -3,8 +3,9 @@
 
 #include "peru/IMutex.h"
 #include "peru/LogBase.h"
+#include "peru/SimpleHashTable.h"
 
-#include <unordered_map>
+#include <vector>
 
 namespace peru {
 
@@ -30,16 +31,10 @@ public:
 
 private:
     class CLogList;
-    struct SHash {
-        size_t operator()(const P<IString>& text) const { return text->getHash(); }
-    };
-    struct SEqual {
-        bool operator()(const P<IString>& a, const P<IString>& b) const { return a->equals(b); }
-    };
 
     P<IMutex> m_mutex; // guards all below
     P<CLogList> m_logs;
-    std::unordered_map<P<IString>, P<CLogList>, SHash, SEqual> m_logsBySource;
+    TSimpleHashTable<P<IString>, P<CLogList>> m_logsBySource;
     // Areas that the sinks were told of. Who heard of an entry hears of the leaving, also when the level
     // was raised in between, since the depth would never come back.
     std::vector<P<IString>> m_areas;
