@@ -30,7 +30,7 @@ P<IString> CString::edit(SStringPos start, SStringPos end, const SStringView& in
             P<IString> copy = text::convert(getUTF8CharEncoding(), view(), '?');
             // Where UTF-8 would not read again what is here, what is put in gives way.
             if (copy->getLength() != m_length)
-                return edit(start, end, text::convert(m_encoding, inserted, '?')->getView());
+                return edit(start, end, text::convert(getEncoding(), inserted, '?')->getView());
             SStringPos from = start.index >= copy->getLength() ? kStringEnd : copy->getPosition(start.index);
             return copy->replaceRange(from, end.index - start.index, CStringArg(inserted));
         }
@@ -91,7 +91,7 @@ P<IString> CString::replace(const CStringArg& search, const CStringArg& replacem
             return copy->replace(search, replacement, copy->getPosition(start.index),
                                  copy->getPosition(end.index));
         // As in edit(): what is put in gives way.
-        return replace(search, *text::convert(m_encoding, inserted, '?'), start, end);
+        return replace(search, *text::convert(getEncoding(), inserted, '?'), start, end);
     }
     int64_t size = m_byteSize;
     for (auto [from, to] : matches) size += needed - (to - from);
