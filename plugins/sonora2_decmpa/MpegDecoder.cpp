@@ -38,7 +38,8 @@ off_t seekInput(void* input, off_t offset, int whence) {
 SDecodedMedia CMpegDecoder::open() {
     close();
     m_input = openForReading(m_file);
-    std::setvbuf(m_input.get(), nullptr, _IOFBF, kInputBufferBytes);
+    m_buffer.resize(kInputBufferBytes); // left to itself the C library would keep to its small one
+    std::setvbuf(m_input.get(), m_buffer.data(), _IOFBF, m_buffer.size());
     int error = MPG123_OK;
     m_handle.reset(mpg123_new(nullptr, &error));
     if (!m_handle) fail("could not open %s: %s", m_file.getDisplayName(), mpg123_plain_strerror(error));
@@ -66,6 +67,7 @@ SDecodedMedia CMpegDecoder::open() {
 void CMpegDecoder::close() {
     m_handle.reset();
     m_input.reset();
+    m_buffer = {};
 }
 
 SPcmFormat CMpegDecoder::readFormat() {

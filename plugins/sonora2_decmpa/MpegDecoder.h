@@ -50,6 +50,7 @@ private:
     SMediaFile m_file;
     SPcmFormat m_format;
     SScan m_scan;
+    std::vector<char> m_buffer;                       // of the input
     InputFile m_input;                                // the handle reads from it
     std::unique_ptr<mpg123_handle, SDelete> m_handle; // while open
 };
