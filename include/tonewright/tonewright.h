@@ -174,8 +174,8 @@ TONEWRIGHT_API void TONEWRIGHT_SetLanguageID(const char16_t* language);
  * takes exactly 9 bytes; null is ignored. */
 TONEWRIGHT_API void TONEWRIGHT_fillFeatures(void* buffer);
 
-/* Makes the disc library, once; `flag` is handed to it. Needed before drives and discs. When there is none, a
- * C++ exception derived from std::exception leaves this function. */
+/* Makes the disc library, once; `flag` is handed to it. Needed before drives and discs. Without
+ * one it logs a line and does nothing. */
 TONEWRIGHT_API void TONEWRIGHT_InitDiscio(uint8_t flag);
 
 /* Sets the ending of the temporary names under which output files and tags are written until they are
