@@ -13,7 +13,7 @@ install(
     INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
 )
 install(
-    TARGETS peru sonora2 zvr_lang
+    TARGETS peru peru_media sonora2 filetag zvr_lang
     EXPORT tonewright-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
     INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/tonewright
@@ -35,8 +35,8 @@ install(
     DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
     COMPONENT development
 )
-# Hosts and plug-ins written in C++ include "peru/..." and "sonora2/..." from here.
-foreach(library peru sonora2)
+# Hosts and plug-ins written in C++ include "peru/..." and its like from here.
+foreach(library peru sonora2 filetag)
     install(
         DIRECTORY ${CMAKE_SOURCE_DIR}/src/${library}
         DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/tonewright

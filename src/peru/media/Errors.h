@@ -1,0 +1,25 @@
+// The errors of sound devices.
+#pragma once
+
+#include "peru/Exception.h"
+#include "peru/String.h"
+#include "peru/media/Api.h"
+
+namespace peru::media {
+
+class PERU_MEDIA_API CMediaException : public CException {
+    PERU_EXCEPTION(CMediaException)
+    explicit CMediaException(const CStringArg& description);
+};
+
+// The text is the engine's own for its error code.
+class PERU_MEDIA_API CPortaudioException : public CMediaException {
+    PERU_EXCEPTION(CPortaudioException)
+    explicit CPortaudioException(int32_t code);
+    int32_t getCode() const { return m_code; }
+
+private:
+    int32_t m_code;
+};
+
+} // namespace peru::media
