@@ -51,7 +51,16 @@ public:
     CProcess& operator=(const CProcess&) = delete;
 
     pid_t getId() const { return m_id; }
-    void signal(int number) const { ::kill(m_id, number); }
+    // Not for one that was waited for: its id would mean every process there is.
+    void signal(int number) const {
+        if (m_id > 0) ::kill(m_id, number);
+    }
+    bool isRunning() const {
+        siginfo_t state = {};
+        return m_id > 0 &&
+               ::waitid(P_PID, static_cast<id_t>(m_id), &state, WEXITED | WNOHANG | WNOWAIT) == 0 &&
+               state.si_pid == 0;
+    }
     std::string readOut() const { return read(m_out); }
 
     SProcessResult wait() {
