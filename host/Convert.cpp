@@ -57,7 +57,7 @@ private:
     };
 
     void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
-    std::string tellWhyNotReadable(const fs::path& input) const;
+    std::string tellWhyNotReadable(const fs::path& input, const SSampleFormat& wanted) const;
     std::string tellWhyNotWritable(const fs::path& input, const std::u16string& outputURI,
                                    const fs::path& output) const;
     std::string tellReason(const fs::path& input, const fs::path& temporary, const fs::path& output) const;
@@ -100,7 +100,7 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
                                        const fs::path& output) {
     const std::u16string inputURI = toURI(input), outputURI = toURI(temporary);
     const double quality = m_options.quality ? std::max(*m_options.quality, 1e-9) : 0.0; // 0.0 means unset
-    bool isWritable = false;
+    std::optional<SSampleFormat> writable; // the first that the target can hold
     for (const SSampleFormat& samples : listCandidates(readSampleFormat(input))) {
         CHostLog::takeReason();
         CHandle format(m_library.CreateAudioFormatFromURI(outputURI.c_str(), samples.rate, samples.channels,
@@ -113,19 +113,19 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
         // A file that cannot be read at all is not tried in every other shape.
         if (std::string reason = CHostLog::takeReason(); !reason.empty())
             throw std::runtime_error(asReason(std::move(reason), input));
-        isWritable = true;
+        if (!writable) writable = samples;
     }
-    if (isWritable) throw std::runtime_error(tellWhyNotReadable(input));
+    if (writable) throw std::runtime_error(tellWhyNotReadable(input, *writable));
     throw std::runtime_error(tellWhyNotWritable(input, outputURI, output));
 }
 
 // A kind that nobody reads is another matter than a conversion that its reader does not do.
-std::string CConverter::tellWhyNotReadable(const fs::path& input) const {
+std::string CConverter::tellWhyNotReadable(const fs::path& input, const SSampleFormat& wanted) const {
     const SSampleFormat own = readSampleFormat(input);
     const CHandle source(m_library.CreateAudioSourceFromURI(toURI(input).c_str(), own.rate, own.channels,
                                                             own.bytesPerSample, 0));
     if (!source) return CHostLog::takeReadReason(input);
-    return "Cannot be converted from " + describe(own) + " to " + describe(listCandidates(own).front());
+    return "Cannot be converted from " + describe(own) + " to " + describe(wanted);
 }
 
 // An extension that nobody writes is another matter than a sound that it cannot hold.

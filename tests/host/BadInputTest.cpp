@@ -184,6 +184,9 @@ TEST_F(BadOutput, IsToldByNameAndReason) {
         expectMessage(fail({"waveform", "in.wav", "-f", "-o", output}), {part});
     EXPECT_EQ(list(), before);
     EXPECT_EQ(tonewright({"convert", "in.wav", "--to", "flac", "--directory", "missing"}).exitCode, 2);
+    write("five.wav", makeTone(44100, 5, 16, 0.1)); // nothing mixes five channels down to what an MP3 holds
+    expectMessage(fail({"convert", "five.wav", "-o", "out.mp3"}),
+                  {"5 channels and", "to 44100 Hz, 2 channels"});
 }
 
 TEST_F(BadOutput, LosesNothing) {
