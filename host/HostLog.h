@@ -15,7 +15,7 @@ class CHostLog final : public peru::ILogManager {
 public:
     // Enters itself with the library for as long as it lives. What is below `printLevel` is not printed.
     CHostLog(CLibrary& library, int32_t printLevel);
-    ~CHostLog();
+    ~CHostLog() override;
 
     // The last failure that was logged on the calling thread since the last call of this, as a sentence
     // without the library's frame; empty when there was none.

@@ -3,6 +3,7 @@
 #include <array>
 #include <cctype>
 #include <cerrno>
+#include <cmath>
 #include <cstdio>
 #include <cstring>
 #include <stdexcept>
@@ -137,7 +138,7 @@ bool flushOutput() {
 }
 
 std::string formatDuration(double seconds) {
-    const long long tenths = static_cast<long long>(seconds * 10 + 0.5);
+    const long long tenths = std::llround(seconds * 10);
     std::array<char, 48> text;
     if (tenths >= 36000)
         std::snprintf(text.data(), text.size(), "%lld:%02lld:%02lld.%lld", tenths / 36000, tenths / 600 % 60,

@@ -52,12 +52,15 @@ struct SWave {
     size_t steps = 0;
     std::vector<SColumn> columns; // channel after channel
 
+    size_t indexOf(int channel, int column) const {
+        return static_cast<size_t>(channel) * static_cast<size_t>(width) + static_cast<size_t>(column);
+    }
     void add(const float* samples, int32_t count) {
         for (int32_t i = 0; i + channels <= count; i += channels, ++steps) {
             const int column =
                 std::min(static_cast<int>(static_cast<double>(steps) / stepsPerColumn), width - 1);
             for (int channel = 0; channel < channels; ++channel)
-                columns[static_cast<size_t>(channel * width + column)].add(samples[i + channel]);
+                columns[indexOf(channel, column)].add(samples[i + channel]);
         }
     }
 };
@@ -107,7 +110,7 @@ CPicture draw(const SWave& wave, int height) {
         const auto y = [&](double value) { return static_cast<int>(std::lround(middle - value * scale)); };
         for (int x = 0; x < wave.width; ++x) {
             picture.drawColumn(x, y(0), y(0), kAxis);
-            const SColumn& column = wave.columns[static_cast<size_t>(channel * wave.width + x)];
+            const SColumn& column = wave.columns[wave.indexOf(channel, x)];
             if (column.count == 0) continue;
             picture.drawColumn(x, y(column.high), y(column.low), kPeak);
             const double loudness = std::sqrt(column.squares / static_cast<double>(column.count));

@@ -35,7 +35,7 @@ SDecodedMedia CVorbisDecoder::open() {
     if (const int error = ov_open_callbacks(file.get(), &m_stream, nullptr, 0, OV_CALLBACKS_DEFAULT);
         error < 0)
         fail("could not open %s: %s", m_file.getDisplayName(), describe(error));
-    file.release(); // goes with the stream
+    static_cast<void>(file.release()); // goes with the stream
     m_opened = true;
 
     const vorbis_info* info = ov_info(&m_stream, -1);

@@ -160,7 +160,7 @@ SMapping parseMapping(const char* line) {
 template <class Callback> void forEachMapping(Callback callback) {
     const int file = ::open("/proc/self/maps", O_RDONLY | O_CLOEXEC);
     if (file < 0) return;
-    char line[1024];
+    char line[1024] = {};
     size_t length = 0;
     char buffer[4096];
     for (ssize_t got; (got = ::read(file, buffer, sizeof buffer)) > 0;) {

@@ -223,8 +223,10 @@ int32_t countWellFormed(const SStringView& view, int32_t byteSize) {
         for (int32_t i = 0; i < byteSize / 2; ++i)
             count += !SUTF16Rules::isLow(SUnits<uint16_t>{view.data}[i]);
         return count;
-    default:
-        return byteSize / getUnitSize(view.encodingId);
+    case ICharEncoding::kUTF32:
+        return byteSize / 4;
+    default: // Latin-1: text of a code page is never known to be well-formed
+        return byteSize;
     }
 }
 

@@ -62,6 +62,7 @@ P<IProcess> CProcessManager::start(const P<IURI>& executable, const std::vector<
     std::vector<std::string> texts{toPath(executable)};
     for (const P<IString>& argument : arguments) texts.push_back(CString::toStdString(argument));
     std::vector<char*> pointers;
+    pointers.reserve(texts.size() + 1);
     for (std::string& text : texts) pointers.push_back(text.data());
     pointers.push_back(nullptr);
 

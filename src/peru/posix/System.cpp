@@ -162,6 +162,7 @@ std::vector<P<IURI>> CSystem::getSearchFolders(const char* environmentVariable, 
         if (installed && *installed) enter(joinPath(getInstallationPrefix(libraryFolder), installed));
     }
     std::vector<P<IURI>> result;
+    result.reserve(folders.size());
     for (const std::string& folder : folders) result.push_back(toFolderURI(folder));
     return result;
 }
