@@ -2,10 +2,11 @@
 
 #include "peru/Errors.h"
 #include "peru/IStringLocalizer.h"
+#include "peru/URIEscapes.h"
+#include "peru/URIPath.h"
 
 #include <algorithm>
 #include <limits>
-#include <string_view>
 
 namespace peru {
 
@@ -32,168 +33,16 @@ struct CURI::SParts {
     void finish();
 };
 
+using namespace uri;
+
 namespace {
 
-constexpr char kHexDigits[] = "0123456789ABCDEF";
-
-// A set of ASCII characters as a bit map.
-class CCharSet {
-public:
-    constexpr CCharSet() = default;
-    constexpr explicit CCharSet(std::string_view characters) {
-        for (char c : characters) add(static_cast<uint8_t>(c));
-    }
-    constexpr void add(uint8_t c) {
-        if (c < 128) m_bits[c / 64] |= uint64_t{1} << (c % 64);
-    }
-    constexpr bool has(uint8_t c) const { return c < 128 && (m_bits[c / 64] >> (c % 64) & 1); }
-
-private:
-    uint64_t m_bits[2] = {};
-};
-
-constexpr std::string_view kAlwaysKept =
-    "0123456789ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz-_.!~*'()";
 // Those of the sub-delimiters; ":" stays in bracketed hosts only, where it is part of the address.
 constexpr const char* kHostSet = ";,&=+$";
 constexpr const char* kAddressSet = ";,&=+$:";
 
-int hexValue(char c) {
-    if (c >= '0' && c <= '9') return c - '0';
-    if (c >= 'a' && c <= 'f') return c - 'a' + 10;
-    if (c >= 'A' && c <= 'F') return c - 'A' + 10;
-    return -1;
-}
-
-bool isEscapeAt(std::string_view text, size_t at) {
-    return text[at] == '%' && at + 2 < text.size() && hexValue(text[at + 1]) >= 0 &&
-           hexValue(text[at + 2]) >= 0;
-}
-
-void appendEscaped(std::string& out, uint8_t byte) {
-    out += '%';
-    out += kHexDigits[byte >> 4];
-    out += kHexDigits[byte & 15];
-}
-
-enum class EPercent { escape, keepEscapes };
-
-std::string escapeBytes(std::string_view bytes, std::string_view keptCharacters, EPercent percent) {
-    CCharSet kept(kAlwaysKept);
-    for (char c : keptCharacters) kept.add(static_cast<uint8_t>(c));
-    std::string out;
-    out.reserve(bytes.size());
-    for (size_t i = 0; i < bytes.size(); ++i) {
-        const uint8_t byte = static_cast<uint8_t>(bytes[i]);
-        if (kept.has(byte) || (percent == EPercent::keepEscapes && isEscapeAt(bytes, i)))
-            out += bytes[i];
-        else
-            appendEscaped(out, byte);
-    }
-    return out;
-}
-
-// For what is taken as it was written: only bytes that no text line should hold are escaped.
-std::string escapeUnprintable(std::string_view bytes) {
-    std::string out;
-    out.reserve(bytes.size());
-    for (char c : bytes) {
-        const uint8_t byte = static_cast<uint8_t>(c);
-        if (byte < 0x20 || byte >= 0x7F)
-            appendEscaped(out, byte);
-        else
-            out += c;
-    }
-    return out;
-}
-
-std::string unescapeBytes(std::string_view text) {
-    std::string out;
-    out.reserve(text.size());
-    for (size_t i = 0; i < text.size(); ++i) {
-        if (isEscapeAt(text, i)) {
-            out += static_cast<char>(hexValue(text[i + 1]) << 4 | hexValue(text[i + 2]));
-            i += 2;
-        } else {
-            out += text[i];
-        }
-    }
-    return out;
-}
-
 P<IString> toString(std::string_view text) {
     return text.empty() ? CString::empty() : CString::fromUTF8(text);
-}
-
-// A path taken apart: the names on the way, and whether the last one is a directory's.
-struct SPath {
-    std::vector<std::string> segments;
-    bool absolute = false;
-    bool directory = false;
-
-    // The segments of the directory that the path lies in, or that it names.
-    size_t getDirectoryDepth() const {
-        return directory || segments.empty() ? segments.size() : segments.size() - 1;
-    }
-};
-
-// Removes "." and ".."; above the root of an absolute path ".." is dropped, in a relative one it stays.
-void normalize(SPath& path) {
-    std::vector<std::string> kept;
-    for (size_t i = 0; i < path.segments.size(); ++i) {
-        std::string& segment = path.segments[i];
-        const bool last = i + 1 == path.segments.size();
-        if (segment == ".") {
-            if (last) path.directory = true;
-        } else if (segment == "..") {
-            if (!kept.empty() && kept.back() != "..")
-                kept.pop_back();
-            else if (!path.absolute)
-                kept.push_back("..");
-            if (last) path.directory = true;
-        } else {
-            kept.push_back(std::move(segment));
-        }
-    }
-    path.segments = std::move(kept);
-}
-
-SPath splitPath(std::string_view text) {
-    SPath path;
-    path.absolute = text.starts_with('/');
-    if (path.absolute) text.remove_prefix(1);
-    if (text.empty()) {
-        path.directory = true;
-        return path;
-    }
-    path.directory = text.ends_with('/');
-    if (path.directory) text.remove_suffix(1);
-    for (size_t start = 0;;) {
-        const size_t end = text.find('/', start);
-        path.segments.emplace_back(text.substr(start, end - start));
-        if (end == std::string_view::npos) return path;
-        start = end + 1;
-    }
-}
-
-std::string joinPath(const SPath& path) {
-    std::string text;
-    if (path.absolute)
-        text = '/';
-    else if (!path.segments.empty() && path.segments[0].empty())
-        text = "./"; // else the empty first name would turn it into an absolute path
-    for (size_t i = 0; i < path.segments.size(); ++i) {
-        text += path.segments[i];
-        if (i + 1 < path.segments.size() || path.directory) text += '/';
-    }
-    return text;
-}
-
-std::string normalizePath(std::string_view text) {
-    if (text.empty()) return {};
-    SPath path = splitPath(text);
-    normalize(path);
-    return joinPath(path);
 }
 
 // Answers false for a text that is no decimal number of 31 bits.
