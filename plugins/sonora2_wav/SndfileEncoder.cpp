@@ -128,6 +128,11 @@ void CSndfileEncoder::write(const uint8_t* pcm, int frames) {
          peru::CString::fromUTF8(sf_strerror(handle)));
 }
 
+void CSndfileEncoder::update() {
+    sf_command(m_handle.get(), SFC_UPDATE_HEADER_NOW, nullptr, 0);
+    m_file->throwFailure();
+}
+
 void CSndfileEncoder::finish() {
     if (sf_close(m_handle.release()) != 0) {
         m_file->throwFailure();

@@ -16,6 +16,7 @@ public:
     bool accepts(const SPcmFormat& format) const override;
     void open(COutputFile& file, const SEncoderSettings& settings) override;
     void write(const uint8_t* pcm, int frames) override;
+    void update() override;
     void finish() override;
     int64_t estimateBytes(double seconds, const SEncoderSettings& settings) const override; // exact
 

@@ -69,6 +69,13 @@ void CWavEncoder::write(const uint8_t* pcm, int frames) {
     m_dataBytes += static_cast<int64_t>(bytes);
 }
 
+void CWavEncoder::update() {
+    const int64_t end = m_file->tell();
+    m_file->seek(0);
+    writeHeader();
+    m_file->seek(end);
+}
+
 void CWavEncoder::finish() {
     if (m_dataBytes % 2 != 0) m_file->write("", 1); // chunks start at even places
     m_file->seek(0);

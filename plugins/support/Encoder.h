@@ -27,6 +27,9 @@ public:
     // Throws what is wrong with the settings; the target file has not been touched when it does.
     virtual void open(COutputFile& file, const SEncoderSettings& settings) = 0;
     virtual void write(const uint8_t* pcm, int frames) = 0;
+    // Brings the sizes in the file's headers up to date in the middle of a job, where it has some that a
+    // reader needs.
+    virtual void update() {}
     // Completes the file, with the sizes in its headers. Called once, also after a cancelled job.
     virtual void finish() = 0;
     // Bytes of the file for that many seconds; asked in any state.

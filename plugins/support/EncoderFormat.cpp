@@ -6,6 +6,12 @@
 
 namespace sonora2::plugins {
 
+namespace {
+
+constexpr auto kUpdate = std::chrono::milliseconds(500);
+
+} // namespace
+
 CEncoderFormat::CEncoderFormat(const P<peru::IString>& pluginName, const SMediaFile& file,
                                EncoderFactory makeEncoder, const SPcmFormat& format)
     : m_pluginName(pluginName), m_file(file), m_makeEncoder(makeEncoder), m_estimator(makeEncoder(file)) {
@@ -34,6 +40,7 @@ void CEncoderFormat::open() {
     }
     m_output = std::move(output);
     m_encoder = std::move(encoder);
+    m_updated = std::chrono::steady_clock::now();
     m_failed = false;
 }
 
@@ -83,6 +90,11 @@ void CEncoderFormat::writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) {
     try {
         m_encoder->write(pAudioChunk->getData(), static_cast<int>(size / frameBytes));
         m_output->throwFailure();
+        if (const auto now = std::chrono::steady_clock::now(); now - m_updated >= kUpdate) {
+            m_encoder->update();
+            m_output->flush();
+            m_updated = now;
+        }
     } catch (...) {
         m_failed = true;
         throw;

@@ -5,13 +5,16 @@
 #include "sonora2/common/ISonoraContext.h"
 #include "support/Encoder.h"
 
+#include <chrono>
 #include <memory>
 
 namespace sonora2::plugins {
 
 // Opening makes or replaces the file once the encoder has accepted its settings; closing completes it, also
-// in the middle of a job. A failure to write is thrown by the write that meets it or at last by close().
-// Quality and bit rates are taken while closed. Each opening starts the file anew.
+// in the middle of a job. What is slowly written, as a recording is, lies complete on the disk twice a
+// second: a process that is killed leaves a file that plays. A failure to write is thrown by the write that
+// meets it or at last by close(). Quality and bit rates are taken while closed. Each opening starts the file
+// anew.
 class CEncoderFormat : public peru::CObject, public common::IAudioFormat {
 public:
     // Closed. `makeEncoder` gives a fresh encoder for each opening.
@@ -42,9 +45,10 @@ private:
     EncoderFactory m_makeEncoder;
     std::unique_ptr<IEncoder> m_estimator; // never opened
     SEncoderSettings m_settings;
-    std::unique_ptr<COutputFile> m_output; // while open
-    std::unique_ptr<IEncoder> m_encoder;   // writes to the output
-    bool m_failed = false;                 // a write has thrown: nothing is to be finished
+    std::unique_ptr<COutputFile> m_output;           // while open
+    std::unique_ptr<IEncoder> m_encoder;             // writes to the output
+    std::chrono::steady_clock::time_point m_updated; // when the file was last complete on the disk
+    bool m_failed = false;                           // a write has thrown: nothing is to be finished
 };
 
 } // namespace sonora2::plugins

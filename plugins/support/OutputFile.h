@@ -23,6 +23,7 @@ public:
     int64_t tell() const { return m_position + static_cast<int64_t>(m_fill); }
     int64_t getSize() const; // highest byte written so far
     void commit();           // empties what was there before; an encoder has taken its settings
+    void flush();            // nothing stays in the buffer
     void close();            // flushes; throws also what an earlier operation failed with
 
     // For callbacks of C libraries, which no exception may cross: false on failure, which is kept.

@@ -46,6 +46,10 @@ void COutputFile::commit() {
     if (truncateOnce() != 0) throwFailure();
 }
 
+void COutputFile::flush() {
+    if (flushBuffer() != 0) throwFailure();
+}
+
 void COutputFile::close() {
     if (m_handle < 0) return throwFailure();
     flushBuffer();
