@@ -7,7 +7,7 @@ namespace peru {
 
 // Made by ISystem::startReplacement. The new content has no name until commit; when the object goes without
 // one, or the process dies, nothing of it is left and the old file stands as it was. One thread at a time.
-// Everything throws CFileError.
+// Everything throws CFileError; only reading behind the end of the stream throws what it throws elsewhere.
 class PERU_API IFileReplacement : public virtual IBase {
 public:
     // Where the new content is written; empty at first. Valid until commit.

@@ -1,6 +1,7 @@
 // What the platform does in one call.
 #pragma once
 
+#include "peru/IFileReplacement.h"
 #include "peru/IURI.h"
 
 #include <vector>
@@ -31,6 +32,9 @@ public:
     // Makes the bytes the whole content of a file, which need not exist. They are written beside it and take
     // its name once they are on the medium; mode and links stay. Throws CFileError with the file as it was.
     virtual void replaceFile(const P<IURI>& file, const void* data, int64_t size) = 0;
+    // The same for content that is written bit by bit or partly taken from the old file. Throws CFileError, a
+    // CFileAccessDeniedError for a file that the user may not write.
+    virtual P<IFileReplacement> startReplacement(const P<IURI>& file) = 0;
 };
 
 PERU_API P<ISystem> getSystem();

@@ -107,6 +107,10 @@ std::unique_ptr<CDiskFile> CDiskFile::open(const P<IURI>& uri, EAccess access, E
     return file;
 }
 
+std::unique_ptr<CDiskFile> CDiskFile::adopt(const P<IURI>& uri, CFileHandle handle) {
+    return std::unique_ptr<CDiskFile>(new CDiskFile(uri, std::move(handle), true));
+}
+
 void CDiskFile::checkOpen() const {
     if (!m_handle.isOpen()) throw CStreamClosedError(m_uri);
 }

@@ -19,6 +19,8 @@ public:
     static std::unique_ptr<CDiskFile> tryOpen(const P<IURI>& uri, EAccess access, EOpenMode mode);
     // Throws CFileNotFoundError in place of the empty result.
     static std::unique_ptr<CDiskFile> open(const P<IURI>& uri, EAccess access, EOpenMode mode);
+    // Over a regular file that is open for all that is done with it, and stands at its start.
+    static std::unique_ptr<CDiskFile> adopt(const P<IURI>& uri, CFileHandle handle);
     // Writes what is buffered; an error is lost: who needs to know calls close().
     ~CDiskFile();
 

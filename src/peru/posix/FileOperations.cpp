@@ -1,5 +1,9 @@
 #include "peru/posix/FileOperations.h"
 
+#include "peru/RandomNumberGenerator.h"
+#include "peru/posix/PlatformFile.h"
+
+#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <fcntl.h>
@@ -10,6 +14,7 @@
 namespace peru::posix {
 namespace {
 
+constexpr int kUniqueAttempts = 100;
 constexpr size_t kBufferSize = 256 * 1024;
 // What one call of the kernel may copy: large, yet short enough for the process to be stopped in between.
 constexpr size_t kRangeSize = 64 * 1024 * 1024;
@@ -59,29 +64,39 @@ int fillCopy(int source, int destination, const struct stat& status) {
     return ::futimens(destination, times) == 0 ? 0 : errno;
 }
 
-// What a file that is about to be replaced hands on to its successor.
-int takeOver(int file, const std::string& target) {
-    struct stat status;
-    if (::stat(target.c_str(), &status) != 0) return errno == ENOENT ? 0 : errno;
-    if (S_ISDIR(status.st_mode)) return EISDIR;
-    if (!S_ISREG(status.st_mode)) return EINVAL;
-    if (::access(target.c_str(), W_OK) != 0) return errno;
-    return setMode(file, status);
+std::string makeUniqueWord() {
+    static const char kDigits[] = "0123456789abcdefghijklmnopqrstuvwxyz";
+    const P<CMersenneTwisterRandomNumberGenerator> random = getRandomNumberGenerator();
+    std::string word;
+    for (int i = 0; i < 12; ++i) word += kDigits[random->getNextBelow(36)];
+    return word;
 }
 
-int fillReplacement(CFileHandle& file, const std::string& beside, const std::string& target, const void* data,
-                    size_t size) {
-    if (int error = takeOver(file.get(), target)) return error;
-    if (int error = writeAll(file.get(), static_cast<const char*>(data), size)) return error;
-    if (::fsync(file.get()) != 0 || !file.close()) return errno;
-    return ::rename(beside.c_str(), target.c_str()) == 0 ? 0 : errno;
+int writeAllAt(int file, const char* bytes, size_t size, off_t offset) {
+    while (size > 0) {
+        const ssize_t written = ::pwrite(file, bytes, size, offset);
+        if (written < 0 && errno == EINTR) continue;
+        if (written < 0) return errno;
+        bytes += written;
+        offset += written;
+        size -= static_cast<size_t>(written);
+    }
+    return 0;
 }
 
-// After a power failure the folder may else still tell the old name. No more can be done where it refuses.
-void syncFolderOf(const std::string& file) {
-    const CFileHandle folder(
-        ::open(file.substr(0, file.rfind('/') + 1).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (folder.isOpen()) ::fsync(folder.get());
+int copyRangeThroughBuffer(int source, off_t from, int destination, off_t to, int64_t size, int64_t& copied) {
+    auto buffer = std::make_unique_for_overwrite<char[]>(kBufferSize);
+    while (copied < size) {
+        const auto wanted = static_cast<size_t>(std::min<int64_t>(size - copied, kBufferSize));
+        const ssize_t count = ::pread(source, buffer.get(), wanted, from + copied);
+        if (count < 0 && errno == EINTR) continue;
+        if (count < 0) return errno;
+        if (count == 0) return 0;
+        if (int error = writeAllAt(destination, buffer.get(), static_cast<size_t>(count), to + copied))
+            return error;
+        copied += count;
+    }
+    return 0;
 }
 
 bool isThere(const std::string& path) {
@@ -117,14 +132,33 @@ int renameWithoutReplacing(const std::string& source, const std::string& destina
     return ::rename(source.c_str(), destination.c_str()) == 0 ? 0 : errno;
 }
 
-int fillAndReplace(CFileHandle file, const std::string& beside, const std::string& target, const void* data,
-                   size_t size) {
-    const int error = fillReplacement(file, beside, target, data, size);
-    if (error == 0)
-        syncFolderOf(target);
-    else
-        ::unlink(beside.c_str());
-    return error;
+int copyRange(int source, int64_t sourceOffset, int destination, int64_t offset, int64_t size,
+              int64_t& copied) {
+    copied = 0;
+    while (copied < size) {
+        off_t from = sourceOffset + copied;
+        off_t to = offset + copied;
+        const auto wanted = static_cast<size_t>(std::min<int64_t>(size - copied, kRangeSize));
+        const ssize_t count = ::copy_file_range(source, &from, destination, &to, wanted, 0);
+        if (count < 0 && errno == EINTR) continue;
+        if (count <= 0) break;
+        copied += count;
+    }
+    return copyRangeThroughBuffer(source, sourceOffset, destination, offset, size, copied);
+}
+
+std::string createUnique(const std::string& folder, const std::string& prefix, const std::string& suffix,
+                         int& error, const std::function<int(const std::string&)>& create) {
+    error = EINVAL;
+    // A separator would lead out of the folder.
+    if ((prefix + suffix).find('/') != std::string::npos) return "";
+    error = EEXIST;
+    for (int i = 0; i < kUniqueAttempts && error == EEXIST; ++i) {
+        std::string path = folder + (folder.ends_with('/') ? "" : "/") + prefix + makeUniqueWord() + suffix;
+        error = create(path);
+        if (error == 0) return path;
+    }
+    return "";
 }
 
 } // namespace peru::posix

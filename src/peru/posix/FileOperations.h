@@ -1,9 +1,8 @@
 // The calls behind copying and moving. Each returns 0 or an errno value and leaves nothing half done.
 #pragma once
 
-#include "peru/posix/PlatformFile.h"
-
-#include <cstddef>
+#include <cstdint>
+#include <functional>
 #include <string>
 
 namespace peru::posix {
@@ -12,9 +11,13 @@ namespace peru::posix {
 int copyRegularFile(const std::string& source, const std::string& destination);
 // EEXIST when anything stands at the destination, EXDEV between volumes.
 int renameWithoutReplacing(const std::string& source, const std::string& destination);
-// Writes the bytes to the new file `beside`, which is open as `file`, and gives it the name of `target`. What
-// stood there hands on its mode, and stays when anything fails; `beside` is gone then.
-int fillAndReplace(CFileHandle file, const std::string& beside, const std::string& target, const void* data,
-                   size_t size);
+// Copies `size` bytes from one offset to another, inside the system where that is possible. `copied` is less
+// where the source ends.
+int copyRange(int source, int64_t sourceOffset, int destination, int64_t offset, int64_t size,
+              int64_t& copied);
+// Calls `create` with one unused name in the folder after the other until it does not answer EEXIST. Returns
+// the path, or an empty one with the errno value.
+std::string createUnique(const std::string& folder, const std::string& prefix, const std::string& suffix,
+                         int& error, const std::function<int(const std::string&)>& create);
 
 } // namespace peru::posix

@@ -4,8 +4,8 @@
 #include "peru/GlobalObjFactory.h"
 #include "peru/IPathes.h"
 #include "peru/IStringLocalizer.h"
-#include "peru/RandomNumberGenerator.h"
 #include "peru/posix/FileOperations.h"
+#include "peru/posix/FileReplacement.h"
 #include "peru/posix/FileVersion.h"
 #include "peru/posix/PlatformFile.h"
 
@@ -15,7 +15,6 @@
 #include <cstdlib>
 #include <dlfcn.h>
 #include <fcntl.h>
-#include <functional>
 #include <link.h>
 #include <memory>
 #include <pwd.h>
@@ -25,8 +24,6 @@
 
 namespace peru::posix {
 namespace {
-
-constexpr int kUniqueAttempts = 100;
 
 struct SLibraryCloser {
     void operator()(void* library) const { ::dlclose(library); }
@@ -84,30 +81,9 @@ std::string getInstallationPrefix(const std::string& libraryFolder) {
     return getFolderOf(libraryFolder);
 }
 
-std::string makeUniqueWord() {
-    static const char kDigits[] = "0123456789abcdefghijklmnopqrstuvwxyz";
-    const P<CMersenneTwisterRandomNumberGenerator> random = getRandomNumberGenerator();
-    std::string word;
-    for (int i = 0; i < 12; ++i) word += kDigits[random->getNextBelow(36)];
-    return word;
-}
-
-// Calls `create` with one name after the other until it does not answer EEXIST. Returns the path, or an
-// empty one with the errno value.
-std::string createUnique(const P<IURI>& folder, const CStringArg& prefix, const std::string& suffix,
-                         int& error, const std::function<int(const std::string&)>& create) {
-    std::string start = CString::toStdString(prefix);
-    error = EINVAL;
-    // A separator would lead out of the folder.
-    if ((start + suffix).find('/') != std::string::npos) return "";
-    std::string base = toPath(folder ? folder : getSystem()->getTemporaryFolder());
-    error = EEXIST;
-    for (int i = 0; i < kUniqueAttempts && error == EEXIST; ++i) {
-        std::string path = joinPath(base, start + makeUniqueWord() + suffix);
-        error = create(path);
-        if (error == 0) return path;
-    }
-    return "";
+// An empty folder is the temporary one.
+std::string getFolderPath(const P<IURI>& folder) {
+    return toPath(folder ? folder : getSystem()->getTemporaryFolder());
 }
 
 } // namespace
@@ -172,10 +148,11 @@ P<IURI> CSystem::createUniqueFile(const P<IURI>& folder, const CStringArg& prefi
     std::string suffix = CString::toStdString(extension);
     if (!suffix.empty() && !suffix.starts_with('.')) suffix.insert(0, ".");
     int error = 0;
-    std::string path = createUnique(folder, prefix, suffix, error, [](const std::string& file) {
-        CFileHandle made(::open(file.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
-        return made.isOpen() ? 0 : errno;
-    });
+    std::string path = createUnique(
+        getFolderPath(folder), CString::toStdString(prefix), suffix, error, [](const std::string& file) {
+            CFileHandle made(::open(file.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+            return made.isOpen() ? 0 : errno;
+        });
     if (!path.empty()) return toURI(path);
     throw CFileError(localize("peru.CSystem.CreateUniqueFileFailed", "Error creating unique file name."),
                      folder);
@@ -183,9 +160,9 @@ P<IURI> CSystem::createUniqueFile(const P<IURI>& folder, const CStringArg& prefi
 
 P<IURI> CSystem::createUniqueFolder(const P<IURI>& folder, const CStringArg& prefix) {
     int error = 0;
-    std::string path = createUnique(folder, prefix, "", error, [](const std::string& name) {
-        return ::mkdir(name.c_str(), 0700) == 0 ? 0 : errno;
-    });
+    std::string path =
+        createUnique(getFolderPath(folder), CString::toStdString(prefix), "", error,
+                     [](const std::string& name) { return ::mkdir(name.c_str(), 0700) == 0 ? 0 : errno; });
     if (!path.empty()) return toFolderURI(path);
     throw CFileError(localize("peru.CSystem.CreateUniqueFolderFailed", "Error creating unique folder name."),
                      folder);
@@ -234,22 +211,13 @@ P<IString> CSystem::getLibraryVersion(const CStringArg& libraryName) {
 }
 
 void CSystem::replaceFile(const P<IURI>& file, const void* data, int64_t size) {
-    const std::string path = toPath(file);
-    std::string target = getRealPath(path);
-    if (target.empty()) target = path;
-    CFileHandle handle;
-    int error = 0;
-    const std::string beside = createUnique(
-        toFolderURI(getFolderOf(target)), ".new-", "", error, [&handle](const std::string& name) {
-            handle = CFileHandle(::open(name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
-            return handle.isOpen() ? 0 : errno;
-        });
-    if (!beside.empty())
-        error = fillAndReplace(std::move(handle), beside, target, data, static_cast<size_t>(size));
-    if (error == 0) return;
-    throw CFileError(localize("peru.CSystem.ReplaceFileFailed", "Error writing file '%FILE%' (%MSG%).",
-                              {{"%FILE%", getShownName(file)}, {"%MSG%", getSystemText(error)}}),
-                     file);
+    const P<IFileReplacement> replacement = startReplacement(file);
+    replacement->getStream()->write(data, size);
+    replacement->commit();
+}
+
+P<IFileReplacement> CSystem::startReplacement(const P<IURI>& file) {
+    return make<CFileReplacement>(file);
 }
 
 } // namespace peru::posix

@@ -30,6 +30,7 @@ public:
     P<IString> getLibraryVersion(const CStringArg& libraryName) override;
     // Refuses what is no regular file, and one that the user may not write.
     void replaceFile(const P<IURI>& file, const void* data, int64_t size) override;
+    P<IFileReplacement> startReplacement(const P<IURI>& file) override;
 };
 
 } // namespace peru::posix
