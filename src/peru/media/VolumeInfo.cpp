@@ -1,0 +1,7 @@
+#include "peru/media/VolumeInfo.h"
+
+namespace peru::media {
+
+CVolumeInfo::~CVolumeInfo() = default;
+
+} // namespace peru::media

@@ -1,0 +1,176 @@
+#include "peru/media/posix/AudioDevice.h"
+
+#include "peru/IStringLocalizer.h"
+#include "peru/StringFormat.h"
+#include "peru/media/DeviceNames.h"
+#include "peru/media/Errors.h"
+#include "peru/media/FormatSearch.h"
+
+#include <cmath>
+#include <pthread.h>
+
+namespace peru::media::posix {
+
+namespace {
+
+P<IString> findHostApi(PaHostApiIndex index) {
+    const PaHostApiInfo* info = Pa_GetHostApiInfo(index);
+    if (!info)
+        throw CMediaException(
+            localize("peru.media.CAudioDevice.NoMediaApi", "Could not get media api from host hostapi"));
+    return getHostApiName(info->type);
+}
+
+// 0 where the engine has none of that width, or this library does not deal in it.
+PaSampleFormat findSampleFormat(int32_t bitsPerSample) {
+    switch (bitsPerSample) {
+    case 8:
+        return paInt8;
+    case 16:
+        return paInt16;
+    case 24:
+        return paInt24;
+    default:
+        return 0;
+    }
+}
+
+} // namespace
+
+int32_t check(int32_t result) {
+    if (result < 0) throw CPortaudioException(result);
+    return result;
+}
+
+CCallbackScope::CCallbackScope() {
+    pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &m_oldState);
+}
+
+CCallbackScope::~CCallbackScope() {
+    pthread_setcancelstate(m_oldState, nullptr);
+}
+
+CAudioDevice::CAudioDevice(const P<IPosixSystem>& system, int32_t index, EDirection direction)
+    : m_streamMutex(getMutexFactory()->createMutex()), m_system(system), m_index(index),
+      m_direction(direction) {
+    const PaDeviceInfo* info = Pa_GetDeviceInfo(index);
+    if (!info)
+        throw CMediaException(localize("peru.media.CAudioDevice.NoHostInfo", "Could not retrieve host info"));
+    const bool isOut = direction == EDirection::out;
+    m_name = CString::fromUTF8(info->name);
+    m_hostApi = findHostApi(info->hostApi);
+    m_isDefault = index == (isOut ? Pa_GetDefaultOutputDevice() : Pa_GetDefaultInputDevice());
+    m_maxChannelCount = isOut ? info->maxOutputChannels : info->maxInputChannels;
+    m_defaultSampleRate = static_cast<int32_t>(info->defaultSampleRate);
+    m_latency = isOut ? info->defaultLowOutputLatency : info->defaultLowInputLatency;
+}
+
+CAudioDevice::~CAudioDevice() = default;
+
+P<IString> CAudioDevice::getId() const {
+    return format("%d", m_index);
+}
+
+P<IString> CAudioDevice::getListName() const {
+    return getDeviceListName(m_index, m_name, m_hostApi, m_isDefault);
+}
+
+void CAudioDevice::setGain(double gain) {
+    if (!std::isfinite(gain))
+        throw CMediaException(
+            localize("peru.media.CAudioDevice.BadGain", "The gain of a sound device must be a number"));
+    m_gain = gain;
+}
+
+PaStreamParameters CAudioDevice::getParameters(const CAudioFormat& format) const {
+    PaStreamParameters parameters{};
+    parameters.device = m_index;
+    parameters.channelCount = format.getChannelCount();
+    parameters.sampleFormat = findSampleFormat(format.getBitsPerSample());
+    parameters.suggestedLatency = m_latency;
+    return parameters;
+}
+
+bool CAudioDevice::isTaken(const CAudioFormat& format, int32_t& failure) const {
+    const PaStreamParameters parameters = getParameters(format);
+    const bool isOut = m_direction == EDirection::out;
+    CMutexLock lock(m_system->getEngineMutex());
+    const PaError result = Pa_IsFormatSupported(isOut ? nullptr : &parameters, isOut ? &parameters : nullptr,
+                                                format.getSampleRate());
+    const bool isAboutFormat = result == paInvalidSampleRate || result == paInvalidChannelCount ||
+                               result == paSampleFormatNotSupported;
+    if (result < 0 && !isAboutFormat) failure = result;
+    return result == paFormatIsSupported;
+}
+
+P<CAudioFormat> CAudioDevice::getFormat(int32_t sampleRate, int32_t bytesPerSample, int32_t channelCount) {
+    const P<CAudioFormat> wanted = make<CAudioFormat>(sampleRate, channelCount, bytesPerSample * 8);
+    if (!findSampleFormat(wanted->getBitsPerSample())) return wanted;
+    int32_t failure = paNoError;
+    P<CAudioFormat> nearest =
+        findNearestFormat(wanted, m_maxChannelCount, m_defaultSampleRate,
+                          [&](const CAudioFormat& candidate) { return isTaken(candidate, failure); });
+    // Nothing fits because the device cannot be reached at all.
+    if (!nearest) check(failure);
+    return nearest;
+}
+
+bool CAudioDevice::isOpened() const {
+    CMutexLock lock(m_streamMutex);
+    return m_stream != nullptr;
+}
+
+int32_t CAudioDevice::getStatus() const {
+    CMutexLock lock(m_streamMutex);
+    return m_state == kDeviceRunning && m_stream && Pa_IsStreamActive(m_stream) == 1 ? kDeviceRunning
+                                                                                     : kDeviceIdle;
+}
+
+void CAudioDevice::openStream(const P<CAudioFormat>& audioFormat, PaStreamCallback* callback, void* self) {
+    if (!audioFormat)
+        throw CMediaException(
+            localize("peru.media.CAudioDevice.NoFormat", "The sound device was given no format"));
+    const PaStreamParameters parameters = getParameters(*audioFormat);
+    if (parameters.sampleFormat == 0)
+        throw CMediaException(
+            format(localize("peru.media.CAudioDevice.BitsNotSupported", "%d Bits are not supported"),
+                   audioFormat->getBitsPerSample()));
+    m_format = audioFormat;
+    m_bytesPerFrame = audioFormat->getBytesPerFrame();
+    m_started = false;
+    const bool isOut = m_direction == EDirection::out;
+    CMutexLock lock(m_system->getEngineMutex());
+    PaStream* stream = nullptr;
+    // The samples go through as they are.
+    check(Pa_OpenStream(&stream, isOut ? nullptr : &parameters, isOut ? &parameters : nullptr,
+                        audioFormat->getSampleRate(), paFramesPerBufferUnspecified, paClipOff | paDitherOff,
+                        callback, self));
+    m_stream = stream;
+}
+
+void CAudioDevice::startStream() {
+    // The first callback comes before the call returns.
+    m_state = kDeviceRunning;
+    if (const PaError result = Pa_StartStream(m_stream); result < 0) {
+        m_state = kDeviceIdle;
+        check(result);
+    }
+    m_started = true;
+}
+
+void CAudioDevice::closeStream(PaStream* stream) {
+    CMutexLock lock(m_system->getEngineMutex());
+    check(Pa_CloseStream(stream));
+}
+
+bool CAudioDevice::hasGone() const {
+    return m_started && Pa_IsStreamActive(m_stream) != 1;
+}
+
+void CAudioDevice::requireOpened() const {
+    if (!m_stream)
+        throw CMediaException(
+            localize("peru.media.CAudioDevice.NotOpened", "The sound device is not opened"));
+}
+
+} // namespace peru::media::posix

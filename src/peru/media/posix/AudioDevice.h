@@ -1,0 +1,86 @@
+// What input and output devices of the engine have in common.
+#pragma once
+
+#include "peru/IString.h"
+#include "peru/media/posix/IPosixAudioDevice.h"
+#include "peru/media/posix/IPosixSystem.h"
+
+#include <portaudio.h>
+
+#include <atomic>
+
+namespace peru::media::posix {
+
+// Gives the result back; throws CPortaudioException when it is an error.
+int32_t check(int32_t result);
+
+// The engine ends a stream by cancelling its thread wherever that waits. A callback must not be torn apart
+// under a lock, so it runs in such a block: the thread ends when the callback has returned.
+class CCallbackScope {
+public:
+    CCallbackScope();
+    ~CCallbackScope();
+    CCallbackScope(const CCallbackScope&) = delete;
+    CCallbackScope& operator=(const CCallbackScope&) = delete;
+
+private:
+    int m_oldState = 0;
+};
+
+class CAudioDevice : public CObject, public virtual IPosixAudioDevice {
+public:
+    ~CAudioDevice() override;
+
+    P<IString> getId() const override;
+    P<IString> getName() const override { return m_name; }
+    P<IString> getListName() const override;
+    P<IString> getHostApi() const override { return m_hostApi; }
+    bool isDefault() const override { return m_isDefault; }
+    int32_t getMaxChannelCount() const override { return m_maxChannelCount; }
+    P<CAudioFormat> getFormat(int32_t sampleRate, int32_t bytesPerSample, int32_t channelCount) override;
+    bool isOpened() const override;
+    int32_t getStatus() const override;
+    double getGain() const override { return m_gain; }
+    void setGain(double gain) override;
+    int32_t getDeviceIndex() const override { return m_index; }
+
+protected:
+    enum class EDirection { in, out };
+
+    CAudioDevice(const P<IPosixSystem>& system, int32_t index, EDirection direction);
+
+    // All four with the stream's mutex held.
+    void openStream(const P<CAudioFormat>& format, PaStreamCallback* callback, void* self);
+    void startStream();         // and sets the state; neither when that fails
+    bool hasGone() const;       // it was started, and the system has ended it since
+    void requireOpened() const; // throws
+
+    // Does not wait for the stream's mutex.
+    void closeStream(PaStream* stream);
+
+    const P<IMutex> m_streamMutex; // guards the stream's handle and whether it was started
+    PaStream* m_stream = nullptr;
+    bool m_started = false;
+    std::atomic<int32_t> m_state{kDeviceIdle};
+    std::atomic<double> m_gain{1.0};
+
+    // Written while no callback runs.
+    P<CAudioFormat> m_format; // of the stream
+    int32_t m_bytesPerFrame = 0;
+
+private:
+    PaStreamParameters getParameters(const CAudioFormat& format) const;
+    bool isTaken(const CAudioFormat& format, int32_t& failure) const;
+
+    const P<IPosixSystem> m_system;
+    const int32_t m_index;
+    const EDirection m_direction;
+    P<IString> m_name;
+    P<IString> m_hostApi;
+    bool m_isDefault = false;
+    int32_t m_maxChannelCount = 0;
+    int32_t m_defaultSampleRate = 0;
+    double m_latency = 0.0; // the least that the driver suggests
+};
+
+} // namespace peru::media::posix
