@@ -1,0 +1,57 @@
+#include "filetag/rifftag/Chunks.h"
+
+#include <algorithm>
+#include <bit>
+
+namespace filetag::rifftag {
+
+// Headers are read and written as they lie in memory.
+static_assert(std::endian::native == std::endian::little);
+
+CChunkReader::CChunkReader(const P<peru::ISeekableInStream>& stream)
+    : m_stream(stream), m_fileSize(stream->getSize()) {
+    struct {
+        SChunkHeader riff;
+        FourCC type;
+    } header;
+    static_assert(sizeof header == kHeaderSize);
+    m_wave = readAt(0, &header, sizeof header) && header.riff.id == FourCC{'R', 'I', 'F', 'F'} &&
+             header.type == FourCC{'W', 'A', 'V', 'E'};
+}
+
+bool CChunkReader::next(SChunk& chunk) {
+    SChunkHeader header;
+    if (!readAt(m_offset, &header, sizeof header)) return false;
+    const int64_t body = m_offset + static_cast<int64_t>(sizeof header);
+    const int64_t left = m_fileSize - body;
+    int64_t size = std::min<int64_t>(header.size, left);
+    if (size == 0 && left > 0 && header.id == FourCC{'d', 'a', 't', 'a'} && !isIdAt(body)) size = left;
+
+    FourCC type{};
+    const bool info = header.id == FourCC{'L', 'I', 'S', 'T'} && size > 4 &&
+                      readAt(body, &type, sizeof type) && type == FourCC{'I', 'N', 'F', 'O'};
+    const bool padded = size % 2 != 0 && isPadAt(body + size);
+    chunk = {m_offset, header.id, header.size, size, info};
+    m_offset = body + size + (padded ? 1 : 0);
+    return true;
+}
+
+bool CChunkReader::isIdAt(int64_t offset) {
+    FourCC id;
+    return readAt(offset, &id, sizeof id) &&
+           std::all_of(id.begin(), id.end(), [](char c) { return c >= 0x20 && c < 0x7F; });
+}
+
+bool CChunkReader::isPadAt(int64_t offset) {
+    uint8_t byte = 0;
+    if (!readAt(offset, &byte, 1)) return false;
+    return byte == 0 || offset + 1 == m_fileSize || (!isIdAt(offset) && isIdAt(offset + 1));
+}
+
+bool CChunkReader::readAt(int64_t offset, void* bytes, int64_t size) {
+    if (size > m_fileSize - offset) return false;
+    m_stream->seek(offset);
+    return m_stream->readSome(bytes, size) == size;
+}
+
+} // namespace filetag::rifftag

@@ -1,0 +1,223 @@
+#include "filetag/rifftag/RIFFTag.h"
+
+#include "filetag/Text.h"
+#include "peru/Errors.h"
+#include "peru/IFileReplacement.h"
+#include "peru/IStreamManager.h"
+#include "peru/IStringLocalizer.h"
+#include "peru/ISystem.h"
+
+#include <utility>
+
+namespace filetag::rifftag {
+
+namespace {
+
+constexpr FourCC kTitle{'I', 'N', 'A', 'M'};
+constexpr FourCC kArtist{'I', 'A', 'R', 'T'};
+constexpr FourCC kTrackNumber{'T', 'R', 'C', 'K'};
+constexpr FourCC kYear{'I', 'C', 'R', 'D'};
+constexpr FourCC kGenre{'I', 'G', 'N', 'R'};
+constexpr FourCC kComment{'I', 'C', 'M', 'T'};
+
+// Texts are held in memory whole. No program writes a list that comes near this.
+constexpr int64_t kMaxList = 64 * 1024 * 1024;
+constexpr int64_t kChunkHeader = sizeof(SChunkHeader);
+constexpr int64_t kMaxFile = int64_t{0xFFFFFFFF} + kChunkHeader;
+
+[[noreturn]] void throwListTooLarge(const P<peru::IURI>& file) {
+    throw peru::CFileError(peru::localize("filetag.CRIFFTag.listTooLarge",
+                                          "The texts in the tag of the file '%URI%' take more than 64 MB."),
+                           file);
+}
+
+// Runs the operation; an error of its streams comes out as an error of the file.
+template <class Operation> void withFileErrors(const P<peru::IURI>& file, Operation&& operation) {
+    try {
+        operation();
+    } catch (const peru::CStreamError& error) {
+        throw peru::CFileError(error.getDescription(), file, error.getTitle());
+    }
+}
+
+P<peru::ISeekableInStream> openFile(const P<peru::IURI>& file) {
+    return peru::getStreamManager()->getSeekableInStream(file);
+}
+
+CChunkReader readChunks(const P<peru::ISeekableInStream>& stream, const P<peru::IURI>& file) {
+    CChunkReader chunks(stream);
+    if (!chunks.isWave()) throw peru::CFileFormatNotSupportedError(file);
+    return chunks;
+}
+
+// As the chunk is to stand in the new file: with its size told as it is, and with a zero behind it when that
+// is odd, so that every other program finds what follows, the list at the end above all.
+bool needsPad(const SChunk& chunk) {
+    return chunk.size % 2 != 0;
+}
+
+int64_t getNewSize(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri, int64_t listSize) {
+    CChunkReader chunks = readChunks(file, uri);
+    int64_t size = CChunkReader::kHeaderSize + listSize;
+    for (SChunk chunk; chunks.next(chunk);) {
+        if (chunk.info) continue;
+        size += kChunkHeader + chunk.size + (needsPad(chunk) ? 1 : 0);
+    }
+    return size;
+}
+
+// Copies neighbours together: a file may consist of any number of small chunks.
+class CCopier {
+public:
+    explicit CCopier(const P<peru::IFileReplacement>& target) : m_target(target) {}
+
+    void copy(int64_t begin, int64_t end) {
+        if (begin != m_end) {
+            finish();
+            m_begin = begin;
+        }
+        m_end = end;
+    }
+    void write(const void* bytes, int64_t size) {
+        finish();
+        m_target->getStream()->write(bytes, size);
+    }
+    void finish() {
+        if (m_end > m_begin) m_target->copyFromOld(m_begin, m_end - m_begin);
+        m_begin = m_end;
+    }
+
+private:
+    P<peru::IFileReplacement> m_target;
+    int64_t m_begin = 0;
+    int64_t m_end = 0;
+};
+
+void copyChunks(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri, CCopier& copier) {
+    CChunkReader chunks = readChunks(file, uri);
+    for (SChunk chunk; chunks.next(chunk);) {
+        if (chunk.info) continue;
+        const int64_t body = chunk.offset + kChunkHeader;
+        const bool mended = chunk.size != chunk.toldSize;
+        if (mended) {
+            const SChunkHeader header{chunk.id, static_cast<uint32_t>(chunk.size)};
+            copier.write(&header, sizeof header);
+        }
+        copier.copy(mended ? body : chunk.offset, body + chunk.size);
+        if (needsPad(chunk)) copier.write("", 1);
+    }
+    copier.finish();
+}
+
+} // namespace
+
+CRIFFTag::CRIFFTag(const P<peru::IURI>& file) : m_uri(file) {}
+
+CRIFFTag::~CRIFFTag() = default;
+
+void CRIFFTag::open() {
+    close();
+    withFileErrors(m_uri, [this] {
+        const P<peru::ISeekableInStream> stream = openFile(m_uri);
+        CChunkReader chunks = readChunks(stream, m_uri);
+        for (SChunk chunk; !m_list && chunks.next(chunk);) {
+            if (!chunk.info) continue;
+            if (chunk.size > kMaxList) throwListTooLarge(m_uri);
+            std::vector<uint8_t> bytes(static_cast<size_t>(kChunkHeader + chunk.size));
+            stream->seek(chunk.offset);
+            stream->read(bytes.data(), static_cast<int64_t>(bytes.size()));
+            m_list.emplace(std::move(bytes));
+        }
+    });
+    m_opened = true;
+}
+
+void CRIFFTag::close() {
+    m_opened = false;
+    m_modified = false;
+    m_list.reset();
+}
+
+void CRIFFTag::store() {
+    if (!m_modified) return;
+    withFileErrors(m_uri, [this] {
+        const std::vector<uint8_t>& list = m_list->getChunk();
+        const auto listSize = static_cast<int64_t>(list.size());
+        const P<peru::ISeekableInStream> old = openFile(m_uri);
+        const int64_t size = getNewSize(old, m_uri, listSize);
+        if (size > kMaxFile)
+            throw peru::CFileError(
+                peru::localize("filetag.CRIFFTag.fileTooLarge",
+                               "The file '%URI%' would take more than 4 GB with its tag, which a WAVE "
+                               "file cannot hold."),
+                m_uri);
+
+        const P<peru::IFileReplacement> replacement = peru::getSystem()->startReplacement(m_uri);
+        CCopier copier(replacement);
+        const auto riffSize = static_cast<uint32_t>(size - kChunkHeader);
+        copier.write("RIFF", 4);
+        copier.write(&riffSize, sizeof riffSize);
+        copier.write("WAVE", 4);
+        copyChunks(old, m_uri, copier);
+        copier.write(list.data(), listSize);
+        replacement->commit();
+    });
+    m_modified = false;
+}
+
+P<peru::IString> CRIFFTag::get(const FourCC& id) const {
+    return m_list ? readNarrowText(m_list->get(id)) : peru::CString::empty();
+}
+
+void CRIFFTag::set(const FourCC& id, const peru::CStringArg& value) {
+    if (!m_opened) return;
+    const std::string bytes = peru::CString::toStdString(value);
+    // One text alone may fill the list: a list that was stored can be opened again.
+    const int64_t used = m_list ? static_cast<int64_t>(m_list->getChunk().size()) : 0;
+    if (used + static_cast<int64_t>(bytes.size()) + 32 > kMaxList) throwListTooLarge(m_uri);
+    if (!m_list) m_list.emplace();
+    m_list->set(id, bytes);
+    m_modified = true;
+}
+
+void CRIFFTag::setTitle(const peru::CStringArg& title) {
+    set(kTitle, title);
+}
+P<peru::IString> CRIFFTag::getTitle() const {
+    return get(kTitle);
+}
+void CRIFFTag::setArtist(const peru::CStringArg& artist) {
+    set(kArtist, artist);
+}
+P<peru::IString> CRIFFTag::getArtist() const {
+    return get(kArtist);
+}
+void CRIFFTag::setTrackNumber(const peru::CStringArg& number) {
+    set(kTrackNumber, number);
+}
+P<peru::IString> CRIFFTag::getTrackNumber() const {
+    return get(kTrackNumber);
+}
+void CRIFFTag::setYear(const peru::CStringArg& year) {
+    set(kYear, year);
+}
+P<peru::IString> CRIFFTag::getYear() const {
+    return get(kYear);
+}
+void CRIFFTag::setGenre(const peru::CStringArg& genre) {
+    set(kGenre, genre);
+}
+P<peru::IString> CRIFFTag::getGenre() const {
+    return get(kGenre);
+}
+void CRIFFTag::setComment(const peru::CStringArg& comment) {
+    set(kComment, comment);
+}
+P<peru::IString> CRIFFTag::getComment() const {
+    return get(kComment);
+}
+P<peru::IString> CRIFFTag::getTagType() const {
+    return peru::newString(m_list ? "INFO" : "");
+}
+
+} // namespace filetag::rifftag

@@ -1,0 +1,57 @@
+// The tag of a WAVE file.
+#pragma once
+
+#include "filetag/IFileTag.h"
+#include "filetag/rifftag/InfoList.h"
+#include "peru/Object.h"
+
+#include <optional>
+
+namespace filetag::rifftag {
+
+// Reads the file's first list of type INFO; storing writes it as the file's last chunk and drops all others
+// of that type. Texts are written in UTF-8. A WAVE file has neither album nor album artist here. An empty
+// text stays in the file as an entry without characters.
+//
+// RF64, which holds what is over 4 GB, is no WAVE file for this class.
+class FILETAG_API CRIFFTag : public peru::CObject, public IFileTag {
+public:
+    explicit CRIFFTag(const P<peru::IURI>& file);
+    ~CRIFFTag() override;
+
+    bool isOpened() const override { return m_opened; }
+    void open() override;
+    void close() override;
+    P<peru::IURI> getURI() const override { return m_uri; }
+    // Also when nothing was set: then the file is not touched. The tag stays open.
+    void store() override;
+
+    void setTitle(const peru::CStringArg& title) override;
+    P<peru::IString> getTitle() const override;
+    void setArtist(const peru::CStringArg& artist) override;
+    P<peru::IString> getArtist() const override;
+    void setAlbum(const peru::CStringArg&) override {}
+    P<peru::IString> getAlbum() const override { return peru::CString::empty(); }
+    void setAlbumArtist(const peru::CStringArg&) override {}
+    P<peru::IString> getAlbumArtist() const override { return peru::CString::empty(); }
+    void setTrackNumber(const peru::CStringArg& number) override;
+    P<peru::IString> getTrackNumber() const override;
+    void setYear(const peru::CStringArg& year) override;
+    P<peru::IString> getYear() const override;
+    void setGenre(const peru::CStringArg& genre) override;
+    P<peru::IString> getGenre() const override;
+    void setComment(const peru::CStringArg& comment) override;
+    P<peru::IString> getComment() const override;
+    P<peru::IString> getTagType() const override;
+
+private:
+    P<peru::IString> get(const FourCC& id) const;
+    void set(const FourCC& id, const peru::CStringArg& value);
+
+    P<peru::IURI> m_uri;
+    bool m_opened = false;
+    bool m_modified = false;
+    std::optional<CInfoList> m_list; // empty when the file has none
+};
+
+} // namespace filetag::rifftag

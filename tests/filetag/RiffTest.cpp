@@ -1,0 +1,282 @@
+#include "filetag/rifftag/RIFFTag.h"
+#include "support/Files.h"
+#include "support/Process.h"
+#include "support/TempFolder.h"
+
+#include <gmock/gmock.h>
+
+#include <filesystem>
+
+using namespace peru;
+using filetag::rifftag::CRIFFTag;
+using tests::text;
+using tests::toURI;
+
+namespace {
+
+std::string word(uint32_t value) {
+    return {reinterpret_cast<const char*>(&value), sizeof value};
+}
+
+// With the body's own size, or one that lies. Pad bytes are part of what the tests write down.
+std::string chunk(const std::string& id, const std::string& body) {
+    return id + word(static_cast<uint32_t>(body.size())) + body;
+}
+std::string chunk(const std::string& id, uint32_t size, const std::string& body) {
+    return id + word(size) + body;
+}
+
+std::string wave(const std::string& chunks) {
+    return "RIFF" + word(static_cast<uint32_t>(4 + chunks.size())) + "WAVE" + chunks;
+}
+
+const std::string kZero(1, '\0');
+const std::string kFormat =
+    chunk("fmt ", std::string("\1\0\1\0\x40\x1F\0\0\x40\x1F\0\0\1\0\x8\0", 16)); // 8 kHz, mono, 8 bits
+const std::string kData = chunk("data", "samples!");
+const std::string kTitled = "INFO" + chunk("INAM", "Old" + kZero);
+
+P<CRIFFTag> openTag(const std::filesystem::path& file) {
+    const P<CRIFFTag> tag = make<CRIFFTag>(toURI(file));
+    tag->open();
+    return tag;
+}
+
+} // namespace
+
+TEST(RiffTag, FieldsStandInTheListByteForByte) {
+    const tests::CTempFolder folder;
+    const auto file = folder.write("a.wav", wave(kFormat + kData));
+    P<CRIFFTag> tag = openTag(file);
+    EXPECT_EQ(text(tag->getTitle()), "");
+    tag->setTitle("Odd name");
+    tag->setArtist("Somebody");
+    tag->setTrackNumber("3/12");
+    tag->setYear("1999");
+    tag->setGenre("Jazz");
+    tag->setComment("");
+    tag->setAlbum("nowhere");
+    tag->setAlbumArtist("nowhere");
+    tag->setArtist("Me");                       // shorter, with entries behind it
+    tag->setTitle("A longer name than it was"); // longer
+    tag->store();
+
+    const std::string list = chunk("LIST", "INFO" + chunk("INAM", "A longer name than it was" + kZero) +
+                                               chunk("IART", "Me" + kZero) + chunk("TRCK", "3/12" + kZero) +
+                                               chunk("ICRD", "1999" + kZero) + chunk("IGNR", "Jazz" + kZero) +
+                                               chunk("ICMT", kZero));
+    EXPECT_EQ(tests::readFile(file), wave(kFormat + kData + list));
+    tag = openTag(file);
+    const std::vector<std::string> fields = {text(tag->getTitle()),       text(tag->getArtist()),
+                                             text(tag->getTrackNumber()), text(tag->getYear()),
+                                             text(tag->getGenre()),       text(tag->getComment()),
+                                             text(tag->getAlbum()),       text(tag->getAlbumArtist())};
+    EXPECT_THAT(fields,
+                testing::ElementsAre("A longer name than it was", "Me", "3/12", "1999", "Jazz", "", "", ""));
+}
+
+TEST(RiffTag, StoringMovesTheListToTheEndAndKeepsTheRest) {
+    const std::string artist = chunk("IART", "Me" + kZero);
+    const std::string added = chunk("LIST", "INFO" + artist);
+    const std::string joined = chunk("LIST", kTitled + artist);
+    const std::string list = chunk("LIST", kTitled);
+    const std::string other = chunk("LIST", "adtl" + chunk("labl", "mark"));
+    const std::string secondInfo = chunk("LIST", "INFO" + chunk("INAM", "Second" + kZero));
+    const struct {
+        const char* name;
+        std::string before;
+        std::string after; // chunks, once the artist is set
+        const char* title; // read
+    } cases[] = {
+        {"no list", kFormat + kData, kFormat + kData + added, ""},
+        {"list before the sound", kFormat + list + kData, kFormat + kData + joined, "Old"},
+        {"other list", other + kFormat + kData, other + kFormat + kData + added, ""},
+        {"two lists", list + kFormat + secondInfo + kData, kFormat + kData + joined, "Old"},
+        {"list without entries", chunk("LIST", "INFO") + kData, chunk("LIST", "INFO") + kData + added, ""},
+        {"padded sound", chunk("data", "odd") + kZero + list, chunk("data", "odd") + kZero + joined, "Old"},
+        {"padded with something", chunk("data", "odd") + "\xEE" + list, chunk("data", "odd") + kZero + joined,
+         "Old"},
+        {"sound without a pad byte", chunk("data", "odd") + list, chunk("data", "odd") + kZero + joined,
+         "Old"},
+        {"unpadded at the end", chunk("data", "odd"), chunk("data", "odd") + kZero + added, ""},
+        {"any pad byte at the end", chunk("data", "odd") + "x", chunk("data", "odd") + kZero + added, ""},
+        {"sound longer than the file", kFormat + chunk("data", 5000, "samples!"), kFormat + kData + added,
+         ""},
+        {"sound of unknown length", kFormat + chunk("data", 0xFFFFFFFF, "samples!"), kFormat + kData + added,
+         ""},
+        {"length never told", kFormat + chunk("data", 0, "\xA0\xA1\xA2\xA3samples!"),
+         kFormat + chunk("data", "\xA0\xA1\xA2\xA3samples!") + added, ""},
+        {"no sound at all", kFormat + chunk("data", "") + list, kFormat + chunk("data", "") + joined, "Old"},
+        {"half a chunk header at the end", kFormat + kData + "LIST\4", kFormat + kData + added, ""},
+        {"list longer than the file", kData + chunk("LIST", 0xFFFFFFF0, kTitled), kData + joined, "Old"},
+        {"list cut in its type", kData + chunk("LIST", 100, "INF"),
+         kData + chunk("LIST", "INF") + kZero + added, ""},
+        {"nothing but a header", "", added, ""},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        const tests::CTempFolder folder;
+        const auto file = folder.write("a.wav", wave(c.before));
+        P<CRIFFTag> tag = openTag(file);
+        EXPECT_EQ(text(tag->getTitle()), c.title);
+        tag->setArtist("Me");
+        tag->store();
+        EXPECT_EQ(tests::readFile(file), wave(c.after));
+        tag = openTag(file);
+        EXPECT_EQ(text(tag->getArtist()), "Me");
+        EXPECT_EQ(text(tag->getTitle()), c.title);
+    }
+}
+
+// Each value is to be there before another field is set, and together with it afterwards.
+TEST(RiffTag, ListsOfOtherProgramsAreReadAndExtended) {
+    const std::string artist = chunk("IART", "Them" + kZero);
+    const struct {
+        const char* name;
+        std::string entries;
+        const char* title;
+        const char* artist;
+    } cases[] = {
+        {"odd and unpadded", chunk("INAM", "ab" + kZero) + artist, "ab", "Them"},
+        {"odd and padded", chunk("INAM", "ab" + kZero) + kZero + artist, "ab", "Them"},
+        {"padded at the end", artist + chunk("INAM", "ab" + kZero) + kZero, "ab", "Them"},
+        {"unterminated", chunk("INAM", "abcd") + artist, "abcd", "Them"},
+        {"filled up with zeros", chunk("INAM", "ab" + std::string(8, '\0')) + artist, "ab", "Them"},
+        {"longer than the list", artist + chunk("INAM", 0xFFFFFFFF, "abc"), "abc", "Them"},
+        {"twice", chunk("INAM", "ab") + chunk("INAM", "cd") + artist, "ab", "Them"},
+        {"rubbish behind the last", chunk("INAM", "ab") + artist + "rubbish", "ab", "Them"},
+        {"code page", chunk("INAM", "caf\xE9 \x80") + artist, "café €", "Them"},
+        {"no whole entry", "INAM", "", ""},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        const tests::CTempFolder folder;
+        const auto file = folder.write("a.wav", wave(kData + chunk("LIST", "INFO" + c.entries)));
+        P<CRIFFTag> tag = openTag(file);
+        EXPECT_EQ(text(tag->getTitle()), c.title);
+        EXPECT_EQ(text(tag->getArtist()), c.artist);
+        tag->setYear("2001");
+        tag->store();
+        tag = openTag(file);
+        EXPECT_EQ(text(tag->getTitle()), c.title);
+        EXPECT_EQ(text(tag->getArtist()), c.artist);
+        EXPECT_EQ(text(tag->getYear()), "2001");
+        tag->setTitle("Another title");
+        EXPECT_EQ(text(tag->getArtist()), c.artist);
+        EXPECT_EQ(text(tag->getYear()), "2001");
+    }
+}
+
+TEST(RiffTag, WithoutChangesTheFileIsNotTouched) {
+    const tests::CTempFolder folder;
+    const auto file = folder.write("a.wav", wave(kData + "rest"));
+    const auto time = std::filesystem::last_write_time(file);
+    const P<CRIFFTag> tag = openTag(file);
+    std::filesystem::permissions(file, std::filesystem::perms::owner_read);
+    tag->store();
+    tag->setTitle("dropped");
+    tag->close();
+    tag->setTitle("closed");
+    tag->store();
+    EXPECT_EQ(std::filesystem::last_write_time(file), time);
+    EXPECT_EQ(tests::readFile(file), wave(kData + "rest"));
+}
+
+TEST(RiffTag, WhatIsNoWaveFileIsRefusedByName) {
+    const std::string good = wave(kFormat + kData);
+    const struct {
+        const char* name;
+        std::string bytes;
+    } cases[] = {{"empty", ""},
+                 {"cut header", good.substr(0, 11)},
+                 {"rf64", "RF64" + good.substr(4)},
+                 {"rifx", "RIFX" + good.substr(4)},
+                 {"other riff", good.substr(0, 8) + "AVI " + good.substr(12)}};
+    const tests::CTempFolder folder;
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        const auto file = folder.write("bad name.wav", c.bytes);
+        const P<CRIFFTag> tag = make<CRIFFTag>(toURI(file));
+        EXPECT_THROW(tag->open(), CFileFormatNotSupportedError);
+        EXPECT_THAT(tests::errorOf([&] { tag->open(); }), testing::HasSubstr("bad%20name.wav"));
+        EXPECT_FALSE(tag->isOpened());
+
+        // The file may have become another one since it was opened.
+        folder.write("bad name.wav", good);
+        tag->open();
+        tag->setTitle("Title");
+        folder.write("bad name.wav", c.bytes);
+        EXPECT_THROW(tag->store(), CFileFormatNotSupportedError);
+        EXPECT_EQ(tests::readFile(file), c.bytes);
+    }
+    EXPECT_THROW(openTag(folder / "missing.wav"), CFileNotFoundError);
+    EXPECT_THROW(openTag(folder.path()), CFileError);
+}
+
+// Holes take no room: the list stands behind 3 GB, and then there is none for it below 4 GB.
+TEST(RiffTag, LargeFilesAreReadUpToTheLimitOfTheFormat) {
+    const tests::CTempFolder folder;
+    const auto grow = [&](const char* name, uint32_t dataSize, const std::string& tail) {
+        const auto file = folder.write(name, wave(chunk("data", dataSize, "")));
+        std::filesystem::resize_file(file, 20 + uint64_t{dataSize});
+        std::ofstream(file, std::ios::binary | std::ios::app) << tail;
+        return file;
+    };
+    const auto large = grow("large.wav", 3'000'000'000, chunk("LIST", kTitled));
+    EXPECT_EQ(text(openTag(large)->getTitle()), "Old");
+
+    const auto full = grow("full.wav", 0xFFFFFFFF - 50, "");
+    const P<CRIFFTag> tag = openTag(full);
+    tag->setTitle("This text has no place in the file");
+    EXPECT_THAT(tests::errorOf([&] { tag->store(); }),
+                testing::AllOf(testing::HasSubstr("full.wav"), testing::HasSubstr("4 GB")));
+    EXPECT_EQ(std::filesystem::file_size(full), 20 + uint64_t{0xFFFFFFFF - 50});
+
+    const auto list = grow("list.wav", 100'000'000, "");
+    { // the hole is the list
+        std::fstream file(list, std::ios::binary | std::ios::in | std::ios::out);
+        file.seekp(12) << "LIST" << word(100'000'000) << "INFO";
+    }
+    EXPECT_THAT(tests::errorOf([&] { openTag(list); }), testing::HasSubstr("list.wav"));
+}
+
+TEST(RiffTag, OtherProgramsReadTextsAndSound) {
+    const char16_t* const texts[] = {u"plain", u"Füße", u"Привет, мир", u"日本語のタイトル",
+                                     u"क ख ग", u"🎵 𝄞 🎷"};
+    const tests::CTempFolder folder;
+    // An odd number of bytes, so that a pad byte follows; 2001 samples of 8 bits, and of 24.
+    for (const char* bits : {"8", "24"}) {
+        const auto file = folder / (std::string(bits) + ".wav");
+        ASSERT_EQ(tests::run({"sox", "-n", "-r", "8000", "-c", "1", "-b", bits, file, "synth", "2001s",
+                              "sine", "440"})
+                      .exitCode,
+                  0);
+        const auto hear = [&](const char* program) {
+            const auto heard = program == std::string("sox")
+                                   ? tests::run({"sox", file, "-t", "raw", "-"})
+                                   : tests::run({"ffmpeg", "-v", "error", "-i", file, "-f", "s24le", "-"});
+            EXPECT_EQ(heard.exitCode, 0) << heard.err;
+            return heard.out;
+        };
+        const std::string before[] = {hear("sox"), hear("ffmpeg")};
+        ASSERT_FALSE(before[0].empty());
+        for (const char16_t* title : texts) {
+            P<CRIFFTag> tag = openTag(file);
+            const P<IString> expected = CString::fromUTF16(title);
+            SCOPED_TRACE(text(expected));
+            tag->setTitle(title);
+            tag->setArtist("Artist");
+            // exiftool does without the list when it is odd and the file ends there.
+            tag->setComment(text(expected).size() % 2 == 0 ? "odd" : "even");
+            tag->store();
+            EXPECT_EQ(CString::toStdU16String(openTag(file)->getTitle()), title);
+            EXPECT_EQ(hear("sox"), before[0]);
+            EXPECT_EQ(hear("ffmpeg"), before[1]);
+            const auto seen = tests::run({"ffprobe", "-v", "error", "-show_entries",
+                                          "format_tags=title,artist", "-of", "default=nk=1:nw=1", file});
+            EXPECT_EQ(seen.out, text(expected) + "\nArtist\n") << seen.err;
+            const auto exif = tests::run({"exiftool", "-charset", "riff=utf8", "-s3", "-Title", file});
+            EXPECT_EQ(exif.out, text(expected) + "\n") << exif.err;
+        }
+    }
+}
