@@ -1,0 +1,136 @@
+#include "FaultyCalls.h"
+
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <cstddef>
+#include <cstdlib>
+#include <fcntl.h>
+#include <linux/filter.h>
+#include <linux/seccomp.h>
+#include <poll.h>
+#include <sys/ioctl.h>
+#include <sys/prctl.h>
+#include <sys/socket.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+#include <unistd.h>
+#include <vector>
+
+namespace tests {
+
+namespace {
+
+constexpr int kFileCalls[] = {
+#ifdef SYS_open
+    SYS_open,      SYS_rename,    SYS_link,
+#endif
+    SYS_openat,    SYS_read,      SYS_pread64,   SYS_readv,     SYS_write,
+    SYS_pwrite64,  SYS_writev,    SYS_sendfile,  SYS_fsync,     SYS_fdatasync,
+    SYS_fchmod,    SYS_fchown,    SYS_fchownat,  SYS_fchmodat,  SYS_linkat,
+    SYS_renameat,  SYS_renameat2, SYS_ftruncate, SYS_fallocate, SYS_copy_file_range,
+    SYS_fsetxattr, SYS_setxattr,  SYS_utimensat};
+
+// The descriptor on which the kernel asks about each of these calls of the process; -1 where it does not.
+int watchFileCalls() {
+    std::vector<sock_filter> filter = {BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr))};
+    for (const int call : kFileCalls) {
+        filter.push_back(BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, static_cast<uint32_t>(call), 0, 1));
+        filter.push_back(BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_USER_NOTIF));
+    }
+    filter.push_back(BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW));
+    const sock_fprog program{static_cast<unsigned short>(filter.size()), filter.data()};
+    if (::prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) != 0) return -1;
+    return static_cast<int>(
+        ::syscall(SYS_seccomp, SECCOMP_SET_MODE_FILTER, SECCOMP_FILTER_FLAG_NEW_LISTENER, &program));
+}
+
+// Sending and receiving are not among the calls that are watched.
+[[noreturn]] void runChild(int channel, const std::function<std::function<std::string()>()>& prepare) {
+    const std::function<std::string()> operation = prepare();
+    const int listener = watchFileCalls();
+    char go = 0;
+    if (::send(channel, &listener, sizeof listener, 0) < 0 || ::recv(channel, &go, 1, 0) != 1) ::_exit(1);
+    const std::string report = operation();
+    ::send(channel, report.data(), report.size(), 0);
+    ::_exit(0);
+}
+
+bool isRenaming(int call) {
+#ifdef SYS_rename
+    if (call == SYS_rename) return true;
+#endif
+    return call == SYS_renameat || call == SYS_renameat2;
+}
+
+// Answers one question of the kernel's; `counted` is the number of the call.
+void answer(int listener, const seccomp_notif& question, const SFault& fault, bool strikes, pid_t child) {
+    if (strikes && fault.error == 0) {
+        ::kill(child, SIGKILL);
+        return;
+    }
+    seccomp_notif_resp response{};
+    response.id = question.id;
+    if (strikes)
+        response.error = -fault.error;
+    else
+        response.flags = SECCOMP_USER_NOTIF_FLAG_CONTINUE;
+    ::ioctl(listener, SECCOMP_IOCTL_NOTIF_SEND, &response);
+}
+
+void answerAll(int listener, const SFault& fault, pid_t child, SFaultyRun& run) {
+    for (int calls = 0;;) {
+        pollfd waiting{listener, POLLIN, 0};
+        if (::poll(&waiting, 1, 60'000) <= 0) {
+            ::kill(child, SIGKILL); // it hangs
+            return;
+        }
+        if (waiting.revents & POLLHUP) return;
+        seccomp_notif question{};
+        if (::ioctl(listener, SECCOMP_IOCTL_NOTIF_RECV, &question) != 0) continue;
+        ++calls;
+        const bool strikes =
+            fault.call != 0 && (calls == fault.call || (fault.forGood && calls > fault.call));
+        if (strikes && !run.struck) run.renaming = isRenaming(question.data.nr);
+        run.struck = run.struck || strikes;
+        answer(listener, question, fault, strikes, child);
+    }
+}
+
+} // namespace
+
+SFaultyRun runWithFault(const SFault& fault, const std::function<std::function<std::string()>()>& prepare) {
+    int channel[2];
+    if (::socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, channel) != 0) std::abort();
+    const pid_t child = ::fork();
+    if (child == 0) {
+        ::close(channel[0]);
+        runChild(channel[1], prepare);
+    }
+    ::close(channel[1]);
+
+    SFaultyRun run;
+    int remote = -1;
+    if (::recv(channel[0], &remote, sizeof remote, 0) == sizeof remote) {
+        const int process = static_cast<int>(::syscall(SYS_pidfd_open, child, 0));
+        const int listener =
+            remote < 0 ? -1 : static_cast<int>(::syscall(SYS_pidfd_getfd, process, remote, 0));
+        run.supported = listener >= 0;
+        if (run.supported) {
+            ::send(channel[0], "g", 1, 0);
+            answerAll(listener, fault, child, run);
+        } else {
+            ::kill(child, SIGKILL);
+        }
+        ::close(listener);
+        ::close(process);
+    }
+    ::waitpid(child, &run.status, 0);
+    std::array<char, 4096> report;
+    const ssize_t length = ::recv(channel[0], report.data(), report.size(), 0);
+    if (length > 0) run.report.assign(report.data(), static_cast<size_t>(length));
+    ::close(channel[0]);
+    return run;
+}
+
+} // namespace tests

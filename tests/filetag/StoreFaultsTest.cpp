@@ -1,0 +1,176 @@
+// What is on the disk after a store that went wrong, in every format: the old file or the new one, whole, and
+// nothing else.
+#include "FaultyCalls.h"
+#include "filetag/rifftag/RIFFTag.h"
+#include "support/Files.h"
+#include "support/Process.h"
+#include "support/TempFolder.h"
+
+#include <gmock/gmock.h>
+
+#include <csignal>
+#include <filesystem>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+using namespace peru;
+
+namespace {
+
+// Half a second of sound with a title, made by programs that others use.
+std::string makeSound(const std::filesystem::path& folder, const std::string& extension) {
+    const auto wave = folder / "source.wav";
+    const auto file = folder / ("made." + extension);
+    tests::run({"sox", "-n", "-r", "22050", "-c", "1", wave, "synth", "0.5", "sine", "440"});
+    const std::string title = "A title of the file's own";
+    if (extension == "wav")
+        tests::run({"ffmpeg", "-v", "error", "-i", wave, "-metadata", "title=" + title, file});
+    else if (extension == "mp3")
+        tests::run({"lame", "--quiet", "--tt", title, wave, file});
+    else if (extension == "flac")
+        tests::run({"flac", "-s", "-T", "TITLE=" + title, wave, "-o", file});
+    else if (extension == "ogg")
+        tests::run({"oggenc", "-Q", "-t", title, wave, "-o", file});
+    else
+        tests::run(
+            {"ffmpeg", "-v", "error", "-i", wave, "-c:a", "wmav2", "-metadata", "title=" + title, file});
+    return tests::readFile(file);
+}
+
+class StoreFaults : public testing::TestWithParam<const char*> {
+protected:
+    static constexpr const char* kName = "a file";
+
+    void SetUp() override {
+        m_old = makeSound(m_making.path(), GetParam());
+        ASSERT_FALSE(m_old.empty());
+        reset();
+        ASSERT_EQ(prepare()(), "stored");
+        m_new = tests::readFile(getFile());
+        ASSERT_NE(m_new, m_old);
+        reset();
+    }
+
+    std::filesystem::path getFile() const { return m_folder / (std::string(kName) + "." + GetParam()); }
+    void reset() const { m_folder.write(getFile().filename(), m_old); }
+
+    // The store of a changed title, and an added text that makes the tag larger than it was. It reports
+    // "stored" or the error's text.
+    std::function<std::string()> prepare() const {
+        const P<filetag::IFileTag> tag = make<filetag::rifftag::CRIFFTag>(tests::toURI(getFile()));
+        tag->open();
+        tag->setTitle("Another title");
+        tag->setComment(CString::fromUTF8(std::string(9000, 'c')));
+        return [tag]() -> std::string {
+            try {
+                tag->store();
+                return "stored";
+            } catch (const CFileError& error) {
+                return tests::text(error.getDescription());
+            } catch (const CException& error) {
+                return "not an error of a file: " + tests::text(error.getDescription());
+            } catch (const std::exception& error) {
+                return std::string("not an error of the system: ") + error.what();
+            }
+        };
+    }
+
+    void expectOldOrNew(const tests::SFaultyRun& run) const {
+        std::vector<std::string> others;
+        for (const auto& entry : std::filesystem::directory_iterator(m_folder.path()))
+            if (entry.path() != getFile()) others.push_back(entry.path());
+        const std::string found = tests::readFile(getFile());
+        if (run.report.empty()) { // killed
+            EXPECT_TRUE(found == m_old || found == m_new);
+            // A name is taken over only from another name: here alone there are two, and what the second one
+            // stands for is whole.
+            if (run.renaming && others.size() == 1) {
+                EXPECT_TRUE(tests::readFile(others[0]) == m_new);
+                std::filesystem::remove(others[0]);
+                others.clear();
+            }
+        } else if (run.report == "stored") {
+            EXPECT_TRUE(found == m_new) << "stored, and not the new file";
+        } else {
+            EXPECT_TRUE(found == m_old) << run.report << (found == m_new ? ": new file" : ": neither file");
+            EXPECT_THAT(run.report, testing::ContainsRegex("a( |%20)file")) << "does not name the file";
+            EXPECT_THAT(run.report, testing::Not(testing::StartsWith("not an error")));
+        }
+        EXPECT_THAT(others, testing::IsEmpty());
+    }
+
+    tests::CTempFolder m_making;
+    tests::CTempFolder m_folder;
+    std::string m_old;
+    std::string m_new;
+};
+
+} // namespace
+
+TEST_P(StoreFaults, EveryFailingCallLeavesTheOldFileOrTheNewOne) {
+    const struct {
+        const char* name;
+        int error;
+        bool forGood;
+    } kinds[] = {{"one call fails", EIO, false},
+                 {"one call is not supported", EOPNOTSUPP, false},
+                 {"the disk is full from here on", ENOSPC, true},
+                 {"killed", 0, false}};
+    for (const auto& kind : kinds)
+        for (int call = 1;; ++call) {
+            SCOPED_TRACE(std::string(kind.name) + ", call " + std::to_string(call));
+            ASSERT_LT(call, 2000);
+            reset();
+            const tests::SFaultyRun run =
+                tests::runWithFault({call, kind.error, kind.forGood}, [this] { return prepare(); });
+            if (!run.supported) GTEST_SKIP() << "this kernel does not let a test fail another's calls";
+            if (run.struck && kind.error == 0) {
+                EXPECT_TRUE(WIFSIGNALED(run.status));
+                EXPECT_EQ(run.report, "");
+            } else {
+                EXPECT_TRUE(WIFEXITED(run.status)) << "signal " << WTERMSIG(run.status);
+                EXPECT_NE(run.report, "");
+            }
+            expectOldOrNew(run);
+            if (HasFailure()) return;
+            if (!run.struck) {
+                EXPECT_EQ(run.report, "stored");
+                break;
+            }
+        }
+}
+
+TEST_P(StoreFaults, ErrorsOfThePlaceNameTheFile) {
+    const auto inChild = [this](const std::function<void()>& restrict) {
+        const tests::SFaultyRun run = tests::runWithFault({}, [this, & restrict] {
+            const std::function<std::string()> store = prepare();
+            restrict();
+            return store;
+        });
+        if (!run.supported) return;
+        EXPECT_NE(run.report, "");
+        EXPECT_NE(run.report, "stored");
+        expectOldOrNew(run);
+    };
+    const auto becomeNobody = [] {
+        if (::getuid() == 0 && ::setuid(65534) != 0) ::_exit(1);
+    };
+    {
+        SCOPED_TRACE("a full disk");
+        inChild([this] {
+            ::signal(SIGXFSZ, SIG_IGN);
+            const rlimit limit{m_old.size() / 2, m_old.size() / 2};
+            ::setrlimit(RLIMIT_FSIZE, &limit);
+        });
+    }
+    {
+        SCOPED_TRACE("a folder that cannot be written");
+        std::filesystem::permissions(m_folder.path(), std::filesystem::perms(0555));
+        inChild(becomeNobody);
+        std::filesystem::permissions(m_folder.path(), std::filesystem::perms(0755));
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Formats, StoreFaults, testing::Values("wav"),
+                         [](const auto& instance) { return std::string(instance.param); });
