@@ -1,0 +1,210 @@
+#include "filetag/id3tag/ID3Tag.h"
+
+#include "filetag/id3tag/CoverArt.h"
+#include "filetag/id3tag/OldTag.h"
+
+#include <id3v1tag.h>
+#include <id3v2framefactory.h>
+#include <id3v2header.h>
+#include <id3v2tag.h>
+#include <textidentificationframe.h>
+
+#include <algorithm>
+
+namespace filetag::id3tag {
+
+using namespace peru;
+using taglib::EField;
+using TagLib::ID3v2::AttachedPictureFrame;
+using TagLib::ID3v2::CommentsFrame;
+using TagLib::ID3v2::TextIdentificationFrame;
+
+namespace {
+
+const char* getFrameId(EField field) {
+    switch (field) {
+    case EField::title:
+        return "TIT2";
+    case EField::artist:
+        return "TPE1";
+    case EField::album:
+        return "TALB";
+    case EField::albumArtist:
+        return "TPE2";
+    case EField::trackNumber:
+        return "TRCK";
+    case EField::year:
+        return "TDRC";
+    case EField::genre:
+        return "TCON";
+    case EField::comment:
+        return "COMM";
+    }
+    return "";
+}
+
+constexpr EField kFields[] = {EField::title,       EField::artist, EField::album, EField::albumArtist,
+                              EField::trackNumber, EField::year,   EField::genre, EField::comment};
+
+} // namespace
+
+CID3Tag::CID3Tag(const P<IURI>& file) : CTagLibTag(file) {}
+
+CID3Tag::~CID3Tag() {
+    close();
+}
+
+std::unique_ptr<TagLib::File> CID3Tag::openFile(TagLib::IOStream& stream) {
+    auto file = std::make_unique<TagLib::MPEG::File>(&stream, TagLib::ID3v2::FrameFactory::instance());
+    // TagLib takes any bytes for an MP3 file; one with neither a tag nor a frame of sound is none.
+    const TagLib::MPEG::Properties* properties = file->audioProperties();
+    const bool sound = properties && properties->sampleRate() > 0;
+    if (!file->isValid() || (!sound && !file->hasID3v2Tag() && !file->hasID3v1Tag() && !file->hasAPETag()))
+        return nullptr;
+    m_mpeg = file.get();
+    m_tag = file->ID3v2Tag(false);
+    m_oldTag = file->ID3v1Tag(false);
+    return file;
+}
+
+void CID3Tag::dropTags() {
+    m_mpeg = nullptr;
+    m_tag = nullptr;
+    m_oldTag = nullptr;
+}
+
+void CID3Tag::createTag() {
+    if (!m_tag && m_mpeg) m_tag = m_mpeg->ID3v2Tag(true);
+}
+
+P<IString> CID3Tag::getTagType() const {
+    if (!m_mpeg) return CString::empty();
+    if (m_mpeg->hasID3v2Tag())
+        return CString::fromUTF8("ID3v2." + std::to_string(m_tag->header()->majorVersion()));
+    return m_mpeg->hasID3v1Tag() ? newString("ID3v1") : CString::empty();
+}
+
+// Programs keep notes of their own in comments with a description.
+CommentsFrame* CID3Tag::findComment() const {
+    CommentsFrame* found = nullptr;
+    for (TagLib::ID3v2::Frame* frame : m_tag->frameList("COMM")) {
+        auto* comment = dynamic_cast<CommentsFrame*>(frame);
+        if (!comment) continue;
+        if (comment->description().isEmpty()) return comment;
+        if (!found && !comment->description().startsWith("iTun")) found = comment;
+    }
+    return found;
+}
+
+TagLib::String CID3Tag::readFrame(EField field) const {
+    if (!m_tag) return {};
+    if (field == EField::genre) return m_tag->genre(); // knows the numbers of the old genres
+    if (field == EField::comment) {
+        const CommentsFrame* comment = findComment();
+        return comment ? comment->text() : TagLib::String();
+    }
+    const TagLib::ID3v2::FrameList frames = m_tag->frameList(getFrameId(field));
+    if (frames.isEmpty()) return {};
+    const auto* frame = dynamic_cast<const TextIdentificationFrame*>(frames.front());
+    return frame && !frame->fieldList().isEmpty() ? frame->fieldList().front() : TagLib::String();
+}
+
+TagLib::String CID3Tag::readField(EField field) const {
+    const TagLib::String text = readFrame(field);
+    return text.isEmpty() && m_oldTag ? readOldField(*m_oldTag, field) : text;
+}
+
+void CID3Tag::writeComment(const TagLib::String& text) {
+    if (text.isEmpty()) {
+        while (CommentsFrame* comment = findComment()) m_tag->removeFrame(comment);
+        return;
+    }
+    CommentsFrame* comment = findComment();
+    if (!comment) {
+        auto fresh = std::make_unique<CommentsFrame>(TagLib::String::UTF8);
+        comment = fresh.get();
+        m_tag->addFrame(fresh.release());
+    }
+    comment->setTextEncoding(TagLib::String::UTF8);
+    comment->setText(text);
+}
+
+void CID3Tag::writeFrame(EField field, const TagLib::String& text) {
+    if (!text.isEmpty()) createTag();
+    if (!m_tag) return;
+    if (field == EField::comment) return writeComment(text);
+    const char* id = getFrameId(field);
+    m_tag->removeFrames(id);
+    if (text.isEmpty()) return;
+    auto frame = std::make_unique<TextIdentificationFrame>(id, TagLib::String::UTF8);
+    frame->setText(text);
+    m_tag->addFrame(frame.release());
+}
+
+void CID3Tag::writeField(EField field, const TagLib::String& text) {
+    writeFrame(field, text);
+    // Else a text that was removed would still be read from there.
+    if (m_oldTag) writeOldField(*m_oldTag, field, text);
+}
+
+// What one tag has and the other lacks is entered there. TagLib would do so by numbers and lose years and
+// track numbers that are none.
+bool CID3Tag::save(TagLib::File&) {
+    for (const EField field : kFields) {
+        const TagLib::String text = readField(field);
+        if (text.isEmpty()) continue;
+        if (readFrame(field).isEmpty()) writeFrame(field, text);
+        TagLib::ID3v1::Tag* oldTag = m_mpeg->ID3v1Tag(true);
+        if (readOldField(*oldTag, field).isEmpty()) writeOldField(*oldTag, field, text);
+        m_oldTag = oldTag;
+    }
+    return m_mpeg->save(TagLib::MPEG::File::AllTags, TagLib::MPEG::File::StripOthers, TagLib::ID3v2::v4,
+                        TagLib::MPEG::File::DoNotDuplicate);
+}
+
+std::vector<AttachedPictureFrame*> CID3Tag::getPictures() const {
+    std::vector<AttachedPictureFrame*> pictures;
+    if (!m_tag) return pictures;
+    for (TagLib::ID3v2::Frame* frame : m_tag->frameList("APIC"))
+        if (auto* picture = dynamic_cast<AttachedPictureFrame*>(frame)) pictures.push_back(picture);
+    return pictures;
+}
+
+AttachedPictureFrame* CID3Tag::getPicture(int32_t index) const {
+    const std::vector<AttachedPictureFrame*> pictures = getPictures();
+    return index >= 0 && static_cast<size_t>(index) < pictures.size() ? pictures[static_cast<size_t>(index)]
+                                                                      : nullptr;
+}
+
+bool CID3Tag::holds(const AttachedPictureFrame* picture) const {
+    const std::vector<AttachedPictureFrame*> pictures = getPictures();
+    return std::find(pictures.begin(), pictures.end(), picture) != pictures.end();
+}
+
+int32_t CID3Tag::getCoverArtCount() const {
+    return static_cast<int32_t>(getPictures().size());
+}
+
+P<ICoverArt> CID3Tag::getCoverArt(int32_t index) const {
+    AttachedPictureFrame* picture = getPicture(index);
+    return picture ? P<ICoverArt>(make<CCoverArt>(P<const CID3Tag>::share(this), picture)) : nullptr;
+}
+
+void CID3Tag::addCoverArt(const P<CMemoryBlock>& data, const CStringArg& mimeType, EPictureType type) {
+    createTag();
+    if (!m_tag) return;
+    auto picture = std::make_unique<AttachedPictureFrame>();
+    taglib::fillPicture(*picture, data, mimeType,
+                        type == kFrontCover || type == kBackCover ? type : kOtherPicture);
+    m_tag->addFrame(picture.release());
+    markChanged();
+}
+
+void CID3Tag::removeCoverArt(int32_t index) {
+    AttachedPictureFrame* picture = getPicture(index);
+    if (!picture) return;
+    m_tag->removeFrame(picture);
+    markChanged();
+}
+
+} // namespace filetag::id3tag

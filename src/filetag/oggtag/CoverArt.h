@@ -1,0 +1,14 @@
+// A picture of a Ogg Vorbis file.
+#pragma once
+
+#include "filetag/oggtag/OGGTag.h"
+#include "filetag/taglib/CoverArtOf.h"
+
+namespace filetag::oggtag {
+
+class CCoverArt : public taglib::TCoverArtOf<COGGTag, TagLib::FLAC::Picture> {
+public:
+    using TCoverArtOf::TCoverArtOf;
+};
+
+} // namespace filetag::oggtag

@@ -1,0 +1,228 @@
+#include "filetag/taglib/TagLibIOStream.h"
+
+#include "peru/Errors.h"
+#include "peru/IFileSystemManager.h"
+#include "peru/IPathes.h"
+#include "peru/IStreamManager.h"
+#include "peru/IStringLocalizer.h"
+#include "peru/ISystem.h"
+
+#include <algorithm>
+#include <limits>
+
+namespace filetag::taglib {
+namespace {
+
+using namespace peru;
+
+// The unit in which the system keeps files in memory: a write that stays within one is done or not done.
+constexpr int64_t kPageSize = 4096;
+// Shorter ranges of the old file are gathered in memory; longer ones are copied inside the system.
+constexpr int64_t kCopiedInside = 128 * 1024;
+
+std::string getPath(const P<IURI>& file) {
+    const std::string path = CString::toStdString(getPathes()->toPlatformPath(file));
+    if (path.empty()) throw CURITypeNotSupportedError(file);
+    return path;
+}
+
+// Empty when it is gone.
+P<IFileObject> look(const P<IURI>& file) {
+    return getFileSystemManager()->getFileObject(file);
+}
+
+std::string_view toView(const TagLib::ByteVector& bytes) {
+    return {bytes.data(), bytes.size()};
+}
+
+} // namespace
+
+CTagLibIOStream::CTagLibIOStream(const P<IURI>& file)
+    : m_uri(file), m_file(getPath(file).c_str(), true), m_oldSize(0), m_oldTime(0), m_pieces(0) {
+    if (!m_file.isOpen()) {
+        try {
+            getStreamManager()->getInStream(file); // tells the reason
+        } catch (const CStreamError& error) {
+            throw CFileError(error.getDescription(), file);
+        }
+        throw CFileAccessDeniedError(file);
+    }
+    const P<IFileObject> object = look(file);
+    if (!object) throw CFileNotFoundError(file);
+    m_oldSize = object->getSize();
+    m_oldTime = object->getTimes()->getLastWriteTime();
+    m_pieces = CPieceTable(m_oldSize);
+}
+
+CTagLibIOStream::~CTagLibIOStream() = default;
+
+TagLib::FileName CTagLibIOStream::name() const {
+    return m_file.name();
+}
+
+TagLib::ByteVector CTagLibIOStream::readBlock(unsigned long length) {
+    if (!m_pieces.isChanged()) return m_file.readBlock(length);
+    const int64_t left = std::max<int64_t>(m_pieces.getSize() - m_position, 0);
+    const int64_t end =
+        m_position + (length < static_cast<unsigned long>(left) ? static_cast<int64_t>(length) : left);
+    const std::string bytes = readNew({m_position, end});
+    m_position += static_cast<int64_t>(bytes.size());
+    return TagLib::ByteVector(bytes.data(), static_cast<unsigned int>(bytes.size()));
+}
+
+// The first change is where the position passes over from the file.
+void CTagLibIOStream::writeBlock(const TagLib::ByteVector& data) {
+    m_position = tell();
+    m_pieces.write(m_position, toView(data));
+    m_position += static_cast<int64_t>(data.size());
+}
+
+void CTagLibIOStream::insert(const TagLib::ByteVector& data, unsigned long start, unsigned long replace) {
+    m_pieces.insert(static_cast<int64_t>(start), toView(data), static_cast<int64_t>(replace));
+    m_position = static_cast<int64_t>(start) + static_cast<int64_t>(data.size());
+}
+
+void CTagLibIOStream::removeBlock(unsigned long start, unsigned long length) {
+    m_pieces.insert(static_cast<int64_t>(start), {}, static_cast<int64_t>(length));
+    m_position = static_cast<int64_t>(start);
+}
+
+bool CTagLibIOStream::readOnly() const {
+    return false;
+}
+
+bool CTagLibIOStream::isOpen() const {
+    return m_file.isOpen();
+}
+
+void CTagLibIOStream::seek(long offset, Position from) {
+    if (!m_pieces.isChanged()) return m_file.seek(offset, from);
+    if (from == Current) offset += m_position;
+    if (from == End) offset += m_pieces.getSize();
+    m_position = std::max(offset, 0L);
+}
+
+void CTagLibIOStream::clear() {
+    m_file.clear();
+}
+
+long CTagLibIOStream::tell() const {
+    return m_pieces.isChanged() ? m_position : m_file.tell();
+}
+
+long CTagLibIOStream::length() {
+    return m_pieces.isChanged() ? m_pieces.getSize() : m_file.length();
+}
+
+void CTagLibIOStream::truncate(long length) {
+    m_position = tell();
+    m_pieces.setSize(length);
+}
+
+std::string CTagLibIOStream::readOld(int64_t offset, int64_t size) {
+    m_file.seek(offset, Beginning);
+    const TagLib::ByteVector bytes = m_file.readBlock(static_cast<unsigned long>(size));
+    if (bytes.size() != static_cast<uint64_t>(size))
+        throw CFileError(localize("filetag.CTagLibIOStream.ReadError", "The file '%FILE%' could not be read.",
+                                  {{"%FILE%", getShownName(m_uri)}}),
+                         m_uri);
+    return std::string(bytes.data(), bytes.size());
+}
+
+std::string CTagLibIOStream::readNew(const SRange& range) {
+    std::string bytes;
+    int64_t position = range.start;
+    for (auto entry = m_pieces.find(position); position < range.end; ++entry) {
+        CPieceTable::SPiece part = entry->second;
+        const int64_t passed = position - entry->first;
+        part.source += passed;
+        part.size = std::min(part.size - passed, range.end - position);
+        if (part.isNew)
+            bytes += m_pieces.getBytes(part);
+        else
+            bytes += readOld(part.source, part.size);
+        position += part.size;
+    }
+    return bytes;
+}
+
+CTagLibIOStream::SRange CTagLibIOStream::findDifference() {
+    SRange range{std::numeric_limits<int64_t>::max(), 0};
+    for (const auto& [position, piece] : m_pieces.getPieces()) {
+        if (!piece.isNew && piece.source == position) continue;
+        int64_t first = 0;
+        int64_t end = piece.size;
+        if (piece.isNew) {
+            const std::string old = readOld(position, piece.size);
+            const std::string_view bytes = m_pieces.getBytes(piece);
+            while (first < end && bytes[static_cast<size_t>(first)] == old[static_cast<size_t>(first)])
+                ++first;
+            if (first == end) continue;
+            while (bytes[static_cast<size_t>(end - 1)] == old[static_cast<size_t>(end - 1)]) --end;
+        }
+        range.start = std::min(range.start, position + first);
+        range.end = std::max(range.end, position + end);
+    }
+    return range;
+}
+
+// The pieces tell of the file that was opened and would tear any other.
+void CTagLibIOStream::checkUnchanged() const {
+    const P<IFileObject> object = look(m_uri);
+    if (!object) throw CFileNotFoundError(m_uri);
+    if (object->getSize() != m_oldSize || object->getTimes()->getLastWriteTime() != m_oldTime)
+        throw CFileError(localize("filetag.CTagLibIOStream.FileChanged",
+                                  "The file '%FILE%' was changed by another program.",
+                                  {{"%FILE%", getShownName(m_uri)}}),
+                         m_uri);
+}
+
+void CTagLibIOStream::writePage(const SRange& range) {
+    const auto write = [&](const std::string& bytes) {
+        const P<ISeekableIOStream> stream = getStreamManager()->getSeekableIOStream(m_uri, EOpenMode::open);
+        stream->seek(range.start);
+        stream->write(bytes.data(), static_cast<int64_t>(bytes.size()));
+        stream->flush();
+        stream->close();
+    };
+    const std::string bytes = readNew(range);
+    const std::string old = readOld(range.start, range.end - range.start);
+    try {
+        write(bytes);
+    } catch (const CStreamError& error) {
+        try {
+            write(old);
+        } catch (const CException&) {
+            // Nothing has reached the file, or the medium takes nothing more; the first error tells it.
+        }
+        throw CFileError(error.getDescription(), m_uri);
+    }
+}
+
+void CTagLibIOStream::replaceFile() {
+    const P<IFileReplacement> replacement = getSystem()->startReplacement(m_uri);
+    const P<ISeekableIOStream> stream = replacement->getStream();
+    for (const auto& [position, piece] : m_pieces.getPieces()) {
+        if (!piece.isNew && piece.size >= kCopiedInside) {
+            replacement->copyFromOld(piece.source, piece.size);
+            continue;
+        }
+        const std::string bytes =
+            piece.isNew ? std::string(m_pieces.getBytes(piece)) : readOld(piece.source, piece.size);
+        stream->write(bytes.data(), piece.size);
+    }
+    replacement->commit();
+}
+
+void CTagLibIOStream::commit() {
+    if (!m_pieces.isChanged()) return;
+    checkUnchanged();
+    if (m_pieces.getSize() == m_oldSize) {
+        const SRange range = findDifference();
+        if (range.end == 0) return;
+        if (range.start / kPageSize == (range.end - 1) / kPageSize) return writePage(range);
+    }
+    replaceFile();
+}
+
+} // namespace filetag::taglib

@@ -1,0 +1,65 @@
+#include "filetag/taglib/TagLibTag.h"
+
+#include "filetag/taglib/Texts.h"
+#include "peru/Errors.h"
+#include "peru/IPathes.h"
+#include "peru/IStringLocalizer.h"
+
+#include <utility>
+
+namespace filetag::taglib {
+
+using namespace peru;
+
+void CTagLibTag::open() {
+    close();
+    auto stream = std::make_unique<CTagLibIOStream>(m_uri);
+    std::unique_ptr<TagLib::File> file = openFile(*stream);
+    if (!file) throw CFileFormatNotSupportedError(m_uri);
+    m_stream = std::move(stream);
+    m_file = std::move(file);
+}
+
+void CTagLibTag::close() {
+    dropTags();
+    m_file.reset();
+    m_stream.reset();
+    m_changed = false;
+}
+
+void CTagLibTag::store() {
+    if (!m_stream)
+        throw CFileError(localize("filetag.CTagLibTag.NotOpened", "The tag of '%FILE%' is not open.",
+                                  {{"%FILE%", getShownName(m_uri)}}),
+                         m_uri);
+    // The stream goes in any case: after an error the objects and the file no longer tell the same.
+    const std::unique_ptr<CTagLibIOStream> stream = std::move(m_stream);
+    // Without this TagLib would still bring an old kind of tag up to date.
+    if (!std::exchange(m_changed, false)) return;
+    if (!save(*m_file))
+        throw CFileError(localize("filetag.CTagLibTag.StoreError", "The tag of '%FILE%' could not be stored.",
+                                  {{"%FILE%", getShownName(m_uri)}}),
+                         m_uri);
+    stream->commit();
+}
+
+void CTagLibTag::set(EField field, const CStringArg& text) {
+    if (!m_file) return;
+    writeField(field, toTagText(text));
+    markChanged();
+}
+
+P<IString> CTagLibTag::get(EField field) const {
+    return m_file ? fromTagText(readField(field)) : CString::empty();
+}
+
+void CTagLibTag::replaceCoverArt(int32_t index, const P<CMemoryBlock>& data, const CStringArg& mimeType,
+                                 EPictureType type) {
+    const P<ICoverArt> picture = getCoverArt(index);
+    if (!picture) return;
+    picture->setData(data);
+    picture->setMimeType(mimeType);
+    picture->setPictureType(type);
+}
+
+} // namespace filetag::taglib

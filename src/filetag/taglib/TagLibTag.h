@@ -1,0 +1,71 @@
+// What the tags on top of TagLib have in common.
+#pragma once
+
+#include "filetag/ICoverArtFileTag.h"
+#include "filetag/taglib/TagLibIOStream.h"
+#include "peru/Object.h"
+
+#include <tfile.h>
+
+#include <memory>
+
+namespace filetag::taglib {
+
+enum class EField { title, artist, album, albumArtist, trackNumber, year, genre, comment };
+
+// A derived class maps fields and pictures to its format; its destructor closes. Before open, and for a file
+// without a tag, fields are empty and there are no pictures.
+class CTagLibTag : public peru::CObject, public ICoverArtFileTag {
+public:
+    bool isOpened() const override { return m_file != nullptr; }
+    void open() override;
+    void close() override;
+    P<peru::IURI> getURI() const override { return m_uri; }
+    void store() override;
+
+    void setTitle(const peru::CStringArg& title) override { set(EField::title, title); }
+    P<peru::IString> getTitle() const override { return get(EField::title); }
+    void setArtist(const peru::CStringArg& artist) override { set(EField::artist, artist); }
+    P<peru::IString> getArtist() const override { return get(EField::artist); }
+    void setAlbum(const peru::CStringArg& album) override { set(EField::album, album); }
+    P<peru::IString> getAlbum() const override { return get(EField::album); }
+    void setAlbumArtist(const peru::CStringArg& artist) override { set(EField::albumArtist, artist); }
+    P<peru::IString> getAlbumArtist() const override { return get(EField::albumArtist); }
+    void setTrackNumber(const peru::CStringArg& number) override { set(EField::trackNumber, number); }
+    P<peru::IString> getTrackNumber() const override { return get(EField::trackNumber); }
+    void setYear(const peru::CStringArg& year) override { set(EField::year, year); }
+    P<peru::IString> getYear() const override { return get(EField::year); }
+    void setGenre(const peru::CStringArg& genre) override { set(EField::genre, genre); }
+    P<peru::IString> getGenre() const override { return get(EField::genre); }
+    void setComment(const peru::CStringArg& comment) override { set(EField::comment, comment); }
+    P<peru::IString> getComment() const override { return get(EField::comment); }
+
+    void replaceCoverArt(int32_t index, const P<peru::CMemoryBlock>& data, const peru::CStringArg& mimeType,
+                         EPictureType type) override;
+
+    // For pictures, which write through: something is to be stored.
+    void markChanged() const { m_changed = true; }
+
+protected:
+    explicit CTagLibTag(const P<peru::IURI>& file) : m_uri(file) {}
+
+    // Reads the file through the stream, with its audio properties, and fetches the tags. Empty when the
+    // content is of another format.
+    virtual std::unique_ptr<TagLib::File> openFile(TagLib::IOStream& stream) = 0;
+    virtual void dropTags() = 0; // before the file goes
+    // Both are called for an open tag only. The empty text removes the field.
+    virtual TagLib::String readField(EField field) const = 0;
+    virtual void writeField(EField field, const TagLib::String& text) = 0;
+    virtual bool save(TagLib::File& file) { return file.save(); }
+
+private:
+    void set(EField field, const peru::CStringArg& text);
+    P<peru::IString> get(EField field) const;
+
+    P<peru::IURI> m_uri;
+    std::unique_ptr<CTagLibIOStream> m_stream; // gone after store; outlives the file otherwise
+    std::unique_ptr<TagLib::File> m_file;
+    mutable bool m_changed = false;
+};
+
+} // namespace filetag::taglib

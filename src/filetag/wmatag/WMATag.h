@@ -1,0 +1,36 @@
+// The tag of an ASF file, such as WMA.
+#pragma once
+
+#include "filetag/taglib/TagLibTag.h"
+
+#include <asffile.h>
+
+namespace filetag::wmatag {
+
+class FILETAG_API CWMATag : public taglib::CTagLibTag {
+public:
+    explicit CWMATag(const P<peru::IURI>& file);
+    ~CWMATag() override;
+
+    P<peru::IString> getTagType() const override;
+    int32_t getCoverArtCount() const override;
+    P<ICoverArt> getCoverArt(int32_t index) const override;
+    void addCoverArt(const P<peru::CMemoryBlock>& data, const peru::CStringArg& mimeType,
+                     EPictureType type) override;
+    void removeCoverArt(int32_t index) override;
+
+    // Pictures share their content with the tag's; one that was removed is written to in vain.
+    bool holds(const TagLib::ASF::Picture*) const { return isOpened(); }
+
+protected:
+    std::unique_ptr<TagLib::File> openFile(TagLib::IOStream& stream) override;
+    void dropTags() override { m_tag = nullptr; }
+    TagLib::String readField(taglib::EField field) const override;
+    void writeField(taglib::EField field, const TagLib::String& text) override;
+    bool save(TagLib::File& file) override;
+
+private:
+    TagLib::ASF::Tag* m_tag = nullptr; // of the open file
+};
+
+} // namespace filetag::wmatag
