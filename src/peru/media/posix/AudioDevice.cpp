@@ -135,6 +135,8 @@ void CAudioDevice::openStream(const P<CAudioFormat>& audioFormat, PaStreamCallba
         throw CMediaException(
             format(localize("peru.media.CAudioDevice.BitsNotSupported", "%d Bits are not supported"),
                    audioFormat->getBitsPerSample()));
+    // The engine would answer the same, after a word on standard error.
+    if (audioFormat->getChannelCount() > m_maxChannelCount) check(paInvalidChannelCount);
     m_format = audioFormat;
     m_bytesPerFrame = audioFormat->getBytesPerFrame();
     m_started = false;

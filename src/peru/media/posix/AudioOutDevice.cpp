@@ -177,7 +177,12 @@ int CAudioOutDevice::onOutput(const void*, void* output, unsigned long frames,
 void CAudioOutDevice::fill(uint8_t* output, int64_t frames, const PaStreamCallbackTimeInfo& time) {
     // What comes in holds old sound. 0 is silence for every width here.
     std::memset(output, 0, static_cast<size_t>(frames * m_bytesPerFrame));
-    if (!m_signal->wait(kLongestWait)) return;
+    if (!m_signal->wait(0)) {
+        // By the end of a wait the system has run dry, and may drop what it gets before it has noticed. The
+        // sound begins with the next buffer.
+        m_signal->wait(kLongestWait);
+        return;
+    }
     if (m_state != kDeviceRunning) return;
 
     const int64_t wanted = frames * m_bytesPerFrame;

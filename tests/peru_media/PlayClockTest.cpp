@@ -1,0 +1,59 @@
+#include "peru/media/PlayClock.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstdint>
+
+using peru::media::CPlayClock;
+
+TEST(PlayClock, CountsWhatHasBeenHeard) {
+    CPlayClock clock(100.0);
+    EXPECT_EQ(clock.getHeard(5.0), 0.0);
+    clock.add(10.0, 100); // until 11
+    clock.add(11.0, 100); // until 12
+    clock.add(15.0, 50);  // after a pause, until 15.5
+    const struct {
+        double now;
+        double heard;
+    } cases[] = {{9.0, 0},    {10.0, 0},   {10.25, 25},  {11.5, 150}, {11.0, 150}, // clocks do not run back
+                 {13.0, 200}, {14.9, 200}, {15.25, 225}, {15.5, 250}, {1e9, 250}};
+    for (const auto& each : cases) EXPECT_NEAR(clock.getHeard(each.now), each.heard, 1e-6) << each.now;
+}
+
+TEST(PlayClock, ForgetsWhatTheSystemDropped) {
+    CPlayClock clock(100.0);
+    clock.add(10.0, 100);
+    clock.drop(10.5);
+    EXPECT_NEAR(clock.getHeard(20.0), 50.0, 1e-6);
+    // The stream's clock starts anew.
+    clock = CPlayClock(100.0);
+    clock.add(10.0, 100);
+    clock.drop(11.0);
+    clock.add(1.0, 100);
+    EXPECT_NEAR(clock.getHeard(1.5), 150.0, 1e-6);
+}
+
+// Blocks come by the thousand, a few hundred milliseconds ahead, with times that tremble, and are asked about
+// seldom or often.
+TEST(PlayClock, NeverFallsAndReachesTheEnd) {
+    for (int askEvery : {1, 7, 500}) {
+        CPlayClock clock(44100.0);
+        double last = 0.0;
+        int64_t given = 0;
+        uint32_t random = 1;
+        for (int i = 0; i < 5000; ++i) {
+            random = random * 1664525u + 1013904223u;
+            const double now = static_cast<double>(given) / 44100.0;
+            clock.add(now + 0.2 + (random >> 16) * 1e-8, 512);
+            given += 512;
+            if (i % askEvery != 0) continue;
+            const double heard = clock.getHeard(now);
+            ASSERT_GE(heard, last);
+            ASSERT_LE(heard, static_cast<double>(given));
+            ASSERT_NEAR(heard, std::max(0.0, (now - 0.2) * 44100.0), 512.0) << i;
+            last = heard;
+        }
+        EXPECT_EQ(clock.getHeard(1e6), static_cast<double>(given));
+    }
+}
