@@ -112,14 +112,17 @@ static inline size_t TONEWRIGHT_GetTextLength(TONEWRIGHT_Handle handle) {
 typedef void (*TONEWRIGHT_DriveChangedCallback)(void* driveHandle, int32_t event);
 
 /* Progress of a player: duration and position in seconds (0.0 once stopped) and a TONEWRIGHT_PlayerState.
- * Called on the thread in TONEWRIGHT_Player_Play or _Pause; must not call the player. */
+ * Called on the thread in TONEWRIGHT_Player_Play, at least twice a second, and on the one in _Pause; must not
+ * call the player. A C++ exception from it ends the playing, or the pause, as a failed one. */
 typedef void (*TONEWRIGHT_PlayerCallback)(double duration, double position, int32_t state);
 
-/* Progress of a recording in seconds; false ends the recording. Called on the device's thread. Must be quick
- * and must not call the source. */
+/* Progress of a recording in seconds, once for every block of sound; false ends the recording after that
+ * block, and so does a C++ exception. Called on the device's thread. Must be quick and must not call the
+ * source. */
 typedef bool (*TONEWRIGHT_RecordingCallback)(double position);
 
-/* The two levels of the last recorded block, left and right. Called on the device's thread. */
+/* The levels of the last recorded block, left and right from 0.0 to 1.0. Called on the device's thread. Must
+ * be quick and must not call the source; a C++ exception from it ends the recording with the next block. */
 typedef void (*TONEWRIGHT_RecordingVolumeCallback)(double first, double second);
 
 /* Progress of an encoder, 0.0 to 1.0, and a reserved 0; false asks it to stop, which is a normal end. Called
@@ -221,8 +224,13 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromEditorXml(const
                                                                            int32_t channelCount,
                                                                            int32_t bytesPerSample);
 
-/* A closed source that records from a device, a handle around a peru::media::IAudioInDevice. Null for a bad
- * handle or a device that has no fitting format. */
+/* A closed source that records from a device, a handle around a peru::media::IAudioInDevice, which it keeps
+ * alive. Opening it starts the recording, at time 0, and closing it ends it. What the device delivers is kept
+ * until it is read, by an encoder as a rule: that job ends, with all that was recorded, when the recording
+ * callback answers false, when the device has gone, and when it has delivered nothing for 15 seconds. Another
+ * thread may also close the source, which drops what was not read yet. Two channels are recorded and
+ * converted to what is wanted; where anything has to be converted the source can have 1 or 2 bytes per
+ * sample. Null for a bad handle or a device that has no fitting format. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSoureFromAudioInDevice(TONEWRIGHT_Handle device,
                                                                               int32_t sampleRate,
                                                                               int32_t channelCount,
@@ -297,24 +305,35 @@ TONEWRIGHT_API int32_t TONEWRIGHT_AudioEncoder_SetCallback(TONEWRIGHT_Handle enc
 
 /* --- Player -------------------------------------------------------------------------------------- */
 
-/* A stopped player of a file on the default output device, at 44100 Hz, 2 channels, 2 bytes per sample. Null
- * when the device or the file does not serve. */
+/* A stopped player of a file on the default output device, at 44100 Hz, 2 channels, 2 bytes per sample or the
+ * nearest that the device takes. Null when the device or the file does not serve. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreatePlayerFromURI(const char16_t* uri);
 
-/* A stopped player of a source, in the source's own format. Null as above or for a bad handle. */
+/* A stopped player of a source, in the source's own format: nothing is converted, and a device that does not
+ * take that format does not serve. Nobody else may use the source while it plays. Null as above or for a bad
+ * handle. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreatePlayerFromAudioSource(TONEWRIGHT_Handle source);
 
-/* Plays; returns at the end or after a stop from another thread. Result: 0 or 9. */
+/* All functions of a player may be called by any thread at any time. The player stays alive while one runs,
+ * also when its handle is destroyed meanwhile; destroying the last one ends the sound. */
+
+/* Plays from the beginning; returns at the end, when the source is closed again, or after a stop from another
+ * thread. A source that was open when it was handed in is played from where it stands the first time. Up to
+ * half a minute of sound is read ahead. Result: 0; 9 after a failure of source, device or callback, and at
+ * once, with nothing disturbed, while another thread plays this player. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Player_Play(TONEWRIGHT_Handle player);
 
-/* Pauses or goes on. Another thread's call while TONEWRIGHT_Player_Play runs. Result: 0 or 9. */
+/* Pauses or goes on, for another thread while TONEWRIGHT_Player_Play runs. Without a playing thread it starts
+ * the device, and nothing is heard. Result: 0 or 9. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Player_Pause(TONEWRIGHT_Handle player);
 
-/* Stops and waits, 10 seconds at most, until TONEWRIGHT_Player_Play has ended its work. Another thread's
- * call. Result: 0 or 9. */
+/* Stops and waits until TONEWRIGHT_Player_Play, in another thread, has ended its work, which takes half a
+ * second as a rule. Result: 0, at once where nothing plays; 9 when it has not ended in 10 seconds, which is
+ * also what comes of the first stop after TONEWRIGHT_Player_Play has failed while it played. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Player_Stop(TONEWRIGHT_Handle player);
 
-/* Sets or (null) removes the progress callback. Result: 0 or 9. */
+/* Sets or (null) removes the progress callback; a call already under way still ends on the old one. Result:
+ * 0, or 9 for a bad handle. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Player_SetCallback(TONEWRIGHT_Handle player,
                                                      TONEWRIGHT_PlayerCallback callback);
 

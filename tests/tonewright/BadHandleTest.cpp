@@ -94,6 +94,8 @@ void expectNotStarted() {
     EXPECT_EQ(TONEWRIGHT_AudioSource_GetDuration(source.get()), -1.0);
     EXPECT_EQ(TONEWRIGHT_AudioSource_FetchStreamSamples(source.get(), never, 0.01, nullptr), 0);
     EXPECT_FALSE(TONEWRIGHT_getValidCodecExtensions(2));
+    EXPECT_FALSE(TONEWRIGHT_CreatePlayerFromURI(u"file:///a.tst"));
+    EXPECT_FALSE(TONEWRIGHT_CreatePlayerFromAudioSource(source.get()));
     TONEWRIGHT_SetTempExtension(u".part");
     TONEWRIGHT_SetDriveChangedCallback(nullptr);
     TONEWRIGHT_SetLanguageID(u"de-AT");

@@ -1,0 +1,398 @@
+#include "Library.h"
+#include "peru/Errors.h"
+#include "support/ScriptedDevice.h"
+
+#include <gmock/gmock.h>
+
+#include <filesystem>
+#include <random>
+
+namespace {
+
+using namespace tests;
+using testing::Contains;
+using testing::Each;
+using testing::Field;
+using Clock = std::chrono::steady_clock;
+
+double secondsSince(Clock::time_point start) {
+    return std::chrono::duration<double>(Clock::now() - start).count();
+}
+
+template <class Condition> bool becomes(Condition condition) {
+    const Clock::time_point start = Clock::now();
+    while (!condition() && secondsSince(start) < 20.0)
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    return condition();
+}
+
+// What a source of that script delivers, and the closing silence.
+std::string playedBytes(const SFakeSource& script) {
+    CFakeSource source(script);
+    source.open();
+    std::string bytes;
+    while (!source.isEOF()) {
+        const auto chunk = source.getNextAudioChunk();
+        bytes.append(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
+    }
+    const auto silence = static_cast<size_t>(5 * script.rate * script.channels * script.bytesPerSample);
+    return bytes.append(silence, script.bytesPerSample == 1 ? '\x80' : '\0');
+}
+
+// A player and what stands around it.
+struct SPlayer {
+    explicit SPlayer(P<CFakeSource> from, double speed = 200.0)
+        : device(peru::make<CScriptedOutDevice>(speed)), source(std::move(from)) {
+        CScriptedSystem system(device);
+        handle = wrap(source);
+        player.reset(TONEWRIGHT_CreatePlayerFromAudioSource(handle.get()));
+    }
+    explicit SPlayer(const SFakeSource& script, double speed = 200.0)
+        : SPlayer(peru::make<CFakeSource>(script), speed) {}
+
+    int32_t play() { return TONEWRIGHT_Player_Play(player.get()); }
+    int32_t pause() { return TONEWRIGHT_Player_Pause(player.get()); }
+    int32_t stop() { return TONEWRIGHT_Player_Stop(player.get()); }
+    void setCallback(TONEWRIGHT_PlayerCallback callback) {
+        EXPECT_EQ(TONEWRIGHT_Player_SetCallback(player.get(), callback), 0);
+    }
+
+    P<CScriptedOutDevice> device;
+    P<CFakeSource> source;
+    CHandle handle;
+    CHandle player;
+};
+
+struct SReport {
+    double duration, position;
+    int32_t state;
+};
+std::mutex g_mutex;
+std::vector<SReport> g_reports;
+void keepReport(double duration, double position, int32_t state) {
+    std::scoped_lock lock(g_mutex);
+    g_reports.push_back({duration, position, state});
+}
+std::vector<SReport> takeReports() {
+    std::scoped_lock lock(g_mutex);
+    return std::exchange(g_reports, {});
+}
+size_t countReports() {
+    std::scoped_lock lock(g_mutex);
+    return g_reports.size();
+}
+
+void throwInt(double, double, int32_t) {
+    throw 42;
+}
+std::atomic<bool> g_isBlocking{false};
+void blockASecond(double, double, int32_t) {
+    g_isBlocking = true;
+    std::this_thread::sleep_for(std::chrono::seconds(1));
+}
+
+class CChunklessSource : public CFakeSource {
+public:
+    using CFakeSource::CFakeSource;
+    P<sonora2::audio::IAudioChunk> getNextAudioChunk() override { return nullptr; }
+};
+// Tells more than it has.
+class CShortSource : public CFakeSource {
+public:
+    using CFakeSource::CFakeSource;
+    double getDuration() override { return 1e6; }
+};
+
+class Player : public CLibraryTest {
+protected:
+    void SetUp() override {
+        CLibraryTest::SetUp();
+        takeReports();
+    }
+};
+
+TEST_F(Player, Play_DeliversTheSourceUnchangedAndThenSilence) {
+    SFakeSource plain, bytes, wide, slow, empty;
+    plain.frames = 5500;
+    bytes.bytesPerSample = 1;
+    wide.bytesPerSample = 3;
+    wide.channels = 1;
+    slow.chunkFrames = 100; // 0.1 s of sound, which lasts half a millisecond here
+    slow.onRead = [] { std::this_thread::sleep_for(std::chrono::milliseconds(20)); };
+    empty.frames = 0;
+    SFakeSource big;
+    big.rate = 48000;
+    big.frames = 48000 * 60; // more than the queue takes at once
+    big.chunkFrames = 48000;
+
+    std::vector<std::pair<SFakeSource, P<CFakeSource>>> cases;
+    for (const SFakeSource& script : {plain, bytes, wide, slow, empty, big})
+        cases.emplace_back(script, peru::make<CFakeSource>(script));
+    cases.emplace_back(plain, peru::make<CShortSource>(plain));
+
+    std::vector<std::thread> threads;
+    for (const auto& [script, source] : cases)
+        threads.emplace_back([script = script, source = source] {
+            SPlayer p(source);
+            p.setCallback(script.frames == 5500 ? nullptr : keepReport);
+            for (int round = 0; round < 2; ++round) {
+                EXPECT_EQ(p.play(), 0);
+                EXPECT_TRUE(p.device->written() == playedBytes(script)) << script.bytesPerSample;
+                EXPECT_EQ(p.device->getStatus(), 0);
+                EXPECT_FALSE(source->isOpened());
+                EXPECT_EQ(p.stop(), 0) << "nothing is left to be stopped";
+            }
+        });
+    for (std::thread& thread : threads) thread.join();
+}
+
+TEST_F(Player, Play_TellsEveryFailureAndCanBeTriedAgain) {
+    SFakeSource good, wide, unreadable, unopenable;
+    good.frames = 20000;
+    wide.bytesPerSample = 4;
+    unreadable.onRead = [] { throw peru::CError("scratched"); };
+    unopenable.onOpen = [] { throw peru::CError("locked"); };
+    struct SCase {
+        const char* reason;
+        P<CFakeSource> source;
+        TONEWRIGHT_PlayerCallback callback;
+        bool isGone;
+        bool hasPlayed; // then a stop waits in vain
+    };
+    for (const SCase& c : std::initializer_list<SCase>{
+             {"scratched", peru::make<CFakeSource>(unreadable), nullptr, false, true},
+             {"locked", peru::make<CFakeSource>(unopenable), nullptr, false, false},
+             {"CPlayer: source return Chunk=NULL but is not EOF", peru::make<CChunklessSource>(good), nullptr,
+              false, true},
+             {"32 Bits are not supported", peru::make<CFakeSource>(wide), nullptr, false, false},
+             {"the device has gone", peru::make<CFakeSource>(good), nullptr, true, true},
+             {"unknown", peru::make<CFakeSource>(good), throwInt, false, true}}) {
+        SPlayer p(c.source);
+        p.setCallback(c.callback);
+        for (int round = 0; round < 2; ++round) {
+            if (c.isGone) p.device->remove();
+            log->take();
+            EXPECT_EQ(p.play(), 9);
+            EXPECT_THAT(log->take(), Contains(SLine{5, "", c.reason}));
+            EXPECT_EQ(p.device->getStatus(), 0) << c.reason;
+            EXPECT_FALSE(c.source->isOpened()) << c.reason;
+        }
+        const Clock::time_point start = Clock::now();
+        if (!c.hasPlayed) {
+            EXPECT_EQ(p.stop(), 0);
+        }
+        p.player.reset();
+        EXPECT_LT(secondsSince(start), 2.0) << "the end of a player does not wait: " << c.reason;
+    }
+}
+
+TEST_F(Player, Stop_WaitsInVainAfterAFailureOnce) {
+    SPlayer p(SFakeSource{});
+    p.setCallback(throwInt);
+    EXPECT_EQ(p.play(), 9);
+    const Clock::time_point start = Clock::now();
+    EXPECT_EQ(p.stop(), 9);
+    EXPECT_GE(secondsSince(start), 10.0);
+    EXPECT_THAT(log->take(), Contains(SLine{5, "", "playerthread could not be stopped in 10seconds"}));
+    EXPECT_EQ(p.stop(), 0);
+    p.setCallback(nullptr);
+    EXPECT_EQ(p.play(), 0);
+}
+
+TEST_F(Player, Creation_NamesWhatIsMissing) {
+    struct SCase {
+        const char* reason;
+        std::function<void(CScriptedOutDevice&)> change;
+        const char16_t* uri; // null: over a source
+    };
+    const auto none = [](int32_t, int32_t, int32_t) -> P<CAudioFormat> { return nullptr; };
+    const auto other = [](int32_t, int32_t, int32_t) { return peru::make<CAudioFormat>(48000, 2, 16); };
+    const SCase cases[] = {{"CPlayer::init could not open audio device", nullptr, nullptr},
+                           {"CPlayer::init could not open audio device", nullptr, u"file:///a.tst"},
+                           {"CPlayer::init could not find format for audio device",
+                            [&](auto& device) { device.takes = none; }, u"file:///a.tst"},
+                           {"CPlayer::init could not find format for audio device",
+                            [&](auto& device) { device.takes = other; }, nullptr},
+                           {"CPlayer::init could not open source", [](auto&) {}, u"file:///a.unknown"},
+                           {"CPlayer::init could not open source", [](auto&) {}, u"file:///refuse.tst"}};
+    for (const SCase& c : cases) {
+        const auto device = c.change ? peru::make<CScriptedOutDevice>() : nullptr;
+        if (c.change) c.change(*device);
+        CScriptedSystem system(device);
+        log->take();
+        const CHandle source = wrap(peru::make<CFakeSource>(SFakeSource{}));
+        EXPECT_FALSE(CHandle(c.uri ? TONEWRIGHT_CreatePlayerFromURI(c.uri)
+                                   : TONEWRIGHT_CreatePlayerFromAudioSource(source.get())));
+        EXPECT_THAT(log->take(), Contains(SLine{5, "", c.reason}));
+    }
+    // A file is decoded to what the device gives in the place of 44100 Hz in two channels of two bytes.
+    const auto device = peru::make<CScriptedOutDevice>();
+    device->takes = [](int32_t rate, int32_t bytes, int32_t channels) {
+        EXPECT_EQ(std::vector({rate, bytes, channels}), std::vector({44100, 2, 2}));
+        return peru::make<CAudioFormat>(48000, 1, 8);
+    };
+    CScriptedSystem system(device);
+    const CHandle player(TONEWRIGHT_CreatePlayerFromURI(u"file:///a.tst"));
+    EXPECT_EQ(TONEWRIGHT_Player_Play(player.get()), 0);
+    EXPECT_EQ(device->written().size(), 48000u + 5 * 48000u);
+}
+
+TEST_F(Player, StoppedPlayer_AnswersAtOnce) {
+    SPlayer p(SFakeSource{});
+    const Clock::time_point start = Clock::now();
+    EXPECT_EQ(p.stop(), 0);
+    EXPECT_EQ(p.device->opens, 0);
+    p.setCallback(keepReport);
+    EXPECT_EQ(p.pause(), 0);
+    EXPECT_EQ(p.device->getStatus(), 1) << "nothing plays, but the device runs";
+    EXPECT_EQ(takeReports().at(0).state, TONEWRIGHT_PLAYER_PLAYING);
+    EXPECT_EQ(p.stop(), 0);
+    EXPECT_EQ(p.device->getStatus(), 0);
+    EXPECT_LT(secondsSince(start), 2.0);
+    EXPECT_EQ(p.pause(), 0);
+    EXPECT_EQ(p.play(), 0) << "from a running device";
+    EXPECT_TRUE(p.device->written() == playedBytes(SFakeSource{}));
+}
+
+TEST_F(Player, Pause_StopsTheSoundAndLosesNothing) {
+    SFakeSource script;
+    script.frames = 100000;
+    SPlayer p(script, 50.0);
+    p.setCallback(keepReport);
+    std::thread player([&] { EXPECT_EQ(p.play(), 0); });
+    ASSERT_TRUE(becomes([&] { return p.device->getPosition() > 1.0; }));
+    EXPECT_EQ(p.play(), 9) << "it plays already";
+    EXPECT_THAT(log->take(), Contains(SLine{5, "", "CPlayer::play the player is playing already"}));
+    EXPECT_EQ(p.pause(), 0);
+    const double position = p.device->getPosition();
+    takeReports();
+    ASSERT_TRUE(becomes([&] { return countReports() >= 7; })) << "reports go on";
+    for (const SReport& report : takeReports()) {
+        EXPECT_EQ(report.state, TONEWRIGHT_PLAYER_PAUSED);
+        EXPECT_EQ(report.duration, 100.0);
+        EXPECT_EQ(report.position, position);
+    }
+    EXPECT_EQ(p.pause(), 0);
+    player.join();
+    const std::vector<SReport> reports = takeReports();
+    EXPECT_EQ(reports.front().state, TONEWRIGHT_PLAYER_PLAYING);
+    EXPECT_EQ(reports.back().state, TONEWRIGHT_PLAYER_STOPPED);
+    EXPECT_EQ(reports.back().position, 0.0);
+    EXPECT_TRUE(p.device->written() == playedBytes(script));
+    EXPECT_EQ(p.device->opens, 1);
+}
+
+TEST_F(Player, Stop_ReturnsSoonWhateverGoesOn) {
+    SFakeSource script, slow;
+    script.frames = slow.frames = 1 << 30;
+    slow.onRead = [] { std::this_thread::sleep_for(std::chrono::milliseconds(300)); };
+    struct SCase {
+        SFakeSource script;
+        TONEWRIGHT_PlayerCallback callback;
+        int pauses;
+        double limit; // seconds
+    };
+    for (const SCase& c : std::initializer_list<SCase>{{script, nullptr, 0, 2.0},
+                                                       {slow, nullptr, 0, 2.0},
+                                                       {script, nullptr, 1, 2.0},
+                                                       {slow, nullptr, 2, 3.0},
+                                                       {script, blockASecond, 0, 9.0}}) {
+        SPlayer p(c.script, 1.0);
+        p.setCallback(c.callback);
+        g_isBlocking = false;
+        std::thread player([&] { EXPECT_EQ(p.play(), 0); });
+        ASSERT_TRUE(becomes([&] { return c.callback ? g_isBlocking.load() : !p.device->written().empty(); }));
+        p.setCallback(nullptr); // the call under way still ends on the old one
+        const Clock::time_point start = Clock::now();
+        for (int i = 0; i < c.pauses; ++i) EXPECT_EQ(p.pause(), 0);
+        EXPECT_EQ(p.stop(), 0);
+        EXPECT_LT(secondsSince(start), c.limit);
+        EXPECT_EQ(p.device->getStatus(), 0);
+        EXPECT_FALSE(p.source->isOpened());
+        player.join();
+    }
+}
+
+TEST_F(Player, Player_OutlivesItsHandleWhileItPlays) {
+    SFakeSource script;
+    script.frames = 20000;
+    auto p = std::make_unique<SPlayer>(script);
+    const P<CScriptedOutDevice> device = p->device;
+    std::thread player([handle = p->player.get(), &device, &script] {
+        EXPECT_EQ(TONEWRIGHT_Player_Play(handle), 0);
+        EXPECT_TRUE(device->written() == playedBytes(script));
+    });
+    ASSERT_TRUE(becomes([&] { return device->starts > 0; }));
+    p.reset();
+    player.join();
+    EXPECT_FALSE(device->isOpened());
+}
+
+TEST_F(Player, Threads_MayCallEverythingAtOnce) {
+    SFakeSource script;
+    script.frames = 3000;
+    SPlayer p(script);
+    const Clock::time_point start = Clock::now();
+    std::vector<std::thread> threads;
+    for (unsigned seed = 1; seed <= 4; ++seed)
+        threads.emplace_back([&p, start, seed] {
+            std::minstd_rand random(seed);
+            while (secondsSince(start) < 3.0) {
+                switch (random() % 8) {
+                case 0:
+                case 1:
+                    p.play(); // may fail: another thread plays
+                    break;
+                case 2:
+                    EXPECT_EQ(p.stop(), 0);
+                    break;
+                case 3:
+                    p.setCallback(random() % 2 ? keepReport : nullptr);
+                    break;
+                default:
+                    EXPECT_EQ(p.pause(), 0);
+                    std::this_thread::sleep_for(std::chrono::microseconds(random() % 20000));
+                }
+            }
+            EXPECT_EQ(p.stop(), 0); // a play may have been paused by the last of the others
+        });
+    // Who plays when the others are through needs somebody to stop him.
+    std::atomic<bool> isDone{false};
+    std::thread last([&] {
+        while (!isDone) {
+            if (secondsSince(start) > 3.0) p.stop();
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        }
+    });
+    for (std::thread& thread : threads) thread.join();
+    isDone = true;
+    last.join();
+    EXPECT_EQ(p.stop(), 0);
+    EXPECT_EQ(p.device->overlaps, 0);
+    EXPECT_EQ(p.play(), 0);
+    EXPECT_TRUE(p.device->written() == playedBytes(script));
+}
+
+TEST_F(Player, Players_LeaveNothingBehind) {
+    const auto count = [](const char* folder) {
+        return std::distance(std::filesystem::directory_iterator(folder), {});
+    };
+    const auto threads = count("/proc/self/task"), files = count("/proc/self/fd");
+    const int sources = CFakeSource::s_alive;
+    SFakeSource script;
+    for (int i = 0; i < 100; ++i) {
+        SPlayer p(script);
+        EXPECT_EQ(p.pause(), 0);
+        if (i % 25 == 0) {
+            EXPECT_EQ(p.play(), 0);
+        }
+        const P<CScriptedOutDevice> device = p.device;
+        p.player.reset();
+        EXPECT_FALSE(device->isOpened());
+    }
+    EXPECT_EQ(count("/proc/self/task"), threads);
+    EXPECT_EQ(count("/proc/self/fd"), files);
+    EXPECT_EQ(CFakeSource::s_alive, sources);
+}
+
+} // namespace
