@@ -1,6 +1,7 @@
 #include "peru/Errors.h"
 #include "peru/StringFormat.h"
 #include "sonora2/common/SampleReader.h"
+#include "tonewright/RecordingAudioSource.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"
@@ -76,8 +77,16 @@ TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromEditorXml(const char16_t*, int
     return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_CreateAudioSourceFromEditorXml", nullptr);
 }
 
-TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSoureFromAudioInDevice(TONEWRIGHT_Handle, int32_t, int32_t, int32_t) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_CreateAudioSoureFromAudioInDevice", nullptr);
+TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSoureFromAudioInDevice(TONEWRIGHT_Handle device, int32_t sampleRate,
+                                                               int32_t channelCount, int32_t bytesPerSample) {
+    return barrier<TONEWRIGHT_Handle>(nullptr, [&]() -> TONEWRIGHT_Handle {
+        const P<peru::media::IAudioInDevice> object = unwrap<peru::media::IAudioInDevice>(device);
+        if (!object) return nullptr;
+        const auto source =
+            peru::make<CRecordingAudioSource>(object, sampleRate, channelCount, bytesPerSample);
+        if (!source->isValid()) return nullptr;
+        return wrap(source);
+    });
 }
 
 uint8_t TONEWRIGHT_AudioSource_IsOpened(TONEWRIGHT_Handle source) {
@@ -116,13 +125,18 @@ double TONEWRIGHT_AudioSource_GetDuration(TONEWRIGHT_Handle source) {
     });
 }
 
-void TONEWRIGHT_AudioSource_SetRecordingCallback(TONEWRIGHT_Handle, TONEWRIGHT_RecordingCallback) {
-    logNotAvailable("TONEWRIGHT_AudioSource_SetRecordingCallback");
+void TONEWRIGHT_AudioSource_SetRecordingCallback(TONEWRIGHT_Handle source,
+                                                 TONEWRIGHT_RecordingCallback callback) {
+    barrier([&] {
+        if (const auto object = unwrap<CRecordingAudioSource>(source)) object->setRecordingCallback(callback);
+    });
 }
 
-void TONEWRIGHT_AudioSource_SetRecordingVolumeCallback(TONEWRIGHT_Handle,
-                                                       TONEWRIGHT_RecordingVolumeCallback) {
-    logNotAvailable("TONEWRIGHT_AudioSource_SetRecordingVolumeCallback");
+void TONEWRIGHT_AudioSource_SetRecordingVolumeCallback(TONEWRIGHT_Handle source,
+                                                       TONEWRIGHT_RecordingVolumeCallback callback) {
+    barrier([&] {
+        if (const auto object = unwrap<CRecordingAudioSource>(source)) object->setVolumeCallback(callback);
+    });
 }
 
 uint8_t TONEWRIGHT_AudioSource_FetchStreamSamples(TONEWRIGHT_Handle source,
