@@ -15,8 +15,10 @@ CChunkReader::CChunkReader(const P<peru::ISeekableInStream>& stream)
         FourCC type;
     } header;
     static_assert(sizeof header == kHeaderSize);
+    header = {};
     m_wave = readAt(0, &header, sizeof header) && header.riff.id == FourCC{'R', 'I', 'F', 'F'} &&
              header.type == FourCC{'W', 'A', 'V', 'E'};
+    m_sizeTold = header.riff.size + static_cast<int64_t>(sizeof header.riff) == m_fileSize;
 }
 
 bool CChunkReader::next(SChunk& chunk) {
@@ -25,7 +27,7 @@ bool CChunkReader::next(SChunk& chunk) {
     const int64_t body = m_offset + static_cast<int64_t>(sizeof header);
     const int64_t left = m_fileSize - body;
     int64_t size = std::min<int64_t>(header.size, left);
-    if (size == 0 && left > 0 && header.id == FourCC{'d', 'a', 't', 'a'} && !isIdAt(body)) size = left;
+    if (size == 0 && !m_sizeTold && header.id == FourCC{'d', 'a', 't', 'a'} && !isIdAt(body)) size = left;
 
     FourCC type{};
     const bool info = header.id == FourCC{'L', 'I', 'S', 'T'} && size > 4 &&

@@ -32,8 +32,8 @@ struct SChunk {
 // follows where a zero stands, with which no id begins, where the last byte of the file stands, and where no
 // id can be read at once but one a byte later.
 //
-// A "data" chunk of size 0 with something behind it that is no chunk was written by a program that never came
-// to tell the size: it reaches to the end of the file.
+// A "data" chunk of size 0 with something behind it that is no chunk, in a file whose own size is not told
+// rightly either, was written by a program that never came to tell sizes: it reaches to the end of the file.
 class CChunkReader {
 public:
     static constexpr int64_t kHeaderSize = 12; // "RIFF", a size, "WAVE"
@@ -54,6 +54,7 @@ private:
     int64_t m_fileSize;
     int64_t m_offset = kHeaderSize;
     bool m_wave = false;
+    bool m_sizeTold = false; // the file is as long as its header says
 };
 
 } // namespace filetag::rifftag

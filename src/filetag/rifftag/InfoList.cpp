@@ -22,9 +22,9 @@ bool CInfoList::getEntry(size_t offset, SEntry& entry) const {
     std::memcpy(&header, &m_chunk[offset], sizeof header);
     const size_t value = offset + kEntryHeader;
     const size_t size = std::min<size_t>(header.size, m_chunk.size() - value);
-    const size_t end = value + size;
-    const bool padded = size % 2 != 0 && end < m_chunk.size() && m_chunk[end] == 0;
-    entry = {offset, size, end + (padded ? 1 : 0)};
+    size_t end = value + size;
+    while (end < m_chunk.size() && m_chunk[end] == 0) ++end;
+    entry = {offset, size, end};
     return true;
 }
 

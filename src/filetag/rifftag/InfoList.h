@@ -11,8 +11,8 @@
 namespace filetag::rifftag {
 
 // A LIST chunk of type INFO in the form that it has in files: "LIST", its size, "INFO", then the entries,
-// each an id, a size and so many bytes. Entries of odd size are written without a pad byte behind them; the
-// one that other programs write is passed over in reading and goes with its entry.
+// each an id, a size and so many bytes. Entries of odd size are written without a pad byte behind them. Other
+// programs write one; as no id begins with a zero, zeros behind an entry are passed over and go with it.
 class FILETAG_API CInfoList {
 public:
     CInfoList(); // without entries
