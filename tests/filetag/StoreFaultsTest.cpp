@@ -1,7 +1,7 @@
 // What is on the disk after a store that went wrong, in every format: the old file or the new one, whole, and
 // nothing else.
 #include "FaultyCalls.h"
-#include "filetag/rifftag/RIFFTag.h"
+#include "filetag/FileTagFactory.h"
 #include "support/Files.h"
 #include "support/Process.h"
 #include "support/TempFolder.h"
@@ -22,7 +22,7 @@ namespace {
 std::string makeSound(const std::filesystem::path& folder, const std::string& extension) {
     const auto wave = folder / "source.wav";
     const auto file = folder / ("made." + extension);
-    tests::run({"sox", "-n", "-r", "22050", "-c", "1", wave, "synth", "0.5", "sine", "440"});
+    tests::run({"sox", "-n", "-r", "22050", "-c", "1", "-b", "16", wave, "synth", "0.5", "sine", "440"});
     const std::string title = "A title of the file's own";
     if (extension == "wav")
         tests::run({"ffmpeg", "-v", "error", "-i", wave, "-metadata", "title=" + title, file});
@@ -58,22 +58,23 @@ protected:
     // The store of a changed title, and an added text that makes the tag larger than it was. It reports
     // "stored" or the error's text.
     std::function<std::string()> prepare() const {
-        const P<filetag::IFileTag> tag = make<filetag::rifftag::CRIFFTag>(tests::toURI(getFile()));
-        tag->open();
+        const P<filetag::IFileTag> tag = make<filetag::CFileTagFactory>()->create(tests::toURI(getFile()));
         tag->setTitle("Another title");
         tag->setComment(CString::fromUTF8(std::string(9000, 'c')));
-        return [tag]() -> std::string {
-            try {
-                tag->store();
-                return "stored";
-            } catch (const CFileError& error) {
-                return tests::text(error.getDescription());
-            } catch (const CException& error) {
-                return "not an error of a file: " + tests::text(error.getDescription());
-            } catch (const std::exception& error) {
-                return std::string("not an error of the system: ") + error.what();
-            }
-        };
+        return [tag] { return report([&tag] { tag->store(); }); };
+    }
+
+    template <class Operation> static std::string report(Operation operation) {
+        try {
+            operation();
+            return "stored";
+        } catch (const CFileError& error) {
+            return tests::text(error.getDescription());
+        } catch (const CException& error) {
+            return "not an error of a file: " + tests::text(error.getDescription());
+        } catch (const std::exception& error) {
+            return std::string("not an error of the system: ") + error.what();
+        }
     }
 
     void expectOldOrNew(const tests::SFaultyRun& run) const {
@@ -142,35 +143,56 @@ TEST_P(StoreFaults, EveryFailingCallLeavesTheOldFileOrTheNewOne) {
 }
 
 TEST_P(StoreFaults, ErrorsOfThePlaceNameTheFile) {
-    const auto inChild = [this](const std::function<void()>& restrict) {
-        const tests::SFaultyRun run = tests::runWithFault({}, [this, & restrict] {
-            const std::function<std::string()> store = prepare();
-            restrict();
-            return store;
-        });
+    const auto expectError = [this](const std::function<std::function<std::string()>()>& prepare) {
+        const tests::SFaultyRun run = tests::runWithFault({}, prepare);
         if (!run.supported) return;
         EXPECT_NE(run.report, "");
         EXPECT_NE(run.report, "stored");
+        std::filesystem::permissions(m_folder.path(), std::filesystem::perms(0700));
+        std::filesystem::permissions(getFile(), std::filesystem::perms(0600));
         expectOldOrNew(run);
     };
-    const auto becomeNobody = [] {
+    // The store, by one to whom the modes of files matter.
+    const auto prepareAsUser = [this] {
+        const std::function<std::string()> store = prepare();
         if (::getuid() == 0 && ::setuid(65534) != 0) ::_exit(1);
+        return store;
+    };
+    const auto setModes = [this](int folder, int file) {
+        std::filesystem::permissions(getFile(), std::filesystem::perms(file));
+        std::filesystem::permissions(m_folder.path(), std::filesystem::perms(folder));
     };
     {
         SCOPED_TRACE("a full disk");
-        inChild([this] {
+        expectError([this] {
+            const std::function<std::string()> store = prepare();
             ::signal(SIGXFSZ, SIG_IGN);
             const rlimit limit{m_old.size() / 2, m_old.size() / 2};
             ::setrlimit(RLIMIT_FSIZE, &limit);
+            return store;
         });
     }
     {
         SCOPED_TRACE("a folder that cannot be written");
-        std::filesystem::permissions(m_folder.path(), std::filesystem::perms(0555));
-        inChild(becomeNobody);
-        std::filesystem::permissions(m_folder.path(), std::filesystem::perms(0755));
+        setModes(0555, 0666);
+        expectError(prepareAsUser);
+    }
+    {
+        SCOPED_TRACE("a file that cannot be written");
+        setModes(0777, 0444);
+        expectError(prepareAsUser);
+    }
+    {
+        SCOPED_TRACE("a file that cannot be read");
+        setModes(0777, 0000);
+        expectError([this]() -> std::function<std::string()> {
+            if (::getuid() == 0 && ::setuid(65534) != 0) ::_exit(1);
+            return [this] {
+                return report([this] { make<filetag::CFileTagFactory>()->create(tests::toURI(getFile())); });
+            };
+        });
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Formats, StoreFaults, testing::Values("wav"),
+INSTANTIATE_TEST_SUITE_P(Formats, StoreFaults, testing::Values("wav", "mp3", "flac", "ogg", "wma"),
                          [](const auto& instance) { return std::string(instance.param); });
