@@ -247,42 +247,39 @@ TEST(RiffTag, LargeFilesAreReadUpToTheLimitOfTheFormat) {
 }
 
 TEST(RiffTag, OtherProgramsReadTextsAndSound) {
-    const char16_t* const texts[] = {u"plain", u"Füße", u"Привет, мир", u"日本語のタイトル",
-                                     u"क ख ग", u"🎵 𝄞 🎷"};
-    const tests::CTempFolder folder;
-    // An odd number of bytes, so that a pad byte follows; 2001 samples of 8 bits, and of 24.
-    for (const char* bits : {"8", "24"}) {
-        const auto file = folder / (std::string(bits) + ".wav");
-        ASSERT_EQ(tests::run({"sox", "-n", "-r", "8000", "-c", "1", "-b", bits, file, "synth", "2001s",
+    const struct {
+        const char* bits; // of 2001 samples: an odd number of bytes, so that a pad byte follows
+        const char16_t* title;
+    } cases[] = {{"8", u"plain"}, {"24", u"Füße"}, {"8", u"Привет, мир"}, {"24", u"日本語のタイトル"},
+                 {"8", u"क ख ग"}, {"24", u"🎵 𝄞 🎷"}};
+    for (const auto& c : cases) {
+        const std::string title = text(CString::fromUTF16(c.title));
+        SCOPED_TRACE(title);
+        const tests::CTempFolder folder;
+        const auto file = folder / "a.wav";
+        ASSERT_EQ(tests::run({"sox", "-n", "-r", "8000", "-c", "1", "-b", c.bits, file, "synth", "2001s",
                               "sine", "440"})
                       .exitCode,
                   0);
-        const auto hear = [&](const char* program) {
-            const auto heard = program == std::string("sox")
-                                   ? tests::run({"sox", file, "-t", "raw", "-"})
-                                   : tests::run({"ffmpeg", "-v", "error", "-i", file, "-f", "s24le", "-"});
-            EXPECT_EQ(heard.exitCode, 0) << heard.err;
-            return heard.out;
+        const auto hear = [&file] {
+            const auto sox = tests::run({"sox", file, "-t", "raw", "-"});
+            const auto ffmpeg = tests::run({"ffmpeg", "-v", "error", "-i", file, "-f", "s24le", "-"});
+            EXPECT_EQ(sox.exitCode + ffmpeg.exitCode, 0) << sox.err << ffmpeg.err;
+            return std::pair(sox.out, ffmpeg.out);
         };
-        const std::string before[] = {hear("sox"), hear("ffmpeg")};
-        ASSERT_FALSE(before[0].empty());
-        for (const char16_t* title : texts) {
-            P<CRIFFTag> tag = openTag(file);
-            const P<IString> expected = CString::fromUTF16(title);
-            SCOPED_TRACE(text(expected));
-            tag->setTitle(title);
-            tag->setArtist("Artist");
-            // exiftool does without the list when it is odd and the file ends there.
-            tag->setComment(text(expected).size() % 2 == 0 ? "odd" : "even");
-            tag->store();
-            EXPECT_EQ(CString::toStdU16String(openTag(file)->getTitle()), title);
-            EXPECT_EQ(hear("sox"), before[0]);
-            EXPECT_EQ(hear("ffmpeg"), before[1]);
-            const auto seen = tests::run({"ffprobe", "-v", "error", "-show_entries",
-                                          "format_tags=title,artist", "-of", "default=nk=1:nw=1", file});
-            EXPECT_EQ(seen.out, text(expected) + "\nArtist\n") << seen.err;
-            const auto exif = tests::run({"exiftool", "-charset", "riff=utf8", "-s3", "-Title", file});
-            EXPECT_EQ(exif.out, text(expected) + "\n") << exif.err;
-        }
+        const auto before = hear();
+        const P<CRIFFTag> tag = openTag(file);
+        tag->setTitle(c.title);
+        tag->setArtist("Artist");
+        // exiftool does without the list when it is odd and the file ends there.
+        tag->setComment(title.size() % 2 == 0 ? "odd" : "even");
+        tag->store();
+        EXPECT_EQ(CString::toStdU16String(openTag(file)->getTitle()), c.title);
+        EXPECT_TRUE(hear() == before);
+        const auto seen = tests::run({"ffprobe", "-v", "error", "-show_entries", "format_tags=title,artist",
+                                      "-of", "default=nk=1:nw=1", file});
+        EXPECT_EQ(seen.out, title + "\nArtist\n") << seen.err;
+        const auto exif = tests::run({"exiftool", "-charset", "riff=utf8", "-s3", "-Title", file});
+        EXPECT_EQ(exif.out, title + "\n") << exif.err;
     }
 }
