@@ -1,0 +1,26 @@
+// The manager of value stores.
+#pragma once
+
+#include "peru/IMutex.h"
+#include "peru/IValueStoreManager.h"
+#include "peru/Object.h"
+#include "peru/SimpleArray.h"
+
+namespace peru {
+
+// Made without factories.
+class PERU_API CValueStoreManager : public CObject, public IValueStoreManager {
+public:
+    CValueStoreManager();
+    ~CValueStoreManager() override;
+
+    P<IValueStore> openStore(const P<IURI>& uri, EStoreAccess access) override;
+    void addFactory(const P<IValueStoreFactory>& factory) override;
+    void removeFactory(const P<IValueStoreFactory>& factory) override;
+
+private:
+    P<IMutex> m_mutex; // guards the array, and is held while the factories are asked
+    TCleaningSimpleArray<P<IValueStoreFactory>> m_factories;
+};
+
+} // namespace peru
