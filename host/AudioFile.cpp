@@ -72,6 +72,12 @@ void checkInput(const fs::path& file) {
     if (::access(file.c_str(), R_OK) != 0) throwSystem(errno);
 }
 
+std::string describe(const SSampleFormat& samples) {
+    return std::to_string(samples.rate) + " Hz, " + std::to_string(samples.channels) +
+           (samples.channels == 1 ? " channel and " : " channels and ") +
+           std::to_string(samples.bytesPerSample * 8) + " bits";
+}
+
 std::string describeKind(const fs::path& file) {
     return file.has_extension() ? file.extension().string() + " files" : "files without an extension";
 }
@@ -124,6 +130,8 @@ COutputPlace::COutputPlace(const fs::path& target, const std::string& temporaryE
         throw std::runtime_error("The folder " + folder.string() +
                                  " cannot be written to: " + std::strerror(errno));
     m_temporary = nameTemporary(m_target, temporaryEnding);
+    if (!replace && ::lstat(m_temporary.c_str(), &status) == 0)
+        throw std::runtime_error(m_temporary.string() + " was left by an earlier run (--force replaces it)");
 }
 
 COutputPlace::~COutputPlace() {

@@ -1,5 +1,6 @@
 #include "Cancel.h"
 
+#include <atomic>
 #include <csignal>
 #include <initializer_list>
 
@@ -8,12 +9,16 @@ namespace host {
 namespace {
 
 volatile std::sig_atomic_t g_cancelled = 0;
+std::atomic<void (*)()> g_react{nullptr};
 
 } // namespace
 
 void watchForCancel() {
     struct sigaction action = {};
-    action.sa_handler = [](int) { g_cancelled = 1; };
+    action.sa_handler = [](int) {
+        g_cancelled = 1;
+        if (void (*react)() = g_react) react();
+    };
     action.sa_flags = static_cast<int>(SA_RESETHAND);
     sigemptyset(&action.sa_mask);
     for (int signal : {SIGINT, SIGTERM, SIGHUP}) {
@@ -27,6 +32,10 @@ void watchForCancel() {
 
 bool isCancelled() {
     return g_cancelled != 0;
+}
+
+void onCancel(void (*react)()) {
+    g_react = react;
 }
 
 } // namespace host

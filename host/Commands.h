@@ -8,11 +8,7 @@
 
 namespace host {
 
-struct SConvertOptions {
-    std::vector<std::filesystem::path> inputs;
-    std::filesystem::path output;    // of a single input
-    std::string extension;           // or one beside each input
-    std::filesystem::path directory; // ... or in this folder
+struct SFormatOptions {
     std::optional<int> rate;
     std::optional<int> channels;
     std::optional<int> bits;
@@ -20,6 +16,13 @@ struct SConvertOptions {
     int bitRate = 0;               // bits per second
     int minBitRate = 0;
     int maxBitRate = 0;
+};
+
+struct SConvertOptions : SFormatOptions {
+    std::vector<std::filesystem::path> inputs;
+    std::filesystem::path output;    // of a single input
+    std::string extension;           // or one beside each input
+    std::filesystem::path directory; // ... or in this folder
     int jobs = 1;
     bool force = false;
     EOutput show = EOutput::normal;
@@ -33,10 +36,26 @@ struct SWaveformOptions {
     bool force = false;
 };
 
+struct SPlayOptions {
+    std::vector<std::filesystem::path> files;
+    EOutput show = EOutput::normal;
+};
+
+struct SRecordOptions : SFormatOptions {
+    std::filesystem::path output;
+    std::string device; // its id; the default device where empty
+    double seconds = 0; // 0: until it is stopped
+    bool force = false;
+    EOutput show = EOutput::normal;
+};
+
 int convert(CLibrary& library, const SConvertOptions& options);
 int showInfo(CLibrary& library, const std::vector<std::filesystem::path>& files, bool json);
 int listFormats(CLibrary& library, bool json);
 int drawWaveform(CLibrary& library, const SWaveformOptions& options);
+int listDevices(bool json);
+int play(CLibrary& library, const SPlayOptions& options);
+int record(CLibrary& library, const SRecordOptions& options);
 
 // "tonewright: FILE: REASON" on standard error.
 void printFailure(const std::filesystem::path& file, const std::string& reason);

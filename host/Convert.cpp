@@ -31,12 +31,6 @@ bool onProgress(double fraction, int32_t) {
     return !t_running->stopped;
 }
 
-std::string describe(const SSampleFormat& samples) {
-    return std::to_string(samples.rate) + " Hz, " + std::to_string(samples.channels) +
-           (samples.channels == 1 ? " channel and " : " channels and ") +
-           std::to_string(samples.bytesPerSample * 8) + " bits";
-}
-
 class CConverter {
 public:
     CConverter(CLibrary& library, const SConvertOptions& options, CProgress& progress)

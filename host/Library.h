@@ -18,10 +18,19 @@ namespace host {
     X(CreateAudioSourceFromURI)                                                                              \
     X(AudioSource_GetDuration)                                                                               \
     X(AudioSource_FetchStreamSamples)                                                                        \
+    X(CreateAudioSoureFromAudioInDevice)                                                                     \
+    X(AudioSource_Open)                                                                                      \
+    X(AudioSource_SetRecordingCallback)                                                                      \
+    X(AudioSource_SetRecordingVolumeCallback)                                                                \
     X(CreateAudioFormatFromURI)                                                                              \
     X(CreateAudioEncoder)                                                                                    \
     X(AudioEncoder_Encode)                                                                                   \
-    X(AudioEncoder_SetCallback)
+    X(AudioEncoder_SetCallback)                                                                              \
+    X(CreatePlayerFromURI)                                                                                   \
+    X(Player_Play)                                                                                           \
+    X(Player_Pause)                                                                                          \
+    X(Player_Stop)                                                                                           \
+    X(Player_SetCallback)
 
 // One at a time.
 class CLibrary {

@@ -1,16 +1,19 @@
-// tonewright: converts sound files, tells about them and draws them.
+// tonewright: converts, plays and records sound files, tells about them and draws them.
 #include "Cancel.h"
 #include "Commands.h"
+#include "Devices.h"
 #include "HostLog.h"
 #include "Text.h"
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
 #include <functional>
 #include <limits>
 #include <map>
+#include <set>
 #include <thread>
 
 namespace {
@@ -23,6 +26,65 @@ const std::map<std::string, int32_t> kLogLevels{
     {"error", peru::kLogException}, {"off", std::numeric_limits<int32_t>::max()}};
 
 using Run = std::function<int(CLibrary&)>;
+
+// A range lets what is none pass.
+std::string isNumber(const std::string& text) {
+    return std::isnan(std::strtod(text.c_str(), nullptr)) ? "is not a number" : "";
+}
+
+// The options that say what to write.
+void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& widths) {
+    command.add_option("--rate", options.rate, "Sample rate in Hz")
+        ->option_text("HZ")
+        ->check(CLI::Range(1, 768000));
+    command.add_option("--channels", options.channels, "Number of channels")
+        ->option_text("N")
+        ->check(CLI::Range(1, 32));
+    command
+        .add_option("--bits", options.bits,
+                    widths.size() == 4 ? "Bits per sample: 8, 16, 24 or 32" : "Bits per sample: 8, 16 or 24")
+        ->option_text("N")
+        ->check(CLI::IsMember(widths));
+    command
+        .add_option("--quality", options.quality,
+                    "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression")
+        ->option_text("Q")
+        ->check(CLI::Range(0.0, 1.0))
+        ->check(isNumber);
+    const CLI::Range bitRates(1, 100'000'000);
+    const auto units = CLI::AsNumberWithUnit(std::map<std::string, int>{{"k", 1000}},
+                                             CLI::AsNumberWithUnit::CASE_INSENSITIVE);
+    auto* bitRate = command.add_option("--bitrate", options.bitRate, "Bits per second, such as 192k")
+                        ->option_text("N")
+                        ->transform(units)
+                        ->check(bitRates);
+    command.add_option("--min-bitrate", options.minBitRate, "Least bits per second")
+        ->option_text("N")
+        ->transform(units)
+        ->check(bitRates)
+        ->needs(bitRate);
+    command.add_option("--max-bitrate", options.maxBitRate, "Most bits per second")
+        ->option_text("N")
+        ->transform(units)
+        ->check(bitRates)
+        ->needs(bitRate);
+}
+
+void checkBitRates(const SFormatOptions& options) {
+    if (options.minBitRate > options.bitRate)
+        throw CLI::ValidationError("--min-bitrate", "is greater than --bitrate");
+    if (options.maxBitRate > 0 && options.maxBitRate < options.bitRate)
+        throw CLI::ValidationError("--max-bitrate", "is less than --bitrate");
+}
+
+// "--json" and "--quiet".
+void addOutput(CLI::App& app, EOutput& show) {
+    auto* json = app.add_flag_callback(
+        "--json", [&] { show = EOutput::json; }, "Events as JSON, one a line");
+    app.add_flag_callback(
+           "-q,--quiet", [&] { show = EOutput::quiet; }, "Tell failures only")
+        ->excludes(json);
+}
 
 void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
@@ -43,41 +105,7 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
         ->option_text("FOLDER")
         ->needs(to)
         ->check(CLI::ExistingDirectory);
-    command->add_option("--rate", options.rate, "Sample rate in Hz")
-        ->option_text("HZ")
-        ->check(CLI::Range(1, 768000));
-    command->add_option("--channels", options.channels, "Number of channels")
-        ->option_text("N")
-        ->check(CLI::Range(1, 32));
-    command->add_option("--bits", options.bits, "Bits per sample: 8, 16, 24 or 32")
-        ->option_text("N")
-        ->check(CLI::IsMember({8, 16, 24, 32}));
-    command
-        ->add_option("--quality", options.quality,
-                     "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression")
-        ->option_text("Q")
-        ->check(CLI::Range(0.0, 1.0));
-    command->get_option("--quality")->check([](const std::string& text) {
-        return std::isnan(std::strtod(text.c_str(), nullptr)) ? std::string("is not a number")
-                                                              : std::string();
-    });
-    const CLI::Range bitRates(1, 100'000'000);
-    const auto units = CLI::AsNumberWithUnit(std::map<std::string, int>{{"k", 1000}},
-                                             CLI::AsNumberWithUnit::CASE_INSENSITIVE);
-    auto* bitRate = command->add_option("--bitrate", options.bitRate, "Bits per second, such as 192k")
-                        ->option_text("N")
-                        ->transform(units)
-                        ->check(bitRates);
-    command->add_option("--min-bitrate", options.minBitRate, "Least bits per second")
-        ->option_text("N")
-        ->transform(units)
-        ->check(bitRates)
-        ->needs(bitRate);
-    command->add_option("--max-bitrate", options.maxBitRate, "Most bits per second")
-        ->option_text("N")
-        ->transform(units)
-        ->check(bitRates)
-        ->needs(bitRate);
+    addFormat(*command, options, {8, 16, 24, 32});
     options.jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
     command
         ->add_option("-j,--jobs", options.jobs,
@@ -85,12 +113,7 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
         ->option_text("N")
         ->check(CLI::Range(1, 256));
     command->add_flag("-f,--force", options.force, "Replace existing files");
-    auto* json = command->add_flag_callback(
-        "--json", [&] { options.show = EOutput::json; }, "Events as JSON, one a line");
-    command
-        ->add_flag_callback(
-            "-q,--quiet", [&] { options.show = EOutput::quiet; }, "Tell failures only")
-        ->excludes(json);
+    addOutput(*command, options.show);
     command->callback([&] {
         if (options.output.empty() == options.extension.empty())
             throw CLI::RequiredError("Either --output or --to");
@@ -98,10 +121,7 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
             throw CLI::ValidationError("--output", "takes one input; use --to for several");
         if (options.extension == "." || options.extension.find('/') != std::string::npos)
             throw CLI::ValidationError("--to", "takes an extension, such as flac");
-        if (options.minBitRate > options.bitRate)
-            throw CLI::ValidationError("--min-bitrate", "is greater than --bitrate");
-        if (options.maxBitRate > 0 && options.maxBitRate < options.bitRate)
-            throw CLI::ValidationError("--max-bitrate", "is less than --bitrate");
+        checkBitRates(options);
         run = [&](CLibrary& library) { return convert(library, options); };
     });
 }
@@ -134,10 +154,52 @@ void addWaveform(CLI::App& app, SWaveformOptions& options, Run& run) {
     command->callback([&] { run = [&](CLibrary& library) { return drawWaveform(library, options); }; });
 }
 
+void addDevices(CLI::App& app, bool& json, Run& run) {
+    CLI::App* command = app.add_subcommand("devices", "List the sound devices that play and record.");
+    command->add_flag("--json", json, "One JSON object a line");
+    command->callback([&] { run = [&](CLibrary&) { return listDevices(json); }; });
+}
+
+void addPlay(CLI::App& app, SPlayOptions& options, Run& run) {
+    CLI::App* command = app.add_subcommand(
+        "play",
+        "Play sound files on the default device. Space pauses and goes on, q or Ctrl-C stops; a file\n"
+        "that fails is told and the next one goes on.");
+    command->add_option("FILE", options.files, "Files to play")->required()->option_text("...");
+    addOutput(*command, options.show);
+    command->callback([&] { run = [&](CLibrary& library) { return play(library, options); }; });
+}
+
+void addRecord(CLI::App& app, SRecordOptions& options, Run& run) {
+    CLI::App* command = app.add_subcommand(
+        "record", "Record a sound file until q or Ctrl-C, with 44100 Hz, 2 channels and 16 bits unless told\n"
+                  "otherwise. It is written as FILE.part and named FILE at its end; a recording that is cut\n"
+                  "off, by a power failure or a kill, stays as FILE.part and can be played.");
+    command->add_option("-o,--output", options.output, "File to write; its extension selects the format")
+        ->required()
+        ->option_text("FILE");
+    command->add_option("--device", options.device, "Device to record from, by its id in tonewright devices")
+        ->option_text("ID");
+    command->add_option("--seconds", options.seconds, "Stop after that time")
+        ->option_text("S")
+        ->check(CLI::Range(0.001, 1e9))
+        ->check(isNumber);
+    addFormat(*command, options, {8, 16, 24});
+    command->add_flag("-f,--force", options.force, "Replace existing files");
+    addOutput(*command, options.show);
+    command->callback([&] {
+        checkBitRates(options);
+        run = [&](CLibrary& library) { return record(library, options); };
+    });
+}
+
 // What the commands themselves do not catch is no fault of the library.
 int runCommand(const Run& run, CLibrary& library) {
     try {
         return run(library);
+    } catch (const CNoDevice& failure) {
+        std::fprintf(stderr, "tonewright: %s\n", failure.what());
+        return kExitNoDevice;
     } catch (const std::exception& failure) {
         std::error_code error;
         const bool isGone = std::filesystem::current_path(error).empty();
@@ -150,7 +212,7 @@ int runCommand(const Run& run, CLibrary& library) {
 } // namespace
 
 int main(int argc, char** argv) {
-    CLI::App app("Converts sound files, tells about them and draws them.", "tonewright");
+    CLI::App app("Converts, plays and records sound files, tells about them and draws them.", "tonewright");
     app.set_version_flag("--version", "tonewright " TONEWRIGHT_VERSION);
     app.require_subcommand(1);
     app.get_formatter()->column_width(28);
@@ -159,11 +221,14 @@ int main(int argc, char** argv) {
                    "Print the library's log from this level on: trace, debug, info, warning, error or off")
         ->option_text("LEVEL")
         ->transform(CLI::CheckedTransformer(kLogLevels, CLI::ignore_case).description(""));
-    app.footer("Exit codes: 0 all well, 1 a file failed, 2 wrong arguments, 4 the library is missing, 130 "
+    app.footer("Exit codes: 0 all well, 1 a file failed, 2 wrong arguments, 3 no sound device, 4 the library "
+               "is missing, 130 "
                "stopped by Ctrl-C.");
 
     SConvertOptions convertOptions;
     SWaveformOptions waveformOptions;
+    SPlayOptions playOptions;
+    SRecordOptions recordOptions;
     std::vector<std::filesystem::path> infoFiles;
     bool json = false;
     Run run;
@@ -171,6 +236,9 @@ int main(int argc, char** argv) {
     addInfo(app, infoFiles, json, run);
     addFormats(app, json, run);
     addWaveform(app, waveformOptions, run);
+    addDevices(app, json, run);
+    addPlay(app, playOptions, run);
+    addRecord(app, recordOptions, run);
     // Which word was wrong, the parser would not say.
     const auto isMeant = [&](const CLI::App* command) { return command->check_name(argv[1]); };
     if (argc > 1 && argv[1][0] != '-' && app.get_subcommands(isMeant).empty()) {

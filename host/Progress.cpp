@@ -14,16 +14,16 @@ constexpr auto kRedraw = std::chrono::milliseconds(100);
 constexpr auto kPlainLine = std::chrono::seconds(5);
 constexpr size_t kDefaultColumns = 80;
 
-size_t terminalColumns() {
-    winsize size = {};
-    return ::ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 ? size.ws_col : kDefaultColumns;
-}
-
 std::string name(const std::filesystem::path& path) {
     return toPrintable(path.native());
 }
 
 } // namespace
+
+size_t getTerminalColumns() {
+    winsize size = {};
+    return ::ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 ? size.ws_col : kDefaultColumns;
+}
 
 std::string toLine(const nlohmann::json& value) {
     return value.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
@@ -119,7 +119,7 @@ void CProgress::eraseBars() {
 
 void CProgress::drawBars() {
     if (!m_bars) return;
-    const size_t columns = terminalColumns();
+    const size_t columns = getTerminalColumns();
     for (const SJob& job : m_jobs) {
         if (!job.running) continue;
         std::fprintf(stderr, "%s\n", drawBar(job, columns).c_str());
@@ -130,13 +130,7 @@ void CProgress::drawBars() {
 
 std::string CProgress::drawBar(const SJob& job, size_t width) const {
     constexpr size_t kName = 24, kFixed = kName + 18;
-    std::string file = name(job.input.filename());
-    // Cut at a character: continuation bytes take no column.
-    size_t columns = 0, cut = 0;
-    for (; cut < file.size() && columns < kName; ++cut) columns += (file[cut] & 0xC0) != 0x80;
-    while (cut < file.size() && (file[cut] & 0xC0) == 0x80) ++cut;
-    file.resize(cut);
-    file.append(kName - columns, ' ');
+    const std::string file = fitColumns(name(job.input.filename()), kName);
 
     const size_t cells = width > kFixed + 10 ? std::min<size_t>(width - kFixed, 50) : 10;
     const size_t filled = static_cast<size_t>(job.fraction * static_cast<double>(cells));

@@ -63,6 +63,8 @@ private:
     Clock::time_point m_lastDrawn;
 };
 
+size_t getTerminalColumns(); // of standard error
+
 // Names need not be valid UTF-8: what is not becomes U+FFFD.
 std::string toLine(const nlohmann::json& value);
 

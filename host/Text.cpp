@@ -113,6 +113,16 @@ std::string withPaths(std::string_view message) {
     return result;
 }
 
+std::string fitColumns(std::string text, size_t columns) {
+    // Cut at a character: continuation bytes take no column.
+    const auto continues = [&](size_t at) { return at < text.size() && (text[at] & 0xC0) == 0x80; };
+    size_t taken = 0, cut = 0;
+    for (; cut < text.size() && (taken < columns || continues(cut)); ++cut) taken += !continues(cut);
+    text.resize(cut);
+    text.append(columns - taken, ' ');
+    return text;
+}
+
 void replaceAll(std::string& text, const std::string& what, const std::string& with) {
     if (what.empty()) return;
     for (size_t at = 0; (at = text.find(what, at)) != std::string::npos; at += with.size())

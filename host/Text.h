@@ -18,6 +18,8 @@ std::string toPrintable(std::string_view text);
 std::string withPaths(std::string_view message);
 // A plug-in's reason as it reads behind the name of the file that it is about: that name is not told twice.
 std::string asReason(std::string message, const std::filesystem::path& about);
+// Cut, or filled with blanks, to so many columns of a terminal.
+std::string fitColumns(std::string text, size_t columns);
 void replaceAll(std::string& text, const std::string& what, const std::string& with);
 
 // Of what was printed to standard output. False when its reader has left; throws std::runtime_error when it

@@ -18,6 +18,7 @@ struct SProcessResult {
     std::string out;
     std::string err;
     long peakMemory = 0; // kB resident, of the program and of what it waited for
+    double cpuSeconds = 0;
 };
 
 // A child whose output goes to two files that are gone from the disk at once. Killed at the end of the block.
@@ -69,10 +70,13 @@ public:
         ::wait4(m_id, &status, 0, &usage);
         m_id = -1;
         return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), read(m_out), read(m_err),
-                usage.ru_maxrss};
+                usage.ru_maxrss, toSeconds(usage.ru_utime) + toSeconds(usage.ru_stime)};
     }
 
 private:
+    static double toSeconds(const timeval& time) {
+        return static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_usec) / 1e6;
+    }
     static int makeFile() {
         std::string name = "/tmp/tonewright-output-XXXXXX";
         const int file = ::mkostemp(name.data(), O_CLOEXEC);

@@ -1,0 +1,181 @@
+#include "AudioFile.h"
+#include "Cancel.h"
+#include "Commands.h"
+#include "Devices.h"
+#include "HostLog.h"
+#include "Keyboard.h"
+#include "LiveLine.h"
+#include "Text.h"
+
+#include <algorithm>
+#include <atomic>
+#include <cstdio>
+#include <cstdlib>
+#include <memory>
+#include <stdexcept>
+#include <thread>
+
+namespace host {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+constexpr int kPollMilliseconds = 50;
+
+// What the player last told. The callback has no word of its own for the caller; one player plays at a time.
+struct STold {
+    std::atomic<double> duration{0};
+    std::atomic<double> position{0};
+    std::atomic<int32_t> state{TONEWRIGHT_PLAYER_STOPPED};
+};
+STold g_told;
+
+void onPlayer(double duration, double position, int32_t state) {
+    g_told.duration = duration;
+    if (state != TONEWRIGHT_PLAYER_STOPPED) g_told.position = position; // else it is told as 0
+    g_told.state = state;
+}
+
+// Every thread that has to do with a player shares this. A stop that meets a player whose playing fails takes
+// ten seconds: nobody waits for that thread.
+class CSession {
+public:
+    CSession(CLibrary& library, CHandle player) : m_library(library), m_player(std::move(player)) {
+        ++s_alive;
+        g_told.duration = g_told.position = 0;
+        g_told.state = TONEWRIGHT_PLAYER_STOPPED;
+        m_library.Player_SetCallback(m_player.get(), onPlayer);
+    }
+    ~CSession() {
+        m_player.reset();
+        --s_alive;
+    }
+    CSession(const CSession&) = delete;
+    CSession& operator=(const CSession&) = delete;
+
+    static bool isAnyAlive() { return s_alive > 0; }
+
+    void play() { // returns at the end
+        CHostLog::takeReason();
+        m_failed = m_library.Player_Play(m_player.get()) != TONEWRIGHT_OK;
+        if (m_failed) {
+            m_reason = CHostLog::takeReason();
+            m_library.Player_SetCallback(m_player.get(), nullptr);
+        }
+        m_ended = true;
+    }
+    bool hasEnded() const { return m_ended; }
+    bool hasFailed() const { return m_failed; }
+    const std::string& getReason() const { return m_reason; }
+
+    // Before playing has begun there is nothing to pause.
+    void togglePause() {
+        if (g_told.state != TONEWRIGHT_PLAYER_STOPPED && !m_ended) m_library.Player_Pause(m_player.get());
+    }
+    void stop() { m_library.Player_Stop(m_player.get()); } // waits for play() to end
+
+private:
+    CLibrary& m_library;
+    CHandle m_player;
+    std::string m_reason;
+    bool m_failed = false;
+    std::atomic<bool> m_ended{false}; // publishes the two above
+    static inline std::atomic<int> s_alive{0};
+};
+
+class CJukebox {
+public:
+    CJukebox(CLibrary& library, EOutput show) : m_library(library), m_line(show, "input") {}
+
+    // Returns at the end of the file; false when it failed.
+    bool play(const fs::path& file);
+    bool isStopped() const { return m_stopped || isCancelled(); }
+
+private:
+    void watch(const std::shared_ptr<CSession>& session);
+    void show();
+
+    CLibrary& m_library;
+    CKeyboard m_keyboard;
+    CLiveLine m_line;
+    bool m_stopped = false; // by its key
+};
+
+void CJukebox::show() {
+    const bool isPaused = g_told.state == TONEWRIGHT_PLAYER_PAUSED;
+    const double duration = g_told.duration, position = std::min<double>(g_told.position, duration);
+    const std::string at = formatDuration(position), all = formatDuration(duration);
+    m_line.update(
+        at + " / " + all + (isPaused ? "  paused" : ""), at + " of " + all,
+        {{"position", position}, {"duration", duration}, {"state", isPaused ? "paused" : "playing"}});
+}
+
+// Shows and obeys until playing has ended.
+void CJukebox::watch(const std::shared_ptr<CSession>& session) {
+    std::thread stopper;
+    while (!session->hasEnded()) {
+        const char key = m_keyboard.wait(kPollMilliseconds);
+        m_stopped = m_stopped || key == 'q' || key == 'Q';
+        if (key == ' ') session->togglePause();
+        // A player that has not begun yet would not hear it.
+        const bool hasBegun = g_told.state != TONEWRIGHT_PLAYER_STOPPED;
+        if (isStopped() && hasBegun && !stopper.joinable())
+            stopper = std::thread([session] { session->stop(); });
+        if (hasBegun && m_line.isDue()) show();
+    }
+    if (!stopper.joinable()) return;
+    if (session->hasFailed())
+        stopper.detach();
+    else
+        stopper.join();
+}
+
+bool CJukebox::play(const fs::path& file) {
+    const auto started = std::chrono::steady_clock::now();
+    m_line.start(file, nlohmann::json::object());
+    try {
+        checkInput(file);
+        CHostLog::takeReason();
+        CHandle player(m_library.CreatePlayerFromURI(toURI(file).c_str()));
+        if (!player) throw std::runtime_error(CHostLog::takeReadReason(file));
+        auto session = std::make_shared<CSession>(m_library, std::move(player));
+        std::thread thread([session] { session->play(); });
+        watch(session);
+        thread.join();
+        if (session->hasFailed()) {
+            const std::string& reason = session->getReason();
+            throw std::runtime_error(reason.empty() ? "It cannot be played" : asReason(reason, file));
+        }
+    } catch (const std::exception& failure) {
+        m_line.fail(failure.what());
+        return false;
+    }
+    const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
+    if (isStopped())
+        m_line.cancel({{"position", g_told.position.load()}});
+    else
+        m_line.finish(formatDuration(g_told.duration) + " played",
+                      {{"duration", g_told.duration.load()}, {"seconds", elapsed.count()}});
+    return true;
+}
+
+} // namespace
+
+int play(CLibrary& library, const SPlayOptions& options) {
+    requireOutDevice();
+    bool failed = false;
+    {
+        CJukebox jukebox(library, options.show);
+        for (const fs::path& file : options.files) {
+            failed = !jukebox.play(file) || failed;
+            if (jukebox.isStopped()) break;
+        }
+    }
+    const int code = isCancelled() ? kExitCancelled : failed ? kExitFailure : kExitSuccess;
+    if (!CSession::isAnyAlive()) return code;
+    std::fflush(nullptr);
+    std::_Exit(code);
+}
+
+} // namespace host

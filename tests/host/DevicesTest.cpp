@@ -1,0 +1,52 @@
+#include "host/Sound.h"
+
+using namespace tests;
+
+namespace {
+
+class Devices : public CSoundTest {
+protected:
+    Devices() : CSoundTest(EMicrophone::isolated) {}
+};
+
+} // namespace
+
+TEST_F(Devices, AreListedWithTheirDefaults) {
+    std::set<std::string> defaults, names;
+    for (const nlohmann::json& device : parseLines(succeed({"devices", "--json"}))) {
+        const std::string direction = device["direction"];
+        names.insert(direction + " " + device["name"].get<std::string>());
+        if (device["default"]) defaults.insert(direction + " " + device["name"].get<std::string>());
+        EXPECT_FALSE(device["id"].get<std::string>().empty());
+        EXPECT_FALSE(device["api"].get<std::string>().empty());
+        EXPECT_GE(device["channels"], 2);
+    }
+    EXPECT_EQ(defaults, (std::set<std::string>{"output default", "input default"}));
+    EXPECT_EQ(names.count("input microphone"), 1u);
+
+    const std::string table = succeed({"devices"});
+    for (const char* word : {"direction", "output", "input", "default", "microphone"})
+        EXPECT_NE(table.find(word), std::string::npos) << table;
+}
+
+TEST_F(Devices, AreMissedInOneLine) {
+    server.kill();
+    write("in.wav", makeTone(44100, 2, 16, 0.1));
+    const std::vector<std::vector<std::string>> commands{
+        {"devices"}, {"devices", "--json"}, {"play", "in.wav"}, {"record", "-o", "out.wav"}};
+    for (const std::vector<std::string>& command : commands) {
+        const SProcessResult result = tonewright(command);
+        EXPECT_EQ(result.exitCode, 3);
+        EXPECT_EQ(result.out, "");
+        EXPECT_EQ(result.err.substr(0, 21), "tonewright: There is ") << result.err;
+        EXPECT_EQ(result.err.find('\n'), result.err.size() - 1) << result.err;
+    }
+    EXPECT_EQ(list(), std::set<std::string>{"in.wav"});
+}
+
+TEST_F(Devices, ThatDoNotExistAreNotRecorded) {
+    const SProcessResult result = tonewright({"record", "-o", "out.wav", "--device", "4711"});
+    EXPECT_EQ(result.exitCode, 3);
+    EXPECT_NE(result.err.find("4711"), std::string::npos) << result.err;
+    EXPECT_EQ(list(), std::set<std::string>{});
+}

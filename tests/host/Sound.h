@@ -1,0 +1,69 @@
+// The program under test with a sound card.
+#pragma once
+
+#include "host/Program.h"
+#include "host/Terminal.h"
+#include "support/SoundServer.h"
+
+#include <chrono>
+#include <memory>
+#include <string>
+#include <thread>
+
+namespace tests {
+
+class CSoundTest : public CProgramTest {
+protected:
+    using Clock = std::chrono::steady_clock;
+
+    explicit CSoundTest(EMicrophone microphone) : server(microphone) {}
+
+    // With its events in a file and its keys on a terminal.
+    std::unique_ptr<CTerminal> start(std::vector<std::string> arguments) {
+        arguments.insert(arguments.begin(), kProgram);
+        arguments.push_back("--json");
+        return std::make_unique<CTerminal>(arguments, CTerminal::EOutput::file, folder.path(),
+                                           programEnvironment());
+    }
+    static std::vector<nlohmann::json> eventsOf(const std::string& text) {
+        return parseLines(text.substr(0, text.rfind('\n') + 1)); // the last may be under way
+    }
+    // Waits for the first event that serves; null when the program ends before.
+    template <class Condition> static nlohmann::json waitFor(CProcess& process, Condition serves) {
+        for (bool running = true; running;) {
+            running = process.isRunning();
+            for (const nlohmann::json& event : eventsOf(process.readOut()))
+                if (serves(event)) return event;
+            std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        }
+        ADD_FAILURE() << "the program ended before: " << process.readOut();
+        return nullptr;
+    }
+    static nlohmann::json waitForPosition(CProcess& process, double seconds) {
+        return waitFor(process, [&](const auto& event) {
+            return event["event"] == "progress" && event["position"] >= seconds;
+        });
+    }
+    static double since(Clock::time_point start) {
+        return std::chrono::duration<double>(Clock::now() - start).count();
+    }
+    // Every value a sample can have but zero, which is what silence is made of.
+    static SSound makeLoudNoise(double seconds) {
+        SSound sound =
+            makeNoise(CSoundServer::kRate, 2, 16, static_cast<size_t>(seconds * CSoundServer::kRate));
+        for (size_t i = 0; i < sound.samples.size(); i += 2) sound.samples[i] |= 1;
+        return sound;
+    }
+    // Without the silence at both ends.
+    static std::string trim(const std::string& samples) {
+        const size_t first = samples.find_first_not_of('\0');
+        if (first == std::string::npos) return {};
+        const size_t start = first / CSoundServer::kFrameBytes * CSoundServer::kFrameBytes;
+        const size_t end = samples.find_last_not_of('\0') / CSoundServer::kFrameBytes + 1;
+        return samples.substr(start, end * CSoundServer::kFrameBytes - start);
+    }
+
+    CSoundServer server;
+};
+
+} // namespace tests
