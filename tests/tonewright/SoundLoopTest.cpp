@@ -1,0 +1,56 @@
+#include "Library.h"
+#include "peru/media/ISystem.h"
+#include "support/SoundServer.h"
+#include "tonewright/RecordingAudioSource.h"
+
+namespace {
+
+using namespace tests;
+
+// Without the frames of silence before, behind, and where a busy machine is late for the next buffer: nothing
+// that is played here is silent.
+std::string withoutSilence(const std::string& sound) {
+    std::string left;
+    for (size_t at = 0; at + 4 <= sound.size(); at += 4)
+        if (sound.compare(at, 4, std::string(4, '\0')) != 0) left.append(sound, at, 4);
+    return left;
+}
+
+// A server whose input hears what its output plays.
+TEST(SoundLoop, Player_IsHeardWholeByARecording) {
+    CSoundServer server;
+    ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK);
+    SFakeSource script;
+    script.rate = script.frames = CSoundServer::kRate;
+    script.chunkFrames = 4000;
+    {
+        auto ear = peru::make<CRecordingAudioSource>(peru::media::getSystem()->getDefaultInDevice(),
+                                                     CSoundServer::kRate, 2, 2);
+        ASSERT_TRUE(ear->isValid());
+        const CHandle player(
+            TONEWRIGHT_CreatePlayerFromAudioSource(wrap(peru::make<CFakeSource>(script)).get()));
+        ASSERT_TRUE(player);
+        std::string played;
+        auto source = peru::make<CFakeSource>(script);
+        for (source->open(); !source->isEOF();) {
+            const auto chunk = source->getNextAudioChunk();
+            played.append(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
+        }
+        for (int round = 0; round < 2; ++round) {
+            ear->open();
+            const auto start = std::chrono::steady_clock::now();
+            EXPECT_EQ(TONEWRIGHT_Player_Play(player.get()), 0);
+            const auto taken = std::chrono::steady_clock::now() - start;
+            EXPECT_GE(taken, std::chrono::milliseconds(900));
+            EXPECT_LE(taken, std::chrono::seconds(5)) << "the closing silence is not waited for";
+            ear->close();
+            std::string heard;
+            while (const auto chunk = ear->getNextAudioChunk())
+                heard.append(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
+            EXPECT_TRUE(withoutSilence(heard) == played) << heard.size() << " bytes were heard";
+        }
+    }
+    TONEWRIGHT_DeInitAll();
+}
+
+} // namespace
