@@ -131,18 +131,19 @@ TEST_F(Player, Play_DeliversTheSourceUnchangedAndThenSilence) {
     cases.emplace_back(plain, peru::make<CShortSource>(plain));
 
     std::vector<std::thread> threads;
-    for (const auto& [script, source] : cases)
-        threads.emplace_back([script = script, source = source] {
-            SPlayer p(source);
-            p.setCallback(script.frames == 5500 ? nullptr : keepReport);
+    for (const auto& [script, source] : cases) {
+        auto player = std::make_shared<SPlayer>(source);
+        player->setCallback(script.frames == 5500 ? nullptr : keepReport);
+        threads.emplace_back([p = std::move(player), script = script] {
             for (int round = 0; round < 2; ++round) {
-                EXPECT_EQ(p.play(), 0);
-                EXPECT_TRUE(p.device->written() == playedBytes(script)) << script.bytesPerSample;
-                EXPECT_EQ(p.device->getStatus(), 0);
-                EXPECT_FALSE(source->isOpened());
-                EXPECT_EQ(p.stop(), 0) << "nothing is left to be stopped";
+                EXPECT_EQ(p->play(), 0);
+                EXPECT_TRUE(p->device->written() == playedBytes(script)) << script.bytesPerSample;
+                EXPECT_EQ(p->device->getStatus(), 0);
+                EXPECT_FALSE(p->source->isOpened());
+                EXPECT_EQ(p->stop(), 0) << "nothing is left to be stopped";
             }
         });
+    }
     for (std::thread& thread : threads) thread.join();
 }
 
