@@ -33,7 +33,11 @@ void CAudioInDevice::open(const P<CAudioFormat>& format) {
 void CAudioInDevice::start() {
     CMutexLock lock(m_streamMutex);
     requireOpened();
-    if (m_started) return;
+    if (m_started && !hasGone()) return;
+    // A stream that a listener has ended must be told to stop before it starts again.
+    if (m_started) check(Pa_StopStream(m_stream));
+    m_started = false;
+    m_position = 0.0;
     startStream();
     m_startTime = Pa_GetStreamTime(m_stream);
 }

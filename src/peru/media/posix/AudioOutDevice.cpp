@@ -189,7 +189,7 @@ void CAudioOutDevice::fill(uint8_t* output, int64_t frames, const PaStreamCallba
     int64_t size = m_source ? readSource(output, wanted) : 0;
     {
         CMutexLock lock(m_queueMutex);
-        if (!m_source) {
+        if (!m_source && m_queue) {
             // A frame of which only a part was written waits for the rest.
             const int64_t whole = m_queue->getAvailable() / m_bytesPerFrame * m_bytesPerFrame;
             size = m_queue->readSome(output, std::min(wanted, whole));
