@@ -68,17 +68,20 @@ function(tw_benchmark name)
     target_link_libraries(${name} PRIVATE ${ARGN} benchmark::benchmark benchmark::benchmark_main)
 endfunction()
 
-# tw_fuzzer(NAME source... LIBRARIES lib...): a libFuzzer target; its seeds are in fuzz/corpus/NAME. The test runs
-# it over the seeds and a bounded number of inputs made from them, which are kept in the build folder.
+# tw_fuzzer(NAME source... LIBRARIES lib... [RUNS count]): a libFuzzer target; its seeds are in fuzz/corpus/NAME.
+# The test runs it over the seeds and a bounded number of inputs made from them, which are kept in the build folder.
 function(tw_fuzzer name)
-    cmake_parse_arguments(arg "" "" "LIBRARIES" ${ARGN})
+    cmake_parse_arguments(arg "" "RUNS" "LIBRARIES" ${ARGN})
+    if(NOT arg_RUNS)
+        set(arg_RUNS 50000)
+    endif()
     add_executable(${name} ${arg_UNPARSED_ARGUMENTS})
     target_link_libraries(${name} PRIVATE ${arg_LIBRARIES})
     target_compile_options(${name} PRIVATE -fsanitize=fuzzer)
     target_link_options(${name} PRIVATE -fsanitize=fuzzer)
     set(found ${CMAKE_BINARY_DIR}/corpus/${name})
     file(MAKE_DIRECTORY ${found})
-    add_test(NAME ${name} COMMAND ${name} -runs=50000 -max_len=4096 -timeout=20 -rss_limit_mb=2048
+    add_test(NAME ${name} COMMAND ${name} -runs=${arg_RUNS} -max_len=4096 -timeout=20 -rss_limit_mb=2048
                                  ${found} ${CMAKE_SOURCE_DIR}/fuzz/corpus/${name})
     set_tests_properties(${name} PROPERTIES LABELS fuzz TIMEOUT 600)
 endfunction()
