@@ -217,8 +217,9 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromURI(const char1
                                                                      int32_t bytesPerSample,
                                                                      int32_t keepOpened);
 
-/* A closed source that mixes the track list told by an editor's XML. Null when the text or one of its files
- * does not serve. */
+/* A closed source that mixes the track list told by an editor's XML, 16-bit samples as a rule. Null for a
+ * text that is no XML, and for numbers or URIs in it that are none. Files are opened when their time comes:
+ * one that cannot be read fails the call that reads the source, and the log tells which one it is. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromEditorXml(const char16_t* xml,
                                                                            int32_t sampleRate,
                                                                            int32_t channelCount,

@@ -1,6 +1,7 @@
 // A time line of tracks.
 #pragma once
 
+#include "peru/IXmlDocument.h"
 #include "sonora2/common/ITrack.h"
 
 #include <cstdint>
@@ -19,6 +20,7 @@ public:
     virtual bool hasMore() = 0; // whether a step would find anything
     // Plays on by one step; false at the end of the list. Throws what a track throws that is due.
     virtual bool step() = 0;
+    virtual P<peru::IXmlDocument> getDebugDocument() = 0; // the state and all tracks
 };
 
 } // namespace sonora2::common

@@ -29,6 +29,7 @@ public:
     void skipToFrame(uint32_t frame) override;
     bool hasMore() override;
     bool step() override;
+    P<peru::IXmlDocument> getDebugDocument() override;
 
 protected:
     enum class EState : uint8_t { closed, requested, playing };
@@ -80,6 +81,7 @@ private:
     void lookAhead();
     double getLookAheadEnd() const;
     void leave(SEntry& entry);
+    void describe(const P<peru::IXmlNode>& node, const SEntry& entry, int sortIndex) const;
     void closeEntry(SEntry& entry) noexcept;
 
     int m_framerateNum;

@@ -1,7 +1,9 @@
 #include "peru/Errors.h"
 #include "peru/StringFormat.h"
 #include "sonora2/common/SampleReader.h"
+#include "tonewright/EditorXml.h"
 #include "tonewright/RecordingAudioSource.h"
+#include "tonewright/TracklistAudioSource.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"
@@ -73,8 +75,14 @@ TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromURI(const char16_t* uri, int32
     });
 }
 
-TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromEditorXml(const char16_t*, int32_t, int32_t, int32_t) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_CreateAudioSourceFromEditorXml", nullptr);
+TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromEditorXml(const char16_t* xml, int32_t sampleRate,
+                                                            int32_t channelCount, int32_t bytesPerSample) {
+    return barrier<TONEWRIGHT_Handle>(nullptr, [&] {
+        const P<CApp> app = requireApp();
+        return wrap(CTracklistAudioSource::create(readEditorXml(toString(xml)), app->getReadPluginHandler(),
+                                                  app->getReadContext()->getLogManager(), sampleRate,
+                                                  channelCount, bytesPerSample));
+    });
 }
 
 TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSoureFromAudioInDevice(TONEWRIGHT_Handle device, int32_t sampleRate,

@@ -1,0 +1,80 @@
+#include "tonewright/EditorXml.h"
+
+#include "peru/Errors.h"
+#include "peru/MemoryIOStream.h"
+#include "peru/StringFormat.h"
+#include "peru/URI.h"
+#include "peru/XmlDocument.h"
+#include "tonewright/TrackModifierFade.h"
+
+#include <cmath>
+
+namespace tonewright {
+
+namespace {
+
+using peru::IXmlNode;
+
+P<peru::IString> readText(const P<IXmlNode>& parent, const char* name) {
+    const P<IXmlNode> child = parent->getChildNode(name);
+    return child ? child->getText() : peru::CString::empty();
+}
+
+double readDouble(const P<IXmlNode>& parent, const char* name, double missing) {
+    const P<peru::IString> text = readText(parent, name);
+    if (text->isEmpty()) return missing;
+    const auto fail = [&](const P<peru::IString>& reason) {
+        throw peru::CParseError(peru::format("%s (%s: \"%s\")", reason, name, text));
+    };
+    double value = missing;
+    try {
+        value = peru::parseDouble(text);
+    } catch (const peru::CParseError& error) {
+        fail(error.getDescription());
+    }
+    if (!std::isfinite(value)) fail(peru::CString::fromUTF8("Not a finite number."));
+    return value;
+}
+
+void readModifiers(const P<IXmlNode>& node, CTrack& track) {
+    for (auto modifiers = node->getChildNodesByName("Modifier"); modifiers.hasMore();) {
+        const P<IXmlNode> fade = modifiers.getNext()->getChildNode("TrackModifierFade");
+        if (!fade) continue;
+        const double timestamp = readDouble(fade, "Timestamp", 0.0);
+        const double duration = readDouble(fade, "Duration", 0.0);
+        const double startValue = readDouble(fade, "StartValue", 1.0);
+        const double endValue = readDouble(fade, "EndValue", 1.0);
+        track.addModifier(peru::make<CTrackModifierFade>(timestamp, startValue, endValue, duration));
+    }
+}
+
+P<CTrack> readTrack(const P<IXmlNode>& node) {
+    const P<CTrack> track = peru::make<CTrack>();
+    track->setTrackStart(readDouble(node, "TrackStart", 0.0));
+    track->setSourceStartTime(readDouble(node, "SourceStartTime", 0.0));
+    track->setSourceEndTime(readDouble(node, "SourceEndTime", 0.0));
+    track->setURI(peru::make<peru::CURI>(readText(node, "Uri")));
+    if (const P<IXmlNode> modifiers = node->getChildNode("Modifiers")) readModifiers(modifiers, *track);
+    return track;
+}
+
+} // namespace
+
+std::vector<P<CTrack>> readEditorXml(const peru::CStringArg& text) {
+    const P<peru::IString> utf8 = peru::CString::fromView(text.getView())->toUTF8String();
+    const P<peru::CMemoryIOStream> stream = peru::make<peru::CMemoryIOStream>();
+    stream->write(utf8->getData(), utf8->getDataSize());
+    stream->reset();
+    const P<peru::IXmlDocument> document = peru::make<peru::CXmlDocument>("1.0", "utf-8");
+    document->parse(stream);
+
+    std::vector<P<CTrack>> tracks;
+    const P<IXmlNode> root = document->getRootNode();
+    const P<IXmlNode> list = root ? root->getChildNode("Tracks") : nullptr;
+    if (!list) return tracks;
+    for (auto nodes = list->getChildNodesByName("Track"); nodes.hasMore();)
+        tracks.push_back(readTrack(nodes.getNext()));
+    return tracks;
+}
+
+} // namespace tonewright

@@ -1,0 +1,55 @@
+// A track of an editor's arrangement as the mixer plays it.
+#pragma once
+
+#include "sonora2/audio/AudioChunkUnifierTrack.h"
+#include "sonora2/common/IPluginHandler.h"
+#include "tonewright/Track.h"
+
+namespace tonewright {
+
+class CTrackModifierFade;
+
+// Has a source while it is opened. One thread at a time; in a track list it lies behind a unifier track,
+// which sees to that.
+class CTracklistAudioTrack : public peru::CObject,
+                             public sonora2::audio::IAudioTrack,
+                             public sonora2::audio::IMediumTimeTrack {
+public:
+    // `index` is the track's place in the document, and its lane in the list.
+    CTracklistAudioTrack(const P<sonora2::common::IPluginHandler>& pluginHandler, const P<CTrack>& track,
+                         int sampleRate, int channelCount, int bytesPerSample, int index);
+    ~CTracklistAudioTrack() override;
+
+    P<peru::IURI> getURI() override; // an empty one
+    void setURI(const P<peru::IURI>& uri) override {}
+    bool isOpened() override { return static_cast<bool>(m_source); }
+    void open() override; // throws CError when no plug-in reads the medium
+    void close() override;
+    int getSortIndex() override { return m_index; }
+    double getStartTime() override { return m_track->getTrackStart(); }
+    double getDuration() override { return m_track->getDuration(); }
+    bool isEnabled() override { return true; }
+    P<peru::IString> getDebugText() override;
+    int getBufferStatus() override { return 100; }
+    // Knows the skip command only, whose time is the medium's; see getMediumTime().
+    void processCommand(const P<sonora2::common::ITrackCommand>& command) override;
+    double getMediumTime(double listTime) const override;
+    int getSampleRate() override { return m_sampleRate; }
+    int getChannelCount() override { return m_channelCount; }
+    int getBytesPerSample() override { return m_bytesPerSample; }
+    // Empty at the end of the medium. Fades work on chunks that lie wholly within them.
+    P<sonora2::audio::IAudioChunk> getNextAudioChunk() override;
+
+private:
+    void applyFade(const CTrackModifierFade& fade, sonora2::audio::IAudioChunk& chunk) const;
+
+    const P<CTrack> m_track;
+    P<sonora2::common::IAudioSource> m_source;
+    const P<sonora2::common::IPluginHandler> m_pluginHandler;
+    const int m_sampleRate;
+    const int m_channelCount;
+    const int m_bytesPerSample;
+    const int m_index;
+};
+
+} // namespace tonewright
