@@ -1,0 +1,378 @@
+#include "tonewright/EditorXml.h"
+
+#include "Library.h"
+#include "host/Wav.h"
+#include "peru/Errors.h"
+#include "sonora2/audio/SonoraContextAudio.h"
+#include "sonora2/common/LogManager.h"
+#include "sonora2/common/PluginHandler.h"
+#include "sonora2/common/TrackCommands.h"
+#include "support/Files.h"
+#include "tonewright/TrackModifierFade.h"
+#include "tonewright/TracklistAudioSource.h"
+#include "tonewright/TracklistAudioTrack.h"
+
+#include <cmath>
+#include <fstream>
+#include <random>
+
+namespace {
+
+using namespace tests;
+using namespace tonewright;
+using sonora2::audio::IAudioChunk;
+
+using Samples = std::vector<int16_t>;
+
+void append(Samples& samples, const P<IAudioChunk>& chunk) {
+    const auto* data = reinterpret_cast<const int16_t*>(chunk->getData());
+    samples.insert(samples.end(), data, data + chunk->getSize() / sizeof(int16_t));
+}
+
+std::string describe(const std::vector<P<CTrack>>& tracks) {
+    std::string text;
+    const auto add = [&](double value) { text += " " + std::to_string(value).substr(0, 5); };
+    for (const P<CTrack>& track : tracks) {
+        text += "[" + tests::text(track->getURI()->getAsString());
+        add(track->getTrackStart());
+        add(track->getSourceStartTime());
+        add(track->getSourceEndTime());
+        for (int32_t i = 0; i < track->getModifierCount(); ++i) {
+            const P<CTrackModifierFade> fade(track->getModifierAt(i));
+            text += " fade";
+            add(fade->getTimestamp());
+            add(fade->getDuration());
+            add(fade->getStartValue());
+            add(fade->getEndValue());
+        }
+        text += "]";
+    }
+    return text;
+}
+
+TEST(EditorXml, Text_BecomesTracks) {
+    struct SCase {
+        const char* xml;
+        const char* tracks;
+    };
+    for (const SCase& c : std::initializer_list<SCase>{
+             {"<?xml version=\"1.0\" encoding=\"utf-8\"?><Project><Tracks><Track><TrackStart>1.5</TrackStart>"
+              "<SourceStartTime>2</SourceStartTime><SourceEndTime>3.25</SourceEndTime>"
+              "<Uri>file:///a%20b.wav</Uri></Track></Tracks></Project>",
+              "[file:///a%20b.wav 1.500 2.000 3.250]"},
+             {"<x><Tracks/></x>", ""},
+             {"<x/>", ""},
+             {"<x><y><Tracks><Track/></Tracks></y></x>", ""},
+             {"<x><Tracks><Track/></Tracks></x>", "[ 0.000 0.000 0.000]"},
+             {"<x><Tracks><Track><TrackStart></TrackStart><TrackStart>9</TrackStart><New>1</New></Track>"
+              "<Other/><Track><Uri>b.mp3</Uri><SourceEndTime>\n -1e-1 \n</SourceEndTime></Track></Tracks>"
+              "<Tracks><Track/></Tracks></x>",
+              "[ 0.000 0.000 0.000][b.mp3 0.000 0.000 -0.10]"},
+             {"<x><Tracks><Track><Modifiers><Modifier><Other/></Modifier><Modifier/><TrackModifierFade/>"
+              "<Modifier><TrackModifierFade/></Modifier><Modifier><TrackModifierFade><Timestamp>1</Timestamp>"
+              "<Duration>2</Duration><StartValue>0.5</StartValue><EndValue>0</EndValue></TrackModifierFade>"
+              "</Modifier></Modifiers></Track></Tracks></x>",
+              "[ 0.000 0.000 0.000 fade 0.000 0.000 1.000 1.000 fade 1.000 2.000 0.500 0.000]"},
+         })
+        EXPECT_EQ(describe(readEditorXml(peru::CString::fromUTF8(c.xml))), c.tracks) << c.xml;
+    EXPECT_EQ(
+        describe(readEditorXml(u"<x><Tracks><Track><Uri>file:///\u00e4.wav</Uri></Track></Tracks></x>")),
+        "[file:///%C3%A4.wav 0.000 0.000 0.000]");
+}
+
+TEST(EditorXml, BadText_IsRefused) {
+    for (const char* xml : {"<x><Tracks></x>", "<x", "no markup",
+                            "<x><Tracks><Track><TrackStart>soon</TrackStart></Track></Tracks></x>",
+                            "<x><Tracks><Track><SourceEndTime>1,5</SourceEndTime></Track></Tracks></x>",
+                            "<x><Tracks><Track><SourceEndTime>inf</SourceEndTime></Track></Tracks></x>",
+                            "<x><Tracks><Track><TrackStart>nan</TrackStart></Track></Tracks></x>"})
+        EXPECT_THROW(readEditorXml(xml), peru::CParseError) << xml;
+    EXPECT_THROW(readEditorXml("<x><Tracks><Track><Uri>http://[</Uri></Track></Tracks></x>"),
+                 peru::CURIFormatError);
+    EXPECT_EQ(errorOf([] {
+                  readEditorXml("<x><Tracks><Track><TrackStart>soon</TrackStart></Track></Tracks></x>");
+              }),
+              "Error parsing floating point value. (TrackStart: \"soon\")");
+}
+
+constexpr int kRate = 1024; // times in powers of two are exact
+constexpr int kStep = 4000;
+
+// Arrangements of media that a plug-in of the tests makes: "<seconds>.tst".
+class Arrangement : public testing::Test {
+protected:
+    Arrangement() {
+        context->addPluginName("none");
+        handler = peru::make<sonora2::common::CPluginHandler>(context);
+        plugin->makeSource = [this](const P<peru::IURI>& uri,
+                                    const auto& params) -> P<sonora2::common::ISource> {
+            if (uri->getAsString()->find("missing").isFound()) return nullptr;
+            SFakeSource script;
+            script.rate = params.nSampleRate;
+            script.channels = params.nChannelCount;
+            script.frames = static_cast<int64_t>(std::stod(text(uri->getAsString())) * script.rate);
+            script.chunkFrames = chunkFrames;
+            return peru::make<CFakeSource>(script, uri);
+        };
+        handler->addPlugin(plugin, plugin);
+    }
+
+    static P<CTrack> makeTrack(const char* uri, double start, double sourceStart, double sourceEnd) {
+        const P<CTrack> track = peru::make<CTrack>();
+        track->setURI(peru::make<peru::CURI>(uri));
+        track->setTrackStart(start);
+        track->setSourceStartTime(sourceStart);
+        track->setSourceEndTime(sourceEnd);
+        return track;
+    }
+    P<CTracklistAudioSource> makeSource(const std::vector<P<CTrack>>& tracks, int rate = kRate) {
+        return CTracklistAudioSource::create(tracks, handler, context->getLogManager(), rate, 1, 2);
+    }
+    static Samples readAll(const P<sonora2::common::IAudioSource>& source) {
+        Samples samples;
+        while (!source->isEOF()) append(samples, source->getNextAudioChunk());
+        return samples;
+    }
+
+    int chunkFrames = 256;
+    P<sonora2::audio::CSonoraContextAudio> context = peru::make<sonora2::audio::CSonoraContextAudio>();
+    P<CFakePlugin> plugin = peru::make<CFakePlugin>("fake", std::initializer_list<const char*>{"tst"});
+    P<sonora2::common::CPluginHandler> handler;
+};
+
+TEST_F(Arrangement, Fade_WorksOnChunksThatLieWhollyInIt) {
+    struct SFade {
+        double timestamp, duration, startValue, endValue;
+    };
+    struct SCase {
+        const char* name;
+        double sourceStart;
+        std::vector<SFade> fades;
+    };
+    // Chunks are a quarter of a second long; after 0.5 the samples are above 2000.
+    for (const SCase& c : std::initializer_list<SCase>{
+             {"aligned", 0.0, {{0.25, 0.25, 0.0, 1.0}}},
+             {"shorter than a chunk", 0.0, {{0.25, 0.2421875, 0.0, 1.0}}},
+             {"over several", 0.0, {{0.125, 1.0, 1.0, 0.25}}},
+             {"counts from the source's start", 0.5, {{0.0, 0.5, 0.0, 1.0}}},
+             {"clips on both sides", 1.0, {{0.0, 4.0, -30.0, 30.0}}},
+             {"two at once", 0.0, {{0.0, 2.0, 0.0, 0.7}, {0.5, 1.0, 1.0, 0.1}}},
+             {"rounded to floats", 0.0, {{0.0, 3.0, 0.1, 0.7}}},
+         }) {
+        SCOPED_TRACE(c.name);
+        const P<CTrack> data = makeTrack("4.tst", 10.0, c.sourceStart, 4.0);
+        for (const SFade& f : c.fades)
+            data->addModifier(
+                peru::make<CTrackModifierFade>(f.timestamp, f.startValue, f.endValue, f.duration));
+        const auto track = peru::make<CTracklistAudioTrack>(handler, data, kRate, 1, 2, 0);
+        EXPECT_FALSE(track->getNextAudioChunk()) << "closed";
+        track->open();
+        int changed = 0;
+        int64_t position = static_cast<int64_t>(c.sourceStart * kRate);
+        for (; const P<IAudioChunk> chunk = track->getNextAudioChunk(); position += 256) {
+            Samples expected;
+            for (int i = 0; i < 256; ++i) expected.push_back(static_cast<int16_t>((position + i) * 4));
+            const Samples plain = expected;
+            for (const SFade& f : c.fades) {
+                const double time = static_cast<double>(position) / kRate,
+                             begin = c.sourceStart + f.timestamp;
+                if (time < begin || time + 0.25 > begin + f.duration) continue;
+                float t = static_cast<float>(time - begin);
+                for (int16_t& sample : expected) {
+                    const float delta = static_cast<float>(f.endValue) - static_cast<float>(f.startValue);
+                    const float gain = static_cast<float>(t / f.duration * delta + f.startValue);
+                    const float product = static_cast<float>(sample) * gain;
+                    sample = product < -32768.0F  ? -32768
+                             : product > 32767.0F ? 32767
+                                                  : static_cast<int16_t>(std::trunc(product));
+                    t += static_cast<float>(1.0 / kRate);
+                }
+            }
+            changed += expected != plain ? 1 : 0;
+            Samples played;
+            append(played, chunk);
+            ASSERT_TRUE(played == expected) << "at frame " << position;
+        }
+        EXPECT_EQ(position, 4 * kRate);
+        EXPECT_EQ(changed > 0, std::string(c.name) != "shorter than a chunk");
+    }
+}
+
+TEST_F(Arrangement, Track_SkipsInItsMedium) {
+    const auto track =
+        peru::make<CTracklistAudioTrack>(handler, makeTrack("4.tst", 10.0, 1.0, 3.0), kRate, 1, 2, 7);
+    EXPECT_EQ(track->getSortIndex(), 7);
+    EXPECT_EQ(track->getMediumTime(10.5), 1.5);
+    track->processCommand(peru::make<sonora2::common::CSkipToTimeCommand>(2.0));
+    track->open();
+    const auto first = [&] { return *reinterpret_cast<int16_t*>(track->getNextAudioChunk()->getData()); };
+    EXPECT_EQ(first(), 1024 * 4) << "the source's start";
+    track->processCommand(peru::make<sonora2::common::CSkipToTimeCommand>(2.0));
+    EXPECT_EQ(first(), 2048 * 4);
+    track->processCommand(peru::make<sonora2::common::CEnableTrackCommand>("", false));
+    EXPECT_EQ(first(), 2304 * 4) << "knows no other command";
+}
+
+TEST_F(Arrangement, Source_PlaysTracksOverASilentBed) {
+    const double step = static_cast<double>(kStep) / kRate;
+    const P<CTracklistAudioSource> source = makeSource(
+        {makeTrack("60.tst", 4 * step, 1.0, 1.0 + step), makeTrack("60.tst", 0.0, 0.5, 0.5 + step)});
+    EXPECT_EQ(source->getDuration(), std::round(5 * step * 1000.0) / 1000.0);
+    EXPECT_EQ(text(source->getPluginName()), "XMLAudioSource");
+    EXPECT_EQ(text(source->getAudioStreamInfos()->getStreamInfo(0)->getStreamLanguage()), "und");
+    EXPECT_FALSE(source->isOpened());
+    for (int run = 0; run < 2; ++run) {
+        source->open();
+        const Samples played = readAll(source);
+        ASSERT_EQ(played.size(), 5u * kStep);
+        for (int i = 0; i < 5 * kStep; ++i) {
+            int expected = 0;
+            if (i < 2 * kStep) expected = (512 + i) * 4; // the step at its end belongs to a track
+            if (i >= 4 * kStep) expected = (1024 + i - 4 * kStep) * 4;
+            ASSERT_EQ(played[static_cast<size_t>(i)], static_cast<int16_t>(expected & 0x7fff)) << i;
+        }
+        source->close();
+        EXPECT_EQ(CFakeSource::s_alive, 0);
+    }
+}
+
+TEST_F(Arrangement, Skip_DeliversTheChunkInHandAndThenTheTime) {
+    // Steps of half a second; tracks begin and end with them.
+    std::vector<P<CTrack>> tracks = {makeTrack("100.tst", 0.0, 0.0, 60.0)};
+    for (int i = 0; i < 30; ++i) tracks.push_back(makeTrack("9.tst", i * 2.0, 1.5, 1.5 + 0.5 * (i % 9)));
+    const P<CTracklistAudioSource> source = makeSource(tracks, 8000);
+    source->open();
+    const Samples whole = readAll(source);
+    ASSERT_EQ(whole.size(), 120u * kStep);
+    source->close();
+    source->open();
+    std::mt19937 random(2);
+    size_t next = 0;
+    for (int i = 0; i < 1000; ++i) {
+        const auto expectStep = [&](size_t step) {
+            const P<IAudioChunk> chunk = source->getNextAudioChunk();
+            ASSERT_TRUE(chunk);
+            ASSERT_EQ(chunk->getTimestamp(), static_cast<double>(step) * 0.5);
+            Samples played;
+            append(played, chunk);
+            ASSERT_TRUE(std::equal(played.begin(), played.end(), whole.begin() + step * kStep))
+                << "skip " << i;
+        };
+        const size_t step = random() % 118;
+        source->skipToTime(static_cast<double>(step) * 0.5);
+        ASSERT_NO_FATAL_FAILURE(expectStep(next));
+        ASSERT_NO_FATAL_FAILURE(expectStep(step));
+        next = step + 1;
+    }
+}
+
+TEST_F(Arrangement, WithoutTracks_IsAtItsEndAtOnce) {
+    const P<CTracklistAudioSource> source = makeSource({});
+    EXPECT_EQ(source->getDuration(), 0.0);
+    EXPECT_TRUE(source->isEOF());
+    source->open();
+    EXPECT_TRUE(source->isOpened());
+    EXPECT_TRUE(source->isEOF());
+}
+
+TEST_F(Arrangement, MediumThatIsMissing_EndsTheReadingWhenItIsDue) {
+    const char* message = "could not open source in CTracklistAudioTrack: file:///missing.tst";
+    const P<CTracklistAudioSource> atStart = makeSource({makeTrack("file:///missing.tst", 0.0, 0.0, 9.0)});
+    EXPECT_EQ(tests::errorOf([&] { atStart->open(); }), message);
+    EXPECT_FALSE(atStart->isOpened());
+
+    const P<CTracklistAudioSource> later = makeSource(
+        {makeTrack("90.tst", 0.0, 0.0, 90.0), makeTrack("file:///missing.tst", 4 * 3.90625, 0.0, 9.0)});
+    later->open();
+    Samples played;
+    for (int i = 0; i < 3; ++i) append(played, later->getNextAudioChunk());
+    EXPECT_EQ(tests::errorOf([&] { append(played, later->getNextAudioChunk()); }), message);
+    EXPECT_TRUE(later->isEOF());
+    later->close();
+    EXPECT_EQ(CFakeSource::s_alive, 0);
+}
+
+// Through the exports, with files.
+class EditorExport : public testing::Test {
+protected:
+    EditorExport() {
+        EXPECT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK);
+        log = std::make_unique<CHostLog>();
+    }
+    ~EditorExport() override {
+        log.reset();
+        TONEWRIGHT_DeInitAll();
+    }
+
+    std::string write(const char* name, const std::string& bytes) {
+        std::ofstream(folder / name, std::ios::binary) << bytes;
+        return text(toURI(folder / name)->getAsString());
+    }
+    CHandle create(const std::string& tracks) {
+        const std::string xml = "<Project><Tracks>" + tracks + "</Tracks></Project>";
+        return CHandle(TONEWRIGHT_CreateAudioSourceFromEditorXml(
+            std::u16string(xml.begin(), xml.end()).c_str(), 44100, 2, 2));
+    }
+    static std::string makeTrack(const std::string& uri, double start, double end) {
+        return "<Track><TrackStart>" + std::to_string(start) + "</TrackStart><SourceEndTime>" +
+               std::to_string(end) + "</SourceEndTime><Uri>" + uri + "</Uri></Track>";
+    }
+    // The sound of the whole source; empty when the encoding fails.
+    SSound encode(const CHandle& source) {
+        const std::string uri = text(toURI(folder / "out.wav")->getAsString());
+        SSound sound;
+        {
+            CHandle format(TONEWRIGHT_CreateAudioFormatFromURI(std::u16string(uri.begin(), uri.end()).c_str(),
+                                                               44100, 2, 2, 0.0, 0, 0, 0));
+            CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), format.get()));
+            if (TONEWRIGHT_AudioEncoder_Encode(encoder.get()) != TONEWRIGHT_OK) return sound;
+        }
+        std::ifstream file(folder / "out.wav", std::ios::binary);
+        return parseWav(std::string(std::istreambuf_iterator<char>(file), {}));
+    }
+    bool hasLine(const std::string& part) {
+        for (const SLine& line : log->take())
+            if (line.text.find(part) != std::string::npos) return true;
+        return false;
+    }
+
+    CTempFolder folder;
+    std::unique_ptr<CHostLog> log;
+};
+
+TEST_F(EditorExport, Tracks_AreMixedIntoOneFile) {
+    const SSound tone = makeTone(44100, 2, 16, 1.0);
+    const std::string whole = write("tone.wav", toWav(tone));
+    const std::string cut = write("cut.wav", toWav(tone).substr(0, 44 + 4 * 10000));
+    const CHandle source = create(makeTrack(whole, 0.0, 1.0) + makeTrack(cut, 1.5, 1.0));
+    ASSERT_TRUE(source);
+    EXPECT_EQ(TONEWRIGHT_AudioSource_IsOpened(source.get()), 0);
+    EXPECT_EQ(TONEWRIGHT_AudioSource_GetDuration(source.get()), 2.5);
+    const SSound mixed = encode(source);
+    ASSERT_GE(mixed.frames(), 110250u);
+    EXPECT_LT(mixed.frames(), 110250u + 4000);
+    EXPECT_EQ(mixed.samples.substr(0, tone.samples.size()), tone.samples);
+    // The second begins with the first step behind its start, and is silent where its file ends early.
+    const size_t begin = (66150 + 3999) / 4000 * 4000, silence = begin + 10000;
+    EXPECT_EQ(mixed.samples.substr(begin * 4, 40000), tone.samples.substr(0, 40000));
+    EXPECT_EQ(mixed.samples.substr(silence * 4), std::string(mixed.samples.size() - silence * 4, '\0'));
+}
+
+TEST_F(EditorExport, BadArrangement_GivesNothingAndALine) {
+    const CHandle noText(TONEWRIGHT_CreateAudioSourceFromEditorXml(u"<a>", 44100, 2, 2));
+    EXPECT_FALSE(noText);
+    EXPECT_TRUE(hasLine("XML Parse Error, line"));
+    const CHandle noSound(TONEWRIGHT_CreateAudioSourceFromEditorXml(u"<a/>", 44100, 0, 2));
+    EXPECT_FALSE(noSound);
+    EXPECT_TRUE(hasLine("0 channels"));
+
+    const std::string uri = write("gone.wav", toWav(makeTone(44100, 2, 16, 0.5)));
+    const CHandle removed = create(makeTrack(uri, 0.0, 0.5));
+    ASSERT_TRUE(removed) << "nothing is opened yet";
+    std::filesystem::remove(folder / "gone.wav");
+    EXPECT_NE(TONEWRIGHT_AudioSource_Open(removed.get()), TONEWRIGHT_OK);
+    EXPECT_TRUE(hasLine("could not open source in CTracklistAudioTrack: " + uri));
+    EXPECT_EQ(TONEWRIGHT_AudioSource_IsOpened(removed.get()), 0);
+}
+
+} // namespace
