@@ -1,12 +1,12 @@
 // Arbitrary bytes as XML: what is accepted is printed, parses again, and prints the same.
 #include "peru/Errors.h"
+#include "peru/IURI.h"
 #include "peru/MemoryIOStream.h"
 #include "peru/StringStreams.h"
 #include "peru/XmlDocument.h"
 
 #include <cstdint>
 #include <cstdlib>
-#include <cstring>
 
 using namespace peru;
 
