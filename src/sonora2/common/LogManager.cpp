@@ -5,8 +5,8 @@
 #include "peru/ITimeManager.h"
 #include "peru/IURI.h"
 #include "peru/StringFormat.h"
-
-#include <tinyxml.h>
+#include "peru/XmlDocument.h"
+#include "peru/XmlText.h"
 
 #include <algorithm>
 #include <chrono>
@@ -20,71 +20,51 @@ using peru::CString;
 
 namespace {
 
-std::string formatTime(int64_t milliseconds) {
+P<peru::IString> formatTime(int64_t milliseconds) {
     using namespace std::chrono;
     const sys_time<std::chrono::milliseconds> time{std::chrono::milliseconds(milliseconds)};
     const auto day = floor<days>(time);
     const year_month_day date{day};
     const hh_mm_ss clock{time - day};
-    return CString::toStdString(peru::format(
-        "%04d-%02d-%02dT%02d:%02d:%02d.%03dZ", static_cast<int>(date.year()),
-        static_cast<unsigned>(date.month()), static_cast<unsigned>(date.day()),
-        static_cast<int>(clock.hours().count()), static_cast<int>(clock.minutes().count()),
-        static_cast<int>(clock.seconds().count()), static_cast<int>(clock.subseconds().count())));
-}
-
-// Bytes of the well-formed UTF-8 sequence at the start of the text that XML may hold; 0 where there is none.
-// Strings hand out their bytes as they came, so nothing can be taken for granted.
-size_t measureCharacter(std::string_view text) {
-    const auto byte = [&](size_t index) { return static_cast<uint8_t>(text[index]); };
-    const uint8_t lead = byte(0);
-    if (lead < 0x80) return lead >= 0x20 || lead == '\t' || lead == '\n' || lead == '\r' ? 1 : 0;
-    const size_t size = lead >= 0xf0 ? 4 : lead >= 0xe0 ? 3 : 2;
-    if (lead < 0xc2 || lead > 0xf4 || text.size() < size) return 0;
-    char32_t ch = lead & (0xff >> (size + 1));
-    for (size_t i = 1; i < size; ++i) {
-        if ((byte(i) & 0xc0) != 0x80) return 0;
-        ch = ch << 6 | (byte(i) & 0x3f);
-    }
-    const char32_t smallest = size == 2 ? 0x80 : size == 3 ? 0x800 : 0x10000;
-    const bool surrogate = ch >= 0xd800 && ch <= 0xdfff;
-    return ch < smallest || ch > 0x10ffff || surrogate || ch == 0xfffe || ch == 0xffff ? 0 : size;
+    return peru::format("%04d-%02d-%02dT%02d:%02d:%02d.%03dZ", static_cast<int>(date.year()),
+                        static_cast<unsigned>(date.month()), static_cast<unsigned>(date.day()),
+                        static_cast<int>(clock.hours().count()), static_cast<int>(clock.minutes().count()),
+                        static_cast<int>(clock.seconds().count()),
+                        static_cast<int>(clock.subseconds().count()));
 }
 
 // Messages carry names from files and devices: one bad name must not spoil the document.
-std::string makeReadable(const P<peru::IString>& text) {
+P<peru::IString> makeReadable(const P<peru::IString>& text) {
     std::string readable = CString::toStdString(text);
     for (size_t at = 0; at < readable.size();) {
-        const size_t size = measureCharacter(std::string_view(readable).substr(at));
+        const size_t size = peru::measureXmlCharacter(std::string_view(readable).substr(at, 4));
         if (size == 0) readable[at] = '?';
         at += std::max<size_t>(size, 1);
     }
-    return readable;
+    return CString::fromUTF8(readable);
 }
 
 } // namespace
 
 CLogManager::CLogManager()
-    : m_mutex(peru::getMutexFactory()->createMutex()), m_document(std::make_unique<TiXmlDocument>()) {
-    m_document->LinkEndChild(std::make_unique<TiXmlDeclaration>("1.0", "UTF-8", "").release());
-    m_document->LinkEndChild(std::make_unique<TiXmlElement>("textlog").release());
-}
+    : m_mutex(peru::getMutexFactory()->createMutex()), m_document(peru::make<peru::CXmlDocument>()),
+      m_root(m_document->addChildNode("textlog")) {}
 
 CLogManager::~CLogManager() = default;
 
 void CLogManager::log(int32_t severity, const P<peru::IString>& text) {
-    auto entry = std::make_unique<TiXmlElement>("logentry");
-    entry->SetAttribute("time", formatTime(peru::getTimeManager()->getTime()));
-    entry->SetAttribute("level", severity);
-    entry->LinkEndChild(std::make_unique<TiXmlText>(makeReadable(text)).release());
+    const P<peru::IString> time = formatTime(peru::getTimeManager()->getTime());
+    const P<peru::IString> readable = makeReadable(text);
 
     CMutexLock lock(m_mutex);
-    TiXmlElement* root = m_document->RootElement();
-    root->LinkEndChild(entry.release());
+    const P<peru::IXmlNode> entry = m_root->addChildNode("logentry");
+    entry->setProperty("time", time);
+    entry->setProperty("level", peru::format("%d", severity));
+    entry->setText(readable);
     if (m_entries < kKeptEntries)
         ++m_entries;
     else
-        root->RemoveChild(root->FirstChild());
+        m_root->removeChildNode(m_root->getChildNode("logentry"));
 }
 
 void CLogManager::logException(const peru::CException& exception) {
@@ -93,11 +73,8 @@ void CLogManager::logException(const peru::CException& exception) {
 }
 
 P<peru::IString> CLogManager::getDocument() const {
-    TiXmlPrinter printer;
-    printer.SetIndent("  ");
     CMutexLock lock(m_mutex);
-    m_document->Accept(&printer);
-    return CString::fromUTF8(printer.Str());
+    return m_document->printToString()->toUTF8String();
 }
 
 void CLogManager::save(const P<peru::IURI>& file) const {

@@ -5,13 +5,11 @@
 #include "peru/Object.h"
 #include "sonora2/common/ILogManager.h"
 
-#include <memory>
-
-class TiXmlDocument;
-
 namespace peru {
 class IURI;
-}
+class IXmlDocument;
+class IXmlNode;
+} // namespace peru
 
 namespace sonora2::common {
 
@@ -34,7 +32,8 @@ public:
 
 private:
     P<peru::IMutex> m_mutex; // guards the document and the count
-    std::unique_ptr<TiXmlDocument> m_document;
+    P<peru::IXmlDocument> m_document;
+    P<peru::IXmlNode> m_root;
     int m_entries = 0;
 };
 
