@@ -3,6 +3,7 @@
 #include "support/TempFolder.h"
 
 #include <csignal>
+#include <fstream>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <sys/xattr.h>
@@ -49,6 +50,28 @@ std::string makeText(size_t size) {
 }
 
 } // namespace
+
+TEST(FileReplacement, LeavesHolesWhereTheyAre) {
+    const CTempFolder folder;
+    const fs::path file = folder.write("file", "head");
+    constexpr int64_t kSize = int64_t{3} << 30;
+    fs::resize_file(file, kSize);
+    std::ofstream(file, std::ios::in).seekp(kSize / 2).write("middle", 6);
+    const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
+    replacement->getStream()->write("+", 1);
+    replacement->copyFromOld(0, kSize);
+    replacement->commit();
+    ASSERT_EQ(fs::file_size(file), static_cast<uintmax_t>(kSize + 1));
+    struct stat status;
+    ASSERT_EQ(::stat(file.c_str(), &status), 0);
+    EXPECT_LT(status.st_blocks, 1000);
+    std::ifstream in(file);
+    char text[8] = {};
+    in.read(text, 5);
+    EXPECT_STREQ(text, "+head");
+    in.seekg(kSize / 2 + 1).read(text, 7);
+    EXPECT_EQ(std::string(text, 7), std::string("middle\0", 7));
+}
 
 TEST(FileReplacement, MixesOldAndNewBytes) {
     const CTempFolder folder;

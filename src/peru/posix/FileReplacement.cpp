@@ -45,6 +45,20 @@ void syncFolder(const std::string& path) {
     if (folder.isOpen()) ::fsync(folder.get());
 }
 
+// Of the bytes from `start` to `end` the first stretch that is on the disk; the whole where the file system
+// does not tell.
+struct SStretch {
+    int64_t start;
+    int64_t end;
+};
+SStretch findData(int file, int64_t start, int64_t end) {
+    const off_t data = ::lseek(file, start, SEEK_DATA);
+    if (data < 0 && errno != ENXIO) return {start, end};
+    if (data < 0 || data >= end) return {end, end};
+    const off_t hole = ::lseek(file, data, SEEK_HOLE);
+    return {data, hole < 0 ? end : std::min<int64_t>(hole, end)};
+}
+
 } // namespace
 
 // The errors of streams become those of files: who replaces a file needs to catch one kind only.
@@ -141,12 +155,24 @@ P<ISeekableIOStream> CFileReplacement::getStream() {
 
 void CFileReplacement::copyFromOld(int64_t offset, int64_t size) {
     const int64_t position = m_stream->getPosition();
+    const int64_t end = offset + size;
+    // Behind its end the new file reads as zeros, and holes of the old one may stay holes.
+    const bool mayHaveHoles = position >= m_stream->getSize();
     // Also takes what the stream holds back to the file, and lets it forget what it has read ahead.
     m_stream->setSize(std::max(m_stream->getSize(), position + size));
-    int64_t copied = 0;
-    const int error = copyRange(m_old.get(), offset, m_new.get(), position, size, copied);
-    if (error != 0) raise(error, m_uri);
-    if (copied < size)
+    struct stat status;
+    if (::fstat(m_old.get(), &status) != 0) raise(errno, m_uri);
+    bool isLongEnough = status.st_size >= end;
+    for (int64_t at = offset; isLongEnough && at < end;) {
+        const SStretch data = mayHaveHoles ? findData(m_old.get(), at, end) : SStretch{at, end};
+        int64_t copied = 0;
+        if (const int error = copyRange(m_old.get(), data.start, m_new.get(), position + data.start - offset,
+                                        data.end - data.start, copied))
+            raise(error, m_uri);
+        isLongEnough = copied == data.end - data.start;
+        at = data.end;
+    }
+    if (!isLongEnough)
         throw CFileError(localize("peru.CFileReplacement.FileTooShort",
                                   "The file '%FILE%' has become shorter.", {{"%FILE%", getShownName(m_uri)}}),
                          m_uri);
