@@ -1,6 +1,7 @@
 // The file of a tag, as TagLib sees it.
 #pragma once
 
+#include "filetag/Api.h"
 #include "filetag/taglib/PieceTable.h"
 #include "peru/IURI.h"
 
@@ -14,7 +15,7 @@ using peru::P;
 
 // Reads from the file; what TagLib writes is kept in memory until commit(), so that the file on the disk
 // never is half changed. Nothing but IOStream's own operations is TagLib's to call.
-class CTagLibIOStream : public TagLib::IOStream {
+class FILETAG_API CTagLibIOStream : public TagLib::IOStream {
 public:
     // Throws CFileError when the file cannot be read.
     explicit CTagLibIOStream(const P<peru::IURI>& file);

@@ -1,0 +1,129 @@
+"""Reads and writes tags with mutagen, so that another reader and writer judges ours.
+
+judge.py fields FILE...        the texts of each file, a list of JSON objects
+judge.py set FILE JSON         enters such texts
+judge.py extras FILE           enters what a file tag of ours does not know
+judge.py others FILE           all that is in the file besides the texts, as JSON
+"""
+import hashlib
+import json
+import sys
+
+import mutagen
+from mutagen import asf, flac, id3
+from mutagen.oggvorbis import OggVorbis
+
+FIELDS = ["title", "artist", "album", "albumArtist", "trackNumber", "year", "genre", "comment"]
+NAMES = {
+    "id3": ["TIT2", "TPE1", "TALB", "TPE2", "TRCK", "TDRC", "TCON", "COMM::XXX"],
+    "xiph": ["title", "artist", "album", "albumartist", "tracknumber", "date", "genre", "comment"],
+    "asf": ["Title", "Author", "WM/AlbumTitle", "WM/AlbumArtist", "WM/TrackNumber", "WM/Year", "WM/Genre",
+            "Description"],
+}
+
+
+def open_file(name):
+    file = id3.ID3FileType(name) if name.endswith(".mp3") else mutagen.File(name)
+    kind = "id3" if name.endswith(".mp3") else "asf" if isinstance(file, asf.ASF) else "xiph"
+    if file.tags is None:
+        file.add_tags()
+    return file, kind
+
+
+def as_texts(value):
+    if isinstance(value, id3.TimeStampTextFrame):
+        return [stamp.text for stamp in value.text]
+    return [str(text) for text in (value.text if isinstance(value, id3.Frame) else value)]
+
+
+def get_fields(name):
+    file, kind = open_file(name)
+    result = {}
+    for field, key in zip(FIELDS, NAMES[kind]):
+        texts = as_texts(file.tags[key]) if key in file.tags else []
+        result[field] = texts[0] if len(texts) == 1 else texts or ""
+    return result
+
+
+def set_fields(name, texts):
+    file, kind = open_file(name)
+    for field, key in zip(FIELDS, NAMES[kind]):
+        text = texts.get(field, "")
+        if not text:
+            continue
+        if kind == "id3" and field == "comment":
+            file.tags.add(id3.COMM(encoding=1, lang="deu", desc="", text=[text]))
+        elif kind == "id3":
+            file.tags.add(getattr(id3, key)(encoding=1, text=[text]))
+        else:
+            file.tags[key] = [text]
+    file.save()
+
+
+def add_extras(name):
+    file, kind = open_file(name)
+    picture = flac.Picture()
+    picture.type, picture.mime, picture.desc, picture.data = 3, "image/png", "the front", b"\x89PNG front"
+    second = flac.Picture()
+    second.type, second.mime, second.desc, second.data = 8, "image/jpeg", "the artist", b"\xff\xd8 artist"
+    texts = {"COMPOSER": "Somebody", "REPLAYGAIN_TRACK_GAIN": "-7.03 dB", "LYRICS": "la\nla"}
+    if kind == "id3":
+        file.tags.add(id3.TCOM(encoding=3, text=["Somebody", "Another"]))
+        file.tags.add(id3.TXXX(encoding=3, desc="replaygain_track_gain", text=["-7.03 dB"]))
+        file.tags.add(id3.USLT(encoding=3, lang="eng", desc="", text="la\nla"))
+        file.tags.add(id3.COMM(encoding=3, lang="eng", desc="iTunNORM", text=["00000A"]))
+        file.tags.add(id3.PRIV(owner="somebody", data=b"\x00\x01"))
+        for entry in (picture, second):
+            file.tags.add(id3.APIC(encoding=3, mime=entry.mime, type=entry.type, desc=entry.desc, data=entry.data))
+    elif kind == "asf":
+        file.tags["WM/Composer"] = ["Somebody", "Another"]
+        file.tags["WM/Lyrics"] = ["la\nla"]
+        file.tags["Copyright"] = ["nobody"]
+        file.tags["replaygain_track_gain"] = ["-7.03 dB"]
+        file.tags["WM/SharedUserRating"] = [asf.ASFDWordAttribute(75)]
+        file.tags["large"] = [asf.ASFByteArrayAttribute(b"x" * 70000)]
+    else:
+        for key, value in texts.items():
+            file.tags[key] = [value, value + " again"]
+        if isinstance(file, OggVorbis):
+            import base64
+            file.tags["metadata_block_picture"] = [
+                base64.b64encode(entry.write()).decode() for entry in (picture, second)]
+        else:
+            file.add_picture(picture)
+            file.add_picture(second)
+            application = flac.MetadataBlock(b"testabcd")
+            application.code = 2
+            file.metadata_blocks.append(application)
+    file.save()
+
+
+def get_others(name):
+    file, kind = open_file(name)
+    known = set(key.lower() for key in NAMES[kind])
+    result = {}
+    for key in file.tags.keys():
+        if key.lower() in known or key == "WM/EncodingSettings":
+            continue
+        value = file.tags[key]
+        if kind == "asf":  # whose values have no order, and which has fields without text
+            value = sorted(value)
+            if not str(value[0]):
+                continue
+        result[key] = hashlib.sha1(repr(value).encode()).hexdigest() + " " + repr(value)[:200]
+    if isinstance(file, flac.FLAC):
+        for number, block in enumerate(file.metadata_blocks):
+            if block.code not in (1, 4):
+                result["block %d" % number] = hashlib.sha1(block.write()).hexdigest()
+    return result
+
+
+command, name = sys.argv[1:3]
+if command == "fields":
+    print(json.dumps([get_fields(file) for file in sys.argv[2:]]))
+elif command == "set":
+    set_fields(name, json.loads(sys.argv[3]))
+elif command == "extras":
+    add_extras(name)
+elif command == "others":
+    print(json.dumps(get_others(name), indent=1, sort_keys=True))

@@ -1,0 +1,286 @@
+// What holds for the tags of all formats that TagLib knows, with other programs as judges.
+#include "Support.h"
+#include "filetag/FileTagFactory.h"
+
+#include <cctype>
+#include <set>
+
+using namespace peru;
+using filetag::CFileTagFactory;
+using filetag::ICoverArt;
+using filetag::ICoverArtFileTag;
+using filetag::IFileTag;
+using tests::CTempFolder;
+using tests::CTexts;
+using tests::kFields;
+using tests::toURI;
+
+namespace {
+
+std::string repeat(const std::string& text, int count) {
+    std::string result;
+    while (count-- > 0) result += text;
+    return result;
+}
+
+const std::string kTexts[] = {
+    "Plain text",
+    "Caf\u00e9 \u00fcber \u00a9",
+    "\u041f\u0440\u0438\u0432\u0435\u0442, \u043c\u0438\u0440",
+    "\u65e5\u672c\u8a9e\u306e\u66f2\u540d",
+    "\U0001f3b5 and \U0001f1e9\U0001f1ea",
+    "e\u0301a\u0308 \u0915\u094d\u0937",
+    "line 1\nline 2",
+    repeat("ten ch\u00e4rs.", 1000),
+};
+constexpr size_t kTextCount = std::size(kTexts);
+
+// Judges give years, track numbers and genres a form of their own.
+std::string getText(size_t field, size_t round) {
+    if (std::string(kFields[field].name) == "year") return std::to_string(1990 + round);
+    if (std::string(kFields[field].name) == "trackNumber") return std::to_string(round + 1) + "/12";
+    const std::string& text = kTexts[(field + round) % kTextCount];
+    return std::string(kFields[field].name) == "genre" && text.starts_with("line") ? "One line" : text;
+}
+
+CTexts makeTexts(size_t round) {
+    CTexts texts;
+    for (size_t field = 0; field < std::size(kFields); ++field)
+        texts[kFields[field].name] = getText(field, round);
+    return texts;
+}
+
+P<IFileTag> open(const std::filesystem::path& file) {
+    return CFileTagFactory::get()->create(toURI(file));
+}
+
+void store(const std::filesystem::path& file, const CTexts& texts) {
+    const P<IFileTag> tag = open(file);
+    for (const tests::SField& field : kFields) {
+        const auto found = texts.find(field.name);
+        if (found != texts.end()) (tag.get()->*field.set)(tests::fromStandard(found->second));
+    }
+    tag->store();
+}
+
+// By the names of this system.
+CTexts readWithFFprobe(const std::filesystem::path& file) {
+    const auto found = nlohmann::json::parse(tests::run({"ffprobe", "-v", "error", "-of", "json",
+                                                         "-show_entries", "format_tags:stream_tags", file})
+                                                 .out);
+    CTexts byName;
+    const auto enter = [&](const nlohmann::json& tags) {
+        for (const auto& [name, value] : tags.items()) {
+            std::string lower = name;
+            for (char& letter : lower) letter = static_cast<char>(std::tolower(letter));
+            byName.emplace(lower, value);
+        }
+    };
+    enter(found["format"].value("tags", nlohmann::json::object()));
+    for (const auto& stream : found["streams"]) enter(stream.value("tags", nlohmann::json::object()));
+    CTexts texts;
+    const char* const names[] = {"title", "artist", "album", "album_artist",
+                                 "track", "date",   "genre", "comment"};
+    for (size_t i = 0; i < std::size(kFields); ++i) texts[kFields[i].name] = byName[names[i]];
+    if (texts["year"].empty()) texts["year"] = byName["wm/year"];
+    return texts;
+}
+
+P<CMemoryBlock> makeBlock(const std::string& bytes) {
+    const P<CMemoryBlock> block = make<CMemoryBlock>(static_cast<int64_t>(bytes.size()));
+    std::copy(bytes.begin(), bytes.end(), block->getData());
+    return block;
+}
+
+std::string toString(const P<ICoverArt>& picture) {
+    if (!picture) return "none";
+    const P<CMemoryBlock> data = picture->getData();
+    return std::to_string(picture->getPictureType()) + " " + tests::text(picture->getMimeType()) + " " +
+           std::string(reinterpret_cast<const char*>(data->getData()), static_cast<size_t>(data->getSize()));
+}
+
+class FileTag : public testing::TestWithParam<const char*> {
+protected:
+    FileTag() : m_file(tests::makeSound(m_folder, GetParam())) {}
+
+    CTempFolder m_folder;
+    std::filesystem::path m_file;
+};
+
+} // namespace
+
+TEST_P(FileTag, OthersReadWhatIsWritten) {
+    const std::string sound = tests::hashSound(m_file);
+    ASSERT_NE(sound, "");
+    std::vector<std::string> command{"fields"};
+    for (size_t round = 0; round < kTextCount; ++round) {
+        const std::filesystem::path copy = m_folder / ("round" + std::to_string(round) + "." + GetParam());
+        std::filesystem::copy_file(m_file, copy);
+        EXPECT_EQ(tests::readFields(*open(copy))["title"], "");
+        store(copy, makeTexts(round));
+        EXPECT_EQ(tests::readFields(*open(copy)), makeTexts(round));
+        // Once more over what is there, now shorter or longer.
+        store(copy, makeTexts(round + 1));
+        command.push_back(copy);
+        EXPECT_EQ(readWithFFprobe(copy), makeTexts(round + 1));
+    }
+    EXPECT_EQ(tests::hashSound(command.back()), sound) << "with the longest way through tags of all lengths";
+    const auto found = tests::judge(command).get<std::vector<CTexts>>();
+    ASSERT_EQ(found.size(), kTextCount);
+    for (size_t round = 0; round < kTextCount; ++round) EXPECT_EQ(found[round], makeTexts(round + 1));
+
+    CTexts empty;
+    for (const tests::SField& field : kFields) empty[field.name] = "";
+    store(command.back(), empty);
+    EXPECT_EQ(tests::readFields(*open(command.back())), empty);
+    EXPECT_EQ(tests::judge({"fields", command.back()})[0].get<CTexts>(), empty);
+    EXPECT_EQ(tests::hashSound(command.back()), sound);
+}
+
+TEST_P(FileTag, ReadsWhatOthersWrite) {
+    for (size_t round = 0; round < kTextCount; ++round) {
+        tests::judge({"set", m_file, nlohmann::json(makeTexts(round)).dump()});
+        EXPECT_EQ(tests::readFields(*open(m_file)), makeTexts(round));
+    }
+}
+
+TEST_P(FileTag, KeepsWhatItDoesNotKnow) {
+    tests::judge({"extras", m_file});
+    if (GetParam() == std::string("flac")) {
+        const auto sheet = m_folder.write(
+            "sheet",
+            "FILE \"a\" WAVE\nTRACK 01 AUDIO\nINDEX 01 00:00:00\nTRACK 02 AUDIO\nINDEX 01 00:00:30\n");
+        ASSERT_EQ(tests::run({"metaflac", "--import-cuesheet-from=" + sheet.string(), m_file}).exitCode, 0);
+    }
+    const nlohmann::json before = tests::judge({"others", m_file});
+    ASSERT_GE(before.size(), 3u);
+    store(m_file, {{"title", repeat("new ", 3000)}});
+    EXPECT_EQ(tests::judge({"others", m_file}), before);
+    EXPECT_EQ(tests::judge({"fields", m_file})[0]["title"], repeat("new ", 3000));
+    store(m_file, {{"title", ""}, {"comment", ""}});
+    EXPECT_EQ(tests::judge({"others", m_file}), before);
+}
+
+TEST_P(FileTag, HoldsPictures) {
+    const std::string sound = tests::hashSound(m_file);
+    const P<ICoverArtFileTag> tag(open(m_file));
+    EXPECT_EQ(tag->getCoverArtCount(), 0);
+    tag->addCoverArt(makeBlock("front"), "image/png", filetag::kFrontCover);
+    tag->addCoverArt(makeBlock("gone"), "image/png", filetag::kBackCover);
+    tag->addCoverArt(makeBlock(std::string("b\0ck", 4) + std::string(200000, 'x')), "image/jpeg",
+                     filetag::kBackCover);
+    const P<ICoverArt> gone = tag->getCoverArt(1);
+    tag->removeCoverArt(1);
+    tag->removeCoverArt(2);
+    tag->removeCoverArt(-1);
+    gone->setMimeType("image/gone");
+    tag->store();
+
+    // ASF has no order among pictures.
+    const bool ordered = GetParam() != std::string("wma");
+    const P<ICoverArtFileTag> read(open(m_file));
+    ASSERT_EQ(read->getCoverArtCount(), 2);
+    const int front = ordered || read->getCoverArt(0)->getPictureType() == filetag::kFrontCover ? 0 : 1;
+    EXPECT_EQ(toString(read->getCoverArt(front)), "0 image/png front");
+    EXPECT_EQ(toString(read->getCoverArt(1 - front)),
+              "1 image/jpeg " + std::string("b\0ck", 4) + std::string(200000, 'x'));
+    EXPECT_EQ(read->getCoverArt(2), nullptr);
+    EXPECT_EQ(read->getCoverArt(-1), nullptr);
+    read->getCoverArt(front)->setPictureType(filetag::kConductor);
+    read->replaceCoverArt(1 - front, makeBlock("new"), "image/gif", filetag::kFileIcon);
+    read->replaceCoverArt(2, makeBlock("nowhere"), "image/gif", filetag::kFileIcon);
+    const P<ICoverArt> held = read->getCoverArt(0);
+    read->store();
+    read->close();
+    EXPECT_EQ(held->getData()->getSize(), 0) << "read from a tag that is closed";
+
+    const P<ICoverArtFileTag> again(open(m_file));
+    ASSERT_EQ(again->getCoverArtCount(), 2);
+    const std::set<std::string> pictures{toString(again->getCoverArt(0)), toString(again->getCoverArt(1))};
+    EXPECT_EQ(pictures, (std::set<std::string>{"9 image/png front", "3 image/gif new"}));
+    EXPECT_EQ(tests::hashSound(m_file), sound);
+    // The numbers that stand in the file, by another reader.
+    const std::string list = tests::run({"exiftool", "-a", "-n", "-PictureType", "-s3", m_file}).out;
+    if (ordered) {
+        EXPECT_EQ(list, "9\n1\n");
+    }
+}
+
+TEST_P(FileTag, StoresOnceAndOnlyChanges) {
+    tests::judge({"set", m_file, R"({"title":"old"})"});
+    const std::string before = tests::readFile(m_file);
+    const P<IFileTag> tag = open(m_file);
+    tag->setTitle("dropped");
+    tag->open();
+    EXPECT_EQ(tests::text(tag->getTitle()), "old");
+    tag->store();
+    EXPECT_TRUE(tests::readFile(m_file) == before);
+    EXPECT_THROW(tag->store(), CFileError);
+    tag->open();
+    tag->setTitle("new");
+    tag->store();
+    EXPECT_EQ(tests::text(tag->getTitle()), "new") << "readable until it is closed";
+    EXPECT_EQ(tests::text(open(m_file)->getTitle()), "new");
+    tag->close();
+    EXPECT_EQ(tests::text(tag->getTitle()), "");
+    tag->setTitle("nowhere");
+    EXPECT_THROW(tag->store(), CFileError);
+}
+
+TEST_P(FileTag, LeavesAFileThatAnotherProgramChanged) {
+    const P<IFileTag> tag = open(m_file);
+    tag->setTitle(tests::fromStandard(repeat("new ", 3000)));
+    const std::string other = tests::readFile(m_file) + "more";
+    m_folder.write(m_file.filename(), other);
+    EXPECT_NE(tests::errorOf([&] { tag->store(); }).find("sound"), std::string::npos);
+    EXPECT_TRUE(tests::readFile(m_file) == other);
+}
+
+TEST_P(FileTag, RefusesContentOfAnotherFormat) {
+    const std::string sound = tests::readFile(m_file);
+    for (const std::string& content :
+         {std::string(), std::string(4096, '\0'), std::string("RIFF....WAVEfmt "),
+          repeat("text that is no sound ", 500)}) {
+        m_folder.write(m_file.filename(), content);
+        EXPECT_THROW(open(m_file), CFileFormatNotSupportedError) << content.substr(0, 30);
+    }
+    // Cut anywhere it is read or refused, and a store leaves it readable.
+    for (size_t size = 1; size < 6000; size = size * 3 / 2 + 1) {
+        m_folder.write(m_file.filename(), sound.substr(0, size));
+        try {
+            const P<IFileTag> tag = open(m_file);
+            tag->setTitle("cut");
+            tag->store();
+            EXPECT_EQ(tests::text(open(m_file)->getTitle()), "cut") << size;
+        } catch (const CFileError&) {
+        }
+    }
+    std::filesystem::remove(m_file);
+    EXPECT_THROW(open(m_file), CFileNotFoundError);
+    std::filesystem::create_directory(m_file);
+    EXPECT_THROW(open(m_file), CFileError);
+}
+
+INSTANTIATE_TEST_SUITE_P(Formats, FileTag, testing::Values("mp3", "flac", "ogg", "wma"),
+                         [](const auto& instance) { return std::string(instance.param); });
+
+TEST(FileTagFactory, GoesByTheExtension) {
+    const CTempFolder folder;
+    const auto flac = tests::makeSound(folder, "flac");
+    const P<CFileTagFactory> factory = make<CFileTagFactory>();
+    const auto find = [&](const std::string& name) {
+        if (name != "sound.flac") std::filesystem::copy_file(flac, folder / name);
+        const P<IFileTag> tag = factory->create(toURI(folder / name));
+        return tag ? tests::text(tag->getTagType()) : "none";
+    };
+    EXPECT_EQ(find("A.FLAC"), "Vorbis comment");
+    EXPECT_EQ(find("a.flac.tmp"), "none");
+    factory->setTempExtension(newString(".tmp"));
+    EXPECT_EQ(find("sound.flac"), "Vorbis comment");
+    EXPECT_EQ(find("b.flac.tmp"), "Vorbis comment");
+    EXPECT_EQ(find("c.flac.part"), "none");
+    EXPECT_EQ(find("flac"), "none");
+    EXPECT_EQ(find("tmp.tmp"), "none");
+    EXPECT_THROW(find("d.wav"), CFileFormatNotSupportedError);
+    EXPECT_THROW(find("e.Ogg.tmp"), CFileFormatNotSupportedError);
+}

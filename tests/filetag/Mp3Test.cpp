@@ -1,0 +1,110 @@
+// What is peculiar to MP3: two tags in one file, three versions of one of them.
+#include "Support.h"
+#include "filetag/FileTagFactory.h"
+
+using namespace peru;
+using filetag::CFileTagFactory;
+using filetag::IFileTag;
+using tests::CTempFolder;
+using tests::CTexts;
+using tests::toURI;
+
+namespace {
+
+P<IFileTag> open(const std::filesystem::path& file) {
+    return CFileTagFactory::get()->create(toURI(file));
+}
+
+// By another reader that tells the two tags apart.
+std::string readWithExiftool(const std::filesystem::path& file, const std::string& name) {
+    const std::string out = tests::run({"exiftool", "-s3", "-" + name, file}).out;
+    return out.substr(0, out.find('\n'));
+}
+
+} // namespace
+
+TEST(Mp3Tag, BringsBothTagsInStep) {
+    const CTempFolder folder;
+    const auto file = tests::makeSound(folder, "mp3");
+    const auto old = folder / "old.mp3";
+    ASSERT_EQ(tests::run({"lame", "--quiet", "--decode", file, folder / "a.wav"}).exitCode, 0);
+    ASSERT_EQ(tests::run({"lame", "--quiet", "--id3v1-only", "--tt", "Old title", "--ta", "Old artist",
+                          "--ty", "1984", "--tn", "7", "--tg", "Jazz", folder / "a.wav", old})
+                  .exitCode,
+              0);
+    P<IFileTag> tag = open(old);
+    EXPECT_EQ(tests::text(tag->getTagType()), "ID3v1");
+    EXPECT_EQ(tests::text(tag->getTitle()), "Old title");
+    EXPECT_EQ(tests::text(tag->getYear()), "1984");
+    EXPECT_EQ(tests::text(tag->getTrackNumber()), "7");
+    EXPECT_EQ(tests::text(tag->getGenre()), "Jazz");
+    tag->setAlbum("New album");
+    tag->setTitle("");
+    tag->store();
+    const CTexts wanted{{"title", ""},       {"artist", "Old artist"}, {"album", "New album"},
+                        {"albumArtist", ""}, {"trackNumber", "7"},     {"year", "1984"},
+                        {"genre", "Jazz"},   {"comment", ""}};
+    EXPECT_EQ(tests::judge({"fields", old})[0].get<CTexts>(), wanted);
+    EXPECT_EQ(tests::readFields(*open(old)), wanted);
+    EXPECT_EQ(readWithExiftool(old, "ID3v1:Album"), "New album");
+    EXPECT_EQ(readWithExiftool(old, "ID3v1:Title"), "");
+    EXPECT_EQ(readWithExiftool(old, "ID3v1:Artist"), "Old artist");
+
+    tag = open(old);
+    for (const tests::SField& field : tests::kFields) (tag.get()->*field.set)("");
+    tag->store();
+    tag->open();
+    EXPECT_EQ(tests::text(tag->getTagType()), "") << "no empty tag stays";
+}
+
+// The old tag has numbers only, and must not take the texts along.
+TEST(Mp3Tag, KeepsTextsThatAreNoNumbers) {
+    const CTempFolder folder;
+    const auto file = tests::makeSound(folder, "mp3");
+    P<IFileTag> tag = open(file);
+    tag->setTrackNumber("A1/B2");
+    tag->setYear("unknown");
+    tag->store();
+    tag = open(file);
+    EXPECT_EQ(tests::text(tag->getTagType()), "ID3v2.4");
+    tag->setTitle("a");
+    tag->store();
+    tag = open(file);
+    EXPECT_EQ(tests::text(tag->getTrackNumber()), "A1/B2");
+    EXPECT_EQ(tests::text(tag->getYear()), "unknown");
+    tag->setTrackNumber("12/13");
+    tag->setYear("1999-12-31");
+    tag->store();
+    EXPECT_EQ(readWithExiftool(file, "ID3v1:Track"), "12");
+    EXPECT_EQ(readWithExiftool(file, "ID3v1:Year"), "1999");
+}
+
+TEST(Mp3Tag, ReadsTheVersionsOfOtherPrograms) {
+    const CTempFolder folder;
+    const auto plain = tests::makeSound(folder, "mp3");
+    const auto file = folder / "b.mp3";
+    const std::string title = "T\u00eftel \u30bf\u30a4\u30c8\u30eb";
+    ASSERT_EQ(
+        tests::run({"ffmpeg", "-v", "error", "-i", plain, "-c", "copy", "-id3v2_version", "3", "-metadata",
+                    "title=" + title, "-metadata", "date=2003", "-metadata", "genre=Rock", file})
+            .exitCode,
+        0);
+    EXPECT_EQ(tests::text(open(file)->getTagType()), "ID3v2.3");
+    ASSERT_EQ(tests::run({"eyeD3", "-Q", "--to-v2.3", "--encoding", "utf16", "-A", title, "-b", title, "-n",
+                          "3", "-N", "9", file})
+                  .exitCode,
+              0);
+    const P<IFileTag> tag = open(file);
+    EXPECT_EQ(tests::toStandard(tag->getTitle()), title);
+    EXPECT_EQ(tests::toStandard(tag->getAlbum()), title);
+    EXPECT_EQ(tests::toStandard(tag->getAlbumArtist()), title);
+    EXPECT_EQ(tests::text(tag->getTrackNumber()), "03/09");
+    EXPECT_EQ(tests::text(tag->getYear()), "2003");
+    EXPECT_EQ(tests::text(tag->getGenre()), "Rock");
+    tag->setArtist("a");
+    tag->store();
+    const std::string shown = tests::run({"eyeD3", "--no-color", file}).out;
+    EXPECT_NE(shown.find("ID3 v2.4"), std::string::npos) << shown;
+    EXPECT_NE(shown.find("title: " + title), std::string::npos) << shown;
+    EXPECT_NE(shown.find("recording date: 2003"), std::string::npos) << shown;
+}
