@@ -76,7 +76,8 @@ inline std::filesystem::path makeSound(const CTempFolder& folder, const std::str
     const std::filesystem::path source = made / ("sound." + extension);
     if (!std::filesystem::exists(source)) {
         const std::string wave = made / "source.wav";
-        run({"sox", "-R", "-n", "-r", "44100", "-b", "16", "-c", "2", wave, "synth", "1", "pinknoise", "vol", "0.5"});
+        run({"sox", "-R", "-n", "-r", "44100", "-b", "16", "-c", "2", wave, "synth", "1", "pinknoise", "vol",
+             "0.5"});
         if (extension == "mp3") run({"lame", "--quiet", "-t", wave, source});
         if (extension == "flac") run({"flac", "-s", wave, "-o", source});
         if (extension == "ogg") run({"oggenc", "-Q", wave, "-o", source});

@@ -7,6 +7,7 @@
 
 #include <tfilestream.h>
 
+#include <filesystem>
 #include <string>
 
 namespace filetag::taglib {
@@ -55,8 +56,8 @@ private:
 
     P<peru::IURI> m_uri;
     TagLib::FileStream m_file;
-    int64_t m_oldSize;
-    int64_t m_oldTime; // of the last change, in nanoseconds
+    int64_t m_oldSize = 0;
+    std::filesystem::file_time_type m_oldTime; // of the last change
     CPieceTable m_pieces;
     int64_t m_position = 0; // once there are changes; the file's own before
 };
