@@ -181,8 +181,10 @@ TONEWRIGHT_API void TONEWRIGHT_fillFeatures(void* buffer);
  * one it logs a line and does nothing. */
 TONEWRIGHT_API void TONEWRIGHT_InitDiscio(uint8_t flag);
 
-/* Sets the ending of the temporary names under which output files and tags are written until they are
- * complete, such as ".part"; it is cut off a name before the extension selects a format. Empty ends that. */
+/* Sets the ending of the temporary names under which a host has output files written until they are
+ * complete, such as ".part": it is cut off a name before the extension selects a format or a kind of tag, so
+ * that a tag can be stored before the file has its final name. Empty ends that. Not to be called while
+ * another thread makes formats or tags. */
 TONEWRIGHT_API void TONEWRIGHT_SetTempExtension(const char16_t* extension);
 
 /* Watches the optical drives, or stops that with null. The callback must stay valid until then. */
@@ -340,14 +342,18 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Player_SetCallback(TONEWRIGHT_Handle player,
 
 /* --- File tags ----------------------------------------------------------------------------------- */
 
-/* The tag of an audio file, read at once. Null when the file or its kind cannot be read. */
+/* The tag of an audio file, read at once: mp3, wav, flac, ogg, wma or asf by the name's extension in any
+ * case. Null, with nothing in the log, for any other extension; null with the reason in the log for a file
+ * that cannot be read or whose content does not fit its extension. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateFileTag(const char16_t* uri);
 
-/* Writes the changed tag to its file. Result: 0, or 8 with the file as it was. */
+/* Writes the changed tag to its file, which is then the new one, whole; other content of the file stays. The
+ * handle is used up: another store needs a tag that was made anew. Result: 0, or 8 with the file as it was.
+ */
 TONEWRIGHT_API int32_t TONEWRIGHT_StoreFileTag(TONEWRIGHT_Handle tag);
 
 /* A field of a tag: a text handle, with an empty text where the tag has none. Bad handle or failure: null.
- * Track number and year are texts too. */
+ * Track number and year are texts too, such as "3/12" and "1999-04-01"; nothing parses them. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetArtist(TONEWRIGHT_Handle tag);
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetAlbumArtist(TONEWRIGHT_Handle tag);
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetTitle(TONEWRIGHT_Handle tag);
@@ -357,7 +363,8 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetYear(TONEWRIGHT_Handle ta
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetGenre(TONEWRIGHT_Handle tag);
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetComment(TONEWRIGHT_Handle tag);
 
-/* Changes a field in memory. A bad handle is ignored. */
+/* Changes a field in memory; an empty text, or null, removes it. A kind of tag that does not have the field
+ * (album and album artist in wav) ignores it: its getter stays empty. A bad handle is ignored. */
 TONEWRIGHT_API void TONEWRIGHT_FileTag_SetArtist(TONEWRIGHT_Handle tag, const char16_t* text);
 TONEWRIGHT_API void TONEWRIGHT_FileTag_SetAlbumArtist(TONEWRIGHT_Handle tag, const char16_t* text);
 TONEWRIGHT_API void TONEWRIGHT_FileTag_SetTitle(TONEWRIGHT_Handle tag, const char16_t* text);

@@ -1,3 +1,4 @@
+#include "filetag/FileTagFactory.h"
 #include "peru/ILog.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
@@ -12,7 +13,10 @@ void TONEWRIGHT_InitDiscio(uint8_t /*flag*/) {
 }
 
 void TONEWRIGHT_SetTempExtension(const char16_t* extension) {
-    barrier([&] { requireApp()->getWritePluginHandler()->setURISuffix(toString(extension)); });
+    barrier([&] {
+        requireApp()->getWritePluginHandler()->setURISuffix(toString(extension));
+        filetag::CFileTagFactory::get()->setTempExtension(toString(extension));
+    });
 }
 
 void TONEWRIGHT_SetDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback) {

@@ -1,75 +1,55 @@
-#include "tonewright/exports/AppReference.h"
+#include "filetag/FileTagFactory.h"
+#include "tonewright/exports/Barrier.h"
+#include "tonewright/exports/Handles.h"
 
 using namespace tonewright::exports;
+using filetag::IFileTag;
 
-TONEWRIGHT_Handle TONEWRIGHT_CreateFileTag(const char16_t*) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_CreateFileTag", nullptr);
+namespace {
+
+template <P<peru::IString> (IFileTag::*get)() const> TONEWRIGHT_Handle getField(TONEWRIGHT_Handle tag) {
+    return barrier<TONEWRIGHT_Handle>(nullptr, [&]() -> TONEWRIGHT_Handle {
+        const P<IFileTag> object = unwrap<IFileTag>(tag);
+        return object ? wrapText((object.get()->*get)()) : nullptr;
+    });
 }
 
-int32_t TONEWRIGHT_StoreFileTag(TONEWRIGHT_Handle) {
-    return notAvailable<int32_t>("TONEWRIGHT_StoreFileTag", TONEWRIGHT_FILE_TAG_FAILED);
+template <void (IFileTag::*set)(const peru::CStringArg&)>
+void setField(TONEWRIGHT_Handle tag, const char16_t* text) {
+    barrier([&] {
+        if (const P<IFileTag> object = unwrap<IFileTag>(tag)) (object.get()->*set)(toString(text));
+    });
 }
 
-TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetArtist(TONEWRIGHT_Handle) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_FileTag_GetArtist", nullptr);
+} // namespace
+
+TONEWRIGHT_Handle TONEWRIGHT_CreateFileTag(const char16_t* uri) {
+    return barrier<TONEWRIGHT_Handle>(
+        nullptr, [&] { return wrap(filetag::CFileTagFactory::get()->create(toURI(uri))); });
 }
 
-TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetAlbumArtist(TONEWRIGHT_Handle) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_FileTag_GetAlbumArtist", nullptr);
+int32_t TONEWRIGHT_StoreFileTag(TONEWRIGHT_Handle tag) {
+    return barrier<int32_t>(TONEWRIGHT_FILE_TAG_FAILED, [&] {
+        const P<IFileTag> object = unwrap<IFileTag>(tag);
+        if (!object) return TONEWRIGHT_FILE_TAG_FAILED;
+        object->store();
+        return TONEWRIGHT_OK;
+    });
 }
 
-TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetTitle(TONEWRIGHT_Handle) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_FileTag_GetTitle", nullptr);
-}
-
-TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetAlbum(TONEWRIGHT_Handle) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_FileTag_GetAlbum", nullptr);
-}
-
-TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetTrackNumber(TONEWRIGHT_Handle) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_FileTag_GetTrackNumber", nullptr);
-}
-
-TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetYear(TONEWRIGHT_Handle) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_FileTag_GetYear", nullptr);
-}
-
-TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetGenre(TONEWRIGHT_Handle) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_FileTag_GetGenre", nullptr);
-}
-
-TONEWRIGHT_Handle TONEWRIGHT_FileTag_GetComment(TONEWRIGHT_Handle) {
-    return notAvailable<TONEWRIGHT_Handle>("TONEWRIGHT_FileTag_GetComment", nullptr);
-}
-
-void TONEWRIGHT_FileTag_SetArtist(TONEWRIGHT_Handle, const char16_t*) {
-    logNotAvailable("TONEWRIGHT_FileTag_SetArtist");
-}
-
-void TONEWRIGHT_FileTag_SetAlbumArtist(TONEWRIGHT_Handle, const char16_t*) {
-    logNotAvailable("TONEWRIGHT_FileTag_SetAlbumArtist");
-}
-
-void TONEWRIGHT_FileTag_SetTitle(TONEWRIGHT_Handle, const char16_t*) {
-    logNotAvailable("TONEWRIGHT_FileTag_SetTitle");
-}
-
-void TONEWRIGHT_FileTag_SetAlbum(TONEWRIGHT_Handle, const char16_t*) {
-    logNotAvailable("TONEWRIGHT_FileTag_SetAlbum");
-}
-
-void TONEWRIGHT_FileTag_SetTrackNumber(TONEWRIGHT_Handle, const char16_t*) {
-    logNotAvailable("TONEWRIGHT_FileTag_SetTrackNumber");
-}
-
-void TONEWRIGHT_FileTag_SetYear(TONEWRIGHT_Handle, const char16_t*) {
-    logNotAvailable("TONEWRIGHT_FileTag_SetYear");
-}
-
-void TONEWRIGHT_FileTag_SetGenre(TONEWRIGHT_Handle, const char16_t*) {
-    logNotAvailable("TONEWRIGHT_FileTag_SetGenre");
-}
-
-void TONEWRIGHT_FileTag_SetComment(TONEWRIGHT_Handle, const char16_t*) {
-    logNotAvailable("TONEWRIGHT_FileTag_SetComment");
-}
+#define FIELD(name)                                                                                          \
+    TONEWRIGHT_Handle TONEWRIGHT_FileTag_Get##name(TONEWRIGHT_Handle tag) {                                  \
+        return getField<&IFileTag::get##name>(tag);                                                          \
+    }                                                                                                        \
+    void TONEWRIGHT_FileTag_Set##name(TONEWRIGHT_Handle tag, const char16_t* text) {                         \
+        setField<&IFileTag::set##name>(tag, text);                                                           \
+    }
+FIELD(Title)
+FIELD(Artist)
+FIELD(Album)
+FIELD(AlbumArtist)
+FIELD(TrackNumber)
+FIELD(Year)
+FIELD(Genre)
+FIELD(Comment)
+#undef FIELD
