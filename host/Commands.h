@@ -4,6 +4,8 @@
 #include "Library.h"
 #include "Progress.h"
 
+#include <functional>
+#include <map>
 #include <optional>
 
 namespace host {
@@ -25,6 +27,7 @@ struct SConvertOptions : SFormatOptions {
     std::filesystem::path directory; // ... or in this folder
     int jobs = 1;
     bool force = false;
+    bool carryTags = true;
     EOutput show = EOutput::normal;
 };
 
@@ -49,6 +52,12 @@ struct SRecordOptions : SFormatOptions {
     EOutput show = EOutput::normal;
 };
 
+struct SSetTagOptions {
+    std::vector<std::filesystem::path> files;
+    std::map<std::string, std::u16string> fields; // by name; an empty text removes one
+    bool json = false;
+};
+
 int convert(CLibrary& library, const SConvertOptions& options);
 int showInfo(CLibrary& library, const std::vector<std::filesystem::path>& files, bool json);
 int listFormats(CLibrary& library, bool json);
@@ -56,6 +65,14 @@ int drawWaveform(CLibrary& library, const SWaveformOptions& options);
 int listDevices(bool json);
 int play(CLibrary& library, const SPlayOptions& options);
 int record(CLibrary& library, const SRecordOptions& options);
+int showTags(CLibrary& library, const std::vector<std::filesystem::path>& files, bool json);
+int setTags(CLibrary& library, const SSetTagOptions& options);
+
+// Does the job, which throws on failure, with each file, whatever became of those before. Whether there is
+// still something to do when the reader of standard output has left, the caller knows.
+enum class EReader { needed, optional };
+int forEachFile(const std::vector<std::filesystem::path>& files, bool json, EReader reader,
+                const std::function<void(const std::filesystem::path&)>& job);
 
 // "tonewright: FILE: REASON" on standard error.
 void printFailure(const std::filesystem::path& file, const std::string& reason);

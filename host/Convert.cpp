@@ -1,6 +1,7 @@
 #include "AudioFile.h"
 #include "Cancel.h"
 #include "Commands.h"
+#include "FileTag.h"
 #include "HostLog.h"
 #include "Text.h"
 
@@ -55,6 +56,8 @@ private:
     std::string tellWhyNotWritable(const fs::path& input, const std::u16string& outputURI,
                                    const fs::path& output) const;
     std::string tellReason(const fs::path& input, const fs::path& temporary, const fs::path& output) const;
+    void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
+                  CProgress::Job job);
     SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
     std::vector<SSampleFormat> listCandidates(const SSampleFormat& own) const;
 
@@ -146,6 +149,34 @@ std::string CConverter::tellReason(const fs::path& input, const fs::path& tempor
     return asReason(std::move(reason), input);
 }
 
+// A tag that cannot be read does not keep the sound from being converted; what the output's kind of tag does
+// not have is left out.
+void CConverter::carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
+                          CProgress::Job job) {
+    std::vector<std::pair<const STagField*, std::u16string>> texts;
+    try {
+        const CFileTag from(m_library, input);
+        if (!from) return;
+        for (const STagField& field : getTagFields())
+            if (std::u16string text = from.get(field); !text.empty())
+                texts.emplace_back(&field, std::move(text));
+    } catch (const std::exception& error) {
+        return m_progress.warn(job,
+                               std::string("The tag could not be read and is left out: ") + error.what());
+    }
+    if (texts.empty()) return;
+    try {
+        CFileTag to(m_library, temporary);
+        if (!to) return;
+        for (const auto& [field, text] : texts) to.set(*field, text);
+        to.store();
+    } catch (const std::exception& error) {
+        std::string reason = "The tag of " + output.native() + " could not be written: " + error.what();
+        replaceAll(reason, m_temporaryEnding, "");
+        throw std::runtime_error(reason);
+    }
+}
+
 void CConverter::convert(const fs::path& input, const fs::path& output, CProgress::Job job) {
     const auto started = std::chrono::steady_clock::now();
     checkInput(input);
@@ -165,6 +196,7 @@ void CConverter::convert(const fs::path& input, const fs::path& output, CProgres
 
     if (running.stopped) return m_progress.cancel(job);
     if (result != TONEWRIGHT_OK) throw std::runtime_error(tellReason(input, place.getTemporary(), output));
+    if (m_options.carryTags) carryTag(input, place.getTemporary(), output, job);
     const uint64_t bytes = fs::file_size(place.getTemporary());
     place.commit();
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;

@@ -41,28 +41,13 @@ void printFailure(const fs::path& file, const std::string& reason) {
                  toPrintable(reason).c_str());
 }
 
-int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
-    bool failed = false, hasHeading = json;
+int forEachFile(const std::vector<fs::path>& files, bool json, EReader reader,
+                const std::function<void(const fs::path&)>& job) {
+    bool failed = false;
     for (const fs::path& file : files) {
         if (isCancelled()) return kExitCancelled;
         try {
-            const SInfo info = readInfo(library, file);
-            if (!std::exchange(hasHeading, true))
-                std::printf("%11s %7s %8s %5s %10s  %s\n", "duration", "rate", "channels", "bits", "size",
-                            "file");
-            if (json)
-                std::printf("%s\n", toLine({{"file", file.native()},
-                                            {"codec", codecName(file)},
-                                            {"duration", info.duration},
-                                            {"rate", info.samples.rate},
-                                            {"channels", info.samples.channels},
-                                            {"bits", info.samples.bytesPerSample * 8},
-                                            {"bytes", info.bytes}})
-                                        .c_str());
-            else
-                std::printf("%11s %7d %8d %5d %10s  %s\n", formatDuration(info.duration).c_str(),
-                            info.samples.rate, info.samples.channels, info.samples.bytesPerSample * 8,
-                            formatSize(info.bytes).c_str(), toPrintable(file.native()).c_str());
+            job(file);
         } catch (const std::exception& error) {
             failed = true;
             if (json)
@@ -70,9 +55,32 @@ int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
             else
                 printFailure(file, error.what());
         }
-        if (!flushOutput()) break;
+        if (!flushOutput() && reader == EReader::needed) break;
     }
     return failed ? kExitFailure : kExitSuccess;
+}
+
+int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
+    bool hasHeading = json;
+    return forEachFile(files, json, EReader::needed, [&](const fs::path& file) {
+        const SInfo info = readInfo(library, file);
+        if (!std::exchange(hasHeading, true))
+            std::printf("%11s %7s %8s %5s %10s  %s\n", "duration", "rate", "channels", "bits", "size",
+                        "file");
+        if (json)
+            std::printf("%s\n", toLine({{"file", file.native()},
+                                        {"codec", codecName(file)},
+                                        {"duration", info.duration},
+                                        {"rate", info.samples.rate},
+                                        {"channels", info.samples.channels},
+                                        {"bits", info.samples.bytesPerSample * 8},
+                                        {"bytes", info.bytes}})
+                                    .c_str());
+        else
+            std::printf("%11s %7d %8d %5d %10s  %s\n", formatDuration(info.duration).c_str(),
+                        info.samples.rate, info.samples.channels, info.samples.bytesPerSample * 8,
+                        formatSize(info.bytes).c_str(), toPrintable(file.native()).c_str());
+    });
 }
 
 int listFormats(CLibrary& library, bool json) {

@@ -30,7 +30,25 @@ namespace host {
     X(Player_Play)                                                                                           \
     X(Player_Pause)                                                                                          \
     X(Player_Stop)                                                                                           \
-    X(Player_SetCallback)
+    X(Player_SetCallback)                                                                                    \
+    X(CreateFileTag)                                                                                         \
+    X(StoreFileTag)                                                                                          \
+    X(FileTag_GetTitle)                                                                                      \
+    X(FileTag_GetArtist)                                                                                     \
+    X(FileTag_GetAlbum)                                                                                      \
+    X(FileTag_GetAlbumArtist)                                                                                \
+    X(FileTag_GetTrackNumber)                                                                                \
+    X(FileTag_GetYear)                                                                                       \
+    X(FileTag_GetGenre)                                                                                      \
+    X(FileTag_GetComment)                                                                                    \
+    X(FileTag_SetTitle)                                                                                      \
+    X(FileTag_SetArtist)                                                                                     \
+    X(FileTag_SetAlbum)                                                                                      \
+    X(FileTag_SetAlbumArtist)                                                                                \
+    X(FileTag_SetTrackNumber)                                                                                \
+    X(FileTag_SetYear)                                                                                       \
+    X(FileTag_SetGenre)                                                                                      \
+    X(FileTag_SetComment)
 
 // One at a time.
 class CLibrary {

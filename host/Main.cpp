@@ -1,7 +1,8 @@
-// tonewright: converts, plays and records sound files, tells about them and draws them.
+// tonewright: converts, plays and records sound files, tells about them, draws them and changes their tags.
 #include "Cancel.h"
 #include "Commands.h"
 #include "Devices.h"
+#include "FileTag.h"
 #include "HostLog.h"
 #include "Text.h"
 
@@ -113,6 +114,9 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
         ->option_text("N")
         ->check(CLI::Range(1, 256));
     command->add_flag("-f,--force", options.force, "Replace existing files");
+    command->add_flag_callback(
+        "--no-tags", [&] { options.carryTags = false; },
+        "Leave title, artist and the other fields of tags behind");
     addOutput(*command, options.show);
     command->callback([&] {
         if (options.output.empty() == options.extension.empty())
@@ -193,6 +197,67 @@ void addRecord(CLI::App& app, SRecordOptions& options, Run& run) {
     });
 }
 
+void addTag(CLI::App& app, SSetTagOptions& options, std::vector<std::string>& cleared, Run& run) {
+    CLI::App* command = app.add_subcommand(
+        "tag",
+        "Show or change title, artist and the other fields of mp3, flac, ogg, wav, wma and asf files.");
+    command->require_subcommand(1);
+    CLI::App* show = command->add_subcommand("show", "Tell the fields of tags.");
+    CLI::App* set = command->add_subcommand(
+        "set", "Change fields of tags. A file is written only when something changes in it, and then as a\n"
+               "whole; a file that fails is told and the next one goes on.");
+    for (CLI::App* each : {show, set}) {
+        each->add_option("FILE", options.files, "Files with tags")->required()->option_text("...");
+        each->add_flag("--json", options.json, "One JSON object a line");
+    }
+    std::vector<std::string> names{"all"};
+    for (const STagField& field : getTagFields()) {
+        names.push_back(field.name);
+        const std::string option = std::string("--") + field.name;
+        const auto take = [&options, name = field.name, option](const std::string& text) {
+            const std::optional<std::u16string> wide = toUTF16(text);
+            if (!wide) throw CLI::ValidationError(option, "is not UTF-8");
+            options.fields[name] = *wide;
+        };
+        set->add_option_function<std::string>(
+               option, take, std::string("The ") + field.title + "; an empty text removes it")
+            ->option_text("TEXT");
+    }
+    set->add_option("--clear", cleared, "Remove a field, or all; may be repeated")
+        ->option_text("FIELD")
+        ->check(CLI::IsMember(names).description(""))
+        ->allow_extra_args(false);
+    show->callback(
+        [&] { run = [&](CLibrary& library) { return showTags(library, options.files, options.json); }; });
+    set->callback([&] {
+        const bool clearsAll = std::find(cleared.begin(), cleared.end(), "all") != cleared.end();
+        for (const STagField& field : getTagFields()) {
+            const bool clears = std::find(cleared.begin(), cleared.end(), field.name) != cleared.end();
+            if (clears && options.fields.count(field.name))
+                throw CLI::ValidationError("--clear", std::string(field.name) + " is also to be set");
+            if (clears || clearsAll) options.fields.try_emplace(field.name);
+        }
+        if (options.fields.empty()) throw CLI::RequiredError("A field to set or to clear");
+        run = [&](CLibrary& library) { return setTags(library, options); };
+    });
+}
+
+// In the parser's order, which is from the last. "--title=" is given an empty text of its own: the parser
+// would take the next word for it.
+std::vector<std::string> splitArguments(int argc, char** argv) {
+    std::vector<std::string> arguments;
+    bool hasOptions = true;
+    for (const std::string& argument : std::vector<std::string>(argv + 1, argv + argc)) {
+        hasOptions = hasOptions && argument != "--";
+        if (hasOptions && argument.starts_with("--") && argument.find('=') == argument.size() - 1)
+            arguments.insert(arguments.end(), {argument.substr(0, argument.size() - 1), ""});
+        else
+            arguments.push_back(argument);
+    }
+    std::reverse(arguments.begin(), arguments.end());
+    return arguments;
+}
+
 // What the commands themselves do not catch is no fault of the library.
 int runCommand(const Run& run, CLibrary& library) {
     try {
@@ -212,7 +277,9 @@ int runCommand(const Run& run, CLibrary& library) {
 } // namespace
 
 int main(int argc, char** argv) {
-    CLI::App app("Converts, plays and records sound files, tells about them and draws them.", "tonewright");
+    CLI::App app(
+        "Converts, plays and records sound files, tells about them, draws them and changes their tags.",
+        "tonewright");
     app.set_version_flag("--version", "tonewright " TONEWRIGHT_VERSION);
     app.require_subcommand(1);
     app.get_formatter()->column_width(28);
@@ -229,6 +296,8 @@ int main(int argc, char** argv) {
     SWaveformOptions waveformOptions;
     SPlayOptions playOptions;
     SRecordOptions recordOptions;
+    SSetTagOptions tagOptions;
+    std::vector<std::string> clearedFields;
     std::vector<std::filesystem::path> infoFiles;
     bool json = false;
     Run run;
@@ -239,6 +308,7 @@ int main(int argc, char** argv) {
     addDevices(app, json, run);
     addPlay(app, playOptions, run);
     addRecord(app, recordOptions, run);
+    addTag(app, tagOptions, clearedFields, run);
     // Which word was wrong, the parser would not say.
     const auto isMeant = [&](const CLI::App* command) { return command->check_name(argv[1]); };
     if (argc > 1 && argv[1][0] != '-' && app.get_subcommands(isMeant).empty()) {
@@ -247,7 +317,7 @@ int main(int argc, char** argv) {
         return kExitUsage;
     }
     try {
-        app.parse(argc, argv);
+        app.parse(splitArguments(argc, argv));
     } catch (const CLI::ParseError& error) {
         return app.exit(error) == 0 ? kExitSuccess : kExitUsage;
     }

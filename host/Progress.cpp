@@ -84,11 +84,20 @@ void CProgress::finish(Job job, const SJobResult& result) {
     drawBars();
 }
 
+void CProgress::warn(Job job, const std::string& reason) {
+    std::lock_guard lock(m_mutex);
+    tell(job, "warning", reason);
+}
+
 void CProgress::fail(Job job, const std::string& reason) {
     std::lock_guard lock(m_mutex);
     m_jobs[job].running = false;
+    tell(job, "error", reason);
+}
+
+void CProgress::tell(Job job, const char* event, const std::string& reason) {
     eraseBars();
-    emit(job, "error", {{"message", reason}});
+    emit(job, event, {{"message", reason}});
     if (m_output != EOutput::json)
         std::fprintf(stderr, "tonewright: %s: %s\n", name(m_jobs[job].input).c_str(),
                      toPrintable(reason).c_str());

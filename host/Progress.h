@@ -23,8 +23,8 @@ struct SJobResult {
     std::string codec;
 };
 
-// Any thread. Bars go to standard error, results to standard output, failures to standard error; with JSON
-// everything goes to standard output.
+// Any thread. Bars go to standard error, results to standard output, failures and warnings to standard error;
+// with JSON everything goes to standard output.
 class CProgress {
 public:
     explicit CProgress(EOutput output);
@@ -35,6 +35,8 @@ public:
               const nlohmann::json& details);
     void advance(Job job, double fraction);
     void finish(Job job, const SJobResult& result);
+    // Something was left out; the job goes on.
+    void warn(Job job, const std::string& reason);
     void fail(Job job, const std::string& reason);
     void cancel(Job job);
 
@@ -50,6 +52,7 @@ private:
         bool running = true;
     };
 
+    void tell(Job job, const char* event, const std::string& reason);
     void emit(Job job, const char* event, nlohmann::json details);
     void eraseBars();
     void drawBars();

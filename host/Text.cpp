@@ -74,6 +74,34 @@ std::string toUTF8(std::u16string_view text) {
     return result;
 }
 
+std::optional<std::u16string> toUTF16(std::string_view utf8) {
+    std::u16string result;
+    for (size_t i = 0; i < utf8.size();) {
+        const unsigned char first = static_cast<unsigned char>(utf8[i++]);
+        const int more = first < 0x80                     ? 0
+                         : first >= 0xC2 && first < 0xE0  ? 1
+                         : first >= 0xE0 && first < 0xF0  ? 2
+                         : first >= 0xF0 && first <= 0xF4 ? 3
+                                                          : -1;
+        if (more < 0) return std::nullopt;
+        char32_t c = more == 0 ? first : first & (0x3F >> more);
+        for (int rest = more; rest > 0; --rest, ++i) {
+            if (i == utf8.size() || (utf8[i] & 0xC0) != 0x80) return std::nullopt;
+            c = c << 6 | (utf8[i] & 0x3F);
+        }
+        // Longer than needed, half of a pair, or beyond the last character
+        if ((more == 2 && c < 0x800) || (more == 3 && c < 0x10000) || (c >= 0xD800 && c < 0xE000) ||
+            c > 0x10FFFF)
+            return std::nullopt;
+        if (c >= 0x10000) {
+            result += static_cast<char16_t>(0xD7C0 + (c >> 10));
+            c = 0xDC00 + (c & 0x3FF);
+        }
+        result += static_cast<char16_t>(c);
+    }
+    return result;
+}
+
 std::string toPrintable(std::string_view text) {
     std::string result;
     for (unsigned char c : text) {
@@ -133,6 +161,8 @@ std::string asReason(std::string message, const std::filesystem::path& about) {
     const std::filesystem::path absolute = std::filesystem::absolute(about);
     for (const std::string& name : {absolute.lexically_normal().native(), absolute.native()}) {
         replaceAll(message, " " + name + ":", ":");
+        for (const char* article : {"the ", "The ", ""})
+            replaceAll(message, article + ("file '" + name + "'"), "this file");
         replaceAll(message, name, "this file");
     }
     if (message.ends_with('.')) message.pop_back();

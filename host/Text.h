@@ -2,6 +2,7 @@
 #pragma once
 
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -10,6 +11,8 @@ namespace host {
 // The "file:" URI of a path, relative ones from the current folder. Every byte that is not plain ASCII in a
 // name is escaped, so that names need not be valid UTF-8.
 std::u16string toURI(const std::filesystem::path& path);
+// Empty for bytes that are no UTF-8.
+std::optional<std::u16string> toUTF16(std::string_view utf8);
 // Unpaired surrogates become U+FFFD.
 std::string toUTF8(std::u16string_view text);
 // For a line on a terminal: control characters are shown as \xNN.
