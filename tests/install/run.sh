@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Installs into a folder of its own, builds a ten-line C host by pkg-config and by the CMake package, and converts
-# a file with each: run.sh BUILD_DIR SOURCE_DIR CMAKE
+# a file with each, and a C++ host of the tag library: run.sh BUILD_DIR SOURCE_DIR CMAKE
 set -euo pipefail
 
 build=$1 source=$2 cmake=$3
@@ -12,7 +12,8 @@ export PKG_CONFIG_PATH=$work/usr/lib/pkgconfig
 read -ra flags < <(pkg-config --cflags --libs tonewright)
 cc -std=c11 -Wall -Wextra -Werror "$source/host.c" -o "$work/by-pkg-config" "${flags[@]}" "-Wl,-rpath,$work/usr/lib"
 
-"$cmake" -S "$source/host" -B "$work/build" -G Ninja "-DCMAKE_PREFIX_PATH=$work/usr" >"$work/configure.log"
+"$cmake" -S "$source/host" -B "$work/build" -G Ninja "-DCMAKE_PREFIX_PATH=$work/usr" \
+    "-DEXAMPLES=$source/../../docs/examples" >"$work/configure.log"
 "$cmake" --build "$work/build" >"$work/build.log" || { cat "$work/build.log"; exit 1; }
 
 sox -n -r 44100 -c 2 -b 16 "$work/tone.wav" synth 1 sine 440
@@ -25,3 +26,7 @@ done
 # The installed program finds everything it needs by itself.
 "$work/usr/bin/tonewright" convert --force "$work/tone.wav" -o "$work/tone.flac"
 flac -t -s "$work/tone.flac"
+
+ffmpeg -v error -f lavfi -i color=red:s=16x16 -frames:v 1 "$work/red.png"
+"$work/build/covers" add "$work/tone.flac" "$work/red.png"
+"$work/build/covers" list "$work/tone.flac" | grep -q "^0 front image/png"
