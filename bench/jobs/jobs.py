@@ -78,12 +78,80 @@ def sparse_silence(path, seconds):
         file.truncate(len(header) + size)
 
 
+# Reads every field of every file, as "tonewright tag show" does.
+MUTAGEN_SHOW = """
+import sys, mutagen
+for name in sys.argv[1:]:
+    tags = mutagen.File(name).tags
+    print(name, {key: str(tags[key]) for key in tags.keys()} if tags else None)
+"""
+PROBE_SHOW = 'for file; do ffprobe -v error -of json -show_entries format_tags:stream_tags "$file"; done'
+TAG_FILES = 1000
+
+
+def compare(title, repeat, ours, peer, theirs, prepare=lambda: None):
+    """One line of ratios. The commands may be functions that give a new command each time."""
+    pairs = []
+    for _ in range(repeat):
+        pair = []
+        for command in (ours, theirs):
+            prepare()
+            pair.append(run(command() if callable(command) else command))
+        pairs.append(pair)
+    mine, other = best([a for a, _ in pairs]), best([b for _, b in pairs])
+    ratio = lambda i: f"{mine[i] / other[i]:6.2f}" if other[i] > 0 else "     -"
+    print(f"{title:40} {peer:8} {ratio(0)} {ratio(1)} {mine[1] * 1000:9.0f} {other[1] * 1000:9.0f}", flush=True)
+
+
+def bench_tags(host, work, wav, repeat):
+    print(f"\n{'tags':40} {'peer':8} {'CPU':>6} {'wall':>6} {'ms':>9} {'peer ms':>9}")
+    folder = work / "tags"
+    shutil.rmtree(folder, ignore_errors=True)
+    folder.mkdir()
+    fields = [f"{key}={key} of a sound" for key in ("title", "artist", "album", "album_artist", "genre", "comment")] + ["track=3", "date=1999"]
+    metadata = [word for field in fields for word in ("-metadata", field)]
+    for extension in ("flac", "mp3", "ogg", "wav", "wma"):
+        first = folder / f"0.{extension}"
+        subprocess.run(["ffmpeg", "-v", "error", "-y", "-t", "2", "-i", wav, *metadata, first], check=True)
+        files = [first]
+        for i in range(1, TAG_FILES):
+            files.append(folder / f"{i}.{extension}")
+            shutil.copyfile(first, files[-1])
+        title = f"show, {TAG_FILES} {extension} files"
+        ours = [host, "tag", "show", "--json", *files]
+        compare(title, repeat, ours, "mutagen", ["/usr/bin/python3", "-c", MUTAGEN_SHOW, *files])
+        # A process for each file, as there is no other way.
+        compare(title, 1, ours, "ffprobe", ["sh", "-c", PROBE_SHOW, "sh", *files])
+
+    counter = iter(range(1000000))
+    text = lambda: f"title {next(counter):06}"
+    noise = folder / "noise.wav"
+    subprocess.run(["sox", "-n", "-r", str(RATE), "-c", "2", "-b", "16", noise, "synth", "290", "whitenoise"], check=True)
+    for name, padding in (("padded", "--padding=8192"), ("tight", "--no-padding")):
+        subprocess.run(["flac", "-s", "-f", "-0", padding, noise, "-o", folder / f"{name}.flac"], check=True)
+    padded, tight, copy, out = (folder / f"{name}.flac" for name in ("padded", "tight", "copy", "out"))
+    set_title = lambda file: lambda: [host, "tag", "set", file, "--title", text()]
+    compare(
+        f"set, FLAC of {padded.stat().st_size // 1000000} MB with padding", max(repeat, 5), set_title(padded),
+        "metaflac", lambda: ["metaflac", "--remove-tag=TITLE", f"--set-tag=TITLE={text()}", padded],
+    )
+    compare(
+        "set, the same without padding", max(repeat, 5), set_title(copy),
+        "cp", ["cp", tight, out], prepare=lambda: shutil.copyfile(tight, copy),
+    )
+    compare(
+        "set, the same without padding", max(repeat, 5), set_title(copy),
+        "cp, sync", ["sh", "-c", 'cp "$0" "$1" && sync "$1"', tight, out], prepare=lambda: shutil.copyfile(tight, copy),
+    )
+    shutil.rmtree(folder)
+
+
 def main():
     parser = argparse.ArgumentParser(description=__doc__)
     parser.add_argument("build", type=pathlib.Path)
     parser.add_argument("--minutes", type=int, default=10, help="length of the material")
     parser.add_argument("--repeat", type=int, default=3, help="runs of each job, interleaved with its peer")
-    parser.add_argument("--only", default="", help="jobs whose name holds this text")
+    parser.add_argument("--only", default="", help="jobs whose name holds this text; tags for those of tags")
     arguments = parser.parse_args()
 
     host = arguments.build / "bin/tonewright"
@@ -115,6 +183,8 @@ def main():
             flush=True,
         )
 
+    if arguments.only.lower() in "tags":
+        bench_tags(host, work, wav, arguments.repeat)
     if not arguments.only:
         print("\nPeak memory by length, WAV to FLAC:")
         for title, seconds in (("1 minute", 60), ("6 hours", 6 * 3600)):
@@ -128,7 +198,7 @@ def main():
 
 
 if __name__ == "__main__":
-    for tool in ("flac", "lame", "oggenc", "ffmpeg", "sox"):
+    for tool in ("flac", "metaflac", "lame", "oggenc", "ffmpeg", "sox"):
         if not shutil.which(tool):
             sys.exit(f"{tool} is missing: run scripts/setup.sh")
     main()
