@@ -32,8 +32,7 @@ std::string_view toView(const TagLib::ByteVector& bytes) {
 
 } // namespace
 
-CTagLibIOStream::CTagLibIOStream(const P<IURI>& file)
-    : m_uri(file), m_file(getPath(file).c_str(), true), m_pieces(0) {
+CTagLibIOStream::CTagLibIOStream(const P<IURI>& file) : m_uri(file), m_file(getPath(file).c_str(), true) {
     if (!m_file.isOpen()) {
         try {
             getStreamManager()->getInStream(file); // tells the reason
@@ -44,8 +43,6 @@ CTagLibIOStream::CTagLibIOStream(const P<IURI>& file)
     }
     std::error_code error;
     m_oldTime = std::filesystem::last_write_time(m_file.name(), error);
-    m_oldSize = m_file.length();
-    m_pieces = CPieceTable(m_oldSize);
 }
 
 CTagLibIOStream::~CTagLibIOStream() = default;
@@ -55,8 +52,8 @@ TagLib::FileName CTagLibIOStream::name() const {
 }
 
 TagLib::ByteVector CTagLibIOStream::readBlock(unsigned long length) {
-    if (!m_pieces.isChanged()) return m_file.readBlock(length);
-    const int64_t left = std::max<int64_t>(m_pieces.getSize() - m_position, 0);
+    if (!m_pieces) return m_file.readBlock(length);
+    const int64_t left = std::max<int64_t>(m_pieces->getSize() - m_position, 0);
     const int64_t end =
         m_position + (length < static_cast<unsigned long>(left) ? static_cast<int64_t>(length) : left);
     const std::string bytes = readNew({m_position, end});
@@ -67,17 +64,17 @@ TagLib::ByteVector CTagLibIOStream::readBlock(unsigned long length) {
 // The first change is where the position passes over from the file.
 void CTagLibIOStream::writeBlock(const TagLib::ByteVector& data) {
     m_position = tell();
-    m_pieces.write(m_position, toView(data));
+    change().write(m_position, toView(data));
     m_position += static_cast<int64_t>(data.size());
 }
 
 void CTagLibIOStream::insert(const TagLib::ByteVector& data, unsigned long start, unsigned long replace) {
-    m_pieces.insert(static_cast<int64_t>(start), toView(data), static_cast<int64_t>(replace));
+    change().insert(static_cast<int64_t>(start), toView(data), static_cast<int64_t>(replace));
     m_position = static_cast<int64_t>(start) + static_cast<int64_t>(data.size());
 }
 
 void CTagLibIOStream::removeBlock(unsigned long start, unsigned long length) {
-    m_pieces.insert(static_cast<int64_t>(start), {}, static_cast<int64_t>(length));
+    change().insert(static_cast<int64_t>(start), {}, static_cast<int64_t>(length));
     m_position = static_cast<int64_t>(start);
 }
 
@@ -90,9 +87,9 @@ bool CTagLibIOStream::isOpen() const {
 }
 
 void CTagLibIOStream::seek(long offset, Position from) {
-    if (!m_pieces.isChanged()) return m_file.seek(offset, from);
+    if (!m_pieces) return m_file.seek(offset, from);
     if (from == Current) offset += m_position;
-    if (from == End) offset += m_pieces.getSize();
+    if (from == End) offset += m_pieces->getSize();
     m_position = std::max(offset, 0L);
 }
 
@@ -101,16 +98,24 @@ void CTagLibIOStream::clear() {
 }
 
 long CTagLibIOStream::tell() const {
-    return m_pieces.isChanged() ? m_position : m_file.tell();
+    return m_pieces ? m_position : m_file.tell();
 }
 
 long CTagLibIOStream::length() {
-    return m_pieces.isChanged() ? m_pieces.getSize() : m_file.length();
+    return m_pieces ? m_pieces->getSize() : m_file.length();
 }
 
 void CTagLibIOStream::truncate(long length) {
     m_position = tell();
-    m_pieces.setSize(length);
+    change().setSize(length);
+}
+
+CPieceTable& CTagLibIOStream::change() {
+    if (!m_pieces) {
+        m_oldSize = m_file.length();
+        m_pieces.emplace(m_oldSize);
+    }
+    return *m_pieces;
 }
 
 std::string CTagLibIOStream::readOld(int64_t offset, int64_t size) {
@@ -126,13 +131,13 @@ std::string CTagLibIOStream::readOld(int64_t offset, int64_t size) {
 std::string CTagLibIOStream::readNew(const SRange& range) {
     std::string bytes;
     int64_t position = range.start;
-    for (auto entry = m_pieces.find(position); position < range.end; ++entry) {
+    for (auto entry = m_pieces->find(position); position < range.end; ++entry) {
         CPieceTable::SPiece part = entry->second;
         const int64_t passed = position - entry->first;
         part.source += passed;
         part.size = std::min(part.size - passed, range.end - position);
         if (part.isNew)
-            bytes += m_pieces.getBytes(part);
+            bytes += m_pieces->getBytes(part);
         else
             bytes += readOld(part.source, part.size);
         position += part.size;
@@ -142,13 +147,13 @@ std::string CTagLibIOStream::readNew(const SRange& range) {
 
 CTagLibIOStream::SRange CTagLibIOStream::findDifference() {
     SRange range{std::numeric_limits<int64_t>::max(), 0};
-    for (const auto& [position, piece] : m_pieces.getPieces()) {
+    for (const auto& [position, piece] : m_pieces->getPieces()) {
         if (!piece.isNew && piece.source == position) continue;
         int64_t first = 0;
         int64_t end = piece.size;
         if (piece.isNew) {
             const std::string old = readOld(position, piece.size);
-            const std::string_view bytes = m_pieces.getBytes(piece);
+            const std::string_view bytes = m_pieces->getBytes(piece);
             while (first < end && bytes[static_cast<size_t>(first)] == old[static_cast<size_t>(first)])
                 ++first;
             if (first == end) continue;
@@ -199,22 +204,22 @@ void CTagLibIOStream::writePage(const SRange& range) {
 void CTagLibIOStream::replaceFile() {
     const P<IFileReplacement> replacement = getSystem()->startReplacement(m_uri);
     const P<ISeekableIOStream> stream = replacement->getStream();
-    for (const auto& [position, piece] : m_pieces.getPieces()) {
+    for (const auto& [position, piece] : m_pieces->getPieces()) {
         if (!piece.isNew && piece.size >= kCopiedInside) {
             replacement->copyFromOld(piece.source, piece.size);
             continue;
         }
         const std::string bytes =
-            piece.isNew ? std::string(m_pieces.getBytes(piece)) : readOld(piece.source, piece.size);
+            piece.isNew ? std::string(m_pieces->getBytes(piece)) : readOld(piece.source, piece.size);
         stream->write(bytes.data(), piece.size);
     }
     replacement->commit();
 }
 
 void CTagLibIOStream::commit() {
-    if (!m_pieces.isChanged()) return;
+    if (!m_pieces || !m_pieces->isChanged()) return;
     checkUnchanged();
-    if (m_pieces.getSize() == m_oldSize) {
+    if (m_pieces->getSize() == m_oldSize) {
         const SRange range = findDifference();
         if (range.end == 0) return;
         if (range.start / kPageSize == (range.end - 1) / kPageSize) return writePage(range);

@@ -8,6 +8,7 @@
 #include <tfilestream.h>
 
 #include <filesystem>
+#include <optional>
 #include <string>
 
 namespace filetag::taglib {
@@ -46,6 +47,7 @@ private:
         int64_t end = 0;
     };
 
+    CPieceTable& change();
     std::string readOld(int64_t offset, int64_t size);
     // What differs from the old file, from the first byte to the last; the content is as long as that.
     SRange findDifference();
@@ -58,8 +60,8 @@ private:
     TagLib::FileStream m_file;
     int64_t m_oldSize = 0;
     std::filesystem::file_time_type m_oldTime; // of the last change
-    CPieceTable m_pieces;
-    int64_t m_position = 0; // once there are changes; the file's own before
+    std::optional<CPieceTable> m_pieces;       // from the first change on: most files are only read
+    int64_t m_position = 0;                    // once there are changes; the file's own before
 };
 
 } // namespace filetag::taglib
