@@ -43,6 +43,7 @@ CTagLibIOStream::CTagLibIOStream(const P<IURI>& file) : m_uri(file), m_file(getP
     }
     std::error_code error;
     m_oldTime = std::filesystem::last_write_time(m_file.name(), error);
+    m_oldSize = m_file.length();
 }
 
 CTagLibIOStream::~CTagLibIOStream() = default;
@@ -101,8 +102,9 @@ long CTagLibIOStream::tell() const {
     return m_pieces ? m_position : m_file.tell();
 }
 
+// TagLib asks again and again; its own stream would go to the end and back each time.
 long CTagLibIOStream::length() {
-    return m_pieces ? m_pieces->getSize() : m_file.length();
+    return m_pieces ? m_pieces->getSize() : m_oldSize;
 }
 
 void CTagLibIOStream::truncate(long length) {
@@ -111,10 +113,7 @@ void CTagLibIOStream::truncate(long length) {
 }
 
 CPieceTable& CTagLibIOStream::change() {
-    if (!m_pieces) {
-        m_oldSize = m_file.length();
-        m_pieces.emplace(m_oldSize);
-    }
+    if (!m_pieces) m_pieces.emplace(m_oldSize);
     return *m_pieces;
 }
 
