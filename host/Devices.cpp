@@ -82,8 +82,9 @@ void print(const IAudioDevice& device, const char* direction, bool json) {
 
 void requireOutDevice() {
     // What plays files has no need to answer within milliseconds, and with the few that the device asks for a
-    // busy machine lets gaps in.
-    ::setenv("PULSE_LATENCY_MSEC", "200", 0);
+    // busy machine lets gaps in. With more than a chunk of sound the beginning has one, and from 150 on the
+    // server's delay is told too short, so that the last samples may be cut off.
+    ::setenv("PULSE_LATENCY_MSEC", "100", 0);
     if (!ask([](auto& system) { return system.getDefaultOutDevice(); }))
         throw CNoDevice("There is no sound device to play on");
 }
