@@ -1,6 +1,7 @@
 #include "AudioFile.h"
 #include "Cancel.h"
 #include "Commands.h"
+#include "EncodeJob.h"
 #include "FileTag.h"
 #include "HostLog.h"
 #include "Text.h"
@@ -10,7 +11,6 @@
 #include <set>
 #include <stdexcept>
 #include <thread>
-#include <unistd.h>
 
 namespace host {
 
@@ -18,28 +18,11 @@ namespace fs = std::filesystem;
 
 namespace {
 
-// The callback has no word of its own for the caller, but it is called on the thread that encodes.
-struct SRunning {
-    CProgress* progress;
-    CProgress::Job job;
-    bool stopped = false;
-};
-thread_local SRunning* t_running = nullptr;
-
-bool onProgress(double fraction, int32_t) {
-    t_running->progress->advance(t_running->job, std::clamp(fraction, 0.0, 1.0));
-    t_running->stopped = isCancelled();
-    return !t_running->stopped;
-}
-
 class CConverter {
 public:
     CConverter(CLibrary& library, const SConvertOptions& options, CProgress& progress)
         : m_library(library), m_options(options), m_progress(progress),
-          m_temporaryEnding(".part" + std::to_string(::getpid())) {
-        m_library.SetTempExtension(
-            std::u16string(m_temporaryEnding.begin(), m_temporaryEnding.end()).c_str());
-    }
+          m_temporaryEnding(setTemporaryEnding(library)) {}
 
     // True when the file was made. Any thread.
     bool run(const fs::path& input, const fs::path& output);
@@ -55,7 +38,6 @@ private:
     std::string tellWhyNotReadable(const fs::path& input, const SSampleFormat& wanted) const;
     std::string tellWhyNotWritable(const fs::path& input, const std::u16string& outputURI,
                                    const fs::path& output) const;
-    std::string tellReason(const fs::path& input, const fs::path& temporary, const fs::path& output) const;
     void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
                   CProgress::Job job);
     SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
@@ -95,14 +77,10 @@ std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) 
 
 CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& temporary,
                                        const fs::path& output) {
-    const std::u16string inputURI = toURI(input), outputURI = toURI(temporary);
-    const double quality = m_options.quality ? std::max(*m_options.quality, 1e-9) : 0.0; // 0.0 means unset
+    const std::u16string inputURI = toURI(input);
     std::optional<SSampleFormat> writable; // the first that the target can hold
     for (const SSampleFormat& samples : listCandidates(readSampleFormat(input))) {
-        CHostLog::takeReason();
-        CHandle format(m_library.CreateAudioFormatFromURI(outputURI.c_str(), samples.rate, samples.channels,
-                                                          samples.bytesPerSample, quality, m_options.bitRate,
-                                                          m_options.minBitRate, m_options.maxBitRate));
+        CHandle format = createFormat(m_library, temporary, samples, m_options);
         if (!format) continue;
         CHandle source(m_library.CreateAudioSourceFromURI(inputURI.c_str(), samples.rate, samples.channels,
                                                           samples.bytesPerSample, 1));
@@ -113,7 +91,7 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
         if (!writable) writable = samples;
     }
     if (writable) throw std::runtime_error(tellWhyNotReadable(input, *writable));
-    throw std::runtime_error(tellWhyNotWritable(input, outputURI, output));
+    throw std::runtime_error(tellWhyNotWritable(input, toURI(temporary), output));
 }
 
 // A kind that nobody reads is another matter than a conversion that its reader does not do.
@@ -135,18 +113,6 @@ std::string CConverter::tellWhyNotWritable(const fs::path& input, const std::u16
     std::string reason = asReason(CHostLog::takeReason(), input);
     if (!reason.empty()) return reason;
     return output.string() + " cannot hold " + describe(listCandidates(readSampleFormat(input)).front());
-}
-
-// Messages name the file that the user knows.
-std::string CConverter::tellReason(const fs::path& input, const fs::path& temporary,
-                                   const fs::path& output) const {
-    std::string reason = CHostLog::takeReason();
-    if (reason.empty()) return "The conversion failed";
-    const fs::path absolute = fs::absolute(temporary);
-    for (const std::string& shown : {absolute.lexically_normal().native(), absolute.native()})
-        replaceAll(reason, shown, output.native());
-    replaceAll(reason, m_temporaryEnding, ""); // wherever the name was told in another way
-    return asReason(std::move(reason), input);
 }
 
 // A tag that cannot be read does not keep the sound from being converted; what the output's kind of tag does
@@ -185,17 +151,10 @@ void CConverter::convert(const fs::path& input, const fs::path& output, CProgres
 
     SEnds ends = openEnds(input, place.getTemporary(), output);
     const double duration = m_library.AudioSource_GetDuration(ends.source.get());
-    CHandle encoder(m_library.CreateAudioEncoder(ends.source.get(), ends.format.get()));
-    SRunning running{&m_progress, job};
-    t_running = &running;
-    m_library.AudioEncoder_SetCallback(encoder.get(), onProgress);
-    const int32_t result = m_library.AudioEncoder_Encode(encoder.get());
-    t_running = nullptr;
-    encoder.reset();
+    const bool done = encode(m_library, ends.source, ends.format, m_progress, job,
+                             {input, place.getTemporary(), output}, m_temporaryEnding);
     ends = {};
-
-    if (running.stopped) return m_progress.cancel(job);
-    if (result != TONEWRIGHT_OK) throw std::runtime_error(tellReason(input, place.getTemporary(), output));
+    if (!done) return m_progress.cancel(job);
     if (m_options.carryTags) carryTag(input, place.getTemporary(), output, job);
     const uint64_t bytes = fs::file_size(place.getTemporary());
     place.commit();

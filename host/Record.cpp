@@ -2,6 +2,7 @@
 #include "Cancel.h"
 #include "Commands.h"
 #include "Devices.h"
+#include "EncodeJob.h"
 #include "HostLog.h"
 #include "Keyboard.h"
 #include "LiveLine.h"
@@ -70,7 +71,6 @@ public:
     void run(const peru::P<peru::media::IAudioInDevice>& device);
 
 private:
-    CHandle makeFormat();
     CHandle openSource(const peru::P<peru::media::IAudioInDevice>& device);
     void encode(const peru::P<peru::media::IAudioInDevice>& device);
     void watch(const std::atomic<bool>& hasEnded);
@@ -86,24 +86,6 @@ private:
     COutputPlace m_place;
     CLiveLine& m_line;
 };
-
-// An extension that nobody writes is another matter than a sound that it cannot hold.
-CHandle CRecorder::makeFormat() {
-    const double quality = m_options.quality ? std::max(*m_options.quality, 1e-9) : 0.0; // 0.0 means unset
-    const std::u16string uri = toURI(m_place.getTemporary());
-    const auto make = [&](const SSampleFormat& samples) {
-        CHostLog::takeReason();
-        return CHandle(m_library.CreateAudioFormatFromURI(uri.c_str(), samples.rate, samples.channels,
-                                                          samples.bytesPerSample, quality, m_options.bitRate,
-                                                          m_options.minBitRate, m_options.maxBitRate));
-    };
-    CHandle format = make(m_samples);
-    if (format) return format;
-    if (const std::string reason = CHostLog::takeReason(); !reason.empty())
-        throw std::runtime_error(asReason(reason, m_place.getTemporary()));
-    if (make(SSampleFormat())) throw std::runtime_error("It cannot hold " + describe(m_samples));
-    throw std::runtime_error("No plug-in writes " + describeKind(m_options.output));
-}
 
 CHandle CRecorder::openSource(const peru::P<peru::media::IAudioInDevice>& device) {
     CHostLog::takeReason();
@@ -137,7 +119,9 @@ void CRecorder::watch(const std::atomic<bool>& hasEnded) {
 
 // Returns when the device delivers no more and all that it delivered is in the file.
 void CRecorder::encode(const peru::P<peru::media::IAudioInDevice>& device) {
-    const CHandle format = makeFormat(), source = openSource(device);
+    const CHandle format =
+        requireFormat(m_library, m_place.getTemporary(), m_samples, m_options, m_options.output, "It");
+    const CHandle source = openSource(device);
     const CHandle encoder(m_library.CreateAudioEncoder(source.get(), format.get()));
     int32_t result = TONEWRIGHT_ENCODER_FAILED;
     std::string reason;

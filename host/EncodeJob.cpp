@@ -1,0 +1,91 @@
+#include "EncodeJob.h"
+
+#include "Cancel.h"
+#include "HostLog.h"
+#include "Text.h"
+
+#include <algorithm>
+#include <stdexcept>
+#include <unistd.h>
+
+namespace host {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+// The callback has no word of its own for the caller, but it is called on the thread that encodes.
+struct SRunning {
+    CProgress* progress;
+    CProgress::Job job;
+    bool stopped = false;
+};
+thread_local SRunning* t_running = nullptr;
+
+bool onProgress(double fraction, int32_t) {
+    t_running->progress->advance(t_running->job, std::clamp(fraction, 0.0, 1.0));
+    t_running->stopped = isCancelled();
+    return !t_running->stopped;
+}
+
+// Messages name the file that the user knows.
+std::string tellReason(const SEncodeFiles& files, const std::string& temporaryEnding) {
+    std::string reason = CHostLog::takeReason();
+    if (reason.empty()) return "The conversion failed";
+    const fs::path absolute = fs::absolute(files.temporary);
+    for (const std::string& shown : {absolute.lexically_normal().native(), absolute.native()})
+        replaceAll(reason, shown, files.output.native());
+    replaceAll(reason, temporaryEnding, ""); // wherever the name was told in another way
+    return asReason(std::move(reason), files.input);
+}
+
+} // namespace
+
+std::string setTemporaryEnding(CLibrary& library) {
+    const std::string ending = ".part" + std::to_string(::getpid());
+    library.SetTempExtension(std::u16string(ending.begin(), ending.end()).c_str());
+    return ending;
+}
+
+CHandle createFormat(CLibrary& library, const fs::path& temporary, const SSampleFormat& samples,
+                     const SFormatOptions& options) {
+    const double quality = options.quality ? std::max(*options.quality, 1e-9) : 0.0; // 0.0 means unset
+    CHostLog::takeReason();
+    return CHandle(library.CreateAudioFormatFromURI(toURI(temporary).c_str(), samples.rate, samples.channels,
+                                                    samples.bytesPerSample, quality, options.bitRate,
+                                                    options.minBitRate, options.maxBitRate));
+}
+
+// An extension that nobody writes is another matter than a sound that it cannot hold.
+CHandle requireFormat(CLibrary& library, const fs::path& temporary, const SSampleFormat& samples,
+                      const SFormatOptions& options, const fs::path& output, const std::string& subject) {
+    CHandle format = createFormat(library, temporary, samples, options);
+    if (format) return format;
+    if (const std::string reason = CHostLog::takeReason(); !reason.empty())
+        throw std::runtime_error(asReason(reason, temporary));
+    if (createFormat(library, temporary, SSampleFormat(), options))
+        throw std::runtime_error(subject + " cannot hold " + describe(samples));
+    throw std::runtime_error("No plug-in writes " + describeKind(output));
+}
+
+bool encode(CLibrary& library, const CHandle& source, const CHandle& format, CProgress& progress,
+            CProgress::Job job, const SEncodeFiles& files, const std::string& temporaryEnding) {
+    CHostLog::takeReason();
+    SRunning running{&progress, job};
+    t_running = &running;
+    int32_t result = TONEWRIGHT_ENCODER_FAILED;
+    {
+        // Making it opens the source for a moment, which may fail already.
+        const CHandle encoder(library.CreateAudioEncoder(source.get(), format.get()));
+        if (encoder) {
+            library.AudioEncoder_SetCallback(encoder.get(), onProgress);
+            result = library.AudioEncoder_Encode(encoder.get());
+        }
+    }
+    t_running = nullptr;
+    if (running.stopped) return false;
+    if (result != TONEWRIGHT_OK) throw std::runtime_error(tellReason(files, temporaryEnding));
+    return true;
+}
+
+} // namespace host
