@@ -44,6 +44,13 @@ struct SPlayOptions {
     EOutput show = EOutput::normal;
 };
 
+struct SMixOptions : SFormatOptions {
+    std::filesystem::path input;
+    std::filesystem::path output;
+    bool force = false;
+    EOutput show = EOutput::normal;
+};
+
 struct SRecordOptions : SFormatOptions {
     std::filesystem::path output;
     std::string device; // its id; the default device where empty
@@ -64,6 +71,7 @@ int listFormats(CLibrary& library, bool json);
 int drawWaveform(CLibrary& library, const SWaveformOptions& options);
 int listDevices(bool json);
 int play(CLibrary& library, const SPlayOptions& options);
+int mix(CLibrary& library, const SMixOptions& options);
 int record(CLibrary& library, const SRecordOptions& options);
 int showTags(CLibrary& library, const std::vector<std::filesystem::path>& files, bool json);
 int setTags(CLibrary& library, const SSetTagOptions& options);

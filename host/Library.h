@@ -16,6 +16,7 @@ namespace host {
     X(getExtensionCount)                                                                                     \
     X(getExtension)                                                                                          \
     X(CreateAudioSourceFromURI)                                                                              \
+    X(CreateAudioSourceFromEditorXml)                                                                        \
     X(AudioSource_GetDuration)                                                                               \
     X(AudioSource_FetchStreamSamples)                                                                        \
     X(CreateAudioSoureFromAudioInDevice)                                                                     \
@@ -27,6 +28,7 @@ namespace host {
     X(AudioEncoder_Encode)                                                                                   \
     X(AudioEncoder_SetCallback)                                                                              \
     X(CreatePlayerFromURI)                                                                                   \
+    X(CreatePlayerFromAudioSource)                                                                           \
     X(Player_Play)                                                                                           \
     X(Player_Pause)                                                                                          \
     X(Player_Stop)                                                                                           \

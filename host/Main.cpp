@@ -1,4 +1,5 @@
-// tonewright: converts, plays and records sound files, tells about them, draws them and changes their tags.
+// tonewright: converts, plays, mixes and records sound files, tells about them, draws them and changes their
+// tags.
 #include "Cancel.h"
 #include "Commands.h"
 #include "Devices.h"
@@ -43,7 +44,9 @@ void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& 
         ->check(CLI::Range(1, 32));
     command
         .add_option("--bits", options.bits,
-                    widths.size() == 4 ? "Bits per sample: 8, 16, 24 or 32" : "Bits per sample: 8, 16 or 24")
+                    widths.size() == 1   ? "Bits per sample: 16"
+                    : widths.size() == 4 ? "Bits per sample: 8, 16, 24 or 32"
+                                         : "Bits per sample: 8, 16 or 24")
         ->option_text("N")
         ->check(CLI::IsMember(widths));
     command
@@ -167,11 +170,30 @@ void addDevices(CLI::App& app, bool& json, Run& run) {
 void addPlay(CLI::App& app, SPlayOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
         "play",
-        "Play sound files on the default device. Space pauses and goes on, q or Ctrl-C stops; a file\n"
-        "that fails is told and the next one goes on.");
+        "Play sound files and arrangements (.xml) on the default device. Space pauses and goes on, q or\n"
+        "Ctrl-C stops; a file that fails is told and the next one goes on.");
     command->add_option("FILE", options.files, "Files to play")->required()->option_text("...");
     addOutput(*command, options.show);
     command->callback([&] { run = [&](CLibrary& library) { return play(library, options); }; });
+}
+
+void addMix(CLI::App& app, SMixOptions& options, Run& run) {
+    CLI::App* command = app.add_subcommand(
+        "mix", "Mix an editor's arrangement into one sound file, with 44100 Hz and 2 channels unless told\n"
+               "otherwise. Media that it names by relative URIs are looked for beside it.");
+    command->add_option("ARRANGEMENT", options.input, "XML file that tells the tracks")
+        ->required()
+        ->option_text(" ");
+    command->add_option("-o,--output", options.output, "File to write; its extension selects the format")
+        ->required()
+        ->option_text("FILE");
+    addFormat(*command, options, {16});
+    command->add_flag("-f,--force", options.force, "Replace existing files");
+    addOutput(*command, options.show);
+    command->callback([&] {
+        checkBitRates(options);
+        run = [&](CLibrary& library) { return mix(library, options); };
+    });
 }
 
 void addRecord(CLI::App& app, SRecordOptions& options, Run& run) {
@@ -277,9 +299,9 @@ int runCommand(const Run& run, CLibrary& library) {
 } // namespace
 
 int main(int argc, char** argv) {
-    CLI::App app(
-        "Converts, plays and records sound files, tells about them, draws them and changes their tags.",
-        "tonewright");
+    CLI::App app("Converts, plays, mixes and records sound files, tells about them, draws them and changes "
+                 "their tags.",
+                 "tonewright");
     app.set_version_flag("--version", "tonewright " TONEWRIGHT_VERSION);
     app.require_subcommand(1);
     app.get_formatter()->column_width(28);
@@ -295,6 +317,7 @@ int main(int argc, char** argv) {
     SConvertOptions convertOptions;
     SWaveformOptions waveformOptions;
     SPlayOptions playOptions;
+    SMixOptions mixOptions;
     SRecordOptions recordOptions;
     SSetTagOptions tagOptions;
     std::vector<std::string> clearedFields;
@@ -307,6 +330,7 @@ int main(int argc, char** argv) {
     addWaveform(app, waveformOptions, run);
     addDevices(app, json, run);
     addPlay(app, playOptions, run);
+    addMix(app, mixOptions, run);
     addRecord(app, recordOptions, run);
     addTag(app, tagOptions, clearedFields, run);
     // Which word was wrong, the parser would not say.

@@ -1,3 +1,4 @@
+#include "Arrangement.h"
 #include "AudioFile.h"
 #include "Cancel.h"
 #include "Commands.h"
@@ -93,6 +94,7 @@ public:
     bool isStopped() const { return m_stopped || isCancelled(); }
 
 private:
+    CHandle makePlayer(const fs::path& file);
     void watch(const std::shared_ptr<CSession>& session);
     void show();
 
@@ -131,15 +133,25 @@ void CJukebox::watch(const std::shared_ptr<CSession>& session) {
         stopper.join();
 }
 
+CHandle CJukebox::makePlayer(const fs::path& file) {
+    checkInput(file);
+    if (!isArrangement(file)) {
+        CHostLog::takeReason();
+        CHandle player(m_library.CreatePlayerFromURI(toURI(file).c_str()));
+        if (!player) throw std::runtime_error(CHostLog::takeReadReason(file));
+        return player;
+    }
+    const CHandle source = openArrangement(m_library, file, SSampleFormat());
+    CHandle player(m_library.CreatePlayerFromAudioSource(source.get()));
+    if (!player) throw std::runtime_error(asReason(CHostLog::takeReason(), file));
+    return player;
+}
+
 bool CJukebox::play(const fs::path& file) {
     const auto started = std::chrono::steady_clock::now();
     m_line.start(file, nlohmann::json::object());
     try {
-        checkInput(file);
-        CHostLog::takeReason();
-        CHandle player(m_library.CreatePlayerFromURI(toURI(file).c_str()));
-        if (!player) throw std::runtime_error(CHostLog::takeReadReason(file));
-        auto session = std::make_shared<CSession>(m_library, std::move(player));
+        auto session = std::make_shared<CSession>(m_library, makePlayer(file));
         std::thread thread([session] { session->play(); });
         watch(session);
         thread.join();
