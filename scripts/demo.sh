@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# The first thing to run: sets up, builds, and converts real recordings into four formats.
+# The first thing to run: sets up, builds, converts real recordings into four formats, and mixes three of them.
 # Leaves the results in the folder given, or in build/demo.
 set -euo pipefail
 
@@ -26,11 +26,19 @@ for line in sys.stdin:
         name = os.path.basename(event["output"])
         print("%-28s %-12s %9.2f %10d %14.0f" % (name, event["codec"], event["duration"], event["bytes"], speed))
 '
+
+# An alarm that fades in and out, a voice above it and, behind a gap, a telephone at half its level.
+arrangement=docs/examples/arrangement.xml
+printf '\n%s mixed:\n' "$arrangement"
+"$tonewright" mix "$arrangement" -o "$target/mixed.flac" --force
+"$tonewright" waveform "$target/mixed.flac" -o "$target/mixed.png" --force
 cat <<TEXT
+Its waveform is in $target/mixed.png.
 
 The files lie in $target. Go on with:
   $tonewright --help
   $tonewright convert YOUR.flac -o YOUR.mp3 --quality 0.8
   $tonewright info $target/*
+  $tonewright mix $arrangement -o mixed.mp3
   $tonewright waveform $target/Front_Center.flac -o wave.png
 TEXT
