@@ -146,12 +146,53 @@ def bench_tags(host, work, wav, repeat):
     shutil.rmtree(folder)
 
 
+def make_tracks(work, wav, minutes, count):
+    """Stereo files, each the material from another place on."""
+    files = []
+    for i in range(count):
+        files.append(work / f"track{i}.wav")
+        shift = minutes * 60 * i / count
+        subprocess.run(["sox", f"|sox {wav} -p trim {shift}", f"|sox {wav} -p trim 0 {shift}", files[-1]], check=True)
+    return files
+
+
+def write_arrangement(path, files, seconds):
+    track = "<Track><SourceEndTime>{}</SourceEndTime><Uri>{}</Uri></Track>"
+    tracks = "".join(track.format(seconds, file.name) for file in files)
+    path.write_text(f'<?xml version="1.0" encoding="utf-8"?><Project><Tracks>{tracks}</Tracks></Project>')
+
+
+def bench_mixing(host, work, wav, minutes, repeat):
+    """Files of a fifth of the length, as there are up to 32 of them."""
+    part = work / "part.wav"
+    seconds = minutes * 12
+    subprocess.run(["sox", wav, part, "trim", "0", str(seconds)], check=True)
+    files = make_tracks(work, part, minutes / 5, 32)
+    arrangement, out = work / "mix.xml", work / "o.wav"
+    ours = [host, "mix", "--force", "--quiet", arrangement, "-o", out]
+    inputs = [word for file in files[:8] for word in ("-i", file)]
+    print(f"\n{f'mixing {minutes / 5:g} minutes':40} {'peer':8} {'CPU':>6} {'wall':>6} {'ms':>9} {'peer ms':>9}")
+    write_arrangement(arrangement, files[:8], seconds)
+    for peer, command in (
+        ("sox", ["sox", "-m", *files[:8], out]),
+        ("ffmpeg", ["ffmpeg", "-v", "error", "-y", *inputs, "-filter_complex", "amix=inputs=8", out]),
+    ):
+        compare("8 stereo WAV to WAV", repeat, ours, peer, command)
+    print("Wall and processor time of each track:")
+    for count in (2, 8, 32):
+        write_arrangement(arrangement, files[:count], seconds)
+        cpu, wall, peak = best([run(ours) for _ in range(repeat)])
+        print(f"  {count:2} tracks {wall / count * 1000:6.1f} ms {cpu / count * 1000:6.1f} ms, {peak / 1024:.1f} MiB in all", flush=True)
+    for leftover in (*files, part, arrangement, out):
+        leftover.unlink()
+
+
 def main():
     parser = argparse.ArgumentParser(description=__doc__)
     parser.add_argument("build", type=pathlib.Path)
     parser.add_argument("--minutes", type=int, default=10, help="length of the material")
     parser.add_argument("--repeat", type=int, default=3, help="runs of each job, interleaved with its peer")
-    parser.add_argument("--only", default="", help="jobs whose name holds this text; tags for those of tags")
+    parser.add_argument("--only", default="", help="jobs whose name holds this text; tags and mixing for those")
     arguments = parser.parse_args()
 
     host = arguments.build / "bin/tonewright"
@@ -185,6 +226,8 @@ def main():
 
     if arguments.only.lower() in "tags":
         bench_tags(host, work, wav, arguments.repeat)
+    if arguments.only.lower() in "mixing":
+        bench_mixing(host, work, wav, arguments.minutes, arguments.repeat)
     if not arguments.only:
         print("\nPeak memory by length, WAV to FLAC:")
         for title, seconds in (("1 minute", 60), ("6 hours", 6 * 3600)):
