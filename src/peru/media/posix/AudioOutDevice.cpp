@@ -1,6 +1,7 @@
 #include "peru/media/posix/AudioOutDevice.h"
 
 #include "peru/IStringLocalizer.h"
+#include "peru/IThreadManager.h"
 #include "peru/media/Errors.h"
 #include "peru/media/Samples.h"
 
@@ -13,6 +14,10 @@ namespace peru::media::posix {
 namespace {
 
 constexpr uint32_t kLongestWait = 500; // milliseconds
+// A system that starts takes as much at once as its buffers hold, more than one write of a host that writes
+// little by little: what is wanted in the queue before the sound begins, and how long it is waited for.
+constexpr double kCushion = 400;   // milliseconds
+constexpr int kCushionRounds = 50; // of a millisecond
 
 // Blocks kept for reuse: as many as a well-filled queue has, so that the callback seldom frees one.
 constexpr int kCachedBlocks = 1024;
@@ -180,7 +185,7 @@ void CAudioOutDevice::fill(uint8_t* output, int64_t frames, const PaStreamCallba
     if (!m_signal->wait(0)) {
         // By the end of a wait the system has run dry, and may drop what it gets before it has noticed. The
         // sound begins with the next buffer.
-        m_signal->wait(kLongestWait);
+        if (m_signal->wait(kLongestWait)) gatherCushion();
         return;
     }
     if (m_state != kDeviceRunning) return;
@@ -199,6 +204,14 @@ void CAudioOutDevice::fill(uint8_t* output, int64_t frames, const PaStreamCallba
     const int32_t bytesPerSample = m_format->getBytesPerSample();
     if (bytesPerSample == 1) flipSigns(output, size);
     if (const double gain = m_gain; gain != 1.0) scaleSamples(output, size, bytesPerSample, gain);
+}
+
+void CAudioOutDevice::gatherCushion() const {
+    const double wanted = kCushion * m_framesPerMillisecond * m_bytesPerFrame;
+    for (int round = 0; round < kCushionRounds && m_state == kDeviceRunning && !m_source; ++round) {
+        if (static_cast<double>(getQueuedSize()) >= wanted) return;
+        getThreadManager()->sleep(1);
+    }
 }
 
 int64_t CAudioOutDevice::readSource(uint8_t* output, int64_t size) {

@@ -28,6 +28,7 @@ private:
     static int onOutput(const void* input, void* output, unsigned long frames,
                         const PaStreamCallbackTimeInfo* time, PaStreamCallbackFlags flags, void* self);
     void fill(uint8_t* output, int64_t frames, const PaStreamCallbackTimeInfo& time);
+    void gatherCushion() const; // waits a little for it
     int64_t readSource(uint8_t* output, int64_t size);
     double getHearingTime(const PaStreamCallbackTimeInfo& time) const;
     void requireAlive() const;
