@@ -151,8 +151,8 @@ def make_tracks(work, wav, minutes, count):
     files = []
     for i in range(count):
         files.append(work / f"track{i}.wav")
-        shift = minutes * 60 * i / count
-        subprocess.run(["sox", f"|sox {wav} -p trim {shift}", f"|sox {wav} -p trim 0 {shift}", files[-1]], check=True)
+        shift = minutes * 60 * (i + 1) / (count + 1)
+        subprocess.run(["sox", f"|sox {wav} -p trim {shift}", f"|sox {wav} -p trim 0 {shift}", "-b", "16", files[-1]], check=True)
     return files
 
 
