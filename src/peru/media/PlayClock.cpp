@@ -1,6 +1,7 @@
 #include "peru/media/PlayClock.h"
 
 #include <algorithm>
+#include <cmath>
 
 namespace peru::media {
 
@@ -14,7 +15,18 @@ void CPlayClock::retireFirst() {
     --m_count;
 }
 
+bool CPlayClock::extendLast(double time, int64_t frames) {
+    if (m_count == 0) return false;
+    SBlock& last = m_ring[(m_first + m_count - 1) % kMostBlocks];
+    const double end = last.time + static_cast<double>(last.frames) / m_framesPerSecond;
+    const double length = static_cast<double>(last.frames + frames) / m_framesPerSecond;
+    if (length > kLongestBlock || std::abs(time - end) > kTremble) return false;
+    last.frames += frames;
+    return true;
+}
+
 void CPlayClock::add(double time, int64_t frames) {
+    if (extendLast(time, frames)) return;
     if (m_count == kMostBlocks) retireFirst();
     m_ring[(m_first + m_count++) % kMostBlocks] = {time, frames};
 }

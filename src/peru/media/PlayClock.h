@@ -34,9 +34,14 @@ private:
     };
     double getPart(const SBlock& block) const;
     void retireFirst();
+    bool extendLast(double time, int64_t frames);
 
-    // More than any system takes ahead; past that the oldest block counts as heard.
-    static constexpr size_t kMostBlocks = 64;
+    // The system may take seconds ahead in buffers of a millisecond: what follows without a pause is kept
+    // together. In seconds; the second one is how far a time may be off for that.
+    static constexpr double kLongestBlock = 0.05;
+    static constexpr double kTremble = 0.01;
+    // Six seconds, more than any system takes ahead; past that the oldest block counts as heard.
+    static constexpr size_t kMostBlocks = 128;
 
     double m_framesPerSecond;
     double m_now = -1e300;

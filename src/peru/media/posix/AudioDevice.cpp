@@ -13,6 +13,8 @@ namespace peru::media::posix {
 
 namespace {
 
+constexpr int kStartAttempts = 3;
+
 P<IString> findHostApi(PaHostApiIndex index) {
     const PaHostApiInfo* info = Pa_GetHostApiInfo(index);
     if (!info)
@@ -153,7 +155,10 @@ void CAudioDevice::openStream(const P<CAudioFormat>& audioFormat, PaStreamCallba
 void CAudioDevice::startStream() {
     // The first callback comes before the call returns.
     m_state = kDeviceRunning;
-    if (const PaError result = Pa_StartStream(m_stream); result < 0) {
+    PaError result = Pa_StartStream(m_stream);
+    // The engine gives its own thread a second to begin, which a machine may be too busy for.
+    for (int i = 1; result == paTimedOut && i < kStartAttempts; ++i) result = Pa_StartStream(m_stream);
+    if (result < 0) {
         m_state = kDeviceIdle;
         check(result);
     }

@@ -25,6 +25,9 @@ constexpr int kCachedBlocks = 1024;
 // A time further ahead of the callback than this is a driver's mistake. In seconds.
 constexpr double kMostAhead = 5.0;
 
+// Sound servers hold back some more than they tell. In seconds.
+constexpr double kHeldBack = 0.05;
+
 } // namespace
 
 CAudioOutDevice::CAudioOutDevice(const P<IPosixSystem>& system, int32_t index)
@@ -230,7 +233,7 @@ int64_t CAudioOutDevice::readSource(uint8_t* output, int64_t size) {
 
 double CAudioOutDevice::getHearingTime(const PaStreamCallbackTimeInfo& time) const {
     const double ahead = time.outputBufferDacTime - time.currentTime;
-    return time.currentTime + (ahead > 0.0 && ahead < kMostAhead ? ahead : m_latency);
+    return time.currentTime + kHeldBack + (ahead > 0.0 && ahead < kMostAhead ? ahead : m_latency);
 }
 
 } // namespace peru::media::posix
