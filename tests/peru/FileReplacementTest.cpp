@@ -10,15 +10,12 @@
 #include <unistd.h>
 
 using namespace peru;
+using tests::countEntries;
 using tests::CTempFolder;
 using tests::toURI;
 namespace fs = std::filesystem;
 
 namespace {
-
-size_t countEntries(const fs::path& folder) {
-    return static_cast<size_t>(std::distance(fs::directory_iterator(folder), fs::directory_iterator()));
-}
 
 std::string getAttribute(const fs::path& file, const char* name) {
     char value[256];
@@ -110,6 +107,7 @@ TEST(FileReplacement, TakesOverWhatSurroundsTheBytes) {
     const CTempFolder folder;
     const fs::path file = folder.write("file", "old");
     fs::create_symlink("file", folder / "link");
+    fs::create_hard_link(file, folder / "second name");
     ASSERT_EQ(::setxattr(file.c_str(), "user.note", "kept", 4, 0), 0);
     setAccessList(file, "system.posix_acl_access", 1234);
     // The folder would give its own list to new files.
@@ -126,6 +124,7 @@ TEST(FileReplacement, TakesOverWhatSurroundsTheBytes) {
     getSystem()->replaceFile(toURI(folder / "link"), "new", 3);
     getSystem()->replaceFile(toURI(plain), "new", 3);
     EXPECT_EQ(tests::readFile(file), "new");
+    EXPECT_EQ(tests::readFile(folder / "second name"), "old") << "never written in place";
     EXPECT_TRUE(fs::is_symlink(folder / "link"));
     EXPECT_EQ(getAttribute(file, "user.note"), "kept");
     EXPECT_EQ(getAttribute(file, "system.posix_acl_access"), listBefore);

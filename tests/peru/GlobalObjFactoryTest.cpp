@@ -105,17 +105,6 @@ TEST_F(GlobalObjFactory, EntersNothingWhenCreationThrows) {
     EXPECT_EQ(g_deaths, "fba");
 }
 
-TEST_F(GlobalObjFactory, LetsADyingSingletonAskForOthers) {
-    P<CSingle> early = getSingle<'a'>();
-    getSingle<'x'>()->m_atEnd = [&] {
-        EXPECT_EQ(getSingle<'a'>(), early);
-        getSingle<'n'>(); // made in the middle of it all
-        early.reset();
-    };
-    CGlobalObjFactory::shutdown();
-    EXPECT_EQ(g_deaths, "xna");
-}
-
 TEST_F(GlobalObjFactory, GivesADyingSingletonItself) {
     CSingle* self = getSingle<'s'>().get();
     self->m_atEnd = [=] { EXPECT_EQ(getSingle<'s'>().get(), self); };

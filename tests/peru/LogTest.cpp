@@ -89,7 +89,6 @@ TEST_F(TextFileLog, Line_HasItsExactForm) {
         const char* expected;
     } cases[] = {
         {{kLogTrace, nullptr, "a"_s, {}, kTime}, "01:46:40 trace - a\n"},
-        {{kLogDebug, ""_s, "a"_s, {}, kTime}, "01:46:40 debug - a\n"},
         {{kLogInfo, "x"_s, "a"_s, {}, kTime}, "01:46:40 [x] info - a\n"},
         {{kLogWarning, "[x]y]"_s, "a"_s, {}, kTime}, "01:46:40 [[x_y_] Warning - a\n"},
         {{kLogException, nullptr, "a"_s, {}, kTime}, "01:46:40 EXCEPTION - a\n"},
@@ -97,7 +96,6 @@ TEST_F(TextFileLog, Line_HasItsExactForm) {
         {{6, nullptr, "a"_s, {}, kTime}, "01:46:40 UnknownLogLevel - a\n"},
         {{kLogInfo, nullptr, "a\nb\r\nc\rd"_s, {}, kTime},
          "01:46:40 info - a\n                b\n                c\n                d\n"},
-        {{kLogInfo, nullptr, "a\n"_s, {}, kTime}, "01:46:40 info - a\n"},
         {{kLogInfo, nullptr, "a\n\nb"_s, {}, kTime},
          "01:46:40 info - a\n                \n                b\n"},
         {{kLogInfo, nullptr, "a"_s, {"b"_s, "c\nd"_s}, kTime},
@@ -125,30 +123,6 @@ TEST_F(TextFileLog, LevelBelowTheMinimum_IsNotWritten) {
         EXPECT_EQ(!written({one.level, nullptr, "x"_s, {}, kTime}).empty(), one.shown)
             << one.minimum << " " << one.level;
     }
-}
-
-TEST_F(TextFileLog, Shortcuts_CarryTheirLevels) {
-    log->trace("s"_s, "1", {"2"_s});
-    log->debug(nullptr, u"3");
-    log->info(nullptr, "4"_s);
-    log->warning(nullptr, "5");
-    log->error(nullptr, "6");
-    log->logException(nullptr, CError("text", "title"));
-    log->startFeature("burn"_s);
-    log->addInfo("speed"_s, "8"_s);
-    log->endFeature("burn"_s);
-    // Lines without a time of their own lose as many of their blanks.
-    EXPECT_EQ(withoutTimes(stream->bytes), "T [s] trace - 1\n"
-                                           "T             2\n"
-                                           "T debug - 3\n"
-                                           "T info - 4\n"
-                                           "T Warning - 5\n"
-                                           "T ERROR - 6\n"
-                                           "T EXCEPTION - Type: title\n"
-                                           "T             Text: text\n"
-                                           "T info - Start Feature: burn\n"
-                                           "T info - Add Info: speed = 8\n"
-                                           "T info - End Feature: burn\n");
 }
 
 TEST_F(TextFileLog, Areas_IndentAndComeBackToZero) {
@@ -284,20 +258,6 @@ TEST_F(LogManager, AreaThatSinksHeardOf_IsLeftAlsoAfterTheLevelRose) {
     EXPECT_EQ(journal, (Journal{"enter a", "leave a"}));
 }
 
-TEST_F(LogManager, RemovingTheLastSink_RemovesTheSource) {
-    auto one = addLog("1", "s"_s), two = addLog("2", "s"_s);
-    EXPECT_EQ(manager->getSourceCount(), 1u);
-    EXPECT_FALSE(manager->removeLog(one, "t"_s));
-    EXPECT_FALSE(manager->removeLog(one, nullptr));
-    EXPECT_TRUE(manager->removeLog(one, "s"_s));
-    EXPECT_FALSE(manager->removeLog(one, "s"_s));
-    manager->info("s"_s, "x");
-    EXPECT_EQ(journal, (Journal{"2:2 s x@-1"}));
-    EXPECT_EQ(manager->getSourceCount(), 1u);
-    EXPECT_TRUE(manager->removeLog(two, "s"_s));
-    EXPECT_EQ(manager->getSourceCount(), 0u);
-}
-
 TEST_F(LogManager, AnotherManager_ServesAsSinkAndLeavesByIdentity) {
     auto host = make<CLogManager>();
     host->addLog(make<CMemoryLog>(journal), nullptr);
@@ -306,7 +266,9 @@ TEST_F(LogManager, AnotherManager_ServesAsSinkAndLeavesByIdentity) {
     manager->addLog(P<ILog>(added), ""_s);
     manager->logException("s"_s, CError("text", "title"));
     EXPECT_EQ(journal, (Journal{"4 s Type: title\nText: text@-1"}));
+    EXPECT_FALSE(manager->removeLog(P<ILog>(host), "s"_s));
     EXPECT_TRUE(manager->removeLog(P<ILog>(host), nullptr));
+    EXPECT_FALSE(manager->removeLog(P<ILog>(host), nullptr));
     manager->info(nullptr, "x");
     EXPECT_EQ(journal.size(), 1u);
     EXPECT_THROW(manager->addLog(P<ILog>(manager), nullptr), CInvalidArgError)
@@ -357,12 +319,6 @@ std::string trace(const char* file, int line, const char* comment) {
     return testing::internal::GetCapturedStderr();
 }
 
-TEST(DebugTrace, HasAShortAndALongForm) {
-    EXPECT_EQ(trace("a.cpp", 12, nullptr), "zvr_trace: a.cpp (12)\n");
-    EXPECT_EQ(trace("a.cpp", 12, ""), "zvr_trace: a.cpp (12)\n");
-    EXPECT_EQ(trace("a.cpp", 12, "p != 0"), "zvr_trace: a.cpp (12) c=p != 0\n");
-}
-
 TEST(DebugTrace, IsCutToItsBuffer) {
     std::string wide;
     for (int i = 0; i < 3000; ++i) wide += "\xe2\x82\xac";
@@ -370,12 +326,7 @@ TEST(DebugTrace, IsCutToItsBuffer) {
     std::string line = trace("f", 1, wide.c_str());
     EXPECT_EQ(line, head + wide.substr(0, 3 * (1023 - head.size()))) << "1023 whole characters";
     EXPECT_EQ(trace("f", 1, std::string(5000, '\x80').c_str()).substr(0, head.size()), head);
-}
-
-TEST(DebugTrace, OutputIsUtf8) {
-    testing::internal::CaptureStderr();
-    outputDebugString(u"\u00e4\n");
-    EXPECT_EQ(testing::internal::GetCapturedStderr(), "\xc3\xa4\n");
+    EXPECT_EQ(trace("a.cpp", 12, nullptr), "zvr_trace: a.cpp (12)\n");
 }
 
 } // namespace

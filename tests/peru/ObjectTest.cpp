@@ -1,4 +1,3 @@
-#include "peru/Array.h"
 #include "peru/Errors.h"
 #include "peru/FrailArray.h"
 #include "peru/IInterfaceQuery.h"
@@ -137,11 +136,6 @@ TEST(Object, CountsFromSeveralThreads) {
     EXPECT_EQ(destroyed, 1);
 }
 
-TEST(Object, IsDescribedByItsDynamicClass) {
-    P<IBase> object = make<CArray>();
-    EXPECT_EQ(CString::toStdString(object->getObjectDesc()), "peru::CArray object");
-}
-
 TEST(Frail, HoldsOnlyWithItsFlag) {
     int destroyed = 0;
     P<CProbe> probe = make<CProbe>(destroyed);
@@ -157,22 +151,6 @@ TEST(Frail, HoldsOnlyWithItsFlag) {
     EXPECT_EQ(destroyed, 1);
 }
 
-TEST(FrailArray, KeepsItsOrderOverRemovals) {
-    int destroyed = 0;
-    std::vector<P<CProbe>> probes;
-    P<TFrailArray<INamed>> list = make<TFrailArray<INamed>>();
-    for (int i = 0; i < 10; ++i) {
-        probes.push_back(make<CProbe>(destroyed));
-        list->add(probes.back().get());
-    }
-    EXPECT_TRUE(list->remove(probes[3].get()));
-    EXPECT_FALSE(list->remove(probes[3].get()));
-    std::vector<INamed*> left;
-    for (size_t i = 0; list->at(i); ++i) left.push_back(list->at(i));
-    ASSERT_EQ(left.size(), 9u);
-    for (size_t i = 0; i < left.size(); ++i) EXPECT_EQ(left[i], probes[i < 3 ? i : i + 1].get());
-}
-
 TEST(FrailArray, StandsAListenerThatLeavesWhileItDies) {
     int destroyed = 0;
     P<TFrailArray<INamed>> list = make<TFrailArray<INamed>>();
@@ -185,19 +163,6 @@ TEST(FrailArray, StandsAListenerThatLeavesWhileItDies) {
     EXPECT_EQ(destroyed, 1);
     ASSERT_EQ(list->getCount(), 1u);
     EXPECT_EQ(list->at(0), third.get());
-}
-
-TEST(SimpleArray, GrowsByItsStep) {
-    TSimpleArray<int> array(0, 4);
-    std::vector<size_t> capacities;
-    for (int i = 0; i < 9; ++i) {
-        array.add(i);
-        capacities.push_back(array.getCapacity());
-    }
-    EXPECT_EQ(capacities, (std::vector<size_t>{4, 4, 4, 4, 8, 8, 8, 8, 12}));
-    TSimpleArray<int> stepless(2, 0);
-    for (int i = 0; i < 3; ++i) stepless.add(i);
-    EXPECT_EQ(stepless.getCapacity(), 3u);
 }
 
 TEST(InterfaceCast, AsksDelegateThenObjectThenParts) {

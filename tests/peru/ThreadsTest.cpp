@@ -87,11 +87,6 @@ TEST(Signal, IsManualReset) {
     EXPECT_TRUE(signal->wait(0)) << "a wait must not reset it";
     EXPECT_TRUE(signal->wait(1000));
     signal->reset();
-    EXPECT_FALSE(signal->wait(0));
-}
-
-TEST(Signal, TimedWait_LastsAsLongAsTold) {
-    P<ISignal> signal = getSignalFactory()->createSignal();
     int64_t start = getTimeManager()->getMonotonicTime();
     EXPECT_FALSE(signal->wait(30));
     EXPECT_GE(getTimeManager()->getMonotonicTime() - start, 30 * 1000000);
@@ -111,22 +106,6 @@ TEST(Signal, SetAndResetAtOnce_ReleasesWhoWaited) {
         getThreadManager()->yield(true);
     }
     waiter->wait();
-}
-
-TEST(Thread, Body_GetsOwnerAndArgument) {
-    struct SBody {
-        static void run(IBase* owner, void* argument) { *static_cast<IBase**>(argument) = owner; }
-    };
-    std::atomic<int> living{0};
-    P<IBase> owner = make<CWitness>(living);
-    IBase* seen = nullptr;
-    SThreadBody body;
-    body.owner = PFrail<IBase>(owner.get(), false);
-    body.function = &SBody::run;
-    body.argument = &seen;
-    getThreadManager()->createThread(body)->wait();
-    EXPECT_EQ(seen, owner.get());
-    EXPECT_THROW(getThreadManager()->createThread(SThreadBody()), CInvalidArgError);
 }
 
 TEST(Thread, Wait_ServesSeveralWaitersAndTheLateOne) {
@@ -204,14 +183,6 @@ TEST(Thread, WaitingForItself_ReturnsAfterTheBodyAndThrowsWithin) {
     EXPECT_TRUE(gone->wait(20000));
 }
 
-TEST(Thread, CurrentThread_IsTheCreatedOne) {
-    P<IThread> inside;
-    P<IThread> thread = runThread([&] { inside = getThreadManager()->getCurrentThread(); });
-    thread->wait();
-    EXPECT_TRUE(inside == thread);
-    EXPECT_FALSE(getThreadManager()->getCurrentThread() == thread);
-}
-
 TEST(Thread, ForeignThread_HasAnObjectThatEndsWithIt) {
     P<IThread> foreign;
     std::thread([&] {
@@ -221,6 +192,7 @@ TEST(Thread, ForeignThread_HasAnObjectThatEndsWithIt) {
     foreign->wait();
     EXPECT_NO_THROW(foreign->setPriority(1)) << "its id may belong to another thread by now";
     EXPECT_THROW(foreign->setPriority(7), CError);
+    EXPECT_THROW(getThreadManager()->createThread(SThreadBody()), CInvalidArgError);
 }
 
 TEST(Thread, Priority_LowersThisThreadOnly) {
@@ -246,14 +218,17 @@ TEST(Thread, Priority_LowersThisThreadOnly) {
 TEST(Thread, PriorityRightAfterStart_ReachesTheThread) {
     P<ISignal> go = getSignalFactory()->createSignal();
     int policy = -1;
+    P<IThread> inside;
     P<IThread> thread = runThread([&] {
         go->wait();
         policy = sched_getscheduler(0);
+        inside = getThreadManager()->getCurrentThread();
     });
     thread->setPriority(1);
     go->set();
     thread->wait();
     EXPECT_EQ(policy, SCHED_BATCH);
+    EXPECT_TRUE(inside == thread);
 }
 
 TEST(Thread, EscapedException_IsLoggedAndEndsTheThreadOnly) {
@@ -355,18 +330,6 @@ TEST(ThreadLocalStorage, ValueThatSetsSlotsWhileDying_LeavesNothing) {
     EXPECT_EQ(living, 0);
     std::thread(use).join();
     EXPECT_EQ(living, 0);
-}
-
-TEST(SimpleThreadLocalStorage, HoldsOneWordForEachThread) {
-    auto storage = getSimpleThreadLocalStorageFactory()->createStorage();
-    int mine = 0, theirs = 0;
-    storage->set(&mine);
-    runThread([&] {
-        EXPECT_EQ(storage->get(), nullptr);
-        storage->set(&theirs);
-        EXPECT_EQ(storage->get(), &theirs);
-    })->wait();
-    EXPECT_EQ(storage->get(), &mine);
 }
 
 } // namespace

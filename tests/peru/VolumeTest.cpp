@@ -126,10 +126,7 @@ TEST(VolumeManager, TellsWhatLeftAndArrived) {
 }
 
 TEST(VolumeManager, WatchesOnlyWhileSomebodyListens) {
-    auto countThreads = [] {
-        std::filesystem::directory_iterator tasks("/proc/self/task");
-        return std::distance(tasks, std::filesystem::directory_iterator());
-    };
+    const auto countThreads = [] { return tests::countEntries("/proc/self/task"); };
     // The kernel lists a thread for a moment longer than its end can be waited for.
     auto comesDownTo = [&](auto count) {
         auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);

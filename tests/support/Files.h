@@ -24,10 +24,11 @@ inline std::string text(const peru::P<peru::IString>& string) {
 }
 
 // The description of the error that the operation throws; a failure of the test when it throws none.
-template <class Operation> std::string errorOf(Operation operation) {
+// Errors of other kinds than the wanted one pass through, and fail it too.
+template <class Error = peru::CException, class Operation> std::string errorOf(Operation operation) {
     try {
         operation();
-    } catch (const peru::CException& error) {
+    } catch (const Error& error) {
         return text(error.getDescription());
     }
     ADD_FAILURE() << "no error was thrown";

@@ -45,4 +45,9 @@ inline std::string readFile(const std::filesystem::path& file) {
     return bytes.str();
 }
 
+inline size_t countEntries(const std::filesystem::path& folder) {
+    return static_cast<size_t>(
+        std::distance(std::filesystem::directory_iterator(folder), std::filesystem::directory_iterator()));
+}
+
 } // namespace tests
