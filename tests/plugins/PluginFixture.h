@@ -1,12 +1,11 @@
 // Loaded plug-ins, signals, and runs through sources and formats.
 #pragma once
 
-#include "peru/Errors.h"
-#include "peru/IPathes.h"
 #include "plugins/FormatCases.h"
 #include "sonora2/audio/AudioChunk.h"
 #include "sonora2/audio/SonoraContextAudio.h"
 #include "sonora2/common/PluginHandler.h"
+#include "support/Files.h"
 #include "support/TempFolder.h"
 
 #include <algorithm>
@@ -44,17 +43,12 @@ inline std::string run(const std::string& command) {
 class CPluginTest : public ::testing::Test {
 protected:
     CPluginTest() : context(peru::make<sonora2::audio::CSonoraContextAudio>()) {
-        context->getBaseDirectories()->setPluginDirectory(
-            peru::getPathes()->fromPlatformPath(TONEWRIGHT_PLUGIN_DIR "/"));
+        context->getBaseDirectories()->setPluginDirectory(toURI(TONEWRIGHT_PLUGIN_DIR "/"));
         std::set<std::string> names;
         for (const SFormatCase& format : kFormatCases)
             if (names.insert(format.plugin).second) context->addPluginName(format.plugin);
         context->addPluginName("sonora2_decmpa"); // reads what another one writes
         handler = peru::make<sonora2::common::CPluginHandler>(context);
-    }
-
-    static P<peru::IURI> toURI(const std::filesystem::path& path) {
-        return peru::getPathes()->fromPlatformPath(peru::CString::fromUTF8(path.string()));
     }
 
     P<IAudioSource> openSource(const std::filesystem::path& path, const SShape& shape) {
