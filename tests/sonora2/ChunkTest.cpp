@@ -1,8 +1,6 @@
 #include "sonora2/audio/AudioChunk.h"
 
 #include "ScriptedMedia.h"
-#include "peru/DataStreams.h"
-#include "peru/MemoryIOStream.h"
 #include "sonora2/audio/AudioStreamInfos.h"
 #include "sonora2/common/ISonoraPlugin.h"
 #include "sonora2/common/ParameterRecord.h"
@@ -11,27 +9,14 @@
 
 namespace {
 
-using peru::CString;
 using peru::make;
 using peru::P;
 using sonora2::audio::CAudioChunk;
 using sonora2::audio::CAudioInfo;
 using sonora2::audio::CAudioStreamInfos;
+using tests::deserialise;
+using tests::serialise;
 using namespace peru::literals;
-
-std::string serialise(const P<peru::ISerializable>& object) {
-    const P<peru::CMemoryIOStream> memory = make<peru::CMemoryIOStream>();
-    object->writeTo(make<peru::CDataOutStream>(memory));
-    return std::string(reinterpret_cast<const char*>(memory->getBlock()->getData()),
-                       static_cast<size_t>(memory->getSize()));
-}
-
-void deserialise(const P<peru::ISerializable>& object, const std::string& bytes) {
-    const P<peru::CMemoryIOStream> memory = make<peru::CMemoryIOStream>();
-    memory->write(bytes.data(), static_cast<int64_t>(bytes.size()));
-    memory->seek(0);
-    object->readFrom(make<peru::CDataInStream>(memory));
-}
 
 TEST(AudioChunk, TravelsWithItsTimestampAndItsValidBytes) {
     for (const size_t size : {0u, 1u, 70000u}) {
@@ -54,19 +39,15 @@ TEST(AudioStreamInfos, TravelInTheirOrderAndReplaceWhatWasThere) {
     deserialise(copy, serialise(infos));
     ASSERT_EQ(copy->getStreamCount(), 2);
     EXPECT_EQ(copy->getStreamInfo(0)->getStreamIndex(), 4);
-    EXPECT_EQ(CString::toStdString(copy->getStreamInfo(0)->getStreamName()), "commentary");
-    EXPECT_EQ(CString::toStdString(copy->getStreamInfo(0)->getStreamLanguage()), "en");
-    EXPECT_EQ(copy->getStreamInfo(1)->getStreamIndex(), -1);
-    EXPECT_TRUE(copy->getStreamInfo(1)->getStreamName()->isEmpty());
-    EXPECT_TRUE(tests::errorOf([&] { copy->getStreamInfo(2); }).has_value());
-    EXPECT_TRUE(tests::errorOf([&] { copy->getStreamInfo(-1); }).has_value());
+    EXPECT_EQ(serialise(copy), serialise(infos));
+    for (int index : {-1, 2}) EXPECT_THROW(copy->getStreamInfo(index), peru::CException);
 }
 
 TEST(AudioStreamInfos, TakeNoMoreMemoryThanTheBytesThatCome) {
     const P<CAudioStreamInfos> infos = make<CAudioStreamInfos>();
     std::string form("\xff\xff\xff\x7f", 4); // two thousand million streams, one of them there
     form += std::string(12, '\0');
-    EXPECT_TRUE(tests::errorOf([&] { deserialise(infos, form); }).has_value());
+    EXPECT_THROW(deserialise(infos, form), peru::CException);
     EXPECT_LE(infos->getStreamCount(), 1);
     deserialise(infos, "\xff\xff\xff\xff");
     EXPECT_EQ(infos->getStreamCount(), 0);
@@ -76,30 +57,17 @@ using SSourceParams = sonora2::common::ISonoraPlugin::SSourceParams;
 using SFormatParams = sonora2::common::ISonoraPlugin::SFormatParams;
 
 TEST(ParameterRecord, TakesAsMuchAsTheSenderFilled) {
-    const struct {
-        int32_t statedSize;
-        SSourceParams expected;
-    } cases[] = {
-        {20, {20, 1, {}, 44100, 2, 3}},
-        {1000000, {20, 1, {}, 44100, 2, 3}},
-        {16, {20, 1, {}, 44100, 2, 0}},
-        {12, {20, 1, {}, 44100, 0, 0}},
-        {10, {20, 1, {}, 44100 & 0xffff, 0, 0}},
-        {4, {20, 0, {}, 0, 0, 0}},
-        {3, {20, 0, {}, 0, 0, 0}},
-        {0, {20, 0, {}, 0, 0, 0}},
-        {-5, {20, 0, {}, 0, 0, 0}},
-        {INT32_MIN, {20, 0, {}, 0, 0, 0}},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(c.statedSize);
-        SSourceParams sent{c.statedSize, 1, {}, 44100, 2, 3};
+    for (int32_t stated : {20, 1000000, 16, 12, 10, 4, 3, 0, -5, INT32_MIN}) {
+        SCOPED_TRACE(stated);
+        const SSourceParams sent{stated, 1, {}, 44100, 2, 3};
         // On the heap with nothing behind what is stated, so that a sanitizer sees a byte too many.
-        const size_t real = static_cast<size_t>(std::clamp<int32_t>(c.statedSize, 4, sizeof(sent)));
+        const size_t real = static_cast<size_t>(std::clamp<int32_t>(stated, 4, sizeof(sent)));
         const std::unique_ptr<uint8_t[]> bytes(new uint8_t[real]);
         std::memcpy(bytes.get(), &sent, real);
+        SSourceParams expected{20, 0, {}, 0, 0, 0};
+        std::memcpy(reinterpret_cast<uint8_t*>(&expected) + 4, bytes.get() + 4, real - 4);
         const SSourceParams got = sonora2::common::receiveRecord<SSourceParams>(bytes.get());
-        EXPECT_EQ(std::memcmp(&got, &c.expected, sizeof(got)), 0);
+        EXPECT_EQ(std::memcmp(&got, &expected, sizeof(got)), 0);
     }
 }
 

@@ -59,13 +59,6 @@ std::string flush(CSampleRateConverter& converter) {
     return tests::bytesOf(converter.convert(nullptr, 0));
 }
 
-// A call gives a bounded number of frames: flushes until the wanted length is there.
-std::string convertWhole(CSampleRateConverter& converter, const Samples& input, size_t wantedBytes) {
-    std::string output = convertAll(converter, input);
-    for (int round = 0; output.size() < wantedBytes && round < 200; ++round) output += flush(converter);
-    return output;
-}
-
 std::string convertInCuts(const SShape& shape, const Samples& input, unsigned seed, int largestCut) {
     std::mt19937 random(seed);
     const P<CSampleRateConverter> converter = makeConverter(shape);
@@ -90,7 +83,10 @@ TEST(SampleRateConverter, OutputDoesNotDependOnHowTheInputIsCut) {
         const Samples input = makeNoise(static_cast<size_t>(shape.srcRate) * 3 / 2 * shape.srcChannels);
         const std::string small = convertInCuts(shape, input, 1, 200);
         const std::string large = convertInCuts(shape, input, 2, 3000);
-        const std::string whole = convertWhole(*makeConverter(shape), input, small.size());
+        const P<CSampleRateConverter> converter = makeConverter(shape);
+        std::string whole = convertAll(*converter, input);
+        // A call gives a bounded number of frames: flushes until the wanted length is there.
+        for (int round = 0; whole.size() < small.size() && round < 200; ++round) whole += flush(*converter);
         EXPECT_EQ(small, large);
         EXPECT_EQ(small, whole.substr(0, small.size()));
     }
@@ -140,22 +136,12 @@ TEST(SampleRateConverter, AFlushGivesExactlyOneSecondThatEndsInSilence) {
     }
 }
 
-TEST(SampleRateConverter, LetsAFewSamplesWait) {
-    const P<CSampleRateConverter> converter = makeConverter({44100, 2, 2, 48000, 2, 2});
-    const Samples input = makeNoise(3 * 2);
-    const P<sonora2::audio::IAudioChunk> chunk = converter->convert(input.data(), 12);
-    ASSERT_TRUE(chunk);
-    EXPECT_EQ(chunk->getSize(), 0u);
-    EXPECT_EQ(converter->convert(input.data(), 3)->getSize(), 0u); // not even one frame
-    EXPECT_EQ(converter->getOutputPosition(), 0u);
-    EXPECT_EQ(samplesOf(converter->convert(nullptr, 0)).size() % 2, 0u);
-    EXPECT_GT(converter->getOutputPosition(), 47000u);
-}
-
 TEST(SampleRateConverter, TimestampsCountTheFramesHandedOut) {
     const P<CSampleRateConverter> converter = makeConverter({44100, 1, 2, 48000, 1, 2});
     const Samples input = makeNoise(10000);
     double frames = 0;
+    EXPECT_EQ(converter->convert(input.data(), 1)->getSize(), 0u) << "not even one frame";
+    EXPECT_EQ(converter->getOutputPosition(), 0u);
     for (int i = 0; i < 5; ++i) {
         if (i == 2) converter->setStartTime(100.0);
         const P<sonora2::audio::IAudioChunk> chunk = converter->convert(input.data(), 20000);
@@ -276,19 +262,12 @@ TEST(SampleRateConverter, SaysWhyItCannotConvert) {
          "CSampleRateConverter: no filter could be made for 0 -> 44100 frames per second"},
         {{2000000000, 6, 4, 1, 1, 1},
          "CSampleRateConverter: no filter could be made for 2000000000 -> 1 frames per second"},
-        {{44100, 2, 2, 44100, 2, 2}, nullptr},
     };
     for (const auto& c : cases) {
         const P<CSampleRateConverter> converter = makeConverter(c.shape);
         for (const void* data :
              {static_cast<const void*>("0123456789abcdef"), static_cast<const void*>(nullptr)})
-            try {
-                converter->convert(data, 16);
-                EXPECT_EQ(c.text, nullptr);
-            } catch (const peru::CError& error) {
-                EXPECT_EQ(peru::CString::toStdString(error.getDescription()), c.text ? c.text : "");
-                EXPECT_EQ(peru::CString::toStdString(error.getTitle()), "Error");
-            }
+            EXPECT_EQ(tests::errorOf<peru::CError>([&] { converter->convert(data, 16); }), c.text);
     }
 }
 

@@ -23,25 +23,6 @@ protected:
     P<CSampleReader> makeReader() { return make<CSampleReader>(context, source); }
 };
 
-TEST_F(SampleReader, CutsASourceIntoEvenBlocksWithItsOwnTimeLine) {
-    source->media = tests::patternBytes(4609 * 4);
-    source->open();
-    const P<CSampleReader> reader = makeReader();
-
-    const P<sonora2::audio::IAudioChunk> first = reader->getSamples(4608);
-    ASSERT_TRUE(first);
-    EXPECT_EQ(first->getSize(), 4608u * 4);
-    EXPECT_EQ(first->getTimestamp(), 0.0);
-    ASSERT_TRUE(reader->hasSamples());
-    const P<sonora2::audio::IAudioChunk> second = reader->getSamples(4608);
-    ASSERT_TRUE(second);
-    EXPECT_EQ(second->getSize(), 4u);
-    EXPECT_DOUBLE_EQ(second->getTimestamp(), 4608.0 / 44100);
-    EXPECT_FALSE(reader->hasSamples());
-    EXPECT_FALSE(reader->getSamples(4608));
-    EXPECT_EQ(reader->getPosition(), 4609);
-}
-
 TEST_F(SampleReader, DeliversTheSameBytesHoweverTheSourceCutsThem) {
     std::mt19937 random(1);
     for (int round = 0; round < 50; ++round) {
@@ -69,19 +50,13 @@ TEST_F(SampleReader, DeliversTheSameBytesHoweverTheSourceCutsThem) {
         }
         EXPECT_EQ(read, source->media);
         EXPECT_EQ(reader->getPosition(), position);
+        EXPECT_FALSE(reader->getSamples(4608));
     }
 }
 
-TEST_F(SampleReader, LeavesAClosedSourceClosed) {
-    source->media = tests::patternBytes(400);
-    const P<CSampleReader> reader = makeReader();
-    EXPECT_EQ(source->opens, 1);
-    EXPECT_EQ(source->closes, 1);
-    EXPECT_FALSE(source->isOpened());
-    EXPECT_FALSE(reader->hasSamples());
-}
-
 TEST_F(SampleReader, ClosesWhatItOpenedAlsoAfterAFailure) {
+    EXPECT_FALSE(makeReader()->hasSamples());
+    EXPECT_FALSE(source->isOpened()) << "it was closed before";
     source->beforeFormat = [] { throw sonora2::common::CSonoraError("no header"); };
     for (const bool wasOpened : {false, true}) {
         if (wasOpened) source->open();
@@ -99,7 +74,7 @@ TEST_F(SampleReader, TellsNoFramesFromNothingLeft) {
     ASSERT_TRUE(none);
     EXPECT_EQ(none->getSize(), 0u);
     EXPECT_DOUBLE_EQ(none->getTimestamp(), 10.0 / 44100);
-    EXPECT_TRUE(tests::errorOf([&] { reader->getSamples(-1); }).has_value());
+    EXPECT_THROW(reader->getSamples(-1), peru::CException);
     EXPECT_EQ(reader->getPosition(), 10);
 }
 
@@ -123,8 +98,7 @@ TEST_F(SampleReader, RefusesAFaultySource) {
     source->open();
     source->emptyBeforeEnd = true;
     const P<CSampleReader> reader = makeReader();
-    EXPECT_THROW(reader->getSamples(10), sonora2::common::CSonoraError);
-    EXPECT_EQ(tests::errorOf([&] { reader->getSamples(10); }),
+    EXPECT_EQ(tests::errorOf<sonora2::common::CSonoraError>([&] { reader->getSamples(10); }),
               "CSampleReader: AudioChunk=NULL but Source is not EOF!");
 
     source->channels = 0;

@@ -2,10 +2,8 @@
 #pragma once
 
 #include "peru/Errors.h"
-#include "sonora2/audio/AudioChunk.h"
-#include "sonora2/common/IAudioFormat.h"
-#include "sonora2/common/IAudioSource.h"
 #include "sonora2/common/IEncodeListener.h"
+#include "support/MediaBase.h"
 
 #include <cstring>
 #include <deque>
@@ -16,27 +14,14 @@
 
 namespace tests {
 
-using peru::P;
-
 inline P<sonora2::audio::CAudioChunk> makeChunk(double timestamp, const std::string& bytes) {
     P<peru::IMemoryBlock> block = peru::make<peru::CMemoryBlock>(static_cast<int64_t>(bytes.size()));
     std::memcpy(block->getData(), bytes.data(), bytes.size());
     return peru::make<sonora2::audio::CAudioChunk>(timestamp, block);
 }
 
-inline std::string bytesOf(const P<sonora2::audio::IAudioChunk>& chunk) {
-    return std::string(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
-}
-
-// Bytes that differ along the whole length, so that a lost or doubled one shows.
-inline std::string patternBytes(size_t count) {
-    std::string bytes(count, '\0');
-    for (size_t i = 0; i < count; ++i) bytes[i] = static_cast<char>((i * 2654435761u) >> 13);
-    return bytes;
-}
-
 // Delivers its media in the given cuts (bytes), over and over; a cut of 0 gives an empty chunk.
-class CScriptedSource : public peru::CObject, public sonora2::common::IAudioSource {
+class CScriptedSource : public CSourceBase {
 public:
     int rate = 44100;
     int channels = 2;
@@ -50,10 +35,8 @@ public:
     std::function<void()> beforeFormat; // may throw
     std::function<void()> beforeClose;
 
-    int opens = 0;
     int closes = 0;
 
-    bool isOpened() override { return m_opened; }
     void open() override {
         ++opens;
         m_opened = true;
@@ -68,19 +51,12 @@ public:
     double getDuration() override {
         return static_cast<double>(media.size()) / (channels * bytesPerSample) / rate;
     }
-    int getBufferStatus() override { return 100; }
     bool isEOF() override {
         if (eofAnswers.empty()) return m_position >= media.size();
         const bool answer = eofAnswers.front();
         eofAnswers.pop_front();
         return answer;
     }
-    void setStartTime(double) override {}
-    double getStartTime() override { return 0.0; }
-    P<peru::IURI> getURI() override { return nullptr; }
-    P<peru::IString> getPluginName() override { return peru::CString::empty(); }
-    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override { return nullptr; }
-    void setAudioStream(int) override {}
     P<sonora2::audio::IAudioChunk> getNextAudioChunk() override {
         if (beforeChunk) beforeChunk();
         if (emptyBeforeEnd || m_position >= media.size()) return nullptr;
@@ -97,12 +73,11 @@ public:
     int getBytesPerSample() override { return m_opened ? bytesPerSample : 0; }
 
 private:
-    bool m_opened = false;
     size_t m_position = 0;
     size_t m_cut = 0;
 };
 
-class CScriptedFormat : public peru::CObject, public sonora2::common::IAudioFormat {
+class CScriptedFormat : public CFormatBase {
 public:
     std::function<void()> beforeWrite; // may throw
     std::function<void()> beforeClose;
@@ -113,7 +88,6 @@ public:
     int opens = 0;
     int closes = 0;
 
-    bool isOpened() override { return m_opened; }
     void open() override {
         ++opens;
         m_opened = true;
@@ -123,8 +97,6 @@ public:
         if (beforeClose) beforeClose();
         m_opened = false;
     }
-    P<peru::IURI> getURI() override { return nullptr; }
-    P<peru::IString> getPluginName() override { return peru::CString::empty(); }
     int64_t getEstimatedSizeBytes(double) override { return 0; }
     int getSampleRate() override { return 44100; }
     int getChannelCount() override { return 2; }
@@ -137,9 +109,6 @@ public:
         sizes.push_back(chunk->getSize());
         timestamps.push_back(chunk->getTimestamp());
     }
-
-private:
-    bool m_opened = false;
 };
 
 // Keeps what it hears; answers false from a fraction on.
@@ -158,11 +127,12 @@ public:
     }
 };
 
-// The description of the peru exception that the call throws; nothing when it throws none.
-inline std::optional<std::string> errorOf(const std::function<void()>& call) {
+// The description of the exception that the call throws; nothing when it throws none.
+template <class Error = peru::CException>
+std::optional<std::string> errorOf(const std::function<void()>& call) {
     try {
         call();
-    } catch (const peru::CException& exception) {
+    } catch (const Error& exception) {
         return peru::CString::toStdString(exception.getDescription());
     }
     return std::nullopt;

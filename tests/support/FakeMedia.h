@@ -2,11 +2,9 @@
 #pragma once
 
 #include "peru/URI.h"
-#include "sonora2/audio/AudioChunk.h"
-#include "sonora2/common/IAudioFormat.h"
-#include "sonora2/common/IAudioSource.h"
 #include "sonora2/common/ISonoraPlugin.h"
 #include "sonora2/common/PluginExtensions.h"
+#include "support/MediaBase.h"
 
 #include <algorithm>
 #include <atomic>
@@ -14,8 +12,6 @@
 #include <initializer_list>
 
 namespace tests {
-
-using peru::P;
 
 struct SFakeSource {
     int rate = 1000;
@@ -30,7 +26,7 @@ struct SFakeSource {
 };
 
 // 16-bit sample of channel c in frame f: (f * 4 + c) wrapped to 15 bits. Other widths are silent.
-class CFakeSource : public peru::CObject, public sonora2::common::IAudioSource {
+class CFakeSource : public CSourceBase {
 public:
     explicit CFakeSource(SFakeSource script, P<peru::IURI> uri = nullptr)
         : m_script(std::move(script)), m_uri(std::move(uri)) {
@@ -39,9 +35,7 @@ public:
     ~CFakeSource() override { --s_alive; }
 
     static inline std::atomic<int> s_alive{0};
-    int opens = 0;
 
-    bool isOpened() override { return m_opened; }
     void open() override {
         ++opens;
         m_script.onOpen();
@@ -54,14 +48,8 @@ public:
     }
     void skipToTime(double time) override { m_position = static_cast<int64_t>(time * m_script.rate); }
     double getDuration() override { return static_cast<double>(m_script.frames) / m_script.rate; }
-    int getBufferStatus() override { return 100; }
     bool isEOF() override { return m_position >= m_script.frames; }
-    void setStartTime(double) override {}
-    double getStartTime() override { return 0.0; }
     P<peru::IURI> getURI() override { return m_uri; }
-    P<peru::IString> getPluginName() override { return peru::CString::fromUTF8("fake"); }
-    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override { return nullptr; }
-    void setAudioStream(int) override {}
     P<sonora2::audio::IAudioChunk> getNextAudioChunk() override {
         m_script.onRead();
         if (isEOF()) return nullptr;
@@ -84,12 +72,11 @@ public:
 private:
     SFakeSource m_script;
     P<peru::IURI> m_uri;
-    bool m_opened = false;
     int64_t m_position = 0;
 };
 
 // Counts what it is given.
-class CFakeFormat : public peru::CObject, public sonora2::common::IAudioFormat {
+class CFakeFormat : public CFormatBase {
 public:
     explicit CFakeFormat(
         const sonora2::common::ISonoraPlugin::SFormatParams& params = {},
@@ -101,11 +88,8 @@ public:
     int bitRates[3] = {-1, -1, -1};
     int64_t bytes = 0;
 
-    bool isOpened() override { return m_opened; }
     void open() override { m_opened = true; }
     void close() override { m_opened = false; }
-    P<peru::IURI> getURI() override { return nullptr; }
-    P<peru::IString> getPluginName() override { return peru::CString::fromUTF8("fake"); }
     // Carries the settings too, for a test that sees no more of the format than a host does.
     int64_t getEstimatedSizeBytes(double duration) override {
         return static_cast<int64_t>(duration * params.nSampleRate * params.nChannelCount *
@@ -128,7 +112,6 @@ public:
 
 private:
     std::function<void()> m_onWrite;
-    bool m_opened = false;
 };
 
 // Makes what its functions make, by default nothing.

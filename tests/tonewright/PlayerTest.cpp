@@ -4,7 +4,6 @@
 
 #include <gmock/gmock.h>
 
-#include <filesystem>
 #include <random>
 
 namespace {
@@ -28,13 +27,9 @@ template <class Condition> bool becomes(Condition condition) {
 
 // What a source of that script delivers, and the closing silence.
 std::string playedBytes(const SFakeSource& script) {
-    CFakeSource source(script);
-    source.open();
-    std::string bytes;
-    while (!source.isEOF()) {
-        const auto chunk = source.getNextAudioChunk();
-        bytes.append(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
-    }
+    const auto source = peru::make<CFakeSource>(script);
+    source->open();
+    std::string bytes = readAll(source);
     const auto silence = static_cast<size_t>(5 * script.rate * script.channels * script.bytesPerSample);
     return bytes.append(silence, script.bytesPerSample == 1 ? '\x80' : '\0');
 }
@@ -339,18 +334,14 @@ TEST_F(Player, Threads_MayCallEverythingAtOnce) {
         threads.emplace_back([&p, start, seed] {
             std::minstd_rand random(seed);
             while (secondsSince(start) < 3.0) {
-                switch (random() % 8) {
-                case 0:
-                case 1:
+                const unsigned turn = random() % 8;
+                if (turn < 2) {
                     p.play(); // may fail: another thread plays
-                    break;
-                case 2:
+                } else if (turn == 2) {
                     EXPECT_EQ(p.stop(), 0);
-                    break;
-                case 3:
+                } else if (turn == 3) {
                     p.setCallback(random() % 2 ? keepReport : nullptr);
-                    break;
-                default:
+                } else {
                     EXPECT_EQ(p.pause(), 0);
                     std::this_thread::sleep_for(std::chrono::microseconds(random() % 20000));
                 }
@@ -375,14 +366,10 @@ TEST_F(Player, Threads_MayCallEverythingAtOnce) {
 }
 
 TEST_F(Player, Players_LeaveNothingBehind) {
-    const auto count = [](const char* folder) {
-        return std::distance(std::filesystem::directory_iterator(folder), {});
-    };
-    const auto threads = count("/proc/self/task"), files = count("/proc/self/fd");
+    const auto threads = countEntries("/proc/self/task"), files = countEntries("/proc/self/fd");
     const int sources = CFakeSource::s_alive;
-    SFakeSource script;
     for (int i = 0; i < 100; ++i) {
-        SPlayer p(script);
+        SPlayer p(SFakeSource{});
         EXPECT_EQ(p.pause(), 0);
         if (i % 25 == 0) {
             EXPECT_EQ(p.play(), 0);
@@ -391,8 +378,8 @@ TEST_F(Player, Players_LeaveNothingBehind) {
         p.player.reset();
         EXPECT_FALSE(device->isOpened());
     }
-    EXPECT_EQ(count("/proc/self/task"), threads);
-    EXPECT_EQ(count("/proc/self/fd"), files);
+    EXPECT_EQ(countEntries("/proc/self/task"), threads);
+    EXPECT_EQ(countEntries("/proc/self/fd"), files);
     EXPECT_EQ(CFakeSource::s_alive, sources);
 }
 

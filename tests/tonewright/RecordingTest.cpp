@@ -15,14 +15,8 @@ namespace {
 using namespace tests;
 using sonora2::audio::IAudioChunk;
 
-std::string pattern(size_t size, unsigned seed = 1) {
-    std::string bytes(size, '\0');
-    for (size_t i = 0; i < size; ++i) bytes[i] = static_cast<char>(((i + seed) * 2654435761u) >> 13);
-    return bytes;
-}
-
-std::string bytesOf(const P<IAudioChunk>& chunk) {
-    return std::string(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
+std::string pattern(size_t size, size_t seed = 1) {
+    return patternBytes(size + seed).substr(seed);
 }
 
 std::atomic<int> g_calls{0};
@@ -66,7 +60,6 @@ TEST_F(Recording, Source_FindsAFormatOfTheDevice) {
     const auto cd = peru::make<CAudioFormat>(44100, 2, 16);
     const auto wide = peru::make<CAudioFormat>(48000, 2, 24);
     for (const SCase& c : std::initializer_list<SCase>{{44100, 2, 2, nullptr, true, true},
-                                                       {8000, 2, 1, nullptr, true, true},
                                                        {48000, 2, 3, nullptr, true, true},
                                                        {44100, 1, 2, nullptr, true, false},
                                                        {48000, 2, 2, cd, true, false},

@@ -30,12 +30,9 @@ TEST(SoundLoop, Player_IsHeardWholeByARecording) {
         const CHandle player(
             TONEWRIGHT_CreatePlayerFromAudioSource(wrap(peru::make<CFakeSource>(script)).get()));
         ASSERT_TRUE(player);
-        std::string played;
         auto source = peru::make<CFakeSource>(script);
-        for (source->open(); !source->isEOF();) {
-            const auto chunk = source->getNextAudioChunk();
-            played.append(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
-        }
+        source->open();
+        const std::string played = readAll(source);
         for (int round = 0; round < 2; ++round) {
             ear->open();
             const auto start = std::chrono::steady_clock::now();
@@ -44,9 +41,7 @@ TEST(SoundLoop, Player_IsHeardWholeByARecording) {
             EXPECT_GE(taken, std::chrono::milliseconds(900));
             EXPECT_LE(taken, std::chrono::seconds(5)) << "the closing silence is not waited for";
             ear->close();
-            std::string heard;
-            while (const auto chunk = ear->getNextAudioChunk())
-                heard.append(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
+            const std::string heard = readAll(ear);
             EXPECT_TRUE(withoutSilence(heard) == played) << heard.size() << " bytes were heard";
         }
     }

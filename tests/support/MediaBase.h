@@ -1,0 +1,77 @@
+// What the sources and formats of all tests have in common, and the bytes they work on.
+#pragma once
+
+#include "peru/DataStreams.h"
+#include "peru/MemoryIOStream.h"
+#include "sonora2/audio/AudioChunk.h"
+#include "sonora2/common/IAudioFormat.h"
+#include "sonora2/common/IAudioSource.h"
+
+#include <string>
+
+namespace tests {
+
+using peru::P;
+
+// A source is what it delivers; the rest of the interface matters to none of these tests.
+class CSourceBase : public peru::CObject, public sonora2::common::IAudioSource {
+public:
+    int opens = 0;
+
+    bool isOpened() override { return m_opened; }
+    int getBufferStatus() override { return 100; }
+    void setStartTime(double) override {}
+    double getStartTime() override { return 0.0; }
+    P<peru::IURI> getURI() override { return nullptr; }
+    P<peru::IString> getPluginName() override { return peru::CString::fromUTF8("fake"); }
+    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override { return nullptr; }
+    void setAudioStream(int) override {}
+
+protected:
+    bool m_opened = false;
+};
+
+class CFormatBase : public peru::CObject, public sonora2::common::IAudioFormat {
+public:
+    bool isOpened() override { return m_opened; }
+    P<peru::IURI> getURI() override { return nullptr; }
+    P<peru::IString> getPluginName() override { return peru::CString::fromUTF8("fake"); }
+
+protected:
+    bool m_opened = false;
+};
+
+inline std::string bytesOf(const P<sonora2::audio::IAudioChunk>& chunk) {
+    return std::string(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
+}
+
+// All that is left in a source.
+inline std::string readAll(const P<sonora2::common::IAudioSource>& source) {
+    std::string bytes;
+    while (const P<sonora2::audio::IAudioChunk> chunk = source->getNextAudioChunk()) bytes += bytesOf(chunk);
+    return bytes;
+}
+
+// Bytes that differ along the whole length, so that a lost or doubled one shows.
+inline std::string patternBytes(size_t count) {
+    std::string bytes(count, '\0');
+    for (size_t i = 0; i < count; ++i) bytes[i] = static_cast<char>((i * 2654435761u) >> 13);
+    return bytes;
+}
+
+// The bytes that an object travels as, and back.
+inline std::string serialise(const P<peru::ISerializable>& object) {
+    const P<peru::CMemoryIOStream> memory = peru::make<peru::CMemoryIOStream>();
+    object->writeTo(peru::make<peru::CDataOutStream>(memory));
+    return std::string(reinterpret_cast<const char*>(memory->getBlock()->getData()),
+                       static_cast<size_t>(memory->getSize()));
+}
+
+inline void deserialise(const P<peru::ISerializable>& object, const std::string& bytes) {
+    const P<peru::CMemoryIOStream> memory = peru::make<peru::CMemoryIOStream>();
+    memory->write(bytes.data(), static_cast<int64_t>(bytes.size()));
+    memory->seek(0);
+    object->readFrom(peru::make<peru::CDataInStream>(memory));
+}
+
+} // namespace tests
