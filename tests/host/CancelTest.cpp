@@ -16,10 +16,10 @@ protected:
         folder.write("long.wav", makeWavHeader(silence, bytes));
         std::filesystem::resize_file(folder / "long.wav", 44 + uint64_t{bytes});
     }
-    bool hasTemporary() {
-        for (const std::string& name : list())
-            if (name.find(".part") != std::string::npos) return true;
-        return false;
+    size_t countTemporary() {
+        size_t count = 0;
+        for (const std::string& name : list()) count += name.find(".part") != std::string::npos;
+        return count;
     }
     template <class Condition> bool waitFor(Condition condition) {
         const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
@@ -39,7 +39,7 @@ TEST_F(Cancel, LeavesEverythingAsItWas) {
         SCOPED_TRACE(signal);
         CProcess process({kProgram, "convert", "long.wav", "-f", "-o", "out.flac"}, folder.path(),
                          programEnvironment());
-        ASSERT_TRUE(waitFor([&] { return hasTemporary(); }));
+        ASSERT_TRUE(waitFor([&] { return countTemporary() == 1; }));
         process.signal(signal);
         const SProcessResult result = process.wait();
         EXPECT_EQ(result.exitCode, 130) << result.err;
@@ -53,8 +53,9 @@ TEST_F(Cancel, IsAnEventAndStartsNothingMore) {
     for (const char* name : {"a.wav", "b.wav"}) write(name, makeTone(8000, 1, 16, 0.1));
     CProcess process({kProgram, "convert", "a.wav", "long.wav", "b.wav", "--to", "flac", "--json", "-j", "1"},
                      folder.path(), programEnvironment());
-    ASSERT_TRUE(waitFor(
-        [&] { return process.readOut().find("\"progress\"") != std::string::npos && hasTemporary(); }));
+    ASSERT_TRUE(waitFor([&] {
+        return process.readOut().find("\"progress\"") != std::string::npos && countTemporary() == 1;
+    }));
     process.signal(SIGINT);
     const SProcessResult result = process.wait();
     EXPECT_EQ(result.exitCode, 130) << result.err;
@@ -72,12 +73,7 @@ TEST_F(Cancel, StopsEveryThread) {
         command.push_back(name);
     }
     CProcess process(command, folder.path(), programEnvironment());
-    const auto running = [&] {
-        size_t count = 0;
-        for (const std::string& name : list()) count += name.find(".part") != std::string::npos;
-        return count == 3;
-    };
-    ASSERT_TRUE(waitFor(running));
+    ASSERT_TRUE(waitFor([&] { return countTemporary() == 3; }));
     process.signal(SIGINT);
     const SProcessResult result = process.wait();
     EXPECT_EQ(result.exitCode, 130) << result.err;

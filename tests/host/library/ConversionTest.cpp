@@ -28,11 +28,6 @@ long residentKilobytes() {
     return resident * (::sysconf(_SC_PAGESIZE) / 1024);
 }
 
-size_t countEntries(const char* folder) {
-    const std::filesystem::directory_iterator entries(folder), end;
-    return static_cast<size_t>(std::distance(entries, end));
-}
-
 class Conversion : public testing::Test {
 protected:
     void SetUp() override { ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK); }
