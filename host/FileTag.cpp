@@ -10,16 +10,11 @@ namespace host {
 
 namespace fs = std::filesystem;
 
-namespace {
-
-// What a sound of more than 4 GB becomes: it is called WAV too, but has no place for a tag.
 bool isWideWav(const fs::path& file) {
     char start[4] = {};
     std::ifstream(file, std::ios::binary).read(start, sizeof start);
     return std::string_view(start, sizeof start) == "RF64";
 }
-
-} // namespace
 
 const std::vector<STagField>& getTagFields() {
     static const std::vector<STagField> kFields{

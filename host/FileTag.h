@@ -20,6 +20,9 @@ struct STagField {
 // In the order in which they are shown.
 const std::vector<STagField>& getTagFields();
 
+// What a sound of more than 4 GB becomes: it is called WAV too, but has no place for a tag.
+bool isWideWav(const std::filesystem::path& file);
+
 class CFileTag {
 public:
     // Throws std::runtime_error for a file whose tag cannot be read. False afterwards for a kind of file that

@@ -17,7 +17,9 @@ constexpr size_t kTitleColumns = 14;
 CFileTag openTag(CLibrary& library, const fs::path& file) {
     checkInput(file);
     CFileTag tag(library, file);
-    if (!tag) throw std::runtime_error("No tag is known for " + describeKind(file));
+    if (!tag)
+        throw std::runtime_error("No tag is known for " +
+                                 (isWideWav(file) ? std::string("RF64 files") : describeKind(file)));
     return tag;
 }
 
