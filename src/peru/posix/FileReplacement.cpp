@@ -104,6 +104,10 @@ private:
     }
 };
 
+STemporaryName::~STemporaryName() {
+    if (!path.empty()) ::unlink(path.c_str());
+}
+
 CFileReplacement::CFileReplacement(const P<IURI>& file) : m_uri(file) {
     m_target = followLinks(toPath(file));
     if (m_target.empty()) raise(errno ? errno : ENOENT, file);
@@ -115,9 +119,7 @@ CFileReplacement::CFileReplacement(const P<IURI>& file) : m_uri(file) {
     m_stream = make<CReplacementStream>(file, std::move(own));
 }
 
-CFileReplacement::~CFileReplacement() {
-    if (!m_name.empty()) ::unlink(m_name.c_str());
-}
+CFileReplacement::~CFileReplacement() = default;
 
 void CFileReplacement::openOld() {
     struct stat status;
@@ -142,7 +144,7 @@ void CFileReplacement::openNew() {
     if (!m_new.isOpen() && errno != EOPNOTSUPP && errno != EISDIR && errno != EINVAL && errno != ENOENT)
         raise(errno, m_uri);
     int error = 0;
-    m_name = createUnique(m_folder, ".new-", "", error, [&](const std::string& name) {
+    m_name.path = createUnique(m_folder, ".new-", "", error, [&](const std::string& name) {
         m_new = CFileHandle(::open(name.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, mode));
         return m_new.isOpen() ? 0 : errno;
     });
@@ -194,10 +196,10 @@ int CFileReplacement::finish() {
     if (m_old.isOpen())
         if (int error = takeOverAttributes(m_old.get(), m_new.get())) return error;
     if (::fsync(m_new.get()) != 0) return errno;
-    if (m_name.empty())
-        if (int error = giveName(m_name)) return error;
-    if (::rename(m_name.c_str(), m_target.c_str()) != 0) return errno;
-    m_name.clear();
+    if (m_name.path.empty())
+        if (int error = giveName(m_name.path)) return error;
+    if (::rename(m_name.path.c_str(), m_target.c_str()) != 0) return errno;
+    m_name.path.clear();
     return 0;
 }
 

@@ -12,8 +12,17 @@ namespace peru::posix {
 
 class CReplacementStream;
 
+// The name of a file that goes with this object, also when the constructor of its owner fails.
+struct STemporaryName {
+    STemporaryName() = default;
+    STemporaryName(const STemporaryName&) = delete;
+    ~STemporaryName();
+
+    std::string path; // empty while there is no such file
+};
+
 // The content grows in a file without a name in the folder of the old one, or, where the file system has no
-// such files, in a hidden one that the destructor removes. A process that dies while commit() renames may
+// such files, in a hidden one that goes with this object. A process that dies while commit() renames may
 // leave the whole new file under a hidden name; at every other time nothing stays.
 //
 // What the new file takes over: mode, access lists, extended attributes, the group and the owner as far as
@@ -43,7 +52,7 @@ private:
     std::string m_folder; // of the target, with a trailing "/"
     CFileHandle m_old;    // not open when there is no such file
     CFileHandle m_new;
-    std::string m_name; // of the new file; empty while it has none
+    STemporaryName m_name; // of the new file
     P<CReplacementStream> m_stream;
 };
 
