@@ -3,6 +3,7 @@
 #include "filetag/id3tag/CoverArt.h"
 #include "filetag/id3tag/OldTag.h"
 
+#include <id3v1genres.h>
 #include <id3v1tag.h>
 #include <id3v2framefactory.h>
 #include <id3v2header.h>
@@ -41,6 +42,14 @@ const char* getFrameId(EField field) {
         return "COMM";
     }
     return "";
+}
+
+// The name behind a number of the old genres.
+TagLib::String toGenre(const TagLib::String& text) {
+    bool isNumber = false;
+    const int number = text.toInt(&isNumber);
+    const TagLib::String name = isNumber ? TagLib::ID3v1::genre(number) : TagLib::String();
+    return name.isEmpty() ? text : name;
 }
 
 constexpr EField kFields[] = {EField::title,       EField::artist, EField::album, EField::albumArtist,
@@ -98,7 +107,6 @@ CommentsFrame* CID3Tag::findComment() const {
 
 TagLib::String CID3Tag::readFrame(EField field) const {
     if (!m_tag) return {};
-    if (field == EField::genre) return m_tag->genre(); // knows the numbers of the old genres
     if (field == EField::comment) {
         const CommentsFrame* comment = findComment();
         return comment ? comment->text() : TagLib::String();
@@ -106,7 +114,9 @@ TagLib::String CID3Tag::readFrame(EField field) const {
     const TagLib::ID3v2::FrameList frames = m_tag->frameList(getFrameId(field));
     if (frames.isEmpty()) return {};
     const auto* frame = dynamic_cast<const TextIdentificationFrame*>(frames.front());
-    return frame && !frame->fieldList().isEmpty() ? frame->fieldList().front() : TagLib::String();
+    if (!frame || frame->fieldList().isEmpty()) return {};
+    const TagLib::String text = frame->fieldList().front();
+    return field == EField::genre ? toGenre(text) : text;
 }
 
 TagLib::String CID3Tag::readField(EField field) const {

@@ -3,16 +3,31 @@
 namespace filetag::taglib {
 namespace {
 
-// Fields for which TagLib has no operation or only a number. The first name is written, both are read.
 struct SNames {
-    const char* first;
+    const char* first; // is read before the second
     const char* second;
 };
 
 SNames getNames(EField field) {
-    if (field == EField::albumArtist) return {"ALBUMARTIST", nullptr};
-    if (field == EField::trackNumber) return {"TRACKNUMBER", "TRACKNUM"};
-    return {"DATE", "YEAR"};
+    switch (field) {
+    case EField::title:
+        return {"TITLE", nullptr};
+    case EField::artist:
+        return {"ARTIST", nullptr};
+    case EField::album:
+        return {"ALBUM", nullptr};
+    case EField::albumArtist:
+        return {"ALBUMARTIST", nullptr};
+    case EField::trackNumber:
+        return {"TRACKNUMBER", "TRACKNUM"};
+    case EField::year:
+        return {"DATE", "YEAR"};
+    case EField::genre:
+        return {"GENRE", nullptr};
+    case EField::comment:
+        return {"DESCRIPTION", "COMMENT"};
+    }
+    return {};
 }
 
 TagLib::String getFirst(const TagLib::Ogg::XiphComment& comment, const char* name) {
@@ -25,20 +40,6 @@ TagLib::String getFirst(const TagLib::Ogg::XiphComment& comment, const char* nam
 
 TagLib::String CXiphTag::readField(EField field) const {
     if (!m_comment) return {};
-    switch (field) {
-    case EField::title:
-        return m_comment->title();
-    case EField::artist:
-        return m_comment->artist();
-    case EField::album:
-        return m_comment->album();
-    case EField::genre:
-        return m_comment->genre();
-    case EField::comment:
-        return m_comment->comment();
-    default:
-        break;
-    }
     const SNames names = getNames(field);
     const TagLib::String text = getFirst(*m_comment, names.first);
     return text.isEmpty() ? getFirst(*m_comment, names.second) : text;
@@ -46,23 +47,12 @@ TagLib::String CXiphTag::readField(EField field) const {
 
 void CXiphTag::writeField(EField field, const TagLib::String& text) {
     if (!m_comment) return;
-    switch (field) {
-    case EField::title:
-        return m_comment->setTitle(text);
-    case EField::artist:
-        return m_comment->setArtist(text);
-    case EField::album:
-        return m_comment->setAlbum(text);
-    case EField::genre:
-        return m_comment->setGenre(text);
-    case EField::comment:
-        return m_comment->setComment(text);
-    default:
-        break;
-    }
     const SNames names = getNames(field);
+    // A comment stays under the name that has it, since players know only one of the two.
+    const bool underSecond = field == EField::comment && getFirst(*m_comment, names.first).isEmpty();
+    m_comment->removeFields(names.first);
     if (names.second) m_comment->removeFields(names.second);
-    m_comment->addField(names.first, text); // in the place of all by that name; empty removes them
+    if (!text.isEmpty()) m_comment->addField(underSecond ? names.second : names.first, text);
 }
 
 } // namespace filetag::taglib

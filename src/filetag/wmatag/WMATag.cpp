@@ -21,9 +21,13 @@ struct SNames {
     const char* second;
 };
 
-// Empty for fields that TagLib keeps as texts itself.
+// Empty for the fields that are no attributes.
 SNames getNames(EField field) {
     switch (field) {
+    case EField::album:
+        return {"WM/AlbumTitle", nullptr};
+    case EField::genre:
+        return {"WM/Genre", nullptr};
     case EField::albumArtist:
         return {"WM/AlbumArtist", nullptr};
     case EField::trackNumber:
@@ -81,10 +85,6 @@ TagLib::String CWMATag::readField(EField field) const {
         return m_tag->title();
     case EField::artist:
         return m_tag->artist();
-    case EField::album:
-        return m_tag->album();
-    case EField::genre:
-        return m_tag->genre();
     case EField::comment:
         return m_tag->comment();
     default:
@@ -97,27 +97,24 @@ TagLib::String CWMATag::readField(EField field) const {
 
 void CWMATag::writeField(EField field, const TagLib::String& text) {
     if (!m_tag) return;
-    const auto setAttribute = [&](const char* name) {
-        m_tag->removeItem(name);
-        if (!text.isEmpty()) m_tag->setAttribute(name, TagLib::ASF::Attribute(text));
-    };
+    // Values after the first of title, artist and comment are attributes.
     switch (field) {
     case EField::title:
+        m_tag->removeItem("Title");
         return m_tag->setTitle(text);
     case EField::artist:
+        m_tag->removeItem("Author");
         return m_tag->setArtist(text);
-    case EField::album:
-        return setAttribute("WM/AlbumTitle");
-    case EField::genre:
-        return setAttribute("WM/Genre");
     case EField::comment:
+        m_tag->removeItem("Description");
         return m_tag->setComment(text);
     default:
         break;
     }
     const SNames names = getNames(field);
+    m_tag->removeItem(names.first);
     if (names.second) m_tag->removeItem(names.second);
-    setAttribute(names.first);
+    if (!text.isEmpty()) m_tag->setAttribute(names.first, TagLib::ASF::Attribute(text));
 }
 
 // TagLib would write what is too long with a length that leads into the middle of it.

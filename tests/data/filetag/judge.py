@@ -1,7 +1,7 @@
 """Reads and writes tags with mutagen, so that another reader and writer judges ours.
 
 judge.py fields FILE...        the texts of each file, a list of JSON objects
-judge.py set FILE JSON         enters such texts
+judge.py set FILE JSON         enters such texts, lists of them too
 judge.py extras FILE           enters what a file tag of ours does not know
 judge.py others FILE           all that is in the file besides the texts, as JSON
 """
@@ -51,12 +51,13 @@ def set_fields(name, texts):
         text = texts.get(field, "")
         if not text:
             continue
+        values = text if isinstance(text, list) else [text]
         if kind == "id3" and field == "comment":
-            file.tags.add(id3.COMM(encoding=1, lang="deu", desc="", text=[text]))
+            file.tags.add(id3.COMM(encoding=1, lang="deu", desc="", text=values))
         elif kind == "id3":
-            file.tags.add(getattr(id3, key)(encoding=1, text=[text]))
+            file.tags.add(getattr(id3, key)(encoding=1, text=values))
         else:
-            file.tags[key] = [text]
+            file.tags[key] = values
     file.save()
 
 
