@@ -149,11 +149,28 @@ TEST_F(Play, GoesOnWithTheNextFile) {
     const SSound noise = makeLoudNoise(0.5);
     write("good.wav", noise);
     folder.write("bad.wav", "RIFF");
+    folder.write("notes.txt", "no sound");
     const std::unique_ptr<CProcess> ears = server.listen();
-    const std::string err = fail({"play", "missing.wav", "bad.wav", "good.wav"});
+    const std::string err = fail({"play", "missing.wav", "bad.wav", "notes.txt", "good.wav"});
     EXPECT_NE(err.find("missing.wav: No such file"), std::string::npos) << err;
-    EXPECT_NE(err.find("tonewright: bad.wav: "), std::string::npos) << err;
+    EXPECT_NE(err.find("tonewright: bad.wav: Could not read: "), std::string::npos) << err;
+    EXPECT_NE(err.find("tonewright: notes.txt: No plug-in reads .txt files"), std::string::npos) << err;
     EXPECT_TRUE(trim(ears->readOut()) == noise.samples);
+}
+
+TEST_F(Play, EndsWithTheSoundServerInAPauseToo) {
+    // All of it lies in the device's queue: nothing that is written could fail.
+    write("a.wav", makeTone(44100, 2, 16, 5));
+    const auto terminal = start({"play", "a.wav"});
+    CProcess& program = terminal->getProcess();
+    waitForPosition(program, 0.2);
+    terminal->type(' ');
+    waitFor(program, [](const auto& event) { return event.value("state", "") == "paused"; });
+    const auto killed = Clock::now();
+    server.kill();
+    EXPECT_EQ(program.wait().exitCode, 1);
+    EXPECT_LT(since(killed), kQuick);
+    EXPECT_TRUE(terminal->isInUsualMode());
 }
 
 TEST_F(Play, EndsWithTheSoundServer) {

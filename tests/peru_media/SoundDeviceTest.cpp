@@ -146,6 +146,7 @@ TEST_F(SoundDevice, MayBeGoneBeforeItIsOpened) {
 TEST_F(SoundDevice, TellsThatItHasGone) {
     CSoundServer server;
     const P<IAudioOutDevice> out = getSystem()->getDefaultOutDevice();
+    const P<IAudioOutDevice> paused = getSystem()->getDefaultOutDevice();
     const P<IAudioInDevice> in = getSystem()->getDefaultInDevice();
     const P<CEars> ears = peru::make<CEars>();
     ASSERT_TRUE(out && in);
@@ -156,10 +157,23 @@ TEST_F(SoundDevice, TellsThatItHasGone) {
     const std::string noise = makeNoise(10);
     out->write(noise.data(), static_cast<int64_t>(noise.size()));
     out->start();
+    paused->open(getFormat());
+    paused->start();
+    paused->pause();
     ASSERT_TRUE(waitFor([&] { return out->getPosition() > 0.1 && ears->blocks > 0; }));
     server.kill();
     EXPECT_TRUE(waitFor([&] { return out->getStatus() == kDeviceIdle && in->getStatus() == kDeviceIdle; }));
     EXPECT_THROW(out->getPosition(), CMediaException);
+    const auto isMissed = [&] {
+        try {
+            paused->getPosition();
+            return false;
+        } catch (const CMediaException&) {
+            return true;
+        }
+    };
+    EXPECT_TRUE(waitFor(isMissed));
+    EXPECT_NO_THROW(paused->stop());
     EXPECT_THROW(out->write(noise.data(), 4), CMediaException);
     out->close();
     in->close();

@@ -21,7 +21,7 @@ public:
     virtual void write(const void* data, int64_t size) = 0;
     virtual int64_t getQueuedSize() const = 0; // bytes that have not been handed to the system yet
     // Seconds of the queue's sound that have been heard since the device was opened: time spent in pauses
-    // or without data does not count. Throws when the device has gone while it ran.
+    // or without data does not count. Throws when the device has gone since it was started, paused or not.
     virtual double getPosition() const = 0;
 };
 

@@ -89,8 +89,10 @@ void CAudioOutDevice::abort() {
     double now = 0.0;
     PaError result = paNoError;
     if (m_started) {
-        if (!hasGone()) now = Pa_GetStreamTime(m_stream);
+        const bool gone = hasGone();
+        if (!gone) now = Pa_GetStreamTime(m_stream);
         result = Pa_AbortStream(m_stream);
+        if (gone) result = paNoError; // what has ended already need not be told to
         m_started = false;
     }
     CMutexLock lock(m_queueMutex);
@@ -164,13 +166,11 @@ int64_t CAudioOutDevice::getQueuedSize() const {
 double CAudioOutDevice::getPosition() const {
     CMutexLock lock(m_streamMutex);
     if (!m_stream) return 0.0;
-    const bool gone = hasGone();
-    if (gone && m_state == kDeviceRunning) requireAlive();
+    requireAlive(); // in a pause too: the position would stay for ever
     // A stream that does not run has no clock to ask.
-    const bool runs = m_started && !gone;
-    const double now = runs ? Pa_GetStreamTime(m_stream) : 0.0;
+    const double now = m_started ? Pa_GetStreamTime(m_stream) : 0.0;
     CMutexLock queueLock(m_queueMutex);
-    const double frames = runs ? m_clock.getHeard(now) : m_clock.getHeard();
+    const double frames = m_started ? m_clock.getHeard(now) : m_clock.getHeard();
     return frames / m_framesPerMillisecond / 1000.0;
 }
 
