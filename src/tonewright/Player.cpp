@@ -225,14 +225,15 @@ void CPlayer::stop() {
 
 void CPlayer::halt() {
     m_state = TONEWRIGHT_PLAYER_STOPPED;
-    if (m_device->getStatus() == peru::media::kDeviceRunning) m_device->stop();
+    // Whatever its status: one that is paused plays silence on, and would for as long as the player lives.
+    if (m_device->isOpened()) m_device->stop();
     if (m_source->isOpened()) m_source->close();
 }
 
 void CPlayer::haltQuietly() {
     quietly("CPlayer", [this] {
         CTurn turn(*this);
-        if (m_device->getStatus() == peru::media::kDeviceRunning) m_device->stop();
+        if (m_device->isOpened()) m_device->stop();
     });
     quietly("CPlayer", [this] {
         CTurn turn(*this);

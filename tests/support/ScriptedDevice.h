@@ -81,6 +81,7 @@ public:
     explicit CScriptedOutDevice(double speed = 200.0) : m_speed(speed) {}
 
     std::atomic<int> starts{0};
+    std::atomic<int> stops{0};
 
     // Everything that was written since it was last opened.
     std::string written() const {
@@ -123,6 +124,7 @@ public:
         CAlone alone(*this);
         std::scoped_lock lock(m_mutex);
         advance();
+        ++stops;
         m_running = false;
         m_end = m_heard;
     }

@@ -304,6 +304,7 @@ TEST_F(Player, Stop_ReturnsSoonWhateverGoesOn) {
         EXPECT_EQ(p.stop(), 0);
         EXPECT_LT(secondsSince(start), c.limit);
         EXPECT_EQ(p.device->getStatus(), 0);
+        EXPECT_GE(p.device->stops, 1) << "also after a pause, in which the stream runs on";
         EXPECT_FALSE(p.source->isOpened());
         player.join();
     }
