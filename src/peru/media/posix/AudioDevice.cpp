@@ -6,7 +6,9 @@
 #include "peru/media/Errors.h"
 #include "peru/media/FormatSearch.h"
 
+#include <algorithm>
 #include <cmath>
+#include <limits>
 #include <pthread.h>
 
 namespace peru::media::posix {
@@ -106,7 +108,10 @@ bool CAudioDevice::isTaken(const CAudioFormat& format, int32_t& failure) const {
 }
 
 P<CAudioFormat> CAudioDevice::getFormat(int32_t sampleRate, int32_t bytesPerSample, int32_t channelCount) {
-    const P<CAudioFormat> wanted = make<CAudioFormat>(sampleRate, channelCount, bytesPerSample * 8);
+    // A width without bounds is still refused under a number of its own.
+    const int64_t bits = std::clamp<int64_t>(int64_t{bytesPerSample} * 8, std::numeric_limits<int32_t>::min(),
+                                             std::numeric_limits<int32_t>::max());
+    const P<CAudioFormat> wanted = make<CAudioFormat>(sampleRate, channelCount, static_cast<int32_t>(bits));
     if (!findSampleFormat(wanted->getBitsPerSample())) return wanted;
     int32_t failure = paNoError;
     P<CAudioFormat> nearest =
