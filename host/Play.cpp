@@ -95,6 +95,7 @@ public:
 
 private:
     CHandle makePlayer(const fs::path& file);
+    std::string findReason(const fs::path& file);
     void watch(const std::shared_ptr<CSession>& session);
     void show();
 
@@ -111,6 +112,15 @@ void CJukebox::show() {
     m_line.update(
         at + " / " + all + (isPaused ? "  paused" : ""), at + " of " + all,
         {{"position", position}, {"duration", duration}, {"state", isPaused ? "paused" : "playing"}});
+}
+
+// A player that cannot be made says of its file only that it does not open; a source of the file says why.
+std::string CJukebox::findReason(const fs::path& file) {
+    const std::string reason = CHostLog::takeReadReason(file);
+    const SSampleFormat samples;
+    const CHandle source(m_library.CreateAudioSourceFromURI(toURI(file).c_str(), samples.rate,
+                                                            samples.channels, samples.bytesPerSample, 0));
+    return source ? reason : CHostLog::takeReadReason(file);
 }
 
 // Shows and obeys until playing has ended.
@@ -138,7 +148,7 @@ CHandle CJukebox::makePlayer(const fs::path& file) {
     if (!isArrangement(file)) {
         CHostLog::takeReason();
         CHandle player(m_library.CreatePlayerFromURI(toURI(file).c_str()));
-        if (!player) throw std::runtime_error(CHostLog::takeReadReason(file));
+        if (!player) throw std::runtime_error(findReason(file));
         return player;
     }
     const CHandle source = openArrangement(m_library, file, SSampleFormat());
