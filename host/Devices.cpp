@@ -91,10 +91,13 @@ void requireOutDevice() {
 
 P<IAudioInDevice> findInDevice(const std::string& id) {
     return ask([&](auto& system) {
-        P<IAudioInDevice> device = system.getDefaultInDevice();
-        if (!device) throw CNoDevice("There is no sound device to record from");
-        if (id.empty()) return device;
-        for (peru::WEnum<IAudioInDevice> devices = system.getInDevices(); devices.hasMore();) {
+        // Where none is the default one, others may still be named.
+        peru::WEnum<IAudioInDevice> devices = system.getInDevices();
+        P<IAudioInDevice> device = id.empty() ? system.getDefaultInDevice() : nullptr;
+        if (id.empty() ? !device : !devices.hasMore())
+            throw CNoDevice("There is no sound device to record from");
+        if (device) return device;
+        while (devices.hasMore()) {
             device = devices.getNext();
             if (toText(device->getId()) == id) return device;
         }

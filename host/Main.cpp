@@ -200,7 +200,7 @@ void addRecord(CLI::App& app, SRecordOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
         "record", "Record a sound file until q or Ctrl-C, with 44100 Hz, 2 channels and 16 bits unless told\n"
                   "otherwise. It is written as FILE.part and named FILE at its end; a recording that is cut\n"
-                  "off, by a power failure or a kill, stays as FILE.part and can be played.");
+                  "off, by a power failure or a kill, stays as FILE.part and plays once it is renamed.");
     command->add_option("-o,--output", options.output, "File to write; its extension selects the format")
         ->required()
         ->option_text("FILE");

@@ -26,6 +26,7 @@ constexpr const char* kTemporaryEnding = ".part";
 // Between the device's thread and the one that watches. The callbacks have no word of their own for the
 // caller; there is one recording at a time.
 struct STold {
+    std::atomic<double> start{-1}; // the device's time of the first block; below 0: there was none
     std::atomic<double> position{0};
     std::atomic<double> left{0}; // greatest level since it was last taken
     std::atomic<double> right{0};
@@ -34,7 +35,10 @@ struct STold {
 };
 STold g_told;
 
-bool onRecorded(double position) {
+// The device's time runs from its start on, and the first block comes later: counted is what was recorded.
+bool onRecorded(double time) {
+    if (g_told.start < 0) g_told.start = time;
+    const double position = time - g_told.start;
     g_told.position = position;
     return !g_told.isStopped && (g_told.limit <= 0 || position < g_told.limit);
 }
@@ -145,14 +149,14 @@ void CRecorder::run(const peru::P<peru::media::IAudioInDevice>& device) {
         encode(device);
     } catch (const std::runtime_error& failure) {
         // Nobody can make the same sound again.
-        if (g_told.position <= 0) throw;
+        if (g_told.start < 0 || countBytes() == 0) throw;
         m_place.keep();
         throw std::runtime_error(std::string(failure.what()) + "; what was recorded is in " +
                                  m_place.getTemporary().string());
     }
     const double position = g_told.position;
     const bool wasWanted = g_told.isStopped || (g_told.limit > 0 && position >= g_told.limit);
-    if (!wasWanted && position <= 0) throw std::runtime_error("The sound device delivers nothing");
+    if (!wasWanted && g_told.start < 0) throw std::runtime_error("The sound device delivers nothing");
     const uint64_t bytes = countBytes();
     m_place.commit();
     if (!wasWanted)

@@ -128,6 +128,7 @@ TEST_F(Record, RefusesWhatItCannotWrite) {
         {{"record", "-o", "out.xyz"}, "out.xyz: No plug-in writes .xyz files"},
         {{"record", "-o", "out.mp3", "--rate", "96000"}, "out.mp3: "},
         {{"record", "-o", "out.wav", "--channels", "7"}, "out.wav: "},
+        {{"record", "-o", "/proc/out.wav"}, "Could not create: No such file or directory\n"},
     };
     for (const auto& [command, reason] : kCases) {
         const SProcessResult result = tonewright(command);
