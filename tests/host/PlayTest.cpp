@@ -7,6 +7,14 @@ namespace {
 // Nothing waits for a thread that fails: what takes ten seconds has waited for one.
 constexpr double kQuick = 8;
 
+// Without frames of silence, of which noise has none.
+std::string withoutGaps(const std::string& heard) {
+    std::string sound;
+    for (size_t at = 0; at + 4 <= heard.size(); at += 4)
+        if (heard.compare(at, 4, std::string(4, '\0')) != 0) sound.append(heard, at, 4);
+    return sound;
+}
+
 class Play : public CSoundTest {
 protected:
     Play() : CSoundTest(EMicrophone::none) {}
@@ -24,10 +32,17 @@ protected:
 
 } // namespace
 
+// How long the sound server itself has to wait for a processor is not ours to say: beside the other tests it
+// now and then plays a gap of its own, which is no failure unless it comes again and again.
 TEST_F(Play, IsBitExactAndHardlyCostsAnything) {
     const SSound noise = makeLoudNoise(30);
     SProcessResult result;
-    EXPECT_TRUE(hear(noise, result) == noise.samples);
+    std::string heard = hear(noise, result);
+    for (int again = 0; again < 2 && heard != noise.samples; ++again) {
+        EXPECT_TRUE(withoutGaps(heard) == noise.samples);
+        heard = hear(noise, result);
+    }
+    EXPECT_TRUE(heard == noise.samples);
     const double cost = result.cpuSeconds / 30;
     RecordProperty("cost", std::to_string(cost));
 #ifndef TONEWRIGHT_SANITIZED
@@ -35,8 +50,7 @@ TEST_F(Play, IsBitExactAndHardlyCostsAnything) {
 #endif
 }
 
-// How long the sound server itself has to wait for a processor is not ours to say, so that a gap is told and
-// no failure; nothing is lost, repeated or out of order.
+// Gaps are told and no failure here; nothing is lost, repeated or out of order.
 TEST_F(Play, LosesNothingOnABusyMachine) {
     std::vector<std::unique_ptr<CProcess>> others;
     for (int i = 0; i < 4; ++i)
@@ -45,9 +59,7 @@ TEST_F(Play, LosesNothingOnABusyMachine) {
     const SSound noise = makeLoudNoise(30);
     SProcessResult result;
     const std::string heard = hear(noise, result);
-    std::string sound;
-    for (size_t at = 0; at + 4 <= heard.size(); at += 4)
-        if (heard.compare(at, 4, std::string(4, '\0')) != 0) sound.append(heard, at, 4);
+    const std::string sound = withoutGaps(heard);
     RecordProperty("gaps", std::to_string(static_cast<double>(heard.size() - sound.size()) / 4 / 44100));
     EXPECT_TRUE(sound == noise.samples);
 }
