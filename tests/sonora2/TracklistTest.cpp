@@ -1,3 +1,4 @@
+#include "peru/IMutex.h"
 #include "sonora2/TrackSupport.h"
 #include "sonora2/common/LogManager.h"
 #include "sonora2/common/TrackCommands.h"
@@ -269,6 +270,28 @@ TEST_F(Tracklist, SlowMedium_HoldsUpNobodyBeforeItIsDue) {
     played.insert(played.end(), rest.begin(), rest.end());
     for (STrackPlan& plan : plans) plan.noise.onOpen = [] {};
     EXPECT_TRUE(played == renderList(plans, kRate, 1, kStep));
+}
+
+TEST_F(Tracklist, LookAhead_OpensFirstWhatIsDueFirst) {
+    const P<peru::IMutex> mutex = peru::getMutexFactory()->createMutex();
+    std::vector<int> opened;
+    std::vector<STrackPlan> plans;
+    for (int i = 0; i < 8; ++i) { // the last lane is due first
+        plans.push_back({{i, kRate}, i, 4.0 - i * 0.5, 5.0});
+        plans.back().noise.onOpen = [&, i] {
+            peru::CMutexLock lock(mutex);
+            opened.push_back(i);
+        };
+    }
+    const P<CAudioTracklist> list = makeList(true, plans);
+    list->open();
+    pull(list);
+    EXPECT_TRUE(becomesTrue([&] {
+        peru::CMutexLock lock(mutex);
+        return opened.size() == plans.size();
+    }));
+    list->close();
+    EXPECT_EQ(opened, (std::vector<int>{7, 6, 5, 4, 3, 2, 1, 0}));
 }
 
 TEST_F(Tracklist, MediumThatFails_IsLoggedWhenOpenedAheadAndThrownWhenDue) {

@@ -181,6 +181,7 @@ double CTracklist::getLookAheadEnd() const {
 
 void CTracklist::lookAhead() {
     const double target = getLookAheadEnd();
+    const auto alreadyHeld = static_cast<Entries::difference_type>(m_held.size());
     for (const SLane& lane : m_lanes) {
         if (lane.start >= target) continue;
         for (size_t i = lane.cursor; i < lane.entries.size() && lane.entries[i]->start < target; ++i) {
@@ -189,9 +190,13 @@ void CTracklist::lookAhead() {
             if (!isDue || entry.state != EState::closed || !entry.track->isEnabled()) continue;
             entry.state = EState::requested;
             m_held.push_back(&entry);
-            m_opener->requestOpen(entry.track);
         }
     }
+    // What is due first is opened first, whatever its lane: many slow media may come at once after a skip.
+    std::stable_sort(m_held.begin() + alreadyHeld, m_held.end(),
+                     [](const SEntry* a, const SEntry* b) { return a->start < b->start; });
+    for (auto entry = m_held.begin() + alreadyHeld; entry != m_held.end(); ++entry)
+        m_opener->requestOpen((*entry)->track);
 }
 
 void CTracklist::leave(SEntry& entry) {
