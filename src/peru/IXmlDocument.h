@@ -16,8 +16,9 @@ public:
     static constexpr int32_t kMaxProperties = 1000;
 
     // Both replace the content; nodes of the old one count as removed. On CParseError the old content stays.
-    // The bytes may be UTF-8, UTF-16 that begins with its mark, or Latin-1 that is declared so. Document type
-    // declarations with a body are refused: what they define would be lost.
+    // The bytes may be UTF-8, UTF-16 that begins with its mark, or Latin-1 that is declared so; a mark counts
+    // for more than what is declared. Document type declarations with a body are refused: what they define
+    // would be lost.
     virtual void parse(const P<IInStream>& stream) = 0; // all that is left in it
     virtual void parseString(const P<IString>& text) = 0;
 

@@ -73,7 +73,7 @@ std::string decode(std::string bytes, const P<IURI>& uri) {
             fail(xml::EFault::encoding, uri, xml::getLine(text, text.size()));
         return text;
     }
-    if (startsWith(bytes, "\xEF\xBB\xBF")) bytes.erase(0, 3);
+    if (startsWith(bytes, "\xEF\xBB\xBF")) return bytes.erase(0, 3);
     return declaresLatin1(bytes) ? xml::decodeLatin1(bytes) : bytes;
 }
 

@@ -63,6 +63,8 @@ P<CTrack> readTrack(const P<IXmlNode>& node) {
 std::vector<P<CTrack>> readEditorXml(const peru::CStringArg& text) {
     const P<peru::IString> utf8 = peru::CString::fromView(text.getView())->toUTF8String();
     const P<peru::CMemoryIOStream> stream = peru::make<peru::CMemoryIOStream>();
+    // The mark says that this is UTF-8, whatever encoding the text declares for its file.
+    if (!utf8->startsWith(u"\uFEFF")) stream->write("\xEF\xBB\xBF", 3);
     stream->write(utf8->getData(), utf8->getDataSize());
     stream->reset();
     const P<peru::IXmlDocument> document = peru::make<peru::CXmlDocument>("1.0", "utf-8");

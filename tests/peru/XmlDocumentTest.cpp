@@ -56,6 +56,7 @@ TEST(XmlDocument, parse_ReadsWhatOtherProgramsWrite) {
         {"<a>x<![CDATA[ <b> ]]>y<!-- c --><b>z</b></a>", "x <b> y"},
         {"<?go on?><a b='>' c='/>'/>", ""},
         {"<?xml version='1.0' encoding='ISO-8859-1'?><a>gr\xFC\xDF</a>", "gr\xC3\xBC\xC3\x9F"},
+        {"\xEF\xBB\xBF<?xml version='1.0' encoding='ISO-8859-1'?><a>\xC3\x9F</a>", "\xC3\x9F"},
         {asUTF16(u"<?xml version='1.0' encoding='UTF-16'?><a>\u00DF\U0001F600</a>", false),
          "\xC3\x9F\xF0\x9F\x98\x80"},
         {asUTF16(u"<a>\u0915</a>", true), "\xE0\xA4\x95"},

@@ -75,9 +75,11 @@ TEST(EditorXml, Text_BecomesTracks) {
               "[ 0.000 0.000 0.000 fade 0.000 0.000 1.000 1.000 fade 1.000 2.000 0.500 0.000]"},
          })
         EXPECT_EQ(describe(readEditorXml(peru::CString::fromUTF8(c.xml))), c.tracks) << c.xml;
-    EXPECT_EQ(
-        describe(readEditorXml(u"<x><Tracks><Track><Uri>file:///\u00e4.wav</Uri></Track></Tracks></x>")),
-        "[file:///%C3%A4.wav 0.000 0.000 0.000]");
+    for (const char16_t* start : {u"", u"\uFEFF", u"<?xml version='1.0' encoding='ISO-8859-1'?>"}) {
+        const std::u16string xml =
+            std::u16string(start) + u"<x><Tracks><Track><Uri>file:///\u00e4.wav</Uri></Track></Tracks></x>";
+        EXPECT_EQ(describe(readEditorXml(xml.c_str())), "[file:///%C3%A4.wav 0.000 0.000 0.000]");
+    }
 }
 
 TEST(EditorXml, BadText_IsRefused) {
