@@ -24,7 +24,7 @@ if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
 endif()
 
 if(TONEWRIGHT_SANITIZERS)
-    add_compile_options(-fsanitize=${TONEWRIGHT_SANITIZERS} -fno-omit-frame-pointer -fno-sanitize-recover=all -O1)
+    add_compile_options(-fsanitize=${TONEWRIGHT_SANITIZERS} -fno-omit-frame-pointer -fno-sanitize-recover=all -O1 -g1)
     add_link_options(-fsanitize=${TONEWRIGHT_SANITIZERS})
     add_compile_definitions(TONEWRIGHT_SANITIZED)
 endif()
