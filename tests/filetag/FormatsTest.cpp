@@ -35,6 +35,10 @@ const std::string kTexts[] = {
 };
 constexpr size_t kTextCount = std::size(kTexts);
 
+// In the order of the fields.
+constexpr const char* kNamesOfFFmpeg[] = {"title", "artist", "album", "album_artist",
+                                          "track", "date",   "genre", "comment"};
+
 // Judges give years, track numbers and genres a form of their own.
 std::string getText(size_t field, size_t round) {
     if (std::string(kFields[field].name) == "year") return std::to_string(1990 + round);
@@ -79,9 +83,7 @@ CTexts readWithFFprobe(const std::filesystem::path& file) {
     enter(found["format"].value("tags", nlohmann::json::object()));
     for (const auto& stream : found["streams"]) enter(stream.value("tags", nlohmann::json::object()));
     CTexts texts;
-    const char* const names[] = {"title", "artist", "album", "album_artist",
-                                 "track", "date",   "genre", "comment"};
-    for (size_t i = 0; i < std::size(kFields); ++i) texts[kFields[i].name] = byName[names[i]];
+    for (size_t i = 0; i < std::size(kFields); ++i) texts[kFields[i].name] = byName[kNamesOfFFmpeg[i]];
     if (texts["year"].empty()) texts["year"] = byName["wm/year"];
     return texts;
 }
@@ -141,6 +143,17 @@ TEST_P(FileTag, ReadsWhatOthersWrite) {
     for (size_t round = 0; round < kTextCount; ++round) {
         tests::judge({"set", m_file, nlohmann::json(makeTexts(round)).dump()});
         EXPECT_EQ(tests::readFields(*open(m_file)), makeTexts(round));
+
+        const std::filesystem::path other = m_folder / ("ffmpeg" + std::to_string(round) + "." + GetParam());
+        std::vector<std::string> command{"ffmpeg", "-v",   "error",         "-i", m_file,
+                                         "-c",     "copy", "-map_metadata", "-1"};
+        for (size_t i = 0; i < std::size(kFields); ++i)
+            command.insert(command.end(), {"-metadata", kNamesOfFFmpeg[i] + ("=" + getText(i, round))});
+        command.push_back(other);
+        tests::run(command);
+        EXPECT_EQ(tests::readFields(*open(other)), makeTexts(round));
+        store(other, makeTexts(round + 1));
+        EXPECT_EQ(readWithFFprobe(other), makeTexts(round + 1));
     }
 }
 

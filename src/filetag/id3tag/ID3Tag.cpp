@@ -19,6 +19,7 @@ using taglib::EField;
 using TagLib::ID3v2::AttachedPictureFrame;
 using TagLib::ID3v2::CommentsFrame;
 using TagLib::ID3v2::TextIdentificationFrame;
+using TagLib::ID3v2::UserTextIdentificationFrame;
 
 namespace {
 
@@ -54,6 +55,11 @@ TagLib::String toGenre(const TagLib::String& text) {
 
 constexpr EField kFields[] = {EField::title,       EField::artist, EField::album, EField::albumArtist,
                               EField::trackNumber, EField::year,   EField::genre, EField::comment};
+
+// Some programs write the comment as a text that is named so.
+UserTextIdentificationFrame* findOtherComment(TagLib::ID3v2::Tag* tag) {
+    return UserTextIdentificationFrame::find(tag, "comment");
+}
 
 } // namespace
 
@@ -105,12 +111,15 @@ CommentsFrame* CID3Tag::findComment() const {
     return found;
 }
 
+TagLib::String CID3Tag::readComment() const {
+    if (const CommentsFrame* comment = findComment()) return comment->text();
+    const UserTextIdentificationFrame* other = findOtherComment(m_tag);
+    return other && other->fieldList().size() > 1 ? other->fieldList()[1] : TagLib::String();
+}
+
 TagLib::String CID3Tag::readFrame(EField field) const {
     if (!m_tag) return {};
-    if (field == EField::comment) {
-        const CommentsFrame* comment = findComment();
-        return comment ? comment->text() : TagLib::String();
-    }
+    if (field == EField::comment) return readComment();
     const TagLib::ID3v2::FrameList frames = m_tag->frameList(getFrameId(field));
     if (frames.isEmpty()) return {};
     const auto* frame = dynamic_cast<const TextIdentificationFrame*>(frames.front());
@@ -125,6 +134,7 @@ TagLib::String CID3Tag::readField(EField field) const {
 }
 
 void CID3Tag::writeComment(const TagLib::String& text) {
+    while (UserTextIdentificationFrame* other = findOtherComment(m_tag)) m_tag->removeFrame(other);
     if (text.isEmpty()) {
         while (CommentsFrame* comment = findComment()) m_tag->removeFrame(comment);
         return;

@@ -39,6 +39,7 @@ private:
     TagLib::ID3v2::AttachedPictureFrame* getPicture(int32_t index) const; // null outside the list
     void createTag();
     TagLib::ID3v2::CommentsFrame* findComment() const; // the one that users mean; null without one
+    TagLib::String readComment() const;
     TagLib::String readFrame(taglib::EField field) const;
     void writeFrame(taglib::EField field, const TagLib::String& text);
     void writeComment(const TagLib::String& text);

@@ -5,6 +5,8 @@
 #include "peru/IPathes.h"
 #include "peru/IStringLocalizer.h"
 
+#include <array>
+
 namespace filetag::wmatag {
 
 using namespace peru;
@@ -16,27 +18,33 @@ constexpr char kPicture[] = "WM/Picture";
 // Title, artist and comment stand in an object whose lengths have 16 bits and count a zero at the end.
 constexpr unsigned int kLongestText = 0xffff / 2 - 1;
 
+// The attribute that is written, empty for what TagLib keeps apart from attributes. The others are read where
+// it is missing, and go when the field is set: values after the first, and what other programs write.
 struct SNames {
-    const char* first; // is written, both are read
-    const char* second;
+    const char* first;
+    std::array<const char*, 2> others;
 };
 
-// Empty for the fields that are no attributes.
 SNames getNames(EField field) {
     switch (field) {
+    case EField::title:
+        return {nullptr, {"Title", "title"}};
+    case EField::artist:
+        return {nullptr, {"Author"}};
+    case EField::comment:
+        return {nullptr, {"Description"}};
     case EField::album:
-        return {"WM/AlbumTitle", nullptr};
+        return {"WM/AlbumTitle", {}};
     case EField::genre:
-        return {"WM/Genre", nullptr};
+        return {"WM/Genre", {}};
     case EField::albumArtist:
-        return {"WM/AlbumArtist", nullptr};
+        return {"WM/AlbumArtist", {}};
     case EField::trackNumber:
-        return {"WM/TrackNumber", "WM/Track"};
+        return {"WM/TrackNumber", {"WM/Track"}};
     case EField::year:
-        return {"WM/Year", nullptr};
-    default:
-        return {nullptr, nullptr};
+        return {"WM/Year", {"date"}};
     }
+    return {nullptr, {}};
 }
 
 // Some programs write numbers as numbers.
@@ -78,8 +86,7 @@ P<IString> CWMATag::getTagType() const {
     return m_tag ? newString("ASF") : CString::empty();
 }
 
-TagLib::String CWMATag::readField(EField field) const {
-    if (!m_tag) return {};
+TagLib::String CWMATag::readOwnField(EField field) const {
     switch (field) {
     case EField::title:
         return m_tag->title();
@@ -88,33 +95,34 @@ TagLib::String CWMATag::readField(EField field) const {
     case EField::comment:
         return m_tag->comment();
     default:
-        break;
+        return getFirst(*m_tag, getNames(field).first);
     }
-    const SNames names = getNames(field);
-    const TagLib::String text = getFirst(*m_tag, names.first);
-    return text.isEmpty() ? getFirst(*m_tag, names.second) : text;
+}
+
+TagLib::String CWMATag::readField(EField field) const {
+    if (!m_tag) return {};
+    TagLib::String text = readOwnField(field);
+    for (const char* other : getNames(field).others)
+        if (text.isEmpty()) text = getFirst(*m_tag, other);
+    return text;
 }
 
 void CWMATag::writeField(EField field, const TagLib::String& text) {
     if (!m_tag) return;
-    // Values after the first of title, artist and comment are attributes.
+    const SNames names = getNames(field);
+    for (const char* other : names.others)
+        if (other) m_tag->removeItem(other);
     switch (field) {
     case EField::title:
-        m_tag->removeItem("Title");
         return m_tag->setTitle(text);
     case EField::artist:
-        m_tag->removeItem("Author");
         return m_tag->setArtist(text);
     case EField::comment:
-        m_tag->removeItem("Description");
         return m_tag->setComment(text);
     default:
-        break;
+        m_tag->removeItem(names.first);
+        if (!text.isEmpty()) m_tag->setAttribute(names.first, TagLib::ASF::Attribute(text));
     }
-    const SNames names = getNames(field);
-    m_tag->removeItem(names.first);
-    if (names.second) m_tag->removeItem(names.second);
-    if (!text.isEmpty()) m_tag->setAttribute(names.first, TagLib::ASF::Attribute(text));
 }
 
 // TagLib would write what is too long with a length that leads into the middle of it.

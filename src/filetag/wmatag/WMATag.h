@@ -30,6 +30,8 @@ protected:
     bool save(TagLib::File& file) override;
 
 private:
+    TagLib::String readOwnField(taglib::EField field) const;
+
     TagLib::ASF::Tag* m_tag = nullptr; // of the open file
 };
 
