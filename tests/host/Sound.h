@@ -12,6 +12,15 @@
 
 namespace tests {
 
+// Without frames of silence, of which noise has none: beside other tests the sound server may have to wait
+// for a processor and then plays a gap of its own.
+inline std::string withoutGaps(const std::string& heard) {
+    std::string sound;
+    for (size_t at = 0; at + 4 <= heard.size(); at += 4)
+        if (heard.compare(at, 4, std::string(4, '\0')) != 0) sound.append(heard, at, 4);
+    return sound;
+}
+
 class CSoundTest : public CProgramTest {
 protected:
     using Clock = std::chrono::steady_clock;
