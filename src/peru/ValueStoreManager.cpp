@@ -7,7 +7,10 @@
 
 namespace peru {
 
-CValueStoreManager::CValueStoreManager() : m_mutex(getMutexFactory()->createMutex()), m_factories(4, 4) {}
+CValueStoreManager::CValueStoreManager(std::initializer_list<P<IValueStoreFactory>> factories)
+    : m_mutex(getMutexFactory()->createMutex()), m_factories(4, 4) {
+    for (const P<IValueStoreFactory>& factory : factories) m_factories.add(factory);
+}
 
 CValueStoreManager::~CValueStoreManager() = default;
 
@@ -40,10 +43,9 @@ void CValueStoreManager::removeFactory(const P<IValueStoreFactory>& factory) {
 P<IValueStoreManager> getValueStoreManager() {
     static const CGlobalObjFactory::SKey key;
     return CGlobalObjFactory::get<IValueStoreManager>(key, []() -> P<IValueStoreManager> {
-        auto manager = make<CValueStoreManager>();
-        manager->addFactory(make<CXmlValueStoreFactory>());
-        manager->addFactory(make<posix::CRegistryValueStoreFactory>());
-        return manager;
+        const P<IValueStoreFactory> xml = make<CXmlValueStoreFactory>();
+        const P<IValueStoreFactory> registry = make<posix::CRegistryValueStoreFactory>();
+        return make<CValueStoreManager>(std::initializer_list<P<IValueStoreFactory>>{xml, registry});
     });
 }
 

@@ -6,12 +6,13 @@
 #include "peru/Object.h"
 #include "peru/SimpleArray.h"
 
+#include <initializer_list>
+
 namespace peru {
 
-// Made without factories.
 class PERU_API CValueStoreManager : public CObject, public IValueStoreManager {
 public:
-    CValueStoreManager();
+    explicit CValueStoreManager(std::initializer_list<P<IValueStoreFactory>> factories);
     ~CValueStoreManager() override;
 
     P<IValueStore> openStore(const P<IURI>& uri, EStoreAccess access) override;
