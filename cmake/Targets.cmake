@@ -5,7 +5,8 @@ set(TONEWRIGHT_LIBRARY_DIR ${CMAKE_BINARY_DIR}/lib)
 set(CMAKE_RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/bin)
 set(CMAKE_LIBRARY_OUTPUT_DIRECTORY ${TONEWRIGHT_LIBRARY_DIR})
 
-# tw_sources(VARIABLE [FOLDER...]): the sources of the calling folder (or of those below it).
+# tw_sources(VARIABLE [FOLDER...]): the sources of the calling folder, or of the folders given, each with the platform code
+# in its posix/.
 macro(tw_sources variable)
     set(folders ${ARGN})
     if(NOT folders)
@@ -13,7 +14,8 @@ macro(tw_sources variable)
     endif()
     set(${variable})
     foreach(folder ${folders})
-        file(GLOB found CONFIGURE_DEPENDS ${CMAKE_CURRENT_SOURCE_DIR}/${folder}/*.cpp ${CMAKE_CURRENT_SOURCE_DIR}/${folder}/*.h)
+        set(path ${CMAKE_CURRENT_SOURCE_DIR}/${folder})
+        file(GLOB found CONFIGURE_DEPENDS ${path}/*.cpp ${path}/*.h ${path}/posix/*.cpp ${path}/posix/*.h)
         list(APPEND ${variable} ${found})
     endforeach()
 endmacro()
@@ -46,10 +48,10 @@ function(tw_library name)
     )
 endfunction()
 
-# tw_test(NAME [PRIVATE lib...] [LABELS label...]): one test binary of the calling folder's sources.
+# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...]): one test binary of the calling folder's sources.
 function(tw_test name)
-    cmake_parse_arguments(arg "" "" "PRIVATE;LABELS" ${ARGN})
-    tw_sources(sources)
+    cmake_parse_arguments(arg "" "" "FOLDERS;PRIVATE;LABELS" ${ARGN})
+    tw_sources(sources ${arg_FOLDERS})
     if(NOT sources)
         return()
     endif()

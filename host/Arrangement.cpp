@@ -3,9 +3,9 @@
 #include "HostLog.h"
 #include "Text.h"
 #include "peru/Errors.h"
-#include "peru/MemoryIOStream.h"
-#include "peru/URI.h"
-#include "peru/XmlDocument.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "peru/uri/URI.h"
+#include "peru/xml/XmlDocument.h"
 
 #include <algorithm>
 #include <fstream>

@@ -3,9 +3,9 @@
 #include "Cancel.h"
 #include "Commands.h"
 #include "Text.h"
-#include "peru/String.h"
 #include "peru/media/Errors.h"
 #include "peru/media/ISystem.h"
+#include "peru/strings/String.h"
 
 #include <cerrno>
 #include <cstdio>

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "Library.h"
-#include "peru/ILog.h"
+#include "peru/log/ILog.h"
 
 #include <atomic>
 #include <filesystem>

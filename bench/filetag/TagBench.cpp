@@ -1,7 +1,7 @@
 // Reading and storing tags, beside TagLib alone and a plain copy. Files are made by lame, flac, oggenc,
 // ffmpeg and sox in the temporary folder.
 #include "filetag/FileTagFactory.h"
-#include "peru/IPathes.h"
+#include "peru/system/IPathes.h"
 
 #include <benchmark/benchmark.h>
 

@@ -1,7 +1,7 @@
 // The string operations beside ICU's UnicodeString and std::u16string, in the same run. The two arguments are
 // the kind of text and its length.
-#include "peru/CharEncodings.h"
-#include "peru/String.h"
+#include "peru/strings/CharEncodings.h"
+#include "peru/strings/String.h"
 
 #include <benchmark/benchmark.h>
 #include <unicode/unistr.h>

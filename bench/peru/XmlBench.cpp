@@ -1,8 +1,8 @@
 // Parsing and printing a document of 10 MB beside the bare parser, in the same run.
-#include "peru/IURI.h"
-#include "peru/MemoryIOStream.h"
-#include "peru/StringStreams.h"
-#include "peru/XmlDocument.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "peru/streams/StringStreams.h"
+#include "peru/uri/IURI.h"
+#include "peru/xml/XmlDocument.h"
 
 #include <benchmark/benchmark.h>
 #include <tinyxml.h>

@@ -1,9 +1,9 @@
 // Cost of mixing: the loop alone, and a list of tracks that play at once.
-#include "sonora2/SilentAudioSource.h"
-#include "sonora2/audio/AudioTrack.h"
-#include "sonora2/audio/AudioTracklist.h"
-#include "sonora2/audio/MixSamples.h"
-#include "sonora2/audio/SonoraContextAudio.h"
+#include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/media/SilentAudioSource.h"
+#include "sonora2/tracks/AudioTrack.h"
+#include "sonora2/tracks/AudioTracklist.h"
+#include "sonora2/tracks/MixSamples.h"
 
 #include <benchmark/benchmark.h>
 

@@ -2,11 +2,11 @@
 //
 // Each run is two fresh processes. The first is timed as a whole; the second takes the same steps one by one
 // and marks their ends. Both tell their marks through a pipe, on the clock of the process that started them.
-#include "peru/IDynamicLibrary.h"
-#include "peru/ILog.h"
-#include "peru/ISystem.h"
-#include "sonora2/audio/SonoraContextAudio.h"
-#include "sonora2/common/PluginHandler.h"
+#include "peru/log/ILog.h"
+#include "peru/system/IDynamicLibrary.h"
+#include "peru/system/ISystem.h"
+#include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/plugins/PluginHandler.h"
 #include "tonewright/tonewright.h"
 
 #include <algorithm>

@@ -9,7 +9,7 @@
 #include "filetag/ICoverArtFileTag.h"
 #include "peru/Errors.h"
 #include "peru/IInterfaceQuery.h"
-#include "peru/IPathes.h"
+#include "peru/system/IPathes.h"
 
 #include <cstdio>
 #include <cstdlib>

@@ -1,8 +1,8 @@
 // Records from the default input device: record FILE SECONDS
 #include "peru/Errors.h"
 #include "peru/IInstanceWrapper.h"
-#include "peru/IPathes.h"
 #include "peru/media/ISystem.h"
+#include "peru/system/IPathes.h"
 #include "tonewright/tonewright.h"
 
 #include <atomic>

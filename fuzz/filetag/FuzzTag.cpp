@@ -3,7 +3,7 @@
 #include "filetag/FileTagFactory.h"
 #include "filetag/ICoverArtFileTag.h"
 #include "peru/Errors.h"
-#include "peru/IPathes.h"
+#include "peru/system/IPathes.h"
 
 #include <cstdint>
 #include <cstdio>

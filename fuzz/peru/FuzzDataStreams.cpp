@@ -1,10 +1,10 @@
 // Arbitrary bytes as typed values, as a text file and as base64: every reader ends with a value or an error
 // of its own.
-#include "peru/Base64Streams.h"
-#include "peru/DataStreams.h"
 #include "peru/Errors.h"
-#include "peru/MemoryIOStream.h"
-#include "peru/TextFile.h"
+#include "peru/streams/Base64Streams.h"
+#include "peru/streams/DataStreams.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "peru/streams/TextFile.h"
 
 #include <cstdint>
 #include <cstdlib>

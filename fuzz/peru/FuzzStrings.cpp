@@ -1,7 +1,7 @@
 // Arbitrary bytes as text in every encoding: operations must agree with each other and stay within the bytes.
 #include "peru/Errors.h"
-#include "peru/StringFormat.h"
-#include "peru/StringTokenizer.h"
+#include "peru/strings/StringFormat.h"
+#include "peru/strings/StringTokenizer.h"
 
 #include <cstdint>
 #include <cstdlib>

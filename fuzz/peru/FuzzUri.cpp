@@ -1,7 +1,7 @@
 // Arbitrary bytes as URIs: what was parsed must be ASCII, parse to the same again, and resolve back from
 // its relative form.
 #include "peru/Errors.h"
-#include "peru/URI.h"
+#include "peru/uri/URI.h"
 
 #include <cstdint>
 #include <cstdlib>

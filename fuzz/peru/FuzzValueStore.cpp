@@ -1,10 +1,10 @@
 // A document as a store of values, changed by what the bytes say: what was set is there afterwards, also in a
 // store over the printed document.
 #include "peru/Errors.h"
-#include "peru/URI.h"
-#include "peru/XmlDocument.h"
-#include "peru/XmlText.h"
-#include "peru/XmlValueStore.h"
+#include "peru/settings/XmlValueStore.h"
+#include "peru/uri/URI.h"
+#include "peru/xml/XmlDocument.h"
+#include "peru/xml/XmlText.h"
 
 #include <cstdint>
 #include <cstdlib>

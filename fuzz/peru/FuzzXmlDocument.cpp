@@ -1,9 +1,9 @@
 // Arbitrary bytes as XML: what is accepted is printed, parses again, and prints the same.
 #include "peru/Errors.h"
-#include "peru/IURI.h"
-#include "peru/MemoryIOStream.h"
-#include "peru/StringStreams.h"
-#include "peru/XmlDocument.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "peru/streams/StringStreams.h"
+#include "peru/uri/IURI.h"
+#include "peru/xml/XmlDocument.h"
 
 #include <cstdint>
 #include <cstdlib>

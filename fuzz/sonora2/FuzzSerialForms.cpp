@@ -1,12 +1,12 @@
 // Arbitrary bytes as the serial forms that cross the pipe: each ends with an object or an error of its own,
 // and a context that could not be read is as it was.
-#include "peru/DataStreams.h"
 #include "peru/Errors.h"
-#include "peru/MemoryIOStream.h"
-#include "sonora2/audio/AudioChunk.h"
-#include "sonora2/audio/AudioStreamInfos.h"
-#include "sonora2/audio/SonoraContextAudio.h"
-#include "sonora2/common/PluginExtensions.h"
+#include "peru/streams/DataStreams.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/media/AudioChunk.h"
+#include "sonora2/media/AudioStreamInfos.h"
+#include "sonora2/plugins/PluginExtensions.h"
 
 #include <cstdint>
 #include <cstdlib>

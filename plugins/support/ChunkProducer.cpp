@@ -1,6 +1,6 @@
 #include "support/ChunkProducer.h"
 
-#include "sonora2/audio/AudioChunk.h"
+#include "sonora2/media/AudioChunk.h"
 
 #include <algorithm>
 #include <cstring>

@@ -1,7 +1,7 @@
 // Turns a decoder's frames into chunks of the wanted format.
 #pragma once
 
-#include "sonora2/common/ISonoraContext.h"
+#include "sonora2/context/ISonoraContext.h"
 #include "sonora2/samplerateconverter/SampleRateConverter.h"
 #include "support/Decoder.h"
 

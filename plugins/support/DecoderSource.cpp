@@ -1,7 +1,7 @@
 #include "support/DecoderSource.h"
 
 #include "peru/Errors.h"
-#include "sonora2/audio/AudioStreamInfos.h"
+#include "sonora2/media/AudioStreamInfos.h"
 
 #include <algorithm>
 #include <cmath>

@@ -1,7 +1,7 @@
 // The audio source over a decoder.
 #pragma once
 
-#include "sonora2/common/IAudioSource.h"
+#include "sonora2/media/IAudioSource.h"
 #include "support/ReadAhead.h"
 
 #include <memory>

@@ -1,8 +1,8 @@
 // The audio format over an encoder.
 #pragma once
 
-#include "sonora2/common/IAudioFormat.h"
-#include "sonora2/common/ISonoraContext.h"
+#include "sonora2/context/ISonoraContext.h"
+#include "sonora2/media/IAudioFormat.h"
 #include "support/Encoder.h"
 
 #include <chrono>

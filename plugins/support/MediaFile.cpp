@@ -1,6 +1,6 @@
 #include "support/MediaFile.h"
 
-#include "peru/IPathes.h"
+#include "peru/system/IPathes.h"
 
 #include <algorithm>
 #include <cerrno>

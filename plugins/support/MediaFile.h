@@ -1,9 +1,9 @@
 // The file that a plug-in reads or writes, and the shape of the sound in it.
 #pragma once
 
-#include "peru/IURI.h"
-#include "peru/StringFormat.h"
-#include "sonora2/common/SonoraError.h"
+#include "peru/strings/StringFormat.h"
+#include "peru/uri/IURI.h"
+#include "sonora2/context/SonoraError.h"
 
 #include <cstdint>
 #include <cstdio>

@@ -1,7 +1,7 @@
 #include "support/PluginBase.h"
 
-#include "sonora2/common/ParameterRecord.h"
-#include "sonora2/common/PluginExtensions.h"
+#include "sonora2/plugins/ParameterRecord.h"
+#include "sonora2/plugins/PluginExtensions.h"
 #include "support/DecoderSource.h"
 
 #include <utility>

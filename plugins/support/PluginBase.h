@@ -1,8 +1,8 @@
 // The plug-in object that every plug-in library delivers.
 #pragma once
 
-#include "sonora2/common/ISonoraContext.h"
-#include "sonora2/common/ISonoraPlugin.h"
+#include "sonora2/context/ISonoraContext.h"
+#include "sonora2/plugins/ISonoraPlugin.h"
 #include "support/Decoder.h"
 #include "support/EncoderFormat.h"
 

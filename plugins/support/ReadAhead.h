@@ -1,7 +1,7 @@
 // Decodes ahead of the consumer on a thread of its own.
 #pragma once
 
-#include "peru/IThreadManager.h"
+#include "peru/threads/IThreadManager.h"
 #include "support/ChunkProducer.h"
 
 #include <condition_variable>

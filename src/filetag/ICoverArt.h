@@ -3,7 +3,7 @@
 
 #include "filetag/Api.h"
 #include "peru/MemoryManager.h"
-#include "peru/String.h"
+#include "peru/strings/String.h"
 
 namespace filetag {
 

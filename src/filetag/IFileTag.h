@@ -2,7 +2,7 @@
 #pragma once
 
 #include "filetag/Api.h"
-#include "peru/IURI.h"
+#include "peru/uri/IURI.h"
 
 namespace filetag {
 

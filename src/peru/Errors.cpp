@@ -1,8 +1,8 @@
 #include "peru/Errors.h"
 
 #include "peru/ClassName.h"
-#include "peru/IStringLocalizer.h"
-#include "peru/IURI.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/uri/IURI.h"
 
 namespace peru {
 

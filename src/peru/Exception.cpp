@@ -1,6 +1,6 @@
 #include "peru/Exception.h"
 
-#include "peru/String.h"
+#include "peru/strings/String.h"
 
 #include <utility>
 

@@ -1,7 +1,7 @@
 #include "peru/GlobalObjFactory.h"
 
-#include "peru/posix/MutexFactory.h"
-#include "peru/posix/ThreadManager.h"
+#include "peru/threads/posix/MutexFactory.h"
+#include "peru/threads/posix/ThreadManager.h"
 
 #include <algorithm>
 #include <atomic>

@@ -1,8 +1,8 @@
 // The owner of the process's singletons.
 #pragma once
 
-#include "peru/IMutex.h"
 #include "peru/Object.h"
+#include "peru/threads/IMutex.h"
 
 #include <deque>
 #include <memory>

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "peru/P.h"
-#include "peru/String.h"
+#include "peru/strings/String.h"
 
 #include <string>
 

@@ -1,8 +1,8 @@
 // Typed values on streams, and objects that write and read themselves.
 #pragma once
 
-#include "peru/IStreams.h"
-#include "peru/String.h"
+#include "peru/streams/IStreams.h"
+#include "peru/strings/String.h"
 
 namespace peru {
 

@@ -1,7 +1,7 @@
 #include "peru/MemoryManager.h"
 
 #include "peru/Errors.h"
-#include "peru/IURI.h"
+#include "peru/uri/IURI.h"
 
 #include <algorithm>
 #include <bit>

@@ -1,9 +1,9 @@
 // Pooled memory blocks.
 #pragma once
 
-#include "peru/IMutex.h"
 #include "peru/ISerializable.h"
 #include "peru/Object.h"
+#include "peru/threads/IMutex.h"
 
 #include <array>
 

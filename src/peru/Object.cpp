@@ -1,7 +1,7 @@
 #include "peru/Object.h"
 
 #include "peru/ClassName.h"
-#include "peru/String.h"
+#include "peru/strings/String.h"
 
 #include <cassert>
 

@@ -2,10 +2,10 @@
 
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
-#include "peru/ILog.h"
-#include "peru/ISystem.h"
-#include "peru/URI.h"
-#include "sonora2/audio/SonoraContextAudio.h"
+#include "peru/log/ILog.h"
+#include "peru/system/ISystem.h"
+#include "peru/uri/URI.h"
+#include "sonora2/context/SonoraContextAudio.h"
 #include "tonewright/SonoraLogManagerProxy.h"
 
 namespace tonewright {

@@ -1,10 +1,10 @@
 // The application object: what stands behind the exports.
 #pragma once
 
-#include "peru/IMutex.h"
-#include "peru/IURI.h"
-#include "sonora2/common/ISonoraContext.h"
-#include "sonora2/common/PluginHandler.h"
+#include "peru/threads/IMutex.h"
+#include "peru/uri/IURI.h"
+#include "sonora2/context/ISonoraContext.h"
+#include "sonora2/plugins/PluginHandler.h"
 #include "tonewright/CancelAutoplay2.h"
 #include "tonewright/tonewright.h"
 #include "zvr_lang_manager/LanguageId.h"

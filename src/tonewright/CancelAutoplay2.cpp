@@ -1,9 +1,9 @@
 #include "tonewright/CancelAutoplay2.h"
 
 #include "peru/Errors.h"
-#include "peru/IPathes.h"
-#include "peru/ISystem.h"
-#include "peru/StringFormat.h"
+#include "peru/strings/StringFormat.h"
+#include "peru/system/IPathes.h"
+#include "peru/system/ISystem.h"
 
 #include <filesystem>
 

@@ -1,8 +1,8 @@
 // Keeps the desktop from mounting and opening discs while the program runs.
 #pragma once
 
-#include "peru/IDynamicLibrary.h"
 #include "peru/Object.h"
+#include "peru/system/IDynamicLibrary.h"
 
 namespace cap {
 

@@ -1,10 +1,10 @@
 #include "tonewright/EditorXml.h"
 
 #include "peru/Errors.h"
-#include "peru/MemoryIOStream.h"
-#include "peru/StringFormat.h"
-#include "peru/URI.h"
-#include "peru/XmlDocument.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "peru/strings/StringFormat.h"
+#include "peru/uri/URI.h"
+#include "peru/xml/XmlDocument.h"
 #include "tonewright/TrackModifierFade.h"
 
 #include <cmath>

@@ -3,8 +3,8 @@
 
 #include "peru/IInterfaceQuery.h"
 #include "peru/Object.h"
-#include "sonora2/common/AudioEncoder.h"
-#include "sonora2/common/IEncodeListener.h"
+#include "sonora2/encoding/AudioEncoder.h"
+#include "sonora2/encoding/IEncodeListener.h"
 #include "tonewright/tonewright.h"
 
 #include <atomic>

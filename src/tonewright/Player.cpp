@@ -1,9 +1,9 @@
 #include "tonewright/Player.h"
 
 #include "peru/Errors.h"
-#include "peru/IThreadManager.h"
 #include "peru/MemoryManager.h"
 #include "peru/media/ISystem.h"
+#include "peru/threads/IThreadManager.h"
 #include "tonewright/Quietly.h"
 
 #include <algorithm>

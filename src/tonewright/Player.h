@@ -1,13 +1,13 @@
 // Plays one source on the system's default output device.
 #pragma once
 
-#include "peru/IMutex.h"
-#include "peru/ISignal.h"
-#include "peru/IURI.h"
 #include "peru/Object.h"
 #include "peru/media/IAudioOutDevice.h"
-#include "sonora2/common/IAudioSource.h"
-#include "sonora2/common/IPluginHandler.h"
+#include "peru/threads/IMutex.h"
+#include "peru/threads/ISignal.h"
+#include "peru/uri/IURI.h"
+#include "sonora2/media/IAudioSource.h"
+#include "sonora2/plugins/IPluginHandler.h"
 #include "tonewright/tonewright.h"
 
 #include <atomic>

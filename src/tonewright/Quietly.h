@@ -2,8 +2,8 @@
 #pragma once
 
 #include "peru/Exception.h"
-#include "peru/ILog.h"
-#include "peru/StringFormat.h"
+#include "peru/log/ILog.h"
+#include "peru/strings/StringFormat.h"
 
 #include <exception>
 

@@ -1,12 +1,12 @@
 #include "tonewright/RecordingAudioSource.h"
 
-#include "peru/ILog.h"
-#include "peru/IThreadManager.h"
-#include "peru/ITimeManager.h"
-#include "peru/StringFormat.h"
-#include "peru/URI.h"
-#include "sonora2/audio/AudioChunk.h"
-#include "sonora2/audio/AudioStreamInfos.h"
+#include "peru/log/ILog.h"
+#include "peru/strings/StringFormat.h"
+#include "peru/system/ITimeManager.h"
+#include "peru/threads/IThreadManager.h"
+#include "peru/uri/URI.h"
+#include "sonora2/media/AudioChunk.h"
+#include "sonora2/media/AudioStreamInfos.h"
 #include "tonewright/Quietly.h"
 
 #include <limits>

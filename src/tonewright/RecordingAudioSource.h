@@ -1,9 +1,9 @@
 // Turns an input device into a source that an encoder reads.
 #pragma once
 
-#include "peru/BufferedIOStream.h"
 #include "peru/media/IAudioInDevice.h"
-#include "sonora2/common/IAudioSource.h"
+#include "peru/streams/BufferedIOStream.h"
+#include "sonora2/media/IAudioSource.h"
 #include "sonora2/samplerateconverter/SampleRateConverter.h"
 #include "tonewright/tonewright.h"
 

@@ -1,8 +1,8 @@
 #include "tonewright/SonoraLogManagerProxy.h"
 
 #include "peru/Exception.h"
-#include "peru/ILog.h"
-#include "peru/StringFormat.h"
+#include "peru/log/ILog.h"
+#include "peru/strings/StringFormat.h"
 
 namespace tonewright {
 

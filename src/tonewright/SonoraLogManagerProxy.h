@@ -2,7 +2,7 @@
 #pragma once
 
 #include "peru/Object.h"
-#include "sonora2/common/ILogManager.h"
+#include "sonora2/context/ILogManager.h"
 
 namespace tonewright {
 

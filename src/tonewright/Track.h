@@ -1,8 +1,8 @@
 // A part of a medium on an arrangement's time line.
 #pragma once
 
-#include "peru/Array.h"
-#include "peru/IURI.h"
+#include "peru/collections/Array.h"
+#include "peru/uri/IURI.h"
 #include "tonewright/ITrackModifier.h"
 
 namespace tonewright {

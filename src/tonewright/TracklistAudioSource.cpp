@@ -1,12 +1,12 @@
 #include "tonewright/TracklistAudioSource.h"
 
 #include "peru/MemoryManager.h"
-#include "peru/URI.h"
-#include "sonora2/SilentAudioSource.h"
-#include "sonora2/audio/AudioStreamInfos.h"
-#include "sonora2/audio/AudioTrack.h"
-#include "sonora2/audio/SonoraContextAudio.h"
-#include "sonora2/common/TrackCommands.h"
+#include "peru/uri/URI.h"
+#include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/media/AudioStreamInfos.h"
+#include "sonora2/media/SilentAudioSource.h"
+#include "sonora2/tracks/AudioTrack.h"
+#include "sonora2/tracks/TrackCommands.h"
 #include "tonewright/TracklistAudioTrack.h"
 
 #include <algorithm>

@@ -1,9 +1,9 @@
 // A list of tracks as one source, for players and encoders.
 #pragma once
 
-#include "sonora2/audio/AudioTracklist.h"
-#include "sonora2/common/IAudioSource.h"
-#include "sonora2/common/IPluginHandler.h"
+#include "sonora2/media/IAudioSource.h"
+#include "sonora2/plugins/IPluginHandler.h"
+#include "sonora2/tracks/AudioTracklist.h"
 #include "tonewright/Track.h"
 
 #include <atomic>

@@ -1,8 +1,8 @@
 #include "tonewright/TracklistAudioTrack.h"
 
 #include "peru/Errors.h"
-#include "peru/URI.h"
-#include "sonora2/common/TrackCommands.h"
+#include "peru/uri/URI.h"
+#include "sonora2/tracks/TrackCommands.h"
 #include "tonewright/TrackModifierFade.h"
 
 #include <algorithm>

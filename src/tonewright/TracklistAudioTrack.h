@@ -1,8 +1,8 @@
 // A track of an editor's arrangement as the mixer plays it.
 #pragma once
 
-#include "sonora2/audio/AudioChunkUnifierTrack.h"
-#include "sonora2/common/IPluginHandler.h"
+#include "sonora2/plugins/IPluginHandler.h"
+#include "sonora2/tracks/AudioChunkUnifierTrack.h"
 #include "tonewright/Track.h"
 
 namespace tonewright {

@@ -1,7 +1,7 @@
 // Which language, as spoken where.
 #pragma once
 
-#include "peru/String.h"
+#include "peru/strings/String.h"
 #include "zvr_lang_manager/Api.h"
 
 namespace zvr_lang {

@@ -1,7 +1,7 @@
 #include "peru/Errors.h"
-#include "peru/Array.h"
-#include "peru/StringLocalizer.h"
-#include "peru/URI.h"
+#include "peru/collections/Array.h"
+#include "peru/strings/StringLocalizer.h"
+#include "peru/uri/URI.h"
 #include "support/Files.h"
 
 #include <functional>

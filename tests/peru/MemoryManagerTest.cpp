@@ -1,6 +1,6 @@
 #include "peru/MemoryManager.h"
-#include "peru/BufferedIOStream.h"
 #include "peru/Errors.h"
+#include "peru/streams/BufferedIOStream.h"
 
 #include <gtest/gtest.h>
 

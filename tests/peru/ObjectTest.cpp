@@ -1,6 +1,6 @@
 #include "peru/Errors.h"
-#include "peru/FrailArray.h"
 #include "peru/IInterfaceQuery.h"
+#include "peru/collections/FrailArray.h"
 
 #include <gtest/gtest.h>
 

@@ -1,10 +1,10 @@
 // What devices promise about their states, over a sound server of the test's own.
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
-#include "peru/IURI.h"
-#include "peru/MemoryIOStream.h"
 #include "peru/media/Errors.h"
 #include "peru/media/ISystem.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "peru/uri/IURI.h"
 #include "support/SoundServer.h"
 
 #include <gtest/gtest.h>

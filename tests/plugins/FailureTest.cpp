@@ -1,7 +1,7 @@
 // Damaged files and disks without room.
 #include "plugins/PluginFixture.h"
 
-#include "sonora2/common/SonoraError.h"
+#include "sonora2/context/SonoraError.h"
 
 #include <unistd.h>
 

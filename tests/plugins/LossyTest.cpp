@@ -1,7 +1,7 @@
 // MP3 and Ogg Vorbis beside the programs that know them best.
 #include "plugins/PluginFixture.h"
 
-#include "sonora2/common/SonoraError.h"
+#include "sonora2/context/SonoraError.h"
 
 #include <functional>
 

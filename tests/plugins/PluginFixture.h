@@ -2,9 +2,9 @@
 #pragma once
 
 #include "plugins/FormatCases.h"
-#include "sonora2/audio/AudioChunk.h"
-#include "sonora2/audio/SonoraContextAudio.h"
-#include "sonora2/common/PluginHandler.h"
+#include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/media/AudioChunk.h"
+#include "sonora2/plugins/PluginHandler.h"
 #include "support/Files.h"
 #include "support/TempFolder.h"
 

@@ -1,7 +1,7 @@
 // What is written comes back, in our own eyes and in those of other programs.
 #include "plugins/PluginFixture.h"
 
-#include "sonora2/common/SonoraError.h"
+#include "sonora2/context/SonoraError.h"
 
 #include <vector>
 

@@ -1,7 +1,7 @@
 // Seeking, start times, and conversion.
 #include "plugins/PluginFixture.h"
 
-#include "sonora2/common/SonoraError.h"
+#include "sonora2/context/SonoraError.h"
 
 namespace tests {
 

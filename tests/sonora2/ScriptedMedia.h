@@ -2,7 +2,7 @@
 #pragma once
 
 #include "peru/Errors.h"
-#include "sonora2/common/IEncodeListener.h"
+#include "sonora2/encoding/IEncodeListener.h"
 #include "support/MediaBase.h"
 
 #include <cstring>

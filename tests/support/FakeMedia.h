@@ -1,9 +1,9 @@
 // Sources, formats and a plug-in whose behaviour a test writes down.
 #pragma once
 
-#include "peru/URI.h"
-#include "sonora2/common/ISonoraPlugin.h"
-#include "sonora2/common/PluginExtensions.h"
+#include "peru/uri/URI.h"
+#include "sonora2/plugins/ISonoraPlugin.h"
+#include "sonora2/plugins/PluginExtensions.h"
 #include "support/MediaBase.h"
 
 #include <algorithm>

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "peru/Errors.h"
-#include "peru/IPathes.h"
+#include "peru/system/IPathes.h"
 
 #include <gtest/gtest.h>
 

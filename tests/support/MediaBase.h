@@ -1,11 +1,11 @@
 // What the sources and formats of all tests have in common, and the bytes they work on.
 #pragma once
 
-#include "peru/DataStreams.h"
-#include "peru/MemoryIOStream.h"
-#include "sonora2/audio/AudioChunk.h"
-#include "sonora2/common/IAudioFormat.h"
-#include "sonora2/common/IAudioSource.h"
+#include "peru/streams/DataStreams.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "sonora2/media/AudioChunk.h"
+#include "sonora2/media/IAudioFormat.h"
+#include "sonora2/media/IAudioSource.h"
 
 #include <string>
 

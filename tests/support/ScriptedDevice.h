@@ -1,7 +1,7 @@
 // Sound devices that do what a test wrote down for them, and tell what was done to them.
 #pragma once
 
-#include "peru/Enums.h"
+#include "peru/collections/Enums.h"
 #include "peru/media/Errors.h"
 #include "peru/media/ISystem.h"
 

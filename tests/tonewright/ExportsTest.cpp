@@ -1,6 +1,6 @@
 #include "Library.h"
 
-#include "sonora2/common/SonoraError.h"
+#include "sonora2/context/SonoraError.h"
 
 #include <gmock/gmock.h>
 

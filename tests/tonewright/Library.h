@@ -2,7 +2,7 @@
 #pragma once
 
 #include "peru/IInstanceWrapper.h"
-#include "peru/LogManager.h"
+#include "peru/log/LogManager.h"
 #include "support/FakeMedia.h"
 #include "support/TempFolder.h"
 #include "tonewright/tonewright.h"

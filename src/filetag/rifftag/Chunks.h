@@ -1,7 +1,7 @@
 // The chunks of a WAVE file, as they stand in the file and not only as their sizes say.
 #pragma once
 
-#include "peru/IStreams.h"
+#include "peru/streams/IStreams.h"
 
 #include <array>
 

@@ -2,10 +2,10 @@
 
 #include "filetag/Text.h"
 #include "peru/Errors.h"
-#include "peru/IFileReplacement.h"
-#include "peru/IStreamManager.h"
-#include "peru/IStringLocalizer.h"
-#include "peru/ISystem.h"
+#include "peru/files/IFileReplacement.h"
+#include "peru/streams/IStreamManager.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/system/ISystem.h"
 
 #include <utility>
 

@@ -1,10 +1,10 @@
 #include "filetag/taglib/TagLibIOStream.h"
 
 #include "peru/Errors.h"
-#include "peru/IPathes.h"
-#include "peru/IStreamManager.h"
-#include "peru/IStringLocalizer.h"
-#include "peru/ISystem.h"
+#include "peru/streams/IStreamManager.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/system/IPathes.h"
+#include "peru/system/ISystem.h"
 
 #include <algorithm>
 #include <limits>

@@ -3,7 +3,7 @@
 
 #include "filetag/Api.h"
 #include "filetag/taglib/PieceTable.h"
-#include "peru/IURI.h"
+#include "peru/uri/IURI.h"
 
 #include <tfilestream.h>
 

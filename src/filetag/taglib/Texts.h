@@ -2,7 +2,7 @@
 #pragma once
 
 #include "peru/MemoryManager.h"
-#include "peru/String.h"
+#include "peru/strings/String.h"
 
 #include <tbytevector.h>
 #include <tstring.h>

@@ -2,8 +2,8 @@
 
 #include "filetag/wmatag/CoverArt.h"
 #include "peru/Errors.h"
-#include "peru/IPathes.h"
-#include "peru/IStringLocalizer.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/system/IPathes.h"
 
 #include <array>
 

@@ -1,6 +1,6 @@
 #include "peru/media/AudioFormat.h"
 
-#include "peru/StringFormat.h"
+#include "peru/strings/StringFormat.h"
 
 namespace peru::media {
 

@@ -1,6 +1,6 @@
 #include "peru/media/DeviceNames.h"
 
-#include "peru/StringFormat.h"
+#include "peru/strings/StringFormat.h"
 
 #include <portaudio.h>
 

@@ -1,8 +1,8 @@
 // How devices are listed.
 #pragma once
 
-#include "peru/String.h"
 #include "peru/media/Api.h"
+#include "peru/strings/String.h"
 
 namespace peru::media {
 

@@ -2,8 +2,8 @@
 #pragma once
 
 #include "peru/Exception.h"
-#include "peru/String.h"
 #include "peru/media/Api.h"
+#include "peru/strings/String.h"
 
 namespace peru::media {
 

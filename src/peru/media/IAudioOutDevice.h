@@ -1,8 +1,8 @@
 // Playback.
 #pragma once
 
-#include "peru/IStreams.h"
 #include "peru/media/IAudioDevice.h"
+#include "peru/streams/IStreams.h"
 
 namespace peru::media {
 

@@ -1,7 +1,7 @@
 // The sound devices of the machine.
 #pragma once
 
-#include "peru/IEnum.h"
+#include "peru/collections/IEnum.h"
 #include "peru/media/IAudioInDevice.h"
 #include "peru/media/IAudioOutDevice.h"
 

@@ -1,7 +1,7 @@
 #include "peru/posix/PlatformFile.h"
 
 #include "peru/Errors.h"
-#include "peru/IPathes.h"
+#include "peru/system/IPathes.h"
 
 #include <system_error>
 #include <unistd.h>

@@ -1,7 +1,7 @@
 // What the file classes of this platform share: descriptors, paths of URIs, texts of errors.
 #pragma once
 
-#include "peru/IURI.h"
+#include "peru/uri/IURI.h"
 
 #include <string>
 #include <utility>

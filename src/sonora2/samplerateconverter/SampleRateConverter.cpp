@@ -1,8 +1,8 @@
 #include "sonora2/samplerateconverter/SampleRateConverter.h"
 
 #include "peru/Errors.h"
-#include "peru/StringFormat.h"
-#include "sonora2/audio/AudioChunk.h"
+#include "peru/strings/StringFormat.h"
+#include "sonora2/media/AudioChunk.h"
 #include "sonora2/samplerateconverter/ChannelConverters.h"
 #include "sonora2/samplerateconverter/Resampler.h"
 #include "sonora2/samplerateconverter/SampleWidths.h"

@@ -1,7 +1,7 @@
 // Changes rate, channel layout and sample width of a stream of PCM.
 #pragma once
 
-#include "sonora2/audio/IAudioChunk.h"
+#include "sonora2/media/IAudioChunk.h"
 
 #include <memory>
 

@@ -1,8 +1,8 @@
 #include "tonewright/exports/AppReference.h"
 
 #include "peru/Errors.h"
-#include "peru/ILog.h"
-#include "peru/StringFormat.h"
+#include "peru/log/ILog.h"
+#include "peru/strings/StringFormat.h"
 #include "tonewright/exports/Barrier.h"
 
 #include <mutex>

@@ -1,4 +1,4 @@
-#include "sonora2/common/IAudioFormat.h"
+#include "sonora2/media/IAudioFormat.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"

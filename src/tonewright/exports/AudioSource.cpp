@@ -1,6 +1,6 @@
 #include "peru/Errors.h"
-#include "peru/StringFormat.h"
-#include "sonora2/common/SampleReader.h"
+#include "peru/strings/StringFormat.h"
+#include "sonora2/encoding/SampleReader.h"
 #include "tonewright/EditorXml.h"
 #include "tonewright/RecordingAudioSource.h"
 #include "tonewright/TracklistAudioSource.h"

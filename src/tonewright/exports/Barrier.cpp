@@ -1,6 +1,6 @@
 #include "tonewright/exports/Barrier.h"
 
-#include "peru/ILog.h"
+#include "peru/log/ILog.h"
 
 namespace tonewright::exports {
 

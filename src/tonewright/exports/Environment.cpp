@@ -1,5 +1,5 @@
 #include "filetag/FileTagFactory.h"
-#include "peru/ILog.h"
+#include "peru/log/ILog.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"

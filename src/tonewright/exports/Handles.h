@@ -3,7 +3,7 @@
 
 #include "peru/IInstanceWrapper.h"
 #include "peru/IInterfaceQuery.h"
-#include "peru/URI.h"
+#include "peru/uri/URI.h"
 #include "tonewright/tonewright.h"
 
 #include <new>

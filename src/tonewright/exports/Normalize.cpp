@@ -1,4 +1,4 @@
-#include "sonora2/common/IAudioSource.h"
+#include "sonora2/media/IAudioSource.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"

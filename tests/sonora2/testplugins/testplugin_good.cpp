@@ -1,6 +1,6 @@
 // Reads and writes the extension "tst" from and to nowhere: every source has 1 second of the wanted format. A
 // file name that begins with "refuse" throws from open.
-#include "sonora2/common/SonoraError.h"
+#include "sonora2/context/SonoraError.h"
 #include "support/FakeMedia.h"
 
 using namespace tests;

@@ -1,7 +1,7 @@
 // Its entry point throws an exception whose code and text lie in the library, which is unloaded at once.
 #include "peru/Errors.h"
-#include "sonora2/common/ISonoraContext.h"
-#include "sonora2/common/ISonoraPlugin.h"
+#include "sonora2/context/ISonoraContext.h"
+#include "sonora2/plugins/ISonoraPlugin.h"
 
 namespace {
 

@@ -1,10 +1,10 @@
 #include "peru/media/posix/AudioDevice.h"
 
-#include "peru/IStringLocalizer.h"
-#include "peru/StringFormat.h"
 #include "peru/media/DeviceNames.h"
 #include "peru/media/Errors.h"
 #include "peru/media/FormatSearch.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/strings/StringFormat.h"
 
 #include <algorithm>
 #include <cmath>

@@ -1,9 +1,9 @@
 // What input and output devices of the engine have in common.
 #pragma once
 
-#include "peru/IString.h"
 #include "peru/media/posix/IPosixAudioDevice.h"
 #include "peru/media/posix/IPosixSystem.h"
+#include "peru/strings/IString.h"
 
 #include <portaudio.h>
 

@@ -1,7 +1,7 @@
 // Recording through the engine.
 #pragma once
 
-#include "peru/FrailArray.h"
+#include "peru/collections/FrailArray.h"
 #include "peru/media/IAudioInDevice.h"
 #include "peru/media/posix/AudioDevice.h"
 

@@ -1,9 +1,9 @@
 #include "peru/media/posix/AudioOutDevice.h"
 
-#include "peru/IStringLocalizer.h"
-#include "peru/IThreadManager.h"
 #include "peru/media/Errors.h"
 #include "peru/media/Samples.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/threads/IThreadManager.h"
 
 #include <algorithm>
 #include <cstring>

@@ -1,11 +1,11 @@
 // Playback through the engine.
 #pragma once
 
-#include "peru/BufferedIOStream.h"
-#include "peru/ISignal.h"
 #include "peru/media/IAudioOutDevice.h"
 #include "peru/media/PlayClock.h"
 #include "peru/media/posix/AudioDevice.h"
+#include "peru/streams/BufferedIOStream.h"
+#include "peru/threads/ISignal.h"
 
 namespace peru::media::posix {
 

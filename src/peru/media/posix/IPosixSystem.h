@@ -1,8 +1,8 @@
 // What devices need from the system that made them.
 #pragma once
 
-#include "peru/IMutex.h"
 #include "peru/media/ISystem.h"
+#include "peru/threads/IMutex.h"
 
 namespace peru::media::posix {
 

@@ -1,7 +1,7 @@
 #include "peru/media/posix/SoundLibraries.h"
 
-#include "peru/IStringLocalizer.h"
 #include "peru/media/Errors.h"
+#include "peru/strings/IStringLocalizer.h"
 
 #include <dlfcn.h>
 #include <memory>

@@ -1,6 +1,6 @@
 #include "peru/media/posix/System.h"
 
-#include "peru/Array.h"
+#include "peru/collections/Array.h"
 #include "peru/media/Errors.h"
 #include "peru/media/posix/AudioInDevice.h"
 #include "peru/media/posix/AudioOutDevice.h"

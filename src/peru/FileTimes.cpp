@@ -1,7 +1,0 @@
-#include "peru/FileTimes.h"
-
-namespace peru {
-
-CFileTimes::~CFileTimes() = default;
-
-} // namespace peru

@@ -1,0 +1,41 @@
+// Listener lists.
+#pragma once
+
+#include "peru/Object.h"
+#include "peru/collections/SimpleArray.h"
+
+namespace peru {
+
+// A counted listener list. Ordinary listeners are entered without a reference and must leave before they
+// die. Not locked: the owner says which thread or lock guards it.
+template <class T> class TFrailArray : public CObject {
+public:
+    // Without a reference: for classes that must not keep their listeners alive.
+    void add(T* listener) { m_elements.add(PFrail<T>(listener, false)); }
+    // With a reference, held until the listener is removed.
+    void addCounted(const P<T>& listener) { m_elements.add(PFrail<T>(listener.get(), true)); }
+
+    // Removes the first match and tells whether there was one; the rest keeps its order.
+    bool remove(const T* listener) {
+        for (size_t i = 0; i < m_elements.getCount(); ++i) {
+            if (!(m_elements[i] == listener)) continue;
+            m_elements.removeAt(i);
+            return true;
+        }
+        return false;
+    }
+    bool contains(const T* listener) const {
+        for (const PFrail<T>& element : m_elements)
+            if (element == listener) return true;
+        return false;
+    }
+
+    size_t getCount() const { return m_elements.getCount(); }
+    // Empty past the end, so that a walk by index survives a listener that leaves meanwhile.
+    T* at(size_t index) const { return index < m_elements.getCount() ? m_elements[index].get() : nullptr; }
+
+private:
+    TCleaningSimpleArray<PFrail<T>> m_elements{0, 4};
+};
+
+} // namespace peru

@@ -1,0 +1,7 @@
+#include "peru/files/FileTimes.h"
+
+namespace peru {
+
+CFileTimes::~CFileTimes() = default;
+
+} // namespace peru

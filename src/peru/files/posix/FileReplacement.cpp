@@ -1,0 +1,212 @@
+#include "peru/files/posix/FileReplacement.h"
+
+#include "peru/Errors.h"
+#include "peru/files/posix/FileAttributes.h"
+#include "peru/files/posix/FileOperations.h"
+#include "peru/streams/posix/DiskStreams.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/system/IPathes.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace peru::posix {
+namespace {
+
+[[noreturn]] void raise(int error, const P<IURI>& file) {
+    if (error == EACCES || error == EPERM || error == EROFS) throw CFileAccessDeniedError(file);
+    if (error == ENOENT) throw CFileNotFoundError(file);
+    throw CFileError(localize("peru.CSystem.ReplaceFileFailed", "Error writing file '%FILE%' (%MSG%).",
+                              {{"%FILE%", getShownName(file)}, {"%MSG%", getSystemText(error)}}),
+                     file);
+}
+
+// Links are followed also when nothing stands at their end yet. Empty where they lead nowhere.
+std::string followLinks(const std::string& path) {
+    std::unique_ptr<char, decltype(&std::free)> real(::realpath(path.c_str(), nullptr), &std::free);
+    if (real) return real.get();
+    struct stat status;
+    return errno == ENOENT && ::lstat(path.c_str(), &status) != 0 ? path : "";
+}
+
+// The way to name a file that has none. Without /proc there is no other for an ordinary user.
+std::string getDescriptorPath(int file) {
+    return "/proc/self/fd/" + std::to_string(file);
+}
+
+// After a power failure the folder may else still tell the old name. No more can be done where it refuses.
+void syncFolder(const std::string& path) {
+    const CFileHandle folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (folder.isOpen()) ::fsync(folder.get());
+}
+
+// Of the bytes from `start` to `end` the first stretch that is on the disk; the whole where the file system
+// does not tell.
+struct SStretch {
+    int64_t start;
+    int64_t end;
+};
+SStretch findData(int file, int64_t start, int64_t end) {
+    const off_t data = ::lseek(file, start, SEEK_DATA);
+    if (data < 0 && errno != ENXIO) return {start, end};
+    if (data < 0 || data >= end) return {end, end};
+    const off_t hole = ::lseek(file, data, SEEK_HOLE);
+    return {data, hole < 0 ? end : std::min<int64_t>(hole, end)};
+}
+
+} // namespace
+
+// The errors of streams become those of files: who replaces a file needs to catch one kind only.
+class CReplacementStream : public CDiskIOStream {
+public:
+    CReplacementStream(const P<IURI>& file, CFileHandle handle)
+        : CDiskIOStream(CDiskFile::adopt(file, std::move(handle))) {}
+
+    void read(void* buffer, int64_t size) override {
+        call([&] { CDiskIOStream::read(buffer, size); });
+    }
+    int64_t readSome(void* buffer, int64_t size) override {
+        return call([&] { return CDiskIOStream::readSome(buffer, size); });
+    }
+    void write(const void* buffer, int64_t size) override {
+        call([&] { CDiskIOStream::write(buffer, size); });
+    }
+    void skip(int64_t size) override {
+        call([&] { CDiskIOStream::skip(size); });
+    }
+    void seek(int64_t position) override {
+        call([&] { CDiskIOStream::seek(position); });
+    }
+    void flush() override {
+        call([&] { CDiskIOStream::flush(); });
+    }
+    void setSize(int64_t size) override {
+        call([&] { CDiskIOStream::setSize(size); });
+    }
+    void close() override {
+        call([&] { CDiskIOStream::close(); });
+    }
+
+private:
+    template <class Operation> auto call(Operation operation) -> decltype(operation()) {
+        try {
+            return operation();
+        } catch (const CEndOfStreamError&) {
+            throw;
+        } catch (const CStreamError& error) {
+            throw CFileError(error.getDescription(), getURI());
+        }
+    }
+};
+
+STemporaryName::~STemporaryName() {
+    if (!path.empty()) ::unlink(path.c_str());
+}
+
+CFileReplacement::CFileReplacement(const P<IURI>& file) : m_uri(file) {
+    m_target = followLinks(toPath(file));
+    if (m_target.empty()) raise(errno ? errno : ENOENT, file);
+    m_folder = m_target.substr(0, m_target.rfind('/') + 1);
+    openOld();
+    openNew();
+    CFileHandle own(::fcntl(m_new.get(), F_DUPFD_CLOEXEC, 0));
+    if (!own.isOpen()) raise(errno, file);
+    m_stream = make<CReplacementStream>(file, std::move(own));
+}
+
+CFileReplacement::~CFileReplacement() = default;
+
+void CFileReplacement::openOld() {
+    struct stat status;
+    // Asked first: a pipe would hold the caller, and some devices act when they are opened.
+    if (::stat(m_target.c_str(), &status) != 0) {
+        if (errno == ENOENT) return;
+        raise(errno, m_uri);
+    }
+    if (S_ISDIR(status.st_mode)) raise(EISDIR, m_uri);
+    if (!S_ISREG(status.st_mode)) raise(EINVAL, m_uri);
+    // Taking the name needs no right to the file, so the right is asked for here.
+    if (::faccessat(AT_FDCWD, m_target.c_str(), W_OK, AT_EACCESS) != 0) raise(errno, m_uri);
+    m_old = CFileHandle(::open(m_target.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
+    if (!m_old.isOpen()) raise(errno, m_uri);
+}
+
+void CFileReplacement::openNew() {
+    // Nobody else may look into it before it has the old file's rights.
+    const mode_t mode = m_old.isOpen() ? 0600 : 0666;
+    m_new = CFileHandle(::open(m_folder.c_str(), O_TMPFILE | O_RDWR | O_CLOEXEC, mode));
+    if (m_new.isOpen() && ::access(getDescriptorPath(m_new.get()).c_str(), F_OK) == 0) return;
+    if (!m_new.isOpen() && errno != EOPNOTSUPP && errno != EISDIR && errno != EINVAL && errno != ENOENT)
+        raise(errno, m_uri);
+    int error = 0;
+    m_name.path = createUnique(m_folder, ".new-", "", error, [&](const std::string& name) {
+        m_new = CFileHandle(::open(name.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, mode));
+        return m_new.isOpen() ? 0 : errno;
+    });
+    if (error != 0) raise(error, m_uri);
+}
+
+P<ISeekableIOStream> CFileReplacement::getStream() {
+    return m_stream;
+}
+
+void CFileReplacement::copyFromOld(int64_t offset, int64_t size) {
+    const int64_t position = m_stream->getPosition();
+    const int64_t end = offset + size;
+    // Behind its end the new file reads as zeros, and holes of the old one may stay holes.
+    const bool mayHaveHoles = position >= m_stream->getSize();
+    // Also takes what the stream holds back to the file, and lets it forget what it has read ahead.
+    m_stream->setSize(std::max(m_stream->getSize(), position + size));
+    struct stat status;
+    if (::fstat(m_old.get(), &status) != 0) raise(errno, m_uri);
+    bool isLongEnough = status.st_size >= end;
+    for (int64_t at = offset; isLongEnough && at < end;) {
+        const SStretch data = mayHaveHoles ? findData(m_old.get(), at, end) : SStretch{at, end};
+        int64_t copied = 0;
+        if (const int error = copyRange(m_old.get(), data.start, m_new.get(), position + data.start - offset,
+                                        data.end - data.start, copied))
+            raise(error, m_uri);
+        isLongEnough = copied == data.end - data.start;
+        at = data.end;
+    }
+    if (!isLongEnough)
+        throw CFileError(localize("peru.CFileReplacement.FileTooShort",
+                                  "The file '%FILE%' has become shorter.", {{"%FILE%", getShownName(m_uri)}}),
+                         m_uri);
+    m_stream->seek(position + size);
+}
+
+int CFileReplacement::giveName(std::string& name) {
+    int error = 0;
+    const std::string descriptor = getDescriptorPath(m_new.get());
+    name = createUnique(m_folder, ".new-", "", error, [&](const std::string& beside) {
+        return ::linkat(AT_FDCWD, descriptor.c_str(), AT_FDCWD, beside.c_str(), AT_SYMLINK_FOLLOW) == 0
+                   ? 0
+                   : errno;
+    });
+    return error;
+}
+
+int CFileReplacement::finish() {
+    if (m_old.isOpen())
+        if (int error = takeOverAttributes(m_old.get(), m_new.get())) return error;
+    if (::fsync(m_new.get()) != 0) return errno;
+    if (m_name.path.empty())
+        if (int error = giveName(m_name.path)) return error;
+    if (::rename(m_name.path.c_str(), m_target.c_str()) != 0) return errno;
+    m_name.path.clear();
+    return 0;
+}
+
+void CFileReplacement::commit() {
+    m_stream->close();
+    if (int error = finish()) raise(error, m_uri);
+    syncFolder(m_folder);
+}
+
+} // namespace peru::posix

@@ -1,0 +1,21 @@
+// File times in the platform's form.
+#pragma once
+
+#include "peru/files/FileTimes.h"
+
+#include <ctime>
+
+namespace peru::posix {
+
+class CFileTimes : public peru::CFileTimes {
+public:
+    // Null where the file system does not keep the time. What lies beyond the range of peru::CFileTimes
+    // (the years 1678 to 2261) becomes its nearest end.
+    CFileTimes(const timespec* creation, const timespec& lastAccess, const timespec& lastWrite);
+    explicit CFileTimes(const P<peru::CFileTimes>& times);
+
+    // For utimensat: last access and last write, UTIME_OMIT for what is unknown.
+    void toTimespec(timespec (&times)[2]) const;
+};
+
+} // namespace peru::posix

@@ -1,0 +1,52 @@
+// The volumes of this machine, and their coming and going.
+#pragma once
+
+#include "peru/collections/FrailArray.h"
+#include "peru/files/posix/FileSystemVolume.h"
+#include "peru/threads/IMutex.h"
+#include "peru/threads/IThreadManager.h"
+
+namespace peru::posix {
+
+class CMountWatcher;
+
+// A thread waits for the kernel's word as long as there are listeners, and only then. The re-entrant mutex is
+// held while listeners are called, so that removing one waits for a call that is under way.
+class PERU_API CVolumeManager : public CObject, public IVolumeManager {
+public:
+    explicit CVolumeManager(std::string mountTable = "/proc/self/mountinfo");
+    ~CVolumeManager() override;
+
+    std::vector<P<IFileSystemVolume>> getVolumes() override;
+    P<IFileSystemVolume> getVolumeOf(const P<IURI>& uri) override;
+    void addListener(IFileSystemVolumeListener* listener) override;
+    void removeListener(IFileSystemVolumeListener* listener) override;
+
+    // Compares the mount table with what listeners know and tells them the difference, those that left first.
+    void update();
+
+private:
+    friend class CMountWatcher;
+    using CVolumes = std::vector<P<CFileSystemVolume>>;
+    struct SWatch {
+        P<CMountWatcher> watcher;
+        P<IThread> thread;
+    };
+
+    CVolumes readVolumes() const;
+    void updateFrom(const CMountWatcher* watcher);
+    void notify(const P<CFileSystemVolume>& volume,
+                void (IFileSystemVolumeListener::*tell)(const P<IFileSystemVolume>&));
+    void waitForRetired();
+
+    const std::string m_mountTable;
+    P<IMutex> m_mutex; // guards everything below
+    P<TFrailArray<IFileSystemVolumeListener>> m_listeners;
+    CVolumes m_known; // what listeners have been told
+    SWatch m_watch;   // empty without listeners
+    // Watches that were told to end out of their own thread, which cannot wait for itself.
+    std::vector<SWatch> m_retired;
+    bool m_notifying = false;
+};
+
+} // namespace peru::posix

@@ -1,0 +1,59 @@
+#include "peru/log/ILog.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+#include <string_view>
+
+namespace peru {
+
+namespace {
+
+// The room of the trace's line in characters, its terminator included.
+constexpr size_t kTraceSize = 1024;
+
+// Cuts between characters; bytes that are no UTF-8 count one each at most.
+size_t cut(const char* utf8, size_t size, size_t characters) {
+    size_t count = 0;
+    for (size_t i = 0; i < size; ++i)
+        if ((utf8[i] & 0xc0) != 0x80 && count++ == characters) return i;
+    return size;
+}
+
+// Standard error is there for everybody to see, other than a debugger's window: a program with an output of
+// its own switches this off.
+bool isEnabled() {
+    static const bool enabled = [] {
+        const char* setting = std::getenv("TONEWRIGHT_DEBUG_OUTPUT");
+        return !setting || std::string_view(setting) != "0";
+    }();
+    return enabled;
+}
+
+void writeDebugOutput(const char* utf8, size_t size) {
+    if (!isEnabled()) return;
+    // One call, so that lines of several threads do not mix.
+    std::fwrite(utf8, 1, size, stderr);
+}
+
+} // namespace
+
+void zvrTrace(const char* file, int line, const char* comment) {
+    char text[kTraceSize * 4]; // no allocation: assertions call this when memory is out, too
+    const char* name = file ? file : "";
+    int length = comment && *comment
+                     ? std::snprintf(text, sizeof text, "zvr_trace: %s (%d) c=%s\n", name, line, comment)
+                     : std::snprintf(text, sizeof text, "zvr_trace: %s (%d)\n", name, line);
+    if (length < 0) return;
+    size_t size = std::min(static_cast<size_t>(length), sizeof text - 1);
+    writeDebugOutput(text, cut(text, size, kTraceSize - 1));
+}
+
+void outputDebugString(const CStringArg& text) {
+    std::string utf8 = CString::toStdString(text);
+    if (!utf8.ends_with('\n')) utf8 += '\n';
+    writeDebugOutput(utf8.data(), utf8.size());
+}
+
+} // namespace peru

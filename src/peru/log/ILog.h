@@ -1,0 +1,68 @@
+// The program's log.
+#pragma once
+
+#include "peru/strings/String.h"
+
+#include <vector>
+
+namespace peru {
+
+class CException;
+
+// Severity in ascending order. EXCEPTION ranks below ERROR on purpose.
+enum ELogLevel : int32_t {
+    kLogTrace = 0,
+    kLogDebug = 1,
+    kLogInfo = 2,
+    kLogWarning = 3,
+    kLogException = 4,
+    kLogError = 5,
+};
+
+// One message on its way to the sinks.
+struct SLogMessage {
+    int32_t level = kLogInfo;
+    P<IString> source; // the component; may be empty
+    P<IString> text;
+    std::vector<P<IString>> extraLines;
+    int64_t time = -1; // milliseconds since 1970 UTC; -1 means now
+};
+
+// A sink, or the manager that fans out to sinks. Any thread may log.
+class PERU_API ILog : public virtual IBase {
+public:
+    using Lines = std::vector<P<IString>>;
+
+    virtual void setMinimumLevel(int32_t level) = 0;
+    virtual int32_t getMinimumLevel() const = 0;
+    virtual void enterArea(const P<IString>& name) = 0;
+    virtual void leaveArea(const P<IString>& name) = 0;
+    virtual void setEnabled(bool enabled) = 0;
+    virtual void trace(const P<IString>& source, const CStringArg& text, const Lines& extra = {}) = 0;
+    virtual void debug(const P<IString>& source, const CStringArg& text, const Lines& extra = {}) = 0;
+    virtual void info(const P<IString>& source, const CStringArg& text, const Lines& extra = {}) = 0;
+    virtual void warning(const P<IString>& source, const CStringArg& text, const Lines& extra = {}) = 0;
+    virtual void error(const P<IString>& source, const CStringArg& text, const Lines& extra = {}) = 0;
+    virtual void logException(const P<IString>& source, const CException& exception) = 0;
+    virtual void startFeature(const P<IString>& name) = 0;
+    virtual void endFeature(const P<IString>& name) = 0;
+    virtual void addInfo(const P<IString>& name, const P<IString>& value) = 0;
+    // What all of the above come down to. Levels outside the enumeration are allowed.
+    virtual void write(const SLogMessage& message) = 0;
+};
+
+class PERU_API ILogManager : public virtual ILog {
+public:
+    // An empty source takes every message.
+    virtual void addLog(const P<ILog>& log, const P<IString>& source) = 0;
+    virtual bool removeLog(const P<ILog>& log, const P<IString>& source) = 0;
+};
+
+PERU_API P<ILogManager> getLogManager();
+
+// The debugger trace: one line on the platform's debug output, in release builds too. That output is standard
+// error, unless the environment has TONEWRIGHT_DEBUG_OUTPUT=0.
+PERU_API void zvrTrace(const char* file, int line, const char* comment = nullptr);
+PERU_API void outputDebugString(const CStringArg& text);
+
+} // namespace peru

@@ -1,0 +1,32 @@
+// The ordinary log.
+#pragma once
+
+#include "peru/log/LogBase.h"
+#include "peru/streams/IStreams.h"
+#include "peru/threads/IMutex.h"
+
+namespace peru {
+
+// Appends lines such as
+//   14:03:59 [source] info - text
+// in UTF-8. Further lines of a message stand below its text. The depth of areas belongs to the log and not
+// to a thread, so that the indentation of threads mixes. An error of the stream ends the call.
+class PERU_API CTextFileLog : public CLogBase {
+public:
+    // Opens the file, or makes it. Throws CFileError.
+    CTextFileLog(const P<IURI>& file, bool flushEachLine);
+    CTextFileLog(const P<IOutStream>& stream, bool flushEachLine);
+    ~CTextFileLog() override;
+
+    void enterArea(const P<IString>& name) override;
+    void leaveArea(const P<IString>& name) override;
+    void write(const SLogMessage& message) override;
+
+private:
+    P<IMutex> m_mutex; // guards all below
+    P<IOutStream> m_stream;
+    bool m_flush;
+    int32_t m_depth = 0;
+};
+
+} // namespace peru

@@ -1,0 +1,18 @@
+// The platform layer's package.
+#pragma once
+
+#include "peru/packages/Package.h"
+
+namespace peru::posix {
+
+// "peru::posix": makes the singletons that stand on the system, so that a machine on which one of them
+// cannot be made says so at start-up.
+class CPackage : public CPackageBase {
+public:
+    CPackage();
+
+protected:
+    void load(IPackageManager& manager) override;
+};
+
+} // namespace peru::posix

@@ -1,0 +1,14 @@
+// Bytes as hexadecimal text.
+#pragma once
+
+#include "peru/strings/String.h"
+
+#include <vector>
+
+namespace peru {
+
+// Two digits a byte in either case, nothing between them. Throws CParseError with "Error parsing hex data.".
+PERU_API std::vector<uint8_t> parseHexData(const CStringArg& text);
+PERU_API P<IString> formatHexData(const void* data, int64_t size); // upper case
+
+} // namespace peru

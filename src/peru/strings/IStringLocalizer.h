@@ -1,0 +1,33 @@
+// Localised texts by key.
+#pragma once
+
+#include "peru/strings/String.h"
+
+#include <initializer_list>
+
+namespace peru {
+
+// Keys are flat dotted names; the first part is the namespace, the second the class. Safe from any thread.
+class PERU_API IStringLocalizer : public virtual IBase {
+public:
+    virtual void clear() = 0;
+    virtual void setParent(const P<IStringLocalizer>& parent) = 0;
+    virtual void setText(const CStringArg& key, const P<IString>& text) = 0;
+    // An own non-empty entry, else the parent's answer, else the default text.
+    virtual P<IString> getText(const CStringArg& key, const P<IString>& defaultText) = 0;
+};
+
+PERU_API P<IStringLocalizer> getStringLocalizer();
+
+// A placeholder such as "%FILE%" and what stands in its place.
+struct SPlaceholder {
+    const char* name;
+    CStringArg value;
+};
+
+// The localised text of a key, or its default, with the placeholders filled in after localising, so that a
+// translation may move them.
+PERU_API P<IString> localize(const char* key, const char* defaultText,
+                             std::initializer_list<SPlaceholder> placeholders = {});
+
+} // namespace peru

@@ -1,0 +1,27 @@
+// The table of localised texts.
+#pragma once
+
+#include "peru/collections/SimpleHashTable.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/threads/IMutex.h"
+
+namespace peru {
+
+class PERU_API CStringLocalizer : public CObject, public IStringLocalizer {
+public:
+    CStringLocalizer();
+    ~CStringLocalizer() override;
+
+    void clear() override;
+    // Parents must not form a ring; a localizer as its own parent is refused with CInvalidArgError.
+    void setParent(const P<IStringLocalizer>& parent) override;
+    void setText(const CStringArg& key, const P<IString>& text) override;
+    P<IString> getText(const CStringArg& key, const P<IString>& defaultText) override;
+
+private:
+    P<IMutex> m_mutex; // guards the members below
+    TSimpleHashTable<P<IString>, P<IString>> m_texts;
+    P<IStringLocalizer> m_parent;
+};
+
+} // namespace peru

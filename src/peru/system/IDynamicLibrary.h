@@ -1,0 +1,40 @@
+// Shared libraries and processes, loaded and started at run time.
+#pragma once
+
+#include "peru/uri/IURI.h"
+
+#include <vector>
+
+namespace peru {
+
+// Unloads with its last release.
+class PERU_API IDynamicLibrary : public virtual IBase {
+public:
+    virtual void* findSymbol(const char* name) = 0; // null when there is none
+};
+
+class PERU_API IDynamicLibraryLoader : public virtual IBase {
+public:
+    // Throws CError with the loader's reason.
+    virtual P<IDynamicLibrary> load(const P<IURI>& file) = 0;
+    virtual P<IDynamicLibrary> loadByName(const CStringArg& name) = 0; // by the platform's search
+};
+
+class PERU_API IProcess : public virtual IBase {
+public:
+    virtual int64_t getId() const = 0;
+    virtual bool wait(uint32_t milliseconds, int& exitCode) = 0; // false when it still runs
+    virtual void terminate() = 0;
+};
+
+class PERU_API IProcessManager : public virtual IBase {
+public:
+    // Normal priority, no inherited files beyond the standard three. Throws CError when it cannot be started.
+    virtual P<IProcess> start(const P<IURI>& executable, const std::vector<P<IString>>& arguments) = 0;
+    virtual int64_t getCurrentProcessId() const = 0;
+};
+
+PERU_API P<IDynamicLibraryLoader> getDynamicLibraryLoader();
+PERU_API P<IProcessManager> getProcessManager();
+
+} // namespace peru

@@ -1,0 +1,28 @@
+// Between URIs and platform paths.
+#pragma once
+
+#include "peru/uri/IURI.h"
+
+namespace peru {
+
+class PERU_API IPathes : public virtual IBase {
+public:
+    // The bytes of the path as a UTF-8 string, terminated; they need not be valid UTF-8. Only "file" and
+    // relative URIs have one: others, and a file on another host, give an empty string.
+    virtual P<IString> toPlatformPath(const P<IURI>& uri, bool forDisplay = false) = 0;
+    // A relative path gives a relative URI.
+    virtual P<IURI> fromPlatformPath(const CStringArg& path) = 0;
+    virtual P<IString> join(const CStringArg& folder, const CStringArg& fileName) = 0;
+    // Folder (with its trailing separator) and file name.
+    virtual void split(const CStringArg& path, P<IString>& folder, P<IString>& fileName) = 0;
+    // $NAME and ${NAME}; throws CError with "error expanding environmental string".
+    virtual P<IString> expandEnvironment(const CStringArg& text) = 0;
+    virtual P<IString> unexpandEnvironment(const CStringArg& text) = 0;
+};
+
+PERU_API P<IPathes> getPathes();
+
+// What a message shows for a URI: its path for display, or its text where it has none.
+PERU_API P<IString> getShownName(const P<IURI>& uri);
+
+} // namespace peru

@@ -1,0 +1,50 @@
+#include "peru/system/posix/ProcessImpl.h"
+
+#include "peru/threads/IThreadManager.h"
+
+#include <cerrno>
+#include <csignal>
+#include <sys/wait.h>
+
+namespace peru::posix {
+
+CProcessImpl::CProcessImpl(pid_t id)
+    : m_id(id), m_ended(getSignalFactory()->createSignal()), m_mutex(getMutexFactory()->createMutex()) {}
+
+void CProcessImpl::watch() {
+    SThreadBody body;
+    body.owner = PFrail<IBase>(this, true);
+    body.argument = this;
+    body.function = [](IBase*, void* argument) { static_cast<CProcessImpl*>(argument)->collect(); };
+    getThreadManager()->createThread(body);
+}
+
+void CProcessImpl::collect() {
+    siginfo_t info;
+    int result;
+    // Leaves the child's id taken, so that terminate() cannot meet a stranger's.
+    do result = waitid(P_PID, static_cast<id_t>(m_id), &info, WEXITED | WNOWAIT);
+    while (result != 0 && errno == EINTR);
+    {
+        CMutexLock lock(m_mutex);
+        int status = 0;
+        if (waitpid(m_id, &status, WNOHANG) == m_id)
+            m_exitCode = WIFSIGNALED(status) ? 128 + WTERMSIG(status) : WEXITSTATUS(status);
+        m_collected = true;
+    }
+    m_ended->set();
+}
+
+bool CProcessImpl::wait(uint32_t milliseconds, int& exitCode) {
+    if (!m_ended->wait(milliseconds)) return false;
+    CMutexLock lock(m_mutex);
+    exitCode = m_exitCode;
+    return true;
+}
+
+void CProcessImpl::terminate() {
+    CMutexLock lock(m_mutex);
+    if (!m_collected) kill(m_id, SIGTERM);
+}
+
+} // namespace peru::posix

@@ -1,0 +1,50 @@
+#include "peru/threads/posix/GlobalMutexImpl.h"
+
+#include "peru/Exception.h"
+#include "peru/threads/posix/MutexSegment.h"
+
+#include <cerrno>
+#include <pthread.h>
+
+namespace peru::posix {
+
+namespace {
+
+// Takes over what a dead owner left; who dies before this call leaves the mutex abandoned as it was.
+int recover(pthread_mutex_t* mutex, int result) {
+    return result == EOWNERDEAD ? pthread_mutex_consistent(mutex) : result;
+}
+
+} // namespace
+
+CGlobalMutexImpl::CGlobalMutexImpl(const P<IString>& name)
+    : m_name(name), m_segment(CMutexSegment::open(CString::toStdString(name))) {
+    if (!m_segment) throw CException("Error createing global mutex " + name, newString("Error"));
+}
+
+CGlobalMutexImpl::~CGlobalMutexImpl() = default;
+
+void CGlobalMutexImpl::lock() {
+    pthread_mutex_t* mutex = m_segment->getMutex();
+    if (recover(mutex, pthread_mutex_lock(mutex)) != 0) throwLockError();
+    m_segment->countLock();
+}
+
+void CGlobalMutexImpl::unlock() {
+    if (pthread_mutex_unlock(m_segment->getMutex()) == 0) m_segment->countUnlock();
+}
+
+bool CGlobalMutexImpl::tryLock() {
+    pthread_mutex_t* mutex = m_segment->getMutex();
+    int result = pthread_mutex_trylock(mutex);
+    if (result == EBUSY) return false;
+    if (recover(mutex, result) != 0) throwLockError();
+    m_segment->countLock();
+    return true;
+}
+
+void CGlobalMutexImpl::throwLockError() const {
+    throw CException("Error locking global mutex " + m_name, newString("Error"));
+}
+
+} // namespace peru::posix

@@ -1,0 +1,183 @@
+#include "peru/threads/posix/MutexSegment.h"
+
+#include "peru/posix/PlatformFile.h"
+
+#include <cerrno>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+#include <fcntl.h>
+#include <map>
+#include <mutex>
+#include <sys/file.h>
+#include <sys/mman.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace peru::posix {
+
+// A segment is ready when the stamp says so. It is written last, under the lock of the file, so that a
+// maker that dies half way leaves a segment that the next one makes anew. A stamp of an earlier run of the
+// machine does not count: its mutex may have an owner that nobody will ever release.
+struct CMutexSegment::SLayout {
+    struct SStamp {
+        uint32_t version;
+        uint32_t mutexSize; // differs between the word sizes that a machine can run
+        char bootId[40];
+    };
+    SStamp stamp;
+    alignas(16) pthread_mutex_t mutex;
+};
+
+namespace {
+
+constexpr uint32_t kVersion = 1;
+constexpr size_t kLongestName = 150;
+
+bool isPrivateFolder(const char* path) {
+    struct stat status;
+    return path && path[0] == '/' && stat(path, &status) == 0 && S_ISDIR(status.st_mode) &&
+           status.st_uid == geteuid() && (status.st_mode & (S_IWGRP | S_IWOTH)) == 0;
+}
+
+// One file name for each name: what could mean something in a path is written in hexadecimal, and a name
+// that is too long for a file ends in a hash of the whole.
+std::string getFileName(const std::string& name) {
+    static const char digits[] = "0123456789abcdef";
+    std::string result = "tonewright-mutex-" + std::to_string(geteuid()) + "-";
+    size_t start = result.size();
+    uint64_t hash = 0xcbf29ce484222325u;
+    for (unsigned char byte : name) {
+        hash = (hash ^ byte) * 0x100000001b3u;
+        bool plain = (byte >= 'a' && byte <= 'z') || (byte >= 'A' && byte <= 'Z') ||
+                     (byte >= '0' && byte <= '9') || byte == '-' || byte == '_';
+        if (plain)
+            result += static_cast<char>(byte);
+        else
+            result.append({'%', digits[byte >> 4], digits[byte & 15]});
+    }
+    if (result.size() - start <= kLongestName) return result;
+    result.resize(start + kLongestName);
+    result += '.'; // no short name has one
+    for (int shift = 60; shift >= 0; shift -= 4) result += digits[hash >> shift & 15];
+    return result + '.' + std::to_string(name.size());
+}
+
+std::string getPath(const std::string& name) {
+    const char* folder = std::getenv("XDG_RUNTIME_DIR");
+    return std::string(isPrivateFolder(folder) ? folder : "/dev/shm") + "/" + getFileName(name);
+}
+
+// Keeps other makers out. Unlocks by itself, since a mapping keeps the lock alive after the file is closed.
+class CFileLock {
+public:
+    explicit CFileLock(int descriptor) : m_descriptor(descriptor) {
+        do m_locked = flock(m_descriptor, LOCK_EX) == 0;
+        while (!m_locked && errno == EINTR);
+    }
+    ~CFileLock() { flock(m_descriptor, LOCK_UN); }
+    CFileLock(const CFileLock&) = delete;
+    CFileLock& operator=(const CFileLock&) = delete;
+
+    bool isLocked() const { return m_locked; }
+
+private:
+    int m_descriptor;
+    bool m_locked = false;
+};
+
+void readBootId(char (&id)[40]) {
+    std::memset(id, 0, sizeof id);
+    CFileHandle file(::open("/proc/sys/kernel/random/boot_id", O_RDONLY | O_CLOEXEC));
+    // Without the file every run of the machine looks the same, as on a system that has no such file.
+    if (file.isOpen() && ::read(file.get(), id, 36) != 36) std::memset(id, 0, sizeof id);
+}
+
+// The segments that this process has mapped.
+struct SRegistry {
+    std::mutex mutex;
+    std::map<std::string, std::weak_ptr<CMutexSegment>> segments;
+};
+
+SRegistry& getRegistry() {
+    // Not destroyed: a mutex may be made or dropped by the last singletons.
+    alignas(SRegistry) static char memory[sizeof(SRegistry)];
+    static SRegistry* registry = ::new (memory) SRegistry;
+    return *registry;
+}
+
+} // namespace
+
+bool CMutexSegment::prepare(SLayout& layout) {
+    SLayout::SStamp stamp;
+    std::memset(&stamp, 0, sizeof stamp);
+    stamp.version = kVersion;
+    stamp.mutexSize = sizeof(pthread_mutex_t);
+    readBootId(stamp.bootId);
+    if (std::memcmp(&layout.stamp, &stamp, sizeof stamp) == 0) return true;
+    bool current = std::memcmp(layout.stamp.bootId, stamp.bootId, sizeof stamp.bootId) == 0;
+    if (layout.stamp.version != 0 && current) return false; // another build's, and maybe in use
+
+    std::memset(&layout, 0, sizeof layout);
+    pthread_mutexattr_t attributes;
+    pthread_mutexattr_init(&attributes);
+    pthread_mutexattr_settype(&attributes, PTHREAD_MUTEX_RECURSIVE);
+    pthread_mutexattr_setpshared(&attributes, PTHREAD_PROCESS_SHARED);
+    pthread_mutexattr_setrobust(&attributes, PTHREAD_MUTEX_ROBUST);
+    int result = pthread_mutex_init(&layout.mutex, &attributes);
+    pthread_mutexattr_destroy(&attributes);
+    if (result != 0) return false;
+    // Others look at it under the lock of the file; only a maker that is killed here must not have written
+    // the stamp early.
+    std::atomic_signal_fence(std::memory_order_seq_cst);
+    layout.stamp = stamp;
+    return true;
+}
+
+CMutexSegment::SLayout* CMutexSegment::map(const std::string& path) {
+    // No link is followed and only a plain file of the user's own is taken, so that nobody else who may
+    // write to the folder can put something in its place.
+    CFileHandle file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600));
+    if (!file.isOpen()) return nullptr;
+    CFileLock lock(file.get());
+    if (!lock.isLocked()) return nullptr;
+    struct stat status;
+    if (fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode) || status.st_uid != geteuid() ||
+        (status.st_mode & 0077) != 0)
+        return nullptr;
+    constexpr auto size = static_cast<off_t>(sizeof(SLayout));
+    // Reserved and not only set: a full disk is an error here and not a signal at the first access.
+    if (status.st_size < size && posix_fallocate(file.get(), 0, size) != 0) return nullptr;
+    void* memory = mmap(nullptr, sizeof(SLayout), PROT_READ | PROT_WRITE, MAP_SHARED, file.get(), 0);
+    if (memory == MAP_FAILED) return nullptr;
+    auto* layout = static_cast<SLayout*>(memory);
+    if (prepare(*layout)) return layout;
+    munmap(memory, sizeof(SLayout));
+    return nullptr;
+}
+
+std::shared_ptr<CMutexSegment> CMutexSegment::open(const std::string& name) {
+    std::string path = getPath(name);
+    SRegistry& registry = getRegistry();
+    std::lock_guard lock(registry.mutex);
+    std::erase_if(registry.segments, [](const auto& entry) { return entry.second.expired(); });
+    std::weak_ptr<CMutexSegment>& entry = registry.segments[path];
+    std::shared_ptr<CMutexSegment> segment = entry.lock();
+    if (segment) return segment;
+    SLayout* layout = map(path);
+    if (layout) {
+        segment.reset(new CMutexSegment(layout));
+        entry = segment;
+    }
+    return segment;
+}
+
+CMutexSegment::~CMutexSegment() {
+    if (m_locks.load(std::memory_order_relaxed) == 0) munmap(m_layout, sizeof(SLayout));
+}
+
+pthread_mutex_t* CMutexSegment::getMutex() const {
+    return &m_layout->mutex;
+}
+
+} // namespace peru::posix

@@ -1,9 +1,0 @@
-#include "sonora2/common/SonoraError.h"
-
-namespace sonora2::common {
-
-PERU_EXCEPTION_IMPL(CSonoraError)
-
-CSonoraError::CSonoraError(const peru::CStringArg& message) : CError(message) {}
-
-} // namespace sonora2::common

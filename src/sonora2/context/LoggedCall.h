@@ -1,0 +1,26 @@
+// A call whose failure is told to the log and to nobody else.
+#pragma once
+
+#include "peru/Errors.h"
+#include "sonora2/context/ILogManager.h"
+
+#include <exception>
+
+namespace sonora2::common {
+
+// The log may be empty.
+template <class Call> void callLogged(const P<ILogManager>& log, Call&& call) noexcept {
+    try {
+        try {
+            call();
+        } catch (const peru::CException& exception) {
+            if (log) log->logException(exception);
+        } catch (const std::exception& exception) {
+            if (log) log->logException(peru::CError(exception.what()));
+        }
+    } catch (...) {
+        // What was thrown says nothing, or the log cannot be written either.
+    }
+}
+
+} // namespace sonora2::common

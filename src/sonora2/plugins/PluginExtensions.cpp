@@ -1,0 +1,44 @@
+#include "sonora2/plugins/PluginExtensions.h"
+
+#include "sonora2/context/SonoraError.h"
+
+#include <algorithm>
+
+namespace sonora2::common {
+
+using peru::IString;
+
+CPluginExtensions::CPluginExtensions() = default;
+CPluginExtensions::~CPluginExtensions() = default;
+
+P<IString> CPluginExtensions::getExtension(int index) const {
+    if (index < 0 || index >= getCount())
+        throw peru::CInvalidArgError("index", "CPluginExtensions::getExtension");
+    return m_extensions[static_cast<size_t>(index)];
+}
+
+bool CPluginExtensions::addExtension(const P<IString>& extension) {
+    auto isEqual = [&extension](const P<IString>& held) { return held->equals(extension); };
+    if (std::any_of(m_extensions.begin(), m_extensions.end(), isEqual)) return false;
+    m_extensions.push_back(extension ? extension : peru::CString::empty());
+    return true;
+}
+
+void CPluginExtensions::writeTo(const P<peru::IDataOutStream>& stream) const {
+    stream->writeInt32(getCount());
+    for (const P<IString>& extension : m_extensions) stream->writeString(extension);
+}
+
+void CPluginExtensions::readFrom(const P<peru::IDataInStream>& stream) {
+    m_extensions.clear();
+    const int32_t count = stream->readInt32();
+    if (count < 0) throw CSonoraError("the list of file extensions has a negative count");
+    for (int32_t i = 0; i < count; ++i) {
+        P<IString> extension = stream->readString();
+        // A stream that has ended delivers empty texts.
+        if (!extension || extension->isEmpty()) throw CSonoraError("the list of file extensions ends early");
+        addExtension(extension);
+    }
+}
+
+} // namespace sonora2::common

@@ -1,0 +1,34 @@
+// A list of file extensions.
+#pragma once
+
+#include "peru/ISerializable.h"
+#include "sonora2/plugins/ISonoraPlugin.h"
+
+#include <vector>
+
+namespace sonora2::common {
+
+// Ordered, without duplicates. Filled by one thread, then read by any number.
+class SONORA2_API CPluginExtensions : public peru::CObject,
+                                      public IPluginExtensions,
+                                      public virtual peru::ISerializable {
+public:
+    CPluginExtensions();
+    ~CPluginExtensions() override;
+
+    int getCount() const override { return static_cast<int>(m_extensions.size()); }
+    // Throws CInvalidArgError for an index outside the list.
+    P<peru::IString> getExtension(int index) const override;
+
+    // False when an equal text is already held.
+    bool addExtension(const P<peru::IString>& extension);
+
+    // The count as int32, then the texts. Reading replaces what the list holds.
+    void writeTo(const P<peru::IDataOutStream>& stream) const override;
+    void readFrom(const P<peru::IDataInStream>& stream) override;
+
+private:
+    std::vector<P<peru::IString>> m_extensions;
+};
+
+} // namespace sonora2::common

@@ -1,0 +1,328 @@
+#include "sonora2/plugins/PluginHandler.h"
+
+#include "peru/IInterfaceQuery.h"
+#include "peru/strings/StringFormat.h"
+#include "peru/system/IPathes.h"
+#include "peru/system/ISystem.h"
+#include "peru/uri/URI.h"
+#include "sonora2/context/SonoraError.h"
+#include "sonora2/media/CloseGuard.h"
+#include "sonora2/plugins/ParameterRecord.h"
+#include "sonora2/plugins/PluginExtensions.h"
+#include "sonora2/plugins/PluginModule.h"
+
+#include <algorithm>
+#include <filesystem>
+#include <string>
+
+namespace sonora2::common {
+
+using peru::CString;
+using peru::IString;
+using peru::IURI;
+
+struct CPluginHandler::STexts {
+    const char* failed; // URI, plug-in, title, description
+    const char* failedUnknown;
+};
+
+namespace {
+
+constexpr const char* kLibraryNameFormat = "%s.so";
+constexpr const char* kDefaultPlugins[] = {"sonora2_ffmpeg", "sonora2_dsgraph", "sonora2_decmpa"};
+constexpr const char* kPreferenceFailed =
+    "the remembered plugin for %s cannot be told or kept: unknown exception";
+constexpr const char* kImageExtensions[] = {"bmp", "jpg", "png", "tiff"};
+
+bool fileExists(const P<IURI>& file) {
+    std::error_code ignored;
+    return std::filesystem::is_regular_file(CString::toStdString(peru::getPathes()->toPlatformPath(file)),
+                                            ignored);
+}
+
+std::string toLowerAscii(std::string text) {
+    for (char& c : text)
+        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
+    return text;
+}
+
+bool contains(IPluginExtensions& extensions, const P<IString>& key) {
+    for (int i = 0; i < extensions.getCount(); ++i)
+        if (extensions.getExtension(i)->equalsIgnoreCase(key)) return true;
+    return false;
+}
+
+} // namespace
+
+CPluginHandler::CPluginHandler(const P<ISonoraContext>& context, bool boxed,
+                               const peru::CStringArg& uriSuffix, const P<IPluginPreference>& preference)
+    : m_context(context), m_boxed(boxed), m_uriSuffix(CString::fromUTF8(CString::toStdString(uriSuffix))),
+      m_preference(preference), m_lock(peru::getMutexFactory()->createMutex()) {
+    const int count = m_context->getPluginNameCount();
+    for (int i = 0; i < count; ++i) loadPlugin(m_context->getPluginNameAt(i));
+    if (count > 0) return;
+    for (const char* name : kDefaultPlugins) loadPlugin(name);
+}
+
+CPluginHandler::~CPluginHandler() = default;
+
+void CPluginHandler::loadPlugin(const peru::CStringArg& name) {
+    try {
+        const P<IString> fileName = peru::format(kLibraryNameFormat, name);
+        if (m_boxed) {
+            P<IString> text = peru::format("there is no slave process to run the plugin in: %s", fileName);
+            throw CSonoraError(text);
+        }
+        const P<IURI> library = findLibrary(fileName);
+        if (!library) throw CSonoraError(peru::format("could not load plugin: %s", fileName));
+        const P<ISonoraPlugin> module = peru::make<CPluginModule>(m_context, library);
+        addPlugin(module, module);
+    } catch (const peru::CException& e) {
+        log(kSeverityWarning,
+            peru::format("Error while loading DLL: %s - %s", e.getTitle(), e.getDescription()));
+    }
+}
+
+void CPluginHandler::addPlugin(const P<ISonoraPlugin>& plugin, const P<ISonoraPlugin>& plainPlugin) {
+    m_plugins.push_back(plugin);
+    m_plainPlugins.push_back(plainPlugin);
+}
+
+// A directory that was set for this context comes before the environment and the installed places; the one
+// that every context starts with, the program's folder, after them.
+P<IURI> CPluginHandler::findLibrary(const P<IString>& fileName) const {
+    const P<IURI> directory = m_context->getBaseDirectories()->getPluginDirectory();
+    const P<IURI> program = peru::getSystem()->getProgramFileFolder();
+    const bool isDefault = directory && program && directory->equals(program);
+    std::vector<P<IURI>> folders =
+        peru::getSystem()->getSearchFolders("TONEWRIGHT_PLUGIN_PATH", "lib/tonewright");
+    if (directory) folders.insert(isDefault ? folders.end() : folders.begin(), directory);
+    for (const P<IURI>& folder : folders) {
+        P<IURI> file = folder->appendPath(fileName);
+        if (fileExists(file)) return file;
+    }
+    return nullptr;
+}
+
+P<ISonoraPlugin> CPluginHandler::getPlugin(int index) {
+    if (index < 0 || index >= getPluginCount())
+        throw peru::CInvalidArgError("index", "CPluginHandler::getPlugin");
+    return m_plugins[static_cast<size_t>(index)];
+}
+
+void CPluginHandler::setVerifyByOpening(bool verify) {
+    peru::CMutexLock lock(m_lock);
+    m_verifyByOpening = verify;
+}
+
+bool CPluginHandler::getVerifyByOpening() {
+    peru::CMutexLock lock(m_lock);
+    return m_verifyByOpening;
+}
+
+void CPluginHandler::setURISuffix(const peru::CStringArg& suffix) {
+    peru::CMutexLock lock(m_lock);
+    m_uriSuffix = CString::fromUTF8(CString::toStdString(suffix));
+}
+
+P<IString> CPluginHandler::getURISuffix() {
+    peru::CMutexLock lock(m_lock);
+    return m_uriSuffix;
+}
+
+P<IPluginExtensions> CPluginHandler::getValidExtensions(int mask) {
+    P<CPluginExtensions> all = peru::make<CPluginExtensions>();
+    if (mask & kImage) {
+        for (const char* extension : kImageExtensions) all->addExtension(CString::fromUTF8(extension));
+        return all;
+    }
+    for (const P<ISonoraPlugin>& plugin : m_plugins) {
+        const P<IPluginExtensions> extensions = plugin->getValidExtensions(mask);
+        for (int i = 0; extensions && i < extensions->getCount(); ++i)
+            all->addExtension(extensions->getExtension(i));
+    }
+    return all;
+}
+
+// Lower case, without a point. The suffix is cut off the whole name, so that "a.flac.part" is a "flac".
+P<IString> CPluginHandler::getLookupKey(const P<IURI>& uri) const {
+    std::string name = toLowerAscii(CString::toStdString(peru::CURI::unescape(uri->getFileName())));
+    const std::string suffix = toLowerAscii(CString::toStdString(m_uriSuffix));
+    if (!suffix.empty() && name.ends_with(suffix)) name.resize(name.size() - suffix.size());
+    name.erase(0, std::min(name.find_first_not_of('.'), name.size())); // a hidden file's point
+    const size_t point = name.rfind('.');
+    return point == std::string::npos ? CString::empty() : CString::fromUTF8(name.substr(point + 1));
+}
+
+void CPluginHandler::log(int32_t severity, const P<IString>& text) const {
+    if (P<ILogManager> manager = m_context->getLogManager()) manager->log(severity, text);
+}
+
+// What the preference does is no reason for a create call to fail.
+template <class Call> void CPluginHandler::askPreference(const P<IURI>& uri, Call call) {
+    if (!m_preference) return;
+    try {
+        call();
+    } catch (const peru::CException& e) {
+        if (P<ILogManager> manager = m_context->getLogManager()) manager->logException(e);
+    } catch (...) {
+        log(kSeverityWarning, peru::format(kPreferenceFailed, uri->getAsString()));
+    }
+}
+
+P<ISonoraPlugin> CPluginHandler::findPreferred(int mask, const P<IURI>& uri) {
+    P<ISonoraPlugin> preferred;
+    askPreference(uri, [&] {
+        const P<IString> name = m_preference->lookUp(mask, uri);
+        if (!name || name->isEmpty()) return;
+        auto isNamed = [&name](const P<ISonoraPlugin>& plugin) {
+            return plugin->getPluginName()->equals(name);
+        };
+        const auto found = std::find_if(m_plugins.begin(), m_plugins.end(), isNamed);
+        if (found != m_plugins.end()) preferred = *found;
+    });
+    return preferred;
+}
+
+void CPluginHandler::storePreferred(int mask, const P<IURI>& uri, ISonoraPlugin& plugin) {
+    askPreference(uri, [&] { m_preference->store(mask, uri, plugin.getPluginName()); });
+}
+
+// The one walk behind every create call: the remembered plug-in, then each in order that lists the extension.
+// `tryCreate` answers an object that has passed every test, or an empty handle.
+template <class T, class TryCreate>
+P<T> CPluginHandler::findObject(const P<IURI>& uri, int mask, const STexts& texts, TryCreate tryCreate) {
+    auto attempt = [&](ISonoraPlugin& plugin, const P<IString>& key, ISonoraPlugin* plain) -> P<T> {
+        P<IString> name = CString::empty();
+        try {
+            name = plugin.getPluginName();
+            if (plain) {
+                const P<IPluginExtensions> extensions = plain->getValidExtensions(mask);
+                if (!extensions || !contains(*extensions, key)) return nullptr;
+            }
+            return tryCreate(plugin);
+        } catch (const peru::CException& e) {
+            log(kSeverityWarning,
+                peru::format(texts.failed, uri->getAsString(), name, e.getTitle(), e.getDescription()));
+        } catch (...) {
+            log(kSeverityWarning, peru::format(texts.failedUnknown, uri->getAsString(), name));
+        }
+        return nullptr;
+    };
+
+    if (P<ISonoraPlugin> preferred = findPreferred(mask, uri))
+        if (P<T> object = attempt(*preferred, nullptr, nullptr)) return object;
+    const P<IString> key = getLookupKey(uri);
+    if (key->isEmpty()) return nullptr;
+    for (size_t i = 0; i < m_plugins.size(); ++i) {
+        P<T> object = attempt(*m_plugins[i], key, m_plainPlugins[i].get());
+        if (!object) continue;
+        storePreferred(mask, uri, *m_plugins[i]);
+        return object;
+    }
+    return nullptr;
+}
+
+bool CPluginHandler::passesOpening(const P<ISource>& source, bool keepOpened) const {
+    if (!m_verifyByOpening) return true;
+    source->open();
+    const bool opened = source->isOpened();
+    if (opened && !keepOpened) source->close();
+    return opened;
+}
+
+P<ISource> CPluginHandler::findSource(const P<IURI>& uri, int mask, const SSourceParams* params) {
+    static constexpr STexts kTexts{"tried to open %s with plugin %s.\nOpening failed: %s - %s",
+                                   "tried to open %s with plugin %s.\nOpening failed: unknown exception"};
+    peru::CMutexLock lock(m_lock);
+    const SSourceParams record = receiveRecord(params);
+    if ((mask & kAudioSource) && (!record.nSampleRate || !record.nChannelCount || !record.nBytesPerSample))
+        throw CSonoraError("not all sourceparameter fields are valid for creating an audio source");
+    return findObject<ISource>(uri, mask, kTexts, [&](ISonoraPlugin& plugin) -> P<ISource> {
+        P<ISource> source = plugin.tryCreateSource(uri, mask, true, &record);
+        if (source && !passesOpening(source, record.bKeepOpened != 0)) source.reset();
+        return source;
+    });
+}
+
+P<IFormat> CPluginHandler::findFormat(const P<IURI>& uri, int mask, const SFormatParams* params) {
+    static constexpr STexts kTexts{"tried to create %s with plugin %s.\nOpening failed: %s - %s",
+                                   "tried to create %s with plugin %s.\nOpening failed: unknown exception"};
+    peru::CMutexLock lock(m_lock);
+    const SFormatParams record = receiveRecord(params);
+    return findObject<IFormat>(uri, mask, kTexts, [&](ISonoraPlugin& plugin) {
+        return plugin.tryCreateFormat(uri, mask, true, &record);
+    });
+}
+
+P<ISource> CPluginHandler::createSource(const P<IURI>& uri, const SSourceParams* params) {
+    return findSource(uri, kVideoSource | kAudioSource, params);
+}
+
+P<IVideoSource> CPluginHandler::createVideoSource(const P<IURI>& uri, const SSourceParams* params) {
+    return peru::interfaceCast<IVideoSource>(findSource(uri, kVideoSource, params));
+}
+
+P<IAudioSource> CPluginHandler::createAudioSource(const P<IURI>& uri, const SSourceParams* params) {
+    return peru::interfaceCast<IAudioSource>(findSource(uri, kAudioSource, params));
+}
+
+P<IAudioSource> CPluginHandler::createAudioSource(const P<IURI>& uri, int rate, int channels,
+                                                  int bytesPerSample, bool keepOpened) {
+    SSourceParams params;
+    params.bKeepOpened = keepOpened;
+    params.nSampleRate = rate;
+    params.nChannelCount = channels;
+    params.nBytesPerSample = bytesPerSample;
+    return createAudioSource(uri, &params);
+}
+
+P<IFormat> CPluginHandler::createFormat(const P<IURI>& uri, const SFormatParams* params) {
+    return findFormat(uri, kVideoFormat | kAudioFormat, params);
+}
+
+P<IVideoFormat> CPluginHandler::createVideoFormat(const P<IURI>& uri, const SFormatParams* params) {
+    return peru::interfaceCast<IVideoFormat>(findFormat(uri, kVideoFormat, params));
+}
+
+P<IAudioFormat> CPluginHandler::createAudioFormat(const P<IURI>& uri, const SFormatParams* params) {
+    return peru::interfaceCast<IAudioFormat>(findFormat(uri, kAudioFormat, params));
+}
+
+P<IAudioFormat> CPluginHandler::createAudioFormat(const P<IURI>& uri, int rate, int channels,
+                                                  int bytesPerSample) {
+    SFormatParams params;
+    params.nSampleRate = rate;
+    params.nChannelCount = channels;
+    params.nBytesPerSample = bytesPerSample;
+    return createAudioFormat(uri, &params);
+}
+
+P<peru::IBase> CPluginHandler::createObject(const P<IURI>& uri, const SObjectParams* params) {
+    static constexpr STexts kTexts{"tried to create %s with plugin %s.\nOpening failed: %s - %s",
+                                   "tried to create %s with plugin %s.\nOpening failed: unknown exception"};
+    peru::CMutexLock lock(m_lock);
+    const SObjectParams record; // its size is all that there is, whatever the caller's says
+    return findObject<peru::IBase>(uri, kPluginObject, kTexts, [&](ISonoraPlugin& plugin) {
+        return plugin.tryCreateObject(uri, &record);
+    });
+}
+
+P<ISonoraPicture> CPluginHandler::createPreviewImage(const P<IURI>& uri, double time, int& width,
+                                                     int& height) {
+    width = height = 0;
+    const P<IVideoSource> source = createVideoSource(uri, nullptr);
+    if (!source) return nullptr;
+    CCloseGuard guard(*source);
+    source->open();
+    const double duration = source->getDuration();
+    if (time > duration) time = duration - 1.0;
+    if (time > 0) source->skipToTime(time);
+    P<ISonoraPicture> picture = source->getNextPicture();
+    if (!picture) return nullptr;
+    width = picture->getWidth();
+    height = picture->getHeight();
+    return picture->getRGBPicture();
+}
+
+} // namespace sonora2::common

@@ -1,0 +1,79 @@
+// Loads the plug-ins and picks the one that reads or writes a URI.
+#pragma once
+
+#include "peru/threads/IMutex.h"
+#include "sonora2/context/ISonoraContext.h"
+#include "sonora2/media/ISonoraPicture.h"
+#include "sonora2/plugins/IPluginHandler.h"
+#include "sonora2/plugins/IPluginPreference.h"
+
+#include <vector>
+
+namespace sonora2::common {
+
+// Plug-ins are tried in the order of the context's list, those only that list the URI's extension; a source
+// counts once it has really been opened. What a plug-in throws is logged and never reaches the caller.
+//
+// The plug-ins stay loaded for the handler's life, and every object that they made must go before it.
+class SONORA2_API CPluginHandler : public peru::CObject, public IPluginHandler {
+public:
+    // Loads the context's plug-ins, or the default ones if it names none; one that cannot be loaded costs a
+    // line of the log. The preference may be empty.
+    explicit CPluginHandler(const P<ISonoraContext>& context, bool boxed = false,
+                            const peru::CStringArg& uriSuffix = "",
+                            const P<IPluginPreference>& preference = nullptr);
+    ~CPluginHandler() override;
+
+    P<ISonoraPicture> createPreviewImage(const P<peru::IURI>& uri, double time, int& width,
+                                         int& height) override;
+    P<ISource> createSource(const P<peru::IURI>& uri, const SSourceParams* params) override;
+    P<IVideoSource> createVideoSource(const P<peru::IURI>& uri, const SSourceParams* params) override;
+    P<IAudioSource> createAudioSource(const P<peru::IURI>& uri, const SSourceParams* params) override;
+    P<IAudioSource> createAudioSource(const P<peru::IURI>& uri, int rate, int channels, int bytesPerSample,
+                                      bool keepOpened) override;
+    P<IFormat> createFormat(const P<peru::IURI>& uri, const SFormatParams* params) override;
+    P<IVideoFormat> createVideoFormat(const P<peru::IURI>& uri, const SFormatParams* params) override;
+    P<IAudioFormat> createAudioFormat(const P<peru::IURI>& uri, const SFormatParams* params) override;
+    P<IAudioFormat> createAudioFormat(const P<peru::IURI>& uri, int rate, int channels,
+                                      int bytesPerSample) override;
+    P<peru::IBase> createObject(const P<peru::IURI>& uri, const SObjectParams* params) override;
+    P<IPluginExtensions> getValidExtensions(int mask) override;
+    void loadPlugin(const peru::CStringArg& name) override;
+    bool isBoxed() override { return m_boxed; }
+    int getPluginCount() override { return static_cast<int>(m_plugins.size()); }
+    P<ISonoraPlugin> getPlugin(int index) override; // throws CInvalidArgError
+    void setVerifyByOpening(bool verify) override;
+    bool getVerifyByOpening() override;
+    void setURISuffix(const peru::CStringArg& suffix) override;
+    P<peru::IString> getURISuffix() override;
+
+    // The first creates objects, the second answers for extensions; in this process they are one object.
+    // Not to be called once create calls may run.
+    void addPlugin(const P<ISonoraPlugin>& plugin, const P<ISonoraPlugin>& plainPlugin);
+
+private:
+    struct STexts; // how a failure of a plug-in reads in the log
+
+    P<ISource> findSource(const P<peru::IURI>& uri, int mask, const SSourceParams* params);
+    P<IFormat> findFormat(const P<peru::IURI>& uri, int mask, const SFormatParams* params);
+    template <class T, class TryCreate>
+    P<T> findObject(const P<peru::IURI>& uri, int mask, const STexts& texts, TryCreate tryCreate);
+    bool passesOpening(const P<ISource>& source, bool keepOpened) const;
+    template <class Call> void askPreference(const P<peru::IURI>& uri, Call call);
+    P<ISonoraPlugin> findPreferred(int mask, const P<peru::IURI>& uri);
+    void storePreferred(int mask, const P<peru::IURI>& uri, ISonoraPlugin& plugin);
+    P<peru::IString> getLookupKey(const P<peru::IURI>& uri) const;
+    P<peru::IURI> findLibrary(const P<peru::IString>& fileName) const;
+    void log(int32_t severity, const P<peru::IString>& text) const;
+
+    std::vector<P<ISonoraPlugin>> m_plugins;
+    std::vector<P<ISonoraPlugin>> m_plainPlugins; // parallel
+    P<ISonoraContext> m_context;
+    bool m_boxed;
+    bool m_verifyByOpening = true; // guarded by m_lock, as is the suffix
+    P<peru::IString> m_uriSuffix;
+    P<IPluginPreference> m_preference;
+    P<peru::IMutex> m_lock; // held over every create call
+};
+
+} // namespace sonora2::common

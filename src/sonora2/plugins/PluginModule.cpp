@@ -1,0 +1,88 @@
+#include "sonora2/plugins/PluginModule.h"
+
+#include "peru/strings/StringFormat.h"
+#include "peru/uri/URI.h"
+#include "sonora2/context/SonoraError.h"
+
+namespace sonora2::common {
+
+namespace {
+
+// A text of its own: one that came out of a plug-in may lie in the plug-in's memory.
+P<peru::IString> detachText(const P<peru::IString>& text) {
+    return peru::CString::fromUTF8(peru::CString::toStdString(text));
+}
+
+P<peru::IDynamicLibrary> loadLibrary(const P<ISonoraContext>& context, const P<peru::IURI>& file,
+                                     const std::string& name) {
+    try {
+        return peru::getDynamicLibraryLoader()->load(file);
+    } catch (const peru::CException& e) {
+        // The library is there, so the loader's reason is what helps: a missing symbol or dependency.
+        if (P<ILogManager> log = context->getLogManager()) log->log(kSeverityDebug, e.getDescription());
+        throw CSonoraError(peru::format("could not load plugin: %s", name.c_str()));
+    }
+}
+
+// What the entry throws is turned into an error that does not outlive the library: the library is unloaded
+// while the exception is on its way.
+P<ISonoraPlugin> createPlugin(PluginCreateFunction create, const P<ISonoraContext>& context) {
+    P<peru::IString> reason;
+    try {
+        P<ISonoraPlugin> plugin;
+        create(context, plugin);
+        return plugin;
+    } catch (const peru::CException& e) {
+        reason = detachText(e.getDescription());
+    } catch (const std::exception& e) {
+        reason = peru::CString::fromUTF8(e.what());
+    } catch (...) {
+        return nullptr;
+    }
+    throw CSonoraError(reason);
+}
+
+} // namespace
+
+CPluginModule::CPluginModule(const P<ISonoraContext>& context, const P<peru::IURI>& library)
+    : m_name(peru::CString::toStdString(peru::CURI::unescape(library->getFileName()))),
+      m_library(loadLibrary(context, library, m_name)) {
+    auto create = reinterpret_cast<PluginCreateFunction>(m_library->findSymbol(kPluginCreateName));
+    if (!create)
+        throw CSonoraError(peru::format("could not load link create function for: %s", m_name.c_str()));
+    m_plugin = createPlugin(create, context);
+    if (!m_plugin)
+        throw CSonoraError(peru::format("could not load link create plugin object for: %s", m_name.c_str()));
+}
+
+CPluginModule::~CPluginModule() {
+    m_plugin.reset();
+}
+
+P<peru::IString> CPluginModule::getPluginName() {
+    return m_plugin->getPluginName();
+}
+
+int CPluginModule::getValidTypes() {
+    return m_plugin->getValidTypes();
+}
+
+P<IPluginExtensions> CPluginModule::getValidExtensions(int nTypes) {
+    return m_plugin->getValidExtensions(nTypes);
+}
+
+P<ISource> CPluginModule::tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
+                                          const SSourceParams* pParams) {
+    return m_plugin->tryCreateSource(uri, nTypes, bDontCloseAfterTesting, pParams);
+}
+
+P<IFormat> CPluginModule::tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
+                                          const SFormatParams* pParams) {
+    return m_plugin->tryCreateFormat(uri, nTypes, bDontCloseAfterTesting, pParams);
+}
+
+P<peru::IBase> CPluginModule::tryCreateObject(const P<peru::IURI>& uri, const SObjectParams* pParams) {
+    return m_plugin->tryCreateObject(uri, pParams);
+}
+
+} // namespace sonora2::common

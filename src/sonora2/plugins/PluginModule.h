@@ -1,0 +1,34 @@
+// A plug-in that runs in this process.
+#pragma once
+
+#include "peru/system/IDynamicLibrary.h"
+#include "sonora2/context/ISonoraContext.h"
+#include "sonora2/plugins/ISonoraPlugin.h"
+
+#include <string>
+
+namespace sonora2::common {
+
+// Keeps the library loaded; objects that the plug-in made do not, and must be gone before the module.
+class SONORA2_API CPluginModule : public peru::CObject, public ISonoraPlugin {
+public:
+    // Loads the library and asks it for its plug-in. Throws CSonoraError, which names the library.
+    CPluginModule(const P<ISonoraContext>& context, const P<peru::IURI>& library);
+    ~CPluginModule() override;
+
+    P<peru::IString> getPluginName() override;
+    int getValidTypes() override;
+    P<IPluginExtensions> getValidExtensions(int nTypes) override;
+    P<ISource> tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
+                               const SSourceParams* pParams) override;
+    P<IFormat> tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
+                               const SFormatParams* pParams) override;
+    P<peru::IBase> tryCreateObject(const P<peru::IURI>& uri, const SObjectParams* pParams) override;
+
+private:
+    std::string m_name;
+    P<ISonoraPlugin> m_plugin; // its code lies in the library: released first
+    P<peru::IDynamicLibrary> m_library;
+};
+
+} // namespace sonora2::common

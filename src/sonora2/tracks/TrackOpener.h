@@ -1,0 +1,56 @@
+// Opens and closes tracks on a thread of its own.
+#pragma once
+
+#include "peru/Object.h"
+#include "peru/threads/IMutex.h"
+#include "peru/threads/ISignal.h"
+#include "peru/threads/IThreadManager.h"
+#include "sonora2/context/ILogManager.h"
+#include "sonora2/tracks/ITrack.h"
+
+#include <deque>
+
+namespace sonora2::common {
+
+// The worker of a track list. It never takes the list's lock, so that a slow medium holds up nobody but
+// those who need that very medium. A track that fails here costs a line of the log: it is opened again when
+// it is due, and fails there.
+//
+// Used by the thread that holds the list's lock, one at a time.
+class CTrackOpener : public peru::CObject {
+public:
+    explicit CTrackOpener(const P<ILogManager>& log); // the log may be empty
+    ~CTrackOpener() override;
+
+    void requestOpen(const P<ITrack>& track) { request(track, false); }
+    void requestClose(const P<ITrack>& track) { request(track, true); }
+    // Afterwards nothing that was requested of the track is still to come. Waits where the thread is just
+    // busy with it. True when the track was still to be closed, which the caller now does himself.
+    bool claim(const P<ITrack>& track);
+    // Ends the thread, when it is done with the track that it is busy with. Tracks that wait to be closed are
+    // closed, those that wait to be opened are not.
+    void stop();
+
+private:
+    struct SJob {
+        P<ITrack> track;
+        bool close;
+    };
+
+    void request(const P<ITrack>& track, bool close);
+    void start();
+    void run();
+    bool takeJob(SJob& job);
+    void perform(const SJob& job);
+
+    P<ILogManager> m_log;
+    P<peru::IThread> m_thread;
+    P<peru::ISignal> m_wake; // set when there is a job, and to stop
+    P<peru::ISignal> m_done; // set when a job is done
+    P<peru::IMutex> m_queueMutex;
+    std::deque<SJob> m_queue; // these are guarded by the mutex
+    ITrack* m_busyWith = nullptr;
+    bool m_stopping = false;
+};
+
+} // namespace sonora2::common

@@ -1,0 +1,188 @@
+#include "peru/system/ISystem.h"
+#include "support/Files.h"
+#include "support/TempFolder.h"
+
+#include <csignal>
+#include <fstream>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <sys/xattr.h>
+#include <unistd.h>
+
+using namespace peru;
+using tests::countEntries;
+using tests::CTempFolder;
+using tests::toURI;
+namespace fs = std::filesystem;
+
+namespace {
+
+std::string getAttribute(const fs::path& file, const char* name) {
+    char value[256];
+    const ssize_t size = ::getxattr(file.c_str(), name, value, sizeof value);
+    return size < 0 ? "none" : std::string(value, static_cast<size_t>(size));
+}
+
+// The usual rights, and one user more who may read.
+void setAccessList(const fs::path& file, const char* name, uint32_t user) {
+    struct SEntry {
+        uint16_t tag, rights;
+        uint32_t id;
+    };
+    constexpr uint32_t kNobody = 0xffffffff;
+    // Owner, user, group, mask, others.
+    const SEntry entries[] = {
+        {1, 6, kNobody}, {2, 4, user}, {4, 4, kNobody}, {16, 6, kNobody}, {32, 0, kNobody}};
+    std::string value("\2\0\0\0", 4);
+    value.append(reinterpret_cast<const char*>(entries), sizeof entries);
+    ASSERT_EQ(::setxattr(file.c_str(), name, value.data(), value.size(), 0), 0);
+}
+
+// Text that tells where it stands.
+std::string makeText(size_t size) {
+    std::string text;
+    while (text.size() < size) text += std::to_string(text.size()) + " ";
+    text.resize(size);
+    return text;
+}
+
+} // namespace
+
+TEST(FileReplacement, LeavesHolesWhereTheyAre) {
+    const CTempFolder folder;
+    const fs::path file = folder.write("file", "head");
+    constexpr int64_t kSize = int64_t{3} << 30;
+    fs::resize_file(file, kSize);
+    std::ofstream(file, std::ios::in).seekp(kSize / 2).write("middle", 6);
+    const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
+    replacement->getStream()->write("+", 1);
+    replacement->copyFromOld(0, kSize);
+    replacement->commit();
+    ASSERT_EQ(fs::file_size(file), static_cast<uintmax_t>(kSize + 1));
+    struct stat status;
+    ASSERT_EQ(::stat(file.c_str(), &status), 0);
+    EXPECT_LT(status.st_blocks, 1000);
+    std::ifstream in(file);
+    char text[8] = {};
+    in.read(text, 5);
+    EXPECT_STREQ(text, "+head");
+    in.seekg(kSize / 2 + 1).read(text, 7);
+    EXPECT_EQ(std::string(text, 7), std::string("middle\0", 7));
+}
+
+TEST(FileReplacement, MixesOldAndNewBytes) {
+    const CTempFolder folder;
+    const std::string old = makeText(300000);
+    const fs::path file = folder.write("file", old);
+    const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
+    const P<ISeekableIOStream> stream = replacement->getStream();
+    stream->write("head", 4);
+    replacement->copyFromOld(10, 200000);
+    stream->write("middle", 6);
+    replacement->copyFromOld(0, 0);
+    replacement->copyFromOld(299990, 10);
+    char start[8];
+    stream->seek(0); // read ahead, then overwritten by a range
+    stream->read(start, 8);
+    EXPECT_EQ(std::string(start, 8), "head" + old.substr(10, 4));
+    stream->seek(2);
+    replacement->copyFromOld(5, 3);
+    stream->read(start, 3);
+    EXPECT_EQ(std::string(start, 3), old.substr(11, 3));
+    stream->seek(200020);
+    replacement->copyFromOld(299990, 10);
+    stream->setSize(200025);
+    EXPECT_THROW(getSystem()->startReplacement(toURI(file))->copyFromOld(299999, 2), CFileError);
+    // Not compared by EXPECT_EQ, which would print them.
+    EXPECT_TRUE(tests::readFile(file) == old) << "nothing happens before the commit";
+    EXPECT_EQ(countEntries(folder.path()), 1u);
+    replacement->commit();
+    const std::string wanted = "he" + old.substr(5, 3) + old.substr(11, 199999) + "middle" +
+                               old.substr(299990) + old.substr(299990, 5);
+    EXPECT_TRUE(tests::readFile(file) == wanted);
+    EXPECT_EQ(countEntries(folder.path()), 1u);
+}
+
+TEST(FileReplacement, TakesOverWhatSurroundsTheBytes) {
+    const CTempFolder folder;
+    const fs::path file = folder.write("file", "old");
+    fs::create_symlink("file", folder / "link");
+    fs::create_hard_link(file, folder / "second name");
+    ASSERT_EQ(::setxattr(file.c_str(), "user.note", "kept", 4, 0), 0);
+    setAccessList(file, "system.posix_acl_access", 1234);
+    // The folder would give its own list to new files.
+    setAccessList(folder.path(), "system.posix_acl_default", 4321);
+    const fs::path plain = folder.write("plain", "old");
+    ASSERT_EQ(::removexattr(plain.c_str(), "system.posix_acl_access"), 0);
+    const bool root = ::geteuid() == 0;
+    if (root) {
+        ASSERT_EQ(::chown(file.c_str(), 1000, 1001), 0);
+    }
+    fs::permissions(plain, fs::perms(0640));
+    const std::string listBefore = getAttribute(file, "system.posix_acl_access");
+
+    getSystem()->replaceFile(toURI(folder / "link"), "new", 3);
+    getSystem()->replaceFile(toURI(plain), "new", 3);
+    EXPECT_EQ(tests::readFile(file), "new");
+    EXPECT_EQ(tests::readFile(folder / "second name"), "old") << "never written in place";
+    EXPECT_TRUE(fs::is_symlink(folder / "link"));
+    EXPECT_EQ(getAttribute(file, "user.note"), "kept");
+    EXPECT_EQ(getAttribute(file, "system.posix_acl_access"), listBefore);
+    EXPECT_EQ(fs::status(plain).permissions(), fs::perms(0640));
+    EXPECT_EQ(getAttribute(plain, "system.posix_acl_access"), "none");
+    if (root) {
+        struct stat status;
+        ASSERT_EQ(::stat(file.c_str(), &status), 0);
+        EXPECT_EQ(status.st_uid, 1000u);
+        EXPECT_EQ(status.st_gid, 1001u);
+    }
+}
+
+// Rights are asked as an ordinary user, also where the tests run as the superuser.
+TEST(FileReplacement, RefusesWhatTheUserMayNotWrite) {
+    const CTempFolder folder;
+    const fs::path locked = folder.write("locked", "precious");
+    const fs::path inside = folder.write("group", "precious");
+    fs::permissions(locked, fs::perms(0444));
+    fs::create_symlink("nowhere", folder / "dangling");
+    const bool root = ::geteuid() == 0;
+    if (root) {
+        ASSERT_EQ(::chown(folder.path().c_str(), 65534, 65534), 0);
+        ASSERT_EQ(::chown(locked.c_str(), 65534, 65534), 0);
+        fs::permissions(inside, fs::perms(0666));
+        ASSERT_EQ(::seteuid(65534), 0);
+    }
+    EXPECT_THROW(getSystem()->startReplacement(toURI(locked)), CFileAccessDeniedError);
+    fs::permissions(folder.path(), fs::perms(0555));
+    EXPECT_THROW(getSystem()->startReplacement(toURI(inside)), CFileAccessDeniedError);
+    EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "fresh")), CFileAccessDeniedError);
+    fs::permissions(folder.path(), fs::perms(0755));
+    if (root) {
+        EXPECT_EQ(::seteuid(0), 0);
+    }
+    EXPECT_THROW(getSystem()->startReplacement(toURI(folder.path())), CFileError);
+    EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "dangling")), CFileNotFoundError);
+    ASSERT_EQ(::mkfifo((folder / "pipe").c_str(), 0600), 0);
+    EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "pipe")), CFileError);
+    EXPECT_EQ(tests::readFile(locked), "precious");
+    EXPECT_EQ(countEntries(folder.path()), 4u);
+}
+
+TEST(FileReplacement, LeavesNothingWithoutCommit) {
+    const CTempFolder folder;
+    const fs::path file = folder.write("file", "old");
+    // Twice: given up in order, and by a process that dies with half of it written.
+    getSystem()->startReplacement(toURI(file))->getStream()->write("new", 3);
+    const pid_t child = ::fork();
+    if (child == 0) {
+        const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
+        replacement->getStream()->write("new", 3);
+        replacement->getStream()->flush();
+        ::kill(::getpid(), SIGKILL);
+    }
+    int status = 0;
+    ASSERT_EQ(::waitpid(child, &status, 0), child);
+    EXPECT_TRUE(WIFSIGNALED(status));
+    EXPECT_EQ(tests::readFile(file), "old");
+    EXPECT_EQ(countEntries(folder.path()), 1u);
+}

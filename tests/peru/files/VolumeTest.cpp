@@ -1,0 +1,151 @@
+#include "support/Files.h"
+#include "support/TempFolder.h"
+
+#include "peru/files/MountTable.h"
+#include "peru/files/posix/VolumeManager.h"
+
+#include <chrono>
+#include <sys/statvfs.h>
+#include <thread>
+
+using namespace peru;
+using tests::CTempFolder;
+using tests::text;
+using tests::toPath;
+
+namespace {
+
+std::string makeLine(const std::string& device, const std::string& root, const std::string& mountPoint,
+                     const std::string& kind, const std::string& options = "rw,relatime") {
+    return "36 35 " + device + " " + root + " " + mountPoint + " " + options + " shared:1 master:2 - " +
+           kind + " rw\n";
+}
+
+std::vector<std::string> selectPoints(const std::string& table) {
+    std::vector<std::string> points;
+    for (const SMount& mount : selectVolumes(parseMountTable(table))) points.push_back(mount.mountPoint);
+    return points;
+}
+
+class CTestListener : public CObject, public IFileSystemVolumeListener {
+public:
+    void volumeArrived(const P<IFileSystemVolume>& volume) override { note("+", volume); }
+    void volumeLeft(const P<IFileSystemVolume>& volume) override { note("-", volume); }
+
+    posix::CVolumeManager* leave = nullptr; // removes itself in its next call
+    std::vector<std::string> log;
+
+private:
+    void note(const char* what, const P<IFileSystemVolume>& volume) {
+        log.push_back(what + text(volume->getLabel()));
+        if (leave) leave->removeListener(this);
+    }
+};
+
+} // namespace
+
+TEST(MountTable, ReadsTheKernelsLines) {
+    std::vector<SMount> mounts =
+        parseMountTable("22 1 8:1 /@home /home/a\\040b\\134\\011 ro,nosuid - ext4 /dev/sda1 rw,errors=x\n"
+                        "junk\n1 2 3 4 5 6 - a b\n\n1 2 0:5 / /x rw shared:1 master:2 - tmpfs none ro");
+    ASSERT_EQ(mounts.size(), 2u);
+    EXPECT_EQ(mounts[0].device, "8:1");
+    EXPECT_EQ(mounts[0].root, "/@home");
+    EXPECT_EQ(mounts[0].mountPoint, "/home/a b\\\t");
+    EXPECT_EQ(mounts[0].fileSystem, "ext4");
+    EXPECT_EQ(mounts[0].source, "/dev/sda1");
+    EXPECT_TRUE(mounts[0].readOnly);
+    EXPECT_TRUE(mounts[1].readOnly);
+    EXPECT_EQ(mounts[1].fileSystem, "tmpfs");
+}
+
+TEST(MountTable, SelectsWhatAUserCallsAVolume) {
+    const std::string table =
+        makeLine("0:20", "/", "/proc", "proc proc") + makeLine("0:21", "/", "/sys", "sysfs sysfs") +
+        makeLine("8:1", "/part", "/bind", "ext4 /dev/sda1") + makeLine("8:1", "/", "/", "ext4 /dev/sda1") +
+        makeLine("8:1", "/etc", "/other", "ext4 /dev/sda1") + makeLine("0:22", "/", "/run", "tmpfs tmpfs") +
+        makeLine("0:40", "/", "/mnt/share", "nfs4 server:/x") +
+        makeLine("0:41", "/", "/run/user/1/gvfs", "fuse.gvfsd-fuse gvfsd-fuse") +
+        makeLine("0:42", "/", "/mnt/far", "fuse.sshfs me@far:") +
+        makeLine("8:17", "/", "/media/stick", "vfat /dev/sdb1") +
+        makeLine("8:33", "/", "/media/stick", "vfat /dev/sdc1");
+    EXPECT_EQ(selectPoints(table), (std::vector<std::string>{"/", "/mnt/share", "/mnt/far", "/media/stick"}));
+}
+
+TEST(VolumeManager, KnowsTheVolumeOfAFile) {
+    P<IVolumeManager> manager = getVolumeManager();
+    std::string file = std::filesystem::read_symlink("/proc/self/exe").string();
+    EXPECT_FALSE(manager->getVolumeOf(tests::toURI("/proc/self/status")));
+    P<IFileSystemVolume> volume = manager->getVolumeOf(tests::toURI(file));
+    if (!volume) GTEST_SKIP() << "the tests run from no volume";
+    EXPECT_TRUE(file.starts_with(toPath(volume->getRoot())));
+    struct statvfs status;
+    ASSERT_EQ(statvfs(file.c_str(), &status), 0);
+    EXPECT_EQ(volume->getTotalBytes(), static_cast<int64_t>(status.f_blocks * status.f_frsize));
+    EXPECT_GE(volume->getTotalBytes(), volume->getFreeBytes());
+    EXPECT_GE(volume->getFreeBytes(), 0);
+}
+
+TEST(VolumeManager, TellsWhatLeftAndArrived) {
+    CTempFolder folder;
+    for (const char* name : {"a", "b", "c"}) std::filesystem::create_directory(folder / name);
+    auto line = [&](const char* device, const char* name) {
+        return makeLine(device, "/", (folder / name).string(), "ext4 /dev/none");
+    };
+    std::string table = folder.write("table", line("99:1", "a") + line("99:2", "b")).string();
+    P<posix::CVolumeManager> manager = make<posix::CVolumeManager>(table);
+    P<CTestListener> stays = make<CTestListener>();
+    P<CTestListener> leaves = make<CTestListener>();
+    manager->addListener(stays.get());
+    manager->addListener(leaves.get());
+    leaves->leave = manager.get();
+    manager->update();
+    EXPECT_TRUE(stays->log.empty());
+
+    P<IFileSystemVolume> gone = manager->getVolumes()[0];
+    folder.write("table", line("99:2", "b") + line("99:3", "c"));
+    manager->update();
+    EXPECT_EQ(stays->log, (std::vector<std::string>{"-a", "+c"}));
+    EXPECT_EQ(leaves->log, (std::vector<std::string>{"-a"}));
+
+    std::filesystem::remove(folder / "a");
+    std::string place = (folder / "a").string() + "/";
+    EXPECT_EQ(tests::errorOf([&] { gone->getFreeBytes(); }),
+              "Error getting the storage properties for drive letter '" + place +
+                  "' (No such file or directory).");
+    stays->leave = manager.get();
+    folder.write("table", "");
+    manager->update();
+    EXPECT_EQ(stays->log.size(), 3u);
+    // Begins anew with what is there then.
+    manager->addListener(leaves.get());
+    folder.write("table", line("99:1", "b"));
+    manager->update();
+    EXPECT_EQ(leaves->log.back(), "+b");
+    manager->removeListener(leaves.get());
+}
+
+TEST(VolumeManager, WatchesOnlyWhileSomebodyListens) {
+    const auto countThreads = [] { return tests::countEntries("/proc/self/task"); };
+    // The kernel lists a thread for a moment longer than its end can be waited for.
+    auto comesDownTo = [&](auto count) {
+        auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+        while (countThreads() != count && std::chrono::steady_clock::now() < deadline)
+            std::this_thread::yield();
+        return countThreads() == count;
+    };
+    P<posix::CVolumeManager> manager = make<posix::CVolumeManager>();
+    P<CTestListener> first = make<CTestListener>();
+    P<CTestListener> second = make<CTestListener>();
+    std::thread([] {}).join(); // a sanitizer has a thread of its own from the first one on
+    auto before = countThreads();
+    for (int i = 0; i < 50; ++i) {
+        manager->addListener(first.get());
+        manager->addListener(second.get());
+        ASSERT_EQ(countThreads(), before + 1);
+        manager->removeListener(first.get());
+        ASSERT_EQ(countThreads(), before + 1);
+        manager->removeListener(second.get());
+        ASSERT_TRUE(comesDownTo(before));
+    }
+}

@@ -1,0 +1,332 @@
+#include "peru/Errors.h"
+#include "peru/log/LogArea.h"
+#include "peru/log/LogManager.h"
+#include "peru/log/TextFileLog.h"
+#include "peru/uri/URI.h"
+#include "support/TempFolder.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <ctime>
+#include <functional>
+#include <thread>
+
+using namespace peru;
+using namespace peru::literals;
+
+namespace {
+
+// Collects bytes and counts flushes; fails when told to.
+class CTextStream : public CObject, public IOutStream {
+public:
+    void close() override {}
+    P<IURI> getURI() const override { return {}; }
+    bool isAtEnd() override { return true; }
+    void write(const void* buffer, int64_t size) override {
+        if (fails) throw CStreamError("disk full", nullptr);
+        bytes.append(static_cast<const char*>(buffer), static_cast<size_t>(size));
+    }
+    void flush() override { ++flushes; }
+
+    std::string bytes;
+    int flushes = 0;
+    bool fails = false;
+};
+
+// Keeps what comes, as "level source text|extra@time".
+class CMemoryLog : public CLogBase {
+public:
+    explicit CMemoryLog(std::vector<std::string>& journal, std::string name = "")
+        : m_journal(journal), m_name(std::move(name)) {}
+    void enterArea(const P<IString>& name) override { m_journal.push_back(m_name + "enter " + text(name)); }
+    void leaveArea(const P<IString>& name) override { m_journal.push_back(m_name + "leave " + text(name)); }
+    void write(const SLogMessage& message) override {
+        if (!isWanted(message.level)) return;
+        if (onWrite) onWrite();
+        std::string line =
+            m_name + std::to_string(message.level) + " " + text(message.source) + " " + text(message.text);
+        for (const P<IString>& extra : message.extraLines) line += "|" + text(extra);
+        m_journal.push_back(line + "@" + std::to_string(message.time));
+    }
+    std::function<void()> onWrite;
+
+private:
+    static std::string text(const P<IString>& string) { return CString::toStdString(string); }
+    std::vector<std::string>& m_journal;
+    std::string m_name;
+};
+
+using Journal = std::vector<std::string>;
+
+constexpr int64_t kTime = 1000000000000; // 01:46:40 UTC
+
+class TextFileLog : public testing::Test {
+protected:
+    void SetUp() override {
+        setenv("TZ", "UTC", 1);
+        tzset();
+    }
+    std::string written(const SLogMessage& message) {
+        stream->bytes.clear();
+        log->write(message);
+        return stream->bytes;
+    }
+    // Whatever now is, it has eight characters.
+    static std::string withoutTimes(std::string text) {
+        for (size_t start = 0; start < text.size(); start = text.find('\n', start) + 1)
+            text.replace(start, 8, "T");
+        return text;
+    }
+    P<CTextStream> stream = make<CTextStream>();
+    P<CTextFileLog> log = make<CTextFileLog>(P<IOutStream>(stream), false);
+};
+
+TEST_F(TextFileLog, Line_HasItsExactForm) {
+    struct SCase {
+        SLogMessage message;
+        const char* expected;
+    } cases[] = {
+        {{kLogTrace, nullptr, "a"_s, {}, kTime}, "01:46:40 trace - a\n"},
+        {{kLogInfo, "x"_s, "a"_s, {}, kTime}, "01:46:40 [x] info - a\n"},
+        {{kLogWarning, "[x]y]"_s, "a"_s, {}, kTime}, "01:46:40 [[x_y_] Warning - a\n"},
+        {{kLogException, nullptr, "a"_s, {}, kTime}, "01:46:40 EXCEPTION - a\n"},
+        {{kLogError, nullptr, nullptr, {}, kTime}, "01:46:40 ERROR - \n"},
+        {{6, nullptr, "a"_s, {}, kTime}, "01:46:40 UnknownLogLevel - a\n"},
+        {{kLogInfo, nullptr, "a\nb\r\nc\rd"_s, {}, kTime},
+         "01:46:40 info - a\n                b\n                c\n                d\n"},
+        {{kLogInfo, nullptr, "a\n\nb"_s, {}, kTime},
+         "01:46:40 info - a\n                \n                b\n"},
+        {{kLogInfo, nullptr, "a"_s, {"b"_s, "c\nd"_s}, kTime},
+         "01:46:40 info - a\n                b\n                c\n                d\n"},
+        {{kLogInfo, nullptr, "a"_s, {}, -1001}, "23:59:58 info - a\n"},
+        {{kLogInfo, nullptr, P<IString>(make<CUTF16String>(u"\u00e4\u20ac")), {}, kTime},
+         "01:46:40 info - \xc3\xa4\xe2\x82\xac\n"},
+        // Indented by characters and not by bytes.
+        {{kLogInfo, CString::fromUTF8("\xc3\xa4"), "a\nb"_s, {}, kTime},
+         "01:46:40 [\xc3\xa4] info - a\n                    b\n"},
+    };
+    for (const SCase& one : cases) EXPECT_EQ(written(one.message), one.expected);
+}
+
+TEST_F(TextFileLog, LevelBelowTheMinimum_IsNotWritten) {
+    struct SCase {
+        int32_t minimum, level;
+        bool shown;
+    } cases[] = {
+        {3, 4, true},  {4, 4, true},   {5, 4, false},  {5, 6, true},
+        {7, 6, false}, {0, -1, false}, {-1, -1, true},
+    };
+    for (const SCase& one : cases) {
+        log->setMinimumLevel(one.minimum);
+        EXPECT_EQ(!written({one.level, nullptr, "x"_s, {}, kTime}).empty(), one.shown)
+            << one.minimum << " " << one.level;
+    }
+}
+
+TEST_F(TextFileLog, Areas_IndentAndComeBackToZero) {
+    {
+        CLogArea outer(log, "outer"_s);
+        CLogArea inner(log, "inner"_s);
+        log->info(nullptr, "x");
+    }
+    log->leaveArea("never entered"_s);
+    log->info(nullptr, "y");
+    EXPECT_EQ(withoutTimes(stream->bytes), "T trace - [Enter] - outer\n"
+                                           "T trace   - [Enter] - inner\n"
+                                           "T info     - x\n"
+                                           "T trace   - [Leave] - inner\n"
+                                           "T trace - [Leave] - outer\n"
+                                           "T trace - [Leave] - never entered\n"
+                                           "T info - y\n");
+}
+
+TEST_F(TextFileLog, HiddenAreas_StillCountTheDepth) {
+    log->setMinimumLevel(kLogInfo);
+    log->enterArea("a"_s);
+    EXPECT_EQ(stream->bytes, "");
+    EXPECT_EQ(written({kLogInfo, nullptr, "x"_s, {}, kTime}), "01:46:40 info   - x\n");
+    log->setEnabled(false);
+    log->leaveArea("a"_s);
+    EXPECT_EQ(written({kLogError, nullptr, "x"_s, {}, kTime}), "");
+    log->setMinimumLevel(kLogTrace);
+    EXPECT_EQ(written({kLogError, nullptr, "x"_s, {}, kTime}), "") << "a level does not enable it";
+    log->setEnabled(true);
+    EXPECT_EQ(written({kLogInfo, nullptr, "x"_s, {}, kTime}), "01:46:40 info - x\n");
+}
+
+TEST_F(TextFileLog, FlushFlag_FlushesEachLine) {
+    log->info(nullptr, "x");
+    EXPECT_EQ(stream->flushes, 0);
+    auto careful = make<CTextFileLog>(P<IOutStream>(stream), true);
+    careful->info(nullptr, "x\ny");
+    careful->info(nullptr, "z");
+    EXPECT_EQ(stream->flushes, 2);
+}
+
+TEST_F(TextFileLog, FailingStream_EndsTheCallAndLeavesTheLogUsable) {
+    stream->fails = true;
+    EXPECT_THROW(log->info(nullptr, "x"), CStreamError);
+    EXPECT_THROW(log->enterArea("a"_s), CStreamError);
+    stream->fails = false;
+    std::thread([&] { log->info(nullptr, "y"); }).join(); // hangs if the mutex was kept
+    EXPECT_EQ(withoutTimes(stream->bytes), "T info - y\n");
+    {
+        CLogArea area(log, "a"_s);
+        stream->fails = true;
+    } // must not throw
+}
+
+TEST_F(TextFileLog, File_IsAppendedToAndItsErrorsAreFileErrors) {
+    tests::CTempFolder folder;
+    auto file = P<IURI>(make<CURI>(CURI::getFileURI(CString::fromUTF8((folder / "a.log").string()))));
+    for (const char* text : {"first", "second"}) make<CTextFileLog>(file, true)->info(nullptr, text);
+    EXPECT_EQ(withoutTimes(tests::readFile(folder / "a.log")), "T info - first\nT info - second\n");
+    auto nowhere = P<IURI>(make<CURI>(CURI::getFileURI(CString::fromUTF8((folder / "no/a.log").string()))));
+    EXPECT_THROW(make<CTextFileLog>(nowhere, true), CFileError);
+}
+
+TEST_F(TextFileLog, ManyThreads_WriteWholeLines) {
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 4; ++i)
+        threads.emplace_back([&] {
+            for (int k = 0; k < 200; ++k) {
+                log->setMinimumLevel(kLogTrace);
+                log->info("t"_s, "one\ntwo");
+            }
+        });
+    for (std::thread& thread : threads) thread.join();
+    std::string expected;
+    for (int i = 0; i < 800; ++i) expected += "T [t] info - one\nT            two\n";
+    EXPECT_EQ(withoutTimes(stream->bytes), expected);
+}
+
+class LogManager : public testing::Test {
+protected:
+    P<CMemoryLog> addLog(const std::string& name, const P<IString>& source) {
+        auto log = make<CMemoryLog>(journal, name.empty() ? name : name + ":");
+        manager->addLog(log, source);
+        return log;
+    }
+    Journal journal;
+    P<CLogManager> manager = make<CLogManager>();
+};
+
+TEST_F(LogManager, SinksOfTheSource_ComeFirstInTheirOrder) {
+    addLog("all", nullptr);
+    addLog("one", "drive"_s);
+    addLog("two", "drive"_s);
+    addLog("other", "codec"_s);
+    addLog("every", ""_s);
+    // The source's name may come in any encoding.
+    manager->write({kLogWarning, P<IString>(make<CUTF16String>(u"drive")), "x"_s, {"y"_s}, 7});
+    EXPECT_EQ(journal, (Journal{"one:3 drive x|y@7", "two:3 drive x|y@7", "all:3 drive x|y@7",
+                                "every:3 drive x|y@7"}));
+    journal.clear();
+    manager->info(nullptr, "z");
+    EXPECT_EQ(journal, (Journal{"all:2  z@-1", "every:2  z@-1"}));
+}
+
+TEST_F(LogManager, Threshold_HoldsBeforeTheSinks) {
+    auto log = addLog("", nullptr);
+    manager->setMinimumLevel(kLogWarning);
+    manager->info(nullptr, "a");
+    manager->enterArea("area"_s);
+    manager->startFeature("f"_s);
+    manager->leaveArea("area"_s);
+    manager->warning(nullptr, "b");
+    log->setMinimumLevel(kLogError);
+    manager->warning(nullptr, "c");
+    manager->setEnabled(false);
+    manager->error(nullptr, "d");
+    manager->setEnabled(true);
+    manager->error(nullptr, "e");
+    EXPECT_EQ(journal, (Journal{"3  b@-1", "5  e@-1"}));
+}
+
+TEST_F(LogManager, AreaThatSinksHeardOf_IsLeftAlsoAfterTheLevelRose) {
+    addLog("", nullptr);
+    addLog("source", "s"_s);
+    manager->enterArea("a"_s);
+    manager->setMinimumLevel(kLogError);
+    manager->enterArea("b"_s);
+    manager->setMinimumLevel(kLogTrace);
+    manager->leaveArea("b"_s);
+    manager->setMinimumLevel(kLogError);
+    manager->leaveArea("a"_s);
+    EXPECT_EQ(journal, (Journal{"enter a", "leave a"}));
+}
+
+TEST_F(LogManager, AnotherManager_ServesAsSinkAndLeavesByIdentity) {
+    auto host = make<CLogManager>();
+    host->addLog(make<CMemoryLog>(journal), nullptr);
+    // As a host hands it over: known as a manager, removed by another handle of the same object.
+    P<ILogManager> added = host;
+    manager->addLog(P<ILog>(added), ""_s);
+    manager->logException("s"_s, CError("text", "title"));
+    EXPECT_EQ(journal, (Journal{"4 s Type: title\nText: text@-1"}));
+    EXPECT_FALSE(manager->removeLog(P<ILog>(host), "s"_s));
+    EXPECT_TRUE(manager->removeLog(P<ILog>(host), nullptr));
+    EXPECT_FALSE(manager->removeLog(P<ILog>(host), nullptr));
+    manager->info(nullptr, "x");
+    EXPECT_EQ(journal.size(), 1u);
+    EXPECT_THROW(manager->addLog(P<ILog>(manager), nullptr), CInvalidArgError)
+        << "it would call itself for ever";
+    EXPECT_THROW(manager->addLog(nullptr, nullptr), CInvalidArgError);
+}
+
+TEST_F(LogManager, ThrowingSink_EndsTheCallAndReleasesTheMutex) {
+    auto bad = addLog("bad", nullptr);
+    addLog("good", nullptr);
+    bad->onWrite = [] { throw CError("full"); };
+    EXPECT_THROW(manager->info(nullptr, "x"), CError);
+    EXPECT_EQ(journal, Journal{});
+    bad->onWrite = nullptr;
+    std::thread([&] { manager->info(nullptr, "y"); }).join();
+    EXPECT_EQ(journal.size(), 2u);
+}
+
+TEST_F(LogManager, SinkThatLeavesDuringItsCall_DoesNoHarm) {
+    P<CMemoryLog> one = addLog("1", "s"_s);
+    one->onWrite = [&] { manager->removeLog(one, "s"_s); };
+    addLog("all", nullptr);
+    manager->info("s"_s, "x");
+    manager->info("s"_s, "y");
+    EXPECT_EQ(journal, (Journal{"1:2 s x@-1", "all:2 s x@-1", "all:2 s y@-1"}));
+    one->onWrite = nullptr;
+}
+
+TEST_F(LogManager, SinksThatComeAndGo_WhileOthersLog) {
+    std::atomic<bool> stop{false};
+    Journal ignored; // written under the manager's mutex only
+    std::thread writer([&] {
+        while (!stop) manager->info("s"_s, "x");
+    });
+    for (int i = 0; i < 300; ++i) {
+        auto log = make<CMemoryLog>(ignored);
+        P<IString> source = i % 2 ? "s"_s : nullptr;
+        manager->addLog(log, source);
+        EXPECT_TRUE(manager->removeLog(log, source));
+    }
+    stop = true;
+    writer.join();
+}
+
+std::string trace(const char* file, int line, const char* comment) {
+    testing::internal::CaptureStderr();
+    zvrTrace(file, line, comment);
+    return testing::internal::GetCapturedStderr();
+}
+
+TEST(DebugTrace, IsCutToItsBuffer) {
+    std::string wide;
+    for (int i = 0; i < 3000; ++i) wide += "\xe2\x82\xac";
+    const std::string head = "zvr_trace: f (1) c=";
+    std::string line = trace("f", 1, wide.c_str());
+    EXPECT_EQ(line, head + wide.substr(0, 3 * (1023 - head.size()))) << "1023 whole characters";
+    EXPECT_EQ(trace("f", 1, std::string(5000, '\x80').c_str()).substr(0, head.size()), head);
+    EXPECT_EQ(trace("a.cpp", 12, nullptr), "zvr_trace: a.cpp (12)\n");
+}
+
+} // namespace

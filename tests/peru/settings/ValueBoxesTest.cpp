@@ -1,0 +1,86 @@
+#include "peru/settings/ValueBoxes.h"
+
+#include "peru/Errors.h"
+#include "support/Files.h"
+
+#include <bit>
+#include <cmath>
+#include <limits>
+#include <random>
+
+using namespace peru;
+using tests::errorOf;
+using tests::text;
+
+namespace {
+
+// What a box reads from a text and writes again, or the error.
+template <class Box> std::string pass(const char* value) {
+    try {
+        return text(Box::parse(value)->toString());
+    } catch (const CParseError& error) {
+        return text(error.getDescription());
+    }
+}
+
+constexpr const char* kBadInteger = "Error parsing integer.";
+constexpr const char* kBadFloat = "Error parsing floating point value.";
+
+} // namespace
+
+TEST(ValueBoxes, parse_TakesTheWholeTextOrNothing) {
+    const struct {
+        std::string (*pass)(const char*);
+        const char* text;
+        const char* result;
+    } cases[] = {
+        {pass<CBool>, "true", "true"},
+        {pass<CBool>, "false", "false"},
+        {pass<CBool>, "True", kBadInteger},
+        {pass<CBool>, "", kBadInteger},
+        {pass<CInt>, "-0", "0"},
+        {pass<CInt>, "+7", "7"},
+        {pass<CInt>, "-2147483648", "-2147483648"},
+        {pass<CInt>, "2147483648", kBadInteger},
+        {pass<CInt>, "0x10", kBadInteger},
+        {pass<CInt>, " 1", kBadInteger},
+        {pass<CInt>, "1 ", kBadInteger},
+        {pass<CInt>, "+-1", kBadInteger},
+        {pass<CInt>, "1.5", kBadInteger},
+        {pass<CInt>, "", kBadInteger},
+        {pass<CInt64>, "9223372036854775807", "9223372036854775807"},
+        {pass<CInt64>, "9223372036854775808", kBadInteger},
+        {pass<CDouble>, "-0", "-0"},
+        {pass<CDouble>, "1.50", "1.5"},
+        {pass<CDouble>, "-2e3", "-2000"},
+        {pass<CDouble>, "++1", kBadFloat},
+        {pass<CDouble>, "1,5", kBadFloat},
+        {pass<CDouble>, "1e400", kBadFloat},
+        {pass<CDouble>, "nan", "nan"},
+        {pass<CDouble>, "-inf", "-inf"},
+        {pass<CDouble>, "1.5 ", kBadFloat},
+        {pass<CDouble>, "", kBadFloat},
+        {pass<CFloat>, "+0.1", "0.1"},
+        {pass<CFloat>, "1e39", kBadFloat},
+        // Half way between two floats but for its last digit: rounding to a double first goes the wrong way.
+        {pass<CFloat>, "1.00000017881393432617187499", "1.0000001"},
+        {pass<CFloat>, "--1", kBadFloat},
+    };
+    for (const auto& c : cases) EXPECT_EQ(c.pass(c.text), c.result) << c.text;
+}
+
+TEST(ValueBoxes, toString_NumbersComeBackBitForBit) {
+    std::mt19937_64 random(1);
+    for (int i = 0; i < 20000; ++i) {
+        const uint64_t bits = random();
+        const auto wide = std::bit_cast<double>(bits);
+        if (std::isfinite(wide)) {
+            EXPECT_EQ(std::bit_cast<uint64_t>(CDouble::parseValue(CDouble::formatValue(wide))), bits);
+        }
+        const auto half = static_cast<uint32_t>(bits);
+        const auto narrow = std::bit_cast<float>(half);
+        if (std::isfinite(narrow)) {
+            EXPECT_EQ(std::bit_cast<uint32_t>(CFloat::parseValue(CFloat::formatValue(narrow))), half);
+        }
+    }
+}

@@ -1,0 +1,282 @@
+#include "peru/Errors.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "peru/streams/StreamManager.h"
+#include "peru/streams/StringStreams.h"
+#include "peru/streams/posix/DiskStreams.h"
+#include "peru/uri/URI.h"
+#include "support/Files.h"
+#include "support/TempFolder.h"
+
+#include <cstring>
+#include <functional>
+#include <random>
+#include <sys/stat.h>
+#include <thread>
+#include <unistd.h>
+
+namespace {
+
+using namespace peru;
+using namespace peru::posix;
+using tests::errorOf;
+using tests::text;
+using tests::toURI;
+
+void write(IOutStream& stream, const std::string& bytes) {
+    stream.write(bytes.data(), static_cast<int64_t>(bytes.size()));
+}
+
+// Random reads, writes, seeks and cuts on a stream and on a plain byte array must agree throughout.
+void compareWithModel(const P<ISeekableIOStream>& stream, int64_t largest, unsigned seed) {
+    std::mt19937 random(seed);
+    std::string model;
+    size_t position = 0;
+    std::string bytes;
+    for (int i = 0; i < 3000; ++i) {
+        const size_t size = random() % 8 == 0 ? random() % static_cast<size_t>(largest) : random() % 64;
+        switch (random() % 6) {
+        case 0:
+        case 1: {
+            bytes.assign(size, '\0');
+            for (char& c : bytes) c = static_cast<char>(random());
+            write(*stream, bytes);
+            if (size > 0) {
+                model.resize(std::max(model.size(), position + size));
+                model.replace(position, size, bytes);
+            }
+            position += size;
+            break;
+        }
+        case 2:
+        case 3: {
+            bytes.assign(size, '\0');
+            const int64_t count = stream->readSome(bytes.data(), static_cast<int64_t>(size));
+            const size_t expected = std::min(size, model.size() - std::min(position, model.size()));
+            ASSERT_EQ(count, static_cast<int64_t>(expected)) << i;
+            ASSERT_TRUE(expected == 0 || bytes.compare(0, expected, model, position, expected) == 0) << i;
+            position += expected;
+            break;
+        }
+        case 4:
+            position = random() % (model.size() + 100);
+            stream->seek(static_cast<int64_t>(position));
+            break;
+        case 5:
+            if (random() % 16 == 0) {
+                model.resize(random() % (model.size() + 100));
+                stream->setSize(static_cast<int64_t>(model.size()));
+            }
+            break;
+        }
+        ASSERT_EQ(stream->getPosition(), static_cast<int64_t>(position)) << i;
+        ASSERT_EQ(stream->getSize(), static_cast<int64_t>(model.size())) << i;
+        ASSERT_EQ(stream->isAtEnd(), position >= model.size()) << i;
+    }
+    stream->reset();
+    ASSERT_EQ(readAll(*stream), model);
+}
+
+TEST(DiskIOStream, AgreesWithAByteArray) {
+    const tests::CTempFolder folder;
+    for (unsigned seed = 0; seed < 4; ++seed)
+        compareWithModel(make<CDiskIOStream>(toURI(folder / "file"), EOpenMode::create), 200000, seed);
+}
+
+TEST(MemoryIOStream, AgreesWithAByteArray) {
+    for (unsigned seed = 0; seed < 4; ++seed) compareWithModel(make<CMemoryIOStream>(), 5000, seed);
+}
+
+TEST(MemoryIOStream, GrowsByDoubling) {
+    const P<CMemoryIOStream> stream = make<CMemoryIOStream>();
+    int moves = 0;
+    for (int i = 0; i < 100000; ++i) {
+        const uint8_t* data = stream->getBlock()->getData();
+        stream->write("0123456789", 10);
+        moves += stream->getBlock()->getData() != data;
+    }
+    EXPECT_LE(moves, 16);
+}
+
+TEST(Streams, ClosedOnesSayTheirName) {
+    const tests::CTempFolder folder;
+    const P<IURI> uri = toURI(folder.write("file", "abc"));
+    const P<CDiskIOStream> stream = make<CDiskIOStream>(uri, EOpenMode::open);
+    stream->close();
+    stream->close();
+    char c = 0;
+    const std::function<void()> operations[] = {
+        [&] { stream->readSome(&c, 1); }, [&] { stream->read(&c, 1); },   [&] { stream->skip(1); },
+        [&] { stream->write(&c, 1); },    [&] { stream->flush(); },       [&] { stream->seek(0); },
+        [&] { stream->reset(); },         [&] { stream->getPosition(); }, [&] { stream->getSize(); },
+        [&] { stream->setSize(0); },      [&] { stream->isAtEnd(); },     [&] { stream->createMarker(); },
+    };
+    for (const auto& operation : operations)
+        EXPECT_NE(errorOf<CStreamClosedError>(operation).find(text(uri->getAsString())), std::string::npos);
+}
+
+TEST(Streams, ShortReadNamesTheStream) {
+    const tests::CTempFolder folder;
+    const P<IURI> uri = toURI(folder.write("file", "abc"));
+    const P<CDiskInStream> disk = make<CDiskInStream>(uri);
+    char bytes[4];
+    EXPECT_THROW(disk->skip(4), CEndOfStreamError);
+    EXPECT_EQ(errorOf<CEndOfStreamError>([&] { disk->read(bytes, 4); }),
+              "Unexpected end of data stream (uri: '" + text(uri->getAsString()) + "').");
+    EXPECT_EQ(errorOf<CEndOfStreamError>([&] { make<CStringInStream>(newString("abc"))->read(bytes, 4); }),
+              "Unexpected end of data stream.");
+    EXPECT_THROW(disk->readSome(bytes, -1), CInvalidArgError);
+    EXPECT_THROW(disk->seek(-1), CInvalidArgError);
+}
+
+TEST(DiskStream, OpenModes) {
+    const tests::CTempFolder folder;
+    const auto file = folder / "file";
+    const auto put = [&](EOpenMode mode, const std::string& bytes) {
+        const P<CDiskOutStream> stream = make<CDiskOutStream>(toURI(file), mode);
+        write(*stream, bytes);
+        stream->close();
+        return tests::readFile(file);
+    };
+    EXPECT_THROW(put(EOpenMode::open, "x"), CFileNotFoundError);
+    EXPECT_EQ(put(EOpenMode::createNew, "12345"), "12345");
+    EXPECT_THROW(put(EOpenMode::createNew, "x"), CStreamError);
+    EXPECT_EQ(put(EOpenMode::open, "ab"), "ab345");
+    EXPECT_EQ(put(EOpenMode::append, "6"), "ab3456");
+    EXPECT_EQ(put(EOpenMode::create, "x"), "x");
+}
+
+TEST(DiskStream, WhatCannotBeOpenedSaysWhy) {
+    const tests::CTempFolder folder;
+    folder.write("file", "");
+    EXPECT_THROW(make<CDiskInStream>(toURI(folder / "none")), CFileNotFoundError);
+    EXPECT_THROW(make<CDiskInStream>(toURI(folder / "file" / "below")), CFileNotFoundError);
+    EXPECT_THROW(make<CDiskOutStream>(toURI(folder / "none" / "x"), EOpenMode::create), CFileNotFoundError);
+    EXPECT_THROW(make<CDiskInStream>(make<CURI>("file:///dev/null%00x")), CFileNotFoundError);
+    EXPECT_THROW(make<CDiskInStream>(make<CURI>("http://host/x")), CFileNotFoundError);
+    for (const P<IURI>& uri : {toURI(folder.path()), toURI(folder.path())->appendPath("/")}) {
+        const std::string error = errorOf<CStreamError>([&] { make<CDiskInStream>(uri); });
+        EXPECT_NE(error.find("Is a directory"), std::string::npos) << error;
+        EXPECT_NE(error.find(folder.path().filename().string()), std::string::npos) << error;
+    }
+    // Refused to everybody, the superuser included.
+    if (::access("/proc/version", F_OK) == 0) {
+        const std::string large(70000, 'x');
+        EXPECT_THROW(write(*make<CDiskOutStream>(make<CURI>("file:///proc/version"), EOpenMode::open), large),
+                     CURIError);
+    }
+    if (::geteuid() != 0) {
+        ::chmod((folder / "file").c_str(), 0);
+        EXPECT_THROW(make<CDiskInStream>(toURI(folder / "file")), CFileAccessDeniedError);
+    }
+}
+
+TEST(DiskStream, FullDiskIsReported) {
+    const P<IURI> full = make<CURI>("file:///dev/full");
+    const std::string large(200000, 'x');
+    EXPECT_THROW(write(*make<CDiskOutStream>(full, EOpenMode::open), large), CStreamError);
+
+    const P<CDiskOutStream> flushed = make<CDiskOutStream>(full, EOpenMode::open);
+    write(*flushed, "x");
+    EXPECT_THROW(flushed->flush(), CStreamError);
+
+    const P<CDiskOutStream> closed = make<CDiskOutStream>(full, EOpenMode::open);
+    write(*closed, "x");
+    const std::string error = errorOf<CStreamError>([&] { closed->close(); });
+    EXPECT_NE(error.find("No space left on device"), std::string::npos) << error;
+    EXPECT_NE(error.find("file:///dev/full"), std::string::npos) << error;
+    closed->close(); // it is closed all the same
+
+    write(*make<CDiskOutStream>(full, EOpenMode::open), "x"); // destroyed without a word
+}
+
+TEST(DiskStream, PositionsGoBeyond32Bits) {
+    const tests::CTempFolder folder;
+    const P<CDiskIOStream> stream = make<CDiskIOStream>(toURI(folder / "sparse"), EOpenMode::create);
+    const int64_t far = (int64_t{5} << 32) + 3;
+    stream->seek(far);
+    write(*stream, "end");
+    EXPECT_EQ(stream->getSize(), far + 3);
+    stream->seek(far - 1);
+    EXPECT_EQ(readAll(*stream), std::string("\0end", 4));
+}
+
+TEST(DiskStream, ReadsPipes) {
+    const tests::CTempFolder folder;
+    const auto pipe = folder / "pipe";
+    ASSERT_EQ(::mkfifo(pipe.c_str(), 0600), 0);
+    const std::string bytes(300000, 'p');
+    std::thread writer([&] {
+        const P<CDiskOutStream> out = make<CDiskOutStream>(toURI(pipe), EOpenMode::open);
+        write(*out, bytes);
+        out->flush();
+        out->close();
+    });
+    const P<CDiskInStream> in = make<CDiskInStream>(toURI(pipe));
+    in->skip(1000);
+    EXPECT_EQ(readAll(*in).size(), bytes.size() - 1000);
+    EXPECT_TRUE(in->isAtEnd());
+    EXPECT_THROW(in->seek(0), CStreamError);
+    writer.join();
+}
+
+// Knows one URI, for which it answers its own name.
+class CNamedFactory : public CStreamFactory {
+public:
+    CNamedFactory(const char* uri, const char* name) : m_uri(uri), m_name(name) {}
+    P<IInStream> tryGetInStream(const P<IURI>& uri) override {
+        if (!uri->getAsString()->equals(m_uri)) return nullptr;
+        return make<CStringInStream>(newString(m_name));
+    }
+
+private:
+    const char* m_uri;
+    const char* m_name;
+};
+
+TEST(StreamManager, AsksInTheOrderOfRegistration) {
+    const P<CStreamManager> manager = make<CStreamManager>();
+    const P<IStreamFactory> first = make<CNamedFactory>("res:x", "first");
+    const P<IURI> uri = make<CURI>("res:x");
+    manager->addFactory(first);
+    for (int i = 0; i < 20; ++i) manager->addFactory(make<CNamedFactory>("res:x", "later"));
+    EXPECT_EQ(readAll(*manager->getInStream(uri)), "first");
+    manager->removeFactory(first);
+    EXPECT_EQ(readAll(*manager->getInStream(uri)), "later");
+    EXPECT_FALSE(manager->tryGetSeekableInStream(uri)); // known, but not in this kind
+}
+
+// Opens nothing itself, but brings the factories that do, and leaves.
+class CBringingFactory : public CStreamFactory {
+public:
+    explicit CBringingFactory(IStreamManager& manager) : m_manager(manager) {}
+    P<IInStream> tryGetInStream(const P<IURI>&) override {
+        m_manager.removeFactory(P<IStreamFactory>::share(this));
+        for (int i = 0; i < 20; ++i) m_manager.addFactory(make<CNamedFactory>("res:x", "brought"));
+        return nullptr;
+    }
+
+private:
+    IStreamManager& m_manager;
+};
+
+TEST(StreamManager, LetsAFactoryChangeTheListWhileItIsAsked) {
+    const P<CStreamManager> manager = make<CStreamManager>();
+    manager->addFactory(make<CBringingFactory>(*manager));
+    const P<IURI> uri = make<CURI>("res:x");
+    EXPECT_EQ(readAll(*manager->getInStream(uri)), "brought");
+}
+
+TEST(StreamManager, TellsMissingFilesFromUnknownKinds) {
+    const tests::CTempFolder folder;
+    const P<IStreamManager> manager = getStreamManager();
+    EXPECT_FALSE(manager->tryGetInStream(make<CURI>("unknown:x")));
+    EXPECT_FALSE(manager->tryGetInStream(toURI(folder / "none")));
+    EXPECT_THROW(manager->getSeekableInStream(toURI(folder / "none")), CFileNotFoundError);
+    EXPECT_THROW(manager->getInStream(make<CURI>("relative")), CURITypeNotSupportedError);
+    EXPECT_NE(errorOf<CURITypeNotSupportedError>([&] {
+                  manager->getIOStream(make<CURI>("unknown:x"), EOpenMode::create);
+              }).find("unknown:x"),
+              std::string::npos);
+}
+
+} // namespace

@@ -1,0 +1,135 @@
+#include "peru/strings/ICharEncoding.h"
+
+#include "peru/Errors.h"
+#include "peru/strings/StringSupport.h"
+
+#include <gtest/gtest.h>
+
+#include <climits>
+#include <string>
+
+using namespace peru;
+using namespace std::string_literals;
+
+namespace {
+
+const uint8_t* raw(const std::string& bytes) {
+    return reinterpret_cast<const uint8_t*>(bytes.data());
+}
+
+int32_t sizeOf(const std::string& bytes) {
+    return static_cast<int32_t>(bytes.size());
+}
+
+} // namespace
+
+TEST(CharEncoding, UTF8_EncodesEveryCodePointAndRejectsThreeLeadBytes) {
+    P<ICharEncoding> utf8 = getUTF8CharEncoding();
+    for (char32_t ch = 0; ch < 0x110000; ++ch) {
+        uint8_t buffer[4];
+        int32_t size = utf8->encodeChar(ch, buffer, 4, 0);
+        ASSERT_EQ(size, utf8->getEncodedSize(ch)) << std::hex << uint32_t(ch);
+        bool rejected = (ch >= 0x800 && ch < 0x1000) || (ch >= 0x10000 && ch < 0x40000);
+        char32_t back = 0;
+        ASSERT_EQ(utf8->decodeChar(back, buffer, size, 0), rejected ? -1 : size) << std::hex << uint32_t(ch);
+        if (!rejected) {
+            ASSERT_EQ(back, ch);
+            ASSERT_EQ(utf8->decodePrevChar(back, buffer, size, size), 0);
+            ASSERT_EQ(back, ch);
+            ASSERT_EQ(utf8->decodeChar(back, buffer, size - 1, 0), -1) << "cut off";
+        }
+    }
+    uint8_t buffer[4];
+    EXPECT_EQ(utf8->getEncodedSize(0x110000), 0);
+    EXPECT_EQ(utf8->encodeChar(0x110000, buffer, 4, 1), 1);
+    EXPECT_EQ(utf8->encodeChar(0x20AC, buffer, 4, 2), 2) << "does not fit";
+}
+
+TEST(CharEncoding, UTF8_JudgesSequences) {
+    const auto judge = [](const std::string& bytes) {
+        return getUTF8CharEncoding()->getCharSizeAt(raw(bytes), sizeOf(bytes), 0);
+    };
+    // Only an all-zero payload of the lead byte counts as over-long; surrogates pass.
+    for (const char* good : {"a", "\xC1\x81", "\xC3\xA9", "\xE2\x82\xAC", "\xED\xA0\x80", "\xF4\x8F\xBF\xBF"})
+        EXPECT_EQ(judge(good), sizeOf(good)) << testing::PrintToString(good);
+    for (const char* bad : {"\x80", "\xC0\x80", "\xC3\x41", "\xE0\xA0\x80", "\xF0\x9F\x98\x80",
+                            "\xF4\x90\x80\x80", "\xF8\x88\x80\x80", "\xFF"})
+        EXPECT_EQ(judge(bad), -1) << testing::PrintToString(bad);
+}
+
+TEST(CharEncoding, UTF16_TakesPairsOnly) {
+    P<ICharEncoding> utf16 = getUTF16CharEncoding();
+    uint8_t buffer[4];
+    ASSERT_EQ(utf16->encodeChar(0x1F600, buffer, 4, 0), 4);
+    EXPECT_EQ(std::memcmp(buffer, u"\U0001F600", 4), 0);
+    EXPECT_EQ(utf16->getEncodedSize(0xD800), 0);
+    EXPECT_EQ(utf16->getEncodedSize(0xDFFF), 0);
+    const std::string loneHigh("\x3D\xD8\x61\x00", 4);
+    char32_t ch = 0;
+    EXPECT_EQ(utf16->decodeChar(ch, raw(loneHigh), 4, 0), -1);
+    EXPECT_EQ(utf16->decodeNextChar(ch, raw(loneHigh), 4, 0), 4);
+    EXPECT_EQ(ch, U'a');
+    EXPECT_EQ(utf16->countChars(raw(loneHigh), 3, 0), 0) << "half a unit at the end";
+}
+
+// Random bytes, read from either end and one at a time or in bulk, give the same characters.
+TEST(CharEncoding, Directions_Agree) {
+    std::mt19937 random(1);
+    static const uint8_t kLikely[] = {'a',  0x80, 0xA9, 0xC1, 0xC3, 0xE0, 0xE2,
+                                      0xED, 0xF0, 0xF1, 0xF4, 0xD8, 0xDC, 0};
+    for (int round = 0; round < 3000; ++round) {
+        std::string bytes(random() % 40, '\0');
+        for (char& byte : bytes) byte = static_cast<char>(kLikely[random() % std::size(kLikely)]);
+        for (const P<ICharEncoding>& encoding : tests::getAllEncodings()) {
+            if (encoding->getId() == ICharEncoding::kCodePage) continue;
+            std::u32string forward, backward, bulk;
+            std::vector<int32_t> starts, backStarts;
+            char32_t ch;
+            for (int32_t pos = 0; (pos = encoding->findValidChar(raw(bytes), sizeOf(bytes), pos)) >= 0;) {
+                starts.push_back(pos);
+                pos = encoding->decodeChar(ch, raw(bytes), sizeOf(bytes), pos);
+                ASSERT_GT(pos, starts.back());
+                forward.push_back(ch);
+            }
+            for (int32_t pos = sizeOf(bytes);
+                 (pos = encoding->decodePrevValidChar(ch, raw(bytes), sizeOf(bytes), pos)) >= 0;) {
+                backward.insert(backward.begin(), ch);
+                backStarts.insert(backStarts.begin(), pos);
+            }
+            ASSERT_EQ(forward, backward) << encoding->getName() << testing::PrintToString(bytes);
+            ASSERT_EQ(starts, backStarts);
+            ASSERT_EQ(encoding->countChars(raw(bytes), sizeOf(bytes), 0), int32_t(forward.size()));
+            char32_t chars[3];
+            int32_t offsets[3];
+            int32_t count = 0;
+            for (int32_t pos = 0; pos >= 0;) {
+                pos = encoding->decodeChars(chars, 3, count, raw(bytes), sizeOf(bytes), pos, offsets);
+                for (int32_t i = 0; i < count; ++i) ASSERT_EQ(offsets[i], starts[bulk.size() + size_t(i)]);
+                bulk.append(chars, size_t(count));
+            }
+            ASSERT_EQ(forward, bulk);
+            for (size_t i = 0; i < starts.size(); ++i)
+                ASSERT_EQ(encoding->advance(raw(bytes), sizeOf(bytes), int32_t(i)), starts[i]);
+            ASSERT_EQ(encoding->advance(raw(bytes), sizeOf(bytes), int32_t(starts.size())), -1);
+        }
+    }
+}
+
+TEST(CharEncoding, CodePage_FollowsTheLocaleForwardsOnly) {
+    tests::CUnicodeCodePage scope;
+    P<ICharEncoding> cp = getCPCharEncoding();
+    std::string text = "a\xFF\xE2\x82\xAC"; // malformed in the middle
+    char32_t chars[4];
+    int32_t offsets[4];
+    int32_t count = 0;
+    EXPECT_EQ(cp->decodeChars(chars, 4, count, raw(text), sizeOf(text), 0, offsets), 5);
+    ASSERT_EQ(count, 2);
+    EXPECT_EQ(chars[1], U'\u20AC');
+    EXPECT_EQ(offsets[1], 2);
+    EXPECT_EQ(cp->getEncodedSize(0xE9), 2);
+    EXPECT_THROW(cp->findPrevChar(raw(text), 5, 5), CMethodNotImplementedError);
+    EXPECT_THROW(cp->decodePrevChar(chars[0], raw(text), 5, 5), CMethodNotImplementedError);
+    EXPECT_THROW(cp->decodePrevValidChar(chars[0], raw(text), 5, 5), CMethodNotImplementedError);
+    EXPECT_THROW(cp->decodeCharsBackward(chars, 4, count, raw(text), 5, 5, nullptr),
+                 CMethodNotImplementedError);
+}

@@ -1,0 +1,346 @@
+#include "peru/strings/String.h"
+
+#include "peru/Errors.h"
+#include "peru/GlobalObjFactory.h"
+#include "peru/strings/StringSupport.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <string>
+#include <thread>
+
+using namespace peru;
+using namespace peru::literals;
+using tests::bytesOf;
+using tests::decode;
+
+namespace {
+
+int sign(int value) {
+    return (value > 0) - (value < 0);
+}
+
+// The hash as it is defined, one code point at a time.
+uint32_t modelHash(const std::u32string& text) {
+    int32_t h = 0;
+    for (char32_t c : text)
+        h = static_cast<int32_t>(static_cast<uint32_t>(h & 0x0FFFFFFF) << 3) ^
+            (((h >> 2) ^ static_cast<int32_t>(c)) & 0x7FFFFFFF);
+    return static_cast<uint32_t>(h);
+}
+
+std::u32string randomText(std::mt19937& random, const std::u32string& alphabet, size_t maxLength) {
+    std::u32string text(random() % (maxLength + 1), U'\0');
+    for (char32_t& ch : text) ch = alphabet[random() % alphabet.size()];
+    return text;
+}
+
+const std::u32string kAlphabets[] = {
+    U"ab",
+    U"ab\u00E9",
+    U"a\u00E9\u03B1\u20AC",
+    U"a\uFFFD\uE000\U00050000\U0010FFFF",
+};
+
+// Two texts in two of the encodings that hold them, with or without malformed bytes between the characters.
+struct SPair {
+    std::u32string a, b;
+    P<IString> sa, sb;
+};
+
+template <class F> void forRandomPairs(unsigned seed, F&& f) {
+    tests::CUnicodeCodePage codePage;
+    std::mt19937 random(seed);
+    auto encodings = tests::getAllEncodings();
+    for (int round = 0; round < 4000; ++round) {
+        const std::u32string& alphabet = kAlphabets[random() % std::size(kAlphabets)];
+        SPair pair;
+        pair.a = randomText(random, alphabet, random() % 2 ? 8 : random() % 8 ? 60 : 1500);
+        pair.b = random() % 4 ? randomText(random, alphabet, 4) : pair.a;
+        if (random() % 4 == 0) pair.b = pair.a.substr(0, random() % (pair.a.size() + 1)) + pair.b;
+        P<ICharEncoding> ea, eb;
+        do ea = encodings[random() % encodings.size()];
+        while (!tests::canEncode(ea, pair.a));
+        do eb = encodings[random() % encodings.size()];
+        while (!tests::canEncode(eb, pair.b));
+        pair.sa = tests::encode(ea, pair.a, random() % 3 ? nullptr : &random);
+        pair.sb = tests::encode(eb, pair.b, random() % 3 ? nullptr : &random);
+        SCOPED_TRACE(std::string(ea->getName()) + " " + testing::PrintToString(bytesOf(pair.sa)) + " / " +
+                     eb->getName() + " " + testing::PrintToString(bytesOf(pair.sb)));
+        f(pair, random);
+        if (testing::Test::HasFailure()) return;
+    }
+}
+
+} // namespace
+
+TEST(String, Comparing_FollowsCodePoints) {
+    forRandomPairs(1, [](const SPair& p, std::mt19937& random) {
+        ASSERT_EQ(decode(p.sa), p.a);
+        ASSERT_EQ(p.sa->getLength(), int32_t(p.a.size()));
+        ASSERT_EQ(p.sa->getHash(), modelHash(p.a));
+        ASSERT_EQ(p.sa->getHash(), modelHash(p.a)) << "asked again";
+        ASSERT_EQ(sign(p.sa->compare(p.sb)), sign(p.a.compare(p.b)));
+        ASSERT_EQ(p.sa->equals(p.sb), p.a == p.b);
+        ASSERT_EQ(p.sa->equalsIgnoreCase(p.sb->toUpper()), p.a == p.b);
+        ASSERT_EQ(sign(p.sa->compareIgnoreCase(p.sb)), sign(p.a.compare(p.b)));
+        int32_t limit = static_cast<int32_t>(random() % 10);
+        ASSERT_EQ(sign(p.sa->compare(p.sb, limit)),
+                  sign(p.a.substr(0, size_t(limit)).compare(p.b.substr(0, size_t(limit)))));
+        ASSERT_EQ(p.sa->equals(p.sb, limit), p.a.substr(0, size_t(limit)) == p.b.substr(0, size_t(limit)));
+        ASSERT_EQ(p.sa->startsWith(p.sb), p.a.starts_with(p.b));
+        ASSERT_EQ(p.sa->endsWith(p.sb), p.a.ends_with(p.b));
+        size_t from = random() % (p.a.size() + 1);
+        size_t to = from + random() % (p.a.size() - from + 1);
+        SStringPos start = p.sa->getPosition(int32_t(from));
+        SStringPos end = p.sa->getPosition(int32_t(to));
+        ASSERT_EQ(sign(p.sa->compareRange(start, end, p.sb)), sign(p.a.substr(from, to - from).compare(p.b)));
+        ASSERT_EQ(p.sa->startsWithAt(start, p.sb), p.a.substr(from).starts_with(p.b));
+        size_t there = from + random() % 20 - 10; // wraps around before the start
+        SStringPos moved = p.sa->movePosition(start, int32_t(there - from));
+        ASSERT_EQ(moved, there < p.a.size() ? p.sa->getPosition(int32_t(there)) : kStringEnd);
+        ASSERT_EQ(p.sa->getCharAt(int32_t(there)), there < p.a.size() ? p.a[there] : U'\0');
+    });
+}
+
+TEST(String, Finding_StaysWithinItsRange) {
+    forRandomPairs(2, [](const SPair& p, std::mt19937& random) {
+        size_t from = random() % (p.a.size() + 1);
+        size_t to = from + random() % (p.a.size() - from + 1);
+        SStringPos start = p.sa->getPosition(int32_t(from));
+        SStringPos end = p.sa->getPosition(int32_t(to));
+        std::u32string part = p.a.substr(from, to - from);
+        auto expected = [&](size_t place) {
+            return place == std::u32string::npos ? -1 : int32_t(place + from);
+        };
+        bool empty = p.b.empty();
+        SStringPos found = p.sa->find(p.sb, start, end);
+        ASSERT_EQ(found.index, expected(part.find(p.b)));
+        if (found.isFound() && !empty) {
+            ASSERT_TRUE(p.sa->startsWithAt(found, p.sb)) << "offset " << found.offset;
+            ASSERT_EQ(p.sa->getCharAt(found), p.b[0]);
+        }
+        if (!empty) {
+            ASSERT_EQ(p.sa->findChar(p.b[0], start, end).index, expected(part.find(p.b[0])));
+            ASSERT_EQ(p.sa->findAnyOf(p.sb, start, end).index, expected(part.find_first_of(p.b)));
+        }
+        if (p.sa->isEncoding(ICharEncoding::kCodePage)) {
+            ASSERT_THROW(p.sa->findLast(p.sb, start, end), CMethodNotImplementedError);
+            ASSERT_THROW(p.sa->findLastChar('a'), CMethodNotImplementedError);
+            ASSERT_THROW(p.sa->findLastAnyOf("a"), CMethodNotImplementedError);
+            return;
+        }
+        ASSERT_EQ(p.sa->findLast(p.sb, start, end).index, expected(part.rfind(p.b)));
+        if (empty) return;
+        ASSERT_EQ(p.sa->findLastChar(p.b[0], start, end).index, expected(part.rfind(p.b[0])));
+        ASSERT_EQ(p.sa->findLastAnyOf(p.sb, start, end).index, expected(part.find_last_of(p.b)));
+    });
+}
+
+TEST(String, Editing_MatchesAModel) {
+    forRandomPairs(3, [](const SPair& p, std::mt19937& random) {
+        ASSERT_EQ(decode(p.sa->concat(p.sb)), p.a + p.b);
+        size_t from = random() % (p.a.size() + 1);
+        size_t count = random() % (p.a.size() - from + 1);
+        SStringPos pos = p.sa->getPosition(int32_t(from));
+        std::u32string model = p.a;
+        P<IString> inserted = p.sa->insert(pos, p.sb);
+        ASSERT_EQ(decode(inserted), model.insert(from, p.b));
+        ASSERT_TRUE(inserted->isTerminated());
+        model = p.a;
+        ASSERT_EQ(decode(p.sa->replaceRange(pos, int32_t(count), p.sb)), model.replace(from, count, p.b));
+        model = p.a;
+        ASSERT_EQ(decode(p.sa->remove(pos)), model.erase(from));
+        ASSERT_EQ(decode(p.sa->substring(pos, p.sa->movePosition(pos, int32_t(count)))),
+                  p.a.substr(from, count));
+
+        std::u32string wanted = p.a.substr(from, 1 + random() % 2);
+        P<IString> search = tests::encode(getUTF32CharEncoding(), wanted);
+        model.clear();
+        size_t done = 0;
+        for (size_t at; !wanted.empty() && (at = p.a.find(wanted, done)) != std::u32string::npos;) {
+            model += p.a.substr(done, at - done) + p.b;
+            done = at + wanted.size();
+        }
+        model += p.a.substr(done);
+        ASSERT_EQ(decode(p.sa->replace(search, p.sb)), model);
+        for (const P<IString>& converted :
+             {p.sa->toUTF8String(), p.sa->toUTF16String(), p.sa->toWCharString(), p.sa->toCPString()})
+            ASSERT_EQ(decode(converted), p.a);
+    });
+}
+
+TEST(String, Storage_ModesKeepOrShareBytes) {
+    const char* literal = "abc";
+    P<IString> referred = make<CLatin1String>(literal, -1, EStringStorage::refer);
+    EXPECT_EQ(static_cast<const void*>(referred->getData()), literal);
+    EXPECT_TRUE(referred->isTerminated());
+
+    auto* block = static_cast<char*>(std::malloc(3));
+    std::memcpy(block, "abc", 3);
+    P<IString> adopted = make<CString>(getUTF8CharEncoding(), block, 3, EStringStorage::adopt);
+    EXPECT_EQ(static_cast<const void*>(adopted->getData()), block);
+    EXPECT_FALSE(adopted->isTerminated());
+    P<IString> terminated = adopted->getTerminated();
+    EXPECT_STREQ(reinterpret_cast<const char*>(terminated->getData()), "abc");
+}
+
+TEST(String, NullPointer_SharesTheEmptyString) {
+    EXPECT_EQ(newString(static_cast<const char*>(nullptr)), (TNullString<char, CLatin1String>::get()));
+    EXPECT_EQ(newString(static_cast<const wchar_t*>(nullptr)), (TNullString<wchar_t, CWCharString>::get()));
+    EXPECT_TRUE(newString(static_cast<const char16_t*>(nullptr))->isEmpty());
+    EXPECT_TRUE(make<CUTF16String>(nullptr)->isTerminated());
+    EXPECT_TRUE(CString::empty()->equals(static_cast<const wchar_t*>(nullptr)));
+    EXPECT_TRUE(("a" + P<IString>())->equals(P<IString>() + L"a")) << "an empty handle is an empty text";
+}
+
+TEST(String, Slice_OutlivesItsParentAndDoesNotChain) {
+    P<IString> parent = newString(u"one two three");
+    const uint8_t* bytes = parent->getData();
+    P<IString> slice = parent->substring(parent->getPosition(4));
+    EXPECT_TRUE(slice->isTerminated()) << "it ends where its parent does";
+    P<IString> inner = slice->substring(kStringBegin, slice->getPosition(3));
+    EXPECT_FALSE(inner->isTerminated());
+    EXPECT_EQ(inner->getData(), bytes + 8);
+    EXPECT_EQ(parent->substring(kStringBegin), parent);
+    parent = nullptr;
+    slice = nullptr;
+    EXPECT_TRUE(inner->equals("two"));
+    EXPECT_EQ(CString::toStdU16String(inner->toUTF16String()), u"two");
+}
+
+TEST(String, UnencodableCharacter_TurnsTheResultIntoUTF8) {
+    P<IString> latin1 = newString("caf\xE9 ");
+    P<IString> greek = latin1->concat(u"\u03B1");
+    EXPECT_TRUE(greek->isEncoding(ICharEncoding::kUTF8));
+    EXPECT_EQ(CString::toStdString(greek), "caf\xC3\xA9 \xCE\xB1");
+    EXPECT_TRUE(latin1->concat(u"\u00E9")->isEncoding(ICharEncoding::kLatin1));
+    EXPECT_EQ(CString::toStdString(latin1->replace("\xE9", L"\x3B1")), "caf\xCE\xB1 ");
+    EXPECT_EQ(CString::toStdString(u"\u03B1" + latin1), "\xCE\xB1"
+                                                        "caf\xC3\xA9 ");
+    EXPECT_EQ(bytesOf(greek->toLatin1String()), "caf\xE9 ?");
+    EXPECT_TRUE(newString("\xFF")->toUpper()->equals(u"\u0178")) << "its capital is not in Latin-1";
+}
+
+// Bytes that this decoder rejects are carried through edits in the same encoding, never made into characters.
+// UTF-16 does not hold a lone surrogate that comes in from UTF-8, and UTF-8 does not read again all that
+// UTF-16 holds.
+TEST(String, TextThatNoEncodingHolds_GetsSubstitutes) {
+    const P<IString> text = newString(u"\u0905-\u0906");
+    const P<IString> surrogate = make<CUTF8String>("abcdefghijklm\xED\xA0\x80");
+    EXPECT_EQ(decode(text->replace("-", surrogate)), U"\u0905abcdefghijklm?\u0906");
+    EXPECT_EQ(decode(text->replaceRange(text->getPosition(1), 1, surrogate)), U"\u0905abcdefghijklm?\u0906");
+    EXPECT_EQ(decode(text + surrogate), U"\u0905-\u0906abcdefghijklm?");
+}
+
+TEST(String, MalformedBytes_StayInvisible) {
+    P<IString> smile = CString::fromUTF8("a\xF0\x9F\x98\x80");
+    EXPECT_EQ(smile->getLength(), 1);
+    EXPECT_EQ(CString::toStdString("x: " + smile), "x: a\xF0\x9F\x98\x80");
+    EXPECT_EQ(CString::toStdString(smile->concat(smile)), "a\xF0\x9F\x98\x80"
+                                                          "a\xF0\x9F\x98\x80");
+    P<IString> joined = CString::fromUTF8("a\xC3")->concat(CString::fromUTF8("\xA9"
+                                                                             "b"));
+    EXPECT_EQ(decode(joined), U"ab");
+    EXPECT_EQ(newString(u"\x0800")->toUTF8String()->getLength(), 0);
+    EXPECT_EQ(CString::toStdString(newString(u"\x0800")), "\xE0\xA0\x80");
+    EXPECT_TRUE(CString::fromUTF8("\xC1\x81")->equals("A")) << "an over-long spelling that passes";
+    EXPECT_TRUE(CString::fromUTF8("\xC1\x81"
+                                  "b")
+                    ->find("Ab")
+                    .isFound());
+    EXPECT_EQ(CString::toStdU16String(CString::fromUTF8("\xED\xA0\x80")), u"\uFFFD");
+}
+
+TEST(String, UnitCutOffAtTheEnd_IsLeftOut) {
+    P<IString> text = make<CString>(getUTF16CharEncoding(), "a\0b\0c", 5);
+    EXPECT_TRUE(text->concat(u"d")->equals("abd"));
+    EXPECT_TRUE(newString(u"x")->concat(CStringArg(*getUTF16CharEncoding(), "a\0b", 3))->equals("xa"));
+}
+
+TEST(String, ReplaceAbsentText_KeepsTheContent) {
+    P<IString> text = newString("abcabc");
+    EXPECT_TRUE(text->replace("x", "y")->equals(text));
+    EXPECT_TRUE(text->replace("", "y")->equals(text));
+    EXPECT_TRUE(text->replace("abc", "")->isEmpty());
+    EXPECT_TRUE(text->replace("b", "--", text->getPosition(2))->equals("abca--c"));
+    EXPECT_TRUE(text->replace("bc", "-", kStringBegin, text->getPosition(5))->equals("a-abc"));
+}
+
+TEST(String, Tokens_EndWithAnEmptyHandle) {
+    struct {
+        const char* text;
+        std::vector<std::string> tokens;
+    } cases[] = {
+        {"a,b;c", {"a", "b", "c"}}, {"a,", {"a", ""}}, {",", {"", ""}}, {"", {""}}, {"abc", {"abc"}}};
+    for (auto& c : cases) {
+        std::vector<std::string> tokens;
+        P<IString> text = newString(c.text);
+        SStringPos pos = kStringBegin;
+        while (P<IString> token = text->nextToken(pos, ",;")) tokens.push_back(CString::toStdString(token));
+        EXPECT_EQ(tokens, c.tokens) << c.text;
+    }
+    P<IString> text = newString("one--two-three");
+    SStringPos pos = kStringBegin;
+    EXPECT_TRUE(text->nextTokenByString(pos, "--")->equals("one"));
+    EXPECT_TRUE(text->nextTokenByString(pos, "--")->equals("two-three"));
+    EXPECT_FALSE(text->nextTokenByString(pos, "--"));
+}
+
+TEST(String, Trim_CutsBothEnds) {
+    tests::CUnicodeCodePage codePage;
+    struct {
+        const char32_t* text;
+        const char32_t* trimmed;
+    } cases[] = {
+        {U" \t\r\na b\n ", U"a b"}, {U"ab", U"ab"}, {U"  ", U""}, {U"", U""}, {U"\u00A0x\u2003", U"x"}};
+    for (auto& c : cases) {
+        for (const P<ICharEncoding>& encoding : tests::getAllEncodings()) {
+            if (!tests::canEncode(encoding, c.text)) continue;
+            EXPECT_EQ(decode(tests::encode(encoding, c.text)->trim()), c.trimmed) << encoding->getName();
+        }
+    }
+    EXPECT_TRUE(newString("/-a/b-/")->trim("-/")->equals("a/b"));
+    EXPECT_TRUE(newString(u"\u03B1x\u03B1")->trim(u"\u03B1")->equals("x"));
+}
+
+TEST(String, Case_FollowsUnicodeWhateverTheLocale) {
+    EXPECT_TRUE(newString(u"\u00C4\u0416Z")->toLower()->equals(u"\u00E4\u0436z"));
+    EXPECT_TRUE(newString("stra\xDF"
+                          "e")
+                    ->toUpper()
+                    ->equals(u"STRA\u00DFE"));
+    EXPECT_TRUE(newString(u"\u00C4bc")
+                    ->equalsIgnoreCase("\xE4"
+                                       "BC"));
+    EXPECT_LT(newString("ABC")->compareIgnoreCase("abd"), 0);
+    EXPECT_TRUE(newString("ABx")->equalsIgnoreCase("aby", 2));
+}
+
+TEST(String, CompareTo_RefusesOtherObjects) {
+    P<IComparable> text = newString("a");
+    EXPECT_GT(text->compareTo(newString(u"A")), 0);
+    EXPECT_THROW(text->compareTo(getUTF8CharEncoding()), CInvalidArgError);
+}
+
+TEST(String, Shutdown_LeavesStringsUsable) {
+    P<IString> before = CString::empty();
+    CGlobalObjFactory::shutdown();
+    EXPECT_EQ(CString::empty(), before);
+    EXPECT_TRUE(("a" + newString(u"b"))->equals("ab"));
+}
+
+TEST(String, Threads_MayShareOne) {
+    P<IString> text = CString::fromUTF8("shared \xC3\xA9 text");
+    std::vector<std::thread> threads;
+    for (int t = 0; t < 4; ++t)
+        threads.emplace_back([text] {
+            for (int i = 0; i < 500; ++i) {
+                P<IString> slice = text->substring(text->findChar(0xE9));
+                ASSERT_EQ(text->getHash(), modelHash(U"shared \u00E9 text"));
+                ASSERT_TRUE((slice + "!")->endsWith("text!"));
+            }
+        });
+    for (std::thread& thread : threads) thread.join();
+}

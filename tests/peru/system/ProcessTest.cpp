@@ -1,0 +1,135 @@
+#include "peru/Errors.h"
+#include "peru/system/IDynamicLibrary.h"
+#include "peru/system/ITimeManager.h"
+#include "peru/uri/URI.h"
+#include "support/Files.h"
+#include "support/TempFolder.h"
+
+#include <csignal>
+#include <fcntl.h>
+#include <functional>
+#include <sys/wait.h>
+#include <thread>
+#include <unistd.h>
+
+using namespace peru;
+using namespace peru::literals;
+using tests::toURI;
+
+namespace {
+
+constexpr uint32_t kLong = 60000; // only a fault lasts so long
+
+P<IProcess> startShell(const std::string& script, std::vector<std::string> arguments = {}) {
+    std::vector<P<IString>> all{"-c"_s, CString::fromUTF8(script), "sh"_s};
+    for (const std::string& argument : arguments) all.push_back(CString::fromUTF8(argument));
+    return getProcessManager()->start(toURI("/bin/sh"), all);
+}
+
+int runShell(const std::string& script, std::vector<std::string> arguments = {}) {
+    int exitCode = -2;
+    EXPECT_TRUE(startShell(script, std::move(arguments))->wait(kLong, exitCode));
+    return exitCode;
+}
+
+TEST(Process, ExitCode_TellsHowItEnded) {
+    EXPECT_EQ(runShell("exit 0"), 0);
+    EXPECT_EQ(runShell("exit 255"), 255);
+    EXPECT_EQ(runShell("kill -KILL $$"), 128 + SIGKILL);
+}
+
+TEST(Process, Arguments_ArriveByteForByte) {
+    tests::CTempFolder folder;
+    const std::string odd = "two words \"' $HOME \\ \xff\n*";
+    EXPECT_EQ(
+        runShell("printf '%s|%s|%s' \"$#\" \"$1\" \"$2\" > \"$3\"", {odd, "", (folder / "out").string()}), 0);
+    EXPECT_EQ(tests::readFile(folder / "out"), "3|" + odd + "|");
+}
+
+TEST(Process, Child_InheritsTheStandardFilesOnly) {
+    tests::CTempFolder folder;
+    // Without the close-on-exec flag, as a careless library opens it.
+    int open = ::open("/dev/null", O_RDONLY);
+    ASSERT_GE(fcntl(open, F_DUPFD, 100), 100);
+    EXPECT_EQ(runShell("ls /proc/$$/fd > \"$1\"", {(folder / "out").string()}), 0);
+    EXPECT_EQ(tests::readFile(folder / "out").find("100"), std::string::npos);
+    close(100);
+    close(open);
+}
+
+TEST(Process, Child_StartsWithDefaultSignals) {
+    sigset_t set, before;
+    sigemptyset(&set);
+    sigaddset(&set, SIGTERM);
+    pthread_sigmask(SIG_BLOCK, &set, &before);
+    auto oldPipe = std::signal(SIGPIPE, SIG_IGN);
+    EXPECT_EQ(runShell("kill -TERM $$; exit 1"), 128 + SIGTERM);
+    EXPECT_EQ(runShell("kill -PIPE $$; exit 1"), 128 + SIGPIPE);
+    std::signal(SIGPIPE, oldPipe);
+    pthread_sigmask(SIG_SETMASK, &before, nullptr);
+}
+
+TEST(Process, Wait_TimesOutAndTerminateEndsIt) {
+    P<IProcess> process = startShell("exec sleep 1000");
+    int exitCode = -2;
+    EXPECT_FALSE(process->wait(0, exitCode));
+    EXPECT_FALSE(process->wait(20, exitCode));
+    EXPECT_EQ(exitCode, -2);
+    process->terminate();
+    EXPECT_TRUE(process->wait(kLong, exitCode));
+    EXPECT_EQ(exitCode, 128 + SIGTERM);
+    EXPECT_TRUE(process->wait(0, exitCode)) << "a second wait answers the same";
+    EXPECT_EQ(exitCode, 128 + SIGTERM);
+    process->terminate(); // nobody is there any more
+}
+
+TEST(Process, EndedChildOfADroppedHandle_IsCollected) {
+    pid_t id = static_cast<pid_t>(startShell("exit 0")->getId());
+    // A zombie would stay for ever.
+    for (int64_t end = getTimeManager()->getTime() + kLong; kill(id, 0) == 0;) {
+        ASSERT_LT(getTimeManager()->getTime(), end);
+        std::this_thread::yield();
+    }
+    EXPECT_EQ(errno, ESRCH);
+}
+
+TEST(Process, WhatCannotBeStarted_IsTold) {
+    tests::CTempFolder folder;
+    const std::string missing = (folder / "no such program").string();
+    EXPECT_EQ(tests::errorOf<CError>([&] { getProcessManager()->start(toURI(missing), {}); }),
+              "Error starting '" + missing + "' (No such file or directory).");
+    EXPECT_THROW(getProcessManager()->start(toURI(folder.write("text", "x")), {}), CError);
+    EXPECT_THROW(getProcessManager()->start(make<CURI>("http://host/program"), {}), CError);
+}
+
+TEST(DynamicLibrary, SymbolsAreFoundByNameAndByFile) {
+    P<IDynamicLibrary> byName = getDynamicLibraryLoader()->loadByName("libm.so.6");
+    auto* cosine = reinterpret_cast<double (*)(double)>(byName->findSymbol("cos"));
+    ASSERT_TRUE(cosine);
+    EXPECT_EQ(cosine(0), 1);
+    EXPECT_EQ(byName->findSymbol("no_such_function"), nullptr);
+}
+
+TEST(DynamicLibrary, FailureTellsFileAndReason) {
+    tests::CTempFolder folder;
+    std::filesystem::path text = folder.write("text \xc3\xa4.so", "not a library");
+    struct SCase {
+        std::function<void()> load;
+        std::string name, reason;
+    } cases[] = {
+        {[&] { getDynamicLibraryLoader()->load(toURI(text)); }, text.string(), "file too short"},
+        {[&] { getDynamicLibraryLoader()->load(toURI(folder / "no.so")); }, (folder / "no.so").string(),
+         "No such file"},
+        {[] { getDynamicLibraryLoader()->loadByName("libno-such.so"); }, "libno-such.so", "No such file"},
+        {[] { getDynamicLibraryLoader()->loadByName(""); }, "''", "no name"},
+        // A relative file is looked for in the current folder, and never in the platform's.
+        {[] { getDynamicLibraryLoader()->load(toURI("libm.so.6")); }, "./libm.so.6", "No such file"},
+    };
+    for (const SCase& one : cases) {
+        const std::string description = tests::errorOf<CError>(one.load);
+        EXPECT_NE(description.find(one.name), std::string::npos) << description;
+        EXPECT_NE(description.find(one.reason), std::string::npos) << description;
+    }
+}
+
+} // namespace

@@ -1,0 +1,194 @@
+#include "peru/threads/IMutex.h"
+#include "peru/threads/IThreadManager.h"
+#include "support/Files.h"
+#include "support/TempFolder.h"
+
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <cstdlib>
+#include <sys/mman.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <thread>
+#include <unistd.h>
+
+using namespace peru;
+
+namespace {
+
+class GlobalMutex : public testing::Test {
+protected:
+    void SetUp() override {
+        std::filesystem::permissions(m_folder.path(), std::filesystem::perms::owner_all);
+        setenv("XDG_RUNTIME_DIR", m_folder.path().c_str(), 1);
+    }
+    void TearDown() override { unsetenv("XDG_RUNTIME_DIR"); }
+
+    static P<IMutex> open(const std::string& name) {
+        return getMutexFactory()->createGlobalMutex(CString::fromUTF8(name));
+    }
+    std::vector<std::filesystem::path> files() const {
+        std::vector<std::filesystem::path> result;
+        for (const auto& entry : std::filesystem::directory_iterator(m_folder.path()))
+            result.push_back(entry.path());
+        return result;
+    }
+    // Runs `function` in a child, which then ends without any clean-up; answers how.
+    template <class F> static int runChild(F function) {
+        pid_t id = startChild(function);
+        int status = 0;
+        waitpid(id, &status, 0);
+        return status;
+    }
+    template <class F> static pid_t startChild(F function) {
+        pid_t id = fork();
+        if (id == 0) {
+            function();
+            _exit(0);
+        }
+        return id;
+    }
+
+    static bool isFreeElsewhere(const char* name) {
+        return runChild([name] { _exit(open(name)->tryLock() ? 0 : 1); }) == 0;
+    }
+
+    tests::CTempFolder m_folder;
+};
+
+TEST_F(GlobalMutex, AbandonedByDeadProcess_NextOwnerGetsItWithoutError) {
+    P<IMutex> mutex = open("abandoned");
+    for (int round = 0; round < 3; ++round) {
+        int status = runChild([] {
+            P<IMutex> theirs = open("abandoned");
+            theirs->lock();
+            theirs->lock();
+            raise(SIGKILL);
+        });
+        ASSERT_TRUE(WIFSIGNALED(status));
+        if (round == 2)
+            ASSERT_TRUE(mutex->tryLock());
+        else
+            mutex->lock();
+        // One unlock sets it free: the dead owner's nesting is not inherited.
+        mutex->unlock();
+        EXPECT_TRUE(isFreeElsewhere("abandoned"));
+    }
+}
+
+TEST_F(GlobalMutex, AbandonedByEndedThread_IsRecovered) {
+    P<IMutex> mutex = open("thread");
+    std::thread([&] { mutex->lock(); }).join();
+    ASSERT_TRUE(mutex->tryLock());
+    mutex->unlock();
+}
+
+TEST_F(GlobalMutex, SeveralProcesses_LoseNoIncrement) {
+    constexpr int kRounds = 3000, kProcesses = 3;
+    void* memory = mmap(nullptr, sizeof(int), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0);
+    ASSERT_NE(memory, MAP_FAILED);
+    auto* counter = static_cast<volatile int*>(memory);
+    // The children make the segment themselves, all at the same time.
+    std::vector<pid_t> children;
+    for (int i = 0; i < kProcesses; ++i)
+        children.push_back(startChild([&] {
+            for (int k = 0; k < kRounds; ++k) {
+                CMutexLock lock(open("counter"));
+                *counter = *counter + 1;
+            }
+        }));
+    for (pid_t child : children) {
+        int status = -1;
+        waitpid(child, &status, 0);
+        EXPECT_EQ(status, 0);
+    }
+    EXPECT_EQ(*counter, kRounds * kProcesses);
+    munmap(memory, sizeof(int));
+}
+
+TEST_F(GlobalMutex, IsReentrantAlsoThroughASecondHandle) {
+    P<IMutex> one = open("twice"), two = open("twice");
+    one->lock();
+    two->lock();
+    one->unlock();
+    one.reset();
+    EXPECT_FALSE(isFreeElsewhere("twice"));
+    two->unlock();
+    EXPECT_TRUE(isFreeElsewhere("twice"));
+}
+
+TEST_F(GlobalMutex, LastHandleDroppedWhileLocked_StaysLockedUntilTheThreadEnds) {
+    std::thread([] {
+        open("dropped")->lock();
+        EXPECT_FALSE(isFreeElsewhere("dropped"));
+    }).join();
+    EXPECT_TRUE(isFreeElsewhere("dropped"));
+}
+
+TEST_F(GlobalMutex, AnyText_IsANameOfItsOwn) {
+    std::string longName(5000, 'x');
+    const std::string names[] = {
+        "",    ".",        "..",   "../../etc/passwd", "a/b",          "a%2fb",  "a b",
+        "A b", "\xc3\xa4", "a\nb", longName + "1",     longName + "2", longName, longName + "12",
+    };
+    std::vector<P<IMutex>> held;
+    for (const std::string& name : names) {
+        held.push_back(open(name));
+        held.back()->lock();
+    }
+    EXPECT_EQ(files().size(), std::size(names));
+    for (const P<IMutex>& mutex : held) mutex->unlock();
+}
+
+TEST_F(GlobalMutex, Segment_IsPrivateAlsoUnderAnOpenMask) {
+    mode_t before = umask(0);
+    open("private");
+    umask(before);
+    ASSERT_EQ(files().size(), 1u);
+    struct stat status;
+    ASSERT_EQ(stat(files()[0].c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 07777, 0600u);
+    EXPECT_EQ(status.st_uid, geteuid());
+}
+
+// What a maker that died half way, or an earlier run of the machine, may leave behind.
+TEST_F(GlobalMutex, HalfMadeSegment_IsMadeAnew) {
+    open("half");
+    std::filesystem::path file = files().at(0);
+    const std::string ready = tests::readFile(file);
+    std::string noStamp = ready, otherRun = ready;
+    noStamp.replace(0, 4, 4, '\0');
+    otherRun[10] ^= 1;                                                  // within the run's mark
+    otherRun.replace(48, ready.size() - 48, ready.size() - 48, '\x7f'); // an owner that is no more
+    for (const std::string& bytes : {std::string(), ready.substr(0, 20), noStamp, otherRun}) {
+        std::ofstream(file, std::ios::binary | std::ios::trunc) << bytes;
+        P<IMutex> mutex = open("half");
+        EXPECT_TRUE(mutex->tryLock());
+        mutex->unlock();
+    }
+}
+
+TEST_F(GlobalMutex, WhatIsNotTheUsersOwnFile_IsRefused) {
+    open("refused");
+    std::filesystem::path file = files().at(0);
+    const std::string message = "Error createing global mutex refused";
+    auto make = [] { open("refused"); };
+
+    chmod(file.c_str(), 0666);
+    EXPECT_EQ(tests::errorOf(make), message);
+    std::filesystem::rename(file, m_folder / "elsewhere");
+    chmod((m_folder / "elsewhere").c_str(), 0600);
+    std::filesystem::create_symlink(m_folder / "elsewhere", file);
+    EXPECT_EQ(tests::errorOf(make), message);
+    std::filesystem::remove(file);
+    std::filesystem::create_directory(file);
+    EXPECT_EQ(tests::errorOf(make), message);
+    std::filesystem::remove(file);
+    ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
+    EXPECT_EQ(tests::errorOf(make), message);
+    std::filesystem::remove(file);
+    EXPECT_NO_THROW(make());
+}
+
+} // namespace

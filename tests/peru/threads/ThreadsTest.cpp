@@ -1,0 +1,335 @@
+#include "peru/Errors.h"
+#include "peru/log/ILog.h"
+#include "peru/log/LogBase.h"
+#include "peru/system/ITimeManager.h"
+#include "peru/threads/IMutex.h"
+#include "peru/threads/ISignal.h"
+#include "peru/threads/IThreadManager.h"
+#include "peru/threads/ThreadLocalStorage.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <functional>
+#include <sched.h>
+#include <stdexcept>
+#include <sys/resource.h>
+#include <thread>
+#include <unistd.h>
+
+using namespace peru;
+using namespace peru::literals;
+
+namespace {
+
+class CFunctionAction : public CObject, public IAction {
+public:
+    explicit CFunctionAction(std::function<void()> function) : m_function(std::move(function)) {}
+    void run() override { m_function(); }
+
+private:
+    std::function<void()> m_function;
+};
+
+P<IThread> runThread(std::function<void()> function) {
+    return getThreadManager()->createThread(P<IAction>(make<CFunctionAction>(std::move(function))));
+}
+
+// Counts its living instances.
+class CWitness : public CObject {
+public:
+    explicit CWitness(std::atomic<int>& living) : m_living(living) { ++m_living; }
+    ~CWitness() override { --m_living; }
+
+private:
+    std::atomic<int>& m_living;
+};
+
+TEST(Mutex, LockedTwice_NeedsTwoUnlocks) {
+    P<IMutex> mutex = getMutexFactory()->createMutex();
+    auto isFree = [&] {
+        bool result = false;
+        runThread([&] {
+            result = mutex->tryLock();
+            if (result) mutex->unlock();
+        })->wait();
+        return result;
+    };
+    mutex->lock();
+    EXPECT_TRUE(mutex->tryLock());
+    mutex->unlock();
+    EXPECT_FALSE(isFree());
+    mutex->unlock();
+    EXPECT_TRUE(isFree());
+}
+
+TEST(Mutex, ManyThreads_LoseNoIncrement) {
+    P<IMutex> mutex = getMutexFactory()->createMutex();
+    int counter = 0;
+    std::vector<P<IThread>> threads;
+    for (int i = 0; i < 4; ++i)
+        threads.push_back(runThread([&] {
+            for (int k = 0; k < 2000; ++k) {
+                CMutexLock lock(mutex);
+                ++counter;
+            }
+        }));
+    for (const P<IThread>& thread : threads) thread->wait();
+    EXPECT_EQ(counter, 8000);
+}
+
+TEST(Signal, IsManualReset) {
+    P<ISignal> signal = getSignalFactory()->createSignal();
+    EXPECT_FALSE(signal->wait(0));
+    signal->set();
+    signal->wait();
+    EXPECT_TRUE(signal->wait(0)) << "a wait must not reset it";
+    EXPECT_TRUE(signal->wait(1000));
+    signal->reset();
+    int64_t start = getTimeManager()->getMonotonicTime();
+    EXPECT_FALSE(signal->wait(30));
+    EXPECT_GE(getTimeManager()->getMonotonicTime() - start, 30 * 1000000);
+}
+
+// The waiter may come to run only after the reset; it was released all the same.
+TEST(Signal, SetAndResetAtOnce_ReleasesWhoWaited) {
+    P<ISignal> signal = getSignalFactory()->createSignal();
+    std::atomic<bool> released{false};
+    P<IThread> waiter = runThread([&] {
+        signal->wait();
+        released = true;
+    });
+    while (!released) {
+        signal->set();
+        signal->reset();
+        getThreadManager()->yield(true);
+    }
+    waiter->wait();
+}
+
+TEST(Thread, Wait_ServesSeveralWaitersAndTheLateOne) {
+    P<ISignal> go = getSignalFactory()->createSignal();
+    std::atomic<bool> done{false};
+    P<IThread> thread = runThread([&] {
+        go->wait();
+        done = true;
+    });
+    std::atomic<int> tooEarly{0};
+    std::vector<P<IThread>> waiters;
+    for (int i = 0; i < 3; ++i)
+        waiters.push_back(runThread([&] {
+            thread->wait();
+            if (!done) ++tooEarly;
+        }));
+    go->set();
+    for (const P<IThread>& waiter : waiters) waiter->wait();
+    thread->wait();
+    EXPECT_EQ(tooEarly, 0);
+}
+
+TEST(Thread, DroppedHandle_DoesNotStopItAndActionLives) {
+    P<ISignal> go = getSignalFactory()->createSignal(), done = getSignalFactory()->createSignal();
+    std::atomic<int> living{0};
+    {
+        auto witness = make<CWitness>(living);
+        runThread([witness, go, done] {
+            go->wait();
+            done->set();
+        });
+    }
+    EXPECT_EQ(living, 1);
+    go->set();
+    EXPECT_TRUE(done->wait(20000));
+    while (living != 0) getThreadManager()->yield(true); // the count outlives its last user
+}
+
+TEST(Thread, EndedThread_HasLetItsActionGo) {
+    std::atomic<int> living{0};
+    auto witness = make<CWitness>(living);
+    P<IThread> thread = runThread([witness] {});
+    witness.reset();
+    thread->wait();
+    EXPECT_EQ(living, 0);
+}
+
+// An owner that is released last by its own thread waits for that thread in its destructor.
+TEST(Thread, WaitingForItself_ReturnsAfterTheBodyAndThrowsWithin) {
+    class COwner : public CObject {
+    public:
+        explicit COwner(P<ISignal> gone) : m_gone(std::move(gone)) {}
+        ~COwner() override {
+            thread->wait();
+            m_gone->set();
+        }
+        P<IThread> thread;
+
+    private:
+        P<ISignal> m_gone;
+    };
+    P<ISignal> go = getSignalFactory()->createSignal(), gone = getSignalFactory()->createSignal();
+    auto owner = make<COwner>(gone);
+    SThreadBody body;
+    body.owner = PFrail<IBase>(owner.get(), true);
+    body.argument = go.get();
+    body.function = [](IBase*, void* argument) {
+        static_cast<ISignal*>(argument)->wait();
+        EXPECT_THROW(getThreadManager()->getCurrentThread()->wait(), CInvalidObjectStateError);
+    };
+    owner->thread = getThreadManager()->createThread(body);
+    owner.reset();
+    body.owner = {};
+    go->set();
+    EXPECT_TRUE(gone->wait(20000));
+}
+
+TEST(Thread, ForeignThread_HasAnObjectThatEndsWithIt) {
+    P<IThread> foreign;
+    std::thread([&] {
+        foreign = getThreadManager()->getCurrentThread();
+        EXPECT_TRUE(foreign == getThreadManager()->getCurrentThread());
+    }).join();
+    foreign->wait();
+    EXPECT_NO_THROW(foreign->setPriority(1)) << "its id may belong to another thread by now";
+    EXPECT_THROW(foreign->setPriority(7), CError);
+    EXPECT_THROW(getThreadManager()->createThread(SThreadBody()), CInvalidArgError);
+}
+
+TEST(Thread, Priority_LowersThisThreadOnly) {
+    const int before = getpriority(PRIO_PROCESS, 0);
+    runThread([] {
+        P<IThread> self = getThreadManager()->getCurrentThread();
+        auto id = static_cast<id_t>(gettid());
+        self->setPriority(3);
+        self->setPriority(2);
+        self->setPriority(2); // the same step twice is harmless
+        EXPECT_GE(getpriority(PRIO_PROCESS, id), 5);
+        self->setPriority(1);
+        EXPECT_EQ(sched_getscheduler(gettid()), SCHED_BATCH);
+        self->setPriority(0);
+        EXPECT_EQ(sched_getscheduler(gettid()), SCHED_IDLE);
+        // Whether the way back is allowed depends on the user; it is no error either way.
+        for (int step : {6, 3}) EXPECT_NO_THROW(self->setPriority(step)) << step;
+        for (int step : {-1, 7}) EXPECT_THROW(self->setPriority(step), CError) << step;
+    })->wait();
+    EXPECT_EQ(getpriority(PRIO_PROCESS, 0), before);
+}
+
+TEST(Thread, PriorityRightAfterStart_ReachesTheThread) {
+    P<ISignal> go = getSignalFactory()->createSignal();
+    int policy = -1;
+    P<IThread> inside;
+    P<IThread> thread = runThread([&] {
+        go->wait();
+        policy = sched_getscheduler(0);
+        inside = getThreadManager()->getCurrentThread();
+    });
+    thread->setPriority(1);
+    go->set();
+    thread->wait();
+    EXPECT_EQ(policy, SCHED_BATCH);
+    EXPECT_TRUE(inside == thread);
+}
+
+TEST(Thread, EscapedException_IsLoggedAndEndsTheThreadOnly) {
+    class CLastMessage : public CLogBase {
+    public:
+        void enterArea(const P<IString>&) override {}
+        void leaveArea(const P<IString>&) override {}
+        void write(const SLogMessage& message) override {
+            texts.push_back(CString::toStdString(message.text));
+        }
+        std::vector<std::string> texts;
+    };
+    auto log = make<CLastMessage>();
+    getLogManager()->addLog(log, nullptr);
+    runThread([] { throw CError("no decoder", "Trouble"); })->wait();
+    runThread([] { throw std::runtime_error("plain"); })->wait();
+    runThread([] { throw 1; })->wait();
+    getLogManager()->removeLog(log, nullptr);
+    ASSERT_EQ(log->texts.size(), 3u);
+    EXPECT_EQ(log->texts[0], "Type: Trouble\nText: no decoder");
+    EXPECT_EQ(log->texts[1], "Type: Error\nText: plain");
+    EXPECT_EQ(log->texts[2], "Type: Error\nText: Unspecified error");
+}
+
+#ifndef TONEWRIGHT_SANITIZED // they cannot live within a limit of address space
+TEST(Thread, NoMemoryForAnotherStack_IsTold) {
+    P<ISignal> never = getSignalFactory()->createSignal();
+    auto fail = [&] {
+        rlimit limit{1, 1};
+        setrlimit(RLIMIT_AS, &limit);
+        try {
+            // Some stacks of ended threads are kept for reuse.
+            for (int i = 0; i < 100; ++i) runThread([&] { never->wait(); });
+        } catch (const CError& error) {
+            std::string text = CString::toStdString(error.getDescription());
+            std::fputs((text + "\n").c_str(), stderr);
+            std::_Exit(3);
+        }
+        std::_Exit(0);
+    };
+    EXPECT_EXIT(fail(), testing::ExitedWithCode(3), "Error creating thread \\(.+\\)\\.");
+}
+#endif
+
+TEST(ThreadLocalStorage, EachThread_HasAValueThatDiesWithIt) {
+    std::atomic<int> living{0};
+    auto slot = make<CThreadLocalStorage>();
+    slot->set(make<CWitness>(living));
+    auto use = [&] {
+        EXPECT_FALSE(slot->get());
+        slot->set(make<CWitness>(living));
+        slot->set(make<CWitness>(living)); // releases the first
+        EXPECT_EQ(living, 2);
+        EXPECT_TRUE(slot->get());
+    };
+    runThread(use)->wait();
+    EXPECT_EQ(living, 1);
+    std::thread(use).join(); // a thread that nobody here has made
+    EXPECT_EQ(living, 1);
+    slot->set(nullptr);
+    EXPECT_EQ(living, 0);
+}
+
+TEST(ThreadLocalStorage, DyingSlot_ReleasesTheValuesOfAllThreads) {
+    std::atomic<int> living{0};
+    auto slot = make<CThreadLocalStorage>(), other = make<CThreadLocalStorage>();
+    P<ISignal> ready = getSignalFactory()->createSignal(), end = getSignalFactory()->createSignal();
+    P<IThread> thread = runThread([&, raw = slot.get()] {
+        raw->set(make<CWitness>(living));
+        other->set(make<CWitness>(living));
+        ready->set();
+        end->wait();
+        EXPECT_TRUE(other->get());
+    });
+    ready->wait();
+    slot.reset();
+    EXPECT_EQ(living, 1);
+    end->set();
+    thread->wait();
+    EXPECT_EQ(living, 0);
+}
+
+// A value's destructor that stores into a slot while its thread ends.
+TEST(ThreadLocalStorage, ValueThatSetsSlotsWhileDying_LeavesNothing) {
+    class CLastWord : public CObject {
+    public:
+        CLastWord(P<CThreadLocalStorage> slot, std::atomic<int>& living)
+            : m_slot(std::move(slot)), m_living(living) {}
+        ~CLastWord() override { m_slot->set(make<CWitness>(m_living)); }
+
+    private:
+        P<CThreadLocalStorage> m_slot;
+        std::atomic<int>& m_living;
+    };
+    std::atomic<int> living{0};
+    auto first = make<CThreadLocalStorage>(), second = make<CThreadLocalStorage>();
+    auto use = [&] { first->set(make<CLastWord>(second, living)); };
+    runThread(use)->wait();
+    EXPECT_EQ(living, 0);
+    std::thread(use).join();
+    EXPECT_EQ(living, 0);
+}
+
+} // namespace

@@ -1,0 +1,122 @@
+#include "peru/threads/WorkerManager.h"
+#include "peru/system/ITimeManager.h"
+
+#include <gtest/gtest.h>
+
+#include <functional>
+#include <string>
+
+using namespace peru;
+
+namespace {
+
+using Journal = std::string;
+
+class CWorker : public CObject, public IWorker {
+public:
+    CWorker(char name, Journal& journal) : m_name(name), m_journal(journal) {}
+    void work() override {
+        m_journal += m_name;
+        if (onWork) onWork();
+    }
+    void attached(IWorkerManager*) override { m_journal += std::string("+") + m_name; }
+    void detached(IWorkerManager* manager) override {
+        m_journal += std::string("-") + m_name;
+        if (onDetached) onDetached(manager);
+    }
+    std::function<void()> onWork;
+    std::function<void(IWorkerManager*)> onDetached;
+
+private:
+    char m_name;
+    Journal& m_journal;
+};
+
+class CListener : public CObject, public IWorkLoopListener {
+public:
+    CListener(char name, Journal& journal) : m_name(name), m_journal(journal) {}
+    void workersChanged(IWorkerManager* manager) override {
+        m_journal += m_name;
+        if (leaves) manager->removeListener(this);
+    }
+    bool leaves = false;
+
+private:
+    char m_name;
+    Journal& m_journal;
+};
+
+class WorkerManager : public testing::Test {
+protected:
+    WorkerManager() {
+        for (const P<CWorker>& worker : {a, b, c}) manager->addWorker(worker.get());
+        journal.clear();
+    }
+    Journal work() {
+        journal.clear();
+        manager->work();
+        return journal;
+    }
+    Journal journal;
+    P<CWorker> a = make<CWorker>('a', journal), b = make<CWorker>('b', journal),
+               c = make<CWorker>('c', journal);
+    P<CWorkerManager> manager = make<CWorkerManager>();
+};
+
+TEST_F(WorkerManager, Work_GoesFromLastToFirstAndStampsTheSlice) {
+    int64_t before = getTimeManager()->getTime();
+    EXPECT_EQ(work(), "cba");
+    EXPECT_GE(manager->getSliceTime(), before);
+}
+
+TEST_F(WorkerManager, RemovalDuringWork_SkipsNobodyWhoIsStillThere) {
+    c->onWork = [&] { manager->removeWorker(c.get()); };
+    EXPECT_EQ(work(), "c-cba") << "itself, the last";
+    EXPECT_EQ(work(), "ba");
+    manager->addWorker(c.get());
+    b->onWork = [&] { manager->removeWorker(a.get()); };
+    c->onWork = nullptr;
+    EXPECT_EQ(work(), "cb-ab") << "one that would have come later; the walk goes by index";
+    c->onWork = [&] {
+        for (const P<CWorker>& worker : {b, c}) manager->removeWorker(worker.get());
+    };
+    EXPECT_EQ(work(), "c-b-c") << "all at once";
+}
+
+TEST_F(WorkerManager, AddedDuringWork_RunsFromTheNextSlice) {
+    auto d = make<CWorker>('d', journal);
+    b->onWork = [&] {
+        manager->addWorker(d.get());
+        b->onWork = nullptr;
+    };
+    EXPECT_EQ(work(), "cb+da");
+    EXPECT_EQ(work(), "dcba");
+    manager->removeWorker(d.get());
+}
+
+TEST_F(WorkerManager, Listeners_AreToldBetweenEntryAndAttached) {
+    auto first = make<CListener>('1', journal), second = make<CListener>('2', journal);
+    auto d = make<CWorker>('d', journal);
+    manager->addListener(first.get());
+    manager->addListener(second.get());
+    manager->addWorker(d.get());
+    EXPECT_EQ(journal, "21+d");
+    journal.clear();
+    second->leaves = true;
+    EXPECT_TRUE(manager->removeWorker(d.get()));
+    EXPECT_EQ(journal, "-d21");
+    journal.clear();
+    EXPECT_FALSE(manager->removeWorker(d.get()));
+    EXPECT_EQ(journal, "") << "nothing changed";
+    EXPECT_FALSE(manager->removeListener(second.get()));
+    EXPECT_TRUE(manager->removeListener(first.get()));
+}
+
+TEST_F(WorkerManager, Destruction_DetachesLastFirst) {
+    // A worker that leaves from within its farewell is not told twice.
+    b->onDetached = [&](IWorkerManager* dying) { EXPECT_FALSE(dying->removeWorker(b.get())); };
+    manager.reset();
+    EXPECT_EQ(journal, "-c-b-a");
+}
+
+} // namespace

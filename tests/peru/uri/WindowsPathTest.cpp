@@ -1,0 +1,76 @@
+#include "support/Files.h"
+
+#include "peru/uri/URI.h"
+#include "peru/uri/WindowsPath.h"
+
+using namespace peru;
+using tests::text;
+
+namespace {
+
+std::string toWindows(const std::string& uri, bool knowsLongForm = true) {
+    return text(toWindowsPath(make<CURI>(CString::fromUTF8(uri)), knowsLongForm));
+}
+
+std::string fromWindows(const std::string& path) {
+    return text(fromWindowsPath(CString::fromUTF8(path))->getAsString());
+}
+
+std::string fill(const std::string& start, size_t length) {
+    return start + std::string(length - start.size(), 'a');
+}
+
+} // namespace
+
+TEST(WindowsPath, FollowsTheGrammarBothWays) {
+    const std::pair<const char*, const char*> cases[] = {
+        {"file:///C:/Music/a%20b.wav", "C:\\Music\\a b.wav"},
+        {"file://server/share/x.wav", "\\\\server\\share\\x.wav"},
+        {"file://server/", "\\\\server\\"},
+        {"music/a.wav", "music\\a.wav"},
+        {"file:///C:/", "C:\\"},
+        {"file:///C:/%E4%BD%A0%23%25.mp3", "C:\\\xe4\xbd\xa0#%.mp3"},
+    };
+    for (const auto& [uri, path] : cases) {
+        EXPECT_EQ(toWindows(uri), path);
+        EXPECT_EQ(fromWindows(path), uri);
+    }
+    EXPECT_EQ(toWindows(""), "");
+    EXPECT_EQ(toWindows("http://server/a"), "");
+    EXPECT_EQ(toWindows("winresicon:shell32.dll,-1"), "");
+    EXPECT_EQ(fromWindows("C:/mixed\\x"), "file:///C:/mixed/x");
+    EXPECT_EQ(fromWindows("\\\\?\\C:\\x"), "file:///C:/x");
+    EXPECT_EQ(fromWindows("\\\\?\\UNC\\server\\share\\x"), "file://server/share/x");
+}
+
+TEST(WindowsPath, TakesTheLongFormFrom240UnitsUpwards) {
+    const std::string shortPath = fill("C:\\", 239);
+    const std::string longPath = fill("C:\\", 240);
+    EXPECT_EQ(toWindows(fromWindows(shortPath)), shortPath);
+    EXPECT_EQ(toWindows(fromWindows(longPath)), "\\\\?\\" + longPath);
+    EXPECT_EQ(fromWindows("\\\\?\\" + longPath), fromWindows(longPath));
+
+    const std::string share = fill("\\\\server\\share\\", 300);
+    EXPECT_EQ(toWindows(fromWindows(share)), "\\\\?\\UNC\\" + share.substr(2));
+    EXPECT_EQ(fromWindows("\\\\?\\UNC\\" + share.substr(2)), fromWindows(share));
+
+    // The platform counts two units for each of these characters.
+    std::string notes = "C:\\";
+    for (int i = 0; i < 118; ++i) notes += "\xf0\x9f\x8e\xb5";
+    EXPECT_EQ(toWindows(fromWindows(notes)), notes);
+    notes += "\xf0\x9f\x8e\xb5";
+    EXPECT_EQ(toWindows(fromWindows(notes)), "\\\\?\\" + notes);
+}
+
+TEST(WindowsPath, CannotExtendEveryPath) {
+    auto message = [](const std::string& path) {
+        return "Error: Windows path is longer than MAX_PATH and the limit cannot be circumvented (path='" +
+               path + "')";
+    };
+    const std::string drive = fill("C:\\", 240);
+    const std::string share = fill("\\\\server\\share\\", 240);
+    const std::string relative = fill("music\\", 240);
+    EXPECT_EQ(tests::errorOf([&] { toWindows(fromWindows(drive), false); }), message(drive));
+    EXPECT_EQ(tests::errorOf([&] { toWindows(fromWindows(share), false); }), message(share));
+    EXPECT_EQ(tests::errorOf([&] { toWindows(fromWindows(relative), true); }), message(relative));
+}

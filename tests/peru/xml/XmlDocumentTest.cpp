@@ -1,0 +1,212 @@
+#include "peru/xml/XmlDocument.h"
+
+#include "peru/streams/IStreamManager.h"
+#include "peru/streams/MemoryIOStream.h"
+#include "peru/streams/StringStreams.h"
+#include "peru/strings/StringFormat.h"
+#include "support/Files.h"
+#include "support/Process.h"
+#include "support/TempFolder.h"
+
+using namespace peru;
+using tests::errorOf;
+using tests::text;
+using namespace peru::literals;
+
+namespace {
+
+P<CXmlDocument> parse(std::string_view bytes) {
+    auto document = make<CXmlDocument>();
+    document->parse(make<CStringInStream>(CString::fromUTF8(bytes)));
+    return document;
+}
+
+std::string print(const P<CXmlDocument>& document) {
+    auto out = make<CMemoryIOStream>();
+    document->print(out);
+    return {reinterpret_cast<const char*>(out->getBlock()->getData()), static_cast<size_t>(out->getSize())};
+}
+
+std::string repeat(std::string_view text, int count) {
+    std::string all;
+    for (int i = 0; i < count; ++i) all += text;
+    return all;
+}
+
+std::string asUTF16(std::u16string_view units, bool bigEndian) {
+    std::string bytes = bigEndian ? "\xFE\xFF" : "\xFF\xFE";
+    for (char16_t unit : units) {
+        bytes += static_cast<char>(bigEndian ? unit >> 8 : unit & 0xFF);
+        bytes += static_cast<char>(bigEndian ? unit & 0xFF : unit >> 8);
+    }
+    return bytes;
+}
+
+} // namespace
+
+TEST(XmlDocument, parse_ReadsWhatOtherProgramsWrite) {
+    const struct {
+        std::string bytes;
+        const char* rootText;
+    } cases[] = {
+        {"<a>x</a>", "x"},
+        {"\xEF\xBB\xBF<?xml version='1.0'?>\r\n<!DOCTYPE a>\n<!-- > --><a  >x</a >\n<!-- end -->", "x"},
+        {"<a>\n    one\n    two </a>", "one two"},
+        {"<a>&#x20;&lt;b&gt; &amp;amp; &#65;&#x1F600;</a>", " <b> &amp; A\xF0\x9F\x98\x80"},
+        {"<a>x<![CDATA[ <b> ]]>y<!-- c --><b>z</b></a>", "x <b> y"},
+        {"<?go on?><a b='>' c='/>'/>", ""},
+        {"<?xml version='1.0' encoding='ISO-8859-1'?><a>gr\xFC\xDF</a>", "gr\xC3\xBC\xC3\x9F"},
+        {"\xEF\xBB\xBF<?xml version='1.0' encoding='ISO-8859-1'?><a>\xC3\x9F</a>", "\xC3\x9F"},
+        {asUTF16(u"<?xml version='1.0' encoding='UTF-16'?><a>\u00DF\U0001F600</a>", false),
+         "\xC3\x9F\xF0\x9F\x98\x80"},
+        {asUTF16(u"<a>\u0915</a>", true), "\xE0\xA4\x95"},
+    };
+    for (const auto& c : cases)
+        EXPECT_EQ(text(parse(c.bytes)->getRootNode()->getText()), c.rootText) << c.bytes;
+    EXPECT_FALSE(parse("<?xml version=\"1.0\" encoding=\"utf-8\"?>")->getRootNode());
+}
+
+TEST(XmlDocument, parse_NamesLineAndFaultOfBadDocuments) {
+    const auto syntax = [](int line) { return "XML Parse Error, line " + std::to_string(line) + "."; };
+    const struct {
+        std::string bytes;
+        std::string message; // the end of it
+    } cases[] = {
+        {"", syntax(1)},
+        {"<a>\n<b>\n</a>\n</b>", syntax(3)},
+        {"<a>\r<b>\r", syntax(3)},
+        {"<a>\n<b c='1' c='2'/></a>", syntax(2)},
+        {"<a>\n<b c='<'/></a>", syntax(2)},
+        {"<a/>\n<b/>", syntax(2)},
+        {"<a/>\ntext", syntax(2)},
+        {"<a>\n</a></a>", syntax(2)},
+        {"<a>\n\n<!-- </a>", syntax(3)},
+        {"<a>\n<![CDATA[ ]] </a>", syntax(2)},
+        {"<!DOCTYPE a [<!ENTITY b 'c'>]>\n<a/>", syntax(1)},
+        {"<a>\n&#0;</a>", syntax(2)},
+        {"<a b='&#x110000;'/>", syntax(1)},
+        {"<a>&#" + repeat("1", 100) + ";</a>", syntax(1)},
+        {"<a>\nrock & roll</a>", syntax(2)},
+        {"<a b='\n&nbsp;'/>", syntax(2)},
+        {std::string("<a>\n\0</a>", 9), syntax(2)},
+        {"<a>\n\xFF</a>", "is not in a known encoding, such as valid UTF-8, line 2."},
+        {"<a>\xF0\x9F\x98", "such as valid UTF-8, line 1."},
+        {asUTF16(u"<a>\n", false) + "\x3D\xD8", "such as valid UTF-8, line 2."},
+        {repeat("<a>", 257) + repeat("</a>", 257), "too many attributes in one element, line 1."},
+    };
+    for (const auto& c : cases) {
+        const auto document = parse("<kept/>");
+        const auto stream = make<CStringInStream>(CString::fromUTF8(c.bytes));
+        EXPECT_THROW(document->parse(stream), CParseError) << c.bytes.substr(0, 80);
+        const std::string message = errorOf([&] { parse(c.bytes); });
+        EXPECT_TRUE(message.ends_with(c.message)) << message << "\n" << c.bytes.substr(0, 80);
+        EXPECT_EQ(text(document->getRootNode()->getName()), "kept");
+    }
+    std::string wide = "<a";
+    for (int i = 0; i <= IXmlDocument::kMaxProperties; ++i) wide += " a" + std::to_string(i) + "=''";
+    EXPECT_THROW(parse(wide + "/>"), CParseError);
+    parse(repeat("<a>", IXmlDocument::kMaxDepth) + repeat("</a>", IXmlDocument::kMaxDepth));
+
+    const tests::CTempFolder folder;
+    const P<IURI> file = tests::toURI(folder.write("list.xml", "<a>\n<b>"));
+    EXPECT_EQ(errorOf([&] { make<CXmlDocument>()->parse(getStreamManager()->getInStream(file)); }),
+              "XML Parse Error in file '" + text(file->getAsString()) + "', line 2.");
+}
+
+TEST(XmlDocument, print_TextsComeBackAndPeersReadThem) {
+    const std::string texts[] = {
+        "plain",
+        "a < b && c > 'd' \"e\"",
+        "&#x41; &amp;",
+        "  two  blanks  ",
+        "\n\tlines\r\nand tabs\n",
+        "]]>",
+        "\xF0\x9F\x98\x80 \xE0\xA4\x95 \xC3\xBC",
+        " ",
+        "\r\n",
+        "\xEF\xBB\xBFmark\xEF\xBB\xBF",
+    };
+    for (const char* encoding : {"UTF-8", "utf-16"}) {
+        auto document = make<CXmlDocument>("1.0", encoding);
+        const P<IXmlNode> root = document->addChildNode("root");
+        for (const std::string& each : texts) {
+            const P<IXmlNode> node = root->addChildNode("text");
+            node->setText(CString::fromUTF8(each));
+            node->setProperty("value", CString::fromUTF8(each));
+        }
+        root->addChildNode("empty");
+        // Text beside elements.
+        root->addChildNode("mixed")->addChildNode("inner");
+        root->getChildNode("mixed")->setText(" m ");
+
+        const std::string printed = print(document);
+        const auto again = parse(printed);
+        WEnum<IXmlNode> nodes = again->getRootNode()->getChildNodesByName("text");
+        EXPECT_EQ(nodes.getCount(), 10);
+        for (const std::string& each : texts) {
+            const P<IXmlNode> node = nodes.getNext();
+            EXPECT_EQ(text(node->getText()->toUTF16String()->toUTF8String()), each);
+            EXPECT_EQ(text(node->getProperty("value")->getValue()->toUTF8String()), each);
+        }
+        EXPECT_EQ(text(again->getRootNode()->getChildNode("mixed")->getText()), " m ");
+        const auto fromString = make<CXmlDocument>("1.0", encoding);
+        fromString->parseString(document->printToString());
+        EXPECT_EQ(print(fromString), printed);
+
+        const tests::CTempFolder folder;
+        const std::string file = folder.write("out.xml", printed).string();
+        for (size_t i = 0; i < std::size(texts) - 2; ++i) {
+            const std::string place = "/root/text[" + std::to_string(i + 1) + "]";
+            const auto judged =
+                tests::run({"xmllint", "--xpath", "concat(" + place + ",'|'," + place + "/@value)", file});
+            EXPECT_EQ(judged.out, texts[i] + "|" + texts[i] + "\n") << judged.err;
+        }
+    }
+    auto document = make<CXmlDocument>();
+    const P<IXmlNode> root = document->addChildNode("a");
+    root->addChildNode("b")->addChildNode("c")->setText("d");
+    root->addChildNode("e");
+    EXPECT_EQ(print(document), "<?xml version=\"1.0\" encoding=\"UTF-8\" ?>\n<a>\n    <b>\n        <c>d</c>\n"
+                               "    </b>\n    <e />\n</a>\n");
+}
+
+TEST(XmlDocument, nodes_OutliveTheDocumentButNotTheirRemoval) {
+    P<CXmlDocument> document = parse("<a><b p='1'><c/></b><b/><d/></a>");
+    const P<IXmlNode> root = document->getRootNode();
+    document.reset();
+    const P<IXmlNode> b = root->getChildNode("b");
+    const P<IXmlNode> c = b->getChildNode("c");
+    const P<IXmlProperty> p = b->getProperty("p");
+    EXPECT_EQ(b, root->getChildNodes().getNext());
+
+    WEnum<IXmlNode> nodes = root->getChildNodes();
+    EXPECT_EQ(nodes.getCount(), 3);
+    EXPECT_THROW(root->removeChildNode(c), CInvalidArgError);
+    root->removeChildNode(b);
+    EXPECT_THROW(b->getName(), CInvalidObjectStateError);
+    EXPECT_THROW(c->addChildNode("x"), CInvalidObjectStateError);
+    EXPECT_THROW(p->getValue(), CInvalidObjectStateError);
+    EXPECT_THROW(nodes.getNext(), CInvalidObjectStateError);
+
+    root->getDocument()->parseString("<new/>"_s);
+    EXPECT_THROW(root->getText(), CInvalidObjectStateError);
+}
+
+TEST(XmlDocument, changes_ThatCouldNotBeReadAgainAreRefused) {
+    auto document = make<CXmlDocument>();
+    P<IXmlNode> node = document->addChildNode("a");
+    EXPECT_THROW(document->addChildNode("b"), CInvalidArgError);
+    for (const char* name : {"", "1", "-a", "a b", "a<", "a=", ":a"}) {
+        EXPECT_THROW(node->addChildNode(name), CInvalidArgError) << name;
+        EXPECT_THROW(node->setProperty(name, ""), CInvalidArgError) << name;
+    }
+    for (const char* bad : {"\x01", "\xED\xA0\x80", "\xFF", "\xEF\xBF\xBF"})
+        EXPECT_THROW(node->setText(CString::fromUTF8(bad)), CInvalidArgError);
+    for (int i = 0; i < IXmlDocument::kMaxProperties; ++i) node->setProperty(format("p%d", i), "");
+    node->setProperty("p0", "changed");
+    EXPECT_THROW(node->setProperty("one", "more"), CInvalidArgError);
+    for (int i = 1; i < IXmlDocument::kMaxDepth; ++i) node = node->addChildNode("a");
+    EXPECT_THROW(node->addChildNode("a"), CInvalidArgError);
+    parse(print(document));
+    EXPECT_THROW(make<CXmlDocument>("1.0", "KOI8-R"), CInvalidArgError);
+}

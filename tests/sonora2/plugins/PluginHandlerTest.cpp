@@ -1,0 +1,435 @@
+#include "sonora2/plugins/PluginHandler.h"
+
+#include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/context/SonoraError.h"
+#include "support/Environment.h"
+#include "support/FakeMedia.h"
+#include "support/Files.h"
+#include "support/TempFolder.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <mutex>
+#include <string>
+#include <thread>
+#include <vector>
+
+namespace {
+
+using namespace sonora2::common;
+using namespace tests;
+using peru::CString;
+using peru::IString;
+using peru::IURI;
+using peru::make;
+using peru::P;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+class CMemoryLog : public peru::CObject, public ILogManager {
+public:
+    void log(int32_t, const P<IString>& text) override {
+        std::scoped_lock lock(m_mutex);
+        texts.push_back(CString::toStdString(text));
+    }
+    void logException(const peru::CException& e) override { log(0, e.getDescription()); }
+
+    std::vector<std::string> texts;
+
+private:
+    std::mutex m_mutex;
+};
+
+P<IURI> uri(const std::string& text) {
+    return make<peru::CURI>(CString::fromUTF8(text));
+}
+
+// A handler whose context names one library that is nowhere, so that it starts without plug-ins.
+class PluginHandler : public testing::Test {
+protected:
+    PluginHandler() {
+        context->setLogManager(log);
+        context->addPluginName("testplugin_nowhere");
+    }
+
+    P<CPluginHandler> makeHandler(const P<IPluginPreference>& preference = nullptr) {
+        P<CPluginHandler> handler = make<CPluginHandler>(context, false, "", preference);
+        log->texts.clear();
+        return handler;
+    }
+    static P<CFakePlugin> addPlugin(CPluginHandler& handler, const char* name,
+                                    std::initializer_list<const char*> extensions) {
+        P<CFakePlugin> plugin = make<CFakePlugin>(name, extensions);
+        plugin->makeSource = [](const P<IURI>& u, const ISonoraPlugin::SSourceParams&) {
+            return make<CFakeSource>(SFakeSource(), u);
+        };
+        handler.addPlugin(plugin, plugin);
+        return plugin;
+    }
+    static P<IAudioSource> open(CPluginHandler& handler, const std::string& name, bool keepOpened = false) {
+        return handler.createAudioSource(uri("file:///x/" + name), 44100, 2, 2, keepOpened);
+    }
+
+    P<CMemoryLog> log = make<CMemoryLog>();
+    P<ISonoraContext> context = make<sonora2::audio::CSonoraContextAudio>();
+};
+
+TEST_F(PluginHandler, FailingCandidates_AreLoggedAndTheNextOneGetsItsTurn) {
+    P<CPluginHandler> handler = makeHandler();
+    addPlugin(*handler, "other", {"wav"});
+    addPlugin(*handler, "declining", {"tst"})->makeSource = [](auto&&...) { return nullptr; };
+    auto addFailing = [&](const char* name, std::function<void()> onOpen) {
+        addPlugin(*handler, name, {"tst"})->makeSource = [onOpen](auto&&...) {
+            SFakeSource script;
+            script.onOpen = onOpen;
+            return make<CFakeSource>(script);
+        };
+    };
+    addFailing("throwing", [] { throw CSonoraError("broken header"); });
+    addFailing("odd", [] { throw 42; });
+    addPlugin(*handler, "closed", {"tst"})->makeSource = [](auto&&...) {
+        SFakeSource script;
+        script.staysClosed = true;
+        return make<CFakeSource>(script);
+    };
+    P<CFakePlugin> good = addPlugin(*handler, "good", {"abc", "TST"});
+    P<CFakePlugin> late = addPlugin(*handler, "late", {"tst"});
+
+    P<IAudioSource> source = open(*handler, "a%20b.Tst");
+    ASSERT_TRUE(source);
+    EXPECT_FALSE(source->isOpened());
+    EXPECT_EQ(good->sourceCalls, 1);
+    EXPECT_EQ(good->mask, 2);
+    EXPECT_EQ(late->sourceCalls, 0);
+    EXPECT_THAT(
+        log->texts,
+        ElementsAre("tried to open file:///x/a%20b.Tst with plugin throwing.\nOpening failed: Error - "
+                    "broken header",
+                    "tried to open file:///x/a%20b.Tst with plugin odd.\nOpening failed: unknown "
+                    "exception"));
+    source.reset();
+    EXPECT_EQ(CFakeSource::s_alive, 0) << "failed candidates are released";
+}
+
+TEST_F(PluginHandler, LookupKey_IsTheExtensionWithoutSuffixAndPoint) {
+    struct SCase {
+        const char* suffix;
+        const char* name;
+        bool found;
+    };
+    P<CPluginHandler> handler = makeHandler();
+    addPlugin(*handler, "p", {"tst"});
+    for (const SCase& c : std::initializer_list<SCase>{{"", "a.TST", true},
+                                                       {"", "a.b.tst", true},
+                                                       {"", "a", false},
+                                                       {"", "a.", false},
+                                                       {"", ".tst", false},
+                                                       {"", "tst", false},
+                                                       {"", "a.tstx", false},
+                                                       {".part", "a.tst.PART", true},
+                                                       {".part", "a.tst", true},
+                                                       {".part", "a.part", false},
+                                                       {"_x", "a._xtst", false},
+                                                       {" (1)", "a.tst%20(1)", true},
+                                                       {"a.tst", "a.tst", false}}) {
+        handler->setURISuffix(c.suffix);
+        EXPECT_EQ(static_cast<bool>(open(*handler, c.name)), c.found) << c.name << " with " << c.suffix;
+    }
+}
+
+TEST_F(PluginHandler, AcceptanceTest_LeavesTheSourceAsWanted) {
+    struct SCase {
+        bool verify, keepOpened, opened;
+        int opens;
+    };
+    for (const SCase& c : std::initializer_list<SCase>{{true, true, true, 1},
+                                                       {true, false, false, 1},
+                                                       {false, true, false, 0},
+                                                       {false, false, false, 0}}) {
+        P<CPluginHandler> handler = makeHandler();
+        addPlugin(*handler, "p", {"tst"});
+        handler->setVerifyByOpening(c.verify);
+        P<CFakeSource> source(open(*handler, "a.tst", c.keepOpened));
+        ASSERT_TRUE(source);
+        EXPECT_EQ(source->isOpened(), c.opened) << c.verify << c.keepOpened;
+        EXPECT_EQ(source->opens, c.opens) << c.verify << c.keepOpened;
+    }
+}
+
+TEST_F(PluginHandler, ParameterRecord_IsTakenByItsSizeAndMustBeComplete) {
+    P<CPluginHandler> handler = makeHandler();
+    P<CFakePlugin> plugin = addPlugin(*handler, "p", {"tst"});
+    ISonoraPlugin::SSourceParams seen;
+    plugin->makeSource = [&](const P<IURI>&, const ISonoraPlugin::SSourceParams& params) {
+        seen = params;
+        return make<CFakeSource>(SFakeSource());
+    };
+    ISonoraPlugin::SSourceParams params;
+    params.nSampleRate = 8000;
+    params.nChannelCount = 1;
+    params.nBytesPerSample = 2;
+    const P<IURI> file = uri("file:///a.tst");
+
+    params.nSize = 1000; // a later caller's longer record
+    EXPECT_TRUE(handler->createAudioSource(file, &params));
+    EXPECT_EQ(seen.nSize, 20);
+    EXPECT_EQ(seen.nSampleRate, 8000);
+
+    params.nSize = 16; // ends before the bytes per sample
+    auto expectRefused = [&](auto create) {
+        EXPECT_EQ(errorOf<CSonoraError>(create),
+                  "not all sourceparameter fields are valid for creating an audio source");
+    };
+    expectRefused([&] { handler->createAudioSource(file, &params); });
+    expectRefused([&] { handler->createSource(file, nullptr); });
+    expectRefused([&] { handler->createAudioSource(file, 44100, 0, 2, false); });
+    EXPECT_FALSE(handler->createVideoSource(file, nullptr)) << "needs no numbers, but is no video";
+    EXPECT_TRUE(open(*handler, "a.tst")) << "the lock is free again";
+}
+
+class CPreference : public peru::CObject, public IPluginPreference {
+public:
+    P<IString> lookUp(int, const P<IURI>&) override {
+        if (name == "throw") throw peru::CError("no memory");
+        if (name == "throw oddly") throw 42;
+        return CString::fromUTF8(name);
+    }
+    void store(int mask, const P<IURI>& u, const P<IString>& plugin) override {
+        stored.push_back(std::to_string(mask) + " " + CString::toStdString(u->getAsString()) + " " +
+                         CString::toStdString(plugin));
+    }
+    std::string name;
+    std::vector<std::string> stored;
+};
+
+TEST_F(PluginHandler, Preference_ComesFirstWhateverTheExtension) {
+    P<CPreference> preference = make<CPreference>();
+    P<CPluginHandler> handler = makeHandler(preference);
+    P<CFakePlugin> first = addPlugin(*handler, "first", {"tst"});
+    P<CFakePlugin> second = addPlugin(*handler, "second", {"xyz"});
+
+    preference->name = "second";
+    EXPECT_TRUE(open(*handler, "a.tst"));
+    EXPECT_TRUE(open(*handler, "noextension"));
+    EXPECT_EQ(first->sourceCalls, 0);
+    EXPECT_EQ(second->sourceCalls, 2);
+    EXPECT_THAT(preference->stored, IsEmpty());
+
+    second->makeSource = [](auto&&...) -> P<ISource> { throw CSonoraError("moved"); };
+    for (const char* name : {"second", "unknown", "", "throw", "throw oddly"}) {
+        preference->name = name;
+        preference->stored.clear();
+        EXPECT_TRUE(open(*handler, "a.tst")) << name;
+        EXPECT_THAT(preference->stored, ElementsAre("2 file:///x/a.tst first")) << name;
+    }
+}
+
+TEST_F(PluginHandler, Formats_AreAcceptedUnopened) {
+    P<CPluginHandler> handler = makeHandler();
+    addPlugin(*handler, "broken", {"tst"})->makeFormat = [](auto&&...) -> P<IFormat> {
+        throw CSonoraError("no encoder");
+    };
+    P<CFakePlugin> plugin = addPlugin(*handler, "p", {"tst"});
+    plugin->makeFormat = [](const P<IURI>&, const ISonoraPlugin::SFormatParams& params) {
+        return make<CFakeFormat>(params);
+    };
+    P<CFakeFormat> format(handler->createAudioFormat(uri("file:///a.tst"), 48000, 1, 3));
+    ASSERT_TRUE(format);
+    EXPECT_FALSE(format->isOpened());
+    EXPECT_EQ(plugin->mask, 16);
+    EXPECT_EQ(format->params.nSize, 116);
+    EXPECT_EQ(format->params.nBytesPerSample, 3);
+    EXPECT_THAT(log->texts, ElementsAre("tried to create file:///a.tst with plugin broken.\nOpening failed: "
+                                        "Error - no encoder"));
+    EXPECT_TRUE(handler->createFormat(uri("file:///a.tst"), nullptr));
+    EXPECT_EQ(plugin->mask, 24);
+    EXPECT_TRUE(handler->createObject(uri("file:///a.tst"), nullptr));
+}
+
+// Tells its name by its size; what is no RGB picture is asked for the one that it becomes.
+class CPicture : public peru::CObject, public ISonoraPicture {
+public:
+    explicit CPicture(P<ISonoraPicture> rgb = nullptr) : m_rgb(std::move(rgb)) {}
+    double getTimestamp() const override { return 0.0; }
+    int getWidth() const override { return 320; }
+    int getHeight() const override { return 200; }
+    bool isFlipped() const override { return false; }
+    P<peru::IMemoryBlock> getRGBBlock(int, int, int, int) override { return nullptr; }
+    void copyRGBRect(uint8_t*, int, int, int, int, int) override {}
+    P<ISonoraPicture> getRGBPicture() override { return m_rgb; }
+    int getPictureType() const override { return kYV12; }
+    P<peru::IMemoryBlock> getImagePlane(int, int, int, int, int) override { return nullptr; }
+    void fillPlaneBlack(int, int, int, int, int) override {}
+    void drawInto(const P<ISonoraPicture>&, int, int, int, int, int, int) override {}
+    P<IString> getPixelShaderName() const override { return CString::empty(); }
+    P<ISonoraPicture> createThumbnail() override { return nullptr; }
+    void writeTo(const P<peru::IDataOutStream>&) const override {}
+    void readFrom(const P<peru::IDataInStream>&) override {}
+
+private:
+    P<ISonoraPicture> m_rgb;
+};
+
+class CVideo : public peru::CObject, public IVideoSource {
+public:
+    double duration = 10.0;
+    std::vector<double> skips;
+    P<ISonoraPicture> picture;
+    std::function<void()> onPicture = [] {}; // may throw
+    int opens = 0;
+
+    bool isOpened() override { return m_opened; }
+    void open() override {
+        ++opens;
+        m_opened = true;
+    }
+    void close() override { m_opened = false; }
+    void skipToTime(double time) override { skips.push_back(time); }
+    double getDuration() override { return m_opened ? duration : 0.0; }
+    int getBufferStatus() override { return 100; }
+    bool isEOF() override { return false; }
+    void setStartTime(double) override {}
+    double getStartTime() override { return 0.0; }
+    P<IURI> getURI() override { return nullptr; }
+    P<IString> getPluginName() override { return CString::empty(); }
+    void setMaxSize(int, int) override {}
+    int getWidth() override { return 0; }
+    int getHeight() override { return 0; }
+    double peekNextPictureTimestamp() override { return 0.0; }
+    P<ISonoraPicture> getNextPicture() override {
+        onPicture();
+        return m_opened ? picture : nullptr;
+    }
+    int getPixelAspectNum() override { return 1; }
+    int getPixelAspectDen() override { return 1; }
+    double getFrameDuration() override { return 0.04; }
+    int getFrameRateNum() override { return 25; }
+    int getFrameRateDen() override { return 1; }
+
+private:
+    bool m_opened = false;
+};
+
+TEST_F(PluginHandler, PreviewImage_IsTakenAtTheTimeAndNeverBehindTheEnd) {
+    struct SCase {
+        double time, duration;
+        std::vector<double> skips;
+    };
+    P<CPluginHandler> handler = makeHandler();
+    P<CFakePlugin> plugin = addPlugin(*handler, "video", {"vid"});
+    const P<ISonoraPicture> rgb = make<CPicture>();
+    for (const SCase& c : std::initializer_list<SCase>{{3.0, 10.0, {3.0}},
+                                                       {10.0, 10.0, {10.0}},
+                                                       {10.5, 10.0, {9.0}},
+                                                       {0.0, 10.0, {}},
+                                                       {-2.0, 10.0, {}},
+                                                       {5.0, 0.5, {}}}) {
+        P<CVideo> video = make<CVideo>();
+        video->duration = c.duration;
+        video->picture = make<CPicture>(rgb);
+        plugin->makeSource = [&](auto&&...) { return video; };
+        int width = -1, height = -1;
+        EXPECT_TRUE(handler->createPreviewImage(uri("file:///a.vid"), c.time, width, height) == rgb);
+        EXPECT_EQ(plugin->mask, 1);
+        EXPECT_EQ(video->skips, c.skips) << c.time << " of " << c.duration;
+        EXPECT_EQ(width, 320);
+        EXPECT_EQ(height, 200);
+        EXPECT_EQ(video->opens, 2) << "once for the test, once for the picture";
+        EXPECT_FALSE(video->isOpened());
+    }
+    P<CVideo> video = make<CVideo>();
+    plugin->makeSource = [&](auto&&...) { return video; };
+    int width = -1, height = -1;
+    EXPECT_FALSE(handler->createPreviewImage(uri("file:///a.vid"), 1.0, width, height)) << "without pictures";
+    EXPECT_EQ(width + height, 0);
+    video->onPicture = [] { throw CSonoraError("torn frame"); };
+    EXPECT_THROW(handler->createPreviewImage(uri("file:///a.vid"), 1.0, width, height), CSonoraError);
+    EXPECT_FALSE(video->isOpened());
+}
+
+TEST_F(PluginHandler, CreateCalls_AreSerialised) {
+    P<CPluginHandler> handler = makeHandler();
+    std::atomic<int> inside{0};
+    std::atomic<bool> overlapped{false};
+    addPlugin(*handler, "p", {"tst"})->makeSource = [&](auto&&...) {
+        SFakeSource script;
+        script.onOpen = [&] {
+            if (++inside > 1) overlapped = true;
+            std::this_thread::yield();
+            --inside;
+        };
+        return make<CFakeSource>(script);
+    };
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 4; ++i)
+        threads.emplace_back([&] {
+            for (int n = 0; n < 50; ++n) EXPECT_TRUE(open(*handler, "a.tst"));
+        });
+    for (std::thread& thread : threads) thread.join();
+    EXPECT_FALSE(overlapped);
+}
+
+TEST_F(PluginHandler, Libraries_ThatFailCostALineEach) {
+    CTempFolder folder;
+    folder.write("testplugin_text.so", "this is no library");
+    for (const char* name :
+         {"testplugin_good", "testplugin_noentry", "testplugin_empty", "testplugin_throwing"})
+        std::filesystem::create_symlink(std::string(TEST_PLUGINS "/") + name + ".so",
+                                        folder / (std::string(name) + ".so"));
+    context->getBaseDirectories()->setPluginDirectory(toURI(folder.path() / ""));
+    for (const char* name : {"testplugin_text", "testplugin_noentry", "testplugin_empty",
+                             "testplugin_throwing", "testplugin_good"})
+        context->addPluginName(name);
+    P<CPluginHandler> handler = make<CPluginHandler>(context);
+
+    ASSERT_EQ(handler->getPluginCount(), 1);
+    EXPECT_EQ(CString::toStdString(handler->getPlugin(0)->getPluginName()), "testplugin_good");
+    const std::string head = "Error while loading DLL: Error - ";
+    std::vector<std::string> lines;
+    for (const std::string& text : log->texts)
+        if (text.starts_with("Error while")) lines.push_back(text.substr(head.size()));
+    EXPECT_THAT(lines, ElementsAre("could not load plugin: testplugin_nowhere.so",
+                                   "could not load plugin: testplugin_text.so",
+                                   "could not load link create function for: testplugin_noentry.so",
+                                   "could not load link create plugin object for: testplugin_empty.so",
+                                   "no licence"));
+    EXPECT_EQ(log->texts.size(), 6u) << "and the loader's own reason for the text file";
+    EXPECT_TRUE(open(*handler, "a.tst"));
+    EXPECT_FALSE(open(*handler, "refuse.tst"));
+}
+
+TEST_F(PluginHandler, Libraries_AreFoundWhereTheEnvironmentSaysUnlessTheContextSaysOtherwise) {
+    CTempFolder environment, own;
+    const std::filesystem::path good = TEST_PLUGINS "/testplugin_good.so";
+    std::filesystem::create_symlink(good, environment / "testplugin_a.so");
+    std::filesystem::create_symlink(good, environment / "testplugin_b.so");
+    own.write("testplugin_a.so", "shadows the good one");
+    CEnvironment path("TONEWRIGHT_PLUGIN_PATH", "/nowhere:" + environment.path().string());
+    context->addPluginName("testplugin_a");
+    context->addPluginName("testplugin_b");
+    EXPECT_EQ(make<CPluginHandler>(context)->getPluginCount(), 2);
+    context->getBaseDirectories()->setPluginDirectory(toURI(own.path() / ""));
+    EXPECT_EQ(make<CPluginHandler>(context)->getPluginCount(), 1);
+}
+
+TEST(PluginExtensions, SerialForm_ComesBackAndRefusesWhatIsCutShort) {
+    P<CPluginExtensions> list = make<CPluginExtensions>();
+    EXPECT_TRUE(list->addExtension(CString::fromUTF8("flac")));
+    EXPECT_TRUE(list->addExtension(CString::fromUTF8("wav")));
+    EXPECT_FALSE(list->addExtension(CString::fromUTF8("flac")));
+    const std::string form = serialise(list);
+    EXPECT_EQ(form.size(), 4u + 4 + 4 + 4 + 3);
+
+    P<CPluginExtensions> back = make<CPluginExtensions>();
+    back->addExtension(CString::fromUTF8("old"));
+    deserialise(back, form);
+    ASSERT_EQ(back->getCount(), 2);
+    EXPECT_EQ(CString::toStdString(back->getExtension(1)), "wav");
+    EXPECT_THROW(back->getExtension(2), peru::CInvalidArgError);
+
+    for (size_t cut : {form.size() - 1, size_t{12}, size_t{2}})
+        EXPECT_THROW(deserialise(back, form.substr(0, cut)), peru::CException) << cut;
+}
+
+} // namespace
