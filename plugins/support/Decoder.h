@@ -7,7 +7,8 @@ namespace sonora2::plugins {
 
 struct SDecodedMedia {
     SPcmFormat format;
-    int64_t frames = 0; // exact: what a run to the end delivers from a sound file
+    int64_t frames = 0;     // exact: what a run to the end delivers from a sound file
+    std::string codec = {}; // such as "FLAC" or "PCM signed 24 bit", for people; empty when unknown
 };
 
 // Decodes one file into PCM. CDecoderSource does everything else: states, conversion, read-ahead, time.

@@ -5,6 +5,8 @@
 
 #include <algorithm>
 #include <cmath>
+#include <filesystem>
+#include <system_error>
 #include <utility>
 
 namespace sonora2::plugins {
@@ -101,6 +103,18 @@ P<audio::IAudioStreamInfos> CDecoderSource::getAudioStreamInfos() {
 
 void CDecoderSource::setAudioStream(int nAudioIndex) {
     if (nAudioIndex != 0) fail("%s has no audio stream %d", m_file.getDisplayName(), nAudioIndex);
+}
+
+P<peru::IString> CDecoderSource::getCodecName() {
+    return peru::CString::fromUTF8(m_media.codec);
+}
+
+int64_t CDecoderSource::getBitRate() {
+    std::error_code error;
+    const uintmax_t bytes = std::filesystem::file_size(m_file.path, error);
+    if (error || m_media.frames <= 0) return 0;
+    return std::llround(static_cast<double>(bytes) * 8.0 * m_media.format.rate /
+                        static_cast<double>(m_media.frames));
 }
 
 P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "sonora2/media/IAudioSource.h"
+#include "sonora2/media/IMediaDescription.h"
 #include "support/ReadAhead.h"
 
 #include <memory>
@@ -10,7 +11,7 @@ namespace sonora2::plugins {
 
 // Rate, channels and width can be asked for as soon as the file has been open once.
 // With a start time the source begins there: its time 0, its duration and its timestamps count from it.
-class CDecoderSource : public peru::CObject, public common::IAudioSource {
+class CDecoderSource : public peru::CObject, public common::IAudioSource, public common::IMediaDescription {
 public:
     // Closed. Zeros in `wanted` stand for the file's own values.
     CDecoderSource(const P<common::ISonoraContext>& context, const P<peru::IString>& pluginName,
@@ -40,6 +41,12 @@ public:
     int getSampleRate() override { return m_delivered.rate; }
     int getChannelCount() override { return m_delivered.channels; }
     int getBytesPerSample() override { return m_delivered.bytesPerSample; }
+
+    P<peru::IString> getCodecName() override;
+    int64_t getBitRate() override; // of the whole file, tags and covers included
+    int getOwnSampleRate() override { return m_media.format.rate; }
+    int getOwnChannelCount() override { return m_media.format.channels; }
+    int getOwnBytesPerSample() override { return m_media.format.bytesPerSample; }
 
 private:
     bool openDecoder(); // false when its format cannot become the wanted one

@@ -6,6 +6,7 @@
 #include "peru/system/ISystem.h"
 #include "peru/uri/URI.h"
 #include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/plugins/MediaEnvironment.h"
 #include "tonewright/SonoraLogManagerProxy.h"
 
 namespace tonewright {
@@ -65,6 +66,8 @@ bool CApp::init() {
     if (!m_writeContext) return fail("CApp::init could not create SonoraWriteContext");
     m_writePluginHandler = peru::make<CPluginHandler>(m_writeContext, false);
     if (!m_writePluginHandler) return fail("CApp::init could not create SonoraWritePluginHandler");
+    sonora2::common::setMediaEnvironment(
+        {m_readContext, m_readPluginHandler, m_writeContext, m_writePluginHandler});
 
     m_serviceLock = peru::getMutexFactory()->createMutex();
     m_driveChanged = nullptr;
@@ -83,6 +86,7 @@ P<ISonoraContext> CApp::makeContext(uint64_t flags, std::initializer_list<const 
 
 void CApp::shutdown() {
     m_driveChanged = nullptr;
+    sonora2::common::setMediaEnvironment({});
     m_readPluginHandler.reset();
     m_writePluginHandler.reset();
     m_readContext.reset();

@@ -1,0 +1,22 @@
+// What a source knows about the file behind it beyond the format that it delivers.
+#pragma once
+
+#include "peru/strings/String.h"
+#include "sonora2/Api.h"
+
+namespace sonora2::common {
+
+using peru::P;
+
+// A source may have it; an interface cast finds it. Valid once the source has been open.
+class SONORA2_API IMediaDescription : public virtual peru::IBase {
+public:
+    virtual P<peru::IString> getCodecName() = 0; // such as "FLAC" or "PCM signed 24 bit"; empty when unknown
+    virtual int64_t getBitRate() = 0;            // bits per second on average, 0 when unknown
+    // The file's own format, whatever the source delivers. Samples wider than 4 bytes count as 4.
+    virtual int getOwnSampleRate() = 0;
+    virtual int getOwnChannelCount() = 0;
+    virtual int getOwnBytesPerSample() = 0;
+};
+
+} // namespace sonora2::common
