@@ -1,13 +1,12 @@
 // The program's log.
 #pragma once
 
+#include "peru/Exception.h"
 #include "peru/strings/String.h"
 
 #include <vector>
 
 namespace peru {
-
-class CException;
 
 // Severity in ascending order. EXCEPTION ranks below ERROR on purpose.
 enum ELogLevel : int32_t {
@@ -26,6 +25,7 @@ struct SLogMessage {
     P<IString> text;
     std::vector<P<IString>> extraLines;
     int64_t time = -1; // milliseconds since 1970 UTC; -1 means now
+    P<CException> exception = nullptr; // a copy of the exception that the text describes; usually empty
 };
 
 // A sink, or the manager that fans out to sinks. Any thread may log.

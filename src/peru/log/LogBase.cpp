@@ -64,7 +64,7 @@ void CLogBase::error(const P<IString>& source, const CStringArg& text, const Lin
 void CLogBase::logException(const P<IString>& source, const CException& exception) {
     if (!isWanted(kLogException)) return;
     P<IString> text = format("Type: %s\nText: %s", exception.getTitle(), exception.getDescription());
-    write({kLogException, source, text, {}});
+    write({kLogException, source, text, {}, -1, exception.clone()});
 }
 
 void CLogBase::startFeature(const P<IString>& name) {

@@ -1,0 +1,166 @@
+// A file's own properties and what a target can hold, by asking the plug-ins.
+#include "host_support/Guard.h"
+#include "peru/strings/StringFormat.h"
+#include "peru/system/IPathes.h"
+#include "sonora2/context/SonoraError.h"
+#include "sonora2/media/CloseGuard.h"
+#include "sonora2/media/IMediaDescription.h"
+#include "sonora2/plugins/MediaEnvironment.h"
+
+using namespace tonewright::host_support;
+using namespace sonora2::common;
+using peru::CString;
+
+namespace {
+
+P<IPluginHandler> requireHandler(const P<IPluginHandler>& handler) {
+    if (!handler) throw peru::CError("The library is not started");
+    return handler;
+}
+
+// The name's extension without a suffix for files still being written, as the plug-in handler sees it.
+P<peru::IString> getExtension(const P<peru::IURI>& uri, IPluginHandler& handler) {
+    std::string extension = CString::toStdString(uri->getExtension());
+    const std::string suffix = CString::toStdString(handler.getURISuffix());
+    if (!suffix.empty() && extension.ends_with(suffix)) extension.resize(extension.size() - suffix.size());
+    if (extension.starts_with(".")) extension.erase(0, 1);
+    return CString::fromUTF8(extension);
+}
+
+// Calls `ask` with each plug-in of that type for the file's extension, until it returns true.
+template <class Ask>
+bool askPlugins(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int type, Ask ask) {
+    const P<peru::IString> wanted = getExtension(uri, *handler);
+    for (int i = 0; i < handler->getPluginCount(); ++i) {
+        const P<ISonoraPlugin> plugin = handler->getPlugin(i);
+        const P<IPluginExtensions> extensions = plugin->getValidExtensions(type);
+        for (int k = 0; extensions && k < extensions->getCount(); ++k) {
+            if (!extensions->getExtension(k)->equals(wanted)) continue;
+            if (ask(*plugin)) return true;
+            break;
+        }
+    }
+    return false;
+}
+
+std::string describeKind(const P<peru::IURI>& uri, IPluginHandler& handler) {
+    const std::string extension = CString::toStdString(getExtension(uri, handler));
+    return extension.empty() ? "files without an extension" : "." + extension + " files";
+}
+
+// An open source in the file's own format. Throws the reason of the first plug-in that failed.
+P<IAudioSource> openMedia(const P<peru::IURI>& uri) {
+    const P<IPluginHandler> handler = requireHandler(getMediaEnvironment().readHandler);
+    P<IAudioSource> source;
+    P<peru::CException> reason;
+    const bool isOpen = askPlugins(uri, handler, kAudioSource, [&](ISonoraPlugin& plugin) {
+        try {
+            source =
+                peru::interfaceCast<IAudioSource>(plugin.tryCreateSource(uri, kAudioSource, true, nullptr));
+            if (source) source->open();
+            return source != nullptr;
+        } catch (const peru::CException& exception) {
+            if (!reason) reason = exception.clone();
+            return false;
+        }
+    });
+    if (isOpen) return source;
+    if (reason) reason->raise();
+    throw CSonoraError(CString::fromUTF8("No plug-in reads " + describeKind(uri, *handler)));
+}
+
+void fillInfo(const P<IAudioSource>& source, TONEWRIGHT_MediaInfo* info) {
+    if (!info) return;
+    TONEWRIGHT_MediaInfo values = {};
+    values.sampleRate = source->getSampleRate();
+    values.channelCount = source->getChannelCount();
+    values.bytesPerSample = source->getBytesPerSample();
+    values.duration = source->getDuration();
+    copyText(values.plugin, CString::toStdString(source->getPluginName()));
+    if (const auto description = peru::interfaceCast<IMediaDescription>(source)) {
+        values.sampleRate = description->getOwnSampleRate();
+        values.channelCount = description->getOwnChannelCount();
+        values.bytesPerSample = description->getOwnBytesPerSample();
+        values.bitRate = description->getBitRate();
+        copyText(values.codec, CString::toStdString(description->getCodecName()));
+    }
+    fillRecord(info, values);
+}
+
+// Whether one of the plug-ins that would write the file takes the format. Their reasons are not wanted here.
+bool canWrite(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int rate, int channels, int bytes) {
+    ISonoraPlugin::SFormatParams params;
+    params.nSampleRate = rate;
+    params.nChannelCount = channels;
+    params.nBytesPerSample = bytes;
+    return askPlugins(uri, handler, kAudioFormat, [&](ISonoraPlugin& plugin) {
+        try {
+            return plugin.tryCreateFormat(uri, kAudioFormat, false, &params) != nullptr;
+        } catch (const peru::CException&) {
+            return false;
+        }
+    });
+}
+
+} // namespace
+
+TONEWRIGHT_Handle TONEWRIGHT_Host_OpenMedia(const char16_t* uri, TONEWRIGHT_MediaInfo* info) {
+    return guard<TONEWRIGHT_Handle>(nullptr, [&] {
+        const P<IAudioSource> source = openMedia(tonewright::exports::toURI(uri));
+        fillInfo(source, info);
+        return wrap(source);
+    });
+}
+
+int32_t TONEWRIGHT_Host_GetMediaInfo(TONEWRIGHT_Handle source, TONEWRIGHT_MediaInfo* info) {
+    return guard(0, [&] {
+        const P<IAudioSource> object = require<IAudioSource>(source, "an audio source");
+        const bool wasOpened = object->isOpened();
+        if (!wasOpened) object->open();
+        const CCloseGuard closing(*object, !wasOpened);
+        fillInfo(object, info);
+        return 1;
+    });
+}
+
+int32_t TONEWRIGHT_Host_GetCapabilities(const char16_t* uri, TONEWRIGHT_Capabilities* capabilities) {
+    return guard(0, [&] {
+        const P<peru::IURI> target = tonewright::exports::toURI(uri);
+        const P<IPluginHandler> handler = requireHandler(getMediaEnvironment().writeHandler);
+        if (!askPlugins(target, handler, kAudioFormat, [](ISonoraPlugin&) { return true; }))
+            throw CSonoraError(CString::fromUTF8("No plug-in writes " + describeKind(target, *handler)));
+
+        // A codec's limits of rate, channels and width do not depend on each other, so that each is asked for
+        // beside a format that it takes.
+        static constexpr int kRates[] = {8000,  11025, 12000, 16000, 22050,  24000,  32000,  44100,
+                                         48000, 64000, 88200, 96000, 176400, 192000, 352800, 384000};
+        TONEWRIGHT_Capabilities values = {};
+        int rate = 0, channels = 0, bytes = 0;
+        for (const int width : {2, 3, 4, 1})
+            for (const int count : {2, 1})
+                for (const int candidate : {44100, 48000, 16000, 8000})
+                    if (rate == 0 && canWrite(target, handler, candidate, count, width))
+                        rate = candidate, channels = count, bytes = width;
+        if (rate > 0) {
+            for (const int candidate : kRates)
+                if (canWrite(target, handler, candidate, channels, bytes))
+                    values.rates[values.rateCount++] = candidate;
+            for (int count = 1; count <= 32; ++count)
+                if (canWrite(target, handler, rate, count, bytes)) values.channelCounts |= 1u << (count - 1);
+            for (int width = 1; width <= 4; ++width)
+                if (canWrite(target, handler, rate, channels, width)) values.widths |= 1u << (width - 1);
+        }
+        fillRecord(capabilities, values);
+        return 1;
+    });
+}
+
+int32_t TONEWRIGHT_Host_CanWrite(const char16_t* uri, int32_t sampleRate, int32_t channelCount,
+                                 int32_t bytesPerSample) {
+    return guard(0, [&] {
+        const P<IPluginHandler> handler = requireHandler(getMediaEnvironment().writeHandler);
+        return canWrite(tonewright::exports::toURI(uri), handler, sampleRate, channelCount, bytesPerSample)
+                   ? 1
+                   : 0;
+    });
+}
