@@ -1,5 +1,5 @@
-// The string operations beside ICU's UnicodeString and std::u16string, in the same run. The two arguments are
-// the kind of text and its length.
+// The string operations compared with ICU's UnicodeString and std::u16string in the same run. The two
+// arguments are the kind of text and its length.
 #include "peru/strings/CharEncodings.h"
 #include "peru/strings/String.h"
 
@@ -14,7 +14,7 @@ namespace {
 
 enum EText { ascii = 0, mixed = 1 };
 
-// Mixed text has a Latin, a Greek and a symbol character in every eight, none of which takes two units.
+// Eight characters of mixed text include a Latin, a Greek and a symbol character; none needs two units.
 std::u16string makeText(const benchmark::State& state) {
     static const std::u16string kAscii = u"abcdefgh";
     static const std::u16string kMixed = u"abc\u00E9fg\u03B1\u20AC";
@@ -87,11 +87,11 @@ void BM_Compare_std(benchmark::State& state) {
     measure(state, twoStd, [](CPairOfStd& s) { return s.first.compare(s.second); });
 }
 
-// The same string asked again and again; a string keeps its hash.
+// Repeated calls on the same string, which caches its hash.
 void BM_Hash_peru_kept(benchmark::State& state) {
     measure(state, twoUTF16, [](STwo& s) { return s.a->getHash(); });
 }
-// A string that has not been asked before; making it is part of the time.
+// The first call on a string; the time includes its construction.
 void BM_Hash_peru_first(benchmark::State& state) {
     std::u16string text = makeText(state);
     for (auto _ : state) {
@@ -101,11 +101,11 @@ void BM_Hash_peru_first(benchmark::State& state) {
     }
     setSpeed(state);
 }
-// ICU keeps no hash and looks at 32 to 64 units of a long text.
+// ICU caches no hash and only reads 32 to 64 units of a long text.
 void BM_Hash_icu(benchmark::State& state) {
     measure(state, twoICU, [](CPairOfICU& s) { return s.first.hashCode(); });
 }
-// Made over the same characters without a copy, as ours is.
+// Refers to the same characters without a copy, like ours.
 void BM_Hash_icu_first(benchmark::State& state) {
     std::u16string text = makeText(state);
     for (auto _ : state) {
@@ -118,7 +118,7 @@ void BM_Hash_std(benchmark::State& state) {
     measure(state, twoStd, [](CPairOfStd& s) { return std::hash<std::u16string>()(s.first); });
 }
 
-// What is looked for stands at the end.
+// The match is at the end.
 void BM_Find_peru_utf16(benchmark::State& state) {
     measure(state, twoUTF16, [needle = newString(u"z")](STwo& s) { return s.a->find(needle).index; });
 }

@@ -1,4 +1,4 @@
-// Parsing and printing a document of 10 MB beside the bare parser, in the same run.
+// Parsing and printing a document of 10 MB compared with the bare parser in the same run.
 #include "peru/streams/MemoryIOStream.h"
 #include "peru/streams/StringStreams.h"
 #include "peru/uri/IURI.h"

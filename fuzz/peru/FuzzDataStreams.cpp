@@ -1,5 +1,5 @@
-// Arbitrary bytes as typed values, as a text file and as base64: every reader ends with a value or an error
-// of its own.
+// Arbitrary bytes as typed values, as a text file and as base64: every reader must end with a value or a
+// family error.
 #include "peru/Errors.h"
 #include "peru/streams/Base64Streams.h"
 #include "peru/streams/DataStreams.h"
@@ -20,7 +20,7 @@ P<CMemoryIOStream> makeStream(const uint8_t* data, size_t size) {
     return make<CMemoryIOStream>(block);
 }
 
-// Each value is asked for by a byte of the input itself.
+// A byte of the input selects the type of each value.
 void readValues(const P<CDataInStream>& stream) {
     while (!stream->isAtEnd()) switch (stream->readUInt8() % 8) {
         case 0:

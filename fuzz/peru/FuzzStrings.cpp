@@ -14,7 +14,7 @@ void require(bool condition) {
     if (!condition) std::abort();
 }
 
-// Blocks of their own, so that the address sanitizer sees a read past the end.
+// Separate blocks of the exact size, so that the address sanitizer detects a read past the end.
 P<IString> makeText(const P<ICharEncoding>& encoding, const uint8_t* data, size_t size) {
     auto* block = static_cast<uint8_t*>(std::malloc(size ? size : 1));
     std::copy(data, data + size, block);
@@ -52,7 +52,7 @@ void formatWith(const P<IString>& text) {
     try {
         P<CStringFormat> formatter = make<CStringFormat>(text);
         for (int i = 0; i < 4; ++i) {
-            // Push by trying: the format decides what it takes, and a refused value changes nothing.
+            // Tries each type: the format decides which it accepts, and a rejected value changes nothing.
             try {
                 formatter->push(-7);
                 continue;

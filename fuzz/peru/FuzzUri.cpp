@@ -1,5 +1,5 @@
-// Arbitrary bytes as URIs: what was parsed must be ASCII, parse to the same again, and resolve back from
-// its relative form.
+// Arbitrary bytes as URIs: a parsed URI must be ASCII, parse to the same URI again and resolve back from its
+// relative form.
 #include "peru/Errors.h"
 #include "peru/uri/URI.h"
 

@@ -1,5 +1,5 @@
-// A document as a store of values, changed by what the bytes say: what was set is there afterwards, also in a
-// store over the printed document.
+// A value store over an arbitrary document: a value that was set must be readable afterwards, also in a store
+// over the printed document.
 #include "peru/Errors.h"
 #include "peru/settings/XmlValueStore.h"
 #include "peru/uri/URI.h"
@@ -36,7 +36,7 @@ void walk(CXmlValueStore& store, const P<IString>& section, int depth) {
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    // A mode, then lines: document, section, name, and the rest is the value.
+    // The input is a mode byte, then lines with document, section and name; the rest is the value.
     if (size == 0) return 0;
     const auto mode = data[0] % 2 ? CXmlValueStore::EMode::attributes : CXmlValueStore::EMode::elements;
     std::string_view rest(reinterpret_cast<const char*>(data) + 1, size - 1);

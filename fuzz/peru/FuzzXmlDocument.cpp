@@ -1,4 +1,4 @@
-// Arbitrary bytes as XML: what is accepted is printed, parses again, and prints the same.
+// Arbitrary bytes as XML: an accepted document must print, parse again and print the same.
 #include "peru/Errors.h"
 #include "peru/streams/MemoryIOStream.h"
 #include "peru/streams/StringStreams.h"
@@ -16,7 +16,7 @@ void require(bool condition) {
     if (!condition) std::abort();
 }
 
-// The whole tree as one text, layout left out.
+// The whole tree as one text, without the layout.
 void describe(const P<IXmlNode>& node, std::string& out) {
     out += "<" + CString::toStdString(node->getName());
     WEnum<IXmlProperty> properties = node->getProperties();

@@ -1,4 +1,4 @@
-// Marks what leaves libperu. Everything is compiled with hidden visibility.
+// PERU_API exports a symbol from libperu; everything else is compiled with hidden visibility.
 #pragma once
 
 #define PERU_API __attribute__((visibility("default")))

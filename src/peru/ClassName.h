@@ -8,7 +8,7 @@
 
 namespace peru {
 
-// As the source has it, such as "peru::CArray".
+// The name as written in the source, such as "peru::CArray".
 PERU_API std::string getClassName(const std::type_info& type);
 
 } // namespace peru

@@ -8,7 +8,7 @@ namespace peru {
 
 namespace {
 
-// A string of its own in the encoding of the text.
+// Copies the text into a new string of the same encoding.
 P<IString> ownText(const CStringArg& text, const char* whenEmpty = "") {
     if (text.isEmpty()) return newString(whenEmpty);
     auto* encoding = const_cast<ICharEncoding*>(&text.getEncoding());

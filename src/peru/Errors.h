@@ -10,8 +10,7 @@ namespace peru {
 
 class IURI;
 
-// The base of everything catchable as a failure. An empty title becomes "Error", an empty description
-// "Unspecified error".
+// The base class of all failures. An empty title becomes "Error", an empty description "Unspecified error".
 class PERU_API CError : public CException {
     PERU_EXCEPTION(CError)
     explicit CError(const CStringArg& description, const CStringArg& title = "");
@@ -30,7 +29,7 @@ class PERU_API CObjectError : public CError {
 
 protected:
     P<IBase> m_object;
-    const std::type_info* m_type; // taken from the object when none was given
+    const std::type_info* m_type; // taken from the object if none was given
 };
 
 class PERU_API CCastError : public CObjectError {
@@ -50,7 +49,7 @@ class PERU_API CEndOfEnumError : public CInvalidObjectStateError {
 
 class PERU_API CInvalidArgError : public CObjectError {
     PERU_EXCEPTION(CInvalidArgError)
-    // Empty texts read "unspecified method" and "unspecified argument".
+    // An empty text appears as "unspecified method" or "unspecified argument".
     CInvalidArgError(const CStringArg& argument, const CStringArg& method, const P<IBase>& object = nullptr);
 };
 
@@ -106,7 +105,7 @@ protected:
 class PERU_API CURIFormatError : public CURIError {
     PERU_EXCEPTION(CURIFormatError)
     explicit CURIFormatError(const P<IURI>& uri = nullptr);
-    // For a text that did not become a URI; it is shown where the URI would stand.
+    // For a text that could not be parsed as a URI; it replaces %URI%.
     explicit CURIFormatError(const CStringArg& uriText);
 };
 

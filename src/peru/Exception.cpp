@@ -10,16 +10,16 @@ CException::CException(const P<IString>& description, const P<IString>& title)
     : m_title(title ? title : CString::empty()), m_description(description ? description : CString::empty()) {
 }
 
-// The life of a thrown object is the run-time system's affair: its count word came from what it was copied
-// from and says nothing about it.
+// The language runtime owns thrown objects. Their count was copied from another object and means nothing; the
+// reset satisfies the check in ~CReferencable.
 CException::~CException() {
     resetCount();
 }
 
 namespace {
 
-// The text that what() handed out last on this thread. Destructors of static objects may still ask for one
-// when the thread's storage is gone.
+// The text that what() last returned on this thread. Destructors of static objects may call what() after the
+// thread's storage has been destroyed.
 struct SWhatText {
     P<IString> text;
     ~SWhatText();
@@ -43,7 +43,7 @@ const char* CException::what() const noexcept {
             return reinterpret_cast<const char*>(t_whatText.text->getData());
         }
     } catch (...) {
-        // A failure must not hide the failure that it is asked about.
+        // A failure here must not hide the one that is being described.
     }
     return "error without a readable description";
 }

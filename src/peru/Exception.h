@@ -19,9 +19,9 @@ public:
     const char* what() const noexcept override;
     virtual P<IString> getTitle() const;
     virtual P<IString> getDescription() const;
-    // A heap copy of the most derived type: how an error crosses threads.
+    // Returns a heap copy of the most derived type, which can be passed to another thread.
     virtual P<CException> clone() const;
-    // Throws a copy of the most derived type; the other end of clone().
+    // Throws a copy of the most derived type: rethrows what clone() has copied.
     [[noreturn]] virtual void raise() const;
 
 protected:
@@ -29,7 +29,7 @@ protected:
     P<IString> m_description;
 };
 
-// The two operations that every class of the tree overrides.
+// Declares the two operations that every class of the tree overrides.
 #define PERU_EXCEPTION(Class)                                                                                \
 public:                                                                                                      \
     Class(const Class&) = default;                                                                           \

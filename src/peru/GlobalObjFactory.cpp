@@ -12,8 +12,8 @@
 
 namespace peru {
 
-// Where the one factory lives. It needs no initialisation and is never destroyed: the marks tell its state
-// also to code that runs before or after the static objects of this library.
+// Holds the factory. It needs no dynamic initialisation and is never destroyed, so that its marks are valid
+// even for code that runs before or after the static objects of this library exist.
 struct SGlobalObjFactoryCell {
     static constexpr uint32_t kConstructed[2] = {0x3D92A405, 0x73DF5089};
     static constexpr uint32_t kDestroyed[2] = {0x4EA3B516, 0x84E0619A};
@@ -55,7 +55,7 @@ CGlobalObjFactory& SGlobalObjFactoryCell::access() {
             construct();
             break;
         }
-        // A manager of our own: the shared one is among the objects that the factory is to hold.
+        // A local manager: the shared one is itself a singleton of this factory.
         make<posix::CThreadManager>()->sleep(1);
     }
     return *factory;
@@ -75,7 +75,8 @@ void SGlobalObjFactoryCell::construct() {
 }
 
 void SGlobalObjFactoryCell::destroyAtExit() {
-    // The singletons die while the cell still stands, since they may ask for earlier ones on their way.
+    // The singletons are destroyed while the cell is still valid, since their destructors may use earlier
+    // ones.
     g_cell.factory->clear();
     setMark(g_cell.destroyed, kDestroyed);
     setMark(g_cell.constructed, {0, 0});
@@ -93,7 +94,7 @@ P<CGlobalObjFactory> CGlobalObjFactory::instance() {
 }
 
 void CGlobalObjFactory::shutdown() {
-    // Where nothing was made there is nothing to destroy, also at the end of the process.
+    // Without a factory there is nothing to destroy; this includes the time after the exit handler has run.
     if (g_cell.isConstructed()) instance()->clear();
 }
 

@@ -12,16 +12,16 @@
 
 namespace peru {
 
-// Singletons are made on demand and die in the reverse order of the completion of their construction:
-// at shutdown(), or at process end. A request after process end stops the program.
+// Singletons are created on demand and destroyed in the reverse order of the completion of their
+// construction, by shutdown() or by an exit handler. A request after that handler has run aborts the program.
 class PERU_API CGlobalObjFactory : public CObject {
 public:
-    // One static key word per accessor: its address names the singleton.
+    // One static key per accessor; its address identifies the singleton.
     struct SKey {
         char word = 0;
     };
 
-    // Knows a singleton without its type.
+    // Owns a singleton without knowing its type.
     class PERU_API IPtrHolder {
     public:
         virtual ~IPtrHolder() = default;
@@ -39,8 +39,8 @@ public:
         P<T> m_object;
     };
 
-    // The one T of the process. The factory function runs with the re-entrant mutex held, so that it
-    // may ask for other singletons; when it throws nothing is entered and the next request tries again.
+    // Returns the process's only T. `create` runs with the re-entrant mutex held, so it may request other
+    // singletons. If it throws, nothing is registered and the next request tries again.
     template <class T> static P<T> get(const SKey& key, P<T> (*create)()) {
         P<CGlobalObjFactory> factory = instance();
         CMutexLock lock(factory->m_mutex);
@@ -50,9 +50,9 @@ public:
         return object;
     }
 
-    // Destroys all singletons, last made first. The factory stays: what is asked for later is made anew, and
-    // what is asked for meanwhile dies with the rest. The mutex is free while a singleton dies, so that it
-    // may wait for threads which need other singletons.
+    // Destroys all singletons, last created first. The factory stays usable: a later request creates the
+    // singleton again, and one created during shutdown is destroyed with the rest. The mutex is not held
+    // while a singleton is destroyed, so its destructor may wait for threads that need other singletons.
     static void shutdown();
 
 protected:
@@ -74,10 +74,10 @@ private:
     void enter(const SKey& key, std::unique_ptr<IPtrHolder> holder);
     void clear();
 
-    P<IMutex> m_mutex; // guards the members below, and is held while a singleton is made
+    P<IMutex> m_mutex; // guards the members below; also held while a singleton is created
     std::unordered_map<const SKey*, IPtrHolder*> m_holders;
     std::deque<SEntry> m_creationOrder;
-    // A singleton that asks for itself while it dies gets itself; for other threads it is gone.
+    // A singleton that requests itself from its own destructor gets itself; other threads no longer see it.
     std::vector<SDying> m_dying;
 
     friend struct SGlobalObjFactoryCell;

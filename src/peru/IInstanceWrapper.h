@@ -8,16 +8,16 @@
 
 namespace peru {
 
-// Two virtual operations: the destructor, then one that destroys the object itself. Not counted: whoever
-// got a wrapper owns it.
+// Two virtual operations: the destructor, then destroy(), which deletes the wrapper. Not reference-counted:
+// whoever receives a wrapper owns it.
 class PERU_API IInstanceWrapper {
 public:
     virtual ~IInstanceWrapper() = default;
     virtual void destroy() = 0;
 };
 
-// Holds a reference on the object behind a handle. No type tag. Header only: a host that hands in an object
-// of its own, such as a log, links nothing for it.
+// Holds a reference to the object behind a handle, without a type tag. Header-only, so that a host can pass
+// an object of its own, such as a log, without linking anything for it.
 class PERU_API CInstanceWrapper : public IInstanceWrapper {
 public:
     explicit CInstanceWrapper(P<IBase> object) : m_object(std::move(object)) {}
@@ -29,7 +29,7 @@ private:
     P<IBase> m_object;
 };
 
-// Holds a text that the host reads through a std::u16string laid out as the library's own.
+// Holds a text that the host reads as a std::u16string with the same layout as the library's.
 class PERU_API CStringInstanceWrapper : public IInstanceWrapper {
 public:
     explicit CStringInstanceWrapper(const CStringArg& text);

@@ -8,13 +8,13 @@
 
 namespace peru {
 
-// What an object says about where an interface of it is to be found. Both handles may be empty.
+// Where to search for an interface of an object. Both members may be empty.
 struct SInterfaceQueryResult {
-    P<IBase> delegate;                // asked first, and followed recursively
-    std::vector<P<IBase>> aggregated; // asked last, in order
+    P<IBase> delegate;                // searched first, recursively
+    std::vector<P<IBase>> aggregated; // searched last, in order
 };
 
-// An object that stands for others answers this query; plain objects need not have it.
+// Implemented by objects that represent others; plain objects do not need it.
 class PERU_API IInterfaceQuery : public virtual IBase {
 public:
     virtual SInterfaceQueryResult queryInterface(const std::type_info& wanted) = 0;
@@ -22,12 +22,13 @@ public:
 
 namespace detail {
 using InterfaceProbe = bool (*)(IBase*);
-// The object in the delegate and aggregate graph of `object` for which the probe answers true, or null.
-// Each object is visited once, so that a cycle ends.
+// Returns the first object in the delegate and aggregate graph of `object` for which the probe returns true,
+// or null. Each object is visited once, so that cycles terminate.
 PERU_API P<IBase> findInterface(IBase* object, const std::type_info& wanted, InterfaceProbe probe);
 } // namespace detail
 
-// Delegate first, then a run-time downcast, then the aggregated objects. Empty when none has it.
+// Searches the delegate, then the object itself by a run-time downcast, then the aggregated objects. Returns
+// an empty handle if none has the interface.
 template <class T> P<T> interfaceCast(const P<IBase>& object) {
     if (!object) return nullptr;
     P<IBase> found = detail::findInterface(object.get(), typeid(T),

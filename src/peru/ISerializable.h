@@ -1,4 +1,4 @@
-// Typed values on streams, and objects that write and read themselves.
+// Typed values on streams, and objects that serialise themselves.
 #pragma once
 
 #include "peru/streams/IStreams.h"
@@ -16,8 +16,8 @@ public:
     virtual void readFrom(const P<IDataInStream>& stream) = 0;
 };
 
-// Little-endian, untagged. A string is its UTF-8 byte count as int32 and its bytes. An object is a null
-// flag, its own form and the check word 123456.
+// Little-endian, untagged. A string is written as its UTF-8 byte count (int32) and its bytes, an object as a
+// null flag, its own form and the check word 123456.
 class PERU_API IDataOutStream : public virtual IOutStream {
 public:
     virtual void writeInt8(int8_t value) = 0;
@@ -49,9 +49,9 @@ public:
     virtual float readFloat() = 0;
     virtual double readDouble() = 0;
     virtual bool readBool() = 0;
-    virtual P<IString> readString() = 0; // empty when the stream ends before its size
-    // The given object reads itself; empty when a null was written. Throws CException with "Error in object
-    // serialization.. write/read differ?" when the check word does not follow.
+    virtual P<IString> readString() = 0; // empty if the stream ends within the byte count
+    // Lets the given object read itself; returns an empty handle if a null was written. Throws CException
+    // with "Error in object serialization.. write/read differ?" if the check word does not follow.
     virtual P<ISerializable> readObject(const P<ISerializable>& object) = 0;
     virtual P<IURI> readURI() = 0;
 };

@@ -6,8 +6,8 @@ namespace peru::detail {
 
 namespace {
 
-// What was visited is held until the walk ends, so that no later object can take its address. The graphs are
-// small: a stream and what it stands on.
+// Visited objects are held until the search ends, so that no new object can reuse their addresses. The graphs
+// are small: a stream and the streams below it.
 P<IBase> find(const P<IBase>& object, const std::type_info& wanted, InterfaceProbe probe,
               std::vector<P<IBase>>& visited) {
     if (!object || std::find(visited.begin(), visited.end(), object) != visited.end()) return nullptr;
@@ -25,7 +25,7 @@ P<IBase> find(const P<IBase>& object, const std::type_info& wanted, InterfacePro
 
 P<IBase> findInterface(IBase* object, const std::type_info& wanted, InterfaceProbe probe) {
     P<IBase> start = P<IBase>::share(object);
-    // Most objects answer for themselves.
+    // Most objects do not represent others.
     if (!tryCast<IInterfaceQuery>(start)) return start && probe(object) ? start : nullptr;
     std::vector<P<IBase>> visited;
     return find(start, wanted, probe, visited);

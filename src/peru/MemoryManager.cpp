@@ -83,8 +83,8 @@ CCachedMemoryBlock::CCachedMemoryBlock(const P<CMemoryManager>& manager, int64_t
 CCachedMemoryBlock::~CCachedMemoryBlock() = default;
 
 void CCachedMemoryBlock::destroy() {
-    // A waiting block must not keep its manager alive. The manager may go with this handle, and take the
-    // block with it: nothing of the block is touched after takeBack.
+    // A block in the free list must not keep its manager alive. Releasing this handle may destroy the
+    // manager, and the block with it, so the block must not be touched after takeBack.
     if (const P<CMemoryManager> manager = std::move(m_manager))
         manager->takeBack(this);
     else
@@ -132,7 +132,7 @@ P<IMemoryBlock> CMemoryManager::getBlock(int64_t size) {
 
 void CMemoryManager::takeBack(CCachedMemoryBlock* block) {
     if (block->m_capacity <= kLargestCachedBlock) {
-        // A block that grew serves the class that it can fill.
+        // A block that has grown goes to the largest class that it can serve.
         const uint64_t classes = static_cast<uint64_t>(block->m_capacity / kSmallestBlock);
         SFreeList& list = m_free[static_cast<size_t>(std::bit_width(classes) - 1)];
         block->m_size = 0;

@@ -16,14 +16,14 @@ public:
     virtual const uint8_t* getData() const = 0;
     virtual int64_t getSize() const = 0;
     virtual int64_t getCapacity() const = 0;
-    // Keeps the bytes that are there; grows the capacity where needed. New bytes are not cleared.
+    // Keeps the existing bytes and grows the capacity if needed. New bytes are not initialised.
     virtual void setSize(int64_t size) = 0;
 };
 
-// Hands out blocks by size, reusing released ones. Safe from any thread.
+// Returns blocks by size and reuses released ones. Thread-safe.
 class PERU_API IMemoryManager : public virtual IBase {
 public:
-    // A block of that size with at least that capacity; its bytes are not cleared.
+    // Returns a block of that size with at least that capacity; its bytes are not initialised.
     virtual P<IMemoryBlock> getBlock(int64_t size) = 0;
 };
 
@@ -35,8 +35,8 @@ public:
     int64_t getSize() const override { return m_size; }
     int64_t getCapacity() const override { return m_capacity; }
     void setSize(int64_t size) override;
-    // The size as int32, then the bytes. Writing throws CInvalidArgError where the size does not fit;
-    // reading takes memory only as the bytes arrive, whatever size the stream claims.
+    // The size as int32, then the bytes. Writing throws CInvalidArgError if the size does not fit. Reading
+    // allocates memory only as the bytes arrive, whatever size the stream announces.
     void writeTo(const P<IDataOutStream>& stream) const override;
     void readFrom(const P<IDataInStream>& stream) override;
 
@@ -48,7 +48,7 @@ protected:
     int64_t m_capacity = 0;
 };
 
-// A block of its own.
+// A block outside any pool.
 class PERU_API CMemoryBlock : public CMemoryBlockBase {
 public:
     explicit CMemoryBlock(int64_t size = 0);
@@ -56,7 +56,7 @@ public:
 
 class CMemoryManager;
 
-// A block that goes back to its manager's free list with its last release.
+// A block that returns to its manager's free list on its last release.
 class PERU_API CCachedMemoryBlock : public CMemoryBlockBase {
 public:
     ~CCachedMemoryBlock() override;
@@ -66,17 +66,17 @@ private:
     friend class CMemoryManager;
     CCachedMemoryBlock(const P<CMemoryManager>& manager, int64_t capacity);
 
-    P<CMemoryManager> m_manager;          // held while the block is out, empty while it waits
+    P<CMemoryManager> m_manager;          // set while the block is in use, empty while it is in the free list
     CCachedMemoryBlock* m_next = nullptr; // in the free list
 };
 
 class PERU_API CMemoryManager : public CObject, public IMemoryManager {
 public:
-    // At most `cachedBlocks` released blocks of each size class are kept.
+    // Keeps at most `cachedBlocks` released blocks of each size class.
     explicit CMemoryManager(int cachedBlocks = 30);
     ~CMemoryManager() override;
     P<IMemoryBlock> getBlock(int64_t size) override;
-    int64_t getCachedBytes() const; // what waits for reuse
+    int64_t getCachedBytes() const; // in the free lists
 
 private:
     friend class CCachedMemoryBlock;
@@ -88,7 +88,8 @@ private:
     static constexpr int64_t kLargestCachedBlock = kSmallestBlock << (kSizeClasses - 1);
 
     struct SFreeList {
-        CCachedMemoryBlock* first = nullptr; // last released first: its bytes are still in the cache
+        CCachedMemoryBlock* first =
+            nullptr; // most recently released first, since its bytes are likely in the CPU cache
         int count = 0;
     };
 

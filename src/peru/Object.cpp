@@ -19,7 +19,7 @@ void CObject::addRef() const {
 }
 
 void CObject::release() const {
-    // The last holder ends the object's life whatever view it had of it.
+    // The last reference destroys the object even if it was a reference to const.
     if (decrement()) const_cast<CObject*>(this)->destroy();
 }
 

@@ -16,17 +16,17 @@ protected:
     static constexpr int32_t kPoison = -1000000;
 
     CReferencable() noexcept = default;
-    // Exceptions are copied while they propagate: the count word is taken as it stands.
+    // Exceptions are copied while they propagate; the copy takes over the count unchanged.
     CReferencable(const CReferencable& other) noexcept
         : m_count(other.m_count.load(std::memory_order_relaxed)) {}
     CReferencable& operator=(const CReferencable&) noexcept { return *this; }
-    // A heap copy starts a life of its own.
+    // For a heap copy, which starts with a count of its own.
     void resetCount() noexcept { m_count.store(1, std::memory_order_relaxed); }
     // In debug builds asserts that the object was destroyed by its last release or was never shared.
     ~CReferencable();
 
     void increment() const noexcept { m_count.fetch_add(1, std::memory_order_relaxed); }
-    // True when this was the last count; the word is then poisoned.
+    // Returns true if this was the last reference; the count is then poisoned.
     bool decrement() const noexcept {
         if (m_count.fetch_sub(1, std::memory_order_acq_rel) != 1) return false;
         m_count.store(kPoison, std::memory_order_relaxed);

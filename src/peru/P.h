@@ -10,7 +10,7 @@
 
 namespace peru {
 
-// Throws CCastError; out of line, so that handles need not know the error tree.
+// Throws CCastError; out of line, so that this header does not depend on the error tree.
 [[noreturn]] PERU_API void throwCastError(const IBase* object, const std::type_info& target);
 
 namespace detail {
@@ -22,10 +22,9 @@ concept UnrelatedTo = !std::is_convertible_v<U*, T*> && (std::is_const_v<T> || !
 
 // Strong handle, one word, may be empty. A copy costs one atomic increment, a move nothing.
 //
-// A raw pointer given to the constructor is adopted: its first count passes to the handle, as `new`
-// returned it. An object that is already held elsewhere (such as `this`) is wrapped by share().
-// Between unrelated interfaces the explicit conversion is a checked dynamic cast that throws CCastError;
-// tryCast() answers an empty handle instead.
+// The constructor adopts a raw pointer: the initial reference from `new` passes to the handle. Use share()
+// for an object that is already held elsewhere, such as `this`. Between unrelated interfaces the explicit
+// conversion is a checked dynamic cast that throws CCastError; tryCast() returns an empty handle instead.
 template <class T> class P {
 public:
     using element_type = T;
@@ -76,7 +75,7 @@ public:
     void reset() noexcept { P().swap(*this); }
     void swap(P& other) noexcept { std::swap(m_object, other.m_object); }
 
-    // Gives the count away without releasing it.
+    // Gives up the reference without releasing it.
     [[nodiscard]] T* detach() noexcept { return std::exchange(m_object, nullptr); }
 
     T* get() const noexcept { return m_object; }
@@ -91,7 +90,7 @@ private:
     T* m_object = nullptr;
 };
 
-// The same for a pointer to const; what constant arrays and enumerators hand out.
+// The same for a pointer to const, as returned by constant arrays and enumerators.
 template <class T> class PC : public P<const T> {
 public:
     using P<const T>::P;
@@ -99,18 +98,18 @@ public:
     PC(const P<T>& other) : P<const T>(other) {}
 };
 
-// Makes an object and the handle that adopts it.
+// Creates an object and a handle that adopts it.
 template <class T, class... Args> P<T> make(Args&&... args) {
     return P<T>(new T(std::forward<Args>(args)...));
 }
 
-// A plain run-time cast; empty when the object does not have the interface.
+// A plain run-time cast; returns an empty handle if the object does not have the interface.
 template <class T, class U> P<T> tryCast(const P<U>& object) noexcept {
     return P<T>::share(dynamic_cast<T*>(object.get()));
 }
 
-// A handle that holds a reference only when its flag is set. With the flag clear the pointee's life is
-// its own affair: who is entered that way must leave before it dies.
+// A handle that holds a reference only when its flag is set. With the flag clear it does not keep the object
+// alive: an object registered that way must be removed before it is destroyed.
 template <class T> class PFrail {
 public:
     PFrail() noexcept = default;
@@ -132,7 +131,7 @@ public:
     T* operator->() const noexcept { return m_object; }
     bool isCounted() const noexcept { return m_counted; }
 
-    // The pointer alone counts, never the flag.
+    // Compares the pointer only, never the flag.
     bool operator==(const PFrail& other) const noexcept { return m_object == other.m_object; }
     bool operator==(const T* object) const noexcept { return m_object == object; }
 

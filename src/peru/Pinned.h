@@ -9,12 +9,12 @@
 
 namespace peru {
 
-// A handle on a singleton, to be a static with constant initialisation: after the first call no lock is
-// taken, and the handle is never destroyed, so that strings work in the destructors of other statics too.
+// A handle to a singleton, meant to be a constant-initialised static. After the first call no lock is taken.
+// The handle is never destroyed, so that strings also work in the destructors of other statics.
 //
-// It is no function-static that its constructor fills: the thread that constructs one would wait for the
-// factory with the static's guard held, and a thread that makes another singleton with the factory held
-// would wait for that guard.
+// A function-local static with an initialiser could deadlock: the initialising thread waits for the factory
+// while it holds the static's guard, and a thread that creates another singleton holds the factory and waits
+// for that guard.
 template <class T> class TPinned {
 public:
     constexpr TPinned() noexcept = default;
@@ -34,7 +34,7 @@ private:
             ::new (m_storage) P<T>(std::move(object));
             m_state.store(EState::pinned, std::memory_order_release);
         }
-        // Another thread has a pointer to store, nothing more.
+        // The other thread only has to store a pointer.
         while (m_state.load(std::memory_order_acquire) != EState::pinned) std::this_thread::yield();
     }
 

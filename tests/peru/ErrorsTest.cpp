@@ -18,7 +18,7 @@ template <class E> std::shared_ptr<CException> error(E&& e) {
     return std::make_shared<std::decay_t<E>>(std::forward<E>(e));
 }
 
-// Texts of the process's localizer for the length of a test.
+// Clears the process's localizer at the end of a test.
 struct SLocalized {
     ~SLocalized() { getStringLocalizer()->clear(); }
 };
@@ -87,7 +87,7 @@ TEST(Exception, CrossesThreadsWithItsOwnType) {
             parked = caught.clone();
         }
     }).join();
-    // A second owner must not show in the copies that are thrown.
+    // A second reference must not affect the thrown copies.
     P<CException> second = parked;
     for (int i = 0; i < 2; ++i) {
         try {
@@ -118,7 +118,7 @@ TEST(Exception, AnswersWhatFromTheCodePageOrTheThread) {
         EXPECT_STREQ(other.what(), "elsewhere");
     }).join();
     EXPECT_STREQ(here, "converted");
-    // A part of a string has no terminator of its own.
+    // A slice has no terminator of its own.
     CException slice(codePage->substring(kStringBegin, codePage->getPosition(3)), nullptr);
     EXPECT_STREQ(slice.what(), "dir");
 }

@@ -33,7 +33,7 @@ private:
     char m_name;
 };
 
-// Singletons named by a letter; three accessors as subsystems have them.
+// Singletons named by a letter, with accessors like those of the subsystems.
 std::atomic<int> g_made{0};
 
 template <char name> P<CSingle> createSingle() {
@@ -46,7 +46,7 @@ template <char name, P<CSingle> (*create)() = createSingle<name>> P<CSingle> get
     return CGlobalObjFactory::get<CSingle>(key, create);
 }
 
-// Other objects of the process die in shutdown() too; they are made anew for the next test.
+// shutdown() also destroys the other singletons of the process; they are created again on demand.
 class GlobalObjFactory : public testing::Test {
 protected:
     void SetUp() override {
@@ -95,7 +95,7 @@ TEST_F(GlobalObjFactory, StartsAgainAfterShutdown) {
 TEST_F(GlobalObjFactory, EntersNothingWhenCreationThrows) {
     g_fail = true;
     for (int i = 0; i < 2; ++i) EXPECT_THROW((getSingle<'f', createFailing>()), CError);
-    // The mutex was let go on the way out.
+    // The mutex was released.
     std::thread([] { getSingle<'b'>(); }).join();
     g_fail = false;
     P<CSingle> made = getSingle<'f', createFailing>();
@@ -125,14 +125,14 @@ TEST_F(GlobalObjFactory, LetsADyingSingletonWaitForAThreadThatNeedsOthers) {
     EXPECT_EQ(g_deaths, "wna");
 }
 
-// The first access of a process, by many threads at once.
+// A pinned singleton.
 const P<CSingle>& getPinned() {
     static const CGlobalObjFactory::SKey key;
     static constinit TPinned<CSingle> pinned;
     return pinned.get(key, createSingle<'p'>);
 }
 
-// True when the thread of this process waits for something.
+// True if the thread of this process is blocked.
 bool isBlocked(pid_t thread) {
     std::ifstream file("/proc/self/task/" + std::to_string(thread) + "/stat");
     const std::string text((std::istreambuf_iterator<char>(file)), {});
@@ -141,7 +141,7 @@ bool isBlocked(pid_t thread) {
 
 std::thread g_rival;
 
-// Asks for the pinned one while a second thread, which asked first, waits for the factory.
+// Requests the pinned singleton while a second thread, which requested it first, waits for the factory.
 P<CSingle> createWithRival() {
     std::atomic<pid_t> id{0};
     g_rival = std::thread([&id] {
@@ -162,6 +162,7 @@ TEST_F(GlobalObjFactory, PinsForSeveralThreadsAtOnce) {
     EXPECT_EQ(getPinned(), getPinned());
 }
 
+// In a process of its own, so that the threads also race for the factory.
 TEST_F(GlobalObjFactory, MakesOneObjectForAllThreads) {
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     auto race = [] {
@@ -185,7 +186,7 @@ TEST_F(GlobalObjFactory, DestroysAtProcessEndAndThenStopsTheProgram) {
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     EXPECT_DEATH(
         {
-            // Handlers run last registered first: the factory's own follows with the first access.
+            // Exit handlers run in reverse order; the factory registers its own on the first access.
             std::atexit([] { getSingle<'b'>(); });
             std::atexit([] { std::fprintf(stderr, "dead: %s\n", g_deaths.c_str()); });
             getSingle<'a'>();

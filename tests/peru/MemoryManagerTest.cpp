@@ -56,10 +56,10 @@ TEST(MemoryManager, GrownBlockServesTheClassItCanFill) {
 TEST(MemoryManager, BlockInUseKeepsItsManagerAlive) {
     P<CMemoryManager> manager = make<CMemoryManager>();
     P<IMemoryBlock> block = manager->getBlock(64);
-    manager->getBlock(64); // one that waits when the manager goes
+    manager->getBlock(64); // in the free list when the manager is released
     manager = nullptr;
     std::memset(block->getData(), 1, 64);
-    block = nullptr; // takes the manager and the waiting block along
+    block = nullptr; // destroys the manager and the cached block
 }
 
 TEST(MemoryManager, IsSafeFromAnyThread) {

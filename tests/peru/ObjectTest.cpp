@@ -19,7 +19,7 @@ public:
 
 class IOther : public virtual IBase {};
 
-// Tells of its destruction.
+// Counts its destruction.
 class CProbe : public CObject, public INamed {
 public:
     explicit CProbe(int& destructions, std::function<void(CProbe&)> atEnd = {})
@@ -35,7 +35,7 @@ private:
     std::function<void(CProbe&)> m_atEnd;
 };
 
-// Stands for others, as a buffered stream stands for the file below it.
+// Represents other objects, as a buffered stream represents the file below it.
 class CRelay : public CObject, public IInterfaceQuery {
 public:
     SInterfaceQueryResult queryInterface(const std::type_info&) override { return m_answer; }

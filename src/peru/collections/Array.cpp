@@ -10,7 +10,7 @@ namespace peru {
 
 namespace {
 
-// `end` is the first index that is not allowed.
+// `end` is the first invalid index.
 void checkIndex(int32_t index, size_t end, const char* method, const CObject* array) {
     if (index >= 0 && static_cast<size_t>(index) < end) return;
     throw CInvalidArgError(("index " + std::to_string(index)).c_str(), method,
@@ -25,7 +25,7 @@ bool isInside(const IConstArray& array, int32_t index) {
     return index >= 0 && index < array.getCount();
 }
 
-// The index to hand out; `index` moves on.
+// Returns the current index and advances it; throws past the end.
 int32_t step(const IConstArray& array, int32_t& index, bool backwards, CObject* enumerator) {
     if (!isInside(array, index)) throw CEndOfEnumError(P<IBase>::share(enumerator));
     return backwards ? index-- : index++;
@@ -87,7 +87,7 @@ void CArray::insertAt(int32_t index, const P<IBase>& element) {
 
 void CArray::setAt(int32_t index, const P<IBase>& element) {
     checkIndex(index, m_elements.size(), "setAt", this);
-    // The old element dies after its place has been taken: it may come back to this array.
+    // The old element is destroyed after it has been replaced, since its destructor may use this array.
     P<IBase> replaced = std::exchange(m_elements[static_cast<size_t>(index)], element);
 }
 

@@ -7,7 +7,7 @@
 
 namespace peru {
 
-// Filled once, read afterwards.
+// Filled on construction, constant afterwards.
 class PERU_API CConstArray : public CObject, public IConstArray {
 public:
     explicit CConstArray(std::vector<PC<IBase>> elements);
@@ -45,7 +45,7 @@ private:
     std::vector<P<IBase>> m_elements;
 };
 
-// Walks any array that hands out constant elements, forwards or backwards.
+// Enumerates any array of constant elements, forwards or backwards.
 class PERU_API CArray::CConstEnum : public CObject, public IConstEnum {
 public:
     CConstEnum(const PC<IConstArray>& array, bool backwards);

@@ -9,7 +9,7 @@ namespace peru {
 
 namespace {
 
-// The chain's first enumerator that has more, or null.
+// The first enumerator of the chain that has more elements, or null.
 template <class E> E* findCurrent(const std::vector<P<E>>& enums) {
     auto found = std::find_if(enums.begin(), enums.end(), [](const P<E>& e) { return e && e->hasMore(); });
     return found == enums.end() ? nullptr : found->get();

@@ -19,7 +19,7 @@ public:
     void reset() override;
 };
 
-// One enumerator after the other. They belong to the chain from then on: reset() resets them all.
+// Chains enumerators. The chain takes them over: reset() resets all of them.
 class PERU_API CMultiEnum : public CObject, public IEnum {
 public:
     explicit CMultiEnum(std::vector<P<IEnum>> enums = {});
@@ -37,7 +37,7 @@ private:
     std::vector<P<IEnum>> m_enums;
 };
 
-// The same for enumerators that hand out constant objects only.
+// The same for enumerators that only return constant objects.
 class PERU_API CConstMultiEnum : public CObject, public IConstEnum {
 public:
     explicit CConstMultiEnum(std::vector<P<IConstEnum>> enums = {});

@@ -6,8 +6,8 @@
 
 namespace peru {
 
-// A counted listener list. Ordinary listeners are entered without a reference and must leave before they
-// die. Not locked: the owner says which thread or lock guards it.
+// A counted listener list. Ordinary listeners are registered without a reference and must be removed before
+// they are destroyed. Not thread-safe: the owner documents which thread or lock guards it.
 template <class T> class TFrailArray : public CObject {
 public:
     // Without a reference: for classes that must not keep their listeners alive.
@@ -15,7 +15,7 @@ public:
     // With a reference, held until the listener is removed.
     void addCounted(const P<T>& listener) { m_elements.add(PFrail<T>(listener.get(), true)); }
 
-    // Removes the first match and tells whether there was one; the rest keeps its order.
+    // Removes the first match and returns whether there was one; the others keep their order.
     bool remove(const T* listener) {
         for (size_t i = 0; i < m_elements.getCount(); ++i) {
             if (!(m_elements[i] == listener)) continue;
@@ -31,7 +31,7 @@ public:
     }
 
     size_t getCount() const { return m_elements.getCount(); }
-    // Empty past the end, so that a walk by index survives a listener that leaves meanwhile.
+    // Returns null past the end, so that a loop by index survives a listener that removes itself.
     T* at(size_t index) const { return index < m_elements.getCount() ? m_elements[index].get() : nullptr; }
 
 private:

@@ -5,12 +5,12 @@
 
 namespace peru {
 
-// Indices outside the array throw CInvalidArgError. Not locked.
+// Indices outside the array throw CInvalidArgError. Not thread-safe.
 class PERU_API IConstArray : public virtual IBase {
 public:
     virtual int32_t getCount() const = 0;
     virtual PC<IBase> getConstAt(int32_t index) const = 0;
-    // Enumerators hold the array and see its changes.
+    // Enumerators keep the array alive and see its changes.
     virtual P<IConstEnum> createConstEnum(bool backwards = false) const = 0;
 };
 
@@ -19,11 +19,11 @@ public:
     virtual P<IBase> getAt(int32_t index) const = 0;
     virtual P<IEnum> createEnum(bool backwards = false) = 0;
     virtual void add(const P<IBase>& element) = 0;
-    // The index may be the count: behind the last element.
+    // The index may equal the count, which appends the element.
     virtual void insertAt(int32_t index, const P<IBase>& element) = 0;
     virtual void setAt(int32_t index, const P<IBase>& element) = 0;
     virtual void removeAt(int32_t index) = 0;
-    // Removes the first occurrence of the object and tells whether there was one.
+    // Removes the first occurrence of the object and returns whether there was one.
     virtual bool remove(const P<IBase>& element) = 0;
     virtual void clear() = 0;
 };

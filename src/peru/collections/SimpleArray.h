@@ -10,8 +10,8 @@
 
 namespace peru {
 
-// What does not depend on the element. When count + 1 exceeds the capacity, it becomes
-// max(count + 1, capacity + step).
+// The part that does not depend on the element type. When count + 1 exceeds the capacity, the capacity
+// becomes max(count + 1, capacity + step).
 class PERU_API CSimpleArrayTemplateBase {
 public:
     size_t getCount() const { return m_count; }
@@ -20,7 +20,7 @@ public:
 protected:
     explicit CSimpleArrayTemplateBase(size_t step) : m_step(step) {}
     ~CSimpleArrayTemplateBase() = default;
-    // The capacity for one element more.
+    // The capacity needed for one more element.
     size_t getNextCapacity() const {
         return m_count < m_capacity ? m_capacity : std::max(m_count + 1, m_capacity + m_step);
     }
@@ -32,8 +32,7 @@ private:
     size_t m_step;
 };
 
-// Removing an element shifts the rest down and keeps the order. The elements are destroyed when the array
-// goes.
+// Removing an element shifts the rest down and keeps the order. The elements are destroyed with the array.
 template <class E> class TSimpleArray : public CSimpleArrayTemplateBase {
 public:
     explicit TSimpleArray(size_t capacity = 0, size_t step = 16) : CSimpleArrayTemplateBase(step) {
@@ -51,8 +50,8 @@ public:
         std::construct_at(m_elements + m_count, std::move(element));
         ++m_count;
     }
-    // The element dies last, when the array is whole again: it may be a handle whose object changes the
-    // array.
+    // The element is destroyed last, when the array is consistent again: it may be a handle whose object
+    // changes the array.
     void removeAt(size_t index) {
         E removed = std::move(m_elements[index]);
         std::move(m_elements + index + 1, m_elements + m_count, m_elements + index);
@@ -83,7 +82,7 @@ private:
     E* m_elements = nullptr;
 };
 
-// Named apart where the destruction of the elements is what the array is for: arrays of handles.
+// A name for arrays of handles, which exist to release their elements.
 template <class E> using TCleaningSimpleArray = TSimpleArray<E>;
 using CCleaningSimpleArrayTemplateBase = CSimpleArrayTemplateBase;
 

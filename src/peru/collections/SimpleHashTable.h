@@ -11,23 +11,23 @@
 
 namespace peru {
 
-// K is a handle on a string. Equal texts are one key, whatever their encodings. A value keeps its address
-// until it is removed. Not locked.
+// K is a string handle. Equal texts are the same key, whatever their encodings. A value keeps its address
+// until it is removed. Not thread-safe.
 template <class K, class V> class TSimpleHashTable {
 public:
     explicit TSimpleHashTable(size_t size = 17) : m_slots(size > 0 ? size : 1) {}
     TSimpleHashTable(const TSimpleHashTable&) = delete;
     TSimpleHashTable& operator=(const TSimpleHashTable&) = delete;
-    // Node by node: left to themselves the nodes of a long chain would destroy each other recursively.
+    // Node by node: the default destructor would destroy the nodes of a long chain recursively.
     ~TSimpleHashTable() { clear(); }
 
-    // Null when the key is not there.
+    // Returns null if the key is missing.
     V* find(const IString& key) const {
         const std::unique_ptr<SNode>& node = *getLink(m_slots, key);
         return node ? &node->value : nullptr;
     }
 
-    // Enters the value or replaces the one that is there, whose key stays.
+    // Inserts the value or replaces the existing one, whose key is kept.
     V& set(const K& key, V value) {
         if (V* known = find(*key)) return *known = std::move(value);
         if (m_count >= m_slots.size()) grow();
@@ -37,7 +37,7 @@ public:
         return slot->value;
     }
 
-    // Tells whether the key was there.
+    // Returns whether the key existed.
     bool remove(const IString& key) {
         std::unique_ptr<SNode>* link = getLink(m_slots, key);
         if (!*link) return false;
@@ -73,8 +73,8 @@ private:
     };
     using Slots = std::vector<std::unique_ptr<SNode>>;
 
-    // The link to the key's node, or the empty one at the end of its chain. Texts are compared only where the
-    // hashes agree.
+    // The link to the key's node, or the empty link at the end of its chain. Texts are only compared if the
+    // hashes are equal.
     template <class S> static auto* getLink(S& slots, const IString& key) {
         uint32_t hash = key.getHash();
         auto* link = &slots[hash % slots.size()];

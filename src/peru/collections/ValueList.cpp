@@ -6,7 +6,7 @@ namespace peru {
 
 namespace {
 
-// The name as a string object without a copy of its bytes, for a look-up.
+// Wraps a name as a string object for a look-up, without copying its bytes.
 class CWantedName : public CString {
 public:
     explicit CWantedName(const CStringArg& name) : CString(name.getView(), false) {}

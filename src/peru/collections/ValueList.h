@@ -32,7 +32,7 @@ private:
     TSimpleHashTable<P<IString>, SEntry> m_entries;
 };
 
-// Keeps the names that the list had when it was made.
+// Enumerates the names that the list had when the enumerator was created.
 class PERU_API CValueList::CNameEnum : public CObject, public IEnum {
 public:
     explicit CNameEnum(const CValueList& list);

@@ -10,10 +10,11 @@ namespace peru {
 
 namespace {
 
-// The room of the trace's line in characters, its terminator included.
+// Size of a trace line in characters, including the terminator.
 constexpr size_t kTraceSize = 1024;
 
-// Cuts between characters; bytes that are no UTF-8 count one each at most.
+// Returns the byte size of the first `characters` characters; bytes that are not UTF-8 count at most one
+// each.
 size_t cut(const char* utf8, size_t size, size_t characters) {
     size_t count = 0;
     for (size_t i = 0; i < size; ++i)
@@ -21,8 +22,8 @@ size_t cut(const char* utf8, size_t size, size_t characters) {
     return size;
 }
 
-// Standard error is there for everybody to see, other than a debugger's window: a program with an output of
-// its own switches this off.
+// Unlike a debugger's window, standard error is visible to users, so a program with its own output may switch
+// this off.
 bool isEnabled() {
     static const bool enabled = [] {
         const char* setting = std::getenv("TONEWRIGHT_DEBUG_OUTPUT");
@@ -33,14 +34,14 @@ bool isEnabled() {
 
 void writeDebugOutput(const char* utf8, size_t size) {
     if (!isEnabled()) return;
-    // One call, so that lines of several threads do not mix.
+    // A single call, so that lines of several threads do not mix.
     std::fwrite(utf8, 1, size, stderr);
 }
 
 } // namespace
 
 void zvrTrace(const char* file, int line, const char* comment) {
-    char text[kTraceSize * 4]; // no allocation: assertions call this when memory is out, too
+    char text[kTraceSize * 4]; // no allocation: assertions also call this when memory is exhausted
     const char* name = file ? file : "";
     int length = comment && *comment
                      ? std::snprintf(text, sizeof text, "zvr_trace: %s (%d) c=%s\n", name, line, comment)

@@ -8,7 +8,8 @@
 
 namespace peru {
 
-// Severity in ascending order. EXCEPTION ranks below ERROR on purpose.
+// Severity in ascending order; EXCEPTION intentionally ranks below ERROR. The levels of sonora2's own
+// ILogManager run the other way: there 0 is the most severe.
 enum ELogLevel : int32_t {
     kLogTrace = 0,
     kLogDebug = 1,
@@ -18,7 +19,7 @@ enum ELogLevel : int32_t {
     kLogError = 5,
 };
 
-// One message on its way to the sinks.
+// A message for the sinks.
 struct SLogMessage {
     int32_t level = kLogInfo;
     P<IString> source; // the component; may be empty
@@ -47,21 +48,21 @@ public:
     virtual void startFeature(const P<IString>& name) = 0;
     virtual void endFeature(const P<IString>& name) = 0;
     virtual void addInfo(const P<IString>& name, const P<IString>& value) = 0;
-    // What all of the above come down to. Levels outside the enumeration are allowed.
+    // All message operations above end here. Levels outside the enumeration are allowed.
     virtual void write(const SLogMessage& message) = 0;
 };
 
 class PERU_API ILogManager : public virtual ILog {
 public:
-    // An empty source takes every message.
+    // With an empty source the log receives every message.
     virtual void addLog(const P<ILog>& log, const P<IString>& source) = 0;
     virtual bool removeLog(const P<ILog>& log, const P<IString>& source) = 0;
 };
 
 PERU_API P<ILogManager> getLogManager();
 
-// The debugger trace: one line on the platform's debug output, in release builds too. That output is standard
-// error, unless the environment has TONEWRIGHT_DEBUG_OUTPUT=0.
+// The debugger trace: writes one line to the platform's debug output, in release builds too. That output is
+// standard error; TONEWRIGHT_DEBUG_OUTPUT=0 in the environment switches it off.
 PERU_API void zvrTrace(const char* file, int line, const char* comment = nullptr);
 PERU_API void outputDebugString(const CStringArg& text);
 

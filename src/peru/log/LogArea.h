@@ -5,11 +5,11 @@
 
 namespace peru {
 
-// Opened at the head of an operation: the log shows what follows in the block indented.
+// Declared at the head of an operation: the log indents what follows in the scope.
 class PERU_API CLogArea {
 public:
     CLogArea(const P<ILog>& log, const P<IString>& name);
-    // A sink that fails is not told of here, since an error may already be on its way.
+    // An error of a sink only goes to the debugger trace, since an exception may already be in flight.
     ~CLogArea();
     CLogArea(const CLogArea&) = delete;
     CLogArea& operator=(const CLogArea&) = delete;

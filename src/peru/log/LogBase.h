@@ -1,4 +1,4 @@
-// What all logs have in common.
+// Common base of all logs.
 #pragma once
 
 #include "peru/Object.h"
@@ -9,8 +9,8 @@
 
 namespace peru {
 
-// Leads every shortcut to write(). A level that is not wanted costs one comparison: no lock is taken and no
-// text is built.
+// Routes every shortcut to write(). A disabled level costs one comparison: no lock is taken and no text is
+// built.
 class PERU_API CLogBase : public CObject, public virtual ILog {
 public:
     void setMinimumLevel(int32_t level) override;

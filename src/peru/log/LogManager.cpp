@@ -7,7 +7,7 @@
 
 namespace peru {
 
-// Counted, so that a sink may change the lists while it is called.
+// Reference-counted, so that a sink may change the lists while it is called.
 class CLogManager::CLogList : public CObject {
 public:
     void add(const P<ILog>& log) { m_logs.push_back(log); }

@@ -1,4 +1,4 @@
-// Fans the program's messages out.
+// Distributes the program's messages to the sinks.
 #pragma once
 
 #include "peru/collections/SimpleHashTable.h"
@@ -9,24 +9,24 @@
 
 namespace peru {
 
-// Holds its mutex while it calls a sink: the order of locks is manager, then sink. A sink that throws ends
-// the call. A sink may itself be a manager; it is known by its identity.
+// Holds its mutex while it calls a sink: the lock order is manager, then sink. An exception from a sink ends
+// the call. A sink may itself be a manager; sinks are compared by identity.
 class PERU_API CLogManager : public CLogBase, public ILogManager {
 public:
     CLogManager();
     ~CLogManager() override;
 
-    // Areas have no source: the sinks that take everything are told.
+    // Areas have no source, so they go to the sinks that receive every message.
     void enterArea(const P<IString>& name) override;
     void leaveArea(const P<IString>& name) override;
-    // The sinks of the message's source first, then those that take everything.
+    // Calls the sinks of the message's source first, then those that receive every message.
     void write(const SLogMessage& message) override;
 
-    // Throws CInvalidArgError for an empty log and for the manager itself.
+    // Throws CInvalidArgError for an empty handle and for the manager itself.
     void addLog(const P<ILog>& log, const P<IString>& source) override;
     bool removeLog(const P<ILog>& log, const P<IString>& source) override;
 
-    // Sources with a sink of their own.
+    // Number of sources that have sinks of their own.
     size_t getSourceCount() const;
 
 private:
@@ -35,8 +35,8 @@ private:
     P<IMutex> m_mutex; // guards all below
     P<CLogList> m_logs;
     TSimpleHashTable<P<IString>, P<CLogList>> m_logsBySource;
-    // Areas that the sinks were told of. Who heard of an entry hears of the leaving, also when the level
-    // was raised in between, since the depth would never come back.
+    // Areas whose entry went to the sinks. Leaving them is passed on even if the level was raised in between,
+    // otherwise the depth of the sinks would never return to zero.
     std::vector<P<IString>> m_areas;
 };
 

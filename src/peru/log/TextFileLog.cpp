@@ -20,7 +20,7 @@ const char* getLevelWord(int32_t level) {
 
 std::string getTimeText(int64_t milliseconds) {
     if (milliseconds == -1) milliseconds = getTimeManager()->getTime();
-    // Rounded down also before 1970.
+    // Rounds down, also before 1970.
     auto seconds = static_cast<time_t>((milliseconds - (milliseconds % 1000 + 1000) % 1000) / 1000);
     std::tm local{};
     localtime_r(&seconds, &local);
@@ -46,7 +46,7 @@ size_t countCharacters(std::string_view utf8) {
         std::count_if(utf8.begin(), utf8.end(), [](char byte) { return (byte & 0xc0) != 0x80; }));
 }
 
-// Lines end in LF, CR or both; an end behind the last line opens no further one.
+// Lines end in LF, CR or CRLF; a line end after the last line does not start another one.
 void appendLines(std::string& result, std::string_view text, const std::string& indentation) {
     do {
         size_t end = std::min(text.find_first_of("\r\n"), text.size());
@@ -76,7 +76,7 @@ void CTextFileLog::enterArea(const P<IString>& name) {
 
 void CTextFileLog::leaveArea(const P<IString>& name) {
     CMutexLock lock(m_mutex);
-    m_depth = std::max(m_depth - 1, 0); // a log that joined within the area never heard of its entry
+    m_depth = std::max(m_depth - 1, 0); // a log added within the area never saw its entry
     if (isWanted(kLogTrace)) write({kLogTrace, nullptr, "[Leave] - " + name, {}});
 }
 

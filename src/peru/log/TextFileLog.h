@@ -1,4 +1,4 @@
-// The ordinary log.
+// The log that writes text to a file or another stream.
 #pragma once
 
 #include "peru/log/LogBase.h"
@@ -9,11 +9,11 @@ namespace peru {
 
 // Appends lines such as
 //   14:03:59 [source] info - text
-// in UTF-8. Further lines of a message stand below its text. The depth of areas belongs to the log and not
-// to a thread, so that the indentation of threads mixes. An error of the stream ends the call.
+// in UTF-8. Further lines of a message are aligned with its text. The depth of areas is per log, not per
+// thread, so the indentation of several threads interleaves. Stream errors propagate to the caller.
 class PERU_API CTextFileLog : public CLogBase {
 public:
-    // Opens the file, or makes it. Throws CFileError.
+    // Opens the file for appending and creates it if necessary. Throws CFileError.
     CTextFileLog(const P<IURI>& file, bool flushEachLine);
     CTextFileLog(const P<IOutStream>& stream, bool flushEachLine);
     ~CTextFileLog() override;

@@ -6,11 +6,11 @@
 
 namespace peru {
 
-// A section is a path of names with "/" between them; an empty one is the top. One thread at a time.
+// A section is a path of names separated by "/"; an empty path is the top level. Not thread-safe.
 //
-// A change is kept in memory until flush(), unless the store saves by itself. Changes throw CReadOnlyError
-// when the store was opened for reading, CInvalidArgError for names and texts that it cannot hold, and
-// CFileError where they are saved at once and cannot be.
+// Changes are kept in memory until flush(), unless the store saves automatically. They throw CReadOnlyError
+// if the store was opened for reading, CInvalidArgError for names and texts that the store cannot hold, and
+// CFileError if saving them automatically fails.
 class PERU_API IValueStore : public virtual IBase {
 public:
     virtual void setString(const CStringArg& section, const CStringArg& name, const CStringArg& value) = 0;
@@ -19,8 +19,9 @@ public:
     virtual void setBool(const CStringArg& section, const CStringArg& name, bool value) = 0;
     virtual void setDouble(const CStringArg& section, const CStringArg& name, double value) = 0;
 
-    // The default where there is no value or its text is empty. Text that is no number throws CParseError
-    // from the three numeric ones; for getBool text other than "true" and "false" is the default.
+    // All return the default if there is no value or its text is empty. The three numeric operations throw
+    // CParseError for text that is not a number; getBool returns the default for text other than "true" and
+    // "false".
     virtual P<IString> getString(const CStringArg& section, const CStringArg& name,
                                  const P<IString>& defaultValue) = 0;
     virtual int32_t getInt(const CStringArg& section, const CStringArg& name, int32_t defaultValue) = 0;
@@ -34,11 +35,11 @@ public:
     virtual WEnum<IString> getValueNames(const CStringArg& section) = 0;
     virtual WEnum<IString> getSectionNames(const CStringArg& section) = 0; // one level
 
-    // What is not there need not be removed.
+    // Removing something that does not exist does nothing.
     virtual void removeValue(const CStringArg& section, const CStringArg& name) = 0;
     virtual void removeSection(const CStringArg& section) = 0; // with everything in it
 
-    // Saves what has changed. Throws CFileError with the changes kept and the old file as it was.
+    // Saves the changes. On CFileError the changes are kept and the old file is unchanged.
     virtual void flush() = 0;
 };
 

@@ -1,4 +1,4 @@
-// Opens stores of values by URI.
+// Opens value stores by URI.
 #pragma once
 
 #include "peru/settings/IValueStore.h"
@@ -10,20 +10,20 @@ enum class EStoreAccess { read, readWrite };
 
 class PERU_API IValueStoreFactory : public virtual IBase {
 public:
-    // Empty for a URI of another kind. What does not exist yet is an empty store; what is there and cannot be
-    // read throws.
+    // Returns an empty handle for a URI of another kind, and an empty store if nothing exists at the URI yet.
+    // Throws if existing content cannot be read.
     virtual P<IValueStore> openStore(const P<IURI>& uri, EStoreAccess access) = 0;
 };
 
-// Asks its factories in the order of registration; the result is empty when none knows the URI. Safe from any
-// thread: one mutex is held while they are asked.
+// Asks its factories in order of registration; returns an empty handle if none supports the URI. Thread-safe:
+// one mutex is held while the factories are called.
 class PERU_API IValueStoreManager : public virtual IValueStoreFactory {
 public:
     virtual void addFactory(const P<IValueStoreFactory>& factory) = 0;
     virtual void removeFactory(const P<IValueStoreFactory>& factory) = 0;
 };
 
-// Knows files "*.xml" and "registry:" from the start.
+// Supports "*.xml" files and "registry:" URIs from the start.
 PERU_API P<IValueStoreManager> getValueStoreManager();
 
 } // namespace peru

@@ -12,7 +12,7 @@ namespace {
 
 constexpr const char* kIntegerFault = "Error parsing integer.";
 
-// The double nearest to a text may lie between two floats where the text does not: a float is read as such.
+// Parses directly to a float: rounding to a double first could round to the wrong float afterwards.
 float parseFloat(const CStringArg& text) {
     parseDouble(text);
     const std::string digits = CString::toStdString(text);

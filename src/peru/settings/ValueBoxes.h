@@ -7,8 +7,8 @@
 namespace peru {
 
 // The text forms are the same in every locale: "true" and "false", decimal integers, and the shortest decimal
-// number that parses to the same floating point value. Parsing throws CParseError for anything else, numbers
-// out of range and white space included; "nan" and "inf" are floating point values.
+// number that parses to the same floating point value. Parsing throws CParseError for anything else,
+// including numbers out of range and white space; "nan" and "inf" are floating point values.
 template <class T> class PERU_API TValueBox : public CObject {
 public:
     explicit TValueBox(T value);

@@ -17,7 +17,7 @@ CValueStoreManager::~CValueStoreManager() = default;
 P<IValueStore> CValueStoreManager::openStore(const P<IURI>& uri, EStoreAccess access) {
     if (!uri) throw CInvalidArgError("uri", "IValueStoreManager::openStore");
     CMutexLock lock(m_mutex);
-    // By index and with a handle of its own: a factory that is asked may enter or remove factories.
+    // By index and with a handle of its own: a factory may add or remove factories while it is called.
     for (size_t i = 0; i < m_factories.getCount(); ++i) {
         const P<IValueStoreFactory> factory = m_factories[i];
         if (P<IValueStore> store = factory->openStore(uri, access)) return store;

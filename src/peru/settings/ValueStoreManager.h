@@ -20,7 +20,7 @@ public:
     void removeFactory(const P<IValueStoreFactory>& factory) override;
 
 private:
-    P<IMutex> m_mutex; // guards the array, and is held while the factories are asked
+    P<IMutex> m_mutex; // guards the array; also held while the factories are called
     TCleaningSimpleArray<P<IValueStoreFactory>> m_factories;
 };
 

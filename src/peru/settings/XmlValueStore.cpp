@@ -40,7 +40,7 @@ P<IString> decodeName(const P<IString>& name) {
     return xml::toString(replaceAll(bytes, kBlankMark, " "));
 }
 
-// Gives each name of the path to `visit`, encoded, while that answers true.
+// Calls `visit` with each encoded name of the path until it returns false.
 template <class F> void walkPath(const CStringArg& section, F visit) {
     const std::string path = CString::toStdString(section);
     for (size_t at = 0; at < path.size();) {
@@ -54,7 +54,7 @@ bool hasChildren(const P<IXmlNode>& node) {
     return node->getChildNodes().hasMore();
 }
 
-// In element mode the one element may be a value, a section, or both.
+// In element mode an element may be a value, a section, or both.
 bool isValue(const P<IXmlNode>& node) {
     return !hasChildren(node) || node->getText()->getDataSize() > 0;
 }
@@ -127,7 +127,7 @@ void CXmlValueStore::noteChange() {
 
 void CXmlValueStore::setString(const CStringArg& section, const CStringArg& name, const CStringArg& value) {
     checkWritable();
-    // Refused before anything is made for it.
+    // Everything is validated before any section is created.
     const P<IString> encoded = xml::toString(xml::fromName(encodeName(name), "IValueStore::setString"));
     xml::fromText(value, "IValueStore::setString");
     walkPath(section, [](const P<IString>& each) {
@@ -254,7 +254,7 @@ void CXmlValueStore::removeSection(const CStringArg& section) {
         node = node->getChildNode(name);
         return true;
     });
-    // A value of the same name stays.
+    // A value of the same name is kept.
     if (parent && m_mode == EMode::elements && node->getText()->getDataSize() > 0)
         removeChildren(node);
     else if (parent)

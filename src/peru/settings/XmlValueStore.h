@@ -7,10 +7,10 @@
 
 namespace peru {
 
-// Sections are nested elements below the root, whatever its name. Names of values and sections may begin with
-// "-" or a digit and hold blanks: the file has "__L__" before such a first character and "__32__" for a
-// blank, and gives the names back as they were. What XML otherwise refuses in a name is refused here. A name
-// that occurs twice in one section of the file is its first occurrence.
+// Sections are nested elements below the root, whatever its name. Names of values and sections may start with
+// "-" or a digit and contain blanks: in the file, "__L__" precedes such a first character and "__32__" stands
+// for a blank; the store returns the original names. Other names that XML rejects are rejected here too. If a
+// name occurs twice in a section of the file, the first occurrence counts.
 class PERU_API CXmlValueStore : public CObject, public IValueStore {
 public:
     enum class EMode {
@@ -18,11 +18,11 @@ public:
         attributes // a value is an attribute of its section; at most IXmlDocument::kMaxProperties of them
     };
 
-    // What is read from the URI, empty when there is no such file or nothing in it. Throws CParseError for a
-    // file that is no XML, which is then never written over.
+    // Opens the store at the URI, which is empty if the file is missing or empty. Throws CParseError if the
+    // file is not XML, so that such a file is never overwritten.
     static P<CXmlValueStore> open(const P<IURI>& uri, EStoreAccess access, EMode mode = EMode::elements,
                                   bool autoSave = false);
-    // Over a document that is there; the URI says where it is saved.
+    // A store over an existing document, which is saved to the URI.
     CXmlValueStore(const P<IXmlDocument>& document, const P<IURI>& uri, EStoreAccess access, EMode mode,
                    bool autoSave);
     // Changes that were not flushed are lost.
@@ -45,14 +45,14 @@ public:
     WEnum<IString> getSectionNames(const CStringArg& section) override;
     void removeValue(const CStringArg& section, const CStringArg& name) override;
     void removeSection(const CStringArg& section) override;
-    // Makes the folder of the file if need be.
+    // Creates the folder of the file if necessary.
     void flush() override;
 
 private:
-    // Empty where there is no such section.
+    // Empty if there is no such section.
     P<IXmlNode> findSection(const CStringArg& section) const;
     P<IXmlNode> makeSection(const CStringArg& section);
-    // The text of a value, null where there is none.
+    // The text of a value, null if there is none.
     P<IString> findValue(const CStringArg& section, const CStringArg& name) const;
     template <class T> T getNumber(const CStringArg& section, const CStringArg& name, T defaultValue) const;
     void checkWritable() const;
@@ -66,7 +66,7 @@ private:
     bool m_dirty = false;
 };
 
-// Files whose extension is "xml"; every other URI is left to others.
+// Opens files with the extension "xml"; returns an empty handle for every other URI.
 class PERU_API CXmlValueStoreFactory : public CObject, public IValueStoreFactory {
 public:
     explicit CXmlValueStoreFactory(CXmlValueStore::EMode mode = CXmlValueStore::EMode::elements,

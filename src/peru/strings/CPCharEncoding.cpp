@@ -11,7 +11,7 @@ namespace peru {
 
 namespace {
 
-// Byte length of the character at `p`, 0 when it is malformed or cut off.
+// Byte length of the character at `p`, 0 if it is malformed or truncated.
 int32_t decodeMultiByte(const uint8_t* p, int32_t left, char32_t& out) {
     if (left <= 0) return 0;
     wchar_t wide = 0;

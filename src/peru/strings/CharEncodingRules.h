@@ -1,5 +1,4 @@
-// How each encoding spells a code point. Shared by the encoding objects and by the loops that are compiled
-// for one encoding.
+// The rules of each encoding, shared by the encoding objects and by loops that are compiled for one encoding.
 #pragma once
 
 #include "peru/strings/ICharEncoding.h"
@@ -10,8 +9,9 @@ namespace peru {
 
 inline constexpr char32_t kMaxCodePoint = 0x10FFFF;
 
-// `decode` gives the byte length of the character at `p`, of which `left` bytes are there, or 0.
-// `getSize` gives 0 for what cannot be encoded; `write` takes only what can.
+// `decode` returns the byte length of the character at `p`, or 0 if it is malformed or exceeds the `left`
+// bytes available. `getSize` returns 0 for a code point that cannot be encoded; `write` must not be called
+// for one.
 
 struct SUTF8Rules {
     static constexpr uint32_t kId = ICharEncoding::kUTF8;
@@ -22,8 +22,9 @@ struct SUTF8Rules {
 
     static bool isTrail(uint8_t byte) { return (byte & 0xC0) == 0x80; }
 
-    // A lead byte whose payload bits are all zero is rejected, also where it would begin a character that the
-    // encoder writes: over-long forms never pass, at the price of U+0800 to U+0FFF and U+10000 to U+3FFFF.
+    // A lead byte whose payload bits are all zero is rejected, even where it begins a character that the
+    // encoder writes. This guards against over-long forms (those after 0xC1 still pass) and makes U+0800 to
+    // U+0FFF and U+10000 to U+3FFFF unreadable.
     static int32_t decode(const uint8_t* p, int32_t left, char32_t& out) {
         if (left <= 0) return 0;
         uint8_t lead = p[0];
@@ -77,8 +78,7 @@ struct SUTF8Rules {
     }
 };
 
-// In the byte order of the machine. A surrogate without its partner is malformed, and a surrogate code point
-// cannot be encoded.
+// Native byte order. An unpaired surrogate is malformed, and a surrogate code point cannot be encoded.
 struct SUTF16Rules {
     static constexpr uint32_t kId = ICharEncoding::kUTF16;
     static constexpr const char* kName = "UTF-16";
@@ -166,7 +166,7 @@ struct SLatin1Rules {
     }
 };
 
-// Bytes per code unit, 0 for the code page, which has none.
+// Bytes per code unit, 0 for the code page, which has no fixed unit.
 constexpr int32_t getUnitSize(uint32_t encodingId) {
     switch (encodingId) {
     case ICharEncoding::kUTF16:

@@ -6,7 +6,7 @@
 
 namespace peru {
 
-// Every operation of an encoding whose characters can be told apart from both ends, from its rules.
+// Implements all operations of an encoding that can be read in both directions, from its rules.
 template <class Rules> class PERU_API TCharEncoding : public CObject, public ICharEncoding {
 public:
     uint32_t getId() const override { return Rules::kId; }
@@ -38,7 +38,7 @@ class PERU_API CUTF32CharEncoding : public TCharEncoding<SUTF32Rules> {};
 class PERU_API CLatin1CharEncoding : public TCharEncoding<SLatin1Rules> {};
 
 // The multi-byte text of the C runtime's current locale. Shift states are not kept between characters. It can
-// be read forwards only.
+// only be read forwards.
 class PERU_API CCPCharEncoding : public CObject, public ICharEncoding {
 public:
     uint32_t getId() const override { return kCodePage; }

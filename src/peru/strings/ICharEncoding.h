@@ -7,8 +7,8 @@
 
 namespace peru {
 
-// Stateless; one shared object per encoding. `buffer` and `size` are bytes, `pos` is a byte offset.
-// Decoding operations return the byte offset behind (or, backwards, of) the character, or -1.
+// Stateless; one shared object per encoding. `size` and `pos` are in bytes. Decoding operations return the
+// byte offset after the character, or of the character when reading backwards, or -1.
 class PERU_API ICharEncoding : public virtual IBase {
 public:
     enum EId : uint32_t {
@@ -23,18 +23,18 @@ public:
     virtual const char* getName() const = 0;
     virtual int32_t getMaxCharSize() const = 0;
 
-    // The new position, or `pos` when the code point does not fit or cannot be encoded.
+    // Returns the new position, or `pos` if the code point does not fit or cannot be encoded.
     virtual int32_t encodeChar(char32_t ch, uint8_t* buffer, int32_t size, int32_t pos) const = 0;
-    // Bytes that `ch` needs, 0 when it cannot be encoded.
+    // Bytes that `ch` needs, 0 if it cannot be encoded.
     virtual int32_t getEncodedSize(char32_t ch) const = 0;
 
     // Length of the character at `pos`, -1 if there is none or it is malformed.
     virtual int32_t getCharSizeAt(const uint8_t* buffer, int32_t size, int32_t pos) const = 0;
-    // Characters from `pos` to the end; malformed bytes are stepped over and not counted.
+    // Characters from `pos` to the end; malformed bytes are skipped and not counted.
     virtual int32_t countChars(const uint8_t* buffer, int32_t size, int32_t pos) const = 0;
     // Byte length of zero-terminated text.
     virtual int32_t getTerminatedLength(const uint8_t* buffer) const = 0;
-    // Position of the character with the index `count`, malformed bytes skipped; -1 when there are fewer.
+    // Position of the character with the index `count`, malformed bytes skipped; -1 if there are fewer.
     virtual int32_t advance(const uint8_t* buffer, int32_t size, int32_t count) const = 0;
     // First position at or after `pos` where a well-formed character starts, -1 if none.
     virtual int32_t findValidChar(const uint8_t* buffer, int32_t size, int32_t pos) const = 0;
@@ -44,18 +44,17 @@ public:
     // The same, skipping malformed bytes first.
     virtual int32_t decodeNextChar(char32_t& out, const uint8_t* buffer, int32_t size, int32_t pos) const = 0;
 
-    // True for the encodings that hold every code point.
+    // True for the Unicode encodings.
     virtual bool isUnicode() const = 0;
 
-    // Backwards. The code page throws CMethodNotImplementedError in all four: it cannot be decoded from its
-    // end.
+    // Reading backwards. The code page throws CMethodNotImplementedError in all four operations.
     virtual int32_t findPrevChar(const uint8_t* buffer, int32_t size, int32_t pos) const = 0;
     virtual int32_t decodePrevChar(char32_t& out, const uint8_t* buffer, int32_t size, int32_t pos) const = 0;
     virtual int32_t decodePrevValidChar(char32_t& out, const uint8_t* buffer, int32_t size,
                                         int32_t pos) const = 0;
 
     // Decodes up to maxCount characters from `pos`, malformed bytes skipped; `positions`, unless null,
-    // receives the byte offset of each. Returns the position behind the last one, -1 when there was none.
+    // receives the byte offset of each. Returns the position after the last one, -1 if there was none.
     virtual int32_t decodeChars(char32_t* out, int32_t maxCount, int32_t& outCount, const uint8_t* buffer,
                                 int32_t size, int32_t pos, int32_t* positions) const = 0;
     virtual int32_t decodeCharsBackward(char32_t* out, int32_t maxCount, int32_t& outCount,

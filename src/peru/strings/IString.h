@@ -11,7 +11,7 @@ namespace peru {
 
 class IString;
 
-// A place in a string: character index and byte offset, so that a scan over multi-byte text carries on in
+// A position in a string: character index and byte offset, so that a scan over multi-byte text continues in
 // constant time. Index -1 means the end, or "not found".
 struct SStringPos {
     int32_t index = -1;
@@ -24,19 +24,19 @@ struct SStringPos {
 inline constexpr SStringPos kStringBegin{0, 0};
 inline constexpr SStringPos kStringEnd{-1, -1};
 
-// Encoded text and what is known of it.
+// Encoded text and what is known about it.
 struct SStringView {
     const ICharEncoding* encoding;
     uint32_t encodingId;
     int32_t byteSize;
     const uint8_t* data;
-    int32_t length;  // characters, -1 when nobody has counted them
-    bool wellFormed; // known to have no malformed bytes; never set while the length is not counted
+    int32_t length;  // in characters, -1 if not counted yet
+    bool wellFormed; // known to have no malformed bytes; only set once the length is known
 };
 
 // A text argument in any of its forms, without allocation: a string object, a zero-terminated Latin-1
-// pointer, a zero-terminated wide pointer (wchar_t or char16_t), or encoded bytes. It refers to its text
-// and lives for one call. A null pointer is an empty text.
+// pointer, a zero-terminated wide pointer (wchar_t or char16_t), or encoded bytes. It refers to the text and
+// must not outlive the call. A null pointer is an empty text.
 class PERU_API CStringArg {
 public:
     CStringArg(const IString& string);
@@ -65,14 +65,14 @@ public:
         int32_t getByteSize() const {
             return m_view.byteSize;
         }
-        // Characters; counted on first use where the form did not tell.
+        // In characters; counted on first use if not known.
         int32_t getLength() const {
             return getView().length;
         }
         bool isEmpty() const {
             return m_view.byteSize == 0 || getLength() == 0;
         }
-        // With the length counted.
+        // The view with its length counted.
         const SStringView& getView() const {
             if (m_view.length < 0) count();
             return m_view;
@@ -88,28 +88,29 @@ public:
 // Ordering, implemented by strings.
 class PERU_API IComparable : public virtual IBase {
 public:
-    // Negative, zero or positive. Throws CInvalidArgError when the other cannot be compared with this.
+    // Negative, zero or positive. Throws CInvalidArgError if the other object is not comparable with this
+    // one.
     virtual int compareTo(const P<IBase>& other) const = 0;
 };
 
-// Every operation that takes text takes it in each form of CStringArg. Ranges are given as start and end
+// Every operation that takes text accepts all forms of CStringArg. Ranges are given as start and end
 // position; the default end is the end of the string. Malformed bytes are skipped by every scan and do not
 // count towards the length. A string may be read by any number of threads.
 class PERU_API IString : public virtual IComparable {
 public:
     // --- Positions ---
-    virtual SStringPos getPosition(int32_t index) const = 0; // kStringEnd where there is no character
-    // Moves by `count` characters, backwards when negative; kStringEnd where there is no character.
+    virtual SStringPos getPosition(int32_t index) const = 0; // kStringEnd if there is no such character
+    // Moves by `count` characters, backwards if negative; kStringEnd if there is no such character.
     virtual SStringPos movePosition(SStringPos pos, int32_t count) const = 0;
-    // The character at `pos`, which moves on; 0 at the end, where `pos` becomes kStringEnd.
+    // Returns the character at `pos` and advances `pos`. At the end returns 0 and sets `pos` to kStringEnd.
     virtual char32_t getCharAndAdvance(SStringPos& pos) const = 0;
-    virtual char32_t getCharAt(int32_t index) const = 0; // 0 outside
+    virtual char32_t getCharAt(int32_t index) const = 0; // 0 if out of range
     virtual char32_t getCharAt(SStringPos pos) const = 0;
 
-    // --- Comparing ---
-    // Depends on the code points only: equal strings in different encodings hash alike.
+    // --- Comparing --- Depends on the code points only: equal strings in different encodings have the same
+    // hash.
     virtual uint32_t getHash() const = 0;
-    // By code point; `limit` characters at most unless -1.
+    // Compares by code point, at most `limit` characters unless -1.
     virtual int compare(const CStringArg& other, int32_t limit = -1) const = 0;
     virtual int compareIgnoreCase(const CStringArg& other, int32_t limit = -1) const = 0;
     virtual int compareRange(SStringPos start, SStringPos end, const CStringArg& other,
@@ -124,10 +125,9 @@ public:
     virtual bool startsWithAt(SStringPos start, const CStringArg& prefix) const = 0;
     virtual bool endsWith(const CStringArg& suffix) const = 0;
 
-    // --- Finding ---
-    // The first (find) or last (findLast) match that lies wholly between start and end. An empty text is
-    // found at the start, or last at the end. Text in the code page cannot be searched from its end: that
-    // throws CMethodNotImplementedError.
+    // --- Finding --- The first (find) or last (findLast) match that lies entirely between start and end.
+    // find returns the start for an empty text, findLast the end. The findLast family throws
+    // CMethodNotImplementedError for text in the code page, which cannot be read backwards.
     virtual SStringPos find(const CStringArg& text, SStringPos start = kStringBegin,
                             SStringPos end = kStringEnd) const = 0;
     virtual SStringPos findLast(const CStringArg& text, SStringPos start = kStringBegin,
@@ -143,16 +143,16 @@ public:
 
     // --- Parts; these share the bytes of this string ---
     virtual P<IString> substring(SStringPos start, SStringPos end = kStringEnd) const = 0;
-    // The slice from `pos` up to the next separator character of the set; `pos` moves behind the separator,
-    // to kStringEnd after the last token. Empty handle when `pos` is kStringEnd on entry.
+    // Returns the slice from `pos` to the next character of the set and moves `pos` past that separator, or
+    // to kStringEnd after the last token. Returns an empty handle if `pos` is kStringEnd on entry.
     virtual P<IString> nextToken(SStringPos& pos, const CStringArg& separatorSet) const = 0;
     // The same with one separator of several characters.
     virtual P<IString> nextTokenByString(SStringPos& pos, const CStringArg& separator) const = 0;
     virtual P<IString> trim() const = 0; // white space at both ends
     virtual P<IString> trim(const CStringArg& characters) const = 0;
 
-    // --- Editing; a new string, in this string's encoding where that holds the result, else UTF-8. Where
-    // replace and the change of case find nothing to do they answer this string. ---
+    // --- Editing; returns a new string, in this string's encoding if that can hold the result, otherwise in
+    // UTF-8. replace, toLower and toUpper return this string if there is nothing to change. ---
     virtual P<IString> concat(const CStringArg& text) const = 0;
     virtual P<IString> insert(SStringPos pos, const CStringArg& text) const = 0;
     virtual P<IString> remove(SStringPos pos, int32_t count = -1) const = 0;
@@ -162,13 +162,13 @@ public:
     virtual P<IString> toLower() const = 0;
     virtual P<IString> toUpper() const = 0;
 
-    // --- Conversion; the same object when it already is terminated text in that encoding ---
+    // --- Conversion; returns this object if it is already terminated text in that encoding ---
     virtual P<IString> toCPString() const = 0;
     virtual P<IString> toUTF8String() const = 0;
     virtual P<IString> toUTF16String() const = 0;
     virtual P<IString> toUTF32String() const = 0;
     virtual P<IString> toWCharString() const = 0;
-    virtual P<IString> toLatin1String() const = 0; // what Latin-1 does not hold becomes '?'
+    virtual P<IString> toLatin1String() const = 0; // other characters become '?'
     virtual P<IString> getTerminated() const = 0;
 
     // --- Access ---
@@ -179,7 +179,7 @@ public:
     virtual const uint8_t* getData() const = 0; // encoded bytes, valid while the string lives
     virtual int32_t getDataSize() const = 0;    // bytes, without the terminator
     virtual bool isTerminated() const = 0;
-    virtual SStringView getView() const = 0; // all of it in one call
+    virtual SStringView getView() const = 0; // all of the above in one call
 };
 
 // Concatenation in every mix of string objects and literals.

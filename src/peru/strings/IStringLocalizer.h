@@ -7,19 +7,20 @@
 
 namespace peru {
 
-// Keys are flat dotted names; the first part is the namespace, the second the class. Safe from any thread.
+// Keys are flat dotted names; the first part is the namespace, the second the class. Thread-safe.
 class PERU_API IStringLocalizer : public virtual IBase {
 public:
     virtual void clear() = 0;
     virtual void setParent(const P<IStringLocalizer>& parent) = 0;
     virtual void setText(const CStringArg& key, const P<IString>& text) = 0;
-    // An own non-empty entry, else the parent's answer, else the default text.
+    // Returns the localizer's own entry if it is not empty, otherwise the parent's result, otherwise the
+    // default text.
     virtual P<IString> getText(const CStringArg& key, const P<IString>& defaultText) = 0;
 };
 
 PERU_API P<IStringLocalizer> getStringLocalizer();
 
-// A placeholder such as "%FILE%" and what stands in its place.
+// A placeholder such as "%FILE%" and its value.
 struct SPlaceholder {
     const char* name;
     CStringArg value;

@@ -1,4 +1,4 @@
-// Locales of the C runtime that do not depend on what the process has chosen.
+// Locales of the C runtime that do not depend on the process's own setting.
 #pragma once
 
 #include <locale.h>
@@ -8,7 +8,7 @@ namespace peru {
 locale_t getUnicodeLocale(); // case and character classes of all of Unicode
 locale_t getPlainLocale();   // "C": the point is the decimal separator
 
-// Makes the plain locale current on this thread for a block.
+// Makes the plain locale current on this thread for the scope.
 class CPlainLocaleScope {
 public:
     CPlainLocaleScope() : m_previous(uselocale(getPlainLocale())) {}

@@ -19,7 +19,8 @@ namespace {
 
 alignas(4) constexpr unsigned char kZeros[8] = {};
 
-// Bytes of a unit that is cut off at the end. They are left out: an edit would shift all units behind them.
+// Bytes of an incomplete unit at the end. They are dropped, since an edit would misalign all units after
+// them.
 int32_t getPartialUnit(uint32_t encodingId, int32_t byteSize) {
     int32_t unit = getUnitSize(encodingId);
     return unit > 1 ? byteSize % unit : 0;
@@ -33,7 +34,7 @@ size_t getTerminatedSize(int64_t byteSize) {
     return static_cast<size_t>(byteSize + kTerminatorSize);
 }
 
-// The encodings of the library live to the end of the process; one that a caller made does not.
+// The library's encodings live until the process exits; a caller's own encoding must be counted.
 PFrail<ICharEncoding> holdEncoding(const ICharEncoding* encoding, uint32_t id) {
     const ICharEncoding* shared = nullptr;
     switch (id) {
@@ -219,7 +220,7 @@ SStringPos CString::movePosition(SStringPos pos, int32_t count) const {
         SStringView rest = getRange(pos, getEnd());
         return {target, pos.offset + text::getOffset(rest, count)};
     }
-    // The code page cannot go back; it starts again from the front.
+    // The code page cannot be read backwards, so the scan restarts at the beginning.
     if (m_encodingId == ICharEncoding::kCodePage) return getPosition(target);
     for (; count < 0; ++count) pos.offset = m_encoding->findPrevChar(m_data, m_byteSize, pos.offset);
     return {target, pos.offset};
@@ -276,7 +277,7 @@ template <class F> P<IString> CString::trimBy(F&& isTrimmed) const {
     char32_t ch;
     SStringPos start = kStringBegin;
     SStringPos end = getEnd();
-    // The code page cannot be read from its end, so there one pass from the front finds both.
+    // The code page cannot be read backwards, so a single forward pass finds both ends.
     bool forwardOnly = m_encodingId == ICharEncoding::kCodePage;
     bool started = false;
     int32_t index = 0;

@@ -9,17 +9,17 @@
 
 namespace peru {
 
-// How a string comes by its bytes.
+// How a string obtains its bytes.
 enum class EStringStorage {
     copy = 0,  // allocates, copies and terminates
-    adopt = 1, // takes over a block from std::malloc and frees it at the end
-    refer = 2, // refers to bytes whose life the caller vouches for, such as literals
+    adopt = 1, // takes ownership of a block from std::malloc
+    refer = 2, // refers to bytes that the caller keeps valid, such as literals
 };
 
 // The implementation of IString; one class for all encodings.
 class PERU_API CString : public CObject, public IString {
 public:
-    // byteSize -1: zero-terminated text. length -1: counted.
+    // byteSize -1: the text is zero-terminated. length -1: the characters are counted.
     CString(const P<ICharEncoding>& encoding, const void* data, int32_t byteSize = -1,
             EStringStorage storage = EStringStorage::copy, bool terminated = false, int32_t length = -1);
     ~CString() override;
@@ -31,7 +31,7 @@ public:
     static P<IString> fromView(const SStringView& view); // a copy
     static P<IString> fromUTF8(std::string_view bytes);
     static P<IString> fromUTF16(const char16_t* text, int32_t length = -1);
-    // The bytes of the string in UTF-8; bytes of a UTF-8 string come back as they are, malformed or not.
+    // The text as UTF-8 bytes. The bytes of a UTF-8 string are returned unchanged, malformed or not.
     static std::string toStdString(const CStringArg& text);
     static std::u16string toStdU16String(const CStringArg& text);
 
@@ -100,21 +100,21 @@ public:
     bool isTerminated() const override { return m_terminated; }
     SStringView getView() const override { return view(); }
 
-    // A terminated string whose bytes lie behind the object itself, in one allocation. Who asked for it
-    // writes them (getRoom) and settles the length before anyone else sees the string. Throws std::bad_alloc,
-    // also above 2 GB.
+    // Allocates a terminated string and room for its bytes in one block. The caller writes the bytes
+    // (getRoom) and calls settle() before anything else uses the string. Throws std::bad_alloc, also above 2
+    // GB.
     static P<CString> reserve(const ICharEncoding& encoding, int64_t byteSize);
     uint8_t* getRoom() { return const_cast<uint8_t*>(m_data); }
     void settle(int32_t length = -1, bool wellFormed = false); // -1: counted
 
-    // Without a size at the end: room for bytes may lie behind the object.
+    // Unsized, since room for the bytes may follow the object.
     static void* operator new(size_t size) { return ::operator new(size); }
     static void operator delete(void* object) { ::operator delete(object); }
 
 protected:
-    // Refers to text whose length is counted.
+    // Refers to text with a counted length.
     CString(const SStringView& view, bool terminated);
-    // The string whose bytes these are: slices of a slice hold on to the root.
+    // The string that owns the bytes; a slice of a slice refers to it directly.
     virtual P<const IString> getSliceRoot() const;
 
 private:
@@ -128,14 +128,14 @@ private:
         return {m_encoding.get(), m_encodingId, m_byteSize, m_data, m_length, m_wellFormed};
     }
     SStringPos getEnd() const { return {m_length, m_byteSize}; }
-    // With an index from 0 to the length and the offset that belongs to it.
+    // Returns a position with an index from 0 to the length and the matching offset.
     SStringPos resolve(SStringPos pos) const {
         if (pos.index < 0 || pos.index >= m_length) return getEnd();
         if (pos.offset < 0 || pos.offset > m_byteSize) pos.offset = getOffset(pos.index);
         return pos;
     }
     int32_t getOffset(int32_t index) const;
-    // Of resolved positions.
+    // Both positions must be resolved.
     SStringView getRange(SStringPos start, SStringPos end) const {
         if (start.index >= end.index || start.offset > end.offset) end = start;
         return {m_encoding.get(),        m_encodingId, end.offset - start.offset, m_data + start.offset,
@@ -155,13 +155,13 @@ private:
     bool m_owner;
     PFrail<ICharEncoding> m_encoding; // the shared encodings outlive all strings and are not counted
     int32_t m_length;                 // characters; known from construction onwards
-    // What falls out of counting, and the hash once it was asked for (0 before).
+    // The flag is set while counting; the hash is 0 until it is first requested.
     bool m_wellFormed;
     uint32_t m_encodingId;
     mutable std::atomic<uint32_t> m_hash{0};
 };
 
-// The concrete classes add their encoding only. `length` counts characters' units, -1 up to the terminator.
+// The concrete classes only add their encoding. `length` is in code units; -1 means up to the terminator.
 class PERU_API CLatin1String : public CString {
 public:
     using Unit = char;
@@ -205,7 +205,7 @@ public:
     explicit CCPString(const char* text, int32_t length = -1, EStringStorage storage = EStringStorage::copy);
 };
 
-// The shared empty instance of each string class: character type and class.
+// The shared empty instance of string class S with character type C.
 template <class C, class S> class PERU_API TNullString {
 public:
     static const P<IString>& get();
@@ -217,7 +217,7 @@ extern template class TNullString<unsigned char, CUTF8String>;
 extern template class TNullString<unsigned int, CUTF32String>;
 extern template class TNullString<wchar_t, CWCharString>;
 
-// A string from a pointer; a null pointer gives the shared empty string and allocates nothing.
+// Creates a string from a pointer; a null pointer returns the shared empty string without allocating.
 PERU_API P<IString> newString(const char* latin1);
 PERU_API P<IString> newString(const wchar_t* wide);
 PERU_API P<IString> newString(const char16_t* wide);
@@ -230,7 +230,7 @@ PERU_API P<IString> operator""_s(const char* text, size_t length);
 // A part of another string: shares its bytes and keeps it alive.
 class PERU_API CStringSlice : public CString {
 public:
-    // A view of bytes of the parent, with its length counted.
+    // `view` refers to bytes of the parent and has a counted length.
     CStringSlice(const P<const IString>& parent, const SStringView& view, bool terminated);
     ~CStringSlice() override;
 

@@ -16,7 +16,7 @@ char32_t toUpper(char32_t ch) {
     return static_cast<char32_t>(towupper_l(static_cast<wint_t>(ch), getUnicodeLocale()));
 }
 
-// The runtime's table leaves out the no-break spaces, which surround pasted text often enough.
+// The runtime's table omits the no-break spaces, which often surround pasted text.
 bool isWhiteSpace(char32_t ch) {
     if (ch < 0x80) return ch == ' ' || (ch >= 9 && ch <= 13);
     return ch == 0x85 || ch == 0xA0 || ch == 0x2007 || ch == 0x202F ||

@@ -38,7 +38,7 @@ template <class M> int compareBySteps(const SStringView& a, const SStringView& b
     }
 }
 
-// For the encodings that the compiler knows: the same without the window.
+// The same without the window, for encodings with compile-time rules.
 template <class A, class B> int compareDecoded(const SStringView& a, const SStringView& b) {
     const uint8_t* endA = a.data + a.byteSize;
     const uint8_t* endB = b.data + b.byteSize;
@@ -101,21 +101,21 @@ bool startsWith(const SStringView& text, const SStringView& prefix) {
 
 namespace {
 
-// h = ((h AND 0x0FFFFFFF) << 3) XOR (((h >> 2) XOR c) AND 0x7FFFFFFF). Bit 31 of h and c is always clear,
-// which makes the second AND idle.
+// h = ((h AND 0x0FFFFFFF) << 3) XOR (((h >> 2) XOR c) AND 0x7FFFFFFF). Bit 31 of h and c is always clear, so
+// the second AND has no effect.
 constexpr uint32_t addToHash(uint32_t hash, uint32_t ch) {
     return (hash << 3 & 0x7FFFFFF8) ^ (hash >> 2 ^ ch);
 }
 
-// Two steps in one, so that a step waits for its forerunner half as often: addToHash(addToHash(h, a), b), its
-// shifts multiplied out.
+// Two steps in one: addToHash(addToHash(hash, a), b) with its shifts multiplied out, which halves the chain
+// of dependent steps.
 constexpr uint32_t addToHash(uint32_t hash, uint32_t a, uint32_t b) {
     return (hash << 6 & 0x7FFFFFC0) ^ (hash << 1 & 0x60000007) ^ (hash >> 4 ^ addToHash(a, b));
 }
 
-// A step is linear over bits, so the hash of two pieces in a row is that of the first, carried on over as
-// many zeros as the second has characters, XOR that of the second. Long text is hashed as four pieces at
-// once, since a single chain of steps leaves the processor waiting for its own results.
+// A step is linear over bits, so the hash of two consecutive pieces is the hash of the first, advanced over
+// as many zeros as the second has characters, XOR the hash of the second. Long text is hashed as four pieces
+// in parallel, since the processor would stall on a single chain of dependent steps.
 constexpr int32_t kHashPiece = 64;
 
 class CHashOverPiece {

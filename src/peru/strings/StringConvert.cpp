@@ -15,7 +15,7 @@ namespace {
 
 constexpr char32_t kReplacementCharacter = 0xFFFD;
 
-// The ASCII spelling of a number without a leading "+"; empty when the text cannot be a number.
+// The text of a number in ASCII without a leading "+"; empty if the text cannot be a number.
 std::string getNumberText(const CStringArg& text) {
     const SStringView& view = text.getView();
     std::string digits;

@@ -19,16 +19,17 @@ uint8_t* append(uint8_t* out, const uint8_t* data, int64_t size) {
 // The core of insert, remove and the ranged replace: one block of the exact size.
 P<IString> CString::edit(SStringPos start, SStringPos end, const SStringView& inserted) const {
     if (start.index > end.index || start.offset > end.offset) end = start;
-    // Text in this string's own encoding goes in byte for byte, so that bytes which only other programs can
-    // decode are kept. Only where malformed bytes join up with their new neighbours to make a character are
-    // they dropped instead.
+    // Text in this string's own encoding is inserted byte for byte, so that bytes which only other programs
+    // can decode are kept. They are dropped only if they would combine with their new neighbours into a
+    // character.
     bool raw = inserted.encodingId == m_encodingId && !inserted.wellFormed;
     int32_t length = m_length - (end.index - start.index) + inserted.length;
     for (;; raw = false) {
         int64_t needed = raw ? inserted.byteSize : text::getEncodedSize(*m_encoding.get(), inserted);
         if (needed < 0) {
             P<IString> copy = text::convert(getUTF8CharEncoding(), view(), '?');
-            // Where UTF-8 would not read again what is here, what is put in gives way.
+            // If this string's own characters would not survive in UTF-8, the inserted text gets substitutes
+            // instead.
             if (copy->getLength() != m_length)
                 return edit(start, end, text::convert(getEncoding(), inserted, '?')->getView());
             SStringPos from = start.index >= copy->getLength() ? kStringEnd : copy->getPosition(start.index);
@@ -90,7 +91,7 @@ P<IString> CString::replace(const CStringArg& search, const CStringArg& replacem
         if (copy->getLength() == m_length)
             return copy->replace(search, replacement, copy->getPosition(start.index),
                                  copy->getPosition(end.index));
-        // As in edit(): what is put in gives way.
+        // As in edit(): the inserted text gets substitutes.
         return replace(search, *text::convert(getEncoding(), inserted, '?'), start, end);
     }
     int64_t size = m_byteSize;

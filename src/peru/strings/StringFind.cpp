@@ -57,7 +57,7 @@ int32_t findLastPiece(const SStringView& text, const uint8_t* piece, int32_t pie
     return -1;
 }
 
-// The search text in the encoding of the text that is searched: as it is, or re-encoded on the stack.
+// The search text in the encoding of the searched text: used directly, or re-encoded on the stack.
 class CPiece {
 public:
     enum EState { ready, impossible, tooLong };
@@ -68,8 +68,8 @@ public:
             m_size = wanted.byteSize;
             return;
         }
-        // One byte a character on both sides is the same bytes in both encodings; beside UTF-8 with longer
-        // characters that holds for ASCII.
+        // With one byte per character on both sides the bytes are the same in both encodings. If the searched
+        // text is UTF-8 with longer characters, that only holds for ASCII.
         if (getFixedWidth(wanted) == 1 && getUnitSize(text.encodingId) == 1 &&
             (getFixedWidth(text) == 1 || isASCII(wanted))) {
             m_data = wanted.data;
@@ -93,7 +93,7 @@ public:
 
 private:
     static bool isASCII(const SStringView& view) {
-        // What is looked for is mostly too short for vectors to pay.
+        // Search texts are usually too short for vectors to pay off.
         for (int32_t i = 0; i < view.byteSize; ++i)
             if (view.data[i] >= 0x80) return false;
         return true;
@@ -107,7 +107,7 @@ private:
                 m_state = text.encoding->getEncodedSize(ch) == 0 ? impossible : tooLong;
                 return;
             }
-            // What the encoder writes and the decoder rejects cannot stand in well-formed text.
+            // A character that the encoder writes but the decoder rejects cannot occur in well-formed text.
             if (text.encoding->decodeChar(back, m_buffer, end, m_size) != end) {
                 m_state = impossible;
                 return;
@@ -130,7 +130,7 @@ bool matchesAt(const SStringView& text, int32_t offset, const SStringView& wante
     return true;
 }
 
-// Places are relative to the text given.
+// The result is relative to `text`.
 SStringPos findBySteps(const SStringView& text, const SStringView& wanted) {
     char32_t first = 0;
     char32_t ch;
@@ -156,7 +156,7 @@ SStringPos findLastBySteps(const SStringView& text, const SStringView& wanted) {
 SStringPos toPlace(const SStringView& text, int32_t offset) {
     if (offset < 0) return kStringEnd;
     int32_t width = getFixedWidth(text);
-    // A shift: a division would cost as much as finding a place in short text.
+    // A shift: a division would cost as much as the search in a short text.
     return {width ? offset >> (width >> 1) : countWellFormed(text, offset), offset};
 }
 
@@ -172,7 +172,7 @@ template <bool last> SStringPos findIn(const SStringView& text, const SStringVie
     return last ? findLastBySteps(text, wanted) : findBySteps(text, wanted);
 }
 
-// A set of characters: a bit for each of the first 256, the rest by looking through the text.
+// A set of characters: a flag for each of the first 256, a search through the text for the others.
 class CCharacterSet {
 public:
     explicit CCharacterSet(const SStringView& view) : m_view(view) {
@@ -228,7 +228,7 @@ SStringPos shift(SStringPos found, SStringPos start) {
     return found.isFound() ? SStringPos{found.index + start.index, found.offset + start.offset} : kStringEnd;
 }
 
-// Text that cannot be read from its end says so itself.
+// Lets the encoding throw its own error for text that cannot be read backwards.
 void requireBackward(const SStringView& text) {
     if (text.encodingId == ICharEncoding::kCodePage)
         text.encoding->findPrevChar(text.data, text.byteSize, text.byteSize);

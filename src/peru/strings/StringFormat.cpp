@@ -14,7 +14,7 @@ namespace peru {
 namespace {
 
 constexpr size_t kMaxFlags = 5;
-// No message needs more; beyond it a format or a "*" argument is taken for damaged.
+// No message needs more; a larger number counts as an error in the format or the "*" argument.
 constexpr int32_t kMaxWidth = 1000000;
 
 constexpr const char* kGoToNextField = "CStringFormat::goToNextFormatField";
@@ -82,7 +82,7 @@ void CStringFormat::parseField() {
     if (parseNumber(m_field.width, EPending::width)) parseTail();
 }
 
-// From the precision on: what follows the width.
+// Parses what follows the width: the precision and the conversion.
 void CStringFormat::parseTail() {
     if (peekChar() == '.') {
         skipChar();
@@ -92,7 +92,7 @@ void CStringFormat::parseTail() {
     finishConversion();
 }
 
-// False when the number is a "*" and waits for its argument.
+// Returns false if the number is a "*" that waits for its argument.
 bool CStringFormat::parseNumber(int32_t& number, EPending star) {
     if (peekChar() == '*') {
         skipChar();
@@ -134,7 +134,7 @@ bool CStringFormat::takeStar(int64_t value, const char* method) {
     }
     if (m_pending == EPending::precision) {
         if (value > kMaxWidth) throwArgError(kExpectedPrecision, method);
-        // As in C, a negative precision is none.
+        // As in C, a negative precision counts as not given.
         m_field.precision = value < 0 ? -1 : static_cast<int32_t>(value);
         finishConversion();
         return true;
@@ -155,7 +155,7 @@ void CStringFormat::requireValue(const char* conversions, const char* method) {
 CStringFormat& CStringFormat::pushInt(int64_t value, size_t size) {
     if (takeStar(value, kDoInt)) return *this;
     uint64_t bits = static_cast<uint64_t>(value);
-    // Narrower arguments than int are promoted, as C does.
+    // As in C, arguments narrower than int are promoted.
     if (size <= 4) bits &= 0xFFFFFFFF;
     return appendInteger(value < 0, value < 0 ? 0 - static_cast<uint64_t>(value) : bits, bits);
 }

@@ -13,7 +13,8 @@ namespace peru {
 // Flags, width, precision (either may be "*") and the conversions c C d i o x X u e E f g G s S follow the C
 // format strings; length modifiers are accepted and skipped, since the type of the pushed value decides.
 // Width and precision of texts count characters; the decimal separator is the point in every locale.
-// Throws CInvalidArgError on a bad format or a value of the wrong type, CError when text is taken too early.
+// Throws CInvalidArgError for an invalid format or a value of the wrong type, CError if the text is taken
+// too early.
 class PERU_API CStringFormat : public CObject {
 public:
     explicit CStringFormat(const CStringArg& format);
@@ -37,14 +38,14 @@ public:
     CStringFormat& push(const P<IString>& value) { return pushString(value); }
     CStringFormat& push(const char* latin1) { return pushString(latin1); }
 
-    // `size` in bytes tells how wide a negative value prints where the field has no sign.
+    // `size` is the argument's size in bytes; it determines how a negative value prints in an unsigned field.
     CStringFormat& pushInt(int64_t value, size_t size = 8);
     CStringFormat& pushUInt(uint64_t value, size_t size = 8);
     CStringFormat& pushDouble(double value);
     CStringFormat& pushString(const CStringArg& value);
     CStringFormat& pushChar(char32_t value);
 
-    // In the format's encoding where that holds the result, else in UTF-8.
+    // In the format's encoding if that can hold the result, otherwise in UTF-8.
     P<IString> getText();
 
 private:
@@ -66,7 +67,7 @@ private:
     char32_t peekChar() const; // 0 at the end of the format
     void skipChar();
 
-    // True when the argument was a width or precision.
+    // Returns true if the argument was taken as a width or precision.
     bool takeStar(int64_t value, const char* method);
     void requireValue(const char* conversions, const char* method);
     void requireNoStar(const char* method) const;

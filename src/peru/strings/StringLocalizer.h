@@ -13,7 +13,7 @@ public:
     ~CStringLocalizer() override;
 
     void clear() override;
-    // Parents must not form a ring; a localizer as its own parent is refused with CInvalidArgError.
+    // Parents must not form a cycle; the localizer itself as its parent throws CInvalidArgError.
     void setParent(const P<IStringLocalizer>& parent) override;
     void setText(const CStringArg& key, const P<IString>& text) override;
     P<IString> getText(const CStringArg& key, const P<IString>& defaultText) override;

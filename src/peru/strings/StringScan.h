@@ -24,10 +24,10 @@ template <class U> struct SUnits {
     }
 };
 
-// The block that the loops below test without a branch: long enough for the compiler to use vectors.
+// Units that the loops below test without a branch; long enough for the compiler to vectorise.
 inline constexpr int32_t kScanBlock = 64;
 
-// The first index at which two arrays differ, `count` when they do not.
+// The first index at which two arrays differ, `count` if they do not.
 template <class A, class B> int32_t findDifference(SUnits<A> a, SUnits<B> b, int32_t count) {
     using W = std::conditional_t<(sizeof(A) > sizeof(B)), A, B>;
     int32_t i = 0;
@@ -70,7 +70,7 @@ template <class U> int32_t findUnit(SUnits<U> units, int32_t count, U wanted) {
     return -1;
 }
 
-// True when one of so many units satisfies the test, which has no branches.
+// True if one of the first `count` units satisfies the test, which must not branch.
 template <class U, class F> bool hasAny(SUnits<U> units, int32_t count, F&& test) {
     U found = 0;
     for (int32_t i = 0; i < count; ++i) found |= static_cast<U>(test(units[i]));

@@ -11,7 +11,7 @@ namespace peru::text {
 
 namespace {
 
-// Units from `pos` on that are one character each, found a block at a time.
+// Skips the blocks from `pos` on in which every unit is a character; returns the position after them.
 template <class Rules> int32_t skipPlainBlocks(const uint8_t* data, int32_t byteSize, int32_t pos) {
     if constexpr (std::is_same_v<Rules, SUTF8Rules>) {
         uint64_t block;
@@ -33,8 +33,8 @@ template <class Rules> int32_t skipPlainBlocks(const uint8_t* data, int32_t byte
     return pos;
 }
 
-// Over-long forms that the decoder lets pass (U+0040 to U+007F behind 0xC1) make two spellings of one text,
-// so such text does not count as well-formed.
+// The over-long forms that the decoder accepts (U+0040 to U+007F after 0xC1) give one text two spellings, so
+// text with them does not count as well-formed.
 template <class Rules> void countBy(SStringView& view) {
     int32_t count = 0;
     bool wellFormed = true;
@@ -42,7 +42,8 @@ template <class Rules> void countBy(SStringView& view) {
     for (int32_t pos = 0; pos < view.byteSize;) {
         int32_t next = skipPlainBlocks<Rules>(view.data, view.byteSize, pos);
         count += (next - pos) / Rules::kUnit;
-        // What stopped the blocks is near: a run of steps costs less than to look for blocks at every one.
+        // The unit that stopped the blocks is near: single steps over a whole block cost less than retrying
+        // the block scan after each step.
         int32_t stop = std::min(next + kScanBlock, view.byteSize);
         for (pos = next; pos < stop;) {
             if constexpr (std::is_same_v<Rules, SUTF8Rules>) wellFormed &= view.data[pos] != 0xC1;
@@ -56,7 +57,7 @@ template <class Rules> void countBy(SStringView& view) {
     view.wellFormed = wellFormed;
 }
 
-// Gives every character of a text to `f` until that returns false.
+// Calls `f` with each character until it returns false.
 template <class F> void forEach(const SStringView& text, F&& f) {
     bool known = withRules(text.encodingId, [&](auto rules) {
         using Rules = decltype(rules);
@@ -80,7 +81,7 @@ template <class Rules> void encodeBy(const SStringView& text, uint8_t* out) {
     });
 }
 
-// The common conversion, eight ASCII characters at a time where there are so many.
+// The most common conversion; takes eight ASCII characters at a time where possible.
 void encodeUTF8AsUTF16(const SStringView& text, uint8_t* out) {
     const uint8_t* data = text.data;
     const uint8_t* end = data + text.byteSize;
@@ -100,7 +101,7 @@ void encodeUTF8AsUTF16(const SStringView& text, uint8_t* out) {
         while (data < stop) {
             int32_t length = 1;
             if (text.wellFormed && *data < 0xF0) {
-                // What counting has checked need not be checked again.
+                // Counting has validated these characters.
                 char32_t lead = *data;
                 length = lead < 0x80 ? 1 : lead < 0xE0 ? 2 : 3;
                 uint16_t unit = static_cast<uint16_t>(
@@ -136,7 +137,7 @@ int64_t getEncodedSizeBySteps(const ICharEncoding& encoding, const SStringView& 
     return total;
 }
 
-// Of well-formed UTF-8 in UTF-16, -1 when that takes a closer look because of surrogates.
+// The size in UTF-16 of well-formed UTF-8; -1 if the text may contain surrogates, which need single steps.
 int64_t getUTF16SizeOfUTF8(const SStringView& text) {
     int32_t pairs = 0;
     uint8_t suspect = 0;
@@ -147,9 +148,8 @@ int64_t getUTF16SizeOfUTF8(const SStringView& text) {
     return suspect ? -1 : 2 * (static_cast<int64_t>(text.length) + pairs);
 }
 
-// Bytes that carry a UTF-8 character on, blockwise so that a lane of the vectors is a byte.
-// Of eight bytes without the first `counted`, which lie in a word's low end: a trail byte begins with the
-// bits 1 and 0, and the product adds up the flags of all bytes.
+// Counts the UTF-8 trail bytes among eight bytes, without the first `counted` ones, which are at the low end
+// of the word. A trail byte starts with the bits 10; the product adds up the flags of all bytes.
 int32_t countTrailsOfWord(const uint8_t* data, int32_t counted) {
     constexpr uint64_t kLowBits = 0x0101010101010101;
     uint64_t word;
@@ -158,6 +158,7 @@ int32_t countTrailsOfWord(const uint8_t* data, int32_t counted) {
     return static_cast<int32_t>(((word >> 7 & ~(word >> 6) & kLowBits) * kLowBits) >> 56);
 }
 
+// The same for any number of bytes. Blocks use byte-wide counters, so that a vector lane is a byte.
 int32_t countTrails(const uint8_t* data, int32_t byteSize) {
     int32_t count = 0;
     int32_t i = 0;
@@ -167,8 +168,8 @@ int32_t countTrails(const uint8_t* data, int32_t byteSize) {
             trails = static_cast<uint8_t>(trails + SUTF8Rules::isTrail(data[i + k]));
         count += trails;
     }
-    // What is left of a long text and the whole of a short one goes by words. The last one overlaps the one
-    // before it; what was counted there is shifted out.
+    // The rest of a long text, or a whole short one, is counted by words. The last word overlaps the one
+    // before it; bytes that are already counted are shifted out.
     if (byteSize < 8) {
         for (; i < byteSize; ++i) count += SUTF8Rules::isTrail(data[i]);
         return count;
@@ -283,7 +284,7 @@ P<IString> convert(const P<ICharEncoding>& encoding, const SStringView& text, ch
     if (size >= 0) {
         P<CString> string = CString::reserve(*encoding, size);
         encode(*encoding, text, string->getRoom());
-        // Only UTF-8 has characters that are written and not read again.
+        // Only UTF-8 writes characters that it does not read back.
         bool known = text.length >= 0 && getUnitSize(encoding->getId()) != 0 &&
                      (encoding->getId() != ICharEncoding::kUTF8 || size == text.length);
         string->settle(known ? text.length : -1, known);

@@ -1,4 +1,4 @@
-// What the string operations share: knowledge about encoded text, typed access, and re-encoding.
+// Helpers of the string operations: properties of encoded text, typed access and re-encoding.
 #pragma once
 
 #include "peru/strings/CharEncodingRules.h"
@@ -10,8 +10,8 @@
 
 namespace peru::text {
 
-// Bytes per character when every character is one code unit and nothing is malformed, else 0. Needs a
-// counted length.
+// Bytes per character if every character is one code unit and none is malformed, otherwise 0. Needs a counted
+// length.
 inline int32_t getFixedWidth(const SStringView& view) {
     int32_t unit = getUnitSize(view.encodingId);
     return unit != 0 && view.length * unit == view.byteSize ? unit : 0;
@@ -29,7 +29,7 @@ template <class F> decltype(auto) withUnits(const SStringView& view, int32_t wid
     }
 }
 
-// Calls `f` with the rules of an encoding that has any; false for the code page.
+// Calls `f` with the rules of the encoding; returns false for the code page, which has none.
 template <class F> bool withRules(uint32_t encodingId, F&& f) {
     switch (encodingId) {
     case ICharEncoding::kUTF8:
@@ -51,28 +51,29 @@ template <class F> bool withRules(uint32_t encodingId, F&& f) {
 // Fills in length and wellFormed.
 void count(SStringView& view);
 
-// Byte offset of a character in counted text, `index` from 0 to the length; the byte size for the length.
+// Byte offset of the character at `index`, from 0 to the length; the byte size for the length itself. Needs a
+// counted length.
 int32_t getOffset(const SStringView& view, int32_t index);
-// Characters in well-formed text before a byte offset at which a character starts.
+// Number of characters in the first `byteSize` bytes of well-formed text, which must end between characters.
 int32_t countWellFormed(const SStringView& view, int32_t byteSize);
 // The first `length` characters.
 SStringView clip(const SStringView& view, int32_t length);
 
-// Negative, zero or positive by code point; counted texts.
+// Negative, zero or positive by code point. Needs counted lengths.
 int compare(const SStringView& a, const SStringView& b);
 bool equals(const SStringView& a, const SStringView& b);
 int compareIgnoreCase(const SStringView& a, const SStringView& b);
 bool startsWith(const SStringView& text, const SStringView& prefix);
 
-// Bytes that counted text needs in another encoding; -1 when a character cannot be encoded there. Malformed
-// bytes need none, except that malformed UTF-8 counts as not encodable in Latin-1: an edit then results in
-// UTF-8, which carries the bytes on.
+// Bytes that the text needs in another encoding, -1 if a character cannot be encoded there. Needs a counted
+// length. Malformed bytes need none, except that malformed UTF-8 counts as unencodable in Latin-1, so that an
+// edit produces UTF-8, which keeps the bytes.
 int64_t getEncodedSize(const ICharEncoding& encoding, const SStringView& text);
-// Writes so many bytes.
+// Writes getEncodedSize() bytes.
 void encode(const ICharEncoding& encoding, const SStringView& text, uint8_t* out);
 
-// The text in another encoding as a string of its own, terminated; `substitute` stands for what cannot be
-// encoded.
+// Returns the text in another encoding as a new, terminated string; `substitute` replaces characters that
+// cannot be encoded.
 P<IString> convert(const P<ICharEncoding>& encoding, const SStringView& text, char32_t substitute);
 
 char32_t toLower(char32_t ch);

@@ -6,19 +6,19 @@
 
 namespace peru {
 
-// What both have in common: slices of one string, found one after the other.
+// Base of both enumerators: slices of one string, found one after the other.
 class PERU_API CStringPartEnum : public CObject, public IEnum {
 public:
     bool hasMore() const override { return m_next != nullptr; }
-    int32_t getCount() const override; // walks the whole text
+    int32_t getCount() const override; // scans the whole text
     PC<IBase> getNextConst() override { return getNext(); }
     P<IBase> getNext() override;
     void reset() override;
 
 protected:
     explicit CStringPartEnum(const P<IString>& text);
-    // The part at `pos`, which moves behind it; empty at the end. Constructors of derived classes call
-    // reset() when they are ready to answer.
+    // Returns the part at `pos` and moves `pos` past it; empty at the end. Constructors of derived classes
+    // must call reset() once this operation works.
     virtual P<IString> findPart(SStringPos& pos) const = 0;
 
     const P<IString> m_text;
@@ -41,8 +41,8 @@ private:
     bool m_skipEmptyTokens;
 };
 
-// The lines, without their ends: \n, \r\n or \r. An empty text has none, and an end behind the last line does
-// not begin another one.
+// The lines without their line ends: \n, \r\n or \r. An empty text has none, and a line end after the last
+// line does not start another one.
 class PERU_API CStringLineTokenizerEnum : public CStringPartEnum {
 public:
     explicit CStringLineTokenizerEnum(const P<IString>& text);

@@ -13,20 +13,20 @@ class CStringWindow {
 public:
     enum EDirection { forward, backward };
 
-    // Forward from `pos` up to `size`, or backward from `pos` (the position behind the first character) down
-    // to 0. `count` limits the characters, -1 for unlimited.
+    // Forward from `pos` up to `size`, or backward from `pos` (the position after the first character to
+    // read) down to 0. `count` limits the characters, -1 for unlimited.
     CStringWindow(const ICharEncoding& encoding, const uint8_t* data, int32_t size, int32_t pos,
                   EDirection direction = forward, int32_t count = -1)
         : m_encoding(encoding), m_data(data), m_size(size), m_pos(pos), m_left(count),
           m_direction(direction) {}
 
-    // False at the end; `ch` is then left alone.
+    // Returns false at the end and then leaves `ch` unchanged.
     bool next(char32_t& ch) {
         if (m_used == m_filled && !fill()) return false;
         ch = m_chars[m_used++];
         return true;
     }
-    // Byte offset of the character that next() gave last.
+    // Byte offset of the character that next() returned last.
     int32_t getOffset() const { return m_offsets[m_used - 1]; }
 
 private:
@@ -48,7 +48,7 @@ private:
     const ICharEncoding& m_encoding;
     const uint8_t* m_data;
     int32_t m_size;
-    int32_t m_pos; // -1: nothing is left
+    int32_t m_pos; // -1 at the end
     int32_t m_left;
     EDirection m_direction;
     int32_t m_filled = 0;

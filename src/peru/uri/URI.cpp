@@ -10,7 +10,7 @@
 
 namespace peru {
 
-// Every part is escaped and pure ASCII. The path is kept joined; its segments are derived where needed.
+// Every part is escaped and pure ASCII. The path is kept joined; its segments are derived when needed.
 struct CURI::SParts {
     std::string scheme;
     std::string opaque; // the scheme-specific part of a URI that is not hierarchical
@@ -21,12 +21,12 @@ struct CURI::SParts {
     std::string path;
     std::string query;
     std::string fragment;
-    bool authority = false; // written, even if empty as in "file:///"
+    bool authority = false; // present, even if empty as in "file:///"
     bool hasQuery = false;
     bool hasFragment = false;
     bool relative = true;
     bool hierarchical = true;
-    P<IString> text; // composed once: URIs are compared and shown more often than they are taken apart
+    P<IString> text; // composed once: URIs are compared and shown more often than split
 
     std::string composeAuthority() const;
     std::string composeAfterScheme() const;
@@ -37,7 +37,8 @@ using namespace uri;
 
 namespace {
 
-// Those of the sub-delimiters; ":" stays in bracketed hosts only, where it is part of the address.
+// The sub-delimiters that stay unescaped in a host; ":" only in a bracketed one, where it is part of the
+// address.
 constexpr const char* kHostSet = ";,&=+$";
 constexpr const char* kAddressSet = ";,&=+$:";
 
@@ -45,7 +46,7 @@ P<IString> toString(std::string_view text) {
     return text.empty() ? CString::empty() : CString::fromUTF8(text);
 }
 
-// Answers false for a text that is no decimal number of 31 bits.
+// Returns false if the text is neither empty, which gives -1, nor a decimal number of 31 bits.
 bool parsePort(std::string_view text, int32_t& port) {
     int64_t value = 0;
     for (char c : text) {
@@ -77,9 +78,9 @@ std::string CURI::SParts::composeAfterScheme() const {
     if (authority)
         out = "//" + composeAuthority();
     else if (path.starts_with("//"))
-        out = "/."; // else the first name would read as an authority
+        out = "/."; // otherwise the first segment would be parsed as an authority
     else if (relative && path.substr(0, path.find('/')).find(':') != std::string::npos)
-        out = "./"; // else the text before the ":" would read as a scheme
+        out = "./"; // otherwise the text before the ":" would be parsed as a scheme
     out += path;
     if (hasQuery) out += "?" + query;
     if (hasFragment) out += "#" + fragment;
@@ -189,9 +190,9 @@ CURI::CURI(const CStringArg& scheme, const CStringArg& host, const CStringArg& p
         throw CURIFormatError(CStringArg(parts.text));
     }
     if (!parts.relative && !parts.authority && parts.path.starts_with('/') && parts.scheme == "file")
-        parts.authority = true; // the usual writing, so that both ways to name a file compare equal
+        parts.authority = true; // the usual form, so that both ways to name a file compare equal
     if (!parts.relative && !parts.authority && !parts.path.starts_with('/')) {
-        // The text would be read back as an opaque one, and so it is.
+        // The text would be parsed as an opaque URI, so it is one.
         parts.opaque = parts.composeAfterScheme();
         parts.hierarchical = false;
         parts.path.clear();

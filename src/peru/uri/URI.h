@@ -12,15 +12,15 @@ namespace peru {
 
 class PERU_API CURI : public CObject, public IURI {
 public:
-    // Characters that stay unescaped in each component, beside letters, digits and "-_.!~*'()".
+    // Characters that stay unescaped in each component, besides letters, digits and "-_.!~*'()".
     static constexpr const char* kPathSet = ";:,/@&=+$";
-    static constexpr const char* kQuerySet = ";:,/?@&=+$"; // also the fragment's
+    static constexpr const char* kQuerySet = ";:,/?@&=+$"; // also for the fragment
     static constexpr const char* kUserInfoSet = ";:,&=+$";
 
-    // Parses a complete URI. %XX sequences that are there stay as they are. Throws CURIFormatError.
+    // Parses a complete URI. Existing %XX sequences are kept. Throws CURIFormatError.
     explicit CURI(const CStringArg& text);
-    // Builds from unescaped parts: a "%" in them becomes "%25". The port text must be empty or a decimal
-    // number, else CURIFormatError. A path without a leading "/" gets one where a host is given.
+    // Composes a URI from unescaped parts: a "%" in them becomes "%25". Throws CURIFormatError if the port
+    // text is neither empty nor a decimal number. A path without a leading "/" gets one if a host is given.
     CURI(const CStringArg& scheme, const CStringArg& host, const CStringArg& port, const CStringArg& userInfo,
          const CStringArg& path, const CStringArg& query, const CStringArg& fragment);
     CURI(const CURI& other);
@@ -28,8 +28,8 @@ public:
 
     // "file:///" and the path with backslashes turned into slashes: the text form of a Windows path.
     static P<IString> getFileURI(const CStringArg& platformPath);
-    // What the set does not hold becomes %XX of its UTF-8 bytes; bytes of a UTF-8 string are taken as they
-    // are, so that names that are no valid UTF-8 survive.
+    // Replaces characters outside the set by %XX for each of their UTF-8 bytes. The bytes of a UTF-8 string
+    // are used unchanged, so that names which are not valid UTF-8 survive.
     static P<IString> escape(const CStringArg& text, const char* keptCharacters);
     static P<IString> unescape(const CStringArg& text);
 

@@ -1,4 +1,4 @@
-// Escaped text of URIs: %XX for what a part must not hold as it is.
+// Escaping in URIs: %XX for bytes that a part must not contain literally.
 #pragma once
 
 #include <string>
@@ -6,13 +6,13 @@
 
 namespace peru::uri {
 
-enum class EPercent { escape, keepEscapes }; // what becomes of a "%XX" that is there already
+enum class EPercent { escape, keepEscapes }; // how an existing "%XX" is treated
 
-// Pure ASCII. Letters, digits and the marks -_.!~*'() stay, and so do `keptCharacters`.
+// Returns ASCII. Letters, digits, the marks -_.!~*'() and `keptCharacters` stay unescaped.
 std::string escapeBytes(std::string_view bytes, std::string_view keptCharacters, EPercent percent);
-// For what is taken as it was written: only bytes that no text line should hold are escaped.
+// For parts that are otherwise kept as written: escapes only the bytes outside printable ASCII.
 std::string escapeUnprintable(std::string_view bytes);
-// A "%" that starts no escape stays.
+// A "%" that does not start an escape is kept.
 std::string unescapeBytes(std::string_view text);
 
 } // namespace peru::uri

@@ -45,7 +45,7 @@ std::string joinPath(const SPath& path) {
     if (path.absolute)
         text = '/';
     else if (!path.segments.empty() && path.segments[0].empty())
-        text = "./"; // else the empty first name would turn it into an absolute path
+        text = "./"; // otherwise the empty first segment would make the path absolute
     for (size_t i = 0; i < path.segments.size(); ++i) {
         text += path.segments[i];
         if (i + 1 < path.segments.size() || path.directory) text += '/';

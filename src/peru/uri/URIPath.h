@@ -1,4 +1,4 @@
-// Paths of URIs, taken apart. They are escaped: a segment holds no "/".
+// URI paths split into segments. They are escaped: a segment contains no "/".
 #pragma once
 
 #include <string>
@@ -7,13 +7,13 @@
 
 namespace peru::uri {
 
-// The names on the way, and whether the last one is a directory's.
+// The segments of a path, and whether it names a directory.
 struct SPath {
     std::vector<std::string> segments;
     bool absolute = false;
     bool directory = false;
 
-    // The segments of the directory that the path lies in, or that it names.
+    // Number of segments of the directory that the path names or lies in.
     size_t getDirectoryDepth() const {
         return directory || segments.empty() ? segments.size() : segments.size() - 1;
     }
@@ -21,7 +21,7 @@ struct SPath {
 
 SPath splitPath(std::string_view text);
 std::string joinPath(const SPath& path);
-// Removes "." and ".."; above the root of an absolute path ".." is dropped, in a relative one it stays.
+// Removes "." and "..". Above the root of an absolute path ".." is dropped, in a relative path it is kept.
 void normalize(SPath& path);
 std::string normalizePath(std::string_view text);
 

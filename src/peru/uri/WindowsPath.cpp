@@ -17,7 +17,8 @@ bool hasDrive(std::string_view path) {
     return path.size() >= 2 && path[1] == ':';
 }
 
-// In UTF-16, by the bytes: the platform counts also what the strict decoder of strings would pass over.
+// Counts UTF-16 units from the bytes: the platform also counts characters that the strict decoder of strings
+// would skip.
 size_t countUnits(std::string_view utf8) {
     size_t units = 0;
     for (char ch : utf8) {

@@ -5,8 +5,8 @@
 
 namespace peru {
 
-// Names its attribute by the element and its name: when either is removed the value can no longer be read or
-// set, which throws CInvalidObjectStateError.
+// Refers to its attribute by element and name. Once either is removed, reading or setting the value throws
+// CInvalidObjectStateError.
 class PERU_API IXmlProperty : public virtual IBase {
 public:
     virtual P<IString> getName() const = 0;

@@ -64,7 +64,7 @@ bool declaresLatin1(std::string_view text) {
     return declaration.find("iso-8859-1") != std::string::npos;
 }
 
-// In UTF-8 and without a mark.
+// Converts the bytes to UTF-8 without a mark.
 std::string decode(std::string bytes, const P<IURI>& uri) {
     const bool little = startsWith(bytes, "\xFF\xFE");
     if (little || startsWith(bytes, "\xFE\xFF")) {
@@ -89,7 +89,7 @@ CXmlDocument::CXmlDocument(const CStringArg& version, const CStringArg& encoding
         throw CInvalidArgError(newString("encoding '") + m_encoding + "'", "CXmlDocument::CXmlDocument");
 }
 
-// Node objects hold their document: none is left.
+// Node objects keep their document alive, so none exists any more.
 CXmlDocument::~CXmlDocument() = default;
 
 void CXmlDocument::parse(const P<IInStream>& stream) {
@@ -107,7 +107,7 @@ void CXmlDocument::parseString(const P<IString>& text) {
 }
 
 void CXmlDocument::parseBytes(std::string_view text, const P<IURI>& uri) {
-    // Lines are counted in 32 bits.
+    // Line numbers have 32 bits.
     if (text.size() > INT_MAX) fail(xml::EFault::limit, uri, 1);
     const xml::SFault fault = xml::check(text);
     if (fault.kind != xml::EFault::none) fail(fault.kind, uri, xml::getLine(text, fault.offset));

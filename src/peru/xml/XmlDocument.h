@@ -1,4 +1,4 @@
-// The document of the XML parser, behind counted nodes.
+// The XML parser's document behind reference-counted nodes.
 #pragma once
 
 #include "peru/Object.h"
@@ -18,8 +18,8 @@ class PERU_API CXmlDocument : public CObject, public IXmlDocument {
 public:
     class CXmlPrinter;
 
-    // An empty document. The version is "1.0" or "1.1", the encoding "UTF-8" or "UTF-16" in any case of
-    // letters; CInvalidArgError otherwise. They tell how the document is printed, not what it can parse.
+    // Creates an empty document. The version must be "1.0" or "1.1", the encoding "UTF-8" or "UTF-16" in any
+    // letter case; otherwise throws CInvalidArgError. Both only affect printing, not parsing.
     explicit CXmlDocument(const CStringArg& version = "1.0", const CStringArg& encoding = "UTF-8");
     ~CXmlDocument() override;
 
@@ -37,29 +37,30 @@ public:
     P<IXmlNode> getChildNode(const CStringArg& name) const override;
     WEnum<IXmlNode> getChildNodes() const override;
     WEnum<IXmlNode> getChildNodesByName(const CStringArg& name) const override;
-    P<IXmlNode> addChildNode(const CStringArg& name) override; // throws CInvalidArgError beside a root
+    P<IXmlNode> addChildNode(const CStringArg& name) override; // throws CInvalidArgError if there is a root
     void removeChildNode(const P<IXmlNode>& child) override;
     P<IXmlProperty> getProperty(const CStringArg& name) const override;
     WEnum<IXmlProperty> getProperties() const override;
-    void setProperty(const CStringArg& name, const CStringArg& value) override; // as setText
+    void setProperty(const CStringArg& name, const CStringArg& value) override; // throws like setText
     void removeProperty(const CStringArg& name) override;
     P<IXmlDocument> getDocument() const override;
 
 private:
     friend class CXmlNode;
 
-    // Zero-terminated UTF-8.
+    // `text` must be zero-terminated UTF-8.
     void parseBytes(std::string_view text, const P<IURI>& uri);
     std::string printBytes() const;
     bool isWide() const;
     P<CXmlDocument> share() const;
-    // Tells the node objects of everything below that their elements are about to go.
+    // Detaches the node objects of `parent` and of everything below it, since their elements are about to be
+    // destroyed.
     void dropNodes(TiXmlNode& parent);
 
     P<IString> m_version;
     P<IString> m_encoding;
     std::unique_ptr<TiXmlDocument> m_tree;
-    int64_t m_nodeCount = 0; // node objects that are alive
+    int64_t m_nodeCount = 0; // number of live node objects
 };
 
 } // namespace peru

@@ -12,10 +12,11 @@ class TiXmlElement;
 
 namespace peru {
 
-// There is one for an element at a time: the element knows it, so that it learns of the element's end.
+// An element has at most one node object at a time and points to it, so that the object can be detached when
+// the element is destroyed.
 class PERU_API CXmlNode : public CObject, public IXmlNode {
 public:
-    // The node object of an element of the document; empty for a null pointer.
+    // Returns the node object of an element of the document; empty for a null pointer.
     static P<CXmlNode> get(const P<CXmlDocument>& document, TiXmlElement* element);
     ~CXmlNode() override;
 
@@ -33,7 +34,7 @@ public:
     void removeProperty(const CStringArg& name) override;
     P<IXmlDocument> getDocument() const override;
 
-    // Throws CInvalidObjectStateError when the element is gone.
+    // Throws CInvalidObjectStateError if the element has been destroyed.
     TiXmlElement& getElement() const;
     const P<CXmlDocument>& getOwner() const { return m_document; }
     void drop() { m_element = nullptr; }
@@ -42,18 +43,18 @@ private:
     CXmlNode(const P<CXmlDocument>& document, TiXmlElement& element);
 
     P<CXmlDocument> m_document;
-    TiXmlElement* m_element; // null once it is gone
+    TiXmlElement* m_element; // null once it is destroyed
 };
 
-// Over sibling elements, all or those of a name.
+// Enumerates sibling elements, all of them or those with a given name.
 class PERU_API CXmlNodeEnum : public CObject, public IEnum {
 public:
-    // `first` is the first one to give; empty for none.
+    // `first` is the first element to return; empty for none.
     CXmlNodeEnum(const P<CXmlNode>& first, std::optional<std::string> name);
     ~CXmlNodeEnum() override;
 
     bool hasMore() const override { return static_cast<bool>(m_next); }
-    int32_t getCount() const override; // walks over them
+    int32_t getCount() const override; // counts by walking over them
     PC<IBase> getNextConst() override { return getNext(); }
     P<IBase> getNext() override;
     void reset() override { m_next = m_first; }

@@ -79,7 +79,7 @@ bool CXmlDocument::CXmlPrinter::Visit(const TiXmlDeclaration&) {
 
 bool CXmlDocument::CXmlPrinter::Visit(const TiXmlText& text) {
     const std::string& value = text.ValueStr();
-    // The parser drops text of white space only, unless it stands in such a section.
+    // The parser drops text that is only white space unless it is in a CDATA section.
     const bool blank = std::all_of(value.begin(), value.end(), xml::isBlank);
     if (text.CDATA() || blank)
         m_text.append("<![CDATA[").append(value).append("]]>");
@@ -123,7 +123,7 @@ void CXmlDocument::CXmlPrinter::write(std::string_view text, bool keepBlanks) {
             m_text += "&apos;";
             break;
         case '\xEF':
-            // The parser takes the byte order mark for white space.
+            // The parser treats the byte order mark as white space.
             if (text.substr(i, 3) == "\xEF\xBB\xBF") {
                 m_text += "&#xFEFF;";
                 i += 2;

@@ -24,7 +24,7 @@ private:
     std::string m_name;
 };
 
-// Over the attributes that the element had when it was made.
+// Enumerates the attributes that the element had when the enumerator was created.
 class PERU_API CXmlPropertyEnum : public CObject, public IEnum {
 public:
     explicit CXmlPropertyEnum(const P<CXmlNode>& node);

@@ -63,7 +63,7 @@ private:
         m_at = end;
     }
 
-    // Passes over what begins with `size` characters and ends with the first `end` behind them.
+    // Skips a construct that starts with `size` characters and ends with the first `end` after them.
     void skipUntil(size_t size, std::string_view end) {
         const size_t found = m_text.find(end, m_at + size);
         if (found == std::string_view::npos) return fail(m_at);
@@ -79,7 +79,7 @@ private:
         scanStartTag();
     }
 
-    // The parser takes it to the first ">", wherever that stands.
+    // The parser ends it at the first ">", wherever that is.
     void scanDocumentType() {
         const size_t start = m_at;
         const size_t end = m_text.find('>', m_at);
@@ -150,7 +150,7 @@ private:
         }
     }
 
-    // Bytes of the reference that the text starts with; 0 when there is none.
+    // Size in bytes of the reference at the start of the text; 0 if there is none.
     static size_t measureReference(std::string_view text) {
         if (text.substr(1, 1) == "#") return measureNumber(text);
         for (std::string_view known : {"&amp;", "&lt;", "&gt;", "&quot;", "&apos;"})
@@ -158,7 +158,7 @@ private:
         return 0;
     }
 
-    // The same for a number, which must be that of a character of XML.
+    // The same for a numeric reference, which must denote an XML character.
     static size_t measureNumber(std::string_view text) {
         const bool hexadecimal = text.substr(2, 1) == "x";
         const char* digits = text.data() + (hexadecimal ? 3 : 2);

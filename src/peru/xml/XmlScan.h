@@ -13,11 +13,10 @@ struct SFault {
     size_t offset = 0;
 };
 
-// Finds, in one pass without recursion, what the parser would mistake, drop in silence or spend unbounded
-// stack or time on: text that is no UTF-8, tags that do not close, more levels or attributes than
-// IXmlDocument allows, text and elements beside the root, document types with a body, bad numeric references.
-// A lone "&" passes: the parser takes it as it stands. Names of end tags and double attributes are left to
-// the parser.
+// Finds, in one pass without recursion, what the parser would misread, drop silently or spend unbounded stack
+// or time on: invalid UTF-8, unclosed tags, more levels or attributes than IXmlDocument allows, text and
+// elements next to the root, document types with a body, and invalid references, including a lone "&". The
+// names of end tags and duplicate attributes are left to the parser.
 SFault check(std::string_view text);
 
 // Counted from 1; a carriage return, with or without a line feed, ends a line.

@@ -1,28 +1,30 @@
-// Text on its way into XML and out of it.
+// Conversion of text to and from XML.
 #pragma once
 
 #include "peru/strings/String.h"
 
 namespace peru {
 
-// Bytes of the well-formed UTF-8 sequence at the start of the text that XML may hold; 0 where there is none.
-// Strict where the UTF-8 of strings is not, and complete: it takes every code point that XML has.
+// Size in bytes of the UTF-8 character at the start of the text; 0 if it is malformed or not allowed in XML.
+// Unlike the decoder of UTF-8 strings this follows the standard: it rejects all over-long forms and accepts
+// every code point of XML.
 PERU_API size_t measureXmlCharacter(std::string_view text);
 
 namespace xml {
 
 bool isNameStart(char byte);
 bool isNamePart(char byte);
-bool isBlank(char byte); // white space of XML
+bool isBlank(char byte); // XML white space
 
-// Of well-formed UTF-8. Where the UTF-8 of strings would refuse characters the string is in UTF-16.
+// Creates a string from well-formed UTF-8; in UTF-16 if it has characters that UTF-8 strings reject.
 P<IString> toString(std::string_view utf8);
-// The UTF-8 form. Throws CInvalidArgError for text that XML cannot hold, or that is no name; `method` goes
-// into the message.
+// Both return UTF-8 and throw CInvalidArgError for text that XML cannot hold, fromName also for an invalid
+// name. `method` appears in the message.
 std::string fromText(const CStringArg& text, const char* method);
 std::string fromName(const CStringArg& name, const char* method);
 
-// UTF-16 bytes as UTF-8; false for lone surrogates and half units, with what came before them in `out`.
+// Converts UTF-16 bytes to UTF-8. Returns false at an unpaired surrogate or half a unit; `out` then has the
+// text before it.
 bool decodeUTF16(std::string_view bytes, bool bigEndian, std::string& out);
 std::string decodeLatin1(std::string_view bytes);
 std::string encodeUTF16(std::string_view utf8); // little-endian, without a mark

@@ -17,7 +17,7 @@ P<CArray> makeArray(const std::string& letters) {
     return array;
 }
 
-// All that is left, as one text.
+// The remaining elements as one text.
 std::string drain(const P<IEnum>& elements) {
     std::string all;
     for (WEnum<IString> typed(elements); typed.hasMore();) all += CString::toStdString(typed.getNext());

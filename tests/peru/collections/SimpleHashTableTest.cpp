@@ -9,7 +9,7 @@
 
 namespace peru {
 
-// Judged by the standard map over many edits, with keys in mixed encodings.
+// Compared with std::map over many edits, with keys in mixed encodings.
 TEST(SimpleHashTable, AgreesWithAMap) {
     std::mt19937 random(20);
     for (size_t size : {1u, 17u}) {

@@ -18,7 +18,7 @@ using namespace peru::literals;
 
 namespace {
 
-// Collects bytes and counts flushes; fails when told to.
+// Collects bytes and counts flushes; fails on request.
 class CTextStream : public CObject, public IOutStream {
 public:
     void close() override {}
@@ -35,7 +35,7 @@ public:
     bool fails = false;
 };
 
-// Keeps what comes, as "level source text|extra@time".
+// Records messages as "level source text|extra@time".
 class CMemoryLog : public CLogBase {
 public:
     explicit CMemoryLog(std::vector<std::string>& journal, std::string name = "")
@@ -73,7 +73,7 @@ protected:
         log->write(message);
         return stream->bytes;
     }
-    // Whatever now is, it has eight characters.
+    // Replaces the time, which has eight characters, at the start of each line.
     static std::string withoutTimes(std::string text) {
         for (size_t start = 0; start < text.size(); start = text.find('\n', start) + 1)
             text.replace(start, 8, "T");
@@ -103,7 +103,7 @@ TEST_F(TextFileLog, Line_HasItsExactForm) {
         {{kLogInfo, nullptr, "a"_s, {}, -1001}, "23:59:58 info - a\n"},
         {{kLogInfo, nullptr, P<IString>(make<CUTF16String>(u"\u00e4\u20ac")), {}, kTime},
          "01:46:40 info - \xc3\xa4\xe2\x82\xac\n"},
-        // Indented by characters and not by bytes.
+        // Indented by characters, not bytes.
         {{kLogInfo, CString::fromUTF8("\xc3\xa4"), "a\nb"_s, {}, kTime},
          "01:46:40 [\xc3\xa4] info - a\n                    b\n"},
     };
@@ -170,7 +170,7 @@ TEST_F(TextFileLog, FailingStream_EndsTheCallAndLeavesTheLogUsable) {
     EXPECT_THROW(log->info(nullptr, "x"), CStreamError);
     EXPECT_THROW(log->enterArea("a"_s), CStreamError);
     stream->fails = false;
-    std::thread([&] { log->info(nullptr, "y"); }).join(); // hangs if the mutex was kept
+    std::thread([&] { log->info(nullptr, "y"); }).join(); // hangs if the mutex is still held
     EXPECT_EQ(withoutTimes(stream->bytes), "T info - y\n");
     {
         CLogArea area(log, "a"_s);
@@ -261,7 +261,7 @@ TEST_F(LogManager, AreaThatSinksHeardOf_IsLeftAlsoAfterTheLevelRose) {
 TEST_F(LogManager, AnotherManager_ServesAsSinkAndLeavesByIdentity) {
     auto host = make<CLogManager>();
     host->addLog(make<CMemoryLog>(journal), nullptr);
-    // As a host hands it over: known as a manager, removed by another handle of the same object.
+    // As a host passes it: added as a manager, removed through another handle to the same object.
     P<ILogManager> added = host;
     manager->addLog(P<ILog>(added), ""_s);
     manager->logException("s"_s, CError("text", "title"));

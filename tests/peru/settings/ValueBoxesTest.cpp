@@ -14,7 +14,7 @@ using tests::text;
 
 namespace {
 
-// What a box reads from a text and writes again, or the error.
+// The text parsed by a box and formatted again, or the error.
 template <class Box> std::string pass(const char* value) {
     try {
         return text(Box::parse(value)->toString());

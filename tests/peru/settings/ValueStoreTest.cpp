@@ -101,14 +101,14 @@ TEST(ValueStore, remove_LeavesTheRest) {
 
 TEST(ValueStore, files_AreReplacedAndNeverSpoiled) {
     const CTempFolder folder;
-    // What cannot be read is not written over.
+    // A file that cannot be read is not overwritten.
     const auto bad = folder.write("bad.xml", "<settings><a>1</a>");
     EXPECT_THROW(CXmlValueStore::open(tests::toURI(bad), EStoreAccess::readWrite), CParseError);
     EXPECT_EQ(tests::readFile(bad), "<settings><a>1</a>");
     EXPECT_FALSE(CXmlValueStore::open(tests::toURI(folder.write("empty.xml", "")), EStoreAccess::read)
                      ->hasValue("", "a"));
 
-    // Foreign content stays; the store saves by itself.
+    // Foreign content is kept; the store saves automatically.
     const auto file = folder.write("real.xml", "<!-- mine --><top other='1'><a>1</a></top>");
     const P<IURI> uri = tests::toURI(file);
     const auto store = CXmlValueStore::open(uri, EStoreAccess::readWrite, EMode::elements, true);
@@ -151,7 +151,7 @@ TEST(ValueStore, registry_KeysShareOneFile) {
 
     const auto whole = openRegistry("registry:HKEY_CURRENT_USER", EStoreAccess::read);
     const auto other = openRegistry("registry:HKEY_LOCAL_MACHINE/Software/One");
-    // Stores in several threads lose nothing of each other.
+    // Stores in several threads do not lose each other's changes.
     std::vector<std::thread> threads;
     for (const char* key :
          {"registry:HKEY_CURRENT_USER/Software/One", "registry:HKEY_CURRENT_USER/Software/Two%20b"})

@@ -17,7 +17,7 @@ using peru::IString;
 using peru::P;
 using peru::SStringPos;
 
-// The code page is UTF-8 for a test, and what it was before afterwards.
+// Makes the code page UTF-8 for a test and restores it afterwards.
 class CUnicodeCodePage {
 public:
     CUnicodeCodePage() : m_previous(std::setlocale(LC_CTYPE, nullptr)) {
@@ -40,7 +40,7 @@ inline bool canEncode(const P<ICharEncoding>& encoding, const std::u32string& te
     return true;
 }
 
-// Bytes that the encoding's decoder steps over, wherever they stand between characters.
+// Bytes that the encoding's decoder skips anywhere between characters.
 inline std::string getNoise(const P<ICharEncoding>& encoding, std::mt19937& random) {
     switch (encoding->getId()) {
     case ICharEncoding::kUTF8: {

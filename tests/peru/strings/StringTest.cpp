@@ -223,7 +223,6 @@ TEST(String, UnencodableCharacter_TurnsTheResultIntoUTF8) {
     EXPECT_TRUE(newString("\xFF")->toUpper()->equals(u"\u0178")) << "its capital is not in Latin-1";
 }
 
-// Bytes that this decoder rejects are carried through edits in the same encoding, never made into characters.
 // UTF-16 does not hold a lone surrogate that comes in from UTF-8, and UTF-8 does not read again all that
 // UTF-16 holds.
 TEST(String, TextThatNoEncodingHolds_GetsSubstitutes) {
@@ -234,6 +233,7 @@ TEST(String, TextThatNoEncodingHolds_GetsSubstitutes) {
     EXPECT_EQ(decode(text + surrogate), U"\u0905-\u0906abcdefghijklm?");
 }
 
+// Bytes that the decoder rejects are kept by edits in the same encoding and never become characters.
 TEST(String, MalformedBytes_StayInvisible) {
     P<IString> smile = CString::fromUTF8("a\xF0\x9F\x98\x80");
     EXPECT_EQ(smile->getLength(), 1);

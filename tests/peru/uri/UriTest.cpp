@@ -54,7 +54,7 @@ TEST(URI, OpaqueOnesKeepTheirRest) {
     }
 }
 
-// What a text is written as once it has been parsed; parsing that again changes nothing.
+// The composed form of each parsed text; parsing it again changes nothing.
 TEST(URI, ComposesWhatItParsed) {
     struct SCase {
         const char *text, *composed;
@@ -125,7 +125,7 @@ TEST(URI, EveryByteOfANameSurvives) {
     std::string name;
     for (int c = 1; c < 256; ++c)
         if (c != '/') name += static_cast<char>(c);
-    name += "\xF0\x9F\x8E\xB5\xE0\xA4\xB9"; // beyond what strings decode
+    name += "\xF0\x9F\x8E\xB5\xE0\xA4\xB9"; // characters that strings do not decode
     const P<IURI> u = uri("file:///folder/")->appendPath(CString::fromUTF8(name));
     EXPECT_EQ(str(u->getUnescapedPath()), "/folder/" + name);
     for (char c : str(u)) EXPECT_TRUE(c > 0x20 && c < 0x7F);

@@ -53,7 +53,7 @@ P<IString> CRegistryValueStore::getPath(const CStringArg& section) const {
 }
 
 CXmlValueStore& CRegistryValueStore::getStore() {
-    // Taken before the file is read: what replaces it meanwhile is read the next time.
+    // Taken before the file is read, so that the next call notices a replacement in between.
     const std::array<int64_t, 5> identity = getIdentity(m_file);
     if (!m_store || identity != m_identity) {
         m_store = CXmlValueStore::open(m_file, m_access);
@@ -70,7 +70,7 @@ template <class F> void CRegistryValueStore::change(F&& operation) {
         store.flush();
         m_identity = getIdentity(m_file);
     } catch (...) {
-        // A change that is not in the file does not stay in memory either.
+        // A change that did not reach the file must not stay in memory either.
         m_store.reset();
         throw;
     }

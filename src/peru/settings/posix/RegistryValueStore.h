@@ -18,10 +18,9 @@ struct SRegistryKey {
     static SRegistryKey parse(const P<IURI>& uri);
 };
 
-// The files lie in $XDG_CONFIG_HOME/tonewright/registry. All stores below a base key share its file, in this
-// process and in others: a change is in the file when its call returns, made to what the others left there
-// (a system-wide mutex is held meanwhile), and every reading sees the changes of all. flush has nothing to
-// do.
+// The files are in $XDG_CONFIG_HOME/tonewright/registry. All stores below a base key share its file, across
+// processes too. A change is applied to the file's current content and saved before the call returns, under a
+// system-wide mutex; every read sees all saved changes. flush does nothing.
 class PERU_API CRegistryValueStore : public CObject, public IValueStore {
 public:
     CRegistryValueStore(const SRegistryKey& key, EStoreAccess access);
@@ -48,20 +47,20 @@ public:
 
 private:
     P<IString> getPath(const CStringArg& section) const;
-    // The content of the file as it is now.
+    // The store over the file's current content.
     CXmlValueStore& getStore();
     template <class F> void change(F&& operation);
 
     std::string m_path; // of the sub-key, with "/"
     EStoreAccess m_access;
     P<IURI> m_file;
-    P<IMutex> m_mutex; // held from reading to writing by whoever changes the file
+    P<IMutex> m_mutex; // held from the read to the write of a change
     P<CXmlValueStore> m_store;
-    // Device, inode, size and time of the file that the store was read from; all zero for none.
+    // Device, inode, size and time of the file that the store was read from; all zero if there was none.
     std::array<int64_t, 5> m_identity{};
 };
 
-// Every other scheme is left to others.
+// Returns an empty handle for every other scheme.
 class PERU_API CRegistryValueStoreFactory : public CObject, public IValueStoreFactory {
 public:
     CRegistryValueStoreFactory();
