@@ -1,5 +1,5 @@
-// CancelAutoplay2 PID dummy: keeps the desktop's session from mounting media for as long as the process PID
-// lives. Without a session, or with one that does not answer, it does nothing but wait.
+// Usage: CancelAutoplay2 PID dummy. Keeps the desktop session from mounting media automatically while the
+// process PID is running. Without a session, or if it does not respond, it only waits for that process.
 #include <cerrno>
 #include <csignal>
 #include <cstdlib>
@@ -14,8 +14,7 @@ namespace {
 constexpr guint32 kInhibitAutoMount = 16;
 constexpr int kAnswerTimeout = 5000; // milliseconds
 
-// The address of the session bus, or an empty text. Asking GIO for the bus would start one where there is
-// none.
+// The address of the session bus, or null if there is none. Asking GIO for the bus would start one.
 gchar* findSessionBus() {
     if (const char* address = g_getenv("DBUS_SESSION_BUS_ADDRESS"); address && *address)
         return g_strdup(address);
@@ -26,7 +25,7 @@ gchar* findSessionBus() {
     return address;
 }
 
-// The inhibition lasts as long as the connection, that is, as this process.
+// The inhibition lasts as long as the connection, that is, until this process ends.
 void onConnected(GObject*, GAsyncResult* result, gpointer) {
     GDBusConnection* bus = g_dbus_connection_new_for_address_finish(result, nullptr);
     if (!bus) return;

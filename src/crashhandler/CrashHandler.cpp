@@ -29,7 +29,7 @@ constexpr const char* kSignalNames[] = {"SIGSEGV", "SIGBUS", "SIGILL", "SIGFPE",
 constexpr size_t kSignalCount = std::size(kSignals);
 constexpr size_t kMaxThreads = 256;
 
-// All of it is filled at installation, so that the handler only reads.
+// Filled at installation, so that the handler only reads it.
 struct SInstalled {
     char application[256] = {};
     char report[4096] = {};
@@ -52,7 +52,7 @@ void copyText(char* target, size_t size, const char* text, const char* suffix = 
     std::strcat(target, suffix);
 }
 
-// Notes what was thrown; the abort that follows writes the files.
+// Records the exception; the abort that follows writes the files.
 void onTerminate() {
     if (const std::type_info* type = abi::__cxa_current_exception_type()) {
         const char* text = "";
@@ -109,7 +109,7 @@ void onSignal(int number, siginfo_t* signal, void* context) {
     size_t index = 0;
     while (index + 1 < kSignalCount && kSignals[index] != number) ++index;
 
-    // A second thread that crashes meanwhile waits for the end; a crash in here goes on to the old handler.
+    // A second crash, in another thread or in here, goes straight to the old handler.
     if (!g_crashed.test_and_set()) {
         const size_t threads = captureThreads(*static_cast<ucontext_t*>(context), g_threads, kMaxThreads);
         {
@@ -125,10 +125,10 @@ void onSignal(int number, siginfo_t* signal, void* context) {
     else if (previous.sa_handler != SIG_DFL && previous.sa_handler != SIG_IGN)
         previous.sa_handler(number);
     else
-        ::raise(number); // delivered with the default action when this handler returns
+        ::raise(number); // delivered with the default action once this handler returns
 }
 
-// Where the arguments and the environment of the process begin, on the main thread's stack.
+// The address on the main thread's stack at which the arguments and the environment begin.
 uintptr_t findStackStart() {
     std::ifstream file("/proc/self/stat");
     std::string text((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>());
@@ -168,8 +168,8 @@ void install(const SNames& names) {
 
     g_installed.stackLimit = findStackStart();
     void* frame = nullptr;
-    ::backtrace(&frame, 1); // loads what it needs now, not in the handler
-    useAlternateStack();    // for the calling thread, so that its stack overflow is caught as well
+    ::backtrace(&frame, 1); // loads its library now rather than in the handler
+    useAlternateStack();    // lets the handler run after a stack overflow of the calling thread
     g_installed.previousTerminate = std::set_terminate(onTerminate);
     struct sigaction action = {};
     action.sa_sigaction = onSignal;

@@ -156,7 +156,7 @@ SMapping parseMapping(const char* line) {
     return mapping;
 }
 
-// Calls back for every mapping of the process, without allocation.
+// Calls `callback` for every mapping of the process, without allocating.
 template <class Callback> void forEachMapping(Callback callback) {
     const int file = ::open("/proc/self/maps", O_RDONLY | O_CLOEXEC);
     if (file < 0) return;
@@ -258,7 +258,7 @@ SContext convertContext(const ucontext_t& from) {
 SMemory writeStack(CSafeWriter& out, uintptr_t stackPointer, uintptr_t stackLimit) {
     constexpr uintptr_t kRedZone = 128;
     SMapping stack;
-    // After an overflow the pointer stands in the guard below the stack.
+    // After an overflow the stack pointer is in the guard area below the stack.
     constexpr uintptr_t kGuard = 1024 * 1024;
     forEachMapping([&](const SMapping& mapping) {
         if (stack.end == 0 && mapping.start < stackPointer + kGuard && stackPointer < mapping.end)
@@ -273,7 +273,7 @@ SMemory writeStack(CSafeWriter& out, uintptr_t stackPointer, uintptr_t stackLimi
     return memory;
 }
 
-// A length in bytes, UTF-16 text and a terminator. Paths are told byte for byte.
+// A length in bytes, UTF-16 text and a terminator. Each byte of a path becomes one unit.
 uint32_t writeName(CSafeWriter& out, std::string_view name) {
     const uint32_t position = out.getPosition();
     const uint32_t bytes = static_cast<uint32_t>(name.size() * 2);
@@ -309,7 +309,7 @@ void writeMiniDump(CSafeWriter& out, const siginfo_t& signal, const SThreadState
     header.streamCount = std::size(streams);
     header.time = static_cast<uint32_t>(std::time(nullptr));
     out.write(&header, sizeof header);
-    out.write(streams, sizeof streams); // again at the end, with what is known then
+    out.write(streams, sizeof streams); // rewritten at the end, when their content is known
 
     threadCount = std::min(threadCount, kMaxThreads);
     for (size_t i = 0; i < threadCount; ++i) {

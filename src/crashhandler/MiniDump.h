@@ -1,4 +1,4 @@
-// Writes a minidump that debuggers read.
+// Writes a minidump for debuggers.
 #pragma once
 
 #include "crashhandler/Threads.h"
@@ -9,10 +9,10 @@ namespace crashhandler {
 
 class CSafeWriter;
 
-// The state of the process at the crash: system, threads with registers and stacks, modules with build ids,
-// the memory map and the status. Only from a signal handler, with every other thread stopped. Stacks end
-// below `stackLimit` where that is inside the stack: the arguments and the environment lie behind it, and
-// with them secrets. The format is the one of Windows minidumps with the Linux streams that debuggers know.
+// Writes the state of the process at the crash: system, threads with registers and stacks, modules with build
+// ids, the memory map and the status. For use in a signal handler with all other threads stopped. A stack
+// that contains `stackLimit` is cut there: the arguments and the environment, which may contain secrets, come
+// after it. The format is that of Windows minidumps with the usual Linux extensions.
 void writeMiniDump(CSafeWriter& out, const siginfo_t& signal, const SThreadState* threads, size_t threadCount,
                    uintptr_t stackLimit);
 

@@ -51,7 +51,7 @@ void CSafeWriter::writeAt(uint32_t position, const void* data, size_t size) {
 void CSafeWriter::writeMemory(uintptr_t address, size_t size) {
     char buffer[4096];
     while (size > 0) {
-        // Up to the end of a page at a time, since the next one may be missing.
+        // One page at a time, since the next one may not be mapped.
         const size_t wanted = std::min(size, sizeof buffer - address % sizeof buffer);
         const iovec local{buffer, wanted};
         const iovec remote{reinterpret_cast<void*>(address), wanted};

@@ -7,8 +7,8 @@
 
 namespace crashhandler {
 
-// A file that is written front to back, with a second pass over earlier bytes where a format wants it.
-// Failures are remembered and later writes do nothing.
+// A file that is written sequentially; writeAt overwrites earlier bytes. After a failure all further writes
+// do nothing.
 class CSafeWriter {
 public:
     explicit CSafeWriter(const char* path); // replaces an existing file; mode 0600
@@ -22,7 +22,7 @@ public:
 
     void write(const void* data, size_t size);
     void writeAt(uint32_t position, const void* data, size_t size);
-    // Copies memory of this process that may not be readable; the rest of an unreadable run becomes zeros.
+    // Copies memory of this process that may be unreadable; unreadable pages become zeros.
     void writeMemory(uintptr_t address, size_t size);
     // The whole content of a file, such as one below /proc.
     void writeFile(const char* path);

@@ -75,7 +75,7 @@ size_t captureThreads(const ucontext_t& crashed, SThreadState* threads, size_t c
     for (size_t i = 1; i < g_count; ++i)
         asked += ::syscall(SYS_tgkill, ::getpid(), threads[i].id, signal) == 0;
 
-    // A thread that blocks the signal does not answer; it is listed without registers.
+    // A thread that blocks the signal does not respond and is listed without registers.
     constexpr int kRounds = 200;
     const timespec pause{0, 1'000'000};
     for (int i = 0; i < kRounds && g_answers.load(std::memory_order_acquire) < asked; ++i)

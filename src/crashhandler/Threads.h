@@ -1,4 +1,4 @@
-// The threads of a crashing process and what each was doing.
+// The threads of a crashing process and their registers.
 #pragma once
 
 #include <cstddef>
@@ -14,8 +14,8 @@ struct SThreadState {
     ucontext_t context = {};
 };
 
-// Stops every other thread of the process in a signal handler and notes its registers. They stay stopped:
-// the process is about to end. Returns how many entries were filled, the crashing thread first.
+// Stops all other threads of the process in a signal handler and records their registers. They stay stopped,
+// since the process is about to end. Returns the number of entries; the crashing thread comes first.
 size_t captureThreads(const ucontext_t& crashed, SThreadState* threads, size_t capacity);
 
 } // namespace crashhandler

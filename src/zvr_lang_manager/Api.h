@@ -1,4 +1,4 @@
-// Marks what leaves libzvr_lang.
+// Marks the exports of libzvr_lang.
 #pragma once
 
 #define ZVR_LANG_API __attribute__((visibility("default")))

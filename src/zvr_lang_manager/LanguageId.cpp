@@ -19,7 +19,7 @@ const char16_t* threeLetterForm(const char16_t* bibliographicCode) {
                                                                        : bibliographicCode;
 }
 
-// An empty text matches nothing: many languages have an empty short code.
+// Empty text matches nothing: many languages have an empty short code.
 bool matches(const P<IString>& text, const char16_t* entry) {
     return !text->isEmpty() && text->equalsIgnoreCase(entry);
 }

@@ -6,7 +6,7 @@
 namespace zvr_lang {
 
 struct SLanguageRow {
-    const char16_t* bibliographicCode; // "aar", or "wel/cym" where the standard has two codes
+    const char16_t* bibliographicCode; // "aar", or "wel/cym" if the standard has two codes
     const char16_t* shortCode;
     const char16_t* name;
 };
@@ -16,7 +16,7 @@ struct SCountryRow {
     const char16_t* name;
 };
 
-std::span<const SLanguageRow> getLanguageTable(); // in the order of the code
-std::span<const SCountryRow> getCountryTable();   // in the order of the code
+std::span<const SLanguageRow> getLanguageTable(); // sorted by code
+std::span<const SCountryRow> getCountryTable();   // sorted by code
 
 } // namespace zvr_lang

@@ -8,7 +8,7 @@ namespace {
 
 using namespace tests;
 
-// Reads a minidump as a debugger does: by its directory.
+// Reads a minidump through its directory, as a debugger does.
 class CDump {
 public:
     explicit CDump(std::string bytes) : m_bytes(std::move(bytes)) {
@@ -48,25 +48,25 @@ TEST(CrashHandler, LeavesReportAndDumpForEveryKindOfCrash) {
     } cases[] = {{"segv", SIGSEGV, "Signal: SIGSEGV"},
                  {"abort", SIGABRT, "Signal: SIGABRT"},
                  {"overflow", SIGSEGV, "Signal: SIGSEGV"},
-                 {"unloaded", SIGSEGV, "Signal: SIGSEGV"}, // the host has closed the library
+                 {"unloaded", SIGSEGV, "Signal: SIGSEGV"}, // after the host has closed the library
                  {"throw", SIGABRT, "Exception: std::runtime_error: nobody catches this"}};
     for (const auto& test : cases) {
         SCOPED_TRACE(test.kind);
         CTempFolder folder;
         const SProcessResult result = run({CRASHING_PROGRAM, test.kind, folder.path()});
-        EXPECT_EQ(result.exitCode, 128 + test.signal); // the crash is not hidden
+        EXPECT_EQ(result.exitCode, 128 + test.signal); // the crash must not be hidden
 
         const std::string report = readFile(folder / "report.txt");
         EXPECT_EQ(report.find("Crashing 1.0\n"), 0u);
         EXPECT_NE(report.find(test.inReport), std::string::npos) << report;
-        EXPECT_NE(report.find("crashing("), std::string::npos) << report; // a call of the program's own
+        EXPECT_NE(report.find("crashing("), std::string::npos) << report; // a frame of the program itself
 
         const CDump dump(readFile(folder / "dump.dmp"));
         for (uint32_t stream : {kThreads, kModules, kMemory, kException, kSystem, kMaps})
             ASSERT_TRUE(dump.has(stream)) << stream;
         EXPECT_EQ(dump.at<uint32_t>(dump.position(kException) + 8), static_cast<uint32_t>(test.signal));
         EXPECT_EQ(dump.at<uint32_t>(dump.position(kThreads)), 2u);
-        EXPECT_GE(dump.at<uint32_t>(dump.position(kMemory)), 2u); // the stacks of both
+        EXPECT_GE(dump.at<uint32_t>(dump.position(kMemory)), 2u); // both stacks
         EXPECT_NE(dump.text(kMaps).find("libc.so"), std::string::npos);
     }
 }

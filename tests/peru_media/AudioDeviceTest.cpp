@@ -1,4 +1,4 @@
-// What devices promise about their states, over a sound server of the test's own.
+// The states of devices, tested with a private sound server.
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
 #include "peru/media/Errors.h"
@@ -44,7 +44,7 @@ protected:
         return condition();
     }
 
-    // What was heard from a place on, without silence: a busy machine may leave gaps.
+    // What was played from an offset on, without silence: a busy machine may leave gaps.
     static std::string getSound(const tests::CProcess& ears, size_t from = 0) {
         static const std::string kSilence(4, '\0');
         const std::string all = ears.readOut();
@@ -59,7 +59,7 @@ protected:
     P<IAudioInDevice> in = getSystem()->getDefaultInDevice();
 };
 
-// Notes its name for every block. The limit is the number of blocks that it wants.
+// Counts calls. The limit is the number of blocks that it accepts.
 class CNote : public CObject, public IAudioInDeviceListener {
 public:
     explicit CNote(int limit = std::numeric_limits<int>::max()) : m_limit(limit) {}
@@ -134,7 +134,7 @@ TEST_F(AudioDevice, RefusesWhatItsStateForbids) {
     EXPECT_EQ(getMessage([&] { in->open(make<CAudioFormat>(5, 2, 16)); }), "Invalid sample rate");
     EXPECT_FALSE(out->isOpened() || in->isOpened());
 
-    // None of that did harm, and a closed device opens again.
+    // The device still works, and can be opened again after close.
     in->setFormat(makeFormat());
     for (int i = 0; i < 2; ++i) {
         out->open(makeFormat());
@@ -157,12 +157,12 @@ TEST_F(AudioDevice, IsStoppedAtOnceWhileItWaitsForData) {
         for (int i = 0; i < 4; ++i) {
             out->open(makeFormat());
             out->start();
-            std::this_thread::sleep_for(std::chrono::milliseconds(20)); // into the callback's wait
+            std::this_thread::sleep_for(std::chrono::milliseconds(20)); // until the callback waits
             const auto start = Clock::now();
             closes ? out->close() : out->stop();
             fastest = std::min(fastest, Clock::now() - start);
         }
-        // The wait would have gone on for nearly half a second.
+        // The wait would otherwise last for nearly half a second.
         EXPECT_LT(fastest, std::chrono::milliseconds(250)) << closes;
     }
 }
@@ -173,7 +173,7 @@ TEST_F(AudioDevice, PlaysAllOfWhatComesLate) {
     out->open(makeFormat());
     out->start();
     const auto ears = server.listen();
-    // Until the callback has waited in vain once.
+    // Until one wait of the callback has timed out.
     ASSERT_TRUE(waitFor([&] { return ears->readOut().size() > size_t{4} * CSoundServer::kRate * 7 / 10; }));
     EXPECT_EQ(out->getPosition(), 0.0);
     out->write(sound.data(), static_cast<int64_t>(sound.size()));
@@ -194,7 +194,7 @@ TEST_F(AudioDevice, DropsTheQueueWhenStopped) {
     const double stopped = out->getPosition();
     EXPECT_GE(stopped, 0.1);
     EXPECT_LT(stopped, 5.0);
-    // It plays on with new sound.
+    // Plays new sound afterwards.
     out->write(noise.data(), 4 * 4410);
     out->start();
     ASSERT_TRUE(waitFor([&] { return out->getPosition() >= stopped + 0.1 - 1e-6; }));
@@ -219,7 +219,7 @@ TEST_F(AudioDevice, PlaysEveryWidthWithGain) {
         SCOPED_TRACE(std::to_string(each.bits) + " bits times " + std::to_string(each.gain));
         std::string sound;
         for (int i = 0; i < 4410; ++i) sound += each.frame;
-        // A machine that is too busy to play loses some frames. Those that come are right.
+        // A busy machine loses some frames. Those that arrive must be correct.
         const auto isHeard = [&each](const std::string& heard) {
             for (size_t i = 0; i < heard.size(); i += 4)
                 if (heard.compare(i, 4, each.expected) != 0) {
@@ -229,7 +229,7 @@ TEST_F(AudioDevice, PlaysEveryWidthWithGain) {
             return heard.size() >= 4 * 500;
         };
         const auto ears = server.listen();
-        // Once from the queue, once from a stream.
+        // Once from the queue and once from a stream.
         out->setGain(each.gain);
         out->open(makeFormat(each.bits));
         out->write(sound.data(), static_cast<int64_t>(sound.size()));
@@ -246,7 +246,7 @@ TEST_F(AudioDevice, PlaysEveryWidthWithGain) {
         out->start();
         EXPECT_TRUE(waitFor([&] { return isHeard(getSound(*ears, heard)); }));
         EXPECT_TRUE(waitFor([&] { return out->getPosition() >= 0.1 - 1e-6; }));
-        EXPECT_EQ(out->getStatus(), kDeviceRunning); // it never ends by itself
+        EXPECT_EQ(out->getStatus(), kDeviceRunning); // it never stops by itself
         out->close();
     }
 }
@@ -266,7 +266,7 @@ TEST_F(AudioDevice, TellsListenersInTurnUntilOneHasEnough) {
     EXPECT_EQ(gone->blocks + gone->volumes, 0);
     in->close();
 
-    // A failure of a listener ends the recording as well.
+    // An exception from a listener ends the recording as well.
     first->onBlock = [] { throw CError("no more"); };
     in->open(makeFormat());
     in->start();
@@ -274,7 +274,7 @@ TEST_F(AudioDevice, TellsListenersInTurnUntilOneHasEnough) {
     EXPECT_EQ(first->blocks, 3);
     for (const P<CNote>& note : {second, third}) in->removeListener(note.get());
 
-    // It goes on where the cause has gone.
+    // It can be started again.
     first->onBlock = nullptr;
     in->start();
     EXPECT_TRUE(waitFor([&] { return first->blocks > 3; }));
@@ -300,7 +300,7 @@ TEST_F(AudioDevice, LetsListenersAskAndLeaveWhileItRecords) {
     }
     in->stop();
     EXPECT_GT(in->getPosition(), 0.0);
-    EXPECT_EQ(keen->volumes, 0); // no levels of three channels
+    EXPECT_EQ(keen->volumes, 0); // no levels for three channels
     in->removeListener(keen.get());
 }
 

@@ -19,17 +19,17 @@ TEST(FormatSearch, FindsTheNearest) {
     };
     const SCase cases[] = {
         {44100, 2, any, 44100, 2},
-        {37000, 3, any, 37000, 3}, // no usual one, yet taken
+        {37000, 3, any, 37000, 3}, // not a common rate, but accepted
         {44100, 2, onlyRate(48000), 48000, 2},
-        {37000, 2, onlyRate(44123), 44123, 2}, // the device's own
+        {37000, 2, onlyRate(44123), 44123, 2}, // the device's default
         {38050, 1,
          [](const CAudioFormat& f) { return f.getSampleRate() % 100 == 0 && f.getSampleRate() != 38050; },
          44100, 1}, // as near as 32000
         {44100, 3, [](const CAudioFormat& f) { return f.getChannelCount() % 2 == 0; }, 44100, 4},
-        {44100, 100, any, 44100, 6}, // more than there are
+        {44100, 100, any, 44100, 6}, // more than the maximum
         {0, 0, any, 8000, 1},
         {-5, -5, any, 8000, 1},
-        // The rate goes before the channels.
+        // The rate takes precedence over the channels.
         {44100, 1,
          [](const CAudioFormat& f) { return f.getSampleRate() == 48000 || f.getChannelCount() == 6; }, 44100,
          6},

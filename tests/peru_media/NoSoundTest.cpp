@@ -1,4 +1,4 @@
-// Machines without a sound device, or with a sound system that is out of order.
+// Machines without a sound device or with a broken sound configuration.
 #include "peru/GlobalObjFactory.h"
 #include "peru/Object.h"
 #include "peru/media/Errors.h"
@@ -22,7 +22,7 @@ protected:
     NoSound() { CGlobalObjFactory::shutdown(); }
     ~NoSound() override { CGlobalObjFactory::shutdown(); }
 
-    // Nobody listens there.
+    // Nothing listens there.
     CTempFolder folder;
     const std::string nobody = "unix:" + (folder / "nobody").string();
     CEnvironment server{"PULSE_SERVER", nobody};
@@ -57,7 +57,7 @@ TEST_F(NoSound, TellsOfAConfigurationThatCannotBeRead) {
     testing::internal::CaptureStderr();
     EXPECT_THROW(getSystem(), CMediaException);
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
-    // The next request tries again.
+    // The next call tries again.
     folder.write("bad.conf", "");
     EXPECT_FALSE(getSystem()->getDefaultOutDevice());
 }
@@ -73,7 +73,7 @@ TEST_F(NoSound, TakesTheSystemOfAHost) {
     const CEnvironment alsa("ALSA_CONFIG_PATH", folder.write("bad.conf", "pcm { x").string());
     const P<ISystem> system = make<CHostSystem>();
     setSystem(system);
-    EXPECT_EQ(getSystem(), system); // the machine's is not touched
+    EXPECT_EQ(getSystem(), system); // the machine's sound system is not used
     setSystem(nullptr);
     EXPECT_THROW(getSystem(), CMediaException);
 }

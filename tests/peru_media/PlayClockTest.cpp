@@ -17,8 +17,9 @@ TEST(PlayClock, CountsWhatHasBeenHeard) {
     const struct {
         double now;
         double heard;
-    } cases[] = {{9.0, 0},    {10.0, 0},   {10.25, 25},  {11.5, 150}, {11.0, 150}, // clocks do not run back
-                 {13.0, 200}, {14.9, 200}, {15.25, 225}, {15.5, 250}, {1e9, 250}};
+    } cases[] = {
+        {9.0, 0},    {10.0, 0},   {10.25, 25},  {11.5, 150}, {11.0, 150}, // time does not go backwards
+        {13.0, 200}, {14.9, 200}, {15.25, 225}, {15.5, 250}, {1e9, 250}};
     for (const auto& each : cases) EXPECT_NEAR(clock.getHeard(each.now), each.heard, 1e-6) << each.now;
 }
 
@@ -27,7 +28,7 @@ TEST(PlayClock, ForgetsWhatTheSystemDropped) {
     clock.add(10.0, 100);
     clock.drop(10.5);
     EXPECT_NEAR(clock.getHeard(20.0), 50.0, 1e-6);
-    // The stream's clock starts anew.
+    // The stream's clock restarts.
     clock = CPlayClock(100.0);
     clock.add(10.0, 100);
     clock.drop(11.0);
@@ -35,7 +36,7 @@ TEST(PlayClock, ForgetsWhatTheSystemDropped) {
     EXPECT_NEAR(clock.getHeard(1.5), 150.0, 1e-6);
 }
 
-// Blocks come by the thousand, far ahead, with times that tremble, and are asked about seldom or often.
+// Thousands of blocks, far ahead, with jittering times, queried rarely or often.
 TEST(PlayClock, NeverFallsAndReachesTheEnd) {
     for (const auto& [askEvery, frames, ahead] :
          {std::tuple(1, 512, 0.2), {7, 512, 0.2}, {500, 512, 0.2}, {1, 94, 2.0}, {1000, 94, 2.0}}) {

@@ -37,7 +37,7 @@ TEST(Samples_Scale, RoundsAndStaysInRange) {
         {2, 0.0, {32767, -32768}, {0, 0}},
         {3, 0.5, {-2, 0x400000, -8388608, 255, 256}, {-1, 0x200000, -4194304, 128, 128}},
         {3, 3.0, {8388607, -8388608, -1, 0x1234}, {8388607, -8388608, -3, 0x369C}},
-        {4, 0.5, {1000}, {1000}}, // a width without a device
+        {4, 0.5, {1000}, {1000}}, // a width that no device has
     };
     for (const SCase& each : cases) {
         std::vector<uint8_t> bytes = pack(each.samples, each.bytesPerSample);
@@ -77,7 +77,7 @@ TEST(Samples_ReadLevels, MeasuresTheFirstFrame) {
     };
     const SCase cases[] = {
         {1, 1, {-127}, 1.0, 1.0},
-        {1, 2, {-128, 0}, 1.0, 0.0}, // one step below full level is full level
+        {1, 2, {-128, 0}, 1.0, 0.0}, // one step beyond full level counts as full level
         {2, 2, {-32767, 16384}, 1.0, 16384 / 32767.0},
         {2, 1, {-16384, 32767}, 16384 / 32767.0, 16384 / 32767.0},
         {3, 2, {8388607, 8388607}, 0.0, 0.0},

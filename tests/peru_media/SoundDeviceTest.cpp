@@ -1,4 +1,4 @@
-// Real sound through the machine's sound system.
+// Real sound through a private sound server.
 #include "peru/GlobalObjFactory.h"
 #include "peru/media/Errors.h"
 #include "peru/media/ISystem.h"
@@ -24,7 +24,7 @@ class SoundDevice : public testing::Test {
 protected:
     static constexpr size_t kFrameBytes = CSoundServer::kFrameBytes;
 
-    // The next server's devices are another test's.
+    // Each test has a sound server of its own.
     void TearDown() override { peru::CGlobalObjFactory::shutdown(); }
 
     static P<CAudioFormat> getFormat() { return peru::make<CAudioFormat>(CSoundServer::kRate, 2, 16); }
@@ -48,7 +48,7 @@ protected:
     }
 };
 
-// Keeps what it hears, and has enough of it at a certain size.
+// Records what it receives, up to a limit.
 class CEars : public peru::CObject, public IAudioInDeviceListener {
 public:
     bool onAudioData(const void* data, int64_t size) override {
@@ -91,7 +91,7 @@ TEST_F(SoundDevice, PlaysEverySampleAcrossAPause) {
     EXPECT_EQ(device->getStatus(), kDeviceIdle);
     const int64_t queued = device->getQueuedSize();
     EXPECT_GT(queued, 0);
-    // The position goes on to what the system had taken, and no further.
+    // The position advances to the end of what the system has buffered, and no further.
     double still = -1;
     ASSERT_TRUE(waitFor([&] {
         const double before = std::exchange(still, device->getPosition());

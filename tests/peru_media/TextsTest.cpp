@@ -9,7 +9,7 @@ using namespace peru::media;
 
 TEST(DeviceNames, TellHostApiAndDefault) {
     const struct {
-        int32_t type; // the engine's number
+        int32_t type; // the engine's number for it
         const char* name;
     } cases[] = {{2, "MMSystem"}, {1, "DirectShow"}, {13, "WASAPI"},
                  {8, "UNKNOWN"},  {0, "UNKNOWN"},    {-1, "UNKNOWN"}};

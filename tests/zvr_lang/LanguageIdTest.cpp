@@ -24,7 +24,7 @@ TEST(LanguageId, FindsLanguageWithCountryByEitherCode) {
         EXPECT_EQ(text(id.countryName), u"Austria");
         EXPECT_TRUE(id.getThreeLetterCode()->equals("deu"));
     }
-    // A language without a two-letter code is found by its three letters alone.
+    // A language without a two-letter code can only be found by its three-letter code.
     EXPECT_EQ(text(findLanguageId(u"haw-US", ELanguageIdKind::languageAndCountry).shortCode), u"");
 }
 

@@ -21,7 +21,7 @@ constexpr int64_t kCopyBufferSize = 256 * 1024;
         culprit);
 }
 
-// Takes back what a failed operation has made. Its own failure would hide the one that matters.
+// Removes what a failed operation has created. Its own failure is ignored, as it would hide the first error.
 void removeQuietly(const P<IFileSystem>& fileSystem, const P<IURI>& uri,
                    void (IFileSystem::*remove)(const P<IURI>&)) {
     try {
@@ -30,17 +30,17 @@ void removeQuietly(const P<IFileSystem>& fileSystem, const P<IURI>& uri,
     }
 }
 
-// The file that an error speaks of, else the one that the operation is about.
+// The file that the error refers to, otherwise the operation's own.
 P<IURI> getCulprit(const CException& error, const P<IURI>& otherwise) {
     auto* uriError = dynamic_cast<const CURIError*>(&error);
     return uriError && uriError->getURI() ? uriError->getURI() : otherwise;
 }
 
-// Between two file systems that know nothing of each other.
+// Copies between two different file systems.
 void copyThroughStreams(const P<IURI>& source, const P<IURI>& destination, const P<IFileSystem>& to,
                         const P<CFileTimes>& times) {
     P<IInStream> in = getStreamManager()->getInStream(source);
-    // What this refuses is somebody else's file, and not taken back below.
+    // If this fails, the destination is not ours and must not be deleted below.
     P<IOutStream> out = getStreamManager()->getOutStream(destination, EOpenMode::createNew);
     try {
         auto buffer = std::make_unique<uint8_t[]>(kCopyBufferSize);
@@ -56,7 +56,7 @@ void copyThroughStreams(const P<IURI>& source, const P<IURI>& destination, const
 } // namespace
 
 CFileSystemManager::CFileSystemManager() : m_mutex(getMutexFactory()->createMutex()) {
-    // Without the mutex: nobody else knows this object, and whoever makes a singleton holds the factory's.
+    // No lock needed: no other thread knows this object yet, and the global object factory's mutex is held.
     m_mounts.push_back({CString::empty(), createDiskFileSystem()});
 }
 
@@ -82,7 +82,7 @@ void CFileSystemManager::unmount(const P<IFileSystem>& fileSystem) {
 P<IFileSystem> CFileSystemManager::getFileSystem(const P<IURI>& uri) {
     if (!uri) return nullptr;
     P<IString> scheme = uri->getScheme();
-    std::vector<SMount> mounts; // asked without the mutex: what a file system calls is its own affair
+    std::vector<SMount> mounts; // asked without the mutex, since file systems may call anything
     {
         CMutexLock lock(m_mutex);
         mounts = m_mounts;
@@ -162,7 +162,7 @@ void CFileSystemManager::createFolder(const P<IURI>& uri) {
                 fileSystem->createFolder(missing.back());
                 made.push_back(missing.back());
             } catch (const CException&) {
-                // Somebody else may have made it in the meantime.
+                // Another process may have created it in the meantime.
                 if (!isFolder(missing.back())) throw;
             }
         }
@@ -313,7 +313,7 @@ void CFileSystemManager::moveFolder(const SRoute& route, const P<IFileObject>& f
             removeQuietly(route.to, route.destination, &IFileSystem::deleteFolder);
             throw;
         }
-        // From here on the copy stays: of the source, parts may be gone.
+        // From here on the copy must stay: parts of the source may be gone.
         route.from->deleteFolder(route.source);
     } catch (const CException& error) {
         fail(error);

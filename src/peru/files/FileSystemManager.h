@@ -1,4 +1,4 @@
-// The implementation of IFileSystemManager: look-up, and copying and moving by steps.
+// The implementation of IFileSystemManager: look-up, and copying and moving in steps.
 #pragma once
 
 #include "peru/files/IFileSystemManager.h"
@@ -35,10 +35,10 @@ public:
 
 private:
     struct SMount {
-        P<IString> scheme; // empty: the file system is asked
+        P<IString> scheme; // empty: decided by IFileSystem::handles
         P<IFileSystem> fileSystem;
     };
-    // Two ends of a copy or move.
+    // Both ends of a copy or move.
     struct SRoute {
         P<IURI> source;
         P<IURI> destination;
@@ -55,7 +55,7 @@ private:
     void moveFile(const SRoute& route, const P<IFileObject>& object);
     void moveFolder(const SRoute& route, const P<IFileObject>& folder);
 
-    P<IMutex> m_mutex; // guards m_mounts; no file system is called under it
+    P<IMutex> m_mutex; // guards m_mounts; never held while a file system is called
     std::vector<SMount> m_mounts;
 };
 

@@ -1,4 +1,4 @@
-// When a file was made, read and written.
+// When a file was created, last read and last written.
 #pragma once
 
 #include "peru/Object.h"
@@ -8,8 +8,8 @@
 
 namespace peru {
 
-// Nanoseconds since 1970 UTC. kUnknown means that the file system does not keep that time, or that it is to
-// stay as it is.
+// Nanoseconds since 1970 UTC. kUnknown means that the file system does not record that time or, when setting
+// times, that it is not to be changed.
 class PERU_API CFileTimes : public CObject {
 public:
     static constexpr int64_t kUnknown = std::numeric_limits<int64_t>::min();

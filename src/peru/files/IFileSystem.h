@@ -5,40 +5,41 @@
 
 namespace peru {
 
-// Every URI given to it is one that it handles. Safe from any thread. What an operation does, it does wholly
-// or not at all, deleteFolder excepted; failures are CFileError.
+// Callers only pass URIs that it handles. Thread-safe. Operations other than deleteFolder either succeed
+// completely or change nothing; failures throw CFileError.
 class PERU_API IFileSystem : public virtual IBase {
 public:
     virtual bool handles(const P<IURI>& uri) = 0;
     virtual P<IFileObject> getRoot() = 0;
-    // Empty when there is nothing. A link that leads nowhere is something.
+    // Empty if nothing exists there. A dangling link exists.
     virtual P<IFileObject> getFileObject(const P<IURI>& uri) = 0;
 
     virtual void setTimes(const P<IURI>& uri, const P<CFileTimes>& times) = 0;
-    virtual void createFolder(const P<IURI>& uri) = 0; // in a folder that exists
-    virtual void deleteFile(const P<IURI>& uri) = 0;   // or a link, never what it leads to
+    virtual void createFolder(const P<IURI>& uri) = 0; // the parent must exist
+    virtual void deleteFile(const P<IURI>& uri) = 0;   // or a link, never its target
     virtual void deleteEmptyFolder(const P<IURI>& uri) = 0;
-    // With everything in it. Links in it are removed and not followed.
+    // With all its content. Links are removed, not followed.
     virtual void deleteFolder(const P<IURI>& uri) = 0;
-    // So that the user can get it back, such as from a waste bin; fails rather than to delete for good.
+    // So that the user can restore it, for example into the trash; fails rather than deleting permanently.
     virtual void deleteUndoable(const P<IURI>& uri) = 0;
 
-    // --- Within this file system; none replaces anything ---
-    virtual void copyFile(const P<IURI>& source, const P<IURI>& destination) = 0; // what a link leads to
+    // --- Within this file system; none of them replaces anything ---
+    virtual void copyFile(const P<IURI>& source, const P<IURI>& destination) = 0; // follows links
     virtual void copyLink(const P<IURI>& source, const P<IURI>& destination) = 0; // the link itself
-    // An empty folder that nobody else can look into until finishFolder gives it the rights and times of its
-    // source, after its children have come.
+    // Creates an empty folder that nobody else can read. finishFolder, called once the children have been
+    // copied, sets the permissions and times of the source.
     virtual void startFolder(const P<IURI>& source, const P<IURI>& destination) = 0;
     virtual void finishFolder(const P<IURI>& source, const P<IURI>& destination) = 0;
-    // A file, folder or link by its name alone. False, with nothing done, where that needs a copy.
+    // Moves a file, folder or link by renaming it. Returns false, with nothing done, if a copy would be
+    // needed.
     virtual bool tryMove(const P<IURI>& source, const P<IURI>& destination) = 0;
-    // Whether `uri`, which need not exist, is `folder` or would lie below it.
+    // Whether `uri`, which need not exist, is `folder` or would be below it.
     virtual bool isWithin(const P<IURI>& uri, const P<IURI>& folder) = 0;
-    // Returns when what was written around `uri` would outlive a power cut.
+    // Returns once everything written at `uri` would survive a power failure.
     virtual void commit(const P<IURI>& uri) = 0;
 };
 
-// The disks of this machine: "file" and relative URIs.
+// The file systems of this machine: "file" and relative URIs.
 PERU_API P<IFileSystem> createDiskFileSystem();
 
 } // namespace peru

@@ -6,13 +6,12 @@
 
 namespace peru {
 
-// A major and a minor type, such as "audio" and "mpeg". Kept in lower case, since case has no meaning in
-// them.
+// A major and a minor type, such as "audio" and "mpeg". Stored in lower case, since case is not significant.
 class PERU_API CMimeType : public CObject {
 public:
     CMimeType(const CStringArg& major, const CStringArg& minor);
     ~CMimeType() override;
-    // Parameters behind a ";" are dropped. Throws CParseError for a text that is no type.
+    // Ignores parameters after a ";". Throws CParseError for an invalid type.
     static P<CMimeType> parse(const CStringArg& text);
 
     const P<IString>& getMajor() const { return m_major; }

@@ -20,7 +20,7 @@ bool isOctal(char ch) {
     return ch >= '0' && ch <= '7';
 }
 
-// Blanks and their kind are written as a backslash and three octal digits.
+// White space and backslashes are written as a backslash and three octal digits.
 std::string unescape(std::string_view word) {
     std::string result;
     for (size_t i = 0; i < word.size(); ++i) {
@@ -45,7 +45,7 @@ bool hasOption(std::string_view options, std::string_view wanted) {
     return false;
 }
 
-// Without a block device of its own and yet a place for a user's files.
+// File systems that hold users' files but have no block device of their own.
 bool isNetworkOrLayered(const std::string& fileSystem) {
     static constexpr std::array<std::string_view, 13> kNames = {
         "nfs", "nfs4",    "cifs", "smb3", "smbfs",  "9p",      "virtiofs",
@@ -92,7 +92,7 @@ std::vector<SMount> selectVolumes(const std::vector<SMount>& mounts) {
         if (same == volumes.end())
             volumes.push_back(*mount);
         else if (same->root != "/" && mount->root == "/")
-            *same = *mount; // the whole of it in place of a part
+            *same = *mount; // prefer the whole file system to a part of it
     }
     return volumes;
 }

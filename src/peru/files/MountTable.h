@@ -1,4 +1,4 @@
-// The text in which the kernel lists what is mounted.
+// Parser for the kernel's list of mounts.
 #pragma once
 
 #include "peru/Api.h"
@@ -9,21 +9,21 @@
 
 namespace peru {
 
-// One line of it. Paths are bytes.
+// One line of the list. Paths are bytes.
 struct SMount {
     std::string device; // "major:minor"
-    std::string root;   // the folder of the file system that is seen; "/" unless a part is mounted
+    std::string root;   // the mounted folder of the file system; "/" unless only a part is mounted
     std::string mountPoint;
     std::string fileSystem; // such as "ext4"
     std::string source;     // such as "/dev/sda1"
     bool readOnly = false;
 };
 
-// Lines that are none are passed over.
+// Skips malformed lines.
 PERU_API std::vector<SMount> parseMountTable(std::string_view text);
 
-// Of the mounts those that a user knows as volumes, each device once: file systems of the kernel's making
-// and single files are left out, and a mount that another one covers.
+// Selects the mounts that a user regards as volumes, each device once. Leaves out the kernel's virtual file
+// systems and mounts that are hidden by a later mount.
 PERU_API std::vector<SMount> selectVolumes(const std::vector<SMount>& mounts);
 
 } // namespace peru

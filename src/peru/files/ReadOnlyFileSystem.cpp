@@ -62,7 +62,7 @@ bool CReadOnlyFileSystem::isWithin(const P<IURI>& uri, const P<IURI>& folder) {
 }
 
 void CReadOnlyFileSystem::commit(const P<IURI>& uri) {
-    // Nothing was written.
+    // Nothing has been written.
 }
 
 } // namespace peru

@@ -1,11 +1,11 @@
-// The base of file systems that can only be looked at, such as discs.
+// Base class of read-only file systems, such as discs.
 #pragma once
 
 #include "peru/files/IFileSystem.h"
 
 namespace peru {
 
-// Every operation that writes throws CReadOnlyError.
+// Every modifying operation throws CReadOnlyError.
 class PERU_API CReadOnlyFileSystem : public CObject, public virtual IFileSystem {
 protected:
     ~CReadOnlyFileSystem() override;
@@ -22,7 +22,7 @@ public:
     void startFolder(const P<IURI>& source, const P<IURI>& destination) override;
     void finishFolder(const P<IURI>& source, const P<IURI>& destination) override;
     bool tryMove(const P<IURI>& source, const P<IURI>& destination) override;
-    bool isWithin(const P<IURI>& uri, const P<IURI>& folder) override; // by the text of the paths
+    bool isWithin(const P<IURI>& uri, const P<IURI>& folder) override; // compares the text of the paths
     void commit(const P<IURI>& uri) override;
 
 private:

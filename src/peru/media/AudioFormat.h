@@ -1,4 +1,4 @@
-// What a sound device delivers or takes.
+// The sample format of a sound device.
 #pragma once
 
 #include "peru/Object.h"
@@ -8,7 +8,7 @@
 
 namespace peru::media {
 
-// Interleaved linear PCM, little-endian: 8 bit unsigned, wider samples signed. Does not change once made.
+// Interleaved linear PCM, little-endian; 8-bit samples are unsigned, wider ones signed. Immutable.
 class PERU_MEDIA_API CAudioFormat : public CObject {
 public:
     CAudioFormat(int32_t sampleRate, int32_t channelCount, int32_t bitsPerSample)

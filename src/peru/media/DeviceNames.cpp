@@ -11,7 +11,7 @@ P<IString> getHostApiName(int32_t type) {
     case paMME:
         return newString("MMSystem");
     case paDirectSound:
-        return newString("DirectShow"); // the name that users know it by
+        return newString("DirectShow"); // the name shown to users
     case paWASAPI:
         return newString("WASAPI");
     default:

@@ -1,4 +1,4 @@
-// How devices are listed.
+// Names under which devices are listed.
 #pragma once
 
 #include "peru/media/Api.h"
@@ -6,7 +6,7 @@
 
 namespace peru::media {
 
-// The name shown for the engine's type number of a host API, the way into the sound system.
+// The name for the engine's type number of a host API.
 PERU_MEDIA_API P<IString> getHostApiName(int32_t type);
 
 // "ID: 3 - NAME (HOST API)", with " [DEFAULT]" for the default.

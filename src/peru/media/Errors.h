@@ -1,4 +1,4 @@
-// The errors of sound devices.
+// Errors of sound devices.
 #pragma once
 
 #include "peru/Exception.h"
@@ -12,7 +12,7 @@ class PERU_MEDIA_API CMediaException : public CException {
     explicit CMediaException(const CStringArg& description);
 };
 
-// The text is the engine's own for its error code.
+// The description is the engine's text for the error code.
 class PERU_MEDIA_API CPortaudioException : public CMediaException {
     PERU_EXCEPTION(CPortaudioException)
     explicit CPortaudioException(int32_t code);

@@ -26,7 +26,7 @@ P<CAudioFormat> findNearestFormat(const P<CAudioFormat>& wanted, int32_t maxChan
     if (wanted->getSampleRate() > 0) rates.push_back(wanted->getSampleRate());
     sortByDistance(rates, wanted->getSampleRate());
 
-    // Some drivers take any count up to more than a hundred; every try opens the device.
+    // Some drivers accept more than a hundred channels, and every attempt opens the device.
     std::vector<int32_t> channelCounts{1, 2, 4, 6, 8, maxChannelCount, wanted->getChannelCount()};
     std::erase_if(channelCounts, [=](int32_t count) { return count < 1 || count > maxChannelCount; });
     sortByDistance(channelCounts, wanted->getChannelCount());

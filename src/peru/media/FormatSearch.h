@@ -1,4 +1,4 @@
-// Finds a format that a device takes.
+// Finds a format that a device supports.
 #pragma once
 
 #include "peru/media/AudioFormat.h"
@@ -9,9 +9,10 @@ namespace peru::media {
 
 using FormatTest = std::function<bool(const CAudioFormat&)>;
 
-// The wanted format where the test passes it, else the nearest one with the same width: of the usual rates,
-// the wanted and the default one the nearest, the higher of two as near; of the usual channel counts up to
-// `maxChannelCount` the nearest, again the higher of two. Empty when the test passes none.
+// Returns the wanted format if the test accepts it, otherwise the nearest accepted one with the same sample
+// width. The candidates are the common sample rates and the default one, then the common channel counts up to
+// `maxChannelCount`; the nearest comes first and the higher of two equally near ones. Empty if none is
+// accepted.
 PERU_MEDIA_API P<CAudioFormat> findNearestFormat(const P<CAudioFormat>& wanted, int32_t maxChannelCount,
                                                  int32_t defaultSampleRate, const FormatTest& isTaken);
 

@@ -8,17 +8,18 @@ namespace peru::media {
 
 class PERU_MEDIA_API IAudioInDevice : public virtual IAudioDevice {
 public:
-    // The format that open uses when it is given none.
+    // The format used by open() if it gets none.
     virtual void setFormat(const P<CAudioFormat>& format) = 0;
-    virtual void open(const P<CAudioFormat>& format = nullptr) = 0; // does nothing when opened
+    virtual void open(const P<CAudioFormat>& format = nullptr) = 0; // does nothing if already open
     virtual void start() = 0;
-    virtual void stop() = 0; // ends and closes the stream
+    virtual void stop() = 0; // stops and closes the stream
 
-    // Seconds since start. Any thread.
+    // Seconds since start. Thread-safe.
     virtual double getPosition() const = 0;
 
-    // Held without a reference: a listener removes itself before it dies. Once remove has returned no call
-    // to that listener is under way. Any thread but the device's own.
+    // Listeners are not owned and must be removed before they are destroyed. removeListener waits for calls
+    // in progress, so it must not be called with a lock held that a listener takes. Both may be called from
+    // any thread except the device's own, that is, not by a listener during its call.
     virtual void addListener(IAudioInDeviceListener* listener) = 0;
     virtual void removeListener(IAudioInDeviceListener* listener) = 0;
 };

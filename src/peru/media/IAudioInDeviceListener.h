@@ -1,4 +1,4 @@
-// Who hears an input device.
+// Receives the samples of an input device.
 #pragma once
 
 #include "peru/media/VolumeInfo.h"
@@ -7,14 +7,15 @@
 
 namespace peru::media {
 
-// Both operations are called on the device's own thread, must be quick, and must neither open nor close the
-// device. They may not throw; an exception ends the recording as a false answer does.
+// Called on the device's own thread with the lock on the list of listeners held. Must return quickly and must
+// not open, start, stop or close the device or wait for a thread that does: closing waits for the callback.
+// Must not throw; an exception ends the recording just like returning false.
 class PERU_MEDIA_API IAudioInDeviceListener : public virtual IBase {
 public:
-    // `size` bytes of whole frames in the device's format, valid during the call. False stops the device; the
-    // listeners behind this one do not get the block.
+    // `size` bytes of complete frames in the device's format, valid during the call. Returning false stops
+    // the device; the remaining listeners do not get the block.
     virtual bool onAudioData(const void* data, int64_t size) = 0;
-    // The level at the start of the block that was just told.
+    // The level at the start of the block just passed to onAudioData.
     virtual void onVolume(const P<CVolumeInfo>& volume) = 0;
 };
 

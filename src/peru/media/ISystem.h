@@ -7,20 +7,20 @@
 
 namespace peru::media {
 
-// Every call gives device objects of its own; a machine without devices gives empty answers. Throws
-// CMediaException where the sound system cannot be reached at all. Any thread.
+// Every call returns new device objects; on a machine without devices the results are empty. Throws
+// CMediaException if the sound system cannot be reached at all. Thread-safe.
 class PERU_MEDIA_API ISystem : public virtual IBase {
 public:
     virtual WEnum<IAudioOutDevice> getOutDevices() = 0;
     virtual WEnum<IAudioInDevice> getInDevices() = 0;
-    virtual P<IAudioOutDevice> getDefaultOutDevice() = 0; // empty when there is none
+    virtual P<IAudioOutDevice> getDefaultOutDevice() = 0; // empty if there is none
     virtual P<IAudioInDevice> getDefaultInDevice() = 0;
 };
 
-// Reaches for the sound system at the first call, which takes some tens of milliseconds.
+// The first call connects to the sound system, which takes some tens of milliseconds.
 PERU_MEDIA_API P<ISystem> getSystem();
-// From now on getSystem() gives this one, for hosts and tests with devices of their own; empty: the machine's
-// again.
+// Makes getSystem() return this object, for hosts and tests with devices of their own; an empty handle
+// restores the machine's.
 PERU_MEDIA_API void setSystem(const P<ISystem>& system);
 
 } // namespace peru::media

@@ -35,7 +35,7 @@ double CPlayClock::getHeard(double now) {
     m_now = std::max(m_now, now);
     while (m_count > 0 && getPart(m_ring[m_first]) >= static_cast<double>(m_ring[m_first].frames))
         retireFirst();
-    // The times of neighbours may overlap a little, so the running block is not always the first.
+    // Neighbouring blocks may overlap slightly, so the current block is not always the first.
     double heard = m_heard;
     for (size_t i = 0; i < m_count; ++i) heard += getPart(m_ring[(m_first + i) % kMostBlocks]);
     return heard;

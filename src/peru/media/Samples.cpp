@@ -8,7 +8,7 @@ namespace peru::media {
 
 namespace {
 
-// The product, rounded half away from zero and held between the ends of the width.
+// The product, rounded half away from zero and clamped to the range of the width.
 template <int32_t Bits> int32_t scale(int32_t sample, double gain) {
     constexpr double kMax = (int64_t{1} << (Bits - 1)) - 1;
     const double product = std::clamp(sample * gain, -kMax - 1.0, kMax);
@@ -37,7 +37,7 @@ void scaleAll24(uint8_t* bytes, int64_t size, double gain) {
 template <class T> double readLevel(const uint8_t* bytes, double full) {
     T sample;
     std::memcpy(&sample, bytes, sizeof(T));
-    // The lowest sample lies one step below full level.
+    // The lowest sample exceeds full level by one step.
     return std::min(1.0, std::abs(static_cast<double>(sample)) / full);
 }
 

@@ -6,7 +6,7 @@ namespace peru::media {
 
 namespace {
 
-// What a host put in the place of the machine's devices.
+// A host's replacement for the machine's devices.
 class CReplacement : public CObject {
 public:
     P<ISystem> get() const {
@@ -15,7 +15,7 @@ public:
     }
     void set(P<ISystem> system) {
         CMutexLock lock(m_mutex);
-        m_system.swap(system); // the old one dies with the argument, when the lock is open again
+        m_system.swap(system); // the old one is released with the argument, after the lock
     }
 
 private:

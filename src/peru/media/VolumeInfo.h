@@ -1,4 +1,4 @@
-// A level reading.
+// A level measurement.
 #pragma once
 
 #include "peru/Object.h"
@@ -6,7 +6,7 @@
 
 namespace peru::media {
 
-// The levels of the left and the right channel, from 0.0 to 1.0; both the same for mono.
+// The levels of the left and right channel, from 0.0 to 1.0; equal for mono.
 class PERU_MEDIA_API CVolumeInfo : public CObject {
 public:
     CVolumeInfo(double left, double right) : m_left(left), m_right(right) {}

@@ -5,14 +5,14 @@
 
 namespace peru {
 
-// Activates the required packages in their order, then calls load().
+// Activates the required packages in the given order, then calls load().
 class PERU_API CPackageBase : public CObject, public IPackage {
 public:
     CPackageBase(const CStringArg& name, const std::vector<const char*>& required = {});
     ~CPackageBase() override;
 
     P<IString> getName() override { return m_name; }
-    // Throws CError when a required package is not known.
+    // Throws CError if a required package is not registered.
     void checkAndLoad(IPackageManager& manager) override;
 
 protected:
@@ -23,7 +23,7 @@ private:
     std::vector<P<IString>> m_required;
 };
 
-// "peru", the root: brings up every package that is registered.
+// "peru", the root package: activates every registered package.
 class PERU_API CPackage : public CPackageBase {
 public:
     CPackage();

@@ -80,8 +80,9 @@ void CPackageManager::removeListener(IPackageListener* listener) {
 P<IPackageManager> getPackageManager() {
     static const CGlobalObjFactory::SKey key;
     return CGlobalObjFactory::get<IPackageManager>(key, [] {
-        // Handed over rather than registered: the factory's mutex is held here, and a package that loads asks
-        // for singletons with the manager's held.
+        // Passed to the constructor rather than registered: the factory's mutex is held here, and a package
+        // that loads takes it while holding the manager's mutex. Registering would lock in the opposite
+        // order.
         std::vector<P<IPackage>> known{make<CPackage>(), make<posix::CPackage>()};
         return P<IPackageManager>(make<CPackageManager>(std::move(known)));
     });

@@ -10,7 +10,7 @@ namespace peru::posix {
 
 bool CFileHandle::close() noexcept {
     int descriptor = std::exchange(m_descriptor, -1);
-    // An interrupted close has closed the descriptor all the same.
+    // An interrupted close has still closed the descriptor.
     return descriptor < 0 || ::close(descriptor) == 0;
 }
 

@@ -1,4 +1,4 @@
-// What the file classes of this platform share: descriptors, paths of URIs, texts of errors.
+// Helpers for this platform's file classes: descriptors, paths of URIs, error texts.
 #pragma once
 
 #include "peru/uri/IURI.h"
@@ -21,23 +21,23 @@ public:
 
     bool isOpen() const { return m_descriptor >= 0; }
     int get() const { return m_descriptor; }
-    // False when the system reports a write error that it had kept back.
+    // False if the system reports a deferred write error.
     bool close() noexcept;
 
 private:
     int m_descriptor;
 };
 
-// The bytes of the URI's path, without a trailing "/", so that a call on a link means the link. Throws
-// CURITypeNotSupportedError when the URI names nothing on this machine's disks.
+// The bytes of the URI's path without a trailing "/", so that a call on a link affects the link itself.
+// Throws CURITypeNotSupportedError if the URI is not a path on this machine.
 std::string toPath(const P<IURI>& uri);
-// The same, empty in place of the error.
+// The same, but returns an empty path instead of throwing.
 std::string tryToPath(const P<IURI>& uri);
 // A folder's URI ends in "/".
 P<IURI> toURI(const std::string& path);
 P<IURI> toFolderURI(std::string path);
 
-// The system's own text for an errno value.
+// The system's text for an errno value.
 P<IString> getSystemText(int error);
 
 } // namespace peru::posix

@@ -12,7 +12,7 @@ namespace peru {
 class PERU_API CBase64OutStream : public CObject, public IOutStream {
 public:
     explicit CBase64OutStream(const P<IOutStream>& target);
-    ~CBase64OutStream() override; // without finish() or close() the last one or two bytes are lost
+    ~CBase64OutStream() override; // loses the last one or two bytes unless finish() or close() was called
 
     // Writes the last group and ends this stream; the target stays open.
     void finish();
@@ -21,25 +21,25 @@ public:
     P<IURI> getURI() const override;
     bool isAtEnd() override;
     void write(const void* buffer, int64_t size) override;
-    void flush() override; // whole groups; the last one or two bytes wait for what follows them
+    void flush() override; // whole groups only; an incomplete group stays buffered
 
 private:
     void checkOpen() const;
 
     P<IOutStream> m_target;
-    std::array<uint8_t, 3> m_group; // bytes that do not fill a group yet
+    std::array<uint8_t, 3> m_group; // an incomplete group
     size_t m_groupSize = 0;
     bool m_finished = false;
     bool m_closed = false;
 };
 
-// Accepts that form; throws CParseError for any other character and for a lone last one.
+// Decodes that form. Throws CParseError for any other character and for a single trailing character.
 class PERU_API CBase64InStream : public CObject, public IInStream {
 public:
     explicit CBase64InStream(const P<IInStream>& source);
     ~CBase64InStream() override;
 
-    void close() override; // also the source
+    void close() override; // closes the source as well
     P<IURI> getURI() const override;
     bool isAtEnd() override;
     void read(void* buffer, int64_t size) override;

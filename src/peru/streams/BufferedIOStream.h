@@ -7,24 +7,24 @@
 
 namespace peru {
 
-// First in, first out, over pooled blocks. Not locked.
+// A first-in, first-out queue over pooled blocks. Not thread-safe.
 class PERU_API CBufferedIOStream : public CObject, public IIOStream {
 public:
-    // Without a manager the stream makes one of its own.
+    // Creates its own manager when given none.
     explicit CBufferedIOStream(const P<IMemoryManager>& memoryManager);
     ~CBufferedIOStream() override;
 
-    void close() override; // drops what is queued
+    void close() override; // discards what is queued
     P<IURI> getURI() const override;
-    bool isAtEnd() override; // nothing is there now
-    // Throws CEndOfStreamError and takes nothing when less is there; so does skip.
+    bool isAtEnd() override; // the queue is empty now
+    // Throws CEndOfStreamError and consumes nothing when fewer bytes are queued; so does skip.
     void read(void* buffer, int64_t size) override;
-    int64_t readSome(void* buffer, int64_t size) override; // never waits
+    int64_t readSome(void* buffer, int64_t size) override; // never blocks
     void skip(int64_t size) override;
     void write(const void* buffer, int64_t size) override; // copies
     void flush() override;
 
-    // Appends a block without copying it; the caller leaves its bytes alone from then on.
+    // Appends a block without copying it; the caller must not modify its bytes afterwards.
     void append(const P<IMemoryBlock>& block);
     void clear();
     int64_t getAvailable() const { return m_available; }
@@ -32,7 +32,7 @@ public:
 
 private:
     void checkOpen() const;
-    void takeOut(uint8_t* target, int64_t size); // a null target drops the bytes
+    void takeOut(uint8_t* target, int64_t size); // a null target discards the bytes
 
     P<IMemoryManager> m_memoryManager;
     std::deque<P<IMemoryBlock>> m_blocks;

@@ -1,4 +1,4 @@
-// Adapters that add the typed values to any in or out stream.
+// Adapters that add typed values to any input or output stream.
 #pragma once
 
 #include "peru/ISerializable.h"
@@ -93,7 +93,7 @@ private:
     }
 };
 
-// Adds reset and position; adds seeking where the stream has it.
+// TResetable adds reset and position, TSeekable adds seeking.
 template <class Base> class TResetable : public Base {
 public:
     using Base::Base;

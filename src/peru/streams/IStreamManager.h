@@ -5,17 +5,17 @@
 
 namespace peru {
 
-// How an output or input/output stream treats what is already there.
+// How an output or input/output stream treats an existing file.
 enum class EOpenMode {
-    create,    // made anew; an existing file is emptied
+    create,    // created; an existing file is truncated
     createNew, // must not exist
     open,      // must exist
-    append,    // opened or made; writing starts at its end
+    append,    // opened or created; writing starts at its end
 };
 
-// The get forms throw. The try forms answer an empty handle for a URI that the factory does not know, and
-// where there is nothing by that name; what is there and cannot be opened throws from both. Factories derive
-// from CStreamFactory, which needs few of these.
+// The get forms throw. The try forms return an empty handle for a URI that the factory does not support and
+// for a resource that does not exist. A resource that exists but cannot be opened makes both forms throw.
+// Factories derive from CStreamFactory, which leaves only a few of these to implement.
 class PERU_API IStreamFactory : public virtual IBase {
 public:
     virtual P<IInStream> getInStream(const P<IURI>& uri) = 0;
@@ -40,9 +40,10 @@ public:
     virtual P<ISeekableIOStream> tryGetSeekableIOStream(const P<IURI>& uri, EOpenMode mode) = 0;
 };
 
-// Asks its factories in the order of registration; the throwing forms throw CURITypeNotSupportedError when
-// none knows the URI, and CFileNotFoundError for a file that does not exist. Safe from any thread: one mutex
-// is held for the walk, a factory's open included.
+// Asks its factories in order of registration. The get forms throw CURITypeNotSupportedError when no factory
+// supports the URI, and CFileNotFoundError for a file that does not exist. Thread-safe: one recursive mutex
+// is held while the factories are asked, so opens run one at a time. A factory may open other URIs and add or
+// remove factories meanwhile, but must not wait for another thread that uses the manager.
 class PERU_API IStreamManager : public virtual IStreamFactory {
 public:
     virtual void addFactory(const P<IStreamFactory>& factory) = 0;

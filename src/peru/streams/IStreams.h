@@ -1,4 +1,4 @@
-// The lattice of stream capabilities: readable, writable, resetable, seekable.
+// The stream interfaces: readable, writable, resetable, seekable and their combinations.
 #pragma once
 
 #include "peru/P.h"
@@ -21,9 +21,9 @@ class PERU_API IInStream : public virtual IStreamBase {
 public:
     // Reads exactly `size` bytes or throws CEndOfStreamError.
     virtual void read(void* buffer, int64_t size) = 0;
-    // Reads what is there, `size` bytes at most; 0 at the end.
+    // Reads up to `size` bytes and returns how many; 0 means the end of the stream.
     virtual int64_t readSome(void* buffer, int64_t size) = 0;
-    // Passes over `size` bytes or throws CEndOfStreamError.
+    // Skips exactly `size` bytes or throws CEndOfStreamError.
     virtual void skip(int64_t size) = 0;
 };
 
@@ -38,7 +38,7 @@ class PERU_API IIOStream : public virtual IInStream, public virtual IOutStream {
 // A saved position.
 class PERU_API IStreamMarker : public virtual IBase {
 public:
-    virtual void restore() = 0; // takes the stream back to where the marker was made
+    virtual void restore() = 0; // seeks back to the position at which the marker was created
 };
 
 class PERU_API IResetableStream : public virtual IStreamBase {
@@ -63,13 +63,13 @@ public:
 class PERU_API ISeekableInStream : public virtual ISeekableStream, public virtual IResetableInStream {};
 class PERU_API ISeekableOutStream : public virtual ISeekableStream, public virtual IResetableOutStream {
 public:
-    virtual void setSize(int64_t size) = 0; // cuts or extends with zeros
+    virtual void setSize(int64_t size) = 0; // truncates, or extends with zeros
 };
 class PERU_API ISeekableIOStream : public virtual ISeekableInStream,
                                    public virtual ISeekableOutStream,
                                    public virtual IResetableIOStream {};
 
-// An out stream that encrypts; no operations of its own.
+// An encrypting output stream; adds no operations.
 class PERU_API ICryptedOutStream : public virtual IOutStream {};
 
 } // namespace peru

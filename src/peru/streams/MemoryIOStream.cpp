@@ -90,7 +90,7 @@ void CMemoryIOStream::setSize(int64_t size) {
     checkOpen();
     checkStreamSize(size, "CMemoryIOStream::setSize");
     const int64_t before = m_block->getSize();
-    // Asked for here, so that every kind of block grows by doubling.
+    // Doubled here so that the growth does not depend on the kind of block.
     const int64_t capacity = m_block->getCapacity();
     if (size > capacity && size <= std::numeric_limits<int64_t>::max() / 2)
         m_block->setSize(std::max(size, capacity * 2));

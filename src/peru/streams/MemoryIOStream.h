@@ -6,7 +6,7 @@
 
 namespace peru {
 
-// Reads and writes the block itself, from its start; the block grows by doubling.
+// Reads and writes the block in place, starting at its first byte; the block's capacity grows by doubling.
 class PERU_API CMemoryIOStream : public CObject, public ISeekableIOStream {
 public:
     class CMarker : public CPositionMarker {
@@ -14,11 +14,11 @@ public:
         using CPositionMarker::CPositionMarker;
     };
 
-    // Without a block the stream makes one of its own.
+    // Creates its own block when given none.
     explicit CMemoryIOStream(const P<IMemoryBlock>& block = nullptr, const P<IURI>& uri = nullptr);
     ~CMemoryIOStream() override;
 
-    const P<IMemoryBlock>& getBlock() const { return m_block; } // also of a closed stream
+    const P<IMemoryBlock>& getBlock() const { return m_block; } // valid after close, too
 
     void close() override;
     P<IURI> getURI() const override;
@@ -30,7 +30,7 @@ public:
     void flush() override;
     void reset() override;
     int64_t getPosition() const override;
-    void seek(int64_t position) override; // may lie behind the end: a write there fills the gap with zeros
+    void seek(int64_t position) override; // may be past the end; a write there fills the gap with zeros
     int64_t getSize() const override;
     void setSize(int64_t size) override;
     P<IStreamMarker> createMarker() override;

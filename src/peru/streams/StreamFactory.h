@@ -1,4 +1,4 @@
-// The base of stream factories.
+// Base class of stream factories.
 #pragma once
 
 #include "peru/Object.h"
@@ -7,14 +7,14 @@
 
 namespace peru {
 
-// A factory overrides the try forms of the most able streams that it has: each try form asks the more able
-// ones below it, and the throwing forms ask the try forms.
+// A factory overrides the try forms for its most capable streams: every other try form falls back to the next
+// more capable one, and the get forms call the try forms.
 class PERU_API CStreamFactory : public CObject, public virtual IStreamFactory {
 public:
     ~CStreamFactory() override;
 
-    // Throws what the factory has to say about a URI for which its try forms answered nothing, such as
-    // CFileNotFoundError; returns when it does not know such URIs at all.
+    // Called when the try forms returned nothing for the URI: throws the reason, such as CFileNotFoundError,
+    // or returns if the factory does not support this kind of URI.
     virtual void reportMissing(const P<IURI>& uri) const;
 
     P<IInStream> getInStream(const P<IURI>& uri) override;

@@ -38,7 +38,7 @@ template <class S, class... A> P<S>
 CStreamManager::askEach(P<S> (IStreamFactory::*open)(const P<IURI>&, A...), const P<IURI>& uri, A... mode) {
     if (!uri) throw CInvalidArgError("uri", "IStreamManager");
     CMutexLock lock(m_mutex);
-    // By index and with a handle of its own: a factory that is asked may enter or remove factories.
+    // By index and holding a reference: a factory may add or remove factories while it is asked.
     for (size_t i = 0; i < m_factories.getCount(); ++i) {
         const P<IStreamFactory> factory = m_factories[i];
         if (P<S> stream = (factory.get()->*open)(uri, mode...)) return stream;

@@ -7,7 +7,7 @@
 
 namespace peru {
 
-// Made with the disk factory in it.
+// Contains the disk factory from the start.
 class PERU_API CStreamManager : public CStreamFactory, public IStreamManager {
 public:
     CStreamManager();
@@ -31,7 +31,7 @@ private:
     template <class S, class... A>
     P<S> askEach(P<S> (IStreamFactory::*open)(const P<IURI>&, A...), const P<IURI>& uri, A... mode);
 
-    P<IMutex> m_mutex; // guards the array, and is held while the factories are asked
+    P<IMutex> m_mutex; // guards the array and is held while the factories are asked
     TCleaningSimpleArray<P<IStreamFactory>> m_factories;
 };
 

@@ -1,4 +1,4 @@
-// What streams have in common, for those who write and those who use them.
+// Helpers for implementing and using streams.
 #pragma once
 
 #include "peru/Object.h"
@@ -12,14 +12,14 @@ namespace peru {
 PERU_API void checkStreamSize(int64_t size, const char* method);
 // Reads exactly `size` bytes through readSome or throws CEndOfStreamError.
 PERU_API void readFully(IInStream& stream, void* buffer, int64_t size);
-// Passes over `size` bytes by reading them, or throws CEndOfStreamError.
+// Skips `size` bytes by reading them, or throws CEndOfStreamError.
 PERU_API void skipByReading(IInStream& stream, int64_t size);
-// Copies what is left in the source. Answers the count of bytes.
+// Copies the rest of the source. Returns the number of bytes copied.
 PERU_API int64_t copyStream(IInStream& source, IOutStream& target);
-// What is left in the stream.
+// Reads the rest of the stream.
 PERU_API std::string readAll(IInStream& stream);
 
-// The marker of every seekable stream: it holds the stream and a position.
+// A marker for any seekable stream; holds a reference to the stream and a position.
 class PERU_API CPositionMarker : public CObject, public IStreamMarker {
 public:
     explicit CPositionMarker(const P<ISeekableStream>& stream);

@@ -6,7 +6,7 @@
 
 namespace peru {
 
-// Reads the bytes of a string as it is encoded.
+// Reads the bytes of a string in the string's own encoding.
 class PERU_API CStringInStream : public CObject, public ISeekableInStream {
 public:
     explicit CStringInStream(const P<IString>& text);
@@ -32,23 +32,23 @@ private:
     bool m_closed = false;
 };
 
-// Gathers bytes and hands out a string at the end.
+// Collects bytes and returns them as a string.
 class PERU_API CStringOutStream : public CObject, public IResetableOutStream {
 public:
-    CStringOutStream(); // of UTF-8 bytes
+    CStringOutStream(); // UTF-8
     explicit CStringOutStream(const P<ICharEncoding>& encoding);
     ~CStringOutStream() override;
 
-    // What was written so far, as text in the encoding; also of a closed stream. Throws CStreamError for
-    // 2 GiB and more, which no string holds.
+    // The bytes written so far as text in the encoding; also works on a closed stream. Throws CStreamError
+    // for 2 GiB or more, the limit of a string.
     P<IString> getString() const;
 
     void close() override;
     P<IURI> getURI() const override;
-    bool isAtEnd() override; // always: there is nothing behind the position
+    bool isAtEnd() override; // always true: the position is always the end
     void write(const void* buffer, int64_t size) override;
     void flush() override;
-    void reset() override; // drops what was written
+    void reset() override; // discards what was written
     int64_t getPosition() const override;
 
 private:

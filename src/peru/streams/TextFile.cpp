@@ -20,7 +20,7 @@ struct SMark {
     std::string_view bytes;
 };
 
-// The longer mark first where one begins with another.
+// Where one mark is a prefix of another, the longer one comes first.
 constexpr SMark kMarks[] = {
     {ETextMark::utf8, "\xEF\xBB\xBF"sv},      {ETextMark::utf32BigEndian, "\x00\x00\xFE\xFF"sv},
     {ETextMark::utf32, "\xFF\xFE\x00\x00"sv}, {ETextMark::utf16BigEndian, "\xFE\xFF"sv},
@@ -71,7 +71,7 @@ CTextFileReader::CTextFileReader(const P<ISeekableInStream>& stream) {
                            stream->getURI());
     int32_t size = static_cast<int32_t>(bytes.size());
     if (encoding) {
-        // A last character that is cut off is dropped.
+        // An incomplete last character is ignored.
         if (m_mark == ETextMark::utf16) size -= size % 2;
         if (m_mark == ETextMark::utf32) size -= size % 4;
         m_text = make<CString>(encoding, bytes.data(), size);
@@ -97,7 +97,7 @@ CTextFileWriter::CTextFileWriter(const P<IURI>& uri, ETextMark mark, bool flushE
 
 CTextFileWriter::CTextFileWriter(const P<IOutStream>& stream, ETextMark mark, bool flushEachWrite)
     : m_stream(stream), m_mark(mark), m_flushEachWrite(flushEachWrite) {
-    // Text that is appended to a file follows its mark.
+    // A file that is appended to already has its mark.
     if (const P<IResetableStream> positioned = tryCast<IResetableStream>(stream))
         m_markWritten = positioned->getPosition() > 0;
 }

@@ -12,9 +12,9 @@ enum class ETextMark { none = 0, utf8 = 1, utf16BigEndian = 2, utf16 = 3, utf32B
 class PERU_API ITextFileReader : public virtual IBase {
 public:
     virtual ETextMark getMark() const = 0;
-    virtual P<IString> getText() const = 0; // the whole content without its mark
+    virtual P<IString> getText() const = 0; // the whole content without the mark
     virtual bool hasMoreLines() const = 0;
-    virtual P<IString> readLine() = 0; // throws CException past the last line
+    virtual P<IString> readLine() = 0; // throws CException after the last line
 };
 
 class PERU_API ITextFileWriter : public virtual IBase {
@@ -24,8 +24,8 @@ public:
     virtual void close() = 0;
 };
 
-// Reads the whole file at once. Without a mark it is text in the system's code page. Throws CException with
-// "Big Endian not supported!" for the big-endian marks.
+// Reads the whole file on construction. A file without a mark is text in the system's code page. Throws
+// CException with "Big Endian not supported!" for the big-endian marks.
 class PERU_API CTextFileReader : public CObject, public ITextFileReader {
 public:
     explicit CTextFileReader(const P<IURI>& uri); // through the stream manager
@@ -43,9 +43,8 @@ private:
     P<IEnum> m_lines;
 };
 
-// Writes UTF-8, without or with its mark, or little-endian UTF-16 with its mark; write() throws CException
-// for the other marks. The mark goes out with the first text, so that a file that nothing is written to is
-// empty.
+// Writes UTF-8 with or without a mark, or little-endian UTF-16 with a mark; write() throws CException for the
+// other marks. The mark is written together with the first text, so a file without text stays empty.
 class PERU_API CTextFileWriter : public CObject, public ITextFileWriter {
 public:
     CTextFileWriter(const P<IURI>& uri, ETextMark mark, bool flushEachWrite,
@@ -55,7 +54,7 @@ public:
 
     void write(const CStringArg& text) override;
     void flush() override;
-    void close() override; // reports what could not be written
+    void close() override; // throws if buffered text cannot be written
 
 private:
     P<IOutStream> m_stream;

@@ -1,4 +1,4 @@
-// Between URIs and platform paths.
+// Conversion between URIs and platform paths.
 #pragma once
 
 #include "peru/uri/IURI.h"
@@ -7,10 +7,10 @@ namespace peru {
 
 class PERU_API IPathes : public virtual IBase {
 public:
-    // The bytes of the path as a UTF-8 string, terminated; they need not be valid UTF-8. Only "file" and
-    // relative URIs have one: others, and a file on another host, give an empty string.
+    // The bytes of the path as a terminated UTF-8 string; they need not be valid UTF-8. Empty unless the URI
+    // is relative or a "file" URI of this host.
     virtual P<IString> toPlatformPath(const P<IURI>& uri, bool forDisplay = false) = 0;
-    // A relative path gives a relative URI.
+    // Returns a relative URI for a relative path.
     virtual P<IURI> fromPlatformPath(const CStringArg& path) = 0;
     virtual P<IString> join(const CStringArg& folder, const CStringArg& fileName) = 0;
     // Folder (with its trailing separator) and file name.
@@ -22,7 +22,7 @@ public:
 
 PERU_API P<IPathes> getPathes();
 
-// What a message shows for a URI: its path for display, or its text where it has none.
+// The text that messages show for a URI: its path for display, or the URI itself if it has no path.
 PERU_API P<IString> getShownName(const P<IURI>& uri);
 
 } // namespace peru

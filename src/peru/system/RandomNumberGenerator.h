@@ -9,14 +9,14 @@
 
 namespace peru {
 
-// Numbers for names and shuffles; not for secrets. Safe from any thread.
+// For unique names and shuffling; not for secrets. Thread-safe.
 class PERU_API CMersenneTwisterRandomNumberGenerator : public CObject {
 public:
     explicit CMersenneTwisterRandomNumberGenerator(uint32_t seed);
     ~CMersenneTwisterRandomNumberGenerator() override;
 
     uint32_t getNext();
-    // From 0 to `bound` - 1, each as likely as the others. Throws CInvalidArgError for 0.
+    // Uniformly distributed from 0 to `bound` - 1. Throws CInvalidArgError for 0.
     uint32_t getNextBelow(uint32_t bound);
 
 private:
@@ -24,7 +24,7 @@ private:
     std::mt19937 m_generator;
 };
 
-// The process's own, seeded by the system.
+// The process-wide generator, seeded by the system.
 PERU_API P<CMersenneTwisterRandomNumberGenerator> getRandomNumberGenerator();
 
 } // namespace peru

@@ -5,7 +5,7 @@
 
 namespace peru {
 
-// Re-entrant: a thread that locks twice must unlock twice.
+// Recursive: a thread that locks twice must unlock twice.
 class PERU_API IMutex : public virtual IBase {
 public:
     virtual void lock() = 0;
@@ -16,7 +16,7 @@ public:
 class PERU_API IMutexFactory : public virtual IBase {
 public:
     virtual P<IMutex> createMutex() = 0;
-    // Shared by every process of the user that names it so. Throws CException.
+    // Shared by all processes of the user that use the same name. Throws CException.
     virtual P<IMutex> createGlobalMutex(const P<IString>& name) = 0;
 };
 

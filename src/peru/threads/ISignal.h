@@ -12,7 +12,7 @@ class PERU_API ISignal : public virtual IBase {
 public:
     virtual void set() = 0;
     virtual void reset() = 0;
-    // True when the signal is set or was set in time; a time-out is no error. Does not reset it.
+    // True if the signal is set or becomes set in time, false on a time-out. Does not reset it.
     virtual bool wait(uint32_t milliseconds) = 0;
     virtual void wait() = 0;
 };

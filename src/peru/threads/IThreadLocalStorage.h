@@ -1,11 +1,11 @@
-// Values that each thread has for itself.
+// Values that each thread has its own copy of.
 #pragma once
 
 #include "peru/P.h"
 
 namespace peru {
 
-// A bare word for each thread, null until it is set. Nobody looks after what it points to.
+// One pointer per thread, null until it is set. The pointed-to object is not owned.
 class PERU_API ISimpleThreadLocalStorage : public virtual IBase {
 public:
     virtual void* get() const = 0;
@@ -14,11 +14,12 @@ public:
 
 class PERU_API ISimpleThreadLocalStorageFactory : public virtual IBase {
 public:
-    virtual P<ISimpleThreadLocalStorage> createStorage() = 0; // throws CError when the system has no more
+    virtual P<ISimpleThreadLocalStorage>
+    createStorage() = 0; // throws CError when the system's slots are exhausted
 };
 
-// A counted object for each thread. It is released when its thread ends, whoever made that thread, and when
-// the slot dies.
+// One counted object per thread. It is released when the thread ends, even if this library did not create the
+// thread, and when the slot is destroyed.
 class PERU_API IThreadLocalStorage : public virtual IBase {
 public:
     virtual P<IBase> get() const = 0; // empty until it is set

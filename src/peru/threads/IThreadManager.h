@@ -15,27 +15,28 @@ public:
 
 class PERU_API IThread : public virtual IBase {
 public:
-    // Returns when the body has returned.
+    // Returns once the body has returned.
     virtual void wait() = 0;
-    // Seven steps from 0 (idle) over 3 (normal) to 6 (time critical). Throws CError.
+    // Seven steps from 0 (idle) through 3 (normal) to 6 (time critical). Throws CError.
     virtual void setPriority(int step) = 0;
 };
 
-// What a thread runs. The body catches its own exceptions; one that leaves it is logged and ends the thread.
+// What a thread runs. The body handles its own exceptions; one that escapes is logged and ends the thread.
 struct SThreadBody {
-    PFrail<IBase> owner; // counted or not, as the owner's life demands
+    PFrail<IBase> owner; // holds a reference or not, as the owner's lifetime requires
     void (*function)(IBase* owner, void* argument) = nullptr;
     void* argument = nullptr;
 };
 
 class PERU_API IThreadManager : public virtual IBase {
 public:
-    virtual P<IThread> createThread(const SThreadBody& body) = 0;  // throws CError
-    virtual P<IThread> createThread(const P<IAction>& action) = 0; // holds the action while it runs
+    virtual P<IThread> createThread(const SThreadBody& body) = 0; // throws CError
+    virtual P<IThread>
+    createThread(const P<IAction>& action) = 0; // holds a reference to the action while it runs
     virtual void sleep(uint32_t milliseconds) = 0;
-    // Gives the processor away, for a millisecond when `longer` is set.
+    // Yields the processor; sleeps for a millisecond if `longer` is set.
     virtual void yield(bool longer) = 0;
-    // The running thread; a thread that this manager did not make gets an object of its own.
+    // The calling thread; a thread that this manager did not create gets an object on its first call.
     virtual P<IThread> getCurrentThread() = 0;
 };
 

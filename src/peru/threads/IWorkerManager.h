@@ -1,4 +1,4 @@
-// Cooperative work on a thread that somebody else owns.
+// Cooperative work on a thread owned by someone else.
 #pragma once
 
 #include "peru/P.h"
@@ -19,19 +19,19 @@ public:
 
 class PERU_API IWorkLoopListener : public virtual IBase {
 public:
-    // A worker came or went.
+    // A worker was added or removed.
     virtual void workersChanged(IWorkerManager* manager) = 0;
 };
 
-// Neither workers nor listeners are held: they leave before they die. Adding, removing and working happen
-// on one thread; there is no lock.
+// Holds no references to workers and listeners: they must be removed before they are destroyed. Not
+// thread-safe: add, remove and work are all called on one thread.
 class PERU_API IWorkerManager : public virtual IBase {
 public:
     virtual void addWorker(IWorker* worker) = 0;
-    virtual bool removeWorker(IWorker* worker) = 0; // false when it was not there
+    virtual bool removeWorker(IWorker* worker) = 0; // false if it was not registered
     virtual void addListener(IWorkLoopListener* listener) = 0;
     virtual bool removeListener(IWorkLoopListener* listener) = 0;
-    // Runs one slice of every worker. Called now and then by the loop that owns the thread.
+    // Runs one slice of every worker. Called regularly by the loop that owns the thread.
     virtual void work() = 0;
 };
 

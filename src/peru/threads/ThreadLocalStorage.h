@@ -1,4 +1,4 @@
-// One slot for counted objects.
+// A slot for one counted object per thread.
 #pragma once
 
 #include "peru/Object.h"

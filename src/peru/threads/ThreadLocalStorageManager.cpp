@@ -17,8 +17,8 @@ struct SThreadTable {
     SThreadTable* next = nullptr;
 };
 
-// These outlive the manager, since threads end when they like: nothing here is ever destroyed, and the
-// table of a thread lies in that thread's own storage.
+// These outlive the manager, since threads may end after it: nothing here is ever destroyed, and each
+// thread's table is in that thread's own storage.
 std::mutex g_mutex; // guards the list and the contents of all tables
 SThreadTable* g_first = nullptr;
 std::atomic<uint64_t> g_lastSlot{0};
@@ -37,7 +37,7 @@ void unlink(SThreadTable& table) {
 }
 
 void clear(SThreadTable& table) {
-    // A destructor may set slots again, but not for ever.
+    // Destructors may set slots again; the rounds are limited so that this ends.
     for (int round = 0; round < 4; ++round) {
         std::unordered_map<uint64_t, P<IBase>> dying;
         std::lock_guard lock(g_mutex);
@@ -46,7 +46,7 @@ void clear(SThreadTable& table) {
     }
 }
 
-// Tells a thread that has no storage any more, which the main thread's last destructors may meet.
+// The thread's storage has been destroyed; the main thread's last destructors can still get here.
 thread_local bool t_over = false;
 
 struct SCurrentTable {

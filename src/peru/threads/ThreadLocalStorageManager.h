@@ -7,19 +7,19 @@
 
 namespace peru {
 
-// Keeps a table from slot to object for each thread that ever set one. Safe from any thread. Values are
-// released outside of every lock, so that their destructors may use slots.
+// Holds a table from slot to object for each thread that has set one. Thread-safe. Values are released with
+// no lock held, so their destructors may use slots.
 class PERU_API CThreadLocalStorageManager : public CObject {
 public:
     CThreadLocalStorageManager();
-    ~CThreadLocalStorageManager() override; // releases what all threads hold
+    ~CThreadLocalStorageManager() override; // releases the values of all threads
 
-    uint64_t createSlot(); // a number that is never given twice
+    uint64_t createSlot(); // a number that is never reused
     void removeSlot(uint64_t slot);
     P<IBase> get(uint64_t slot) const;
     void set(uint64_t slot, const P<IBase>& value);
 
-    // The calling thread's values go at once; thread ends that are not ours do the same by themselves.
+    // Releases the calling thread's values now. Threads that this library did not create do so when they end.
     static void clearCurrentThread() noexcept;
 };
 

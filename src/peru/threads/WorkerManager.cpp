@@ -10,7 +10,7 @@ CWorkerManager::CWorkerManager()
 CWorkerManager::~CWorkerManager() {
     while (size_t count = m_workers->getCount()) {
         IWorker* worker = m_workers->at(count - 1);
-        m_workers->remove(worker); // first, so that it may try to leave once more
+        m_workers->remove(worker); // first, since detached() may call removeWorker()
         worker->detached(this);
     }
 }

@@ -7,8 +7,8 @@
 
 namespace peru {
 
-// Walks from the last to the first by index, so that a worker or listener may leave during its own call.
-// A worker that is still present at the end is told that it is detached.
+// Iterates by index from last to first, so a worker or listener may remove itself during its own call.
+// Workers that are still registered when the manager is destroyed get a detached() call.
 class PERU_API CWorkerManager : public CObject, public IWorkerManager {
 public:
     CWorkerManager();
@@ -20,7 +20,7 @@ public:
     bool removeListener(IWorkLoopListener* listener) override;
     void work() override;
 
-    // When the slice that runs, or the last one, began: milliseconds since 1970 UTC.
+    // Start of the current or most recent slice, in milliseconds since 1970 UTC.
     int64_t getSliceTime() const { return m_sliceTime; }
 
 private:

@@ -1,4 +1,4 @@
-// Crashes in the way that its first argument tells; report and dump go to the folder of the second.
+// Crashes in the way given by the first argument; the second is the folder for report and dump.
 #include <tonewright/tonewright.h>
 
 #include <csignal>
@@ -22,7 +22,7 @@ int recurse(int depth) {
 
 int main(int argc, char** argv) {
     if (argc != 3) return 2;
-    volatile uintptr_t address = 16; // nothing lies there, and the compiler does not know
+    volatile uintptr_t address = 16; // not mapped, and opaque to the compiler
     const std::string kind = argv[1], folder = argv[2];
     const std::string report = folder + "/report.txt", dump = folder + "/dump";
     const auto wide = [](const std::string& text) { return std::u16string(text.begin(), text.end()); };

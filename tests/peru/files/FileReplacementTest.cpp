@@ -23,7 +23,7 @@ std::string getAttribute(const fs::path& file, const char* name) {
     return size < 0 ? "none" : std::string(value, static_cast<size_t>(size));
 }
 
-// The usual rights, and one user more who may read.
+// The usual permissions plus read permission for one more user.
 void setAccessList(const fs::path& file, const char* name, uint32_t user) {
     struct SEntry {
         uint16_t tag, rights;
@@ -38,7 +38,7 @@ void setAccessList(const fs::path& file, const char* name, uint32_t user) {
     ASSERT_EQ(::setxattr(file.c_str(), name, value.data(), value.size(), 0), 0);
 }
 
-// Text that tells where it stands.
+// Text in which every position is recognisable.
 std::string makeText(size_t size) {
     std::string text;
     while (text.size() < size) text += std::to_string(text.size()) + " ";
@@ -82,7 +82,7 @@ TEST(FileReplacement, MixesOldAndNewBytes) {
     replacement->copyFromOld(0, 0);
     replacement->copyFromOld(299990, 10);
     char start[8];
-    stream->seek(0); // read ahead, then overwritten by a range
+    stream->seek(0); // buffered by a read, then overwritten by a range
     stream->read(start, 8);
     EXPECT_EQ(std::string(start, 8), "head" + old.substr(10, 4));
     stream->seek(2);
@@ -110,7 +110,7 @@ TEST(FileReplacement, TakesOverWhatSurroundsTheBytes) {
     fs::create_hard_link(file, folder / "second name");
     ASSERT_EQ(::setxattr(file.c_str(), "user.note", "kept", 4, 0), 0);
     setAccessList(file, "system.posix_acl_access", 1234);
-    // The folder would give its own list to new files.
+    // New files inherit this list from the folder.
     setAccessList(folder.path(), "system.posix_acl_default", 4321);
     const fs::path plain = folder.write("plain", "old");
     ASSERT_EQ(::removexattr(plain.c_str(), "system.posix_acl_access"), 0);
@@ -138,7 +138,7 @@ TEST(FileReplacement, TakesOverWhatSurroundsTheBytes) {
     }
 }
 
-// Rights are asked as an ordinary user, also where the tests run as the superuser.
+// Permissions are checked as an ordinary user, even if the tests run as root.
 TEST(FileReplacement, RefusesWhatTheUserMayNotWrite) {
     const CTempFolder folder;
     const fs::path locked = folder.write("locked", "precious");
@@ -171,7 +171,7 @@ TEST(FileReplacement, RefusesWhatTheUserMayNotWrite) {
 TEST(FileReplacement, LeavesNothingWithoutCommit) {
     const CTempFolder folder;
     const fs::path file = folder.write("file", "old");
-    // Twice: given up in order, and by a process that dies with half of it written.
+    // Once abandoned regularly, once by a process that is killed half way.
     getSystem()->startReplacement(toURI(file))->getStream()->write("new", 3);
     const pid_t child = ::fork();
     if (child == 0) {

@@ -25,7 +25,7 @@ P<IFileSystemManager> manager() {
     return getFileSystemManager();
 }
 
-// Every path below the folder with what it is: contents, link target or mode of a folder.
+// Every path below the folder with its type, times and content.
 using CTree = std::map<std::string, std::string>;
 CTree readTree(const fs::path& folder) {
     CTree tree;
@@ -43,7 +43,7 @@ CTree readTree(const fs::path& folder) {
     return tree;
 }
 
-// Folders three deep, names that are no UTF-8, links to a file, a folder, nowhere and upwards.
+// Three levels of folders, names that are not UTF-8, links to a file, to nothing and upwards.
 void makeTree(const fs::path& folder) {
     fs::create_directories(folder / "one/two/three");
     fs::create_directory(folder / "empty");
@@ -61,7 +61,7 @@ void makeTree(const fs::path& folder) {
         utimensat(AT_FDCWD, (folder / name).c_str(), times, 0);
 }
 
-// A folder on another volume than the temporary one; empty when this machine has none.
+// A folder on a different volume than the temporary folder; empty if this machine has none.
 class COtherVolume {
 public:
     explicit COtherVolume(const fs::path& here) {
@@ -259,7 +259,7 @@ TEST(FileSystemManager, LosesNothingWhenAMoveBetweenVolumesFails) {
     COtherVolume other(folder.path());
     if (other.path.empty()) GTEST_SKIP() << "no second volume here";
     makeTree(folder / "source");
-    // Nobody can copy a pipe, not even the superuser.
+    // Nobody can copy a FIFO, not even root.
     ASSERT_EQ(mkfifo((folder / "source/one/two/pipe").c_str(), 0600), 0);
     CTree before = readTree(folder / "source");
     try {
@@ -276,7 +276,7 @@ TEST(FileSystemManager, LosesNothingWhenAMoveBetweenVolumesFails) {
 
 namespace {
 
-// One that reaches the disks under a scheme of its own: "mirror:///x" is the folder's "x".
+// Maps its own scheme to a folder: "mirror:///x" is the folder's "x".
 class CMirror : public CReadOnlyFileSystem {
 public:
     explicit CMirror(fs::path folder) : m_folder(std::move(folder)) {}
@@ -304,14 +304,14 @@ TEST(FileSystemManager, ServesWhatIsMounted) {
     manager()->mount(mirror);
     EXPECT_TRUE(manager()->isFolder(disc));
     EXPECT_THROW(manager()->deleteFolder(disc), CReadOnlyError);
-    // From one file system to another, by way of streams.
+    // Between two file systems, through streams.
     manager()->copy(disc, toURI(folder / "copy"));
     EXPECT_EQ(tests::readFile(folder / "copy/50% #?.wav"), "beta");
     EXPECT_EQ(tests::readFile(folder / "copy/two/\xff\xe4 x\ny").size(), 300000u);
     EXPECT_EQ(tests::readFile(folder / "copy/link"), "alpha");
     EXPECT_EQ(fs::last_write_time(folder / "copy/two"), fs::last_write_time(folder / "disc/one/two"));
     EXPECT_THROW(manager()->copy(toURI(folder / "copy"), make<CURI>("mirror:///new")), CReadOnlyError);
-    // What cannot be deleted is not moved: its copy goes again.
+    // A source that cannot be deleted is not moved: the copy is removed again.
     EXPECT_THROW(manager()->move(make<CURI>("mirror:///a.txt"), toURI(folder / "moved")), CException);
     EXPECT_FALSE(fs::exists(folder / "moved"));
     manager()->unmount(mirror);
@@ -321,7 +321,7 @@ TEST(FileSystemManager, ServesWhatIsMounted) {
     manager()->unmount(mirror);
 }
 
-// In a process of its own: GIO remembers the user's folders from its first look.
+// In a separate process: GIO caches the user's folders.
 TEST(FileSystemManagerDeathTest, UndoableDeleteFillsTheWasteBin) {
     testing::FLAGS_gtest_death_test_style = "threadsafe";
     auto deleteAndLook = [] {

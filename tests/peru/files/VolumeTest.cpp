@@ -32,7 +32,7 @@ public:
     void volumeArrived(const P<IFileSystemVolume>& volume) override { note("+", volume); }
     void volumeLeft(const P<IFileSystemVolume>& volume) override { note("-", volume); }
 
-    posix::CVolumeManager* leave = nullptr; // removes itself in its next call
+    posix::CVolumeManager* leave = nullptr; // removes itself during its next call
     std::vector<std::string> log;
 
 private:
@@ -117,7 +117,7 @@ TEST(VolumeManager, TellsWhatLeftAndArrived) {
     folder.write("table", "");
     manager->update();
     EXPECT_EQ(stays->log.size(), 3u);
-    // Begins anew with what is there then.
+    // Starts again from the current state.
     manager->addListener(leaves.get());
     folder.write("table", line("99:1", "b"));
     manager->update();
@@ -127,7 +127,7 @@ TEST(VolumeManager, TellsWhatLeftAndArrived) {
 
 TEST(VolumeManager, WatchesOnlyWhileSomebodyListens) {
     const auto countThreads = [] { return tests::countEntries("/proc/self/task"); };
-    // The kernel lists a thread for a moment longer than its end can be waited for.
+    // The kernel lists a thread for a moment after it has been joined.
     auto comesDownTo = [&](auto count) {
         auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
         while (countThreads() != count && std::chrono::steady_clock::now() < deadline)
@@ -137,7 +137,7 @@ TEST(VolumeManager, WatchesOnlyWhileSomebodyListens) {
     P<posix::CVolumeManager> manager = make<posix::CVolumeManager>();
     P<CTestListener> first = make<CTestListener>();
     P<CTestListener> second = make<CTestListener>();
-    std::thread([] {}).join(); // a sanitizer has a thread of its own from the first one on
+    std::thread([] {}).join(); // a sanitizer starts its own thread along with the first one
     auto before = countThreads();
     for (int i = 0; i < 50; ++i) {
         manager->addListener(first.get());

@@ -49,7 +49,7 @@ TEST(PackageManager, BringsUpWhatIsRequiredFirstAndOnce) {
     manager->registerPackage(make<CTestPackage>("top", log, std::vector{"left", "right"}));
     manager->registerPackage(make<CTestPackage>("left", log, std::vector{"base"}));
     manager->registerPackage(make<CTestPackage>("right", log, std::vector{"base"}));
-    manager->registerPackage(make<CTestPackage>("base", log, std::vector{"top"})); // a cycle ends there
+    manager->registerPackage(make<CTestPackage>("base", log, std::vector{"top"})); // the cycle ends here
     manager->registerPackage(make<CTestPackage>("base", log));
     EXPECT_TRUE(manager->activateByName("top"));
     EXPECT_TRUE(manager->activateByName("top"));

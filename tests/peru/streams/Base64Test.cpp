@@ -29,7 +29,7 @@ std::string decode(const std::string& text, size_t cut) {
     return bytes;
 }
 
-// The judge is the system's base64 program, padding and line breaks apart.
+// Compares with the system's base64 program, apart from padding and line breaks.
 TEST(Base64, AgreesWithThePeerInEveryCut) {
     const tests::CTempFolder folder;
     std::mt19937 random(5);

@@ -67,10 +67,10 @@ TEST(DataStream, ReadsWhatItWrote) {
     out->writeDouble(0.1);
     out->writeFloat(-0.5f);
     out->writeUInt8(255);
-    out->writeString(CString::fromUTF8("\xF0\x9F\x8E\xB5 \xFF")); // the bytes count, decodable or not
+    out->writeString(CString::fromUTF8("\xF0\x9F\x8E\xB5 \xFF")); // the bytes are kept, valid or not
     out->writeObject(make<CPoint>(int16_t{-7}));
     out->writeURI(make<CURI>("file:///x"));
-    const P<CMemoryBlock> block = make<CMemoryBlock>(200000); // more than is read at once
+    const P<CMemoryBlock> block = make<CMemoryBlock>(200000); // larger than one read step
     for (int i = 0; i < 200000; ++i) block->getData()[i] = static_cast<uint8_t>(i * 7);
     out->writeObject(block);
     EXPECT_EQ(out->getPosition(), memory->getSize());

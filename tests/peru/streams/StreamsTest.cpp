@@ -26,7 +26,7 @@ void write(IOutStream& stream, const std::string& bytes) {
     stream.write(bytes.data(), static_cast<int64_t>(bytes.size()));
 }
 
-// Random reads, writes, seeks and cuts on a stream and on a plain byte array must agree throughout.
+// Random reads, writes, seeks and truncations of a stream must match those of a plain byte array.
 void compareWithModel(const P<ISeekableIOStream>& stream, int64_t largest, unsigned seed) {
     std::mt19937 random(seed);
     std::string model;
@@ -158,7 +158,7 @@ TEST(DiskStream, WhatCannotBeOpenedSaysWhy) {
         EXPECT_NE(error.find("Is a directory"), std::string::npos) << error;
         EXPECT_NE(error.find(folder.path().filename().string()), std::string::npos) << error;
     }
-    // Refused to everybody, the superuser included.
+    // Refused even for root.
     if (::access("/proc/version", F_OK) == 0) {
         const std::string large(70000, 'x');
         EXPECT_THROW(write(*make<CDiskOutStream>(make<CURI>("file:///proc/version"), EOpenMode::open), large),
@@ -184,9 +184,9 @@ TEST(DiskStream, FullDiskIsReported) {
     const std::string error = errorOf<CStreamError>([&] { closed->close(); });
     EXPECT_NE(error.find("No space left on device"), std::string::npos) << error;
     EXPECT_NE(error.find("file:///dev/full"), std::string::npos) << error;
-    closed->close(); // it is closed all the same
+    closed->close(); // it is closed nevertheless
 
-    write(*make<CDiskOutStream>(full, EOpenMode::open), "x"); // destroyed without a word
+    write(*make<CDiskOutStream>(full, EOpenMode::open), "x"); // the destructor ignores the error
 }
 
 TEST(DiskStream, PositionsGoBeyond32Bits) {
@@ -219,7 +219,7 @@ TEST(DiskStream, ReadsPipes) {
     writer.join();
 }
 
-// Knows one URI, for which it answers its own name.
+// Supports one URI and returns its own name as content.
 class CNamedFactory : public CStreamFactory {
 public:
     CNamedFactory(const char* uri, const char* name) : m_uri(uri), m_name(name) {}
@@ -242,10 +242,10 @@ TEST(StreamManager, AsksInTheOrderOfRegistration) {
     EXPECT_EQ(readAll(*manager->getInStream(uri)), "first");
     manager->removeFactory(first);
     EXPECT_EQ(readAll(*manager->getInStream(uri)), "later");
-    EXPECT_FALSE(manager->tryGetSeekableInStream(uri)); // known, but not in this kind
+    EXPECT_FALSE(manager->tryGetSeekableInStream(uri)); // supported, but not as a seekable stream
 }
 
-// Opens nothing itself, but brings the factories that do, and leaves.
+// Opens nothing itself, but removes itself and adds other factories.
 class CBringingFactory : public CStreamFactory {
 public:
     explicit CBringingFactory(IStreamManager& manager) : m_manager(manager) {}

@@ -30,7 +30,7 @@ TEST(TextFileReader, KnowsTheMarks) {
              {"\xEF\xBB\xBF", ETextMark::utf8, {}},
              {"\xEF\xBB\xBF\xC3\xA4\nb", ETextMark::utf8, {"\xC3\xA4", "b"}},
              {"\xFF\xFE\xE4\0\n\0b\0"s, ETextMark::utf16, {"\xC3\xA4", "b"}},
-             {"\xFF\xFEx\0c"s, ETextMark::utf16, {"x"}}, // cut off
+             {"\xFF\xFEx\0c"s, ETextMark::utf16, {"x"}}, // incomplete last character
              {"\xFF\xFE\0\0\xE4\0\0\0"s, ETextMark::utf32, {"\xC3\xA4"}},
          }) {
         const P<CTextFileReader> reader = make<CTextFileReader>(toURI(folder.write("text", c.bytes)));

@@ -18,7 +18,7 @@ using tests::toURI;
 
 namespace {
 
-constexpr uint32_t kLong = 60000; // only a fault lasts so long
+constexpr uint32_t kLong = 60000; // only reached on a fault
 
 P<IProcess> startShell(const std::string& script, std::vector<std::string> arguments = {}) {
     std::vector<P<IString>> all{"-c"_s, CString::fromUTF8(script), "sh"_s};
@@ -48,7 +48,7 @@ TEST(Process, Arguments_ArriveByteForByte) {
 
 TEST(Process, Child_InheritsTheStandardFilesOnly) {
     tests::CTempFolder folder;
-    // Without the close-on-exec flag, as a careless library opens it.
+    // Without the close-on-exec flag, as careless libraries open files.
     int open = ::open("/dev/null", O_RDONLY);
     ASSERT_GE(fcntl(open, F_DUPFD, 100), 100);
     EXPECT_EQ(runShell("ls /proc/$$/fd > \"$1\"", {(folder / "out").string()}), 0);
@@ -80,12 +80,12 @@ TEST(Process, Wait_TimesOutAndTerminateEndsIt) {
     EXPECT_EQ(exitCode, 128 + SIGTERM);
     EXPECT_TRUE(process->wait(0, exitCode)) << "a second wait answers the same";
     EXPECT_EQ(exitCode, 128 + SIGTERM);
-    process->terminate(); // nobody is there any more
+    process->terminate(); // the process no longer exists
 }
 
 TEST(Process, EndedChildOfADroppedHandle_IsCollected) {
     pid_t id = static_cast<pid_t>(startShell("exit 0")->getId());
-    // A zombie would stay for ever.
+    // A zombie would remain for ever.
     for (int64_t end = getTimeManager()->getTime() + kLong; kill(id, 0) == 0;) {
         ASSERT_LT(getTimeManager()->getTime(), end);
         std::this_thread::yield();
@@ -122,7 +122,7 @@ TEST(DynamicLibrary, FailureTellsFileAndReason) {
          "No such file"},
         {[] { getDynamicLibraryLoader()->loadByName("libno-such.so"); }, "libno-such.so", "No such file"},
         {[] { getDynamicLibraryLoader()->loadByName(""); }, "''", "no name"},
-        // A relative file is looked for in the current folder, and never in the platform's.
+        // A relative file is looked up in the current folder, never in the loader's search path.
         {[] { getDynamicLibraryLoader()->load(toURI("libm.so.6")); }, "./libm.so.6", "No such file"},
     };
     for (const SCase& one : cases) {

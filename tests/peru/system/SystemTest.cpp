@@ -103,7 +103,7 @@ TEST(System, NeverReplacesAndLeavesNoHalfCopy) {
     EXPECT_EQ(tests::errorOf([&] { getSystem()->copyFile(missing, toURI(folder / "c")); }),
               "Error copying file '" + toPath(missing) + "' to '" + (folder / "c").string() +
                   "' (No such file or directory).");
-    // Fails in its first read, after the destination was made.
+    // Fails on the first read, after the destination was created.
     EXPECT_THROW(getSystem()->copyFile(toURI("/proc/self/mem"), toURI(folder / "c")), CFileError);
     fs::create_symlink(folder / "nowhere", folder / "link");
     EXPECT_THROW(getSystem()->copyFile(source, toURI(folder / "link")), CFileError);
@@ -114,7 +114,7 @@ TEST(System, NeverReplacesAndLeavesNoHalfCopy) {
                  CURITypeNotSupportedError);
     EXPECT_EQ(tests::readFile(folder / "b"), "old");
     EXPECT_EQ(countEntries(folder.path()), 4u);
-    // A file whose size the kernel does not tell.
+    // A file whose size the kernel does not report.
     getSystem()->copyFile(toURI("/proc/self/status"), toURI(folder / "c"));
     EXPECT_NE(tests::readFile(folder / "c").find("VmRSS"), std::string::npos);
 }

@@ -34,7 +34,7 @@ protected:
             result.push_back(entry.path());
         return result;
     }
-    // Runs `function` in a child, which then ends without any clean-up; answers how.
+    // Runs `function` in a child process that ends without clean-up; returns the wait status.
     template <class F> static int runChild(F function) {
         pid_t id = startChild(function);
         int status = 0;
@@ -71,7 +71,7 @@ TEST_F(GlobalMutex, AbandonedByDeadProcess_NextOwnerGetsItWithoutError) {
             ASSERT_TRUE(mutex->tryLock());
         else
             mutex->lock();
-        // One unlock sets it free: the dead owner's nesting is not inherited.
+        // One unlock releases it: the dead owner's lock count is not inherited.
         mutex->unlock();
         EXPECT_TRUE(isFreeElsewhere("abandoned"));
     }
@@ -89,7 +89,7 @@ TEST_F(GlobalMutex, SeveralProcesses_LoseNoIncrement) {
     void* memory = mmap(nullptr, sizeof(int), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0);
     ASSERT_NE(memory, MAP_FAILED);
     auto* counter = static_cast<volatile int*>(memory);
-    // The children make the segment themselves, all at the same time.
+    // The children create the segment themselves, all at the same time.
     std::vector<pid_t> children;
     for (int i = 0; i < kProcesses; ++i)
         children.push_back(startChild([&] {
@@ -152,15 +152,15 @@ TEST_F(GlobalMutex, Segment_IsPrivateAlsoUnderAnOpenMask) {
     EXPECT_EQ(status.st_uid, geteuid());
 }
 
-// What a maker that died half way, or an earlier run of the machine, may leave behind.
+// Left behind by a process that died during initialisation, or from before a reboot.
 TEST_F(GlobalMutex, HalfMadeSegment_IsMadeAnew) {
     open("half");
     std::filesystem::path file = files().at(0);
     const std::string ready = tests::readFile(file);
     std::string noStamp = ready, otherRun = ready;
     noStamp.replace(0, 4, 4, '\0');
-    otherRun[10] ^= 1;                                                  // within the run's mark
-    otherRun.replace(48, ready.size() - 48, ready.size() - 48, '\x7f'); // an owner that is no more
+    otherRun[10] ^= 1;                                                  // within the boot id
+    otherRun.replace(48, ready.size() - 48, ready.size() - 48, '\x7f'); // an owner that no longer exists
     for (const std::string& bytes : {std::string(), ready.substr(0, 20), noStamp, otherRun}) {
         std::ofstream(file, std::ios::binary | std::ios::trunc) << bytes;
         P<IMutex> mutex = open("half");

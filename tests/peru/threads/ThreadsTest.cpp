@@ -36,7 +36,7 @@ P<IThread> runThread(std::function<void()> function) {
     return getThreadManager()->createThread(P<IAction>(make<CFunctionAction>(std::move(function))));
 }
 
-// Counts its living instances.
+// Counts its live instances.
 class CWitness : public CObject {
 public:
     explicit CWitness(std::atomic<int>& living) : m_living(living) { ++m_living; }
@@ -92,7 +92,7 @@ TEST(Signal, IsManualReset) {
     EXPECT_GE(getTimeManager()->getMonotonicTime() - start, 30 * 1000000);
 }
 
-// The waiter may come to run only after the reset; it was released all the same.
+// The waiter may not run until after the reset; it must still be released.
 TEST(Signal, SetAndResetAtOnce_ReleasesWhoWaited) {
     P<ISignal> signal = getSignalFactory()->createSignal();
     std::atomic<bool> released{false};
@@ -141,7 +141,7 @@ TEST(Thread, DroppedHandle_DoesNotStopItAndActionLives) {
     EXPECT_EQ(living, 1);
     go->set();
     EXPECT_TRUE(done->wait(20000));
-    while (living != 0) getThreadManager()->yield(true); // the count outlives its last user
+    while (living != 0) getThreadManager()->yield(true); // the last reference is released after `done` is set
 }
 
 TEST(Thread, EndedThread_HasLetItsActionGo) {
@@ -153,7 +153,7 @@ TEST(Thread, EndedThread_HasLetItsActionGo) {
     EXPECT_EQ(living, 0);
 }
 
-// An owner that is released last by its own thread waits for that thread in its destructor.
+// The owner is released last by its own thread, and its destructor waits for that thread.
 TEST(Thread, WaitingForItself_ReturnsAfterTheBodyAndThrowsWithin) {
     class COwner : public CObject {
     public:
@@ -202,13 +202,13 @@ TEST(Thread, Priority_LowersThisThreadOnly) {
         auto id = static_cast<id_t>(gettid());
         self->setPriority(3);
         self->setPriority(2);
-        self->setPriority(2); // the same step twice is harmless
+        self->setPriority(2); // setting the same step twice is harmless
         EXPECT_GE(getpriority(PRIO_PROCESS, id), 5);
         self->setPriority(1);
         EXPECT_EQ(sched_getscheduler(gettid()), SCHED_BATCH);
         self->setPriority(0);
         EXPECT_EQ(sched_getscheduler(gettid()), SCHED_IDLE);
-        // Whether the way back is allowed depends on the user; it is no error either way.
+        // Whether raising is permitted depends on the user; it is not an error either way.
         for (int step : {6, 3}) EXPECT_NO_THROW(self->setPriority(step)) << step;
         for (int step : {-1, 7}) EXPECT_THROW(self->setPriority(step), CError) << step;
     })->wait();
@@ -253,14 +253,14 @@ TEST(Thread, EscapedException_IsLoggedAndEndsTheThreadOnly) {
     EXPECT_EQ(log->texts[2], "Type: Error\nText: Unspecified error");
 }
 
-#ifndef TONEWRIGHT_SANITIZED // they cannot live within a limit of address space
+#ifndef TONEWRIGHT_SANITIZED // sanitizers cannot run with a limited address space
 TEST(Thread, NoMemoryForAnotherStack_IsTold) {
     P<ISignal> never = getSignalFactory()->createSignal();
     auto fail = [&] {
         rlimit limit{1, 1};
         setrlimit(RLIMIT_AS, &limit);
         try {
-            // Some stacks of ended threads are kept for reuse.
+            // The C library keeps some stacks of ended threads for reuse.
             for (int i = 0; i < 100; ++i) runThread([&] { never->wait(); });
         } catch (const CError& error) {
             std::string text = CString::toStdString(error.getDescription());
@@ -286,7 +286,7 @@ TEST(ThreadLocalStorage, EachThread_HasAValueThatDiesWithIt) {
     };
     runThread(use)->wait();
     EXPECT_EQ(living, 1);
-    std::thread(use).join(); // a thread that nobody here has made
+    std::thread(use).join(); // a thread that this library did not create
     EXPECT_EQ(living, 1);
     slot->set(nullptr);
     EXPECT_EQ(living, 0);
@@ -311,7 +311,7 @@ TEST(ThreadLocalStorage, DyingSlot_ReleasesTheValuesOfAllThreads) {
     EXPECT_EQ(living, 0);
 }
 
-// A value's destructor that stores into a slot while its thread ends.
+// A value whose destructor sets a slot while its thread ends.
 TEST(ThreadLocalStorage, ValueThatSetsSlotsWhileDying_LeavesNothing) {
     class CLastWord : public CObject {
     public:

@@ -113,7 +113,7 @@ TEST_F(WorkerManager, Listeners_AreToldBetweenEntryAndAttached) {
 }
 
 TEST_F(WorkerManager, Destruction_DetachesLastFirst) {
-    // A worker that leaves from within its farewell is not told twice.
+    // A worker that removes itself in detached() is not called twice.
     b->onDetached = [&](IWorkerManager* dying) { EXPECT_FALSE(dying->removeWorker(b.get())); };
     manager.reset();
     EXPECT_EQ(journal, "-c-b-a");

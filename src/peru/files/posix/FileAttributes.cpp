@@ -14,12 +14,12 @@ namespace {
 constexpr char kAccessList[] = "system.posix_acl_access";
 constexpr std::string_view kLabel = "security.selinux";
 
-// Capabilities and checksums belong to the bytes and not to the name; the system drops them on writing, too.
+// Capabilities and checksums belong to the old content; the kernel drops them on writing, too.
 bool isTakenOver(std::string_view name) {
     return !name.starts_with("security.") || name == kLabel;
 }
 
-// The names, each with its zero.
+// The names, each terminated by a zero byte.
 std::string listAttributes(int file) {
     for (;;) {
         const ssize_t size = ::flistxattr(file, nullptr, 0);
@@ -49,7 +49,7 @@ bool isRefusal(int error) {
 }
 
 int copyAttributes(int from, int to) {
-    // What the new file has from its folder would let people in whom the old one kept out.
+    // An access list inherited from the folder could admit users whom the old file's list kept out.
     if (::fremovexattr(to, kAccessList) != 0 && errno != ENODATA && !isRefusal(errno)) return errno;
     const std::string names = listAttributes(from);
     std::string value;
@@ -71,14 +71,14 @@ int takeOverAttributes(int from, int to) {
     if (old.st_uid != fresh.st_uid || old.st_gid != fresh.st_gid) {
         if (::fchown(to, old.st_uid, old.st_gid) != 0 &&
             ::fchown(to, static_cast<uid_t>(-1), old.st_gid) != 0) {
-            // Another group than before: it gets what everybody had.
+            // The group changes: it only gets the permissions of others.
             const mode_t others = mode & 07;
             mode = (mode & ~070u) | (mode & others << 3);
         }
         if (::fstat(to, &fresh) != 0) return errno;
         if (fresh.st_uid != old.st_uid || fresh.st_gid != old.st_gid) mode &= 01777;
     }
-    // The access list holds the group's rights too, so the mode comes last.
+    // Setting the access list changes the mode too, so the mode is set last.
     if (int error = copyAttributes(from, to)) return error;
     return ::fchmod(to, mode) == 0 || isRefusal(errno) ? 0 : errno;
 }

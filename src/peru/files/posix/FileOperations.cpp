@@ -16,7 +16,7 @@ namespace {
 
 constexpr int kUniqueAttempts = 100;
 constexpr size_t kBufferSize = 256 * 1024;
-// What one call of the kernel may copy: large, yet short enough for the process to be stopped in between.
+// Bytes per copying system call: large, but small enough for the process to be interrupted in between.
 constexpr size_t kRangeSize = 64 * 1024 * 1024;
 
 int writeAll(int file, const char* bytes, size_t size) {
@@ -46,13 +46,13 @@ int copyBytes(int source, int destination) {
         ssize_t count = ::copy_file_range(source, nullptr, destination, nullptr, kRangeSize, 0);
         if (count > 0) continue;
         if (count < 0 && errno == EINTR) continue;
-        // Files of the kernel report no bytes here, and some file systems cannot do it at all: what is left
-        // goes through memory from where the call stopped. True errors show there again.
+        // Virtual files of the kernel report no bytes here, and some file systems do not support the call:
+        // the rest is copied through a buffer, where genuine errors occur again.
         return copyThroughBuffer(source, destination);
     }
 }
 
-// File systems without modes refuse what they cannot keep.
+// File systems without modes refuse to set one.
 int setMode(int file, const struct stat& like) {
     return ::fchmod(file, like.st_mode & 0777) == 0 || errno == EPERM || errno == ENOTSUP ? 0 : errno;
 }
@@ -107,7 +107,7 @@ bool isThere(const std::string& path) {
 } // namespace
 
 int copyRegularFile(const std::string& source, const std::string& destination) {
-    // Non-blocking, so that a pipe with that name does not hold the caller until somebody writes to it.
+    // Non-blocking, so that opening a FIFO does not wait for a writer.
     CFileHandle in(::open(source.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
     if (!in.isOpen()) return errno;
     struct stat status;
@@ -126,8 +126,8 @@ int copyRegularFile(const std::string& source, const std::string& destination) {
 int renameWithoutReplacing(const std::string& source, const std::string& destination) {
     if (::renameat2(AT_FDCWD, source.c_str(), AT_FDCWD, destination.c_str(), RENAME_NOREPLACE) == 0) return 0;
     if (errno != EINVAL && errno != ENOSYS) return errno;
-    // A file system without that flag. EINVAL also means a folder that is moved into itself; the plain call
-    // reports that again.
+    // The file system does not support the flag. EINVAL also means that a folder would be moved into itself;
+    // the plain call reports that again.
     if (isThere(destination)) return EEXIST;
     return ::rename(source.c_str(), destination.c_str()) == 0 ? 0 : errno;
 }

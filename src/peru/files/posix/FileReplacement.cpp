@@ -26,7 +26,7 @@ namespace {
                      file);
 }
 
-// Links are followed also when nothing stands at their end yet. Empty where they lead nowhere.
+// Resolves links. A path at which nothing exists is returned as it is; a dangling link gives an empty path.
 std::string followLinks(const std::string& path) {
     std::unique_ptr<char, decltype(&std::free)> real(::realpath(path.c_str(), nullptr), &std::free);
     if (real) return real.get();
@@ -34,19 +34,20 @@ std::string followLinks(const std::string& path) {
     return errno == ENOENT && ::lstat(path.c_str(), &status) != 0 ? path : "";
 }
 
-// The way to name a file that has none. Without /proc there is no other for an ordinary user.
+// A path to a file that has no name. Without /proc an ordinary user has no other way to link such a file.
 std::string getDescriptorPath(int file) {
     return "/proc/self/fd/" + std::to_string(file);
 }
 
-// After a power failure the folder may else still tell the old name. No more can be done where it refuses.
+// Otherwise the directory may still hold the old entry after a power failure. Failure is ignored: there is no
+// other way.
 void syncFolder(const std::string& path) {
     const CFileHandle folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (folder.isOpen()) ::fsync(folder.get());
 }
 
-// Of the bytes from `start` to `end` the first stretch that is on the disk; the whole where the file system
-// does not tell.
+// The first range with data between `start` and `end`; the whole range if the file system does not report
+// holes.
 struct SStretch {
     int64_t start;
     int64_t end;
@@ -61,7 +62,7 @@ SStretch findData(int file, int64_t start, int64_t end) {
 
 } // namespace
 
-// The errors of streams become those of files: who replaces a file needs to catch one kind only.
+// Turns stream errors into file errors, so that callers need to catch only one kind.
 class CReplacementStream : public CDiskIOStream {
 public:
     CReplacementStream(const P<IURI>& file, CFileHandle handle)
@@ -123,21 +124,21 @@ CFileReplacement::~CFileReplacement() = default;
 
 void CFileReplacement::openOld() {
     struct stat status;
-    // Asked first: a pipe would hold the caller, and some devices act when they are opened.
+    // Checked before opening: opening a FIFO may block, and opening some devices has side effects.
     if (::stat(m_target.c_str(), &status) != 0) {
         if (errno == ENOENT) return;
         raise(errno, m_uri);
     }
     if (S_ISDIR(status.st_mode)) raise(EISDIR, m_uri);
     if (!S_ISREG(status.st_mode)) raise(EINVAL, m_uri);
-    // Taking the name needs no right to the file, so the right is asked for here.
+    // Renaming over a file needs no permission to write it, so check that here.
     if (::faccessat(AT_FDCWD, m_target.c_str(), W_OK, AT_EACCESS) != 0) raise(errno, m_uri);
     m_old = CFileHandle(::open(m_target.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
     if (!m_old.isOpen()) raise(errno, m_uri);
 }
 
 void CFileReplacement::openNew() {
-    // Nobody else may look into it before it has the old file's rights.
+    // Nobody else may read it before it has the old file's permissions.
     const mode_t mode = m_old.isOpen() ? 0600 : 0666;
     m_new = CFileHandle(::open(m_folder.c_str(), O_TMPFILE | O_RDWR | O_CLOEXEC, mode));
     if (m_new.isOpen() && ::access(getDescriptorPath(m_new.get()).c_str(), F_OK) == 0) return;
@@ -158,9 +159,9 @@ P<ISeekableIOStream> CFileReplacement::getStream() {
 void CFileReplacement::copyFromOld(int64_t offset, int64_t size) {
     const int64_t position = m_stream->getPosition();
     const int64_t end = offset + size;
-    // Behind its end the new file reads as zeros, and holes of the old one may stay holes.
+    // Past its end the new file reads as zeros, so holes of the old one can stay holes.
     const bool mayHaveHoles = position >= m_stream->getSize();
-    // Also takes what the stream holds back to the file, and lets it forget what it has read ahead.
+    // Also flushes the stream's buffer to the file and discards its read-ahead.
     m_stream->setSize(std::max(m_stream->getSize(), position + size));
     struct stat status;
     if (::fstat(m_old.get(), &status) != 0) raise(errno, m_uri);

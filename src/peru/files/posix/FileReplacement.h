@@ -1,4 +1,4 @@
-// The new content of a file on this platform.
+// Replacement of a file's content on this platform.
 #pragma once
 
 #include "peru/Object.h"
@@ -12,27 +12,27 @@ namespace peru::posix {
 
 class CReplacementStream;
 
-// The name of a file that goes with this object, also when the constructor of its owner fails.
+// The name of a temporary file. Deletes the file on destruction, also if the owner's constructor throws.
 struct STemporaryName {
     STemporaryName() = default;
     STemporaryName(const STemporaryName&) = delete;
     ~STemporaryName();
 
-    std::string path; // empty while there is no such file
+    std::string path; // empty if there is no such file
 };
 
-// The content grows in a file without a name in the folder of the old one, or, where the file system has no
-// such files, in a hidden one that goes with this object. A process that dies while commit() renames may
-// leave the whole new file under a hidden name; at every other time nothing stays.
+// The content is written to an unnamed file in the folder of the old one or, if the file system does not
+// support unnamed files, to a hidden one that this object deletes. A process that is killed while commit()
+// renames may leave the complete new file under a hidden name.
 //
-// What the new file takes over: mode, access lists, extended attributes, the group and the owner as far as
-// this user may give them away; rights that would reach another group than before are dropped. Its time is
-// that of the writing. A file with several names is replaced under this one only: writing through to the
-// others would mean to write in place, and whoever wants the old content keeps it there.
+// The new file takes over mode, access lists, extended attributes and, as far as the user may set them, group
+// and owner; permissions that would apply to a different group are dropped. Its modification time is the time
+// of writing. Of a file with several hard links only this name is replaced: the other names keep the old
+// content, since changing them too would mean writing in place.
 class CFileReplacement : public CObject, public IFileReplacement {
 public:
-    // The file need not exist. Throws CFileError: CFileAccessDeniedError for a file or a folder that the user
-    // may not write.
+    // The file need not exist. Throws CFileError, or CFileAccessDeniedError if the user may not write the
+    // file or its folder.
     explicit CFileReplacement(const P<IURI>& file);
     ~CFileReplacement() override;
 
@@ -43,14 +43,14 @@ public:
 private:
     void openOld();
     void openNew();
-    // Answer 0 or an errno value.
+    // Both return 0 or an errno value.
     int giveName(std::string& name);
     int finish();
 
     P<IURI> m_uri;
-    std::string m_target; // where links lead to
+    std::string m_target; // with links resolved
     std::string m_folder; // of the target, with a trailing "/"
-    CFileHandle m_old;    // not open when there is no such file
+    CFileHandle m_old;    // not open if the file does not exist
     CFileHandle m_new;
     STemporaryName m_name; // of the new file
     P<CReplacementStream> m_stream;

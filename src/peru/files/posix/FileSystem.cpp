@@ -23,7 +23,7 @@
 namespace peru::posix {
 namespace {
 
-// An error whose text names one file and the system's reason.
+// Throws an error whose text names one file and the system's reason.
 [[noreturn]] void throwError(const char* key, const char* text, const char* placeholder, const P<IURI>& uri,
                              int error) {
     throw CFileError(localize(key, text, {{placeholder, getShownName(uri)}, {"%MSG%", getSystemText(error)}}),
@@ -91,7 +91,7 @@ void CFileSystem::deleteFolder(const P<IURI>& uri) {
     struct stat status;
     if (::lstat(path.c_str(), &status) != 0) throwDeleteFolderError(uri, errno);
     if (!S_ISDIR(status.st_mode)) throwDeleteFolderError(uri, ENOTDIR);
-    // The root itself could not go, but everything in it would.
+    // The root itself cannot be deleted, but all its content would be.
     if (path == "/") throwDeleteFolderError(uri, EBUSY);
     std::error_code error;
     std::filesystem::remove_all(path, error);
@@ -121,7 +121,7 @@ void CFileSystem::copyLink(const P<IURI>& source, const P<IURI>& destination) {
     if (::symlink(target.c_str(), to.c_str()) != 0) throwCopyError(source, destination, errno);
     struct stat status;
     if (::lstat(from.c_str(), &status) != 0) return;
-    // Not every file system keeps times of a link, and nothing depends on them.
+    // Not every file system stores times of links, and nothing depends on them.
     const timespec times[2] = {status.st_atim, status.st_mtim};
     static_cast<void>(::utimensat(AT_FDCWD, to.c_str(), times, AT_SYMLINK_NOFOLLOW));
 }
@@ -136,7 +136,7 @@ void CFileSystem::finishFolder(const P<IURI>& source, const P<IURI>& destination
     CFileHandle folder(::open(toPath(destination).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (!folder.isOpen()) throwCopyError(source, destination, errno);
     const timespec times[2] = {status.st_atim, status.st_mtim};
-    // File systems without modes refuse what they cannot keep.
+    // File systems without modes refuse to set one.
     if (::fchmod(folder.get(), status.st_mode & 01777) != 0 && errno != EPERM && errno != ENOTSUP)
         throwCopyError(source, destination, errno);
     if (::futimens(folder.get(), times) != 0) throwCopyError(source, destination, errno);
@@ -163,7 +163,7 @@ bool CFileSystem::isWithin(const P<IURI>& uri, const P<IURI>& folder) {
     std::filesystem::path path =
         std::filesystem::weakly_canonical(std::filesystem::absolute(toPath(uri)), error);
     if (error) return false;
-    // By identity and not by name: links and mounts give one folder several names.
+    // Compares identity rather than names: links and mounts give one folder several names.
     for (;; path = path.parent_path()) {
         struct stat status;
         if (::stat(path.c_str(), &status) == 0 && status.st_dev == outer.st_dev &&
@@ -176,7 +176,7 @@ bool CFileSystem::isWithin(const P<IURI>& uri, const P<IURI>& folder) {
 void CFileSystem::commit(const P<IURI>& uri) {
     std::string path = toPath(uri);
     CFileHandle file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOFOLLOW));
-    // What cannot be opened, such as a link, is reached through its folder.
+    // For anything that cannot be opened, such as a link, use its folder.
     if (!file.isOpen())
         file = CFileHandle(::open(std::filesystem::absolute(path).parent_path().c_str(),
                                   O_RDONLY | O_CLOEXEC | O_DIRECTORY));

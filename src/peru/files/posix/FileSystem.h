@@ -1,17 +1,17 @@
-// The disks of this machine.
+// The file systems of this machine.
 #pragma once
 
 #include "peru/files/IFileSystem.h"
 
 namespace peru::posix {
 
-// Stateless; safe from any thread.
+// Stateless; thread-safe.
 class CFileSystem : public CObject, public IFileSystem {
 public:
     bool handles(const P<IURI>& uri) override;
     P<IFileObject> getRoot() override;
     P<IFileObject> getFileObject(const P<IURI>& uri) override;
-    // The creation time cannot be set here.
+    // The creation time cannot be set on this platform.
     void setTimes(const P<IURI>& uri, const P<peru::CFileTimes>& times) override;
     void createFolder(const P<IURI>& uri) override;
     void deleteFile(const P<IURI>& uri) override;
@@ -24,7 +24,7 @@ public:
     void finishFolder(const P<IURI>& source, const P<IURI>& destination) override;
     bool tryMove(const P<IURI>& source, const P<IURI>& destination) override;
     bool isWithin(const P<IURI>& uri, const P<IURI>& folder) override;
-    // Writes out the whole volume.
+    // Syncs the whole volume.
     void commit(const P<IURI>& uri) override;
 };
 

@@ -63,7 +63,7 @@ int CFileSystemFileObject::look(const std::string& path) {
     if (::statx(AT_FDCWD, path.c_str(), AT_SYMLINK_NOFOLLOW, kWanted, &status) != 0) return errno;
     m_attributes.link = S_ISLNK(status.stx_mode);
     if (m_attributes.link) {
-        // Where the link leads nowhere, it stands for itself.
+        // A dangling link describes itself.
         struct statx target;
         if (::statx(AT_FDCWD, path.c_str(), 0, kWanted, &target) == 0) status = target;
     }
@@ -77,7 +77,7 @@ int CFileSystemFileObject::look(const std::string& path) {
     std::string name = getLastSegment(path);
     m_attributes.hidden = name.starts_with('.') && name != "." && name != "..";
     m_attributes.executable = m_file && (status.stx_mode & 0111) != 0;
-    // The superuser may write to everything, so that the mode is asked as well.
+    // The superuser may write to everything, so check the mode as well.
     m_attributes.readOnly = (status.stx_mode & 0222) == 0 || ::access(path.c_str(), W_OK) != 0;
     return 0;
 }

@@ -1,4 +1,4 @@
-// A file or folder on disk, and the walk over a folder's children.
+// A file or folder on disk, and enumeration of a folder's children.
 #pragma once
 
 #include "peru/files/IFileObject.h"
@@ -11,7 +11,7 @@ namespace peru::posix {
 
 class CFileSystemFileObject : public CObject, public virtual IFileObject {
 public:
-    // Empty when there is nothing with that path. Throws CFileError when the system will not tell.
+    // Empty if nothing exists at the path. Throws CFileError if that cannot be determined.
     static P<IFileObject> find(const std::string& path);
 
     P<IURI> getURI() override;
@@ -22,7 +22,7 @@ public:
     int64_t getSize() override { return m_size; }
     P<peru::CFileTimes> getTimes() override { return m_times; }
     SFileAttributes getAttributes() override { return m_attributes; }
-    // Told from the name alone: the file is not opened.
+    // Derived from the name alone: the file is not opened.
     P<IString> getKind() override;
     P<IFileObjectCursor> enumerate() override;
 
@@ -30,7 +30,7 @@ protected:
     CFileSystemFileObject() = default;
     ~CFileSystemFileObject() override = default;
     template <class T, class... Args> friend P<T> peru::make(Args&&... args);
-    // An errno value, 0 when the file was found.
+    // Returns 0 if the file was found, otherwise an errno value.
     int look(const std::string& path);
 
 private:
@@ -42,10 +42,10 @@ private:
     SFileAttributes m_attributes;
 };
 
-// A child that goes away between its turn and the look at it is passed over.
+// Skips a child that is deleted while the folder is being read.
 class CFileSystemFolderCursor : public CObject, public IFileObjectCursor {
 public:
-    // Throws CFileError when the path is no folder or cannot be read.
+    // Throws CFileError if the path is not a folder or cannot be read.
     static P<IFileObjectCursor> open(const std::string& path);
 
     bool next() override;

@@ -25,7 +25,7 @@ struct statvfs getStorageProperties(const SMount& mount) {
                      uri);
 }
 
-// In names of links to devices, what is no plain character is "\x" and two hexadecimal digits.
+// Special characters in the names of device links are written as "\x" and two hexadecimal digits.
 std::string unescapeLabel(const std::string& name) {
     std::string label;
     for (size_t i = 0; i < name.size(); ++i) {
@@ -76,7 +76,7 @@ bool CFileSystemVolume::isRemovable() {
     std::error_code error;
     std::filesystem::path device = std::filesystem::canonical("/sys/dev/block/" + m_mount.device, error);
     if (error) return false;
-    // A partition's folder lies in its disk's, which holds the mark.
+    // A partition's folder is inside its disk's, which has the attribute.
     for (const std::filesystem::path& folder : {device, device.parent_path()}) {
         int removable = 0;
         if (std::ifstream(folder / "removable") >> removable) return removable != 0;

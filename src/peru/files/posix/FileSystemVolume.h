@@ -7,14 +7,14 @@
 
 namespace peru::posix {
 
-// What the platform knows beyond IFileSystemVolume.
+// Platform-specific additions to IFileSystemVolume.
 class PERU_API IPosixFileSystemVolume : public virtual IFileSystemVolume {
 public:
-    virtual P<IString> getSource() = 0;       // the device file, or the share of a network volume
+    virtual P<IString> getSource() = 0;       // the device file or network share
     virtual P<IString> getDeviceNumber() = 0; // "major:minor"
 };
 
-// Immutable; safe from any thread.
+// Immutable; thread-safe.
 class CFileSystemVolume : public CObject, public IPosixFileSystemVolume {
 public:
     explicit CFileSystemVolume(SMount mount) : m_mount(std::move(mount)) {}

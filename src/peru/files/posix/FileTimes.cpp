@@ -22,7 +22,7 @@ timespec toTime(int64_t nanoseconds) {
         time.tv_nsec = UTIME_OMIT;
         return time;
     }
-    // Division rounds towards zero, but the fraction counts upwards also before 1970.
+    // Division rounds towards zero, but the fraction must be positive before 1970, too.
     int64_t seconds = nanoseconds / kSecond - (nanoseconds % kSecond < 0 ? 1 : 0);
     time.tv_sec = static_cast<time_t>(seconds);
     time.tv_nsec = static_cast<long>((nanoseconds % kSecond + kSecond) % kSecond);

@@ -9,12 +9,12 @@ namespace peru::posix {
 
 class CFileTimes : public peru::CFileTimes {
 public:
-    // Null where the file system does not keep the time. What lies beyond the range of peru::CFileTimes
-    // (the years 1678 to 2261) becomes its nearest end.
+    // `creation` is null if the file system does not record it. Times outside the range of peru::CFileTimes
+    // (the years 1678 to 2261) are clamped to it.
     CFileTimes(const timespec* creation, const timespec& lastAccess, const timespec& lastWrite);
     explicit CFileTimes(const P<peru::CFileTimes>& times);
 
-    // For utimensat: last access and last write, UTIME_OMIT for what is unknown.
+    // For utimensat: last access and last write, UTIME_OMIT if unknown.
     void toTimespec(timespec (&times)[2]) const;
 };
 

@@ -47,7 +47,7 @@ P<IString> findIconName(const char* contentType, const char* genericName) {
     return name;
 }
 
-// The system's files have types of their own, archives share a generic icon; the others go by major type.
+// System files have specific types and archives share a generic icon; the rest is decided by the major type.
 EFileCategory findCategory(const char* contentType, const P<CMimeType>& mimeType, const char* genericIcon) {
     for (const char* type :
          {"application/x-sharedlib", "application/x-executable", "application/x-msdos-program",
@@ -86,7 +86,7 @@ P<IFileType> CFileTypesManager::getFileType(const CStringArg& extension) {
     std::string name = CString::toStdString(extension);
     if (name.starts_with('.')) name.erase(0, 1);
     const P<IString> key = CString::fromUTF8(name)->toLower();
-    // A name without an extension would be looked up by itself, such as "makefile".
+    // An empty extension must not be looked up: the guess would be made from the name alone.
     const CText contentType(name.empty() ? g_strdup("application/octet-stream")
                                          : g_content_type_guess(("name." + CString::toStdString(key)).c_str(),
                                                                 nullptr, 0, nullptr));

@@ -1,11 +1,11 @@
-// Kinds of files as the desktop knows them.
+// File types as known to the desktop.
 #pragma once
 
 #include "peru/files/IFileType.h"
 
 namespace peru::posix {
 
-// Answers from the desktop's table of content types.
+// Uses the desktop's database of content types.
 class CFileTypesManager : public CObject, public IFileTypesManager {
 public:
     ~CFileTypesManager() override;

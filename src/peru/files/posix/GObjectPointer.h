@@ -1,5 +1,5 @@
-// Owners of what GIO hands out. GIO's headers stay out of here, so that who uses such a class does not need
-// them.
+// Smart pointers for objects returned by GIO. Does not include GIO's headers, so that users of a class with
+// such a member do not need them.
 #pragma once
 
 #include "peru/Api.h"

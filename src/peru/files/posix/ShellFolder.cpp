@@ -19,7 +19,7 @@ P<IString> toText(const char* utf8) {
 }
 
 P<IURI> toURI(GFile* file) {
-    // A file of the disks keeps its bytes; GIO's own text may escape more than ours.
+    // Local files keep their bytes this way; GIO's own URI text may escape more than ours.
     CGText path(g_file_get_path(file));
     if (path) return posix::toURI(path.get());
     CGText text(g_file_get_uri(file));

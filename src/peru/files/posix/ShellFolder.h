@@ -1,4 +1,4 @@
-// The desktop's view of files: what GIO knows of them, also beyond the disks.
+// The desktop's view of files through GIO, including locations that are not on disk.
 #pragma once
 
 #include "peru/files/IFileObject.h"
@@ -6,16 +6,17 @@
 
 namespace peru::posix {
 
-// A place of the desktop's name space, such as a folder, "trash:///" or "network:///". Belongs to one thread.
+// A location in the desktop's name space, such as a folder, "trash:///" or "network:///". For use by one
+// thread.
 class PERU_API CShellFolder : public CObject {
 public:
-    // Throws CFileError when the place is not there or holds no items.
+    // Throws CFileError if the location does not exist or cannot contain items.
     static P<CShellFolder> bind(const P<IURI>& uri);
 
     P<IURI> getURI();
-    // What is in it. Throws CFileError.
+    // Its items. Throws CFileError.
     P<IFileObjectCursor> enumerate();
-    // Of one item, by its own name. Both throw CFileError.
+    // For one item, by its name. Both throw CFileError.
     P<IString> getItemName(const CStringArg& name);
     SFileAttributes getItemAttributes(const CStringArg& name);
 
@@ -26,10 +27,10 @@ private:
     TGObject<GFile> m_file;
 };
 
-// An item as the desktop shows it. Belongs to one thread.
+// An item as the desktop shows it. For use by one thread.
 class PERU_API CShellFileObject : public CObject, public IFileObject {
 public:
-    // Throws CFileError when there is no such item.
+    // Throws CFileError if there is no such item.
     static P<CShellFileObject> find(const P<IURI>& uri);
     CShellFileObject(TGObject<GFile> file, TGObject<GFileInfo> info);
 
@@ -41,11 +42,11 @@ public:
     int64_t getSize() override;
     P<peru::CFileTimes> getTimes() override;
     SFileAttributes getAttributes() override;
-    P<IString> getKind() override; // where its name does not tell, from its first bytes
+    P<IString> getKind() override; // from its first bytes if the name does not suffice
     P<IFileObjectCursor> enumerate() override;
 
     P<IString> getKindDescription(); // in the user's language
-    P<IString> getIconName();        // of the icon theme; empty when there is none
+    P<IString> getIconName();        // in the icon theme; empty if there is none
 
 protected:
     ~CShellFileObject() override;
@@ -72,7 +73,7 @@ private:
     P<IFileObject> m_current;
 };
 
-// The root that browsing starts from: the user's desktop folder, or the home folder where there is none.
+// The root of browsing: the user's desktop folder, or the home folder if there is none.
 class PERU_API CDesktopFileObject : public CShellFileObject {
 public:
     static P<CDesktopFileObject> get(); // throws CFileError

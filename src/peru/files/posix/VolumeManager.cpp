@@ -16,7 +16,7 @@
 
 namespace peru::posix {
 
-// The body of the thread. The manager waits for its end before it dies.
+// The body of the watching thread. The manager waits for it before it is destroyed.
 class CMountWatcher : public CObject, public IAction {
 public:
     CMountWatcher(CVolumeManager* manager, const std::string& mountTable)
@@ -35,7 +35,7 @@ public:
             pollfd files[2] = {{m_table.get(), POLLPRI, 0}, {m_stop.get(), POLLIN, 0}};
             if (::poll(files, 2, -1) < 0 && errno != EINTR) return;
             if (files[1].revents != 0) return;
-            // The table shows its change as an error beside the event.
+            // A change of the table is reported as an error as well.
             if (files[0].revents & POLLNVAL) return;
             if (files[0].revents & (POLLPRI | POLLERR)) m_manager->updateFrom(this);
         }
@@ -78,8 +78,8 @@ CVolumeManager::CVolumes CVolumeManager::readVolumes() const {
     std::ostringstream text;
     text << file.rdbuf();
     std::vector<SMount> mounts = parseMountTable(text.str());
-    // A single file may be mounted as well. What does not answer, such as a share out of reach, may be a
-    // folder.
+    // Single files may be mounted as well; leave those out. A mount that cannot be examined, such as an
+    // unreachable share, is kept.
     std::erase_if(mounts, [](const SMount& mount) { return !isFolder(mount.mountPoint); });
     CVolumes volumes;
     for (const SMount& mount : selectVolumes(mounts)) volumes.push_back(make<CFileSystemVolume>(mount));
@@ -101,8 +101,8 @@ P<IFileSystemVolume> CVolumeManager::getVolumeOf(const P<IURI>& uri) {
     std::ifstream file(m_mountTable, std::ios::binary);
     std::ostringstream text;
     text << file.rdbuf();
-    // The longest mount point above the file decides, also where that is no volume: files in memory that lie
-    // below the root are not on the root's volume.
+    // The longest matching mount point decides, even if it is not a volume: files on a virtual file system
+    // that is mounted below the root are not on the root's volume.
     std::vector<SMount> mounts = parseMountTable(text.str());
     const SMount* best = nullptr;
     size_t bestLength = 0;
@@ -121,7 +121,7 @@ P<IFileSystemVolume> CVolumeManager::getVolumeOf(const P<IURI>& uri) {
 void CVolumeManager::addListener(IFileSystemVolumeListener* listener) {
     CMutexLock lock(m_mutex);
     if (!m_watch.watcher) {
-        // Opened before the table is read, so that nothing can change unseen in between.
+        // Opened before the table is read, so that no change in between is missed.
         P<CMountWatcher> watcher = make<CMountWatcher>(this, m_mountTable);
         m_known = readVolumes();
         m_watch = {watcher, getThreadManager()->createThread(P<IAction>(watcher))};
@@ -139,7 +139,7 @@ void CVolumeManager::removeListener(IFileSystemVolumeListener* listener) {
             m_retired.push_back(m_watch);
             m_watch = SWatch();
         }
-        // Who holds the mutex while listeners are called is the thread that calls them.
+        // If listeners are being called, this is the thread that calls them, since it got the mutex.
         mayWait = !m_notifying;
     }
     if (mayWait) waitForRetired();
@@ -151,7 +151,7 @@ void CVolumeManager::waitForRetired() {
         CMutexLock lock(m_mutex);
         retired.swap(m_retired);
     }
-    // Not under the mutex, for which the thread may be waiting itself.
+    // Without the mutex, which the thread may be waiting for.
     for (const SWatch& watch : retired) watch.thread->wait();
 }
 
@@ -177,14 +177,14 @@ void CVolumeManager::update() {
 void CVolumeManager::notify(const P<CFileSystemVolume>& volume,
                             void (IFileSystemVolumeListener::*tell)(const P<IFileSystemVolume>&)) {
     m_notifying = true;
-    // By index and from the end: a listener may remove itself in its call.
+    // By index and from the end: a listener may remove itself during its call.
     for (size_t i = m_listeners->getCount(); i-- > 0;) {
         IFileSystemVolumeListener* listener = m_listeners->at(i);
         if (!listener) continue;
         try {
             (listener->*tell)(volume);
         } catch (const std::exception&) {
-            // One listener's failure is not the next one's.
+            // A failing listener must not affect the others.
         }
     }
     m_notifying = false;

@@ -1,4 +1,4 @@
-// The volumes of this machine, and their coming and going.
+// The volumes of this machine and notification of changes.
 #pragma once
 
 #include "peru/collections/FrailArray.h"
@@ -10,8 +10,8 @@ namespace peru::posix {
 
 class CMountWatcher;
 
-// A thread waits for the kernel's word as long as there are listeners, and only then. The re-entrant mutex is
-// held while listeners are called, so that removing one waits for a call that is under way.
+// While there are listeners, a thread waits for notifications from the kernel. The recursive mutex is held
+// while listeners are called, so that removing one waits for a call in progress.
 class PERU_API CVolumeManager : public CObject, public IVolumeManager {
 public:
     explicit CVolumeManager(std::string mountTable = "/proc/self/mountinfo");
@@ -22,7 +22,8 @@ public:
     void addListener(IFileSystemVolumeListener* listener) override;
     void removeListener(IFileSystemVolumeListener* listener) override;
 
-    // Compares the mount table with what listeners know and tells them the difference, those that left first.
+    // Compares the mount table with the state last reported and notifies listeners: removals first, then
+    // arrivals.
     void update();
 
 private:
@@ -42,9 +43,9 @@ private:
     const std::string m_mountTable;
     P<IMutex> m_mutex; // guards everything below
     P<TFrailArray<IFileSystemVolumeListener>> m_listeners;
-    CVolumes m_known; // what listeners have been told
-    SWatch m_watch;   // empty without listeners
-    // Watches that were told to end out of their own thread, which cannot wait for itself.
+    CVolumes m_known; // the state last reported to listeners
+    SWatch m_watch;   // empty if there are no listeners
+    // Watches stopped from their own thread, which cannot wait for itself.
     std::vector<SWatch> m_retired;
     bool m_notifying = false;
 };

@@ -25,7 +25,7 @@ P<IString> findHostApi(PaHostApiIndex index) {
     return getHostApiName(info->type);
 }
 
-// 0 where the engine has none of that width, or this library does not deal in it.
+// 0 for a width that the engine or this library does not support.
 PaSampleFormat findSampleFormat(int32_t bitsPerSample) {
     switch (bitsPerSample) {
     case 8:
@@ -108,7 +108,7 @@ bool CAudioDevice::isTaken(const CAudioFormat& format, int32_t& failure) const {
 }
 
 P<CAudioFormat> CAudioDevice::getFormat(int32_t sampleRate, int32_t bytesPerSample, int32_t channelCount) {
-    // A width without bounds is still refused under a number of its own.
+    // Any width that is out of range must still give an unsupported number of bits.
     const int64_t bits = std::clamp<int64_t>(int64_t{bytesPerSample} * 8, std::numeric_limits<int32_t>::min(),
                                              std::numeric_limits<int32_t>::max());
     const P<CAudioFormat> wanted = make<CAudioFormat>(sampleRate, channelCount, static_cast<int32_t>(bits));
@@ -117,7 +117,7 @@ P<CAudioFormat> CAudioDevice::getFormat(int32_t sampleRate, int32_t bytesPerSamp
     P<CAudioFormat> nearest =
         findNearestFormat(wanted, m_maxChannelCount, m_defaultSampleRate,
                           [&](const CAudioFormat& candidate) { return isTaken(candidate, failure); });
-    // Nothing fits because the device cannot be reached at all.
+    // No format is supported because the device cannot be reached at all.
     if (!nearest) check(failure);
     return nearest;
 }
@@ -142,7 +142,7 @@ void CAudioDevice::openStream(const P<CAudioFormat>& audioFormat, PaStreamCallba
         throw CMediaException(
             format(localize("peru.media.CAudioDevice.BitsNotSupported", "%d Bits are not supported"),
                    audioFormat->getBitsPerSample()));
-    // The engine would answer the same, after a word on standard error.
+    // The engine would return the same error, but also print to standard error.
     if (audioFormat->getChannelCount() > m_maxChannelCount) check(paInvalidChannelCount);
     m_format = audioFormat;
     m_bytesPerFrame = audioFormat->getBytesPerFrame();
@@ -150,7 +150,7 @@ void CAudioDevice::openStream(const P<CAudioFormat>& audioFormat, PaStreamCallba
     const bool isOut = m_direction == EDirection::out;
     CMutexLock lock(m_system->getEngineMutex());
     PaStream* stream = nullptr;
-    // The samples go through as they are.
+    // Neither clipping nor dithering: the samples must pass through unchanged.
     check(Pa_OpenStream(&stream, isOut ? nullptr : &parameters, isOut ? &parameters : nullptr,
                         audioFormat->getSampleRate(), paFramesPerBufferUnspecified, paClipOff | paDitherOff,
                         callback, self));
@@ -158,10 +158,10 @@ void CAudioDevice::openStream(const P<CAudioFormat>& audioFormat, PaStreamCallba
 }
 
 void CAudioDevice::startStream() {
-    // The first callback comes before the call returns.
+    // Set first: the first callback comes before the call returns.
     m_state = kDeviceRunning;
     PaError result = Pa_StartStream(m_stream);
-    // The engine gives its own thread a second to begin, which a machine may be too busy for.
+    // The engine waits one second for its thread to start, which is too short on a busy machine.
     for (int i = 1; result == paTimedOut && i < kStartAttempts; ++i) result = Pa_StartStream(m_stream);
     if (result < 0) {
         m_state = kDeviceIdle;

@@ -1,4 +1,4 @@
-// What input and output devices of the engine have in common.
+// Common base of the engine's input and output devices.
 #pragma once
 
 #include "peru/media/posix/IPosixAudioDevice.h"
@@ -11,11 +11,11 @@
 
 namespace peru::media::posix {
 
-// Gives the result back; throws CPortaudioException when it is an error.
+// Returns the result; throws CPortaudioException if it is an error.
 int32_t check(int32_t result);
 
-// The engine ends a stream by cancelling its thread wherever that waits. A callback must not be torn apart
-// under a lock, so it runs in such a block: the thread ends when the callback has returned.
+// Disables thread cancellation for a scope. The engine stops a stream by cancelling its thread at any
+// blocking call; callbacks run in such a scope, so that they are not interrupted while they hold a lock.
 class CCallbackScope {
 public:
     CCallbackScope();
@@ -49,22 +49,22 @@ protected:
 
     CAudioDevice(const P<IPosixSystem>& system, int32_t index, EDirection direction);
 
-    // All four with the stream's mutex held.
+    // All four require the stream's mutex.
     void openStream(const P<CAudioFormat>& format, PaStreamCallback* callback, void* self);
-    void startStream();         // and sets the state; neither when that fails
-    bool hasGone() const;       // it was started, and the system has ended it since
+    void startStream();         // also sets the state, unless starting fails
+    bool hasGone() const;       // it was started and the system has ended it since
     void requireOpened() const; // throws
 
-    // Does not wait for the stream's mutex.
+    // Does not require the stream's mutex.
     void closeStream(PaStream* stream);
 
-    const P<IMutex> m_streamMutex; // guards the stream's handle and whether it was started
+    const P<IMutex> m_streamMutex; // guards m_stream and m_started
     PaStream* m_stream = nullptr;
     bool m_started = false;
     std::atomic<int32_t> m_state{kDeviceIdle};
     std::atomic<double> m_gain{1.0};
 
-    // Written while no callback runs.
+    // Only written while no callback runs.
     P<CAudioFormat> m_format; // of the stream
     int32_t m_bytesPerFrame = 0;
 
@@ -80,7 +80,7 @@ private:
     bool m_isDefault = false;
     int32_t m_maxChannelCount = 0;
     int32_t m_defaultSampleRate = 0;
-    double m_latency = 0.0; // the least that the driver suggests
+    double m_latency = 0.0; // the driver's low-latency suggestion
 };
 
 } // namespace peru::media::posix

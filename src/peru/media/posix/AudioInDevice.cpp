@@ -15,7 +15,7 @@ CAudioInDevice::~CAudioInDevice() {
     try {
         stop();
     } catch (...) {
-        // The engine has let go of the stream whatever it answered.
+        // The engine has released the stream in any case.
     }
 }
 
@@ -34,7 +34,7 @@ void CAudioInDevice::start() {
     CMutexLock lock(m_streamMutex);
     requireOpened();
     if (m_started && !hasGone()) return;
-    // A stream that a listener has ended must be told to stop before it starts again.
+    // A stream that was ended by a listener must be stopped before it can be started again.
     if (m_started) check(Pa_StopStream(m_stream));
     m_started = false;
     m_position = 0.0;
@@ -51,7 +51,7 @@ void CAudioInDevice::stop() {
         stream = std::exchange(m_stream, nullptr);
         m_started = false;
     }
-    // Waits for the callback, so with the mutex free: a listener may be asking for the status.
+    // Stopping waits for the callback, so do it without the mutex: a listener may be calling getStatus().
     if (!stream) return;
     const PaError stopped = Pa_IsStreamStopped(stream);
     const PaError result = stopped == 0 ? Pa_StopStream(stream) : stopped;
@@ -85,7 +85,7 @@ int CAudioInDevice::onInput(const void* input, void*, unsigned long frames, cons
     auto* device = static_cast<CAudioInDevice*>(self);
     if (!input || frames == 0) return paContinue;
     try {
-        // The buffer is the callback's until it returns.
+        // The callback may modify the buffer until it returns.
         return device->hear(static_cast<uint8_t*>(const_cast<void*>(input)),
                             static_cast<int64_t>(frames) * device->m_bytesPerFrame);
     } catch (...) {

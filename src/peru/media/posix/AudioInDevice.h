@@ -31,9 +31,9 @@ private:
 
     P<CAudioFormat> m_defaultFormat;
     double m_startTime = 0.0;        // on the stream's clock
-    mutable double m_position = 0.0; // the last that was told; both are guarded by the stream's mutex
+    mutable double m_position = 0.0; // last position returned; both are guarded by the stream's mutex
 
-    // Held while listeners are called, so that one who has left hears no more.
+    // Held while listeners are called, so that a removed listener gets no more calls.
     const P<IMutex> m_listenersMutex;
     const P<Listeners> m_listeners;
 };

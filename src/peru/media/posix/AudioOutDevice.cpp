@@ -14,18 +14,18 @@ namespace peru::media::posix {
 namespace {
 
 constexpr uint32_t kLongestWait = 500; // milliseconds
-// A system that starts takes as much at once as its buffers hold, more than one write of a host that writes
-// little by little: what is wanted in the queue before the sound begins, and how long it is waited for.
+// A starting sound system fills all its buffers at once, which takes more than a single small write of a
+// host: how much should be queued before playback begins, and how long to wait for it.
 constexpr double kCushion = 400;   // milliseconds
 constexpr int kCushionRounds = 50; // of a millisecond
 
-// Blocks kept for reuse: as many as a well-filled queue has, so that the callback seldom frees one.
+// Blocks kept for reuse: as many as a full queue has, so that the callback rarely frees one.
 constexpr int kCachedBlocks = 1024;
 
-// A time further ahead of the callback than this is a driver's mistake. In seconds.
+// A playback time further ahead than this is a driver error. In seconds.
 constexpr double kMostAhead = 5.0;
 
-// Sound servers hold back some more than they tell. In seconds.
+// Sound servers buffer slightly more than they report. In seconds.
 constexpr double kHeldBack = 0.05;
 
 } // namespace
@@ -38,7 +38,7 @@ CAudioOutDevice::~CAudioOutDevice() {
     try {
         close();
     } catch (...) {
-        // The engine has let go of the stream whatever it answered.
+        // The engine has released the stream in any case.
     }
 }
 
@@ -78,13 +78,13 @@ void CAudioOutDevice::start() {
 }
 
 void CAudioOutDevice::pause() {
-    // The stream runs on and plays silence: stopping it would drop what the system has taken already.
+    // The stream keeps running and plays silence: stopping it would discard what the system has buffered.
     m_state = kDeviceIdle;
 }
 
 void CAudioOutDevice::abort() {
     m_state = kDeviceIdle;
-    // A callback that waits for its first data goes on at once.
+    // Releases a callback that waits for its first data.
     m_signal->set();
     double now = 0.0;
     PaError result = paNoError;
@@ -92,7 +92,7 @@ void CAudioOutDevice::abort() {
         const bool gone = hasGone();
         if (!gone) now = Pa_GetStreamTime(m_stream);
         result = Pa_AbortStream(m_stream);
-        if (gone) result = paNoError; // what has ended already need not be told to
+        if (gone) result = paNoError; // no error for a stream that has already ended
         m_started = false;
     }
     CMutexLock lock(m_queueMutex);
@@ -109,7 +109,7 @@ void CAudioOutDevice::stop() {
 void CAudioOutDevice::close() {
     CMutexLock lock(m_streamMutex);
     if (!m_stream) return;
-    // Closing aborts once more where aborting failed, and tells of it.
+    // If this fails, closing aborts again and reports the error.
     try {
         abort();
     } catch (const CPortaudioException&) {
@@ -148,7 +148,7 @@ void CAudioOutDevice::write(const void* data, int64_t size) {
     const P<IMemoryBlock> block = memory->getBlock(size);
     std::memcpy(block->getData(), data, static_cast<size_t>(size));
     {
-        // A device that was closed meanwhile has another queue, or none.
+        // If the device was closed meanwhile, it has a different queue or none.
         CMutexLock lock(m_queueMutex);
         queue->append(block);
     }
@@ -160,14 +160,14 @@ int64_t CAudioOutDevice::getQueuedSize() const {
     return m_queue ? m_queue->getAvailable() : 0;
 }
 
-// The callback hands the queue's sound over in blocks and enters each in the clock with the moment at which
-// the system will play it. Silence that fills a buffer up is not entered, so that pauses and want of data
-// stop the count; once the last block has been heard the position is that of the last frame that was written.
+// The callback adds each block of queued sound to the clock with the time at which the system will play it.
+// It does not add the silence that fills a buffer, so pauses and gaps do not count, and once the last block
+// has been heard the position is that of the last frame written.
 double CAudioOutDevice::getPosition() const {
     CMutexLock lock(m_streamMutex);
     if (!m_stream) return 0.0;
-    requireAlive(); // in a pause too: the position would stay for ever
-    // A stream that does not run has no clock to ask.
+    requireAlive(); // while paused, too: otherwise the position would stay the same for ever
+    // A stream that is not running has no clock.
     const double now = m_started ? Pa_GetStreamTime(m_stream) : 0.0;
     CMutexLock queueLock(m_queueMutex);
     const double frames = m_started ? m_clock.getHeard(now) : m_clock.getHeard();
@@ -183,11 +183,11 @@ int CAudioOutDevice::onOutput(const void*, void* output, unsigned long frames,
 }
 
 void CAudioOutDevice::fill(uint8_t* output, int64_t frames, const PaStreamCallbackTimeInfo& time) {
-    // What comes in holds old sound. 0 is silence for every width here.
+    // The buffer contains old samples. 0 is silence for every width.
     std::memset(output, 0, static_cast<size_t>(frames * m_bytesPerFrame));
     if (!m_signal->wait(0)) {
-        // By the end of a wait the system has run dry, and may drop what it gets before it has noticed. The
-        // sound begins with the next buffer.
+        // After the wait the system has an underrun and may discard this buffer, so playback begins with the
+        // next one.
         if (m_signal->wait(kLongestWait)) gatherCushion();
         return;
     }
@@ -198,7 +198,7 @@ void CAudioOutDevice::fill(uint8_t* output, int64_t frames, const PaStreamCallba
     {
         CMutexLock lock(m_queueMutex);
         if (!m_source && m_queue) {
-            // A frame of which only a part was written waits for the rest.
+            // An incomplete frame stays queued until the rest is written.
             const int64_t whole = m_queue->getAvailable() / m_bytesPerFrame * m_bytesPerFrame;
             size = m_queue->readSome(output, std::min(wanted, whole));
         }
@@ -226,7 +226,7 @@ int64_t CAudioOutDevice::readSource(uint8_t* output, int64_t size) {
             done += count;
         }
     } catch (...) {
-        // A source that fails is one that has no more: the device plays silence, as after its end.
+        // A failing source counts as ended: the device plays silence.
     }
     return done;
 }

@@ -28,21 +28,21 @@ private:
     static int onOutput(const void* input, void* output, unsigned long frames,
                         const PaStreamCallbackTimeInfo* time, PaStreamCallbackFlags flags, void* self);
     void fill(uint8_t* output, int64_t frames, const PaStreamCallbackTimeInfo& time);
-    void gatherCushion() const; // waits a little for it
+    void gatherCushion() const; // waits briefly for enough queued sound
     int64_t readSource(uint8_t* output, int64_t size);
     double getHearingTime(const PaStreamCallbackTimeInfo& time) const;
     void requireAlive() const;
 
-    void abort(); // with the stream's mutex held: drops what is queued and what the system has
+    void abort(); // requires the stream's mutex; discards the queue and the system's buffer
 
-    // There is something to play, or there was since open or start. The callback waits for it for a while.
+    // Set once there has been something to play since open or start. The callback waits for it for a while.
     const P<ISignal> m_signal;
     double m_framesPerMillisecond = 0.0;
-    double m_latency = 0.0; // seconds between a callback and its sound, where the system does not tell
-    // A stream of the caller's in the place of the queue; read by the callback alone.
+    double m_latency = 0.0; // seconds from a callback to its sound, if the system does not report it
+    // The caller's stream in place of the queue; only read by the callback.
     P<IInStream> m_source;
 
-    const P<IMutex> m_queueMutex; // guards the rest; held for a copy at most
+    const P<IMutex> m_queueMutex; // guards the members below; never held longer than a copy takes
     P<IMemoryManager> m_memory;
     P<CBufferedIOStream> m_queue; // empty handle while closed
     mutable CPlayClock m_clock;

@@ -1,4 +1,4 @@
-// What devices need from the system that made them.
+// What devices need from the system that created them.
 #pragma once
 
 #include "peru/media/ISystem.h"
@@ -6,11 +6,11 @@
 
 namespace peru::media::posix {
 
-// Held by every device, so that the engine ends after the last of them.
+// Every device holds a reference, so that the engine is terminated after the last device.
 class IPosixSystem : public virtual ISystem {
 public:
-    // To be held while a stream is opened or closed and while a format is tried: the engine keeps its list of
-    // streams unlocked.
+    // Must be held while a stream is opened or closed and while a format is tested: the engine does not lock
+    // its list of streams.
     virtual P<IMutex> getEngineMutex() const = 0;
 };
 

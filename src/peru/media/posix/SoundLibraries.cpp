@@ -15,7 +15,7 @@ struct SLibraryCloser {
 };
 using Library = std::unique_ptr<void, SLibraryCloser>;
 
-// The engine decides which of them are there; nothing is loaded for this.
+// Only libraries that the engine has loaded are of interest; this loads nothing.
 Library getLoaded(const char* name) {
     return Library(::dlopen(name, RTLD_NOW | RTLD_NOLOAD));
 }

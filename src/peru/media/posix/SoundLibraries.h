@@ -1,14 +1,14 @@
-// The libraries that the engine stands on.
+// The libraries that the engine uses.
 #pragma once
 
 namespace peru::media::posix {
 
-// They write to standard error whatever they could not find, on every machine that lacks something. From now
-// on they keep quiet, for all that this process does with them. Before the engine starts.
+// Turns off the messages that these libraries print to standard error about every component they cannot find.
+// Applies to all other uses in this process as well. Call before the engine starts.
 void silenceSoundLibraries();
 
-// Whether ALSA has a device to offer, be it of the configuration alone. The engine ends the process when it
-// has none. Throws CMediaException when the configuration cannot be read. True where there is no ALSA.
+// Whether the ALSA configuration defines a device. The engine aborts the process if it defines none. Throws
+// CMediaException if the configuration cannot be read. True if ALSA is not loaded.
 bool hasConfiguredDevices();
 
 } // namespace peru::media::posix

@@ -1,11 +1,11 @@
-// The sound engine and the devices it finds.
+// The sound engine and its devices.
 #pragma once
 
 #include "peru/media/posix/IPosixSystem.h"
 
 namespace peru::media::posix {
 
-// Starts the engine, and ends it with the last device. The devices are those that were there at the start.
+// Starts the engine and terminates it with the last device. Devices that appear later are not listed.
 class CSystem : public CObject, public virtual IPosixSystem {
 public:
     CSystem(); // throws CMediaException
@@ -22,7 +22,7 @@ private:
     template <class Device> P<IEnum> getDevices();
 
     const P<IMutex> m_engineMutex;
-    const bool m_hasDevices; // the engine runs only where there are any
+    const bool m_hasDevices; // false if the engine was not started
 };
 
 } // namespace peru::media::posix

@@ -5,8 +5,8 @@
 
 namespace peru::posix {
 
-// "peru::posix": makes the singletons that stand on the system, so that a machine on which one of them
-// cannot be made says so at start-up.
+// "peru::posix": creates the singletons that depend on the system, so that a machine on which one of them
+// cannot be created reports it at start-up.
 class CPackage : public CPackageBase {
 public:
     CPackage();

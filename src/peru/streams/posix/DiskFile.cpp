@@ -60,8 +60,7 @@ int getFlags(EAccess access, EOpenMode mode) {
     return flags;
 }
 
-// A trailing slash stays, so that the system refuses a URI that names a folder. Empty for a path that no
-// file can have.
+// Keeps a trailing slash so that the system refuses a URI that names a folder. Empty for an invalid path.
 std::string getFilePath(const P<IURI>& uri) {
     std::string path = tryToPath(uri);
     if (path.find('\0') != std::string::npos) return {};
@@ -212,7 +211,7 @@ int64_t CDiskFile::readSome(void* buffer, int64_t size) {
             m_cursor += count;
             done += count;
         } else if (done > 0 && !m_regular) {
-            break; // another read could wait
+            break; // another read might block
         } else if (size - done >= kBufferSize) {
             dropBuffer();
             moveTo(m_bufferStart);
@@ -270,7 +269,7 @@ void CDiskFile::flush() {
     int result;
     do result = ::fdatasync(m_handle.get());
     while (result != 0 && errno == EINTR);
-    // Pipes and devices have nothing to be synchronised.
+    // Pipes and devices cannot be synchronised.
     if (result != 0 && errno != EINVAL && errno != EROFS && errno != ENOTSUP)
         raise(kWriteError, errno, m_uri);
 }

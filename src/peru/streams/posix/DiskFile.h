@@ -1,4 +1,4 @@
-// A buffered file, on which the disk streams stand.
+// The buffered file that the disk streams are built on.
 #pragma once
 
 #include "peru/posix/PlatformFile.h"
@@ -11,27 +11,28 @@ namespace peru::posix {
 
 enum class EAccess { read, write, readWrite };
 
-// One buffer serves reading and writing in turn, so that small values cost a copy and both may be mixed.
-// Failures throw CFileAccessDeniedError or CStreamError; after close everything throws CStreamClosedError.
+// Reading and writing share one buffer, so they may be mixed freely and small transfers cost only a copy.
+// Failures throw CFileAccessDeniedError or CStreamError; after close every operation throws
+// CStreamClosedError. Not thread-safe.
 class PERU_API CDiskFile {
 public:
-    // Empty when there is no such file, or no folder to make it in. Folders are refused.
+    // Empty if the file, or the folder to create it in, does not exist. Throws CStreamError for a folder.
     static std::unique_ptr<CDiskFile> tryOpen(const P<IURI>& uri, EAccess access, EOpenMode mode);
-    // Throws CFileNotFoundError in place of the empty result.
+    // Like tryOpen, but throws CFileNotFoundError instead of returning nothing.
     static std::unique_ptr<CDiskFile> open(const P<IURI>& uri, EAccess access, EOpenMode mode);
-    // Over a regular file that is open for all that is done with it, and stands at its start.
+    // Takes over an open regular file whose file offset is 0 and whose access mode permits the intended use.
     static std::unique_ptr<CDiskFile> adopt(const P<IURI>& uri, CFileHandle handle);
-    // Writes what is buffered; an error is lost: who needs to know calls close().
+    // Writes what is buffered and ignores errors; call close() to see them.
     ~CDiskFile();
 
-    // Throws what kept the last bytes from being written; the file is closed all the same.
+    // Throws if buffered bytes cannot be written; the file is closed in any case.
     void close();
     const P<IURI>& getURI() const { return m_uri; }
     bool isAtEnd();
     int64_t readSome(void* buffer, int64_t size);
     void skip(int64_t size);
     void write(const void* buffer, int64_t size);
-    // To the disk itself: what was written before survives a loss of power.
+    // Writes through to the disk: everything written before survives a power failure.
     void flush();
     int64_t getPosition() const;
     void seek(int64_t position);
@@ -43,24 +44,24 @@ private:
 
     void checkOpen() const;
     bool fill();        // reads the next buffer load; false at the end
-    void writeBuffer(); // what could not be written stays in the buffer
-    void dropBuffer();  // of a buffer that was read; the position stays
+    void writeBuffer(); // bytes that could not be written stay in the buffer
+    void dropBuffer();  // read-ahead only; the position stays
     void moveTo(int64_t offset);
     int64_t readDirect(void* buffer, int64_t size);
-    // Answers the bytes written; less than `size` when errno tells why.
+    // Returns the number of bytes written; if less than `size`, errno holds the reason.
     int64_t writeDirect(const void* buffer, int64_t size);
 
     static constexpr int64_t kBufferSize = 64 * 1024;
 
     P<IURI> m_uri;
     CFileHandle m_handle;
-    bool m_regular; // false for pipes and devices, which have neither size nor position
+    bool m_regular; // false for pipes and devices, which have no size and no position
     std::unique_ptr<uint8_t[]> m_buffer;
     int64_t m_bufferStart = 0; // offset in the file
     int64_t m_filled = 0;      // valid bytes in the buffer
     int64_t m_cursor = 0;      // the stream's position within the buffer
-    bool m_dirty = false;      // the buffer holds bytes to be written
-    int64_t m_fileOffset = 0;  // where the system stands
+    bool m_dirty = false;      // the buffer holds bytes that have not been written
+    int64_t m_fileOffset = 0;  // the descriptor's file offset
 };
 
 } // namespace peru::posix

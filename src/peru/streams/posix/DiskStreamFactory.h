@@ -1,12 +1,12 @@
-// The factory of the streams over files.
+// Creates streams over files.
 #pragma once
 
 #include "peru/streams/StreamFactory.h"
 
 namespace peru::posix {
 
-// Knows the "file" scheme. The try forms answer nothing for a file that does not exist; the throwing ones
-// throw CFileNotFoundError for it. A file that exists and cannot be opened throws from both.
+// Supports the "file" scheme. For a file that does not exist the try forms return nothing and the get forms
+// throw CFileNotFoundError. A file that exists but cannot be opened makes both throw.
 class PERU_API CDiskStreamFactory : public CStreamFactory {
 public:
     ~CDiskStreamFactory() override;

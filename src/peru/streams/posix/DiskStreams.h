@@ -8,8 +8,8 @@
 namespace peru::posix {
 
 // Seekable, with 64-bit positions. Opening throws CFileNotFoundError, CFileAccessDeniedError or CStreamError.
-// close() reports bytes that could not be written; destruction closes without a word. flush() reaches the
-// disk itself, so it is slow.
+// close() throws if buffered bytes cannot be written; the destructor closes and ignores errors. flush() waits
+// for the disk itself, so it is slow.
 template <class Interface> class TDiskStream : public CObject, public Interface {
 public:
     explicit TDiskStream(std::unique_ptr<CDiskFile> file) : m_file(std::move(file)) {}

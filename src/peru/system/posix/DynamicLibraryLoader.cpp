@@ -26,7 +26,7 @@ private:
 };
 
 P<IDynamicLibrary> open(const std::string& name) {
-    // An empty name would answer the program itself.
+    // An empty name would return the program itself.
     void* handle = name.empty() ? nullptr : dlopen(name.c_str(), RTLD_NOW | RTLD_LOCAL);
     if (handle) return make<CDynamicLibrary>(handle);
     const char* reason = name.empty() ? "no name was given" : dlerror();
@@ -40,7 +40,7 @@ P<IDynamicLibrary> open(const std::string& name) {
 
 P<IDynamicLibrary> CDynamicLibraryLoader::load(const P<IURI>& file) {
     std::string path = toPath(file);
-    // Without a slash the platform would search its own folders.
+    // Without a slash the loader would use its search path.
     return open(path.find('/') == std::string::npos ? "./" + path : path);
 }
 

@@ -6,8 +6,8 @@
 
 namespace peru::posix {
 
-// Symbols are bound at once, so that a library that lacks one fails here and not in the middle of a job, and
-// stay the library's own.
+// Binds all symbols at once, so that a missing one is reported here and not in the middle of a job. The
+// library's symbols are not visible to other libraries.
 class CDynamicLibraryLoader : public CObject, public IDynamicLibraryLoader {
 public:
     P<IDynamicLibrary> load(const P<IURI>& file) override;

@@ -21,7 +21,7 @@ using SSegment = ElfW(Phdr);
 using SEntry = ElfW(Dyn);
 
 constexpr unsigned char kClass = sizeof(void*) == 8 ? ELFCLASS64 : ELFCLASS32;
-// More than any linker writes; what claims more is no library.
+// More than any linker writes; a file that claims more is not a valid library.
 constexpr uint64_t kMaxDynamicSize = 1024 * 1024;
 constexpr size_t kMaxName = 4096;
 
@@ -30,7 +30,7 @@ bool readAt(int file, uint64_t offset, void* buffer, size_t size) {
            ::pread(file, buffer, size, static_cast<off_t>(offset)) == static_cast<ssize_t>(size);
 }
 
-// Where the bytes of an address of the loaded library stand in the file.
+// Converts an address of the loaded library to an offset in the file.
 std::optional<uint64_t> toFileOffset(const std::vector<SSegment>& segments, uint64_t address) {
     for (const SSegment& segment : segments) {
         if (segment.p_type != PT_LOAD || address < segment.p_vaddr) continue;
@@ -40,7 +40,7 @@ std::optional<uint64_t> toFileOffset(const std::vector<SSegment>& segments, uint
     return std::nullopt;
 }
 
-// False when the file is no shared library; the name stays empty when it has none.
+// False if the file is not a shared library. The name stays empty if the library has none.
 bool readSoname(int file, std::string& soname) {
     SHeader header;
     if (!readAt(file, 0, &header, sizeof header)) return false;

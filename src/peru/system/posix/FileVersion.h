@@ -1,4 +1,4 @@
-// The version that a shared library carries.
+// The version of a shared library.
 #pragma once
 
 #include "peru/Object.h"
@@ -8,13 +8,13 @@ namespace peru::posix {
 
 class CFileVersion : public CObject {
 public:
-    // Empty when the file cannot be read or is no shared library of this machine's kind.
+    // Empty if the file cannot be read or is not a shared library of this machine's word size.
     static P<CFileVersion> read(const P<IURI>& file);
 
     // The name that programs are linked with, such as "libgio-2.0.so.0"; empty when the library has none.
     const P<IString>& getSoname() const { return m_soname; }
-    // What follows ".so." in the file's own name ("0.7400.6"), else in its SONAME; empty when neither
-    // tells. Links are followed to the file first.
+    // What follows ".so." in the file's own name after resolving links ("0.7400.6"), otherwise in its SONAME;
+    // empty if neither contains a version.
     const P<IString>& getVersion() const { return m_version; }
 
 private:

@@ -30,7 +30,7 @@ bool isHere(const P<IURI>& uri) {
     return !uri->hasHost() || uri->getHost()->isEmpty() || uri->getHost()->equalsIgnoreCase("localhost");
 }
 
-// False when a "${" is not closed.
+// False if a "${" is not closed.
 bool expand(const std::string& text, std::string& result) {
     result.clear();
     size_t pos = 0;
@@ -64,7 +64,7 @@ bool expand(const std::string& text, std::string& result) {
 P<IString> CPathes::toPlatformPath(const P<IURI>& uri, bool forDisplay) {
     if (!uri || !uri->hasPath() || !isHere(uri)) return CString::empty();
     std::string path = CString::toStdString(uri->getUnescapedPath());
-    // A path ends at its first zero byte, so that such a URI would name another file.
+    // A path ends at its first zero byte, so such a URI would name a different file.
     if (path.find('\0') != std::string::npos) return CString::empty();
     if (forDisplay && !g_utf8_validate(path.data(), static_cast<gssize>(path.size()), nullptr)) {
         char* valid = g_utf8_make_valid(path.data(), static_cast<gssize>(path.size()));
@@ -106,7 +106,7 @@ P<IString> CPathes::expandEnvironment(const CStringArg& text) {
 P<IString> CPathes::unexpandEnvironment(const CStringArg& text) {
     std::string path = CString::toStdString(text);
     std::string result = path;
-    size_t longest = 1; // of "/" nothing is said by a variable
+    size_t longest = 1; // a variable that holds "/" is never used
     for (const char* name : {"HOME", "XDG_DATA_HOME", "XDG_CONFIG_HOME", "TMPDIR"}) {
         const char* value = std::getenv(name);
         std::string folder = value ? value : "";

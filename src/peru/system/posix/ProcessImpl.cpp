@@ -22,7 +22,7 @@ void CProcessImpl::watch() {
 void CProcessImpl::collect() {
     siginfo_t info;
     int result;
-    // Leaves the child's id taken, so that terminate() cannot meet a stranger's.
+    // Does not reap the child yet: its id stays reserved, so terminate() cannot signal another process.
     do result = waitid(P_PID, static_cast<id_t>(m_id), &info, WEXITED | WNOWAIT);
     while (result != 0 && errno == EINTR);
     {

@@ -10,28 +10,29 @@
 
 namespace peru::posix {
 
-// A thread of its own waits for the child, so that an ended one is collected also when nobody asks.
+// A dedicated thread waits for the child, so that it is reaped even if nobody calls wait().
 class CProcessImpl : public CObject, public IProcess {
 public:
     explicit CProcessImpl(pid_t id);
 
-    // Starts the collecting thread, which holds the object until the child has ended. Throws CError.
+    // Starts the waiting thread, which holds a reference to the object until the child has ended. Throws
+    // CError.
     void watch();
 
     int64_t getId() const override { return m_id; }
-    // The exit code of a child that a signal ended is 128 and the signal's number; -1 when somebody else in
-    // the program collected it.
+    // The exit code is 128 plus the signal's number for a child that was killed by a signal, and -1 if other
+    // code in this program reaped the child.
     bool wait(uint32_t milliseconds, int& exitCode) override;
-    void terminate() override; // asks by SIGTERM; does nothing when the child has ended
+    void terminate() override; // sends SIGTERM; does nothing if the child has ended
 
-    // Returns when the child has ended.
+    // Waits for the child to end and reaps it.
     void collect();
 
 private:
     const pid_t m_id;
     P<ISignal> m_ended;
-    P<IMutex> m_mutex;        // guards the members below, and is held while the id is used
-    bool m_collected = false; // the system may hand out the id anew
+    P<IMutex> m_mutex;        // guards the members below and is held while the id is used
+    bool m_collected = false; // reaped; the system may reuse the id
     int m_exitCode = -1;
 };
 

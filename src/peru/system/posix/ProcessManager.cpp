@@ -48,7 +48,7 @@ private:
     posix_spawnattr_t m_attributes;
 };
 
-// A child inherits the priority of the thread that starts it. The system may refuse; then it stays.
+// A child inherits the priority of the thread that starts it. If the system refuses, the priority stays.
 void setNormalPriority(pid_t id) {
     if (getpriority(PRIO_PROCESS, static_cast<id_t>(id)) != 0)
         setpriority(PRIO_PROCESS, static_cast<id_t>(id), 0);
@@ -78,7 +78,7 @@ P<IProcess> CProcessManager::start(const P<IURI>& executable, const std::vector<
         process->watch();
         return process;
     } catch (...) {
-        // Nobody would ever collect it.
+        // Nobody would ever reap it.
         kill(id, SIGKILL);
         waitpid(id, nullptr, 0);
         throw;

@@ -6,8 +6,8 @@
 
 namespace peru::posix {
 
-// The child gets the three standard files, default signals and the parent's environment. Where the parent
-// runs with less than normal priority and may not raise it, the child does too.
+// The child gets the three standard files, default signal handling and the parent's environment. It keeps a
+// lower than normal priority of the parent if the user may not raise it.
 class CProcessManager : public CObject, public IProcessManager {
 public:
     P<IProcess> start(const P<IURI>& executable, const std::vector<P<IString>>& arguments) override;

@@ -64,7 +64,7 @@ std::string getFolderOf(const std::string& file) {
     return slash == 0 || slash == std::string::npos ? "/" : file.substr(0, slash);
 }
 
-// The folder of libperu.so; empty when the loader cannot tell.
+// The folder of libperu.so; empty if the loader does not know it.
 std::string getLibraryFolder() {
     Dl_info info;
     if (!::dladdr(reinterpret_cast<void*>(&getSystem), &info) || !info.dli_fname) return "";
@@ -72,7 +72,7 @@ std::string getLibraryFolder() {
     return file.empty() ? "" : getFolderOf(file);
 }
 
-// The library stands in "lib", "lib64" or an architecture's folder below it; what holds that is the prefix.
+// The library is in "lib", "lib64" or an architecture's folder below it; the parent folder is the prefix.
 std::string getInstallationPrefix(const std::string& libraryFolder) {
     for (std::string folder = libraryFolder; folder != "/"; folder = getFolderOf(folder)) {
         std::string name = folder.substr(folder.rfind('/') + 1);
@@ -81,7 +81,7 @@ std::string getInstallationPrefix(const std::string& libraryFolder) {
     return getFolderOf(libraryFolder);
 }
 
-// An empty folder is the temporary one.
+// An empty handle means the temporary folder.
 std::string getFolderPath(const P<IURI>& folder) {
     return toPath(folder ? folder : getSystem()->getTemporaryFolder());
 }
@@ -93,7 +93,7 @@ P<IURI> CSystem::getMainExecutableFile() {
     ssize_t length = ::readlink("/proc/self/exe", path.data(), path.size());
     if (length <= 0) return nullptr;
     path.resize(static_cast<size_t>(length));
-    // The kernel's mark on a program that was replaced while it runs.
+    // The kernel marks a program file that was replaced while the program runs.
     static const std::string kDeleted = " (deleted)";
     if (path.ends_with(kDeleted) && ::access(path.c_str(), F_OK) != 0)
         path.resize(path.size() - kDeleted.size());

@@ -10,7 +10,8 @@ namespace peru::posix {
 
 namespace {
 
-// Takes over what a dead owner left; who dies before this call leaves the mutex abandoned as it was.
+// Takes over a mutex from an owner that died. If this process dies before the call, the mutex stays
+// abandoned.
 int recover(pthread_mutex_t* mutex, int result) {
     return result == EOWNERDEAD ? pthread_mutex_consistent(mutex) : result;
 }

@@ -1,4 +1,4 @@
-// The lock that processes share by name.
+// A named lock that is shared between processes.
 #pragma once
 
 #include "peru/Object.h"
@@ -11,12 +11,12 @@ namespace peru::posix {
 
 class CMutexSegment;
 
-// Lives in a small file that only the user may open, in $XDG_RUNTIME_DIR or, where that is not set, in
-// /dev/shm. The file stays when the last process has gone. When an owner dies the next one gets the lock
+// Stored in a small file that only the user may open, in $XDG_RUNTIME_DIR or, if that is not set, in
+// /dev/shm. The file remains when the last process has gone. If an owner dies, the next one gets the lock
 // without an error.
 class CGlobalMutexImpl : public CObject, public IMutex {
 public:
-    // Any text is a name. Throws CException.
+    // Any text is a valid name. Throws CException.
     explicit CGlobalMutexImpl(const P<IString>& name);
     ~CGlobalMutexImpl() override;
 

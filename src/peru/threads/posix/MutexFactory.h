@@ -1,4 +1,4 @@
-// Makes the locks of this platform.
+// Creates this platform's locks.
 #pragma once
 
 #include "peru/Object.h"
@@ -6,7 +6,7 @@
 
 namespace peru::posix {
 
-// A mutex without a request to the global object factory, whose own mutex this is.
+// Creates a mutex without going through the global object factory, which needs one itself.
 PERU_API P<IMutex> createPlainMutex();
 
 class CMutexFactory : public CObject, public IMutexFactory {

@@ -2,7 +2,7 @@
 
 namespace peru::posix {
 
-// On this platform none of these calls fails for a recursive mutex that its owner unlocks.
+// None of these calls can fail on this platform for a recursive mutex that is unlocked by its owner.
 
 CMutexImpl::CMutexImpl() {
     pthread_mutexattr_t attributes;

@@ -16,9 +16,9 @@
 
 namespace peru::posix {
 
-// A segment is ready when the stamp says so. It is written last, under the lock of the file, so that a
-// maker that dies half way leaves a segment that the next one makes anew. A stamp of an earlier run of the
-// machine does not count: its mutex may have an owner that nobody will ever release.
+// A segment is ready once it has a stamp. The stamp is written last, under the file lock, so that the next
+// process initialises the segment again if a process dies half way. A stamp from before a reboot is invalid:
+// the mutex may have an owner that no longer exists.
 struct CMutexSegment::SLayout {
     struct SStamp {
         uint32_t version;
@@ -40,8 +40,8 @@ bool isPrivateFolder(const char* path) {
            status.st_uid == geteuid() && (status.st_mode & (S_IWGRP | S_IWOTH)) == 0;
 }
 
-// One file name for each name: what could mean something in a path is written in hexadecimal, and a name
-// that is too long for a file ends in a hash of the whole.
+// Maps each name to a distinct file name: characters that are special in paths are written in hexadecimal,
+// and a name that is too long is cut and ends in a hash of the whole name.
 std::string getFileName(const std::string& name) {
     static const char digits[] = "0123456789abcdef";
     std::string result = "tonewright-mutex-" + std::to_string(geteuid()) + "-";
@@ -58,7 +58,7 @@ std::string getFileName(const std::string& name) {
     }
     if (result.size() - start <= kLongestName) return result;
     result.resize(start + kLongestName);
-    result += '.'; // no short name has one
+    result += '.'; // names that are not cut contain no "."
     for (int shift = 60; shift >= 0; shift -= 4) result += digits[hash >> shift & 15];
     return result + '.' + std::to_string(name.size());
 }
@@ -68,7 +68,8 @@ std::string getPath(const std::string& name) {
     return std::string(isPrivateFolder(folder) ? folder : "/dev/shm") + "/" + getFileName(name);
 }
 
-// Keeps other makers out. Unlocks by itself, since a mapping keeps the lock alive after the file is closed.
+// Excludes other processes during initialisation. Unlocks explicitly: a mapping would keep the lock alive
+// after the file is closed.
 class CFileLock {
 public:
     explicit CFileLock(int descriptor) : m_descriptor(descriptor) {
@@ -89,18 +90,18 @@ private:
 void readBootId(char (&id)[40]) {
     std::memset(id, 0, sizeof id);
     CFileHandle file(::open("/proc/sys/kernel/random/boot_id", O_RDONLY | O_CLOEXEC));
-    // Without the file every run of the machine looks the same, as on a system that has no such file.
+    // Without this file segments from before a reboot cannot be recognised.
     if (file.isOpen() && ::read(file.get(), id, 36) != 36) std::memset(id, 0, sizeof id);
 }
 
-// The segments that this process has mapped.
+// The segments mapped by this process.
 struct SRegistry {
     std::mutex mutex;
     std::map<std::string, std::weak_ptr<CMutexSegment>> segments;
 };
 
 SRegistry& getRegistry() {
-    // Not destroyed: a mutex may be made or dropped by the last singletons.
+    // Never destroyed: the last singletons may still create or release a mutex.
     alignas(SRegistry) static char memory[sizeof(SRegistry)];
     static SRegistry* registry = ::new (memory) SRegistry;
     return *registry;
@@ -116,7 +117,7 @@ bool CMutexSegment::prepare(SLayout& layout) {
     readBootId(stamp.bootId);
     if (std::memcmp(&layout.stamp, &stamp, sizeof stamp) == 0) return true;
     bool current = std::memcmp(layout.stamp.bootId, stamp.bootId, sizeof stamp.bootId) == 0;
-    if (layout.stamp.version != 0 && current) return false; // another build's, and maybe in use
+    if (layout.stamp.version != 0 && current) return false; // written by another build and possibly in use
 
     std::memset(&layout, 0, sizeof layout);
     pthread_mutexattr_t attributes;
@@ -127,16 +128,16 @@ bool CMutexSegment::prepare(SLayout& layout) {
     int result = pthread_mutex_init(&layout.mutex, &attributes);
     pthread_mutexattr_destroy(&attributes);
     if (result != 0) return false;
-    // Others look at it under the lock of the file; only a maker that is killed here must not have written
-    // the stamp early.
+    // Other processes read the stamp under the file lock, so only the order of the writes of this process
+    // matters, in case it is killed here.
     std::atomic_signal_fence(std::memory_order_seq_cst);
     layout.stamp = stamp;
     return true;
 }
 
 CMutexSegment::SLayout* CMutexSegment::map(const std::string& path) {
-    // No link is followed and only a plain file of the user's own is taken, so that nobody else who may
-    // write to the folder can put something in its place.
+    // Follows no link and accepts only a regular file owned by the user, so that nobody else with write
+    // access to the folder can substitute the file.
     CFileHandle file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600));
     if (!file.isOpen()) return nullptr;
     CFileLock lock(file.get());
@@ -146,7 +147,8 @@ CMutexSegment::SLayout* CMutexSegment::map(const std::string& path) {
         (status.st_mode & 0077) != 0)
         return nullptr;
     constexpr auto size = static_cast<off_t>(sizeof(SLayout));
-    // Reserved and not only set: a full disk is an error here and not a signal at the first access.
+    // Allocated rather than only extended: a full disk is then an error here and not a SIGBUS on first
+    // access.
     if (status.st_size < size && posix_fallocate(file.get(), 0, size) != 0) return nullptr;
     void* memory = mmap(nullptr, sizeof(SLayout), PROT_READ | PROT_WRITE, MAP_SHARED, file.get(), 0);
     if (memory == MAP_FAILED) return nullptr;

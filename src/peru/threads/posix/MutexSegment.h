@@ -8,19 +8,19 @@
 
 namespace peru::posix {
 
-// Mapped once in each process, however many handles there are: the C library links a locked mutex by its
-// address into a list of its owner, so one mutex must not appear at two addresses.
+// Mapped once per process, however many handles exist: the C library links a locked mutex by its address into
+// a list of its owner, so one mutex must not appear at two addresses.
 class CMutexSegment {
 public:
-    // Empty when the segment cannot be had, or is not the user's own.
+    // Empty if the segment cannot be opened or does not belong to the user.
     static std::shared_ptr<CMutexSegment> open(const std::string& name);
     ~CMutexSegment();
     CMutexSegment(const CMutexSegment&) = delete;
     CMutexSegment& operator=(const CMutexSegment&) = delete;
 
     pthread_mutex_t* getMutex() const;
-    // A segment that goes while this process holds its mutex stays mapped, for the list's sake: the lock is
-    // then abandoned when its thread ends.
+    // If the segment object is destroyed while this process holds the mutex, the memory stays mapped because
+    // the owner's list still refers to it; the lock counts as abandoned when the owning thread ends.
     void countLock() { m_locks.fetch_add(1, std::memory_order_relaxed); }
     void countUnlock() { m_locks.fetch_sub(1, std::memory_order_relaxed); }
 

@@ -1,4 +1,4 @@
-// Makes events.
+// Creates events.
 #pragma once
 
 #include "peru/Object.h"

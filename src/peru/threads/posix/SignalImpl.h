@@ -1,4 +1,4 @@
-// The event.
+// A manual-reset event.
 #pragma once
 
 #include "peru/Object.h"
@@ -8,7 +8,7 @@
 
 namespace peru::posix {
 
-// Measures time-outs on the monotonic clock, so that setting the time of day moves none of them.
+// Time-outs use the monotonic clock, so that changing the time of day does not affect them.
 class CSignalImpl : public CObject, public ISignal {
 public:
     CSignalImpl(); // throws CError
@@ -25,7 +25,7 @@ private:
     pthread_cond_t m_condition;
     pthread_mutex_t m_mutex; // guards both members below
     bool m_isSet = false;
-    // Who waits when the signal is set goes on, also when it is reset before that thread comes to run.
+    // Releases threads that were waiting when the signal was set, even if it is reset before they run.
     uint64_t m_timesSet = 0;
 };
 

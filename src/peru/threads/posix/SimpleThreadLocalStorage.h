@@ -1,4 +1,4 @@
-// One bare thread-local word.
+// One thread-local pointer.
 #pragma once
 
 #include "peru/Object.h"

@@ -13,11 +13,11 @@
 
 namespace peru::posix {
 
-// The calling thread's object. Its destructor runs at the end of threads that were made elsewhere too.
+// The calling thread's object. The destructor also runs at the end of threads created elsewhere.
 struct SCurrentThread {
     P<CThreadImpl> thread;
     ~SCurrentThread() {
-        // Empty from here on, for destructors of the thread's storage that still ask.
+        // Emptied first, since destructors of thread-local objects may still call getCurrent().
         if (P<CThreadImpl> ending = std::move(thread)) ending->end();
     }
 };
@@ -34,7 +34,7 @@ thread_local SCurrentThread t_current;
                           {{"%ERRORDESC%", reason}}));
 }
 
-// What left a body is told and forgotten; a sink that fails as well leaves its trace on the debug output.
+// Logs an exception that escaped a body; if logging fails, falls back to the debug output.
 void logEscaped(const CException& exception) noexcept {
     try {
         getLogManager()->logException(newString("thread"), exception);
@@ -70,7 +70,7 @@ CThreadImpl::~CThreadImpl() {
 P<CThreadImpl> CThreadImpl::start(const SThreadBody& body) {
     P<CThreadImpl> thread = make<CThreadImpl>(body);
     CMutexLock lock(thread->m_joinMutex);
-    thread->addRef(); // the running thread's
+    thread->addRef(); // owned by the running thread
     int error = pthread_create(&thread->m_handle, nullptr, &CThreadImpl::enter, thread.get());
     if (error != 0) {
         thread->release();
@@ -102,7 +102,7 @@ void* CThreadImpl::enter(void* self) {
 void CThreadImpl::run() {
     runBody(m_body);
     m_bodyEnded = true;
-    m_body = SThreadBody(); // the last handle on the owner may be this one
+    m_body = SThreadBody(); // this may release the last reference to the owner
     CThreadLocalStorageManager::clearCurrentThread();
 }
 

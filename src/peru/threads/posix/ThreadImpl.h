@@ -12,21 +12,21 @@
 
 namespace peru::posix {
 
-// Holds itself while it runs; dropping the last handle does not stop it.
+// Holds a reference to itself while running; releasing the last handle does not stop it.
 class CThreadImpl : public CObject, public IThread {
 public:
     static P<CThreadImpl> start(const SThreadBody& body); // throws CError
-    // The object of the calling thread. Threads of others get one on first use.
+    // The calling thread's object. Threads created elsewhere get one on first use.
     static P<CThreadImpl> getCurrent();
     explicit CThreadImpl(const SThreadBody& body); // not running yet: see start()
     ~CThreadImpl() override;
 
-    // By any number of threads, also after the end. When it returns the thread's slots have been torn down.
-    // A thread that drops the last handle on its own owner may end up here itself: it then returns at once,
-    // where the body is done, and throws CInvalidObjectStateError while the body runs.
+    // May be called by several threads, and after the end. On return the thread's slots have been released.
+    // If a thread waits for itself, because it released the last reference to its own owner, the call returns
+    // at once when the body has finished and throws CInvalidObjectStateError while the body runs.
     void wait() override;
-    // Does nothing once the thread has ended. A step that the system does not allow the user becomes the
-    // nearest that it does: raising, even back to where the thread was before, often is not allowed.
+    // Does nothing once the thread has ended. A step that the user may not set becomes the nearest permitted
+    // one: raising a priority, even back to its former value, is often not permitted.
     void setPriority(int step) override;
 
 private:
@@ -42,11 +42,10 @@ private:
     P<IMutex> m_joinMutex; // guards m_joinable
     bool m_joinable = false;
     pthread_t m_handle{};
-    P<IMutex>
-        m_idMutex; // held while the id is used, since the system hands out the id of an ended thread anew
+    P<IMutex> m_idMutex; // held while the id is used, since the system reuses the ids of ended threads
     std::atomic<pid_t> m_id{kNotStarted};
     std::atomic<bool> m_bodyEnded{false};
-    P<ISignal> m_ended; // of a thread that was made elsewhere and cannot be joined
+    P<ISignal> m_ended; // for a thread that was created elsewhere and cannot be joined
 };
 
 } // namespace peru::posix

@@ -1,4 +1,4 @@
-// Makes the threads of this platform.
+// Creates this platform's threads.
 #pragma once
 
 #include "peru/Object.h"

@@ -14,7 +14,7 @@ struct SStep {
     int niceValue;
 };
 
-// Real-time policies are left out: a decoder that runs away at one of them takes the desktop with it.
+// No real-time policies: a runaway decoder at such a priority would freeze the desktop.
 constexpr SStep kSteps[] = {
     {SCHED_IDLE, 19},  {SCHED_BATCH, 10},  {SCHED_OTHER, 5},   {SCHED_OTHER, 0},
     {SCHED_OTHER, -5}, {SCHED_OTHER, -10}, {SCHED_OTHER, -20},
@@ -32,8 +32,8 @@ int setThreadPriority(pid_t thread, int step) {
     const SStep& wanted = kSteps[step];
     auto id = static_cast<id_t>(thread);
     sched_param parameters{};
-    // The nice value first: whether a thread may leave the idle policy depends on it. The value that the
-    // thread has already is always allowed, which ends the search at the latest.
+    // The nice value first: whether a thread may leave the idle policy depends on it. Setting the current
+    // value is always permitted, so the loop ends there at the latest.
     for (int value = wanted.niceValue; value <= kLowestNice; ++value) {
         if (setpriority(PRIO_PROCESS, id, value) == 0) break;
         if (!isRefusal(errno)) return errno;

@@ -5,8 +5,8 @@
 
 namespace peru::posix {
 
-// Gives one thread the step, or the nearest that the system allows. Answers 0 or an errno value; a missing
-// permission is none.
+// Sets a thread's step, or the nearest one that the system permits. Returns 0 or an errno value; a missing
+// permission is not an error.
 int setThreadPriority(pid_t thread, int step);
 
 } // namespace peru::posix
