@@ -1,3 +1,4 @@
+#include "peru/files/SystemCalls.h"
 #include "peru/system/ISystem.h"
 #include "support/Files.h"
 #include "support/TempFolder.h"
@@ -144,7 +145,6 @@ TEST(FileReplacement, RefusesWhatTheUserMayNotWrite) {
     const fs::path locked = folder.write("locked", "precious");
     const fs::path inside = folder.write("group", "precious");
     fs::permissions(locked, fs::perms(0444));
-    fs::create_symlink("nowhere", folder / "dangling");
     const bool root = ::geteuid() == 0;
     if (root) {
         ASSERT_EQ(::chown(folder.path().c_str(), 65534, 65534), 0);
@@ -161,11 +161,10 @@ TEST(FileReplacement, RefusesWhatTheUserMayNotWrite) {
         EXPECT_EQ(::seteuid(0), 0);
     }
     EXPECT_THROW(getSystem()->startReplacement(toURI(folder.path())), CFileError);
-    EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "dangling")), CFileNotFoundError);
     ASSERT_EQ(::mkfifo((folder / "pipe").c_str(), 0600), 0);
     EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "pipe")), CFileError);
     EXPECT_EQ(tests::readFile(locked), "precious");
-    EXPECT_EQ(countEntries(folder.path()), 4u);
+    EXPECT_EQ(countEntries(folder.path()), 3u);
 }
 
 TEST(FileReplacement, LeavesNothingWithoutCommit) {
@@ -185,4 +184,58 @@ TEST(FileReplacement, LeavesNothingWithoutCommit) {
     EXPECT_TRUE(WIFSIGNALED(status));
     EXPECT_EQ(tests::readFile(file), "old");
     EXPECT_EQ(countEntries(folder.path()), 1u);
+}
+
+TEST(FileReplacement, CreatesWhatADanglingLinkOrARelativePathNames) {
+    const CTempFolder folder;
+    fs::create_directory(folder / "sub");
+    fs::create_symlink("sub/second", folder / "first");
+    fs::create_symlink("new", folder / "sub/second");
+    fs::create_symlink("circle", folder / "circle");
+    getSystem()->replaceFile(toURI(folder / "first"), "new", 3);
+    EXPECT_EQ(tests::readFile(folder / "sub/new"), "new");
+    EXPECT_TRUE(fs::is_symlink(folder / "first") && fs::is_symlink(folder / "sub/second"));
+    EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "circle")), CFileError);
+
+    const fs::path before = fs::current_path();
+    fs::current_path(folder.path());
+    getSystem()->replaceFile(toURI("relative"), "new", 3);
+    fs::current_path(before);
+    EXPECT_EQ(tests::readFile(folder / "relative"), "new");
+    EXPECT_EQ(countEntries(folder.path()), 4u);
+}
+
+// The bytes reach the disk before the name does, also on a file system that has no hard links.
+TEST(FileReplacement, SyncsBeforeItRenamesAndIsPrivateUntilThen) {
+    const mode_t mask = ::umask(022);
+    for (const bool hasLinks : {true, false})
+        for (const mode_t mode : {0600u, 0644u, 0u}) { // 0: the file is new
+            SCOPED_TRACE(std::to_string(hasLinks) + " " + std::to_string(mode));
+            const CTempFolder folder;
+            const fs::path file = folder / "file";
+            if (mode != 0) fs::permissions(folder.write("file", "old"), fs::perms(mode));
+            std::vector<std::string> calls;
+            const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
+            replacement->getStream()->write("new", 3);
+            {
+                const tests::CSystemCalls watch([&](const std::string& call, int descriptor) {
+                    struct stat status = {};
+                    if (call == "copy_file_range" && ::fstat(descriptor, &status) == 0) {
+                        EXPECT_EQ(status.st_mode & 0777, 0600u);
+                    }
+                    calls.push_back(call);
+                    return call == "linkat" && !hasLinks ? EPERM : 0;
+                });
+                replacement->commit();
+            }
+            EXPECT_EQ(tests::readFile(file), "new");
+            EXPECT_EQ(fs::status(file).permissions(), fs::perms(mode != 0 ? mode : 0644));
+            EXPECT_EQ(countEntries(folder.path()), 1u);
+            const auto renamed = std::find(calls.begin(), calls.end(), "rename");
+            ASSERT_NE(renamed, calls.end());
+            // Without links the bytes end up in a second file, which needs an fsync of its own.
+            EXPECT_EQ(std::count(calls.begin(), renamed, "fsync"), hasLinks ? 1 : 2);
+            EXPECT_EQ(std::count(renamed, calls.end(), "fsync"), 1) << "of the folder";
+        }
+    ::umask(mask);
 }

@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <climits>
 #include <cstdio>
 #include <cstdlib>
 #include <fcntl.h>
@@ -26,12 +27,35 @@ namespace {
                      file);
 }
 
-// Resolves links. A path at which nothing exists is returned as it is; a dangling link gives an empty path.
-std::string followLinks(const std::string& path) {
-    std::unique_ptr<char, decltype(&std::free)> real(::realpath(path.c_str(), nullptr), &std::free);
-    if (real) return real.get();
-    struct stat status;
-    return errno == ENOENT && ::lstat(path.c_str(), &status) != 0 ? path : "";
+// Resolves links, also a dangling one, whose target is the file to be created. Empty on failure, with errno
+// set.
+std::string followLinks(std::string path) {
+    constexpr int kMostLinks = 40; // as many as the kernel follows
+    for (int i = 0; i < kMostLinks; ++i) {
+        std::unique_ptr<char, decltype(&std::free)> real(::realpath(path.c_str(), nullptr), &std::free);
+        if (real) return real.get();
+        if (errno != ENOENT) return "";
+        std::string target(PATH_MAX, '\0');
+        const ssize_t length = ::readlink(path.c_str(), target.data(), target.size());
+        if (length < 0) return path; // the file does not exist
+        target.resize(static_cast<size_t>(length));
+        path = target.starts_with('/') ? target : path.substr(0, path.rfind('/') + 1) + target;
+    }
+    errno = ELOOP;
+    return "";
+}
+
+// The mode of an ordinary new file in the folder, as decided by the umask and a default access list.
+mode_t getNewFileMode(const std::string& folder) {
+    struct stat status = {};
+    int error = 0;
+    const std::string path = createUnique(folder, ".new-", "", error, [&](const std::string& name) {
+        const CFileHandle file(::open(name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+        return file.isOpen() && ::fstat(file.get(), &status) == 0 ? 0 : errno;
+    });
+    if (path.empty()) return 0600;
+    ::unlink(path.c_str());
+    return status.st_mode & 0777;
 }
 
 // A path to a file that has no name. Without /proc an ordinary user has no other way to link such a file.
@@ -111,7 +135,8 @@ STemporaryName::~STemporaryName() {
 
 CFileReplacement::CFileReplacement(const P<IURI>& file) : m_uri(file) {
     m_target = followLinks(toPath(file));
-    if (m_target.empty()) raise(errno ? errno : ENOENT, file);
+    if (m_target.empty()) raise(errno, file);
+    if (m_target.find('/') == std::string::npos) m_target.insert(0, "./");
     m_folder = m_target.substr(0, m_target.rfind('/') + 1);
     openOld();
     openNew();
@@ -138,18 +163,22 @@ void CFileReplacement::openOld() {
 }
 
 void CFileReplacement::openNew() {
-    // Nobody else may read it before it has the old file's permissions.
+    // Nobody can open the unnamed file, so it may have its final mode from the start.
     const mode_t mode = m_old.isOpen() ? 0600 : 0666;
     m_new = CFileHandle(::open(m_folder.c_str(), O_TMPFILE | O_RDWR | O_CLOEXEC, mode));
     if (m_new.isOpen() && ::access(getDescriptorPath(m_new.get()).c_str(), F_OK) == 0) return;
     if (!m_new.isOpen() && errno != EOPNOTSUPP && errno != EISDIR && errno != EINVAL && errno != ENOENT)
         raise(errno, m_uri);
+    if (int error = openNamed(m_new)) raise(error, m_uri);
+}
+
+int CFileReplacement::openNamed(CFileHandle& file) {
     int error = 0;
     m_name.path = createUnique(m_folder, ".new-", "", error, [&](const std::string& name) {
-        m_new = CFileHandle(::open(name.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, mode));
-        return m_new.isOpen() ? 0 : errno;
+        file = CFileHandle(::open(name.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+        return file.isOpen() ? 0 : errno;
     });
-    if (error != 0) raise(error, m_uri);
+    return error;
 }
 
 P<ISeekableIOStream> CFileReplacement::getStream() {
@@ -182,10 +211,10 @@ void CFileReplacement::copyFromOld(int64_t offset, int64_t size) {
     m_stream->seek(position + size);
 }
 
-int CFileReplacement::giveName(std::string& name) {
+int CFileReplacement::giveName() {
     int error = 0;
     const std::string descriptor = getDescriptorPath(m_new.get());
-    name = createUnique(m_folder, ".new-", "", error, [&](const std::string& beside) {
+    m_name.path = createUnique(m_folder, ".new-", "", error, [&](const std::string& beside) {
         return ::linkat(AT_FDCWD, descriptor.c_str(), AT_FDCWD, beside.c_str(), AT_SYMLINK_FOLLOW) == 0
                    ? 0
                    : errno;
@@ -193,12 +222,33 @@ int CFileReplacement::giveName(std::string& name) {
     return error;
 }
 
-int CFileReplacement::finish() {
-    if (m_old.isOpen())
+int CFileReplacement::copyToNamed() {
+    CFileHandle named;
+    struct stat status;
+    if (::fstat(m_new.get(), &status) != 0) return errno;
+    if (int error = openNamed(named)) return error;
+    int64_t copied = 0;
+    if (int error = copyRange(m_new.get(), 0, named.get(), 0, status.st_size, copied)) return error;
+    if (copied != status.st_size) return EIO;
+    m_new = std::move(named);
+    return finishContent();
+}
+
+int CFileReplacement::finishContent() {
+    if (m_old.isOpen()) {
         if (int error = takeOverAttributes(m_old.get(), m_new.get())) return error;
-    if (::fsync(m_new.get()) != 0) return errno;
-    if (m_name.path.empty())
-        if (int error = giveName(m_name.path)) return error;
+    } else if (!m_name.path.empty()) {
+        // File systems without modes refuse to set one.
+        static_cast<void>(::fchmod(m_new.get(), getNewFileMode(m_folder)));
+    }
+    return ::fsync(m_new.get()) == 0 ? 0 : errno;
+}
+
+int CFileReplacement::finish() {
+    if (int error = finishContent()) return error;
+    // A file system without hard links cannot name the unnamed file; its content must not be lost for that.
+    if (m_name.path.empty() && giveName() != 0)
+        if (int error = copyToNamed()) return error;
     if (::rename(m_name.path.c_str(), m_target.c_str()) != 0) return errno;
     m_name.path.clear();
     return 0;

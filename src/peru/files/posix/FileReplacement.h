@@ -31,7 +31,8 @@ struct STemporaryName {
 // content, since changing them too would mean writing in place.
 class CFileReplacement : public CObject, public IFileReplacement {
 public:
-    // The file need not exist. Throws CFileError, or CFileAccessDeniedError if the user may not write the
+    // The file need not exist; a dangling link creates its target. Throws CFileError, or
+    // CFileAccessDeniedError if the user may not write the
     // file or its folder.
     explicit CFileReplacement(const P<IURI>& file);
     ~CFileReplacement() override;
@@ -43,8 +44,11 @@ public:
 private:
     void openOld();
     void openNew();
-    // Both return 0 or an errno value.
-    int giveName(std::string& name);
+    // All return 0 or an errno value.
+    int openNamed(CFileHandle& file); // a hidden file that only the user can open; sets m_name
+    int giveName();                   // links the unnamed file; sets m_name
+    int copyToNamed();                // in place of giveName
+    int finishContent();              // attributes and fsync
     int finish();
 
     P<IURI> m_uri;
