@@ -19,22 +19,23 @@ void checkStreamSize(int64_t size, const char* method) {
 void readFully(IInStream& stream, void* buffer, int64_t size) {
     checkStreamSize(size, "IInStream::read");
     uint8_t* target = static_cast<uint8_t*>(buffer);
-    while (size > 0) {
+    // At least one call, since reading 0 bytes from a closed stream must throw.
+    do {
         const int64_t count = stream.readSome(target, size);
-        if (count <= 0) throw CEndOfStreamError(stream.getURI());
+        if (count <= 0 && size > 0) throw CEndOfStreamError(stream.getURI());
         target += count;
         size -= count;
-    }
+    } while (size > 0);
 }
 
 void skipByReading(IInStream& stream, int64_t size) {
     checkStreamSize(size, "IInStream::skip");
     std::array<uint8_t, 4096> dropped;
-    while (size > 0) {
+    do {
         const int64_t count = stream.readSome(dropped.data(), std::min<int64_t>(size, dropped.size()));
-        if (count <= 0) throw CEndOfStreamError(stream.getURI());
+        if (count <= 0 && size > 0) throw CEndOfStreamError(stream.getURI());
         size -= count;
-    }
+    } while (size > 0);
 }
 
 int64_t copyStream(IInStream& source, IOutStream& target) {

@@ -1,4 +1,7 @@
 #include "peru/Errors.h"
+#include "peru/files/SystemCalls.h"
+#include "peru/streams/Base64Streams.h"
+#include "peru/streams/BufferedIOStream.h"
 #include "peru/streams/MemoryIOStream.h"
 #include "peru/streams/StreamManager.h"
 #include "peru/streams/StringStreams.h"
@@ -7,6 +10,8 @@
 #include "support/Files.h"
 #include "support/TempFolder.h"
 
+#include <atomic>
+#include <chrono>
 #include <cstring>
 #include <functional>
 #include <random>
@@ -32,9 +37,11 @@ void compareWithModel(const P<ISeekableIOStream>& stream, int64_t largest, unsig
     std::string model;
     size_t position = 0;
     std::string bytes;
+    P<IStreamMarker> marker = stream->createMarker();
+    size_t marked = 0;
     for (int i = 0; i < 3000; ++i) {
         const size_t size = random() % 8 == 0 ? random() % static_cast<size_t>(largest) : random() % 64;
-        switch (random() % 6) {
+        switch (random() % 7) {
         case 0:
         case 1: {
             bytes.assign(size, '\0');
@@ -62,6 +69,15 @@ void compareWithModel(const P<ISeekableIOStream>& stream, int64_t largest, unsig
             stream->seek(static_cast<int64_t>(position));
             break;
         case 5:
+            if (random() % 2 == 0) {
+                marker = stream->createMarker();
+                marked = position;
+            } else {
+                marker->restore();
+                position = marked;
+            }
+            break;
+        case 6:
             if (random() % 16 == 0) {
                 model.resize(random() % (model.size() + 100));
                 stream->setSize(static_cast<int64_t>(model.size()));
@@ -97,21 +113,45 @@ TEST(MemoryIOStream, GrowsByDoubling) {
     EXPECT_LE(moves, 16);
 }
 
-TEST(Streams, ClosedOnesSayTheirName) {
+TEST(Streams, RefuseEverythingOnceClosed) {
     const tests::CTempFolder folder;
     const P<IURI> uri = toURI(folder.write("file", "abc"));
-    const P<CDiskIOStream> stream = make<CDiskIOStream>(uri, EOpenMode::open);
-    stream->close();
-    stream->close();
     char c = 0;
-    const std::function<void()> operations[] = {
-        [&] { stream->readSome(&c, 1); }, [&] { stream->read(&c, 1); },   [&] { stream->skip(1); },
-        [&] { stream->write(&c, 1); },    [&] { stream->flush(); },       [&] { stream->seek(0); },
-        [&] { stream->reset(); },         [&] { stream->getPosition(); }, [&] { stream->getSize(); },
-        [&] { stream->setSize(0); },      [&] { stream->isAtEnd(); },     [&] { stream->createMarker(); },
-    };
-    for (const auto& operation : operations)
-        EXPECT_NE(errorOf<CStreamClosedError>(operation).find(text(uri->getAsString())), std::string::npos);
+    for (const P<IStreamBase>& stream : std::vector<P<IStreamBase>>{
+             make<CDiskIOStream>(uri, EOpenMode::open), make<CMemoryIOStream>(nullptr, uri),
+             make<CStringInStream>(newString("abc")), make<CStringOutStream>(),
+             make<CBufferedIOStream>(nullptr),
+             make<CBase64InStream>(make<CStringInStream>(newString("QUJD"))),
+             make<CBase64OutStream>(make<CStringOutStream>())}) {
+        stream->close();
+        stream->close();
+        std::vector<std::function<void()>> operations{[&] { stream->isAtEnd(); }};
+        if (const auto in = tryCast<IInStream>(stream))
+            for (const int64_t size : {0, 1}) {
+                operations.push_back([in, size, &c] { in->read(&c, size); });
+                operations.push_back([in, size, &c] { in->readSome(&c, size); });
+                operations.push_back([in, size] { in->skip(size); });
+            }
+        if (const auto out = tryCast<IOutStream>(stream)) {
+            operations.push_back([out, &c] { out->write(&c, 0); });
+            operations.push_back([out] { out->flush(); });
+        }
+        if (const auto resetable = tryCast<IResetableStream>(stream)) {
+            operations.push_back([resetable] { resetable->reset(); });
+            operations.push_back([resetable] { resetable->getPosition(); });
+        }
+        if (const auto seekable = tryCast<ISeekableStream>(stream)) {
+            operations.push_back([seekable] { seekable->seek(0); });
+            operations.push_back([seekable] { seekable->getSize(); });
+            operations.push_back([seekable] { seekable->createMarker(); });
+        }
+        if (const auto sized = tryCast<ISeekableOutStream>(stream))
+            operations.push_back([sized] { sized->setSize(0); });
+        const std::string name = stream->getURI() ? text(stream->getURI()->getAsString()) : "";
+        for (size_t i = 0; i < operations.size(); ++i)
+            EXPECT_NE(errorOf<CStreamClosedError>(operations[i]).find(name), std::string::npos)
+                << typeid(*stream.get()).name() << " " << i;
+    }
 }
 
 TEST(Streams, ShortReadNamesTheStream) {
@@ -158,16 +198,12 @@ TEST(DiskStream, WhatCannotBeOpenedSaysWhy) {
         EXPECT_NE(error.find("Is a directory"), std::string::npos) << error;
         EXPECT_NE(error.find(folder.path().filename().string()), std::string::npos) << error;
     }
-    // Refused even for root.
-    if (::access("/proc/version", F_OK) == 0) {
-        const std::string large(70000, 'x');
-        EXPECT_THROW(write(*make<CDiskOutStream>(make<CURI>("file:///proc/version"), EOpenMode::open), large),
-                     CURIError);
-    }
-    if (::geteuid() != 0) {
-        ::chmod((folder / "file").c_str(), 0);
-        EXPECT_THROW(make<CDiskInStream>(toURI(folder / "file")), CFileAccessDeniedError);
-    }
+    // As an ordinary user, even if the tests run as root.
+    ::chmod((folder / "file").c_str(), 0);
+    const bool root = ::geteuid() == 0;
+    ASSERT_EQ(root ? ::seteuid(65534) : 0, 0);
+    EXPECT_THROW(make<CDiskInStream>(toURI(folder / "file")), CFileAccessDeniedError);
+    EXPECT_EQ(root ? ::seteuid(0) : 0, 0);
 }
 
 TEST(DiskStream, FullDiskIsReported) {
@@ -200,23 +236,35 @@ TEST(DiskStream, PositionsGoBeyond32Bits) {
     EXPECT_EQ(readAll(*stream), std::string("\0end", 4));
 }
 
-TEST(DiskStream, ReadsPipes) {
+// Opening must not wait for the other end of a FIFO either.
+TEST(DiskStream, RefusesWhatIsNoRegularFile) {
     const tests::CTempFolder folder;
-    const auto pipe = folder / "pipe";
+    const auto pipe = folder / "pipe", socket = folder / "socket";
     ASSERT_EQ(::mkfifo(pipe.c_str(), 0600), 0);
-    const std::string bytes(300000, 'p');
-    std::thread writer([&] {
-        const P<CDiskOutStream> out = make<CDiskOutStream>(toURI(pipe), EOpenMode::open);
-        write(*out, bytes);
-        out->flush();
-        out->close();
+    ASSERT_EQ(::mknod(socket.c_str(), S_IFSOCK | 0600, 0), 0);
+    for (const auto& path : {pipe, socket}) {
+        const P<IURI> uri = toURI(path);
+        const std::string expected = "The file '" + text(uri->getAsString()) + "' is not a regular file.";
+        EXPECT_EQ(errorOf<CStreamError>([&] { make<CDiskInStream>(uri); }), expected);
+        EXPECT_EQ(errorOf<CStreamError>([&] { make<CDiskOutStream>(uri, EOpenMode::open); }), expected);
+        EXPECT_EQ(errorOf<CStreamError>([&] { make<CDiskIOStream>(uri, EOpenMode::create); }), expected);
+    }
+    EXPECT_THROW(make<CDiskInStream>(make<CURI>("file:///dev/zero")), CStreamError);
+}
+
+TEST(DiskStream, FlushReachesTheDiskAndReportsItsErrors) {
+    const tests::CTempFolder folder;
+    const P<CDiskOutStream> stream = make<CDiskOutStream>(toURI(folder / "file"), EOpenMode::create);
+    write(*stream, "abc");
+    int synced = 0;
+    const tests::CSystemCalls watch([&](const std::string& call, int) {
+        EXPECT_EQ(call, "fdatasync");
+        EXPECT_EQ(tests::readFile(folder / "file"), "abc");
+        return ++synced == 1 ? 0 : EIO;
     });
-    const P<CDiskInStream> in = make<CDiskInStream>(toURI(pipe));
-    in->skip(1000);
-    EXPECT_EQ(readAll(*in).size(), bytes.size() - 1000);
-    EXPECT_TRUE(in->isAtEnd());
-    EXPECT_THROW(in->seek(0), CStreamError);
-    writer.join();
+    stream->flush();
+    EXPECT_EQ(synced, 1);
+    EXPECT_THROW(stream->flush(), CStreamError);
 }
 
 // Supports one URI and returns its own name as content.
@@ -264,6 +312,35 @@ TEST(StreamManager, LetsAFactoryChangeTheListWhileItIsAsked) {
     manager->addFactory(make<CBringingFactory>(*manager));
     const P<IURI> uri = make<CURI>("res:x");
     EXPECT_EQ(readAll(*manager->getInStream(uri)), "brought");
+}
+
+// Starts a thread that changes the list, which must wait until this factory has been asked.
+class CContestedFactory : public CStreamFactory {
+public:
+    explicit CContestedFactory(IStreamManager& manager) : m_manager(manager) {}
+    P<IInStream> tryGetInStream(const P<IURI>&) override {
+        m_other = std::thread([this] {
+            m_manager.removeFactory(P<IStreamFactory>::share(this));
+            m_removed = true;
+        });
+        std::this_thread::sleep_for(std::chrono::milliseconds(30));
+        EXPECT_FALSE(m_removed);
+        return nullptr;
+    }
+    void join() { m_other.join(); }
+
+private:
+    IStreamManager& m_manager;
+    std::thread m_other;
+    std::atomic<bool> m_removed{false};
+};
+
+TEST(StreamManager, LocksOutOtherThreadsWhileItAsks) {
+    const P<CStreamManager> manager = make<CStreamManager>();
+    const P<CContestedFactory> factory = make<CContestedFactory>(*manager);
+    manager->addFactory(factory);
+    EXPECT_FALSE(manager->tryGetInStream(make<CURI>("res:x")));
+    factory->join();
 }
 
 TEST(StreamManager, TellsMissingFilesFromUnknownKinds) {

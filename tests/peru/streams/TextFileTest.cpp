@@ -4,6 +4,8 @@
 #include "support/Files.h"
 #include "support/TempFolder.h"
 
+#include <clocale>
+
 namespace {
 
 using namespace peru;
@@ -24,9 +26,12 @@ TEST(TextFileReader, KnowsTheMarks) {
         std::vector<std::string> lines;
     };
     const tests::CTempFolder folder;
+    const std::string locale = std::setlocale(LC_CTYPE, nullptr);
+    ASSERT_TRUE(std::setlocale(LC_CTYPE, "C.UTF-8"));
     for (const SCase& c : {
              SCase{"", ETextMark::none, {}},
              {"a\nb", ETextMark::none, {"a", "b"}},
+             {"\xC3\xA4", ETextMark::none, {"\xC3\xA4"}}, // in the code page
              {"\xEF\xBB\xBF", ETextMark::utf8, {}},
              {"\xEF\xBB\xBF\xC3\xA4\nb", ETextMark::utf8, {"\xC3\xA4", "b"}},
              {"\xFF\xFE\xE4\0\n\0b\0"s, ETextMark::utf16, {"\xC3\xA4", "b"}},
@@ -37,6 +42,7 @@ TEST(TextFileReader, KnowsTheMarks) {
         EXPECT_EQ(reader->getMark(), c.mark) << c.bytes;
         EXPECT_EQ(readLines(reader), c.lines) << c.bytes;
     }
+    std::setlocale(LC_CTYPE, locale.c_str());
     EXPECT_EQ(make<CTextFileReader>(toURI(folder.write("text", "\xEF\xBB")))->getMark(), ETextMark::none);
 }
 

@@ -22,6 +22,7 @@ struct SText {
 };
 
 constexpr SText kOpenError{"peru.CDiskFile.openError", "The file '%URI%' could not be opened: %ERRORDESC%."};
+constexpr SText kKindError{"peru.CDiskFile.kindError", "The file '%URI%' is not a regular file."};
 constexpr SText kReadError{"peru.CDiskFile.readError", "The file '%URI%' could not be read: %ERRORDESC%."};
 constexpr SText kWriteError{"peru.CDiskFile.writeError",
                             "The file '%URI%' could not be written: %ERRORDESC%."};
@@ -36,7 +37,7 @@ constexpr SText kSizeError{"peru.CDiskFile.sizeError",
 }
 
 int getFlags(EAccess access, EOpenMode mode) {
-    int flags = O_CLOEXEC | O_NOCTTY;
+    int flags = O_CLOEXEC | O_NOCTTY | O_NONBLOCK;
     switch (access) {
     case EAccess::read:
         return flags | O_RDONLY;
@@ -58,6 +59,11 @@ int getFlags(EAccess access, EOpenMode mode) {
         return flags | O_CREAT;
     }
     return flags;
+}
+
+// Devices may only be written.
+bool isAccepted(mode_t kind, EAccess access) {
+    return S_ISREG(kind) || (access == EAccess::write && (S_ISCHR(kind) || S_ISBLK(kind)));
 }
 
 // Keeps a trailing slash so that the system refuses a URI that names a folder. Empty for an invalid path.
@@ -83,6 +89,10 @@ CDiskFile::~CDiskFile() {
 std::unique_ptr<CDiskFile> CDiskFile::tryOpen(const P<IURI>& uri, EAccess access, EOpenMode mode) {
     const std::string path = getFilePath(uri);
     if (path.empty()) return nullptr;
+    // Checked before opening: that may block or have side effects on anything but a regular file.
+    struct stat info;
+    if (::stat(path.c_str(), &info) == 0 && !S_ISDIR(info.st_mode) && !isAccepted(info.st_mode, access))
+        raise(kKindError, EINVAL, uri);
     int descriptor;
     do descriptor = ::open(path.c_str(), getFlags(access, mode), 0666);
     while (descriptor < 0 && errno == EINTR);
@@ -92,9 +102,10 @@ std::unique_ptr<CDiskFile> CDiskFile::tryOpen(const P<IURI>& uri, EAccess access
     }
 
     CFileHandle handle(descriptor);
-    struct stat info;
     if (::fstat(descriptor, &info) != 0) raise(kOpenError, errno, uri);
     if (S_ISDIR(info.st_mode)) raise(kOpenError, EISDIR, uri);
+    if (!isAccepted(info.st_mode, access)) raise(kKindError, EINVAL, uri);
+    if (!S_ISREG(info.st_mode)) ::fcntl(descriptor, F_SETFL, ::fcntl(descriptor, F_GETFL) & ~O_NONBLOCK);
     std::unique_ptr<CDiskFile> file(new CDiskFile(uri, std::move(handle), S_ISREG(info.st_mode)));
     if (mode == EOpenMode::append && access != EAccess::read && file->m_regular) file->seek(info.st_size);
     return file;
@@ -194,8 +205,7 @@ bool CDiskFile::fill() {
 
 bool CDiskFile::isAtEnd() {
     checkOpen();
-    if (m_regular) return getPosition() >= getSize();
-    return !m_dirty && m_cursor == m_filled && !fill();
+    return getPosition() >= getSize();
 }
 
 int64_t CDiskFile::readSome(void* buffer, int64_t size) {
@@ -210,8 +220,6 @@ int64_t CDiskFile::readSome(void* buffer, int64_t size) {
             std::memcpy(target + done, m_buffer.get() + m_cursor, static_cast<size_t>(count));
             m_cursor += count;
             done += count;
-        } else if (done > 0 && !m_regular) {
-            break; // another read might block
         } else if (size - done >= kBufferSize) {
             dropBuffer();
             moveTo(m_bufferStart);
@@ -229,17 +237,8 @@ int64_t CDiskFile::readSome(void* buffer, int64_t size) {
 void CDiskFile::skip(int64_t size) {
     checkOpen();
     checkStreamSize(size, "IInStream::skip");
-    if (m_regular) {
-        if (size > getSize() - getPosition()) throw CEndOfStreamError(m_uri);
-        seek(getPosition() + size);
-        return;
-    }
-    while (size > 0) {
-        if (m_cursor == m_filled && !fill()) throw CEndOfStreamError(m_uri);
-        const int64_t count = std::min(size, m_filled - m_cursor);
-        m_cursor += count;
-        size -= count;
-    }
+    if (size > getSize() - getPosition()) throw CEndOfStreamError(m_uri);
+    seek(getPosition() + size);
 }
 
 void CDiskFile::write(const void* buffer, int64_t size) {
@@ -269,7 +268,7 @@ void CDiskFile::flush() {
     int result;
     do result = ::fdatasync(m_handle.get());
     while (result != 0 && errno == EINTR);
-    // Pipes and devices cannot be synchronised.
+    // Devices cannot be synchronised.
     if (result != 0 && errno != EINVAL && errno != EROFS && errno != ENOTSUP)
         raise(kWriteError, errno, m_uri);
 }

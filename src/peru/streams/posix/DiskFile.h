@@ -16,7 +16,8 @@ enum class EAccess { read, write, readWrite };
 // CStreamClosedError. Not thread-safe.
 class PERU_API CDiskFile {
 public:
-    // Empty if the file, or the folder to create it in, does not exist. Throws CStreamError for a folder.
+    // Empty if the file, or the folder to create it in, does not exist. Never blocks. Throws CStreamError for
+    // anything but a regular file, except that devices may be opened for writing only.
     static std::unique_ptr<CDiskFile> tryOpen(const P<IURI>& uri, EAccess access, EOpenMode mode);
     // Like tryOpen, but throws CFileNotFoundError instead of returning nothing.
     static std::unique_ptr<CDiskFile> open(const P<IURI>& uri, EAccess access, EOpenMode mode);
@@ -55,7 +56,7 @@ private:
 
     P<IURI> m_uri;
     CFileHandle m_handle;
-    bool m_regular; // false for pipes and devices, which have no size and no position
+    bool m_regular; // false for devices, which have no size and no position
     std::unique_ptr<uint8_t[]> m_buffer;
     int64_t m_bufferStart = 0; // offset in the file
     int64_t m_filled = 0;      // valid bytes in the buffer
