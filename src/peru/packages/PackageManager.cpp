@@ -23,8 +23,7 @@ void CPackageManager::registerPackage(const P<IPackage>& package) {
     CMutexLock lock(m_mutex);
     if (findPackage(package->getName())) return;
     m_known.push_back(package);
-    for (size_t i = 0; IPackageListener* listener = m_listeners->at(i); ++i)
-        listener->packageRegistered(package);
+    notify(package, &IPackageListener::packageRegistered);
 }
 
 P<IPackage> CPackageManager::findPackage(const CStringArg& name) {
@@ -52,8 +51,16 @@ void CPackageManager::activate(const P<IPackage>& package) {
     std::erase(m_activating, package);
     if (contains(m_active, package)) return;
     m_active.push_back(package);
-    for (size_t i = 0; IPackageListener* listener = m_listeners->at(i); ++i)
-        listener->packageActivated(package);
+    notify(package, &IPackageListener::packageActivated);
+}
+
+void CPackageManager::notify(const P<IPackage>& package,
+                             void (IPackageListener::*event)(const P<IPackage>&)) {
+    // Over a copy, since a listener may remove itself or others during its call.
+    std::vector<IPackageListener*> listeners;
+    for (size_t i = 0; i < m_listeners->getCount(); ++i) listeners.push_back(m_listeners->at(i));
+    for (IPackageListener* listener : listeners)
+        if (m_listeners->contains(listener)) (listener->*event)(package);
 }
 
 bool CPackageManager::activateByName(const CStringArg& name) {

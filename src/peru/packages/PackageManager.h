@@ -25,6 +25,8 @@ private:
     using CPackages = std::vector<P<IPackage>>;
     static bool contains(const CPackages& packages, const P<IPackage>& package);
 
+    void notify(const P<IPackage>& package, void (IPackageListener::*event)(const P<IPackage>&));
+
     P<IMutex> m_mutex; // guards everything below
     CPackages m_known;
     CPackages m_active;

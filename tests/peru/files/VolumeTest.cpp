@@ -3,10 +3,15 @@
 
 #include "peru/files/MountTable.h"
 #include "peru/files/posix/VolumeManager.h"
+#include "peru/threads/ISignal.h"
 
 #include <chrono>
+#include <sched.h>
+#include <sys/mount.h>
 #include <sys/statvfs.h>
+#include <sys/wait.h>
 #include <thread>
+#include <unistd.h>
 
 using namespace peru;
 using tests::CTempFolder;
@@ -39,6 +44,7 @@ private:
     void note(const char* what, const P<IFileSystemVolume>& volume) {
         log.push_back(what + text(volume->getLabel()));
         if (leave) leave->removeListener(this);
+        throw 1; // must not affect the other listeners
     }
 };
 
@@ -148,4 +154,31 @@ TEST(VolumeManager, WatchesOnlyWhileSomebodyListens) {
         manager->removeListener(second.get());
         ASSERT_TRUE(comesDownTo(before));
     }
+}
+
+// In a child with mounts of its own.
+TEST(VolumeManager, ReportsWhatIsMountedWhileItWatches) {
+    class CSignalling : public CObject, public IFileSystemVolumeListener {
+    public:
+        void volumeArrived(const P<IFileSystemVolume>&) override { arrived->set(); }
+        void volumeLeft(const P<IFileSystemVolume>&) override { left->set(); }
+        const P<ISignal> arrived = getSignalFactory()->createSignal(),
+                         left = getSignalFactory()->createSignal();
+    };
+    const CTempFolder folder;
+    const pid_t child = ::fork();
+    if (child == 0) {
+        if (::unshare(CLONE_NEWNS) != 0 && ::unshare(CLONE_NEWUSER | CLONE_NEWNS) != 0) ::_exit(2);
+        if (::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0) ::_exit(2);
+        const P<CSignalling> listener = make<CSignalling>();
+        getVolumeManager()->addListener(listener.get());
+        if (::mount("/dev/volume", folder.path().c_str(), "tmpfs", 0, nullptr) != 0) ::_exit(2);
+        if (!listener->arrived->wait(20000)) ::_exit(3);
+        ::umount(folder.path().c_str());
+        ::_exit(listener->left->wait(20000) ? 0 : 4);
+    }
+    int status = 0;
+    ASSERT_EQ(::waitpid(child, &status, 0), child);
+    if (WEXITSTATUS(status) == 2) GTEST_SKIP() << "this user may not mount anything";
+    EXPECT_EQ(status, 0);
 }

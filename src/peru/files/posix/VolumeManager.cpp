@@ -175,15 +175,16 @@ void CVolumeManager::update() {
 }
 
 void CVolumeManager::notify(const P<CFileSystemVolume>& volume,
-                            void (IFileSystemVolumeListener::*tell)(const P<IFileSystemVolume>&)) {
+                            void (IFileSystemVolumeListener::*event)(const P<IFileSystemVolume>&)) {
     m_notifying = true;
-    // By index and from the end: a listener may remove itself during its call.
-    for (size_t i = m_listeners->getCount(); i-- > 0;) {
-        IFileSystemVolumeListener* listener = m_listeners->at(i);
-        if (!listener) continue;
+    // Over a copy, since a listener may remove itself or others during its call.
+    std::vector<IFileSystemVolumeListener*> listeners;
+    for (size_t i = m_listeners->getCount(); i-- > 0;) listeners.push_back(m_listeners->at(i));
+    for (IFileSystemVolumeListener* listener : listeners) {
+        if (!m_listeners->contains(listener)) continue;
         try {
-            (listener->*tell)(volume);
-        } catch (const std::exception&) {
+            (listener->*event)(volume);
+        } catch (...) {
             // A failing listener must not affect the others.
         }
     }

@@ -37,7 +37,7 @@ private:
     CVolumes readVolumes() const;
     void updateFrom(const CMountWatcher* watcher);
     void notify(const P<CFileSystemVolume>& volume,
-                void (IFileSystemVolumeListener::*tell)(const P<IFileSystemVolume>&));
+                void (IFileSystemVolumeListener::*event)(const P<IFileSystemVolume>&));
     void waitForRetired();
 
     const std::string m_mountTable;
