@@ -22,7 +22,7 @@ CEncoderFormat::~CEncoderFormat() {
     try {
         CEncoderFormat::close();
     } catch (...) {
-        // Who wants to know calls close().
+        // Callers that need the error call close().
     }
 }
 
@@ -47,7 +47,7 @@ void CEncoderFormat::open() {
 void CEncoderFormat::close() {
     const std::unique_ptr<COutputFile> output = std::move(m_output);
     const std::unique_ptr<IEncoder> encoder = std::move(m_encoder);
-    // A failed write has been told, and what lies behind it cannot be completed.
+    // The failed write has already been reported, and the rest cannot be completed.
     if (!output || m_failed) return;
     encoder->finish();
     output->close();

@@ -24,7 +24,7 @@ public:
     ~CEncoderFormat() override; // closes without a word
 
     bool isOpened() override { return m_output != nullptr; }
-    void open() override; // nothing on an open format
+    void open() override; // does nothing on an open format
     void close() override;
     P<peru::IURI> getURI() override { return m_file.uri; }
     P<peru::IString> getPluginName() override { return m_pluginName; }
@@ -33,7 +33,7 @@ public:
     int getSampleRate() override { return m_settings.format.rate; }
     int getChannelCount() override { return m_settings.format.channels; }
     int getBytesPerSample() override { return m_settings.format.bytesPerSample; }
-    void setAudioQuality(double fQuality) override; // what lies outside 0.0 to 1.0 is moved inside
+    void setAudioQuality(double fQuality) override; // clamped to 0.0 to 1.0
     void setAudioBitRate(int nNominal, int nMin, int nMax) override;
     void writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) override;
 
@@ -43,7 +43,7 @@ private:
     P<peru::IString> m_pluginName;
     SMediaFile m_file;
     EncoderFactory m_makeEncoder;
-    std::unique_ptr<IEncoder> m_estimator; // never opened
+    std::unique_ptr<IEncoder> m_estimator; // used for estimates only, never opened
     SEncoderSettings m_settings;
     std::unique_ptr<COutputFile> m_output;           // while open
     std::unique_ptr<IEncoder> m_encoder;             // writes to the output

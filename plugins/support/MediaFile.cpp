@@ -36,7 +36,7 @@ P<peru::IString> SMediaFile::getDisplayName() const {
 
 InputFile openForReading(const SMediaFile& file) {
     std::error_code error;
-    // A pipe would block, and a codec needs to go back and forth.
+    // A pipe would block, and a codec needs to seek.
     const std::filesystem::file_status status = std::filesystem::status(file.path, error);
     if (error) failSystem("could not open", file, error.value());
     if (std::filesystem::is_directory(status)) failSystem("could not open", file, EISDIR);

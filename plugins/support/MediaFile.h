@@ -1,4 +1,4 @@
-// The file that a plug-in reads or writes, and the shape of the sound in it.
+// The file that a plug-in reads or writes, and its audio format.
 #pragma once
 
 #include "peru/strings/StringFormat.h"
@@ -15,7 +15,7 @@ namespace sonora2::plugins {
 
 using peru::P;
 
-// Interleaved PCM as chunks carry it: 8 bit unsigned, 16, 24 and 32 bit signed little-endian.
+// Interleaved PCM as in chunks: 8 bit unsigned, 16, 24 and 32 bit signed little-endian.
 struct SPcmFormat {
     int rate = 0; // frames per second
     int channels = 0;
@@ -27,13 +27,13 @@ struct SPcmFormat {
 
 struct SMediaFile {
     P<peru::IURI> uri;
-    std::string path; // bytes of the platform path; empty when the URI names no local file
+    std::string path; // platform path in bytes; empty unless the URI is a local file
 
     explicit SMediaFile(const P<peru::IURI>& uri);
 
-    // Which of the known extensions (lower case) the file's name means. A job may write under a temporary
-    // name: an unknown ending is looked through ("x.aiff.part", "x.aiffpart"). Without any match the
-    // first of them.
+    // Returns the one of the known extensions (lower case) that the file's name has. Since jobs may write to
+    // temporary names, unknown suffixes are skipped ("x.aiff.part", "x.aiffpart"). Returns the first known
+    // extension if none matches.
     std::string getExtension(const std::vector<std::string>& known) const;
 
     P<peru::IString> getDisplayName() const; // for messages
@@ -43,7 +43,7 @@ struct SFileCloser {
     void operator()(std::FILE* file) const { std::fclose(file); }
 };
 using InputFile = std::unique_ptr<std::FILE, SFileCloser>;
-// Opens an ordinary file for a codec library, by stream or by the descriptor under it. Throws CSonoraError.
+// Opens a regular file for a codec library, which uses the stream or its descriptor. Throws CSonoraError.
 InputFile openForReading(const SMediaFile& file);
 
 // Throws CSonoraError; `text` is a format of CStringFormat.

@@ -1,4 +1,4 @@
-// The file under an encoder.
+// The file that an encoder writes.
 #pragma once
 
 #include "support/MediaFile.h"

@@ -17,7 +17,7 @@ std::string toPath(const P<peru::IURI>& file) {
     return peru::CString::toStdString(peru::getPathes()->toPlatformPath(file));
 }
 
-// The first that exists, else where it belongs, for the message.
+// The first candidate that exists; otherwise the first candidate, so that the error message names a path.
 P<peru::IURI> findCompanion() {
     const P<peru::ISystem> system = peru::getSystem();
     std::vector<P<peru::IURI>> folders =
@@ -52,7 +52,7 @@ CCancelAutoplay2::~CCancelAutoplay2() {
         int exitCode = 0;
         m_process->wait(1000, exitCode);
     } catch (const peru::CException&) {
-        // It has gone already, or goes with this process.
+        // It has already ended, or ends with this process.
     }
 }
 

@@ -1,4 +1,4 @@
-// Reads the arrangement that an audio editor describes.
+// Reads an audio editor's arrangement.
 #pragma once
 
 #include "tonewright/Track.h"
@@ -7,9 +7,9 @@
 
 namespace tonewright {
 
-// The tracks in the order of the text; none where the document has no element "Tracks". Elements that are
-// unknown are skipped, those that are missing or empty take their defaults. Throws CParseError for a text
-// that is no XML and for numbers that are none, CURIFormatError.
+// Returns the tracks in document order; none if the document has no "Tracks" element. Unknown elements are
+// ignored; missing or empty ones take their defaults. Throws CParseError for malformed XML and for invalid
+// numbers, CURIFormatError for invalid URIs.
 std::vector<P<CTrack>> readEditorXml(const peru::CStringArg& text);
 
 } // namespace tonewright

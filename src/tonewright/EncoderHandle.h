@@ -1,4 +1,4 @@
-// What a host holds when it holds an encoder: the encoder and the host's callback.
+// The object behind an encoder handle: the encoder and the host's callback.
 #pragma once
 
 #include "peru/IInterfaceQuery.h"
@@ -13,8 +13,9 @@ namespace tonewright {
 
 using peru::P;
 
-// Listens to its encoder for as long as it lives, so that the callback may change at any time and from any
-// thread. An interface cast finds the encoder behind it. Who runs the encoder keeps this object alive.
+// Registered as a listener of its encoder for its whole lifetime, so that the callback may be changed at any
+// time and from any thread. An interface cast finds the encoder. Whoever runs the encoder must keep this
+// object alive.
 class CEncoderHandle : public peru::CObject,
                        public peru::IInterfaceQuery,
                        public sonora2::common::IEncodeListener {

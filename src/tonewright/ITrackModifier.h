@@ -1,4 +1,4 @@
-// What changes the sound of a track for a while.
+// Changes the sound of a track for part of its length.
 #pragma once
 
 #include "peru/IBase.h"
@@ -7,7 +7,7 @@ namespace tonewright {
 
 class ITrackModifier : public virtual peru::IBase {
 public:
-    virtual double getTimestamp() const = 0; // seconds from where the track begins in its medium
+    virtual double getTimestamp() const = 0; // seconds from the track's start within its medium
     virtual double getDuration() const = 0;  // seconds
 };
 

@@ -21,7 +21,7 @@ constexpr int32_t kFileSampleRate = 44100;
 constexpr int32_t kFileBytesPerSample = 2;
 constexpr int32_t kFileChannelCount = 2;
 constexpr int64_t kClosingSeconds = 5;
-constexpr uint8_t kSilentByte = 0x80; // of 8-bit samples, which have no sign
+constexpr uint8_t kSilentByte = 0x80; // 8-bit samples are unsigned
 constexpr int kIdleRounds = 5;
 constexpr uint32_t kIdleMilliseconds = 100;
 constexpr int kTurnRounds = 10; // of a millisecond
@@ -35,7 +35,7 @@ bool hasFormat(IAudioSource& source, const CAudioFormat& format) {
 
 } // namespace
 
-// Holds the player's lock for a thread other than the feeding one.
+// Holds the player's lock on behalf of any thread but the feeding one.
 class CPlayer::CTurn {
 public:
     explicit CTurn(CPlayer& player) {
@@ -62,7 +62,7 @@ CPlayer::CPlayer(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, con
     m_deviceFormat = source ? m_device->getFormat(source->getSampleRate(), source->getBytesPerSample(),
                                                   source->getChannelCount())
                             : m_device->getFormat(kFileSampleRate, kFileBytesPerSample, kFileChannelCount);
-    // The nearest format would play a given source at a wrong speed or as noise.
+    // Any other format would play the source at the wrong speed or as noise.
     if (!m_deviceFormat || (source && !hasFormat(*source, *m_deviceFormat)))
         throw peru::CError("CPlayer::init could not find format for audio device");
     m_source = source;
@@ -75,7 +75,7 @@ CPlayer::CPlayer(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, con
 }
 
 CPlayer::~CPlayer() {
-    // Stop would wait for a signal that nobody is left to give.
+    // stop() would wait for a signal that no thread is left to set.
     if (m_state != TONEWRIGHT_PLAYER_STOPPED) haltQuietly();
     quietly("CPlayer", [this] {
         if (m_device && m_device->isOpened()) m_device->close();
@@ -85,7 +85,7 @@ CPlayer::~CPlayer() {
 void CPlayer::play() {
     {
         peru::CMutexLock control(m_control);
-        // One that has come to its end may have half a second of work left.
+        // A play() that has reached its end may still need half a second to return.
         if (m_isFeeding && m_state == TONEWRIGHT_PLAYER_STOPPED) m_ended->wait(kStopMilliseconds);
         if (m_isFeeding) throw peru::CError("CPlayer::play the player is playing already");
         m_ended->reset();
@@ -95,7 +95,7 @@ void CPlayer::play() {
     try {
         start();
     } catch (...) {
-        // Nothing has played: a stop finds nothing to wait for.
+        // Nothing has played, so a stop() must not wait.
         haltQuietly();
         m_state = TONEWRIGHT_PLAYER_STOPPED;
         m_isFeeding = false;
@@ -117,10 +117,10 @@ void CPlayer::play() {
 
 void CPlayer::start() {
     CTurn turn(*this);
-    // A pause that came before this may have turned the state meanwhile; a stop stays.
+    // An earlier pause() may have changed the state meanwhile; a stop stays in effect.
     int32_t paused = TONEWRIGHT_PLAYER_PAUSED;
     m_state.compare_exchange_strong(paused, TONEWRIGHT_PLAYER_PLAYING);
-    // The device tells its position since it was opened, and may hold the rest of what was stopped.
+    // The device counts its position from open() and may still hold sound from before the last stop.
     if (m_device->isOpened()) m_device->close();
     openDevice();
     if (!m_source->isOpened()) m_source->open();
@@ -140,7 +140,7 @@ void CPlayer::feed() {
         if (m_state == TONEWRIGHT_PLAYER_STOPPED) return;
         CTurn turn(*this);
         if (m_state == TONEWRIGHT_PLAYER_STOPPED) return;
-        // A source that is shorter than it told ends too: all is written, nothing is left to be heard.
+        // Also ends a source that is shorter than its stated duration: all is written and the queue is empty.
         const double position = m_device->getPosition();
         const bool isDry = isSilenceWritten && m_state == TONEWRIGHT_PLAYER_PLAYING &&
                            position == lastPosition && m_device->getQueuedSize() == 0;
@@ -177,7 +177,7 @@ void CPlayer::writeNext(bool& isSilenceWritten) {
     isSilenceWritten = true;
 }
 
-// Carries the device's position past the last sample, whatever the system holds back.
+// Pushes the device's position past the last sample, whatever latency the sound system has.
 void CPlayer::writeSilence() {
     const int64_t size =
         kClosingSeconds * m_deviceFormat->getSampleRate() * m_deviceFormat->getBytesPerFrame();
@@ -207,7 +207,7 @@ void CPlayer::pause() {
         m_device->start();
     } else {
         m_device->pause();
-        m_state.compare_exchange_strong(state, TONEWRIGHT_PLAYER_PAUSED); // but for a stop since then
+        m_state.compare_exchange_strong(state, TONEWRIGHT_PLAYER_PAUSED); // unless stopped since
         report();
     }
 }
@@ -225,7 +225,7 @@ void CPlayer::stop() {
 
 void CPlayer::halt() {
     m_state = TONEWRIGHT_PLAYER_STOPPED;
-    // Whatever its status: one that is paused plays silence on, and would for as long as the player lives.
+    // Whatever its status: a paused device would go on playing silence for as long as the player lives.
     if (m_device->isOpened()) m_device->stop();
     if (m_source->isOpened()) m_source->close();
 }

@@ -16,28 +16,28 @@ namespace tonewright {
 
 using peru::P;
 
-// It has no thread of its own: play feeds the device on the caller's thread, and pause and stop come from
-// another. Play, pause, stop and setCallback may be called by any thread at any time, but not from the
-// callback; the caller keeps the player alive while it is inside.
+// Has no thread of its own: play() feeds the device on the caller's thread; pause() and stop() are called
+// from another. Play, pause, stop and setCallback may be called from any thread at any time, but not from the
+// callback. Callers must keep the player alive during a call.
 class CPlayer : public peru::CObject {
 public:
-    // Both throw CError where there is no device, no format or no source that serves. The first one asks the
-    // handler for a source in a format of the device; the second one converts nothing, so that a device
-    // which does not take the source's own format has none for it.
+    // Both throw CError if there is no suitable device, format or source. The first asks the handler for a
+    // source in a format that the device supports; the second never converts, so the device must support the
+    // source's own format.
     CPlayer(const P<peru::IURI>& uri, const P<sonora2::common::IPluginHandler>& handler);
     explicit CPlayer(const P<sonora2::common::IAudioSource>& source);
-    ~CPlayer() override; // never throws and never waits: nobody is in play any more
+    ~CPlayer() override; // never throws or waits: no thread is in play() any more
 
-    // Returns at the end of the source or after stop, and then the player can play again from the source's
-    // beginning. What source, device and callback throw passes through. Throws CError, and disturbs nothing,
-    // while another thread plays.
+    // Returns at the end of the source or after stop(); the next call plays from the source's beginning.
+    // Exceptions of source, device and callback propagate. Throws CError, without disturbing playback, while
+    // another thread is in play().
     void play();
-    // A toggle. Does nothing while a stop is under way.
+    // Toggles between paused and playing. Does nothing while a stop is under way.
     void pause();
-    // Returns when play has ended its work, at once where nothing plays. Throws CError after ten seconds of
-    // waiting, which pass in vain after a play that ended by an exception.
+    // Waits until play() has finished; returns at once if nothing is playing. Throws CError after ten
+    // seconds, which is also the result of the first stop after a play() that ended with an exception.
     void stop();
-    // A call that is already under way still ends on the old one.
+    // A call already under way still completes on the old callback.
     void setCallback(TONEWRIGHT_PlayerCallback callback) { m_callback = callback; }
 
 private:
@@ -48,7 +48,7 @@ private:
     explicit CPlayer(const P<peru::IURI>& uri, const P<sonora2::common::IPluginHandler>& handler,
                      const P<sonora2::common::IAudioSource>& source);
 
-    // What they are made of. The caller of those marked so holds m_lock.
+    // Those marked "locked" are called with m_lock held.
     void start();
     void feed();
     void fillQueue(bool& isSilenceWritten);
@@ -57,13 +57,13 @@ private:
     void idle();
     void openDevice();  // locked
     void halt();        // locked; stops the device, closes the source
-    void haltQuietly(); // the same for when an error is on its way already
+    void haltQuietly(); // the same while an exception is propagating
     bool isPastEnd() const { return m_device->getPosition() > m_duration; }
     void report() const;
 
-    P<peru::ISignal> m_ended; // set unless a play is under way or has ended by an exception
+    P<peru::ISignal> m_ended; // reset while play() runs and after it has thrown
     P<peru::IURI> m_uri;
-    int32_t m_queueLimit = kQueueLimit; // bytes that lie in the device's queue at most, but for one chunk
+    int32_t m_queueLimit = kQueueLimit; // most bytes in the device's queue, give or take one chunk
     double m_startOffset = 0.0;         // seconds, added to the device's position in reports
     double m_duration = 0.0;
     std::atomic<int32_t> m_state{TONEWRIGHT_PLAYER_STOPPED};
@@ -73,12 +73,12 @@ private:
     P<peru::IMutex> m_lock; // guards device and source between play, pause and stop
     std::atomic<TONEWRIGHT_PlayerCallback> m_callback{nullptr};
 
-    // Held by stop from its request to its end, and by play only while it turns the state: a play cannot
-    // take the signal away that a stop waits for.
+    // Held by stop() throughout, and by play() only while it changes the state, so that a new play() cannot
+    // reset the signal that a stop() is waiting for.
     P<peru::IMutex> m_control;
     std::atomic<bool> m_isFeeding{false};
-    // Threads that want m_lock. The feeding thread gives it away between two chunks and would mostly get it
-    // back first; it waits for these.
+    // Number of threads waiting for m_lock. The feeding thread releases it between chunks and would usually
+    // win it back at once; it yields to these first.
     std::atomic<int32_t> m_waiting{0};
 };
 

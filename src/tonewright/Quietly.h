@@ -1,4 +1,4 @@
-// For work whose failure nobody is left to hear of.
+// Runs code whose failure can only be logged.
 #pragma once
 
 #include "peru/Exception.h"
@@ -9,8 +9,8 @@
 
 namespace tonewright {
 
-// True when the body ran to its end; else the log has the reason behind `what`. Fit for destructors and for
-// threads that are not the library's own.
+// Returns true if the body completed; otherwise logs the reason, prefixed with `what`. Suitable for
+// destructors and for threads that the library does not own.
 template <class Body> bool quietly(const char* what, Body&& body) noexcept {
     try {
         const auto log = [what](const peru::CStringArg& reason) {
@@ -28,7 +28,7 @@ template <class Body> bool quietly(const char* what, Body&& body) noexcept {
             log("unknown");
         }
     } catch (...) {
-        // No memory for a line of the log.
+        // Logging failed as well, for instance for lack of memory.
     }
     return false;
 }

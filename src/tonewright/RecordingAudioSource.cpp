@@ -20,7 +20,7 @@ using tonewright::quietly;
 namespace {
 
 constexpr int kCachedBlocks = 30;
-// Always asked of the device: mono is mixed here, from what every device has.
+// Always requested from the device: every device has stereo, and mono is mixed here.
 constexpr int32_t kDeviceChannels = 2;
 constexpr int64_t kNanosecondsPerMillisecond = 1000000;
 
@@ -39,7 +39,7 @@ CRecordingAudioSource::CRecordingAudioSource(const P<IAudioInDevice>& device, in
     m_secondSize = m_frameSize * m_deviceFormat->getSampleRate();
     restart();
     m_device->setFormat(m_deviceFormat);
-    // Last: the device does not count its listeners, and nobody would take away one whose making failed.
+    // Last: the device does not count its listeners, so one whose constructor failed would never be removed.
     m_device->addListener(this);
     m_isValid = true;
 }
@@ -72,7 +72,7 @@ bool CRecordingAudioSource::isDeviceFormatWanted() const {
            m_deviceFormat->getChannelCount() == m_channelCount;
 }
 
-// A converter serves one stretch of sound: its filter and its time go on from what it was given before.
+// Each recording needs a new converter: its filter state and timestamps continue from earlier input.
 void CRecordingAudioSource::restart() {
     P<CSampleRateConverter> converter;
     if (!isDeviceFormatWanted())
@@ -109,7 +109,7 @@ void CRecordingAudioSource::open() {
 
 void CRecordingAudioSource::close() {
     peru::CMutexLock deviceLock(m_deviceLock);
-    // Before the lock: the device's thread may wait for it, and closing waits for that thread.
+    // Before taking m_lock: the device's thread may be waiting for it, and close() waits for that thread.
     if (m_device->isOpened()) m_device->close();
     m_isBegun = false;
     peru::CMutexLock lock(m_lock);
@@ -121,7 +121,7 @@ double CRecordingAudioSource::getDuration() {
 }
 
 bool CRecordingAudioSource::isEOF() {
-    // In this order: the device's last block is in the stream before its status tells that it was the last.
+    // Order matters: the device's last block is in the stream before its status says that it has stopped.
     return (m_device->getStatus() != peru::media::kDeviceRunning || m_isSilent) && m_buffered < 1;
 }
 
@@ -137,7 +137,7 @@ peru::P<sonora2::audio::IAudioStreamInfos> CRecordingAudioSource::getAudioStream
     return peru::make<sonora2::audio::CAudioStreamInfos>();
 }
 
-// False when there is nothing to wait for any more.
+// False once no more data can arrive.
 bool CRecordingAudioSource::waitForData() {
     const P<peru::ITimeManager> clock = peru::getTimeManager();
     const int64_t limit =
@@ -146,7 +146,7 @@ bool CRecordingAudioSource::waitForData() {
         if (isEOF()) return false;
         peru::getThreadManager()->sleep(1);
         if (clock->getMonotonicTime() <= limit) continue;
-        m_isSilent = true; // a reader takes an empty handle for an error where the source is not at its end
+        m_isSilent = true; // readers treat an empty chunk before the end as an error
         return m_buffered > 0;
     }
     return true;
@@ -163,13 +163,13 @@ peru::P<IAudioChunk> CRecordingAudioSource::getNextAudioChunk() {
         size = m_stream->readSome(block->getData(), m_secondSize);
         m_buffered = m_stream->getAvailable();
         timestamp = static_cast<double>(m_framesDelivered) / m_sampleRate;
-        // By the device's frames: those wanted may have another number of channels or bytes. Where they
-        // differ the converter tells the time, from the frames that leave it.
+        // Counted in device frames, whose size may differ from the requested format's. If the formats differ
+        // the converter sets the timestamps, from the frames it has put out.
         m_framesDelivered += size / m_frameSize;
         converter = m_converter;
     }
     block->setSize(size);
-    // The converter would take an empty block for the end; another thread's open may have emptied the stream.
+    // The converter treats an empty block as a flush; open() on another thread may have emptied the stream.
     if (!converter || size == 0) return peru::make<sonora2::audio::CAudioChunk>(timestamp, block);
     return converter->convert(block->getData(), static_cast<int>(size));
 }

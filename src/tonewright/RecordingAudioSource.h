@@ -9,9 +9,9 @@
 
 #include <atomic>
 
-// The device's thread puts its bytes into a queue without bound and another thread takes chunks of a second
-// at most: nothing is lost while the reader is held up. Made closed; open starts the recording and its time
-// at 0. In no namespace, so that hosts which know the class by name find it.
+// The device's thread appends to an unbounded queue and another thread reads chunks of at most one second, so
+// that nothing is lost while the reader is blocked. Created closed; open() starts the recording at time 0.
+// Deliberately in the global namespace: hosts look the class up by name.
 class CRecordingAudioSource : public peru::CObject,
                               public sonora2::common::IAudioSource,
                               public peru::media::IAudioInDeviceListener {
@@ -20,35 +20,35 @@ public:
 
     static constexpr uint32_t kSilenceMilliseconds = 15000;
 
-    // A reader of an open device that delivers nothing gets its end after that time.
+    // A read from an open device that delivers nothing for that long reports the end of the source.
     CRecordingAudioSource(const P<peru::media::IAudioInDevice>& device, int32_t sampleRate,
                           int32_t channelCount, int32_t bytesPerSample,
                           uint32_t silenceMilliseconds = kSilenceMilliseconds);
-    ~CRecordingAudioSource() override; // ends a recording that this object began
+    ~CRecordingAudioSource() override; // ends a recording started by this object
 
-    // False where the device has no format from which the wanted one can be made, which is in the log: the
-    // object is then of no use.
+    // False if the device has no format that can be converted to the requested one; the reason is in the log
+    // and the object is unusable.
     bool isValid() const { return m_isValid; }
-    // Called on the device's thread; null for none. Any thread; a call already under way still ends on the
-    // old one. What a callback throws ends the recording.
+    // Callbacks run on the device's thread; null for none. May be set from any thread; a call already under
+    // way still completes on the old callback. An exception thrown by a callback ends the recording.
     void setRecordingCallback(TONEWRIGHT_RecordingCallback callback) { m_recordingCallback = callback; }
     void setVolumeCallback(TONEWRIGHT_RecordingVolumeCallback callback) { m_volumeCallback = callback; }
 
     bool isOpened() override;
     void open() override;
-    void close() override; // what has not been read stays until open
+    void close() override; // unread data stays until the next open
     void skipToTime(double) override {}
-    double getDuration() override; // the greatest finite number: the end is not known
+    double getDuration() override; // the largest finite double: the end is not known
     int getBufferStatus() override { return 0; }
     bool isEOF() override;
     void setStartTime(double) override {}
     double getStartTime() override { return 0.0; }
-    P<peru::IURI> getURI() override; // an empty one
+    P<peru::IURI> getURI() override; // an empty URI
     P<peru::IString> getPluginName() override;
 
-    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override; // of no stream
+    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override; // an empty list
     void setAudioStream(int) override {}
-    // Waits for data. Shorter than a second when less is there.
+    // Waits for data. Returns at most one second, less if less is available.
     P<sonora2::audio::IAudioChunk> getNextAudioChunk() override;
     int getSampleRate() override { return m_sampleRate; }
     int getChannelCount() override { return m_channelCount; }
@@ -70,21 +70,21 @@ private:
     const int32_t m_channelCount;
     const int32_t m_bytesPerSample;
     bool m_isValid = false;
-    int32_t m_frameSize = 0;         // bytes, of the device's format, as is the next
+    int32_t m_frameSize = 0;         // bytes, in the device's format, as is the next member
     int32_t m_secondSize = 0;        // bytes
-    int64_t m_framesDelivered = 0;   // of the device's frames, since it was opened
-    std::atomic<int64_t> m_buffered; // what the stream holds, for a look without the lock
+    int64_t m_framesDelivered = 0;   // in device frames, since open
+    std::atomic<int64_t> m_buffered; // bytes in the stream, readable without the lock
     P<peru::media::CAudioFormat> m_deviceFormat;
-    P<sonora2::samplerateconverter::CSampleRateConverter> m_converter; // empty where the formats are equal
+    P<sonora2::samplerateconverter::CSampleRateConverter> m_converter; // empty if the formats are equal
     P<peru::media::IAudioInDevice> m_device;
     std::atomic<TONEWRIGHT_RecordingCallback> m_recordingCallback{nullptr};
     std::atomic<TONEWRIGHT_RecordingVolumeCallback> m_volumeCallback{nullptr};
 
     const uint32_t m_silenceMilliseconds;
-    // Guards the device, which takes one caller at a time, between an encoder and a host that closes
-    // meanwhile; the device's thread never takes it.
+    // Guards the device, which allows one caller at a time, against an encoder and a host that closes the
+    // source at the same time. Never taken by the device's thread.
     P<peru::IMutex> m_deviceLock;
-    bool m_isBegun = false;               // by open
-    std::atomic<bool> m_isSilent{false};  // the reader has given up waiting
+    bool m_isBegun = false;               // set by open()
+    std::atomic<bool> m_isSilent{false};  // the reader has timed out
     std::atomic<bool> m_hasFailed{false}; // the volume callback threw
 };

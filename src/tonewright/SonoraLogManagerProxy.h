@@ -1,4 +1,4 @@
-// The media framework's log, written into the program's.
+// Forwards the media framework's log to the program's log.
 #pragma once
 
 #include "peru/Object.h"
@@ -8,14 +8,15 @@ namespace tonewright {
 
 using peru::P;
 
-// No state of its own; safe from any thread.
+// Stateless; safe from any thread.
 class CSonoraLogManagerProxy : public peru::CObject, public sonora2::common::ILogManager {
 public:
     ~CSonoraLogManagerProxy() override;
 
-    // The framework counts down to its worst severity, the program up; anything unknown is information.
+    // In the framework 0 is the most severe level, in the program's log the highest number is. Unknown
+    // levels map to info.
     void log(int32_t severity, const P<peru::IString>& text) override;
-    void logException(const peru::CException& exception) override; // at the worst severity
+    void logException(const peru::CException& exception) override; // at error level
 };
 
 } // namespace tonewright

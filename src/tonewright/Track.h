@@ -1,4 +1,4 @@
-// A part of a medium on an arrangement's time line.
+// A section of a medium, placed on an arrangement's time line.
 #pragma once
 
 #include "peru/collections/Array.h"
@@ -9,7 +9,7 @@ namespace tonewright {
 
 using peru::P;
 
-// Plain data, all times in seconds. Filled by one thread, then read by any number.
+// Plain data, all times in seconds. Written by one thread before any others read it.
 class CTrack : public peru::CObject {
 public:
     CTrack();
@@ -21,7 +21,7 @@ public:
     void setSourceStartTime(double time) { m_sourceStartTime = time; }
     double getSourceEndTime() const { return m_sourceEndTime; }
     void setSourceEndTime(double time) { m_sourceEndTime = time; }
-    double getTrackStart() const { return m_trackStart; } // where it begins on the time line
+    double getTrackStart() const { return m_trackStart; } // on the time line
     void setTrackStart(double time) { m_trackStart = time; }
 
     double getDuration() const { return m_sourceEndTime - m_sourceStartTime; }

@@ -1,4 +1,4 @@
-// A gain that goes from one value to another.
+// A gain that moves from one value to another.
 #pragma once
 
 #include "peru/Object.h"

@@ -24,8 +24,8 @@ constexpr int kCachedBlocks = 30;
 constexpr int kFramesPerStep = 4000;
 constexpr int kSilentBedIndex = -1; // the lane before all others
 
-// The media of the next seconds are opened on the list's own thread: who plays must not wait for a slow one
-// before it is due.
+// Media due in the next seconds are opened on the list's own thread, so that playback does not wait for a
+// slow one.
 constexpr bool kOpenInThread = true;
 
 } // namespace

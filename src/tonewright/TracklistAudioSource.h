@@ -11,16 +11,16 @@
 
 namespace tonewright {
 
-// Keeps one chunk in hand, by whose time the end is told: after a skip that one is delivered first. Skips may
-// come from any thread; all else is for one thread at a time. What a track throws that is due ends the
-// reading.
+// Reads one chunk ahead to detect the end; after a skip that chunk is still delivered first. Skips may come
+// from any thread; everything else is for one thread at a time. If a track that is due throws, the exception
+// reaches the reader.
 class CTracklistAudioSource : public peru::CObject, public sonora2::common::IAudioSource {
 public:
     explicit CTracklistAudioSource(const P<sonora2::audio::CAudioTracklist>& tracklist);
     ~CTracklistAudioSource() override;
 
-    // Mixes the tracks over a silent bed of the whole length, so that there are no gaps. No medium is opened
-    // yet. Throws CSonoraError when the three numbers are no sound.
+    // Mixes the tracks over a silent bed of the full length, so that there are no gaps. Opens no medium yet.
+    // Throws CSonoraError if the three numbers are not a valid format.
     static P<CTracklistAudioSource> create(const std::vector<P<CTrack>>& tracks,
                                            const P<sonora2::common::IPluginHandler>& pluginHandler,
                                            const P<sonora2::common::ILogManager>& log, int sampleRate,
@@ -35,7 +35,7 @@ public:
     bool isEOF() override;
     void setStartTime(double fStartTime) override {}
     double getStartTime() override { return 0.0; }
-    P<peru::IURI> getURI() override; // an empty one
+    P<peru::IURI> getURI() override; // an empty URI
     P<peru::IString> getPluginName() override;
     P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override;
     void setAudioStream(int nAudioIndex) override {}

@@ -21,7 +21,7 @@ int16_t scale(int16_t sample, float gain) {
     const float product = static_cast<float>(sample) * gain;
     if (product < -32768.0F) return -32768;
     if (product > 32767.0F) return 32767;
-    return product == product ? static_cast<int16_t>(product) : int16_t{0}; // no number is silence
+    return product == product ? static_cast<int16_t>(product) : int16_t{0}; // NaN becomes silence
 }
 
 } // namespace

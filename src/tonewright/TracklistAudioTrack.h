@@ -1,4 +1,4 @@
-// A track of an editor's arrangement as the mixer plays it.
+// Plays a track of an editor's arrangement in the mixer.
 #pragma once
 
 #include "sonora2/plugins/IPluginHandler.h"
@@ -9,18 +9,18 @@ namespace tonewright {
 
 class CTrackModifierFade;
 
-// Has a source while it is opened. One thread at a time; in a track list it lies behind a unifier track,
-// which sees to that.
+// Has a source while it is open. One thread at a time; in a track list the unifier track in front of it
+// ensures that.
 class CTracklistAudioTrack : public peru::CObject,
                              public sonora2::audio::IAudioTrack,
                              public sonora2::audio::IMediumTimeTrack {
 public:
-    // `index` is the track's place in the document, and its lane in the list.
+    // `index` is the track's position in the document and its lane in the list.
     CTracklistAudioTrack(const P<sonora2::common::IPluginHandler>& pluginHandler, const P<CTrack>& track,
                          int sampleRate, int channelCount, int bytesPerSample, int index);
     ~CTracklistAudioTrack() override;
 
-    P<peru::IURI> getURI() override; // an empty one
+    P<peru::IURI> getURI() override; // an empty URI
     void setURI(const P<peru::IURI>& uri) override {}
     bool isOpened() override { return static_cast<bool>(m_source); }
     void open() override; // throws CError when no plug-in reads the medium
@@ -31,13 +31,13 @@ public:
     bool isEnabled() override { return true; }
     P<peru::IString> getDebugText() override;
     int getBufferStatus() override { return 100; }
-    // Knows the skip command only, whose time is the medium's; see getMediumTime().
+    // Handles only the skip command, in medium time; see getMediumTime().
     void processCommand(const P<sonora2::common::ITrackCommand>& command) override;
     double getMediumTime(double listTime) const override;
     int getSampleRate() override { return m_sampleRate; }
     int getChannelCount() override { return m_channelCount; }
     int getBytesPerSample() override { return m_bytesPerSample; }
-    // Empty at the end of the medium. Fades work on chunks that lie wholly within them.
+    // Empty at the end of the medium. A fade applies only to chunks that lie entirely within it.
     P<sonora2::audio::IAudioChunk> getNextAudioChunk() override;
 
 private:

@@ -18,7 +18,7 @@ P<peru::IURI> CBaseDirectories::get(const P<peru::IURI>& member) const {
 }
 
 void CBaseDirectories::set(P<peru::IURI>& member, const P<peru::IURI>& uri) {
-    // A copy of our own: the caller's object may come from a plug-in that is unloaded before us.
+    // Copied: the caller's object may belong to a plug-in that is unloaded earlier.
     P<peru::IURI> copy = uri ? P<peru::IURI>(peru::make<peru::CURI>(uri->getAsString())) : nullptr;
     peru::CMutexLock lock(m_mutex);
     member.swap(copy);

@@ -7,7 +7,7 @@
 
 namespace sonora2::common {
 
-// All three start as the folder of the main executable. Safe from any thread.
+// All three default to the folder of the main executable. Safe from any thread.
 class SONORA2_API CBaseDirectories : public peru::CObject, public IBaseDirectories {
 public:
     CBaseDirectories();

@@ -1,4 +1,4 @@
-// A mutex that lives together with the object that it guards.
+// A mutex that shares the lifetime of the object that it guards.
 #pragma once
 
 #include "peru/Object.h"
@@ -9,7 +9,7 @@ namespace sonora2::common {
 using peru::P;
 
 // All facets of one plug-in object share one of these, so that every call into the object runs under one
-// lock. It keeps the object alive and hands it out; who calls it holds the lock.
+// lock. It keeps the object alive; callers hold the lock while they use the object.
 template <class T> class CEmbeddedMutex : public peru::CObject, public peru::IMutex {
 public:
     explicit CEmbeddedMutex(const P<T>& object)

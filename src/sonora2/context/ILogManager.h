@@ -12,7 +12,7 @@ namespace sonora2::common {
 
 using peru::P;
 
-// Severity descends: 0 is the worst.
+// Lower is more severe, the reverse of peru::ELogLevel.
 enum ESeverity : int32_t {
     kSeverityError = 0,
     kSeverityWarning = 1,

@@ -1,4 +1,4 @@
-// What every object of the framework needs.
+// Shared settings and services of all framework objects.
 #pragma once
 
 #include "peru/MemoryManager.h"
@@ -18,7 +18,7 @@ public:
     virtual void setDataDirectory(const P<peru::IURI>& uri) = 0;
 };
 
-// Its serial form passes to a slave process, so that it works with the same settings.
+// Its serial form is sent to slave processes so that they use the same settings.
 class SONORA2_API ISonoraContext : public virtual peru::IBase, public virtual peru::ISerializable {
 public:
     virtual void setMemoryManager(const P<peru::IMemoryManager>& memoryManager) = 0;
@@ -37,7 +37,7 @@ public:
     virtual int getPluginNameCount() = 0;
     virtual P<peru::IString> getPluginNameAt(int index) = 0;
     virtual void clearPluginNames() = 0;
-    virtual bool hasFlags(uint64_t mask) = 0;  // every bit of the mask is set
+    virtual bool hasFlags(uint64_t mask) = 0;  // true if every bit of the mask is set
     virtual void setFlags(uint64_t flags) = 0; // replaces the whole word
     virtual uint64_t getFlags() = 0;
     virtual P<peru::IBase> getHostObject() = 0;

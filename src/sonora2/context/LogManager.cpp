@@ -33,7 +33,7 @@ P<peru::IString> formatTime(int64_t milliseconds) {
                         static_cast<int>(clock.subseconds().count()));
 }
 
-// Messages carry names from files and devices: one bad name must not spoil the document.
+// Messages contain names of files and devices: an invalid name must not make the document malformed.
 P<peru::IString> makeReadable(const P<peru::IString>& text) {
     std::string readable = CString::toStdString(text);
     for (size_t at = 0; at < readable.size();) {

@@ -13,9 +13,9 @@ class IXmlNode;
 
 namespace sonora2::common {
 
-// The root "textlog" holds one "logentry" a message, with its time (UTC) and its severity as attributes. The
-// document stays in memory until it is asked for; of a process that logs for days the newest entries are
-// kept.
+// The root element "textlog" holds one "logentry" per message, with its time (UTC) and severity as
+// attributes. The document is kept in memory; only the newest entries are kept, so that its size stays
+// bounded.
 class SONORA2_API CLogManager : public peru::CObject, public ILogManager {
 public:
     static constexpr int kKeptEntries = 10000;
@@ -24,10 +24,10 @@ public:
     ~CLogManager() override;
 
     void log(int32_t severity, const P<peru::IString>& text) override;
-    void logException(const peru::CException& exception) override; // at the worst severity
+    void logException(const peru::CException& exception) override; // at kSeverityError
 
-    P<peru::IString> getDocument() const; // as UTF-8 text
-    // Replaces the file of the last time, which stays when the new one cannot be written. Throws CFileError.
+    P<peru::IString> getDocument() const; // UTF-8
+    // Replaces the file atomically. Throws CFileError and leaves the old file unchanged.
     void save(const P<peru::IURI>& file) const;
 
 private:

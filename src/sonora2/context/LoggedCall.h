@@ -1,4 +1,4 @@
-// A call whose failure is told to the log and to nobody else.
+// Runs a call whose failure is only logged.
 #pragma once
 
 #include "peru/Errors.h"
@@ -19,7 +19,7 @@ template <class Call> void callLogged(const P<ILogManager>& log, Call&& call) no
             if (log) log->logException(peru::CError(exception.what()));
         }
     } catch (...) {
-        // What was thrown says nothing, or the log cannot be written either.
+        // The exception carries no text, or logging failed as well.
     }
 }
 

@@ -156,7 +156,7 @@ void CSonoraContextAudio::setHostObject(const P<peru::IBase>& object) {
 
 void CSonoraContextAudio::writeTo(const P<peru::IDataOutStream>& stream) const {
     CMutexLock lock(m_mutex);
-    // Counted before the first byte leaves, so that a form that is too large leaves nothing half written.
+    // Checked before the first byte is written, so that nothing is left half written.
     const uint16_t names = countFor(m_pluginNames.size(), "plug-in names");
     const uint16_t groups = countFor(m_parameters.size(), "parameter groups");
     for (const auto& [key, group] : m_parameters) countFor(group.size(), "parameters in a group");

@@ -30,7 +30,7 @@ public:
     P<common::IBaseDirectories> getBaseDirectories() override;
     P<common::ILogManager> getLogManager() override;
     void setLogManager(const P<common::ILogManager>& logManager) override;
-    // Never empty handles. Looking up makes no group.
+    // Never returns an empty handle. A lookup does not create a group.
     P<peru::IString> getParameter(uint32_t key, const peru::CStringArg& name) override;
     void setParameter(uint32_t key, const peru::CStringArg& name, const P<peru::IString>& value) override;
     void addPluginName(const peru::CStringArg& name) override;
@@ -43,10 +43,10 @@ public:
     P<peru::IBase> getHostObject() override;
     void setHostObject(const P<peru::IBase>& object) override;
 
-    // Switches, flag word, plug-in names and parameters; managers, directories and host object stay behind.
-    // Throws CSonoraError when there are more names, groups or entries than the form can count (65535).
+    // Writes switches, flags, plug-in names and parameters, but not managers, directories and host object.
+    // Throws CSonoraError for more than 65535 names, groups or entries of a group.
     void writeTo(const P<peru::IDataOutStream>& stream) const override;
-    // Adds to what the context holds; nothing is changed when the stream ends early.
+    // Adds to the existing content; changes nothing if the stream ends early.
     void readFrom(const P<peru::IDataInStream>& stream) override;
 
 private:

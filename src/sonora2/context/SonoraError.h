@@ -6,7 +6,7 @@
 
 namespace sonora2::common {
 
-// Every failure that the framework reports itself; its only payload is the message.
+// Thrown for every failure that the framework itself reports; carries only a message.
 class SONORA2_API CSonoraError : public peru::CError {
     PERU_EXCEPTION(CSonoraError)
     explicit CSonoraError(const peru::CStringArg& message);

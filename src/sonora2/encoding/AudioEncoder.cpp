@@ -13,7 +13,7 @@ namespace {
 // One block size for all formats: a multiple of what the usual codecs frame (1152, 576, 512).
 constexpr int kBlockFrames = 4608;
 
-// What a close reports has nobody left to hear it but the log.
+// Errors are only logged.
 template <class Media> void closeQuietly(const P<Media>& media, const P<ISonoraContext>& context) noexcept {
     try {
         if (media && media->isOpened()) media->close();
@@ -75,7 +75,7 @@ void CAudioEncoder::close() {
 void CAudioEncoder::encode() {
     if (!m_source->isOpened()) m_source->open();
     if (!m_format->isOpened()) m_format->open();
-    // Asked once: it may cost a round trip to another process.
+    // Queried once: it may cost a round trip to another process.
     const double duration = m_source->getDuration();
     notify(duration, 0.0);
 

@@ -9,22 +9,23 @@
 
 namespace sonora2::common {
 
-// One thread at a time. Exceptions of source and format pass through unchanged; the files are then finished
-// when the encoder is released.
+// One thread at a time. Exceptions of source and format propagate unchanged; both are then closed when the
+// encoder is destroyed.
 class SONORA2_API CAudioEncoder : public peru::CObject {
 public:
-    // Asks the source for its sample format; a closed source is opened for that and closed again.
+    // Queries the source's sample format; a closed source is opened for that and closed again.
     CAudioEncoder(const P<ISonoraContext>& context, const P<IAudioSource>& source,
                   const P<IAudioFormat>& format);
-    ~CAudioEncoder() override; // closes source and format where they are opened, and never throws
+    ~CAudioEncoder() override; // closes source and format if open; never throws
 
-    // Listeners are held without a reference: they leave before they die. They may leave during a call.
+    // Listeners are not reference-counted: they must be removed before they are destroyed, which is allowed
+    // during a call.
     void addListener(IEncodeListener* listener);
     bool removeListener(IEncodeListener* listener);
     bool hasListener(const IEncodeListener* listener) const;
 
-    // Returns when all is written or a listener answered false; both are a normal end with source and format
-    // closed. Listeners are called on this thread.
+    // Returns when everything is written or a listener has returned false; both are a normal end with source
+    // and format closed. Listeners are called on this thread.
     void encode();
 
     int getSampleRate() const { return m_sampleRate; }

@@ -1,4 +1,4 @@
-// Hears of an encoding job's progress.
+// Observes the progress of an encoding job.
 #pragma once
 
 #include "peru/P.h"

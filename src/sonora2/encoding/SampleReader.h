@@ -1,4 +1,4 @@
-// Cuts what a source delivers into blocks of a wanted length.
+// Cuts a source's chunks into blocks of a requested length.
 #pragma once
 
 #include "peru/streams/BufferedIOStream.h"
@@ -10,17 +10,17 @@ namespace sonora2::common {
 // One thread at a time.
 class SONORA2_API CSampleReader : public peru::CObject {
 public:
-    // Asks the source for its sample format; a closed source is opened for that and closed again.
-    // Throws CSonoraError when the source tells none.
+    // Queries the source's sample format; a closed source is opened for that and closed again. Throws
+    // CSonoraError if the format is invalid.
     CSampleReader(const P<ISonoraContext>& context, const P<IAudioSource>& source);
     ~CSampleReader() override;
 
-    bool hasSamples(); // never for a closed source
-    // `frames` frames; fewer only at the end of the source, and an empty handle when nothing is left.
-    // The timestamp counts the frames that were delivered, whatever the source's own chunks say.
-    // Throws CSonoraError when the source gives no chunk although it is not at its end.
+    bool hasSamples(); // false for a closed source
+    // Returns `frames` frames; fewer only at the end of the source, and an empty handle when none are left.
+    // The timestamp counts the frames delivered, independently of the source's own timestamps. Throws
+    // CSonoraError if the source returns no chunk before its end.
     P<audio::IAudioChunk> getSamples(int frames);
-    void reset(); // closes the source and starts the time line again
+    void reset(); // closes the source and restarts the time line
     int64_t getPosition() const { return m_position; }
 
 private:
@@ -28,8 +28,8 @@ private:
     P<IAudioSource> m_source;
     P<peru::CBufferedIOStream> m_buffer;
     P<ISonoraContext> m_context;
-    // Frames delivered since the last reset. The source's timestamps are dropped: after a skip some decoders
-    // restart them, and an encoder needs a time line without holes.
+    // Frames delivered since the last reset. The source's own timestamps are ignored: some decoders restart
+    // them after a skip, and an encoder needs a time line without gaps.
     int64_t m_position = 0;
 };
 

@@ -4,7 +4,7 @@ namespace sonora2::audio {
 
 CAudioChunk::CAudioChunk(double timestamp, P<peru::IMemoryBlock> block)
     : m_timestamp(timestamp), m_block(std::move(block)) {
-    // A chunk that is about to read itself from a stream has nothing to start from.
+    // A chunk created for readFrom() has no block yet.
     if (!m_block) m_block = peru::make<peru::CMemoryBlock>();
 }
 

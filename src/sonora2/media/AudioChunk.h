@@ -7,7 +7,7 @@ namespace sonora2::audio {
 
 class SONORA2_API CAudioChunk : public peru::CObject, public IAudioChunk {
 public:
-    // Takes a reference on the block and copies nothing.
+    // Shares the block; copies nothing.
     CAudioChunk(double timestamp, P<peru::IMemoryBlock> block);
     ~CAudioChunk() override;
 

@@ -51,7 +51,7 @@ void CAudioStreamInfos::writeTo(const P<peru::IDataOutStream>& stream) const {
 void CAudioStreamInfos::readFrom(const P<peru::IDataInStream>& stream) {
     m_infos.clear();
     const int32_t count = stream->readInt32();
-    // No room is made ahead: the count may be anything, and a stream that ends early throws at its element.
+    // Nothing is reserved: the count is untrusted, and a short stream throws when it ends.
     for (int32_t i = 0; i < count; ++i) {
         P<IAudioInfo> info = peru::make<CAudioInfo>();
         info->readFrom(stream);

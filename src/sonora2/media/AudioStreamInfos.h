@@ -1,4 +1,4 @@
-// What a source tells of the audio streams in its container.
+// Describes the audio streams of a source's container.
 #pragma once
 
 #include "peru/Object.h"
@@ -10,7 +10,7 @@ namespace sonora2::audio {
 
 class SONORA2_API CAudioInfo : public peru::CObject, public IAudioInfo {
 public:
-    // Empty handles are empty texts.
+    // Empty handles count as empty texts.
     explicit CAudioInfo(int index = 0, const P<peru::IString>& name = nullptr,
                         const P<peru::IString>& language = nullptr);
     ~CAudioInfo() override;
@@ -38,8 +38,8 @@ public:
     int getStreamCount() const override { return static_cast<int>(m_infos.size()); }
     P<IAudioInfo> getStreamInfo(int index) const override; // throws CInvalidArgError outside the array
 
-    // The count as int32, then the elements. Reading replaces what was there; its memory is bounded by the
-    // bytes that really come, whatever the count says.
+    // The count as int32, then the elements. Reading replaces the content; memory use is bounded by the bytes
+    // in the stream, not by the count.
     void writeTo(const P<peru::IDataOutStream>& stream) const override;
     void readFrom(const P<peru::IDataInStream>& stream) override;
 

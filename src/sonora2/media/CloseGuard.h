@@ -1,12 +1,12 @@
-// Closes a source that was opened for a short look at it.
+// Closes a source that was opened only to inspect it.
 #pragma once
 
 #include "sonora2/media/ISource.h"
 
 namespace sonora2::common {
 
-// Closes the source when the block is left, also by an exception; nothing where it is closed already, so that
-// who wants to hear of a failing close calls it himself before.
+// Closes the source on leaving the scope, also by an exception. Does nothing if it is already closed; a
+// caller that needs the errors of close() calls it before.
 class CCloseGuard {
 public:
     explicit CCloseGuard(ISource& source, bool isArmed = true) : m_source(source), m_isArmed(isArmed) {}
@@ -14,7 +14,7 @@ public:
         try {
             if (m_isArmed && m_source.isOpened()) m_source.close();
         } catch (...) {
-            // What was looked for is there, or an error is already on its way; neither is spoilt by this one.
+            // The inspection is done, or another exception is already propagating; neither is affected.
         }
     }
     CCloseGuard(const CCloseGuard&) = delete;

@@ -8,8 +8,8 @@ namespace sonora2::audio {
 
 using peru::P;
 
-// Interleaved linear PCM, little-endian: 8 bit unsigned, 16, 24 and 32 bit signed. A chunk carries no
-// format of its own: its source tells rate, channels and bytes per sample.
+// Interleaved linear PCM, little-endian: 8 bit unsigned, 16, 24 and 32 bit signed. Rate, channels and bytes
+// per sample are those of the source.
 class SONORA2_API IAudioChunk : public virtual peru::IBase, public virtual peru::ISerializable {
 public:
     virtual double getTimestamp() const = 0; // seconds, of the first sample within the source

@@ -12,7 +12,7 @@ public:
     virtual int getChannelCount() = 0;
     virtual int getBytesPerSample() = 0;
     virtual void setAudioQuality(double fQuality) = 0;                  // 0.0 to 1.0
-    virtual void setAudioBitRate(int nNominal, int nMin, int nMax) = 0; // bits per second, 0 where open
+    virtual void setAudioBitRate(int nNominal, int nMin, int nMax) = 0; // bits per second, 0 for unspecified
     virtual void writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) = 0;
 };
 

@@ -1,4 +1,4 @@
-// Formats consume media and write it to a URI.
+// A format writes media to a URI.
 #pragma once
 
 #include "peru/uri/IURI.h"
@@ -8,7 +8,8 @@ namespace sonora2::common {
 
 using peru::P;
 
-// Opening makes the file; closing finishes it. Failures are thrown as peru::CException. One thread at a time.
+// Opening creates the file; closing completes it. Failures are thrown as peru::CException. One thread at a
+// time.
 class SONORA2_API IFormat : public virtual peru::IBase {
 public:
     virtual bool isOpened() = 0;
@@ -16,7 +17,7 @@ public:
     virtual void close() = 0;
     virtual P<peru::IURI> getURI() = 0;
     virtual P<peru::IString> getPluginName() = 0;
-    virtual int64_t getEstimatedSizeBytes(double fDuration) = 0; // of the output file, for seconds of media
+    virtual int64_t getEstimatedSizeBytes(double fDuration) = 0; // output file size for that many seconds
 };
 
 } // namespace sonora2::common

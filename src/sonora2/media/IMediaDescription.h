@@ -1,4 +1,4 @@
-// What a source knows about the file behind it beyond the format that it delivers.
+// Properties of the file behind a source, beyond the format that the source delivers.
 #pragma once
 
 #include "peru/strings/String.h"
@@ -8,7 +8,7 @@ namespace sonora2::common {
 
 using peru::P;
 
-// A source may have it; an interface cast finds it. Valid once the source has been open.
+// Optional; found by an interface cast on a source. Valid once the source has been open.
 class SONORA2_API IMediaDescription : public virtual peru::IBase {
 public:
     virtual P<peru::IString> getCodecName() = 0; // such as "FLAC" or "PCM signed 24 bit"; empty when unknown

@@ -1,4 +1,4 @@
-// Sources deliver media from a URI.
+// A source delivers media from a URI.
 #pragma once
 
 #include "peru/uri/IURI.h"
@@ -8,7 +8,7 @@ namespace sonora2::common {
 
 using peru::P;
 
-// Made, open, deliver and skip in any order, close. Open after close starts again at the beginning.
+// Life cycle: create; open; read and skip in any order; close. Reopening starts at the beginning.
 // Time is in seconds. Failures are thrown as peru::CException. One thread at a time.
 class SONORA2_API ISource : public virtual peru::IBase {
 public:
@@ -18,7 +18,7 @@ public:
     virtual void skipToTime(double fTimestamp) = 0; // the next delivery starts at or after that time
     virtual double getDuration() = 0;
     virtual int getBufferStatus() = 0;                // fill state of the read-ahead, 0 to 100
-    virtual bool isEOF() = 0;                         // nothing more to deliver
+    virtual bool isEOF() = 0;                         // nothing left to deliver
     virtual void setStartTime(double fStartTime) = 0; // offset within the medium
     virtual double getStartTime() = 0;
     virtual P<peru::IURI> getURI() = 0;

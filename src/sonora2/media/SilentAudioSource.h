@@ -9,7 +9,7 @@ namespace sonora2 {
 
 using peru::P;
 
-// Always opened. One thread at a time. Every chunk holds the same block: it is not to be written to.
+// Always open. One thread at a time. All chunks share one block, which must not be modified.
 class SONORA2_API CSilentAudioSource : public peru::CObject, public common::IAudioSource {
 public:
     static constexpr int kFramesPerChunk = 500;
@@ -27,7 +27,7 @@ public:
     bool isEOF() override;
     void setStartTime(double fStartTime) override {}
     double getStartTime() override { return 0.0; }
-    P<peru::IURI> getURI() override; // an empty one
+    P<peru::IURI> getURI() override; // an empty URI
     P<peru::IString> getPluginName() override;
     P<audio::IAudioStreamInfos> getAudioStreamInfos() override; // one stream
     void setAudioStream(int nAudioIndex) override {}

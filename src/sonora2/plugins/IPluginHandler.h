@@ -1,4 +1,4 @@
-// Finds an object that reads or writes a URI.
+// Finds a plug-in object that reads or writes a URI.
 #pragma once
 
 #include "sonora2/media/IAudioFormat.h"
@@ -9,8 +9,8 @@
 
 namespace sonora2::common {
 
-// The create calls try the plug-ins in their order and answer empty when none fits; they throw CSonoraError
-// only for an invalid parameter record. They are serialised, the test opening included.
+// The create calls try the plug-ins in order and return an empty handle if none fits; they throw CSonoraError
+// only for an invalid parameter record. Calls are serialized, including the test opening.
 class SONORA2_API IPluginHandler : public virtual peru::IBase {
 public:
     using SSourceParams = ISonoraPlugin::SSourceParams;
@@ -36,10 +36,10 @@ public:
     virtual bool isBoxed() = 0;
     virtual int getPluginCount() = 0;
     virtual P<ISonoraPlugin> getPlugin(int index) = 0;
-    // Whether a candidate counts only if it could be opened.
+    // Whether a candidate is accepted only if it can be opened.
     virtual void setVerifyByOpening(bool verify) = 0;
     virtual bool getVerifyByOpening() = 0;
-    // A temporary ending that is cut off a name before its extension is looked at.
+    // Suffix of temporary names; removed from a name before its extension is determined.
     virtual void setURISuffix(const peru::CStringArg& suffix) = 0;
     virtual P<peru::IString> getURISuffix() = 0;
 };

@@ -1,4 +1,4 @@
-// Remembers which plug-in served a URI.
+// Remembers which plug-in handled a URI.
 #pragma once
 
 #include "peru/uri/IURI.h"
@@ -8,7 +8,7 @@ namespace sonora2::common {
 
 using peru::P;
 
-// The storage is free. Called with the handler's lock held; what it throws is logged and ignored.
+// Implementations choose the storage. Called with the handler's lock held; exceptions are logged and ignored.
 class SONORA2_API IPluginPreference : public virtual peru::IBase {
 public:
     // The name of the plug-in for a mask of types and a URI; empty when none is known.

@@ -1,4 +1,4 @@
-// What a plug-in library delivers.
+// The interface of a plug-in library.
 #pragma once
 
 #include "sonora2/media/IFormat.h"
@@ -10,7 +10,7 @@ namespace sonora2::common {
 
 class ISonoraContext;
 
-// What a plug-in can make; bits of nTypes.
+// Kinds of object a plug-in can create; bits of nTypes.
 enum EPluginType : int {
     kVideoSource = 1,
     kAudioSource = 2,
@@ -23,14 +23,14 @@ enum EPluginType : int {
 class SONORA2_API IPluginExtensions : public virtual peru::IBase {
 public:
     virtual int getCount() const = 0;
-    virtual P<peru::IString> getExtension(int index) const = 0; // lower case, without the point
+    virtual P<peru::IString> getExtension(int index) const = 0; // lower case, without the dot
 };
 
 class SONORA2_API ISonoraPlugin : public virtual peru::IBase {
 public:
-    // Fixed records that also cross the pipe as raw bytes. The first field tells how many bytes the caller
-    // filled: a receiver copies that many into a zeroed record of its own size, so that a shorter record
-    // from an older caller stays valid.
+    // Fixed records that also cross the pipe as raw bytes. The first field is the number of bytes the caller
+    // filled: a receiver copies that many into a zeroed record of its own size, so that shorter records from
+    // older callers stay valid.
     struct SSourceParams {
         int32_t nSize = sizeof(SSourceParams);
         uint8_t bKeepOpened = 0; // 0: closed again after the test opening
@@ -54,7 +54,7 @@ public:
     virtual P<peru::IString> getPluginName() = 0;
     virtual int getValidTypes() = 0;
     virtual P<IPluginExtensions> getValidExtensions(int nTypes) = 0;
-    // Empty when the plug-in declines.
+    // Empty if the plug-in declines.
     virtual P<ISource> tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
                                        const SSourceParams* pParams) = 0;
     virtual P<IFormat> tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,

@@ -7,7 +7,7 @@ namespace sonora2::common {
 
 namespace {
 
-// A singleton of the factory, so that handlers that were never cleared still go before what they use.
+// A factory singleton, so that handlers that were never cleared are still released before what they use.
 class CHolder : public peru::CObject {
 public:
     ~CHolder() override = default;
@@ -23,7 +23,7 @@ public:
 } // namespace
 
 void setMediaEnvironment(const SMediaEnvironment& environment) {
-    SMediaEnvironment previous = environment; // then the old one, which is released without the lock
+    SMediaEnvironment previous = environment; // swapped with the old one, which is released outside the lock
     const P<CHolder> holder = CHolder::get();
     peru::CMutexLock lock(holder->mutex);
     std::swap(holder->environment, previous);

@@ -1,4 +1,4 @@
-// The plug-in handlers of the running library, for libraries that stand beside the front.
+// The running library's plug-in handlers, for libraries beside the front.
 #pragma once
 
 #include "peru/threads/IMutex.h"
@@ -15,8 +15,8 @@ struct SMediaEnvironment {
     P<IPluginHandler> writeHandler;
 };
 
-// The front sets it when it starts and clears it before the plug-ins are unloaded. A reader must not keep a
-// handler across the end of the library. Any thread.
+// The front sets it at start-up and clears it before the plug-ins are unloaded. Readers must not hold a
+// handler beyond that. Any thread.
 SONORA2_API void setMediaEnvironment(const SMediaEnvironment& environment);
 SONORA2_API SMediaEnvironment getMediaEnvironment();
 

@@ -1,4 +1,4 @@
-// The rule by which the fixed parameter records are received.
+// Receives fixed parameter records of any version.
 #pragma once
 
 #include <algorithm>
@@ -8,10 +8,10 @@
 
 namespace sonora2::common {
 
-// Takes as many bytes as the record's first field (its size as int32) says into a zeroed record of our own
-// size, whose first field then tells that size. A record from an older caller is shorter and reads as zero
-// where it ends; of a longer one, or one whose size is garbage, no more than our own size is read. Nothing
-// is read beyond the size that the caller states, nor beyond `available` bytes.
+// Copies as many bytes as the record's first field (its size as int32) states into a zeroed record of our own
+// size, whose first field is then set to that size. A shorter record from an older caller reads as zero where
+// it ends; of a longer one, or one with a garbage size, at most our own size is read. Never reads beyond the
+// stated size or `available` bytes.
 template <class Record> Record receiveRecord(const void* bytes, size_t available = sizeof(Record)) {
     static_assert(std::is_trivially_copyable_v<Record> && std::is_standard_layout_v<Record>);
     static_assert(std::is_same_v<decltype(Record::nSize), int32_t>);

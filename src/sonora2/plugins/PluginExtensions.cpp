@@ -35,7 +35,7 @@ void CPluginExtensions::readFrom(const P<peru::IDataInStream>& stream) {
     if (count < 0) throw CSonoraError("the list of file extensions has a negative count");
     for (int32_t i = 0; i < count; ++i) {
         P<IString> extension = stream->readString();
-        // A stream that has ended delivers empty texts.
+        // At its end the stream delivers empty texts.
         if (!extension || extension->isEmpty()) throw CSonoraError("the list of file extensions ends early");
         addExtension(extension);
     }

@@ -8,7 +8,7 @@
 
 namespace sonora2::common {
 
-// Ordered, without duplicates. Filled by one thread, then read by any number.
+// Ordered, without duplicates. Filled by one thread before any others read it.
 class SONORA2_API CPluginExtensions : public peru::CObject,
                                       public IPluginExtensions,
                                       public virtual peru::ISerializable {
@@ -17,13 +17,13 @@ public:
     ~CPluginExtensions() override;
 
     int getCount() const override { return static_cast<int>(m_extensions.size()); }
-    // Throws CInvalidArgError for an index outside the list.
+    // Throws CInvalidArgError for an index out of range.
     P<peru::IString> getExtension(int index) const override;
 
-    // False when an equal text is already held.
+    // False if an equal text is already present.
     bool addExtension(const P<peru::IString>& extension);
 
-    // The count as int32, then the texts. Reading replaces what the list holds.
+    // The count as int32, then the texts. Reading replaces the content.
     void writeTo(const P<peru::IDataOutStream>& stream) const override;
     void readFrom(const P<peru::IDataInStream>& stream) override;
 

@@ -88,8 +88,8 @@ void CPluginHandler::addPlugin(const P<ISonoraPlugin>& plugin, const P<ISonoraPl
     m_plainPlugins.push_back(plainPlugin);
 }
 
-// A directory that was set for this context comes before the environment and the installed places; the one
-// that every context starts with, the program's folder, after them.
+// A directory set for this context takes precedence over the environment and the installed locations; the
+// default directory, the program's folder, comes after them.
 P<IURI> CPluginHandler::findLibrary(const P<IString>& fileName) const {
     const P<IURI> directory = m_context->getBaseDirectories()->getPluginDirectory();
     const P<IURI> program = peru::getSystem()->getProgramFileFolder();
@@ -144,12 +144,12 @@ P<IPluginExtensions> CPluginHandler::getValidExtensions(int mask) {
     return all;
 }
 
-// Lower case, without a point. The suffix is cut off the whole name, so that "a.flac.part" is a "flac".
+// Lower case, without the dot. The suffix is removed first, so that "a.flac.part" yields "flac".
 P<IString> CPluginHandler::getLookupKey(const P<IURI>& uri) const {
     std::string name = toLowerAscii(CString::toStdString(peru::CURI::unescape(uri->getFileName())));
     const std::string suffix = toLowerAscii(CString::toStdString(m_uriSuffix));
     if (!suffix.empty() && name.ends_with(suffix)) name.resize(name.size() - suffix.size());
-    name.erase(0, std::min(name.find_first_not_of('.'), name.size())); // a hidden file's point
+    name.erase(0, std::min(name.find_first_not_of('.'), name.size())); // the dot of a hidden file
     const size_t point = name.rfind('.');
     return point == std::string::npos ? CString::empty() : CString::fromUTF8(name.substr(point + 1));
 }
@@ -158,7 +158,7 @@ void CPluginHandler::log(int32_t severity, const P<IString>& text) const {
     if (P<ILogManager> manager = m_context->getLogManager()) manager->log(severity, text);
 }
 
-// What the preference does is no reason for a create call to fail.
+// A failing preference must not fail the create call.
 template <class Call> void CPluginHandler::askPreference(const P<IURI>& uri, Call call) {
     if (!m_preference) return;
     try {
@@ -188,8 +188,8 @@ void CPluginHandler::storePreferred(int mask, const P<IURI>& uri, ISonoraPlugin&
     askPreference(uri, [&] { m_preference->store(mask, uri, plugin.getPluginName()); });
 }
 
-// The one walk behind every create call: the remembered plug-in, then each in order that lists the extension.
-// `tryCreate` answers an object that has passed every test, or an empty handle.
+// Common to all create calls: tries the remembered plug-in, then each plug-in that lists the extension, in
+// order. `tryCreate` returns an object that has passed every test, or an empty handle.
 template <class T, class TryCreate>
 P<T> CPluginHandler::findObject(const P<IURI>& uri, int mask, const STexts& texts, TryCreate tryCreate) {
     auto attempt = [&](ISonoraPlugin& plugin, const P<IString>& key, ISonoraPlugin* plain) -> P<T> {
@@ -302,7 +302,7 @@ P<peru::IBase> CPluginHandler::createObject(const P<IURI>& uri, const SObjectPar
     static constexpr STexts kTexts{"tried to create %s with plugin %s.\nOpening failed: %s - %s",
                                    "tried to create %s with plugin %s.\nOpening failed: unknown exception"};
     peru::CMutexLock lock(m_lock);
-    const SObjectParams record; // its size is all that there is, whatever the caller's says
+    const SObjectParams record; // it has no field but its size, whatever the caller passed
     return findObject<peru::IBase>(uri, kPluginObject, kTexts, [&](ISonoraPlugin& plugin) {
         return plugin.tryCreateObject(uri, &record);
     });

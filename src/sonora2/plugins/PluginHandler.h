@@ -1,4 +1,4 @@
-// Loads the plug-ins and picks the one that reads or writes a URI.
+// Loads the plug-ins and selects the one that reads or writes a URI.
 #pragma once
 
 #include "peru/threads/IMutex.h"
@@ -11,14 +11,14 @@
 
 namespace sonora2::common {
 
-// Plug-ins are tried in the order of the context's list, those only that list the URI's extension; a source
-// counts once it has really been opened. What a plug-in throws is logged and never reaches the caller.
+// Plug-ins that list the URI's extension are tried in the order of the context's list; a source is accepted
+// once it has actually been opened. Exceptions of a plug-in are logged and never reach the caller.
 //
-// The plug-ins stay loaded for the handler's life, and every object that they made must go before it.
+// The plug-ins stay loaded for the handler's lifetime; every object created by them must be destroyed first.
 class SONORA2_API CPluginHandler : public peru::CObject, public IPluginHandler {
 public:
-    // Loads the context's plug-ins, or the default ones if it names none; one that cannot be loaded costs a
-    // line of the log. The preference may be empty.
+    // Loads the context's plug-ins, or the default ones if it names none; failures to load are only logged.
+    // The preference may be empty.
     explicit CPluginHandler(const P<ISonoraContext>& context, bool boxed = false,
                             const peru::CStringArg& uriSuffix = "",
                             const P<IPluginPreference>& preference = nullptr);
@@ -47,12 +47,12 @@ public:
     void setURISuffix(const peru::CStringArg& suffix) override;
     P<peru::IString> getURISuffix() override;
 
-    // The first creates objects, the second answers for extensions; in this process they are one object.
-    // Not to be called once create calls may run.
+    // `plugin` creates objects, `plainPlugin` is asked for extensions; in this process both are the same
+    // object. Must not be called once create calls may run.
     void addPlugin(const P<ISonoraPlugin>& plugin, const P<ISonoraPlugin>& plainPlugin);
 
 private:
-    struct STexts; // how a failure of a plug-in reads in the log
+    struct STexts; // log messages for a failing plug-in
 
     P<ISource> findSource(const P<peru::IURI>& uri, int mask, const SSourceParams* params);
     P<IFormat> findFormat(const P<peru::IURI>& uri, int mask, const SFormatParams* params);
@@ -70,10 +70,10 @@ private:
     std::vector<P<ISonoraPlugin>> m_plainPlugins; // parallel
     P<ISonoraContext> m_context;
     bool m_boxed;
-    bool m_verifyByOpening = true; // guarded by m_lock, as is the suffix
+    bool m_verifyByOpening = true; // guarded by m_lock, like the suffix
     P<peru::IString> m_uriSuffix;
     P<IPluginPreference> m_preference;
-    P<peru::IMutex> m_lock; // held over every create call
+    P<peru::IMutex> m_lock; // held during every create call
 };
 
 } // namespace sonora2::common

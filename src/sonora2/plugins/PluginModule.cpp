@@ -8,7 +8,7 @@ namespace sonora2::common {
 
 namespace {
 
-// A text of its own: one that came out of a plug-in may lie in the plug-in's memory.
+// Copies a text, since one from a plug-in may live in the plug-in's memory.
 P<peru::IString> detachText(const P<peru::IString>& text) {
     return peru::CString::fromUTF8(peru::CString::toStdString(text));
 }
@@ -18,14 +18,14 @@ P<peru::IDynamicLibrary> loadLibrary(const P<ISonoraContext>& context, const P<p
     try {
         return peru::getDynamicLibraryLoader()->load(file);
     } catch (const peru::CException& e) {
-        // The library is there, so the loader's reason is what helps: a missing symbol or dependency.
+        // The file exists, so the loader's reason matters: a missing symbol or dependency.
         if (P<ILogManager> log = context->getLogManager()) log->log(kSeverityDebug, e.getDescription());
         throw CSonoraError(peru::format("could not load plugin: %s", name.c_str()));
     }
 }
 
-// What the entry throws is turned into an error that does not outlive the library: the library is unloaded
-// while the exception is on its way.
+// Converts exceptions of the entry point: the library is unloaded while they propagate, so they must not
+// refer to it.
 P<ISonoraPlugin> createPlugin(PluginCreateFunction create, const P<ISonoraContext>& context) {
     P<peru::IString> reason;
     try {

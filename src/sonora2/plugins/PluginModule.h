@@ -1,4 +1,4 @@
-// A plug-in that runs in this process.
+// A plug-in running in this process.
 #pragma once
 
 #include "peru/system/IDynamicLibrary.h"
@@ -9,10 +9,10 @@
 
 namespace sonora2::common {
 
-// Keeps the library loaded; objects that the plug-in made do not, and must be gone before the module.
+// Keeps the library loaded. Objects created by the plug-in do not, and must be destroyed before the module.
 class SONORA2_API CPluginModule : public peru::CObject, public ISonoraPlugin {
 public:
-    // Loads the library and asks it for its plug-in. Throws CSonoraError, which names the library.
+    // Loads the library and creates its plug-in. Throws CSonoraError, which names the library.
     CPluginModule(const P<ISonoraContext>& context, const P<peru::IURI>& library);
     ~CPluginModule() override;
 
@@ -27,7 +27,7 @@ public:
 
 private:
     std::string m_name;
-    P<ISonoraPlugin> m_plugin; // its code lies in the library: released first
+    P<ISonoraPlugin> m_plugin; // its code is in the library: released first
     P<peru::IDynamicLibrary> m_library;
 };
 

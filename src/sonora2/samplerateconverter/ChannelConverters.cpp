@@ -14,15 +14,15 @@ constexpr unsigned allPlanes(int count) {
     return (1u << count) - 1;
 }
 
-// The loops of all matrices. A mix is given the channels of one frame and answers the sample of one plane, in
-// 32 bits; it is stored in 16 without clipping. Divisions truncate towards zero.
+// The loops of all matrices. A mix maps the channels of one frame to the sample of one plane, in 32 bits; it
+// is stored in 16 bits without clipping. Divisions truncate towards zero.
 template <int SRC, int DST, unsigned WRITTEN = allPlanes(DST)> class TShape : public CChannelConverter {
 public:
     TShape() : CChannelConverter(SRC, DST, WRITTEN) {}
 
 protected:
-    // One pass for each plane: with a stride that the compiler knows and one target that nothing aliases, the
-    // loop is vectorised, and the source is in the cache from the second pass on.
+    // One pass per plane: with a constant stride and a target without aliases the compiler vectorises the
+    // loop, and from the second pass on the source is in the cache.
     template <class Mix> static void mixPlane(int frames, const SourcePointers& source, int stride,
                                               int16_t* __restrict plane, Mix mix) {
         if (isDense(source, stride)) {
@@ -53,8 +53,7 @@ private:
     }
 };
 
-// The gaps of some rows (planes without signal, channels that are left out) are part of how the mixes sound
-// and stay as they are.
+// The gaps of some rows (planes without signal, unused channels) are part of the sound and must stay.
 
 class CMonoToMonoConverter final : public TShape<1, 1> {
 public:

@@ -16,7 +16,7 @@ public:
     using PlanePointers = std::array<int16_t*, kMaxChannels>;
 
     // Reads `frames` frames from source pointers that advance by the stride, and writes each plane densely.
-    // A plane that isPlaneWritten denies stays as it is.
+    // Planes for which isPlaneWritten() is false are left unchanged.
     virtual void convert(int frames, SourcePointers source, int sourceStrideBytes,
                          PlanePointers planes) const = 0;
 
@@ -24,7 +24,7 @@ public:
     int getDestinationChannels() const { return m_destinationChannels; }
     bool isPlaneWritten(int plane) const { return (m_writtenPlanes >> plane & 1u) != 0; }
 
-    // Empty where there is no matrix for the two layouts.
+    // Empty if there is no matrix for the two layouts.
     static P<CChannelConverter> create(int sourceChannels, int destinationChannels);
     static bool exists(int sourceChannels, int destinationChannels);
 
@@ -36,7 +36,7 @@ protected:
 private:
     int m_sourceChannels;
     int m_destinationChannels;
-    unsigned m_writtenPlanes; // one bit a plane
+    unsigned m_writtenPlanes; // one bit per plane
 };
 
 } // namespace sonora2::samplerateconverter

@@ -39,7 +39,7 @@ SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShif
                             nullptr) < 0)
         return nullptr;
     std::unique_ptr<SwrContext, SContextDeleter> context(made);
-    // All that shapes the sound is set here, since the library's defaults are other ones. The flag makes it
+    // Every option that affects the sound is set explicitly; the library's defaults differ. The flag makes it
     // filter equal rates too.
     const bool accepted = av_opt_set_sample_fmt(made, "internal_sample_fmt", AV_SAMPLE_FMT_S16P, 0) >= 0 &&
                           av_opt_set(made, "flags", "+res", 0) >= 0 &&
@@ -53,7 +53,7 @@ SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShif
                           av_opt_set_double(made, "kaiser_beta", 9.0, 0) >= 0;
     if (!accepted || swr_init(made) < 0) return nullptr;
 
-    // At its start the filter waits for two lengths of itself and then gives them out at once.
+    // The filter first collects two filter lengths of input and then outputs them at once.
     const int64_t taps = filterSize * ((std::max(inRate, outRate) + int64_t{outRate} - 1) / outRate);
     const int64_t margin = 2 * taps * outRate / inRate + kOutputMargin;
     return std::make_unique<SResampler>(SResampler{std::move(context), inRate, outRate, margin}).release();
@@ -61,9 +61,9 @@ SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShif
 
 int resamplerRun(SResampler* resampler, int16_t* dst, const int16_t* src, int* consumed, int srcSize,
                  int dstSize) {
-    // The library holds back what its output cannot take, and would do so without bound: it is given no more
-    // than fits, beside the little that it waited for at its start. The room that it is told stays near what
-    // will come, since it grows slow with a large one.
+    // The library buffers whatever does not fit the output, without bound, so it gets no more input than fits
+    // (apart from the initial fill). The output size passed to it stays close to what is expected, since it
+    // becomes slow with a large one.
     const int64_t fitting = dstSize * resampler->inRate / resampler->outRate;
     const int taken = static_cast<int>(std::min<int64_t>(srcSize, fitting));
     const int64_t expected = taken * resampler->outRate / resampler->inRate + resampler->margin;

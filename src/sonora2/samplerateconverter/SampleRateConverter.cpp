@@ -20,7 +20,7 @@ namespace {
 constexpr int kMaxChannels = CSampleRateConverter::CChannelConverter::kMaxChannels;
 constexpr int kSampleBytes = sizeof(int16_t);
 constexpr int kOutputBlockBytes = CSampleRateConverter::kMaxOutputFrames * kSampleBytes;
-constexpr int kMaxRate = 1 << 24; // far above any sound, so that a flush has a size that can be had
+constexpr int kMaxRate = 1 << 24; // far above any real rate; bounds the memory of a flush
 
 constexpr int kFilterSize = 16;
 constexpr int kPhaseShift = 10;
@@ -39,11 +39,11 @@ int16_t* shorts(const P<IMemoryBlock>& block) {
 
 struct CSampleRateConverter::SImpl {
     struct SChannel {
-        P<IMemoryBlock> input; // what the filter gets, carry-over in front
-        int carryBytes = 0;    // bytes of the input that the last round consumed
-        int carrySamples = 0;  // samples of it that wait for the next round
+        P<IMemoryBlock> input; // for the filter, carry-over first
+        int carryBytes = 0;    // bytes of the input consumed by the last call
+        int carrySamples = 0;  // samples left for the next call
         std::unique_ptr<SResampler, SResamplerDeleter> resampler;
-        P<IMemoryBlock> output; // for the length of one call
+        P<IMemoryBlock> output; // during one call
         int produced = 0;
     };
 
@@ -54,7 +54,7 @@ struct CSampleRateConverter::SImpl {
     int dstRate, dstChannels, dstBytes;
     bool planarOutput;
     uint32_t outputPosition = 0;
-    P<CChannelConverter> matrix; // found at the first conversion
+    P<CChannelConverter> matrix; // set by the first conversion
     std::array<SChannel, kMaxChannels> channels;
 
     void prepare();
@@ -64,7 +64,7 @@ struct CSampleRateConverter::SImpl {
     P<IMemoryBlock> assemble(int frames);
 };
 
-// Refuses what cannot be converted, at the first call: a converter may be made for a shape that never comes.
+// Rejects unsupported formats at the first conversion, not earlier: a converter may never be used.
 void CSampleRateConverter::SImpl::prepare() {
     if (srcBytes < 1 || srcBytes > 4)
         throw peru::CError(peru::format(
@@ -94,7 +94,7 @@ void CSampleRateConverter::SImpl::prepare() {
 P<IMemoryBlock> CSampleRateConverter::SImpl::makeSilence() {
     const int64_t size = int64_t{srcBytes} * srcChannels * srcRate;
     const P<IMemoryBlock> block = memoryManager->getBlock(size);
-    // Unsigned samples rest in the middle: bytes of zero would be a click at full scale.
+    // Unsigned samples are silent at mid-scale: zero bytes would be a full-scale click.
     std::memset(block->getData(), srcBytes == 1 ? 0x80 : 0, static_cast<size_t>(size));
     return block;
 }
@@ -128,7 +128,7 @@ void CSampleRateConverter::SImpl::resample(SChannel& channel) {
     if (channel.produced < 0) throw std::bad_alloc();
     channel.carrySamples = samples - consumed;
     channel.carryBytes = consumed * kSampleBytes;
-    // Nothing waits as a rule: the pool has the block back before the next chunk needs one.
+    // Usually nothing is left over: return the block to the pool before the next chunk needs one.
     if (channel.carrySamples == 0) {
         channel.input = memoryManager->getBlock(0);
         channel.carryBytes = 0;
@@ -137,7 +137,7 @@ void CSampleRateConverter::SImpl::resample(SChannel& channel) {
 
 P<IMemoryBlock> CSampleRateConverter::SImpl::assemble(int frames) {
     const P<IMemoryBlock> block = memoryManager->getBlock(int64_t{dstBytes} * dstChannels * frames);
-    // Two bytes go straight to their place; single bytes are narrowed from the same order of samples.
+    // 16-bit samples are written in place; 8-bit samples are narrowed from the same order of samples.
     P<IMemoryBlock> ordered = block;
     if (dstBytes == 1) ordered = memoryManager->getBlock(int64_t{kSampleBytes} * dstChannels * frames);
     if (planarOutput) {
@@ -197,7 +197,7 @@ P<audio::IAudioChunk> CSampleRateConverter::convert(const void* data, int size) 
     }
     const int frames = static_cast<int>(byteCount / s.srcChannels / s.srcBytes);
 
-    // 16-bit samples are read where they lie.
+    // 16-bit samples are used in place.
     P<IMemoryBlock> narrowed;
     const int16_t* pcm = reinterpret_cast<const int16_t*>(bytes);
     if (s.srcBytes != kSampleBytes || reinterpret_cast<uintptr_t>(bytes) % alignof(int16_t) != 0) {

@@ -11,7 +11,7 @@ namespace sonora2::audio {
 
 namespace {
 
-// An input that answers with empty chunks for ever is taken for ended.
+// An input that returns only empty chunks counts as ended after this many.
 constexpr int kMaxEmptyChunks = 10000;
 
 } // namespace

@@ -1,4 +1,4 @@
-// Makes the uneven chunks of a decoder even.
+// Cuts a decoder's chunks of varying size into chunks of one size.
 #pragma once
 
 #include "sonora2/context/ISonoraContext.h"
@@ -8,18 +8,18 @@
 
 namespace sonora2::audio {
 
-// One thread at a time. The input is opened before and stays so.
+// One thread at a time. The input must be open throughout.
 class SONORA2_API CAudioChunkUnifier : public peru::CObject {
 public:
     CAudioChunkUnifier(const P<common::ISonoraContext>& context, const P<IAudioTrack>& input);
     CAudioChunkUnifier(const P<common::ISonoraContext>& context, const P<common::IAudioSource>& input);
     ~CAudioChunkUnifier() override;
 
-    // What the input gives in another format is converted. Called before the first chunk.
+    // Input in another format is converted. Call before the first chunk.
     void setFormat(int sampleRate, int channelCount, int bytesPerSample);
 
-    // Always that many frames: the last chunk of the input is filled up with zeros. Empty when nothing is
-    // left. The timestamp is the input's.
+    // Returns exactly that many frames, padding the end of the input with zeros; empty when nothing is left.
+    // The timestamp is the input's.
     P<IAudioChunk> getChunk(int frames);
 
 private:
@@ -35,12 +35,12 @@ private:
     P<IAudioChunk> fetch();
     bool advance();
 
-    P<IAudioTrack> m_track; // one of the two
+    P<IAudioTrack> m_track; // either this or m_source
     P<common::IAudioSource> m_source;
-    P<IAudioChunk> m_chunk; // what is left of the last one; empty or with bytes behind the offset
+    P<IAudioChunk> m_chunk; // the partly used chunk, with bytes left after the offset; or empty
     int64_t m_offset = 0;   // bytes
     P<common::ISonoraContext> m_context;
-    SFormat m_format; // of what is handed out
+    SFormat m_format; // of the output
     P<samplerateconverter::CSampleRateConverter> m_converter;
 };
 

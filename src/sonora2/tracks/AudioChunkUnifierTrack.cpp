@@ -53,7 +53,7 @@ void CAudioChunkUnifierTrack::processCommand(const P<common::ITrackCommand>& com
     const P<peru::IString> name = command->getCommandName();
     peru::CMutexLock lock(m_mutex);
     if (name->equals(COpenThreadIndependentCommand::kName)) {
-        // Not passed on: opening means to make the unifier as well, and an inner list would open all it has.
+        // Not passed on: opening also creates the unifier, and an inner list would open all its tracks.
         if (P<COpenThreadIndependentCommand>(command)->isClose()) {
             if (isOpened()) close();
         } else if (!isOpened()) {
@@ -71,7 +71,7 @@ void CAudioChunkUnifierTrack::skipTo(double listTime, const P<common::ITrackComm
         m_track->processCommand(peru::make<CSkipToTimeCommand>(medium->getMediumTime(listTime)));
     else
         m_track->processCommand(command);
-    // What it holds of the last chunk belongs to the time before.
+    // Its partly used chunk belongs to the old position.
     if (m_unifier) m_unifier = makeUnifier();
 }
 

@@ -1,4 +1,4 @@
-// A track in a mixer's list: delivers chunks of one length in the list's format.
+// A track in a mixer's list: delivers chunks of one size in the list's format.
 #pragma once
 
 #include "peru/threads/IMutex.h"
@@ -6,7 +6,7 @@
 
 namespace sonora2::audio {
 
-// A track whose skip command counts in the time of its medium. Who skips in a list asks it what that is.
+// A track whose skip command uses medium time. A list asks it for the medium time before it skips.
 class SONORA2_API IMediumTimeTrack {
 public:
     virtual double getMediumTime(double listTime) const = 0; // seconds
@@ -16,10 +16,10 @@ protected:
 };
 
 // Opening, reading and commands of the inner track run under one lock, so that the list's worker may open it
-// while others play; questions that need no opened track are passed on without.
+// while others play; queries that need no open track are passed on without the lock.
 class SONORA2_API CAudioChunkUnifierTrack : public peru::CObject, public IAudioTrack {
 public:
-    // getNextAudioChunk() gives `frames` frames at that rate, channel count and sample width.
+    // getNextAudioChunk() returns `frames` frames at that rate, channel count and sample width.
     CAudioChunkUnifierTrack(const P<common::ISonoraContext>& context, const P<IAudioTrack>& track, int frames,
                             int sampleRate, int channelCount, int bytesPerSample);
     ~CAudioChunkUnifierTrack() override;
@@ -51,8 +51,8 @@ private:
     const int m_sampleRate;
     const int m_channelCount;
     const int m_bytesPerSample;
-    P<peru::IMutex> m_mutex;         // guards the unifier and what the inner track does with its medium
-    P<CAudioChunkUnifier> m_unifier; // while opened
+    P<peru::IMutex> m_mutex;         // guards the unifier and the inner track's use of its medium
+    P<CAudioChunkUnifier> m_unifier; // while open
 };
 
 } // namespace sonora2::audio

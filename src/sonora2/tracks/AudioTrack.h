@@ -13,8 +13,8 @@
 
 namespace sonora2::audio {
 
-// A gain that goes from one factor to the other; times in seconds of the source. It works on chunks that lie
-// wholly within it, and on 16-bit samples only.
+// A gain that moves from one factor to another; times in seconds of the source. Applies only to chunks that
+// lie entirely within it, and only to 16-bit samples.
 struct SVolumeChange {
     double startFactor;
     double endFactor;
@@ -22,26 +22,26 @@ struct SVolumeChange {
     double endTime;
 };
 
-// Opened, read and closed by any thread. The setters are for the time before the track is played.
+// May be opened, read and closed by any thread. The setters are to be called before the track is played.
 class SONORA2_API CAudioTrack : public peru::CObject, public IAudioTrack {
 public:
-    // `opened`: the source is handed over opened, at its beginning.
+    // `opened`: the source is already open, at its beginning.
     CAudioTrack(const P<common::ISonoraContext>& context, const P<common::IAudioSource>& source, bool opened,
                 double startTime, double duration, int sortIndex, const P<peru::IURI>& uri = nullptr,
                 const peru::CStringArg& trackId = "");
     ~CAudioTrack() override;
 
-    // Replaces all volume changes by a fade at the start and one at the end; seconds, 0 for none.
+    // Replaces all volume changes by a fade-in and a fade-out; in seconds, 0 for none.
     virtual void setFadeTimes(double fadeIn, double fadeOut);
     virtual void addVolumeChange(double startFactor, double endFactor, double startTime, double endTime);
-    virtual void setEqualizerPreset(int preset); // 0 is none; counts from the next open
+    virtual void setEqualizerPreset(int preset); // 0 is none; takes effect at the next open
     virtual void setSpeed(double speed);         // 2 is twice as fast and an octave up; 0 is normal
     void setEnabled(bool enabled) { m_enabled = enabled; }
 
     P<peru::IURI> getURI() override { return m_uri; } // empty for a silent track
     void setURI(const P<peru::IURI>& uri) override { m_uri = uri; }
     bool isOpened() override;
-    void open() override; // throws what the source throws
+    void open() override; // exceptions of the source propagate
     void close() override;
     int getSortIndex() override { return m_sortIndex; }
     double getStartTime() override { return m_startTime; }
@@ -63,7 +63,7 @@ private:
     P<IAudioChunk> changeSpeed(const P<IAudioChunk>& chunk);
 
     P<common::ISonoraContext> m_context;
-    P<common::CEmbeddedMutex<common::IAudioSource>> m_guard; // guards what happens with the source
+    P<common::CEmbeddedMutex<common::IAudioSource>> m_guard; // guards the use of the source
     double m_startTime;
     double m_duration;
     P<peru::IURI> m_uri;
@@ -74,7 +74,7 @@ private:
     P<IAudioEqualizer> m_equalizer;
     int m_equalizerPreset = 0;
     std::atomic<bool> m_enabled{true};
-    P<samplerateconverter::CSampleRateConverter> m_converter; // of the stream since it was opened or skipped
+    P<samplerateconverter::CSampleRateConverter> m_converter; // one per stretch between skips
     std::vector<SVolumeChange> m_volumeChanges;
     int m_sortIndex;
 };

@@ -17,7 +17,7 @@ namespace sonora2::audio {
 
 namespace {
 
-// The position is told in whole milliseconds: a finer frame would show nothing.
+// Positions are reported in whole milliseconds, so a finer frame would have no effect.
 constexpr int kFramerateNum = 1;
 constexpr int kFramerateDen = 1000;
 
@@ -118,7 +118,8 @@ P<peru::IMemoryBlock> CAudioTracklist::mixActive(const Entries& active) {
     for (const SEntry* entry : active) {
         const P<IAudioChunk> chunk = P<CAudioChunkUnifierTrack>(entry->track)->getNextAudioChunk();
         if (!chunk) continue;
-        // The first one is the unifier's fresh copy and becomes the sum: mixed into zeros it stays as it is.
+        // The first chunk is the unifier's own copy and becomes the sum; mixing it into zeros changes
+        // nothing.
         if (!sum) {
             sum = chunk->getMemoryBlock();
             continue;

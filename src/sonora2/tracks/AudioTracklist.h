@@ -9,25 +9,25 @@
 
 namespace sonora2::audio {
 
-// Opened, it delivers chunk after chunk from the start of the time line; opened again after close it starts
-// anew. Tracks begin and end at the borders of chunks. Works on 16-bit samples.
+// Once open, delivers chunks from the start of the time line; reopening restarts it. Tracks begin and end at
+// chunk boundaries. Works on 16-bit samples.
 class SONORA2_API CAudioTracklist : public common::CTracklist, public IAudioTracklist {
 public:
-    // `openInThread`: tracks are opened ahead and closed on a thread of the list's own. `framesPerStep` is
-    // the length of a chunk. `startTime` is the place of the list on the time line of a list that it is a
-    // track of; skip commands count from there. Throws CSonoraError for a format that is none.
+    // `openInThread`: tracks are opened ahead and closed on the list's own thread. `framesPerStep` is the
+    // length of a chunk. `startTime` is the list's position on the time line of an enclosing list; skip
+    // commands are relative to it. Throws CSonoraError for an invalid format.
     CAudioTracklist(bool openInThread, const P<common::ISonoraContext>& context, int sampleRate,
                     int channelCount, int bytesPerSample, int framesPerStep, double startTime, int sortIndex,
                     const peru::CStringArg& trackId = "");
     ~CAudioTracklist() override;
 
-    // Throws CError for what is no IAudioTrack.
+    // Throws CError unless the track is an IAudioTrack.
     void addTrack(const P<common::ITrack>& track, double start, double end) override;
     void processCommand(const P<common::ITrackCommand>& command) override;
     int getBufferStatus() override { return CTracklist::getBufferStatus(); }
     double getDuration() override { return CTracklist::getDuration(); }
 
-    P<peru::IURI> getURI() override; // an empty one
+    P<peru::IURI> getURI() override; // an empty URI
     void setURI(const P<peru::IURI>& uri) override {}
     bool isOpened() override;
     void open() override;
@@ -39,7 +39,7 @@ public:
     int getSampleRate() override { return m_sampleRate; }
     int getChannelCount() override { return m_channelCount; }
     int getBytesPerSample() override { return m_bytesPerSample; }
-    // A step; empty at the end of the list and while it is closed. The chunk is the caller's own.
+    // Performs one step; empty at the end of the list and while closed. The caller may modify the chunk.
     P<IAudioChunk> getNextAudioChunk() override;
 
 protected:
@@ -59,7 +59,7 @@ private:
     const P<peru::IString> m_trackId;
     std::atomic<bool> m_enabled{true};
     const int m_framesPerStep;
-    // These are guarded by the list's lock.
+    // Guarded by the list's lock:
     bool m_opened = false;
     uint64_t m_position = 0; // frames delivered, or skipped, so far
     P<IAudioChunk> m_current;

@@ -1,4 +1,4 @@
-// Equalizers, and where they come from.
+// Equalizers and the factory that provides them.
 #pragma once
 
 #include "peru/P.h"
@@ -19,12 +19,12 @@ public:
 
 class SONORA2_API IAudioToolsHandler : public virtual peru::IBase {
 public:
-    virtual P<IAudioEqualizer> createEqualizer() = 0; // empty where there is none
+    virtual P<IAudioEqualizer> createEqualizer() = 0; // may be empty
 };
 
 using AudioToolsHandlerFactory = P<IAudioToolsHandler> (*)();
 
-// Who brings the audio tools says so here; null takes them away again. Without them, presets have no effect.
+// Registers the provider of the audio tools; null removes it. Without audio tools, presets have no effect.
 SONORA2_API void setAudioToolsHandlerFactory(AudioToolsHandlerFactory factory);
 SONORA2_API P<IAudioToolsHandler> createAudioToolsHandler(); // empty without audio tools
 

@@ -8,7 +8,7 @@ namespace sonora2::audio {
 
 class SONORA2_API IAudioTracklist : public virtual common::ITracklist, public virtual IAudioTrack {
 public:
-    // Said by both bases.
+    // Declared by both bases.
     int getBufferStatus() override = 0;
     void processCommand(const P<common::ITrackCommand>& command) override = 0;
     double getDuration() override = 0;

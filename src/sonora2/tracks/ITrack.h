@@ -1,4 +1,4 @@
-// A source with effects and a place in time.
+// A source with effects and a position in time.
 #pragma once
 
 #include "peru/uri/IURI.h"
@@ -45,7 +45,7 @@ public:
     virtual void open() = 0;
     virtual void close() = 0;
     virtual int getSortIndex() = 0;    // the lane of the track in its list
-    virtual double getStartTime() = 0; // seconds on the time line of its list
+    virtual double getStartTime() = 0; // seconds on its list's time line
     virtual double getDuration() = 0;  // seconds on that time line
     virtual bool isEnabled() = 0;
     virtual P<peru::IString> getDebugText() = 0;

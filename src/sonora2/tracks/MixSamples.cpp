@@ -2,8 +2,8 @@
 
 namespace sonora2::audio {
 
-// Without branches and in lanes of 16 bits, so that the compiler makes vectors of eight samples of it. All
-// arithmetic is modulo 2^16; the sum is in range, so that what wraps on the way comes back.
+// Branch-free and in 16-bit lanes, so that the compiler vectorises it by eight. All arithmetic is modulo
+// 2^16; the final sum is in range, so intermediate wrap-around cancels out.
 void mixSamples(const int16_t* __restrict samples, int16_t* __restrict sum, size_t count) {
     for (size_t i = 0; i < count; ++i) {
         const int16_t a = samples[i], b = sum[i];
@@ -15,7 +15,7 @@ void mixSamples(const int16_t* __restrict samples, int16_t* __restrict sum, size
         const auto h = static_cast<uint16_t>(high << 1 | low >> 15);
         const auto l = static_cast<uint16_t>(low & 0x7FFF);
         const auto q = static_cast<uint16_t>(h + (static_cast<uint16_t>(h + l + 1) >> 15));
-        // All bits set where both are negative, or neither is; a product of 0 corrects nothing.
+        // All bits set if both are negative, or if neither is; a product of 0 needs no correction.
         const auto negative = static_cast<uint16_t>((a & b) >> 15);
         const auto positive = static_cast<uint16_t>(~((a | b) >> 15));
         sum[i] = static_cast<int16_t>(static_cast<uint16_t>(

@@ -1,4 +1,4 @@
-// What can be told to a track or a list of them.
+// Commands for tracks and track lists.
 #pragma once
 
 #include "peru/Object.h"
@@ -6,7 +6,7 @@
 
 namespace sonora2::common {
 
-// A command's name and target. Immutable, so that one object may be sent to any number of tracks.
+// A command's name and target. Immutable: one object may be sent to any number of tracks.
 class SONORA2_API CTrackCommand : public peru::CObject, public ITrackCommand {
 public:
     ~CTrackCommand() override;
@@ -21,10 +21,10 @@ private:
     P<peru::IString> m_target;
 };
 
-// Whether a command is meant for the track of that id.
+// Whether a command is addressed to the track with that id.
 SONORA2_API bool isMeantFor(const ITrackCommand& command, const P<peru::IString>& trackId);
 
-// Plays on from another time. A list counts in its own time and tells its tracks so.
+// Continues from another time. A list converts it to its own time before passing it to its tracks.
 class SONORA2_API CSkipToTimeCommand : public CTrackCommand {
 public:
     static constexpr const char* kName = "CSkipToTimeCommand";
@@ -61,7 +61,7 @@ private:
     int m_preset;
 };
 
-// Opens a track, or closes it, away from the thread that plays the list.
+// Opens or closes a track on a thread other than the one that plays the list.
 class SONORA2_API COpenThreadIndependentCommand : public CTrackCommand {
 public:
     static constexpr const char* kName = "COpenThreadIndependentCommand";

@@ -9,7 +9,7 @@ namespace sonora2::common {
 
 namespace {
 
-// How long an idle worker sleeps at most before it looks around.
+// Longest sleep of an idle worker before it checks its state.
 constexpr uint32_t kIdleMilliseconds = 1000;
 
 } // namespace

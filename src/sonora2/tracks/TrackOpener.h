@@ -12,9 +12,8 @@
 
 namespace sonora2::common {
 
-// The worker of a track list. It never takes the list's lock, so that a slow medium holds up nobody but
-// those who need that very medium. A track that fails here costs a line of the log: it is opened again when
-// it is due, and fails there.
+// The worker of a track list. Never takes the list's lock, so that a slow medium delays only threads that
+// need that medium. A failure here is only logged: the track is opened again when it is due, and fails there.
 //
 // Used by the thread that holds the list's lock, one at a time.
 class CTrackOpener : public peru::CObject {
@@ -24,11 +23,11 @@ public:
 
     void requestOpen(const P<ITrack>& track) { request(track, false); }
     void requestClose(const P<ITrack>& track) { request(track, true); }
-    // Afterwards nothing that was requested of the track is still to come. Waits where the thread is just
-    // busy with it. True when the track was still to be closed, which the caller now does himself.
+    // Cancels all pending requests for the track and waits if the thread is busy with it. Returns true if a
+    // close was pending, which is then up to the caller.
     bool claim(const P<ITrack>& track);
-    // Ends the thread, when it is done with the track that it is busy with. Tracks that wait to be closed are
-    // closed, those that wait to be opened are not.
+    // Ends the thread once its current request is done. Pending closes are performed, pending opens are
+    // dropped.
     void stop();
 
 private:
@@ -48,7 +47,7 @@ private:
     P<peru::ISignal> m_wake; // set when there is a job, and to stop
     P<peru::ISignal> m_done; // set when a job is done
     P<peru::IMutex> m_queueMutex;
-    std::deque<SJob> m_queue; // these are guarded by the mutex
+    std::deque<SJob> m_queue; // guarded by the mutex, like the next two
     ITrack* m_busyWith = nullptr;
     bool m_stopping = false;
 };

@@ -98,7 +98,7 @@ void CTracklist::processCommand(const P<ITrackCommand>& command) {
         skipTo(skip->getTime() - m_fixedDuration);
         return;
     }
-    // Told without the lock: a track that is just being opened answers only when that is done.
+    // Sent without the lock: a track that is being opened blocks until that is done.
     std::vector<P<ITrack>> tracks;
     {
         peru::CMutexLock lock(m_lock);
@@ -120,11 +120,11 @@ void CTracklist::skipTo(double time) {
     m_currentFrame = toFrame(time);
     setPosition(time);
 
-    // What plays and has its start at the new time starts anew, whatever the rounding of times makes of it.
+    // A playing track that starts at or after the new time is restarted, whatever rounding does to the time.
     for (SEntry* entry : Entries(m_held))
         if (entry->state == EState::playing && entry->start >= m_currentFrame) leave(*entry);
     findActive();
-    // What is open for another time must not be found open when its own comes.
+    // Tracks opened for another time must not still be open when they become due.
     const double target = getLookAheadEnd();
     for (SEntry* entry : Entries(m_held)) {
         if (std::find(m_active.begin(), m_active.end(), entry) != m_active.end()) continue;
@@ -192,7 +192,7 @@ void CTracklist::lookAhead() {
             m_held.push_back(&entry);
         }
     }
-    // What is due first is opened first, whatever its lane: many slow media may come at once after a skip.
+    // Opened in the order in which they are due, across lanes: after a skip many slow media may be requested.
     std::stable_sort(m_held.begin() + alreadyHeld, m_held.end(),
                      [](const SEntry* a, const SEntry* b) { return a->start < b->start; });
     for (auto entry = m_held.begin() + alreadyHeld; entry != m_held.end(); ++entry)
@@ -209,7 +209,7 @@ void CTracklist::leave(SEntry& entry) {
         closeEntry(entry);
 }
 
-// What has been heard is not spoilt by a medium that fails to close.
+// A medium that fails to close must not interrupt playback.
 void CTracklist::closeEntry(SEntry& entry) noexcept {
     callLogged(m_log, [&] {
         if (entry.track->isOpened()) entry.track->close();

@@ -1,4 +1,4 @@
-// The logic of a time line: what plays when, what is opened and closed for it.
+// The logic of a time line: which tracks play when, and when they are opened and closed.
 #pragma once
 
 #include "peru/Object.h"
@@ -12,9 +12,9 @@
 
 namespace sonora2::common {
 
-// Tracks lie in lanes, one for each sort index; within a lane one track plays at a time, in the order of
-// their starts. A track is open while it plays, and where the list opens in a thread from at most
-// kLookAheadSeconds before. Safe from any thread: one that plays, others that send commands.
+// Tracks are grouped into lanes, one per sort index; within a lane one track plays at a time, in order of
+// start. A track is open while it plays; with openInThread it is opened up to kLookAheadSeconds earlier. One
+// thread may play while others send commands.
 class SONORA2_API CTracklist : public peru::CObject, public virtual ITracklist {
 public:
     static constexpr double kLookAheadSeconds = 5.0;
@@ -38,20 +38,20 @@ protected:
         uint32_t start; // frames of the list, both inclusive
         uint32_t end;
         P<ITrack> track;
-        EState state = EState::closed; // what the list has done about it
+        EState state = EState::closed; // as far as the list is concerned
     };
     using Entries = std::vector<SEntry*>;
 
-    // A frame of the list lasts framerateNum / framerateDen seconds; `fixedDuration` is where the list itself
-    // begins on the time line that skip commands count in. The log may be empty.
+    // A frame of the list lasts framerateNum / framerateDen seconds; `fixedDuration` is the start of the list
+    // on the time line of skip commands. The log may be empty.
     CTracklist(int framerateNum, int framerateDen, int sortIndex, bool openInThread, double fixedDuration,
                const P<ILogManager>& log);
 
-    // All of these are called with the lock held.
+    // All called with the lock held.
     virtual void mix(const Entries& active) = 0;
     virtual int64_t getPositionMs() = 0;
     virtual void setPosition(double time) = 0; // after a skip; seconds from the list's start
-    // Closes what is open and goes back to the start.
+    // Closes all open tracks and returns to the start.
     void closeTracks();
 
     int getListSortIndex() const { return m_sortIndex; }
@@ -62,7 +62,7 @@ private:
     struct SLane {
         int sortIndex;
         size_t cursor = 0; // the first entry that has not ended
-        // Of the entry at the cursor, so that a step over thousands of lanes reads nothing else.
+        // Copied from the entry at the cursor, so that a step over thousands of lanes touches nothing else.
         uint32_t start;
         uint32_t end;
         std::vector<std::unique_ptr<SEntry>> entries; // by start
@@ -95,8 +95,8 @@ private:
     uint32_t m_maxFrame = 0;
     uint32_t m_currentFrame = 0;
     std::vector<SLane> m_lanes; // by sort index
-    Entries m_active;           // what plays at the current frame, in the order of the lanes
-    Entries m_held;             // what is not in the state `closed`
+    Entries m_active;           // tracks playing at the current frame, in lane order
+    Entries m_held;             // entries whose state is not `closed`
     P<CTrackOpener> m_opener;
 };
 

@@ -10,11 +10,11 @@ namespace sonora2::audio {
 namespace {
 
 constexpr double kMargin = 0.02;    // seconds by which a change is widened
-constexpr double kConstant = 0.001; // factors as near as this are one
-constexpr int64_t kWholeChunk = 5;  // fewer frames than this are not left out at a chunk's end
+constexpr double kConstant = 0.001; // factors this close count as equal
+constexpr int64_t kWholeChunk = 5;  // fewer frames than this are not skipped at a chunk's end
 
 int16_t scale(int16_t sample, double factor) {
-    // In this order, what is no number becomes one.
+    // This order maps NaN to -32768.
     return static_cast<int16_t>(std::min(std::max(-32768.0, sample * factor), 32767.0));
 }
 

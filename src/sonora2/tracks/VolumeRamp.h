@@ -1,4 +1,4 @@
-// A gain that changes along the samples of a chunk.
+// Applies a changing gain to the samples of a chunk.
 #pragma once
 
 #include <cstdint>
@@ -7,7 +7,7 @@ namespace sonora2::audio {
 
 struct SVolumeChange;
 
-// Where a chunk stands and what it holds.
+// A chunk's samples, format and position.
 struct SRampChunk {
     int16_t* samples;
     int64_t frames;
@@ -16,7 +16,7 @@ struct SRampChunk {
     double timestamp;
 };
 
-// Does nothing unless the chunk lies wholly within the change.
+// Does nothing unless the chunk lies entirely within the change.
 void applyVolumeChange(const SVolumeChange& change, const SRampChunk& chunk);
 
 } // namespace sonora2::audio

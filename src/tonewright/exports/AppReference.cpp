@@ -16,7 +16,7 @@ struct SReference {
     P<CApp> app; // guarded by the mutex
 };
 
-// Made on first use, hence after the factory's own statics, and so gone before them.
+// Created on first use, after the factory's own statics, and therefore destroyed before them.
 SReference& reference() {
     static SReference r;
     return r;

@@ -1,4 +1,4 @@
-// The exports' reference on the application.
+// The exports' reference to the application.
 #pragma once
 
 #include "tonewright/App.h"
@@ -9,12 +9,12 @@ using peru::P;
 
 // Empty unless TONEWRIGHT_InitStartup has been called. Any thread.
 P<CApp> getApp();
-// The same, but throws CError where there is none.
+// The same, but throws CError if there is none.
 P<CApp> requireApp();
-// Exchanges the reference for another.
+// Replaces the reference and returns the old one.
 P<CApp> exchangeApp(P<CApp> app);
 
-// For a function whose object this library cannot make: tells the log so, in one line.
+// For exports whose object this build cannot create: logs one line.
 void logNotAvailable(const char* exportName) noexcept;
 template <class R> R notAvailable(const char* exportName, R failure) noexcept {
     logNotAvailable(exportName);

@@ -24,8 +24,8 @@ int32_t TONEWRIGHT_AudioEncoder_Encode(TONEWRIGHT_Handle encoder) {
     return barrier<int32_t>(failure, [&] {
         const P<CAudioEncoder> object = unwrap<CAudioEncoder>(encoder);
         if (!object) return TONEWRIGHT_ENCODER_FAILED;
-        // The listener leaves its encoder when it dies: it stays until the run is over, also when the host
-        // destroys its handle meanwhile.
+        // The listener unregisters itself when destroyed; it must outlive the run even if the host destroys
+        // its handle meanwhile.
         const P<CEncoderHandle> listener = unwrap<CEncoderHandle>(encoder);
         failure = TONEWRIGHT_ENCODER_RUN_FAILED;
         object->encode();

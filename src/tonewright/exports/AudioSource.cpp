@@ -21,8 +21,8 @@ namespace {
 constexpr int kStepsPerBlock = 100;
 constexpr float kSampleScale = 3.0517578125e-05f; // 1 / 32768
 
-// Frames from one step of a wave-form to the next. Throws CError for a step that is no whole frame, or that
-// is more than one chunk can hold.
+// Frames between two steps of a waveform. Throws CError for a step of less than one frame or of more than one
+// chunk can hold.
 int getFramesPerStep(IAudioSource& source, double secondsPerStep) {
     const double frames = source.getSampleRate() * secondsPerStep;
     const int limit = std::numeric_limits<int32_t>::max() / (2 * source.getChannelCount());
@@ -31,7 +31,7 @@ int getFramesPerStep(IAudioSource& source, double secondsPerStep) {
         "TONEWRIGHT_AudioSource_FetchStreamSamples: a step of %g seconds cannot be taken", secondsPerStep));
 }
 
-// True when the reader came to its end, false when the callback ended it.
+// True at the end of the source, false if the callback ended it.
 bool fetchSamples(TONEWRIGHT_Handle handle, const P<IAudioSource>& source,
                   TONEWRIGHT_SamplesCallback callback, double secondsPerStep, void* user) {
     const P<sonora2::common::ISonoraContext> context = requireApp()->getReadContext();

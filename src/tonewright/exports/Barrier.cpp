@@ -6,7 +6,7 @@ namespace tonewright::exports {
 
 namespace {
 
-// A log of the host's may throw, and must not keep the text from the debugger.
+// A host's log may throw; the debugger output must still get the text.
 void writeToLog(const peru::SLogMessage& message) noexcept {
     try {
         peru::getLogManager()->write(message);
@@ -25,7 +25,7 @@ void reportException(const peru::P<peru::IString>& text, const char* fallback) n
         writeToLog(message);
         peru::outputDebugString(message.text);
     } catch (...) {
-        // Nothing is left that could be told of it.
+        // There is nowhere left to report to.
     }
 }
 

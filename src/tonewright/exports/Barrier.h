@@ -1,4 +1,4 @@
-// Where exceptions stop.
+// Stops exceptions at the boundary of the library.
 #pragma once
 
 #include "peru/Exception.h"
@@ -8,16 +8,17 @@
 
 namespace tonewright::exports {
 
-// The texts that stand for an exception which says nothing about itself.
+// Logged for exceptions that carry no text of their own.
 inline constexpr const char* kUnknownStdException = "unknown std::exception";
 inline constexpr const char* kUnknown = "unknown";
 
-// Writes the text to the log at its severest level and to the debugger output; `fallback` where it is empty.
+// Writes the text, or `fallback` if it is empty, to the log at its most severe level and to the debugger
+// output.
 void reportException(const peru::P<peru::IString>& text, const char* fallback) noexcept;
 void reportException(const char* text, const char* fallback) noexcept;
 
-// Runs the body of an export. After an exception the result is `failure`, which is read only then, so that a
-// body may change what its failure means while it proceeds.
+// Runs the body of an export. Returns `failure` after an exception; it is read only then, so the body may
+// change it as it proceeds.
 template <class R, class Body> R barrier(const R& failure, Body&& body) {
     try {
         return static_cast<R>(body());

@@ -53,7 +53,7 @@ void TONEWRIGHT_EMBEDDEDCOVEREDITOR_ShowHelp() {
     logNotAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_ShowHelp");
 }
 
-// A host calls this whenever it has nothing else to do: one line has to serve for all of them.
+// Hosts call this whenever they are idle, so only the first call is logged.
 void TONEWRIGHT_EMBEDDEDCOVEREDITOR_Idle() {
     static std::atomic_flag isTold = ATOMIC_FLAG_INIT;
     if (!isTold.test_and_set()) logNotAvailable("TONEWRIGHT_EMBEDDEDCOVEREDITOR_Idle");

@@ -29,7 +29,7 @@ void TONEWRIGHT_SetDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback
 void TONEWRIGHT_AddProxyLogManager(TONEWRIGHT_Handle log) {
     const P<peru::ILogManager> proxy = unwrap<peru::ILogManager>(log);
     const P<peru::ILogManager> manager = peru::getLogManager();
-    // The manager itself as its own proxy would write in a circle.
+    // The manager as its own proxy would recurse forever.
     if (proxy && !(proxy == manager)) manager->addLog(proxy, peru::CString::empty());
 }
 

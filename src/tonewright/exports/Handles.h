@@ -1,4 +1,4 @@
-// Between handles and objects, texts and strings.
+// Converts between handles and objects and between host texts and strings.
 #pragma once
 
 #include "peru/IInstanceWrapper.h"
@@ -16,7 +16,7 @@ inline TONEWRIGHT_Handle toHandle(peru::IInstanceWrapper* wrapper) {
     return reinterpret_cast<TONEWRIGHT_Handle>(wrapper);
 }
 
-// A handle that the host owns; null for an empty object, and when memory has run out.
+// Returns a handle that the host owns; null for an empty object or when out of memory.
 inline TONEWRIGHT_Handle wrap(P<peru::IBase> object) {
     if (!object) return nullptr;
     return toHandle(new (std::nothrow) peru::CInstanceWrapper(std::move(object)));
@@ -26,7 +26,7 @@ inline TONEWRIGHT_Handle wrapText(const peru::CStringArg& text) {
     return toHandle(new (std::nothrow) peru::CStringInstanceWrapper(text));
 }
 
-// The T behind a handle; empty for a null handle and for one of another kind.
+// Returns the T behind a handle; empty for a null handle or a handle of another kind.
 template <class T> P<T> unwrap(TONEWRIGHT_Handle handle) {
     auto* wrapper = dynamic_cast<peru::CInstanceWrapper*>(reinterpret_cast<peru::IInstanceWrapper*>(handle));
     return wrapper ? peru::interfaceCast<T>(wrapper->getObject()) : nullptr;

@@ -7,7 +7,7 @@ using namespace tonewright::exports;
 
 namespace {
 
-// A gain like any other to look at; the host has to know it.
+// Looks like a valid gain; hosts must compare with it.
 constexpr double kBadSource = 3.0;
 
 } // namespace

@@ -8,8 +8,8 @@ using namespace tonewright::exports;
 
 namespace {
 
-// Runs an operation on the player behind the handle, which stays alive meanwhile whatever becomes of the
-// handle.
+// Runs an operation on the player behind the handle and keeps the player alive meanwhile, even if the handle
+// is destroyed.
 template <class Operation> int32_t withPlayer(TONEWRIGHT_Handle handle, Operation&& operation) {
     return barrier<int32_t>(TONEWRIGHT_PLAYER_FAILED, [&] {
         const P<CPlayer> player = unwrap<CPlayer>(handle);
@@ -32,7 +32,7 @@ TONEWRIGHT_Handle TONEWRIGHT_CreatePlayerFromAudioSource(TONEWRIGHT_Handle sourc
     return barrier<TONEWRIGHT_Handle>(nullptr, [&]() -> TONEWRIGHT_Handle {
         const P<sonora2::common::IAudioSource> object = unwrap<sonora2::common::IAudioSource>(source);
         if (!object) return nullptr;
-        requireApp(); // the sound system is one of the singletons that end with it
+        requireApp(); // the sound system is a singleton that ends with it
         return wrap(peru::make<CPlayer>(object));
     });
 }

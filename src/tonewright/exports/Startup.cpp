@@ -14,7 +14,7 @@ using namespace tonewright::exports;
 
 namespace {
 
-// Below the path that the host gives, which has no separator at its end.
+// Appended to the host's path, which has no trailing separator.
 constexpr const char* kCoverEditorFolder = "/covereditor";
 
 } // namespace
@@ -36,7 +36,7 @@ int32_t TONEWRIGHT_InitGui(const char16_t*, const char16_t*, const char16_t*, in
     });
 }
 
-// The installer copies the names to where a crash finds them.
+// install() copies the names to memory that the crash handler can read.
 void TONEWRIGHT_Init_Crashhandler(const char16_t* application, const char16_t* report, const char16_t* dump) {
     const std::string applicationName = peru::CString::toStdString(application);
     const std::string reportPath = peru::CString::toStdString(report);
@@ -51,8 +51,8 @@ uint8_t TONEWRIGHT_OnWindowShown(TONEWRIGHT_WindowHandle /*window*/) {
 void TONEWRIGHT_DeInitAll() {
     barrier([] {
         if (P<CApp> app = exchangeApp(nullptr)) app->shutdown();
-        // The factory's is now the last reference, so that the order of its singletons holds. Without an
-        // application there may be others, such as the log that a host has added to before the start.
+        // The factory now holds the last reference, so its singletons are destroyed in order. Even without an
+        // application some may exist, such as the log if a host used it before starting.
         peru::CGlobalObjFactory::shutdown();
     });
 }
