@@ -7,6 +7,7 @@
 #include "tonewright/Quietly.h"
 
 #include <algorithm>
+#include <cmath>
 #include <optional>
 
 namespace tonewright {
@@ -54,24 +55,35 @@ CPlayer::CPlayer(const P<peru::IURI>& uri, const P<IPluginHandler>& handler)
 CPlayer::CPlayer(const P<IAudioSource>& source) : CPlayer(nullptr, nullptr, source) {}
 
 CPlayer::CPlayer(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, const P<IAudioSource>& source)
-    : m_ended(peru::getSignalFactory()->createSignal()), m_uri(uri),
-      m_lock(peru::getMutexFactory()->createMutex()), m_control(peru::getMutexFactory()->createMutex()) {
+    : m_ended(peru::getSignalFactory()->createSignal()), m_wake(peru::getSignalFactory()->createSignal()),
+      m_uri(uri), m_handler(handler), m_lock(peru::getMutexFactory()->createMutex()),
+      m_control(peru::getMutexFactory()->createMutex()) {
     m_ended->set();
-    m_device = peru::media::getSystem()->getDefaultOutDevice();
-    if (!m_device) throw peru::CError("CPlayer::init could not open audio device");
-    m_deviceFormat = source ? m_device->getFormat(source->getSampleRate(), source->getBytesPerSample(),
-                                                  source->getChannelCount())
-                            : m_device->getFormat(kFileSampleRate, kFileBytesPerSample, kFileChannelCount);
+    const auto device = peru::media::getSystem()->getDefaultOutDevice();
+    if (!device) throw peru::CError("CPlayer::init could not open audio device");
+    useDevice(device, source);
+}
+
+// Without a source one is created in a format of the device.
+void CPlayer::useDevice(const P<peru::media::IAudioOutDevice>& device, const P<IAudioSource>& source) {
+    const auto format = source ? device->getFormat(source->getSampleRate(), source->getBytesPerSample(),
+                                                   source->getChannelCount())
+                               : device->getFormat(kFileSampleRate, kFileBytesPerSample, kFileChannelCount);
     // Any other format would play the source at the wrong speed or as noise.
-    if (!m_deviceFormat || (source && !hasFormat(*source, *m_deviceFormat)))
+    if (!format || (source && !hasFormat(*source, *format)))
         throw peru::CError("CPlayer::init could not find format for audio device");
-    m_source = source;
-    if (!m_source && handler)
-        m_source = handler->createAudioSource(m_uri, m_deviceFormat->getSampleRate(),
-                                              m_deviceFormat->getChannelCount(),
-                                              m_deviceFormat->getBitsPerSample() / 8, false);
-    if (!m_source) throw peru::CError("CPlayer::init could not open source");
-    m_duration = m_source->getDuration();
+    P<IAudioSource> used = source;
+    if (!used && m_handler)
+        used = m_handler->createAudioSource(m_uri, format->getSampleRate(), format->getChannelCount(),
+                                            format->getBitsPerSample() / 8, false);
+    if (!used) throw peru::CError("CPlayer::init could not open source");
+    STitle title;
+    title.source = used;
+    title.duration = used->getDuration();
+    m_titles.clear();
+    m_titles.push_back(title);
+    m_device = device;
+    m_deviceFormat = format;
 }
 
 CPlayer::~CPlayer() {
@@ -123,7 +135,15 @@ void CPlayer::start() {
     // The device counts its position from open() and may still hold sound from before the last stop.
     if (m_device->isOpened()) m_device->close();
     openDevice();
-    if (!m_source->isOpened()) m_source->open();
+    m_writtenBytes = 0;
+    m_isSilenceWritten = false;
+    STitle& title = m_titles.front();
+    title.begin = title.offset = 0.0;
+    if (!title.source->isOpened()) title.source->open();
+    if (const std::optional<double> time = std::exchange(m_startTime, std::nullopt)) {
+        title.source->skipToTime(*time);
+        title.offset = *time;
+    }
     m_device->start();
 }
 
@@ -131,56 +151,91 @@ void CPlayer::openDevice() {
     if (!m_device->isOpened()) m_device->open(m_deviceFormat);
 }
 
+int64_t CPlayer::getBytesPerSecond() const {
+    return int64_t{m_deviceFormat->getSampleRate()} * m_deviceFormat->getBytesPerFrame();
+}
+
 void CPlayer::feed() {
-    bool isSilenceWritten = false;
     double lastPosition = -1.0;
     for (;;) {
-        fillQueue(isSilenceWritten);
+        fillQueue();
         idle();
         if (m_state == TONEWRIGHT_PLAYER_STOPPED) return;
-        CTurn turn(*this);
-        if (m_state == TONEWRIGHT_PLAYER_STOPPED) return;
-        // Also ends a source that is shorter than its stated duration: all is written and the queue is empty.
-        const double position = m_device->getPosition();
-        const bool isDry = isSilenceWritten && m_state == TONEWRIGHT_PLAYER_PLAYING &&
-                           position == lastPosition && m_device->getQueuedSize() == 0;
-        lastPosition = position;
-        if (position > m_duration || isDry) {
-            halt();
-            return report();
+        bool isEnd = false;
+        {
+            CTurn turn(*this);
+            if (m_state == TONEWRIGHT_PLAYER_STOPPED) return;
+            // Also ends a source that is shorter than its stated duration: all is written and the queue is
+            // empty.
+            const double position = m_device->getPosition();
+            const bool isDry = m_isSilenceWritten && m_state == TONEWRIGHT_PLAYER_PLAYING &&
+                               position == lastPosition && m_device->getQueuedSize() == 0;
+            lastPosition = position;
+            isEnd = isDry || isPastEnd();
+            if (isEnd) halt();
         }
-        report();
+        reportState();
+        if (isEnd) return;
     }
 }
 
-void CPlayer::fillQueue(bool& isSilenceWritten) {
+void CPlayer::fillQueue() {
     for (;;) {
         for (int i = 0; i < kTurnRounds && m_waiting > 0; ++i) peru::getThreadManager()->yield(true);
-        peru::CMutexLock lock(m_lock);
-        if (m_state != TONEWRIGHT_PLAYER_PLAYING || m_device->getQueuedSize() >= m_queueLimit) return;
-        writeNext(isSilenceWritten);
-        if (m_state != TONEWRIGHT_PLAYER_STOPPED && isPastEnd()) halt();
-        report();
-        if (isSilenceWritten) return;
+        {
+            peru::CMutexLock lock(m_lock);
+            if (m_state != TONEWRIGHT_PLAYER_PLAYING || m_device->getQueuedSize() >= m_queueLimit) return;
+            if (!writeNext()) return;
+            if (m_state != TONEWRIGHT_PLAYER_STOPPED && isPastEnd()) halt();
+        }
+        reportState();
     }
 }
 
-void CPlayer::writeNext(bool& isSilenceWritten) {
-    if (!m_source->isEOF()) {
-        if (const P<sonora2::audio::IAudioChunk> chunk = m_source->getNextAudioChunk())
-            m_device->write(chunk->getData(), chunk->getSize());
-        else if (!m_source->isEOF())
-            throw peru::CError("CPlayer: source return Chunk=NULL but is not EOF");
+bool CPlayer::writeNext() {
+    if (m_isSilenceWritten) return false;
+    while (m_titles.back().source->isEOF() && beginNext()) {
     }
-    if (isSilenceWritten || !m_source->isEOF()) return;
+    const P<IAudioSource> source = m_titles.back().source;
+    if (!source->isEOF()) {
+        if (const P<sonora2::audio::IAudioChunk> chunk = source->getNextAudioChunk()) {
+            m_device->write(chunk->getData(), chunk->getSize());
+            m_writtenBytes += chunk->getSize();
+        } else if (!source->isEOF()) {
+            throw peru::CError("CPlayer: source return Chunk=NULL but is not EOF");
+        }
+    }
+    if (!source->isEOF() || !m_queue.empty()) return true;
+    // Another source may still be queued: silence in front of it would be a gap.
+    if (m_isQueueUsed && m_device->getQueuedSize() > getBytesPerSecond()) return false;
     writeSilence();
-    isSilenceWritten = true;
+    m_isSilenceWritten = true;
+    return true;
+}
+
+bool CPlayer::beginNext() {
+    while (!m_queue.empty()) {
+        const P<IAudioSource> source = m_queue.front();
+        m_queue.pop_front();
+        const bool isOpened = quietly("CPlayer: skipped a queued source", [&] {
+            if (!source->isOpened()) source->open();
+            if (!hasFormat(*source, *m_deviceFormat)) throw peru::CError("the device has another format");
+        });
+        if (!isOpened) continue;
+        STitle title;
+        title.source = source;
+        title.duration = source->getDuration();
+        title.begin = static_cast<double>(m_writtenBytes) / static_cast<double>(getBytesPerSecond());
+        title.offset = -title.begin;
+        m_titles.push_back(title);
+        return true;
+    }
+    return false;
 }
 
 // Pushes the device's position past the last sample, whatever latency the sound system has.
 void CPlayer::writeSilence() {
-    const int64_t size =
-        kClosingSeconds * m_deviceFormat->getSampleRate() * m_deviceFormat->getBytesPerFrame();
+    const int64_t size = kClosingSeconds * getBytesPerSecond();
     auto silence = peru::make<peru::CMemoryBlock>(size);
     std::fill_n(silence->getData(), size,
                 m_deviceFormat->getBytesPerSample() == 1 ? kSilentByte : uint8_t{0});
@@ -189,27 +244,33 @@ void CPlayer::writeSilence() {
 
 void CPlayer::idle() {
     for (int round = 0; round < kIdleRounds; ++round) {
-        report();
-        peru::getThreadManager()->sleep(kIdleMilliseconds);
+        reportState();
+        const bool isWoken = m_wake->wait(kIdleMilliseconds);
+        m_wake->reset();
         CTurn turn(*this);
-        if (!m_device->isOpened()) return;
+        if (isWoken || !m_device->isOpened()) return;
     }
 }
 
 void CPlayer::pause() {
-    CTurn turn(*this);
-    int32_t state = m_state;
-    if (m_isFeeding && state == TONEWRIGHT_PLAYER_STOPPED) return;
-    if (m_device->getStatus() != peru::media::kDeviceRunning) {
-        if (!m_state.compare_exchange_strong(state, TONEWRIGHT_PLAYER_PLAYING)) return;
-        openDevice();
-        report();
-        m_device->start();
-    } else {
-        m_device->pause();
-        m_state.compare_exchange_strong(state, TONEWRIGHT_PLAYER_PAUSED); // unless stopped since
-        report();
+    SReport made;
+    {
+        CTurn turn(*this);
+        int32_t state = m_state;
+        if (m_isFeeding && state == TONEWRIGHT_PLAYER_STOPPED) return;
+        if (m_device->getStatus() != peru::media::kDeviceRunning) {
+            if (!m_state.compare_exchange_strong(state, TONEWRIGHT_PLAYER_PLAYING)) return;
+            openDevice();
+            m_device->start();
+            m_wake->set();
+        } else {
+            m_device->pause();
+            m_state.compare_exchange_strong(state, TONEWRIGHT_PLAYER_PAUSED); // unless stopped since
+        }
+        if (!isObserved()) return;
+        made = makeReport();
     }
+    report(made);
 }
 
 void CPlayer::stop() {
@@ -217,6 +278,7 @@ void CPlayer::stop() {
     peru::CMutexLock control(m_control);
     if (m_state == TONEWRIGHT_PLAYER_STOPPED) return;
     m_state = TONEWRIGHT_PLAYER_STOPPED;
+    m_wake->set();
     if (!m_ended->wait(kStopMilliseconds))
         throw peru::CError("playerthread could not be stopped in 10seconds");
     CTurn turn(*this);
@@ -226,8 +288,10 @@ void CPlayer::stop() {
 void CPlayer::halt() {
     m_state = TONEWRIGHT_PLAYER_STOPPED;
     // Whatever its status: a paused device would go on playing silence for as long as the player lives.
+    if (m_titles.size() > 1) quietly("CPlayer", [this] { getHeard(m_device->getPosition()); });
     if (m_device->isOpened()) m_device->stop();
-    if (m_source->isOpened()) m_source->close();
+    returnUnheard();
+    if (m_titles.front().source->isOpened()) m_titles.front().source->close();
 }
 
 void CPlayer::haltQuietly() {
@@ -237,16 +301,140 @@ void CPlayer::haltQuietly() {
     });
     quietly("CPlayer", [this] {
         CTurn turn(*this);
-        if (m_source->isOpened()) m_source->close();
+        returnUnheard();
+        if (m_titles.front().source->isOpened()) m_titles.front().source->close();
     });
 }
 
-void CPlayer::report() const {
-    const TONEWRIGHT_PlayerCallback callback = m_callback;
-    if (!callback) return;
+void CPlayer::returnUnheard() {
+    while (m_titles.size() > 1) {
+        const P<IAudioSource> source = m_titles.back().source;
+        m_titles.pop_back();
+        m_queue.push_front(source);
+        if (source->isOpened()) source->close();
+    }
+}
+
+CPlayer::STitle& CPlayer::getHeard(double position) {
+    while (m_titles.size() > 1 && position >= m_titles[1].begin) {
+        const P<IAudioSource> ended = m_titles.front().source;
+        m_titles.pop_front();
+        ++m_sourceIndex;
+        quietly("CPlayer", [&] {
+            if (ended->isOpened()) ended->close();
+        });
+    }
+    return m_titles.front();
+}
+
+// A source that another one follows is played to its last sample, whatever its stated duration.
+bool CPlayer::isPastEnd() {
+    const double position = m_device->getPosition();
+    const STitle& heard = getHeard(position);
+    return m_titles.size() == 1 && m_queue.empty() && position + heard.offset > heard.duration;
+}
+
+void CPlayer::restartAt(double seconds) {
+    STitle& heard = getHeard(m_device->getPosition());
+    returnUnheard();
+    heard.source->skipToTime(seconds);
+    m_device->stop();
+    const double position = m_device->getPosition();
+    heard.offset = seconds - position;
+    m_writtenBytes = std::llround(position * static_cast<double>(getBytesPerSecond()));
+    m_isSilenceWritten = false;
+    if (m_state == TONEWRIGHT_PLAYER_PLAYING) m_device->start();
+    m_wake->set();
+}
+
+void CPlayer::seek(double seconds) {
+    if (std::isnan(seconds)) throw peru::CInvalidArgError("seconds", "CPlayer::seek");
+    seconds = std::max(seconds, 0.0);
+    CTurn turn(*this);
+    if (!m_isFeeding || m_state == TONEWRIGHT_PLAYER_STOPPED || !m_titles.front().source->isOpened())
+        m_startTime = seconds;
+    else
+        restartAt(seconds);
+}
+
+void CPlayer::setVolume(double factor) {
+    if (!std::isfinite(factor) || factor < 0.0) throw peru::CInvalidArgError("factor", "CPlayer::setVolume");
+    CTurn turn(*this);
+    m_volume = factor;
+    m_device->setGain(factor);
+}
+
+double CPlayer::getVolume() {
+    CTurn turn(*this);
+    return m_volume;
+}
+
+void CPlayer::setDevice(const P<peru::media::IAudioOutDevice>& device) {
+    if (!device) throw peru::CInvalidArgError("device", "CPlayer::setDevice");
+    const auto requireStopped = [this] {
+        if (m_isFeeding) throw peru::CError("CPlayer::setDevice the player is playing");
+    };
+    requireStopped(); // before the lock: a stop that waits for this thread holds it
+    peru::CMutexLock control(m_control);
+    CTurn turn(*this);
+    requireStopped();
+    const P<peru::media::IAudioOutDevice> old = m_device;
+    const P<IAudioSource> source = m_titles.front().source;
+    const auto format =
+        device->getFormat(source->getSampleRate(), source->getBytesPerSample(), source->getChannelCount());
+    const bool isConvertible = m_handler && m_sourceIndex == 0 && (!format || !hasFormat(*source, *format));
+    useDevice(device, isConvertible ? nullptr : source);
+    if (old->isOpened()) old->close();
+    m_device->setGain(m_volume);
+    m_state = TONEWRIGHT_PLAYER_STOPPED;
+}
+
+bool CPlayer::enqueue(const P<IAudioSource>& source) {
+    if (!source) throw peru::CInvalidArgError("source", "CPlayer::enqueue");
+    CTurn turn(*this);
+    if (!hasFormat(*source, *m_deviceFormat)) return false;
+    m_isQueueUsed = true;
+    m_queue.push_back(source);
+    if (m_isSilenceWritten && m_isFeeding && m_state != TONEWRIGHT_PLAYER_STOPPED) {
+        const double position = m_device->getPosition();
+        restartAt(position + getHeard(position).offset);
+    }
+    m_wake->set();
+    return true;
+}
+
+int32_t CPlayer::getSourceIndex() {
+    CTurn turn(*this);
+    if (m_device->isOpened()) getHeard(m_device->getPosition());
+    return m_sourceIndex;
+}
+
+void CPlayer::setProgressFunction(std::function<void(double, double, int32_t)> function) {
+    m_progress.set(std::move(function));
+}
+
+CPlayer::SReport CPlayer::makeReport() {
     const int32_t state = m_state;
-    callback(m_duration, state == TONEWRIGHT_PLAYER_STOPPED ? 0.0 : m_device->getPosition() + m_startOffset,
-             state);
+    if (state == TONEWRIGHT_PLAYER_STOPPED) return {m_titles.front().duration, 0.0, state};
+    const double position = m_device->getPosition();
+    const STitle& heard = getHeard(position);
+    return {heard.duration, position + heard.offset, state};
+}
+
+void CPlayer::reportState() {
+    if (!isObserved()) return;
+    SReport made;
+    {
+        CTurn turn(*this);
+        made = makeReport();
+    }
+    report(made);
+}
+
+void CPlayer::report(const SReport& report) const {
+    const TONEWRIGHT_PlayerCallback callback = m_callback;
+    if (callback) callback(report.duration, report.position, report.state);
+    if (const auto function = m_progress.get()) (*function)(report.duration, report.position, report.state);
 }
 
 } // namespace tonewright

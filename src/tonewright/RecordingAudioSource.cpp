@@ -88,6 +88,14 @@ void CRecordingAudioSource::restart() {
     m_hasFailed = false;
 }
 
+void CRecordingAudioSource::setProgressFunction(std::function<bool(double)> function) {
+    m_progress.set(std::move(function));
+}
+
+void CRecordingAudioSource::setLevelFunction(std::function<void(double, double)> function) {
+    m_level.set(std::move(function));
+}
+
 bool CRecordingAudioSource::isOpened() {
     peru::CMutexLock deviceLock(m_deviceLock);
     return m_device->isOpened();
@@ -177,20 +185,28 @@ peru::P<IAudioChunk> CRecordingAudioSource::getNextAudioChunk() {
 bool CRecordingAudioSource::onAudioData(const void* data, int64_t size) {
     bool goesOn = !m_hasFailed;
     const bool isDone = quietly("CRecordingAudioSource: the recording ends", [&] {
-        peru::CMutexLock lock(m_lock);
-        m_stream->write(data, size);
-        m_buffered = m_stream->getAvailable();
-        m_isSilent = false;
+        {
+            peru::CMutexLock lock(m_lock);
+            m_stream->write(data, size);
+            m_buffered = m_stream->getAvailable();
+            m_isSilent = false;
+        }
         const TONEWRIGHT_RecordingCallback callback = m_recordingCallback;
-        if (callback && !callback(m_device->getPosition())) goesOn = false;
+        const auto function = m_progress.get();
+        if (!callback && !function) return;
+        const double position = m_device->getPosition();
+        if (callback && !callback(position)) goesOn = false;
+        if (function && !(*function)(position)) goesOn = false;
     });
     return isDone && goesOn;
 }
 
 void CRecordingAudioSource::onVolume(const P<peru::media::CVolumeInfo>& volume) {
-    const TONEWRIGHT_RecordingVolumeCallback callback = m_volumeCallback;
-    if (!callback || m_hasFailed) return;
-    if (!quietly("CRecordingAudioSource: the recording ends",
-                 [&] { callback(volume->getLeft(), volume->getRight()); }))
-        m_hasFailed = true;
+    if (m_hasFailed) return;
+    const bool isDone = quietly("CRecordingAudioSource: the recording ends", [&] {
+        const TONEWRIGHT_RecordingVolumeCallback callback = m_volumeCallback;
+        if (callback) callback(volume->getLeft(), volume->getRight());
+        if (const auto function = m_level.get()) (*function)(volume->getLeft(), volume->getRight());
+    });
+    if (!isDone) m_hasFailed = true;
 }

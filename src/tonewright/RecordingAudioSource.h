@@ -5,6 +5,8 @@
 #include "peru/streams/BufferedIOStream.h"
 #include "sonora2/media/IAudioSource.h"
 #include "sonora2/samplerateconverter/SampleRateConverter.h"
+#include "tonewright/CallbackSlot.h"
+#include "tonewright/ICallbackTargets.h"
 #include "tonewright/tonewright.h"
 
 #include <atomic>
@@ -14,7 +16,8 @@
 // Deliberately in the global namespace: hosts look the class up by name.
 class CRecordingAudioSource : public peru::CObject,
                               public sonora2::common::IAudioSource,
-                              public peru::media::IAudioInDeviceListener {
+                              public peru::media::IAudioInDeviceListener,
+                              public tonewright::IRecordingTarget {
 public:
     template <class T> using P = peru::P<T>;
 
@@ -33,6 +36,8 @@ public:
     // way still completes on the old callback. An exception thrown by a callback ends the recording.
     void setRecordingCallback(TONEWRIGHT_RecordingCallback callback) { m_recordingCallback = callback; }
     void setVolumeCallback(TONEWRIGHT_RecordingVolumeCallback callback) { m_volumeCallback = callback; }
+    void setProgressFunction(std::function<bool(double)> function) override;
+    void setLevelFunction(std::function<void(double, double)> function) override;
 
     bool isOpened() override;
     void open() override;
@@ -79,6 +84,8 @@ private:
     P<peru::media::IAudioInDevice> m_device;
     std::atomic<TONEWRIGHT_RecordingCallback> m_recordingCallback{nullptr};
     std::atomic<TONEWRIGHT_RecordingVolumeCallback> m_volumeCallback{nullptr};
+    tonewright::TCallbackSlot<bool(double)> m_progress;
+    tonewright::TCallbackSlot<void(double, double)> m_level;
 
     const uint32_t m_silenceMilliseconds;
     // Guards the device, which allows one caller at a time, against an encoder and a host that closes the

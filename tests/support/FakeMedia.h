@@ -2,6 +2,7 @@
 #pragma once
 
 #include "peru/uri/URI.h"
+#include "sonora2/media/IDiscardable.h"
 #include "sonora2/plugins/ISonoraPlugin.h"
 #include "sonora2/plugins/PluginExtensions.h"
 #include "support/MediaBase.h"
@@ -75,11 +76,18 @@ private:
     int64_t m_position = 0;
 };
 
-// Counts what it is given.
-class CFakeFormat : public CFormatBase {
+// Counts what it is given. Takes what a CFakeSource delivers by default.
+class CFakeFormat : public CFormatBase, public sonora2::common::IDiscardable {
 public:
+    static sonora2::common::ISonoraPlugin::SFormatParams takes(int rate, int channels, int bytesPerSample) {
+        sonora2::common::ISonoraPlugin::SFormatParams params;
+        params.nSampleRate = rate;
+        params.nChannelCount = channels;
+        params.nBytesPerSample = bytesPerSample;
+        return params;
+    }
     explicit CFakeFormat(
-        const sonora2::common::ISonoraPlugin::SFormatParams& params = {},
+        const sonora2::common::ISonoraPlugin::SFormatParams& params = takes(1000, 2, 2),
         std::function<void()> onWrite = [] {})
         : params(params), m_onWrite(std::move(onWrite)) {}
 
@@ -87,8 +95,13 @@ public:
     double quality = -1.0;
     int bitRates[3] = {-1, -1, -1};
     int64_t bytes = 0;
+    bool isDiscarded = false;
 
     void open() override { m_opened = true; }
+    void discard() noexcept override {
+        isDiscarded = true;
+        m_opened = false;
+    }
     void close() override { m_opened = false; }
     // Carries the settings too, for a test that sees no more of the format than a host does.
     int64_t getEstimatedSizeBytes(double duration) override {

@@ -42,8 +42,8 @@ public:
     }
     bool isOpened() const override { return m_opened; }
     int32_t getStatus() const override { return m_running ? 1 : 0; }
-    double getGain() const override { return 1.0; }
-    void setGain(double) override {}
+    double getGain() const override { return m_gain; }
+    void setGain(double gain) override { m_gain = gain; }
 
 protected:
     // For the length of an operation that tolerates no other beside it.
@@ -73,6 +73,7 @@ protected:
     std::atomic<bool> m_opened{false};
     std::atomic<bool> m_running{false};
     std::atomic<int> m_inside{0};
+    std::atomic<double> m_gain{1.0};
 };
 
 // Plays into nowhere, `speed` times as fast as sound.

@@ -1,6 +1,7 @@
 #include "Library.h"
 
 #include "sonora2/context/SonoraError.h"
+#include "tonewright/ICallbackTargets.h"
 
 #include <gmock/gmock.h>
 
@@ -186,8 +187,7 @@ TEST_F(Exports, Encode_TellsHowItEnded) {
         if (c.sourceFails) script.onRead = [] { throw sonora2::common::CSonoraError("scratched"); };
         std::function<void()> onWrite = [] {};
         if (c.formatFails) onWrite = [] { throw std::runtime_error("disk full"); };
-        P<CFakeFormat> format =
-            peru::make<CFakeFormat>(sonora2::common::ISonoraPlugin::SFormatParams(), onWrite);
+        P<CFakeFormat> format = peru::make<CFakeFormat>(CFakeFormat::takes(1000, 2, 2), onWrite);
         CHandle source = makeSource(script), formatHandle = wrap(format);
         CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), formatHandle.get()));
         ASSERT_TRUE(encoder);
@@ -195,10 +195,47 @@ TEST_F(Exports, Encode_TellsHowItEnded) {
         EXPECT_EQ(TONEWRIGHT_AudioEncoder_SetCallback(encoder.get(), c.callback), 0);
         EXPECT_EQ(TONEWRIGHT_AudioEncoder_Encode(encoder.get()), c.result);
         EXPECT_EQ(format->bytes / 4, c.frames);
+        EXPECT_EQ(format->isDiscarded, c.result != 0) << "a failed job has no result";
         encoder.reset();
         EXPECT_FALSE(format->isOpened()) << "finished at the latest with its encoder";
     }
     EXPECT_GT(g_calls, 0);
+}
+
+TEST_F(Exports, EncoderFunction_WorksBesideTheCallback) {
+    struct SCase {
+        TONEWRIGHT_EncoderCallback callback;
+        double stopsAt, discardsAt;
+        int64_t frames;
+    };
+    const int64_t all = 100 * 1000;
+    for (const SCase& c : std::initializer_list<SCase>{{goOn, 2.0, 2.0, all},
+                                                       {goOn, 0.5, 2.0, 50688},
+                                                       {stopAtHalf, 2.0, 2.0, 50688},
+                                                       {nullptr, 2.0, 0.5, 50688},
+                                                       {nullptr, 2.0, 1.0, all},
+                                                       {nullptr, 2.0, 0.0, 0}}) {
+        SFakeSource script;
+        script.frames = all;
+        const P<CFakeFormat> format = peru::make<CFakeFormat>();
+        const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(makeSource(script).get(), wrap(format).get()));
+        const auto target = behind<tonewright::IEncoderProgressTarget>(encoder);
+        int calls = 0;
+        target->setProgressFunction([&](double fraction) {
+            ++calls;
+            if (fraction >= c.discardsAt) target->stopAndDiscard();
+            return fraction < c.stopsAt;
+        });
+        EXPECT_EQ(TONEWRIGHT_AudioEncoder_SetCallback(encoder.get(), c.callback), 0);
+        g_calls = 0;
+        EXPECT_EQ(TONEWRIGHT_AudioEncoder_Encode(encoder.get()), 0);
+        EXPECT_EQ(format->bytes / 4, c.frames);
+        EXPECT_EQ(format->isDiscarded, c.discardsAt <= 1.0);
+        EXPECT_FALSE(format->isOpened());
+        if (c.callback == goOn) {
+            EXPECT_EQ(g_calls, calls) << "both are called";
+        }
+    }
 }
 
 TEST_F(Exports, EncoderCallback_MayChangeAndTheHandleGoWhileTheJobRuns) {

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "peru/IInstanceWrapper.h"
+#include "peru/IInterfaceQuery.h"
 #include "peru/log/LogManager.h"
 #include "support/FakeMedia.h"
 #include "support/TempFolder.h"
@@ -26,6 +27,13 @@ using CHandle = std::unique_ptr<TONEWRIGHT_HandleData, SHandleEnd>;
 inline CHandle wrap(P<peru::IBase> object) {
     peru::IInstanceWrapper* wrapper = new peru::CInstanceWrapper(std::move(object));
     return CHandle(reinterpret_cast<TONEWRIGHT_Handle>(wrapper));
+}
+
+// What a C++ library beside the front finds behind a handle.
+template <class T> P<T> behind(const CHandle& handle) {
+    const auto* wrapper =
+        dynamic_cast<peru::CInstanceWrapper*>(reinterpret_cast<peru::IInstanceWrapper*>(handle.get()));
+    return peru::interfaceCast<T>(wrapper->getObject());
 }
 
 struct SLine {

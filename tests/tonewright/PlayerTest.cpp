@@ -1,6 +1,7 @@
 #include "Library.h"
 #include "peru/Errors.h"
 #include "support/ScriptedDevice.h"
+#include "tonewright/ICallbackTargets.h"
 
 #include <gmock/gmock.h>
 
@@ -340,6 +341,10 @@ TEST_F(Player, Threads_MayCallEverythingAtOnce) {
                     p.play(); // may fail: another thread plays
                 } else if (turn == 2) {
                     EXPECT_EQ(p.stop(), 0);
+                } else if (turn == 4) {
+                    const auto control = behind<tonewright::IPlayerControl>(p.player);
+                    control->seek(random() % 3);
+                    control->setVolume(random() % 3);
                 } else if (turn == 3) {
                     p.setCallback(random() % 2 ? keepReport : nullptr);
                 } else {
@@ -364,6 +369,92 @@ TEST_F(Player, Threads_MayCallEverythingAtOnce) {
     EXPECT_EQ(p.device->overlaps, 0);
     EXPECT_EQ(p.play(), 0);
     EXPECT_TRUE(p.device->written() == playedBytes(script));
+}
+
+TEST_F(Player, Queue_IsPlayedWithoutAGap) {
+    SFakeSource first, second, third, other;
+    first.frames = 5500;
+    second.frames = 777;
+    third.frames = 4000;
+    other.rate = 2000;
+    const P<CFakeSource> broken = peru::make<CFakeSource>(SFakeSource{.onOpen = [] { throw 1; }});
+    SPlayer p(peru::make<CShortSource>(first));
+    const auto control = behind<tonewright::IPlayerControl>(p.player);
+    std::vector<std::pair<double, double>> heard; // duration and greatest position
+    behind<tonewright::IPlayerProgressTarget>(p.player)->setProgressFunction(
+        [&](double duration, double position, int32_t state) {
+            if (heard.empty() || heard.back().first != duration) heard.emplace_back(duration, 0.0);
+            heard.back().second = std::max(heard.back().second, position);
+            // Late, with the second source read to its end.
+            if (duration == 0.777 && control->getSourceIndex() == 1 && third.frames != 0) {
+                EXPECT_TRUE(control->enqueue(peru::make<CFakeSource>(third)));
+                third.frames = 0;
+            }
+        });
+    EXPECT_FALSE(control->enqueue(peru::make<CFakeSource>(other)));
+    EXPECT_TRUE(control->enqueue(broken));
+    EXPECT_TRUE(control->enqueue(peru::make<CFakeSource>(second)));
+    p.setCallback(keepReport);
+    EXPECT_EQ(p.play(), 0);
+    third.frames = 4000;
+    std::string expected = playedBytes(first);
+    expected.resize(5500 * 4);
+    EXPECT_TRUE(p.device->written() ==
+                expected + playedBytes(second).substr(0, 777 * 4) + playedBytes(third));
+    EXPECT_EQ(control->getSourceIndex(), 2);
+    EXPECT_EQ(heard.size(), 3u);
+    EXPECT_EQ(heard.back().first, 4.0);
+    EXPECT_LE(heard.front().second, 5.5) << "the next source has a time line of its own";
+    EXPECT_GT(countReports(), 5u) << "the callback without user data is called too";
+}
+
+TEST_F(Player, Seek_DropsWhatIsQueued) {
+    SFakeSource script;
+    script.frames = 100000;
+    SPlayer p(script, 20.0);
+    const auto control = behind<tonewright::IPlayerControl>(p.player);
+    control->seek(40.0);
+    control->setVolume(0.25);
+    EXPECT_THROW(control->setVolume(-1.0), peru::CInvalidArgError);
+    EXPECT_THROW(control->seek(std::nan("")), peru::CInvalidArgError);
+    EXPECT_EQ(p.device->getGain(), 0.25);
+    p.setCallback(keepReport);
+    std::thread player([&] { EXPECT_EQ(p.play(), 0); });
+    ASSERT_TRUE(becomes([&] { return p.device->getPosition() > 1.0; }));
+    EXPECT_GT(takeReports().back().position, 40.0);
+    EXPECT_EQ(p.pause(), 0);
+    control->seek(20.0);
+    takeReports();
+    ASSERT_TRUE(becomes([&] { return countReports() > 1; }));
+    EXPECT_NEAR(takeReports().back().position, 20.0, 1e-6);
+    EXPECT_EQ(p.pause(), 0);
+    ASSERT_TRUE(becomes([&] { return p.device->getQueuedSize() > 100000; }));
+    const Clock::time_point start = Clock::now();
+    control->seek(95.0);
+    player.join();
+    EXPECT_LT(secondsSince(start), 2.0) << "80 seconds of sound were queued";
+    const std::string all = playedBytes(script), written = p.device->written();
+    EXPECT_TRUE(written == all.substr(40 * 4000) + all.substr(20 * 4000) + all.substr(95 * 4000));
+}
+
+TEST_F(Player, Device_IsExchangedWhileStopped) {
+    SPlayer p(SFakeSource{}, 1.0);
+    const auto control = behind<tonewright::IPlayerControl>(p.player);
+    const auto other = peru::make<CScriptedOutDevice>(), unfit = peru::make<CScriptedOutDevice>();
+    unfit->takes = [](int32_t, int32_t, int32_t) { return peru::make<CAudioFormat>(48000, 2, 16); };
+    EXPECT_THROW(control->setDevice(unfit), peru::CError);
+    control->setVolume(0.5);
+    control->setDevice(other);
+    EXPECT_EQ(p.play(), 0);
+    EXPECT_TRUE(other->written() == playedBytes(SFakeSource{}));
+    EXPECT_EQ(other->getGain(), 0.5);
+    EXPECT_EQ(p.device->opens, 0);
+    // A file is decoded anew to a format of the device.
+    CScriptedSystem system(other);
+    const CHandle file(TONEWRIGHT_CreatePlayerFromURI(u"file:///a.tst"));
+    behind<tonewright::IPlayerControl>(file)->setDevice(unfit);
+    EXPECT_EQ(TONEWRIGHT_Player_Play(file.get()), 0);
+    EXPECT_EQ(unfit->format->getSampleRate(), 48000);
 }
 
 TEST_F(Player, Players_LeaveNothingBehind) {

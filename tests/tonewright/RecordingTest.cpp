@@ -151,10 +151,13 @@ TEST_F(Recording, Callbacks_HearOfEveryBlockAndMayEndIt) {
         TONEWRIGHT_RecordingVolumeCallback volume;
         int wanted;    // calls until the callback says no
         int delivered; // blocks that reach the source, of 10
+        int wantedByFunction = 99;
     };
     for (const SCase& c : std::initializer_list<SCase>{{nullptr, nullptr, 99, 10},
                                                        {countCalls, keepLevels, 99, 10},
                                                        {countCalls, nullptr, 3, 3},
+                                                       {countCalls, keepLevels, 99, 4, 4},
+                                                       {nullptr, nullptr, 99, 4, 4},
                                                        {countCalls, nullptr, 1, 1},
                                                        {throwInt, nullptr, 99, 1},
                                                        {throwError, keepLevels, 99, 1},
@@ -163,6 +166,11 @@ TEST_F(Recording, Callbacks_HearOfEveryBlockAndMayEndIt) {
         const CHandle source(TONEWRIGHT_CreateAudioSoureFromAudioInDevice(deviceHandle.get(), 8000, 2, 2));
         TONEWRIGHT_AudioSource_SetRecordingCallback(source.get(), c.callback);
         TONEWRIGHT_AudioSource_SetRecordingVolumeCallback(source.get(), c.volume);
+        int functionCalls = 0;
+        double left = -1.0;
+        const auto target = behind<tonewright::IRecordingTarget>(source);
+        target->setProgressFunction([&](double) { return ++functionCalls < c.wantedByFunction; });
+        target->setLevelFunction([&](double level, double) { left = level; });
         g_calls = 0;
         g_callsWanted = c.wanted;
         EXPECT_EQ(TONEWRIGHT_AudioSource_Open(source.get()), 0);
@@ -172,6 +180,10 @@ TEST_F(Recording, Callbacks_HearOfEveryBlockAndMayEndIt) {
             ++delivered;
         }
         EXPECT_EQ(delivered, c.delivered);
+        if (!c.callback || c.callback == countCalls) {
+            EXPECT_EQ(functionCalls, c.delivered);
+            EXPECT_EQ(left, c.volume == throwFromLevels ? -1.0 : 0.1 * (delivered - 1));
+        }
         if (c.callback == countCalls) {
             EXPECT_EQ(g_calls, c.delivered);
             EXPECT_EQ(g_position, 200.0 * c.delivered / 8000);
@@ -202,7 +214,7 @@ TEST_F(Recording, Encoder_GetsEveryBlockUntilTheCallbackEndsIt) {
         TONEWRIGHT_AudioSource_SetRecordingCallback(source.get(), countCalls);
         g_calls = 0;
         g_callsWanted = wanted;
-        const auto format = peru::make<CFakeFormat>();
+        const auto format = peru::make<CFakeFormat>(CFakeFormat::takes(8000, 2, 2));
         const CHandle formatHandle = wrap(format);
         const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), formatHandle.get()));
         g_calls = 0; // making the encoder looked at the source, which is a short recording
@@ -225,8 +237,8 @@ TEST_F(Recording, Source_MayBeClosedAndDestroyedWhileItRecords) {
             source.reset();
         } else {
             std::atomic<bool> isWriting{false};
-            const CHandle format = wrap(peru::make<CFakeFormat>(
-                sonora2::common::ISonoraPlugin::SFormatParams(), [&isWriting] { isWriting = true; }));
+            const CHandle format = wrap(
+                peru::make<CFakeFormat>(CFakeFormat::takes(8000, 1, 2), [&isWriting] { isWriting = true; }));
             const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), format.get()));
             std::thread job([&] { EXPECT_EQ(TONEWRIGHT_AudioEncoder_Encode(encoder.get()), 0); });
             while (!isWriting) std::this_thread::yield();

@@ -14,21 +14,24 @@ TONEWRIGHT_Handle TONEWRIGHT_CreateAudioEncoder(TONEWRIGHT_Handle source, TONEWR
         const P<IAudioSource> from = unwrap<IAudioSource>(source);
         const P<IAudioFormat> to = unwrap<IAudioFormat>(format);
         if (!from || !to) return nullptr;
-        return wrap(
-            peru::make<CEncoderHandle>(peru::make<CAudioEncoder>(requireApp()->getWriteContext(), from, to)));
+        return wrap(peru::make<CEncoderHandle>(requireApp()->getWriteContext(), from, to));
     });
 }
 
 int32_t TONEWRIGHT_AudioEncoder_Encode(TONEWRIGHT_Handle encoder) {
     int32_t failure = TONEWRIGHT_ENCODER_FAILED;
     return barrier<int32_t>(failure, [&] {
-        const P<CAudioEncoder> object = unwrap<CAudioEncoder>(encoder);
-        if (!object) return TONEWRIGHT_ENCODER_FAILED;
-        // The listener unregisters itself when destroyed; it must outlive the run even if the host destroys
-        // its handle meanwhile.
-        const P<CEncoderHandle> listener = unwrap<CEncoderHandle>(encoder);
+        // Held by this call: the host may destroy its handle meanwhile.
+        if (const P<CEncoderHandle> object = unwrap<CEncoderHandle>(encoder)) {
+            failure = TONEWRIGHT_ENCODER_RUN_FAILED;
+            object->run();
+            return TONEWRIGHT_OK;
+        }
+        // An encoder that the host created itself.
+        const P<CAudioEncoder> own = unwrap<CAudioEncoder>(encoder);
+        if (!own) return TONEWRIGHT_ENCODER_FAILED;
         failure = TONEWRIGHT_ENCODER_RUN_FAILED;
-        object->encode();
+        own->encode();
         return TONEWRIGHT_OK;
     });
 }
