@@ -9,17 +9,17 @@ namespace sonora2::plugins {
 namespace {
 
 constexpr int kBytesPerSample = 2;
-// How much of something else (an unknown tag, damage) may stand before the first frame, and before others.
+// Limits for skipping other data (an unknown tag, damage) before the first frame and before later frames.
 constexpr long kFirstFrameBytes = 64 * 1024;
 constexpr long kNextFrameBytes = 16 * 1024 * 1024;
-// Frames decoded before the target of a seek. A frame may refer back to the bits of several earlier ones,
-// and what a seek delivers must be what a run from the start delivers.
+// Frames decoded before the target of a seek. A frame may use bits stored in several earlier ones, and a seek
+// must deliver the same samples as a run from the start.
 constexpr long kRunUpFrames = 16;
-// Places of frames that are remembered, evenly over the file; in between, headers are followed.
+// Entries of the seek index, spread evenly over the file. Between them, frame headers are followed.
 constexpr long kPlaces = 2048;
-// Every decoder of layer III delivers what it gets that many frames late.
+// Delay in frames that every layer III decoder adds.
 constexpr long kDecoderDelay = 529;
-// The codec reads each header and each frame by a call of its own.
+// The codec issues a separate read for each header and each frame.
 constexpr size_t kInputBufferBytes = 64 * 1024;
 
 ssize_t readInput(void* input, void* data, size_t size) {
@@ -38,14 +38,14 @@ off_t seekInput(void* input, off_t offset, int whence) {
 SDecodedMedia CMpegDecoder::open() {
     close();
     m_input = openForReading(m_file);
-    m_buffer.resize(kInputBufferBytes); // left to itself the C library would keep to its small one
+    m_buffer.resize(kInputBufferBytes); // the C library's default buffer is small
     std::setvbuf(m_input.get(), m_buffer.data(), _IOFBF, m_buffer.size());
     int error = MPG123_OK;
     m_handle.reset(mpg123_new(nullptr, &error));
     if (!m_handle) fail("could not open %s: %s", m_file.getDisplayName(), mpg123_plain_strerror(error));
     mpg123_handle* handle = m_handle.get();
     mpg123_param(handle, MPG123_ADD_FLAGS, MPG123_QUIET | MPG123_SKIP_ID3V2, 0);
-    // The codec would believe the file's word for its length.
+    // Gapless mode would trust the length stated in the file.
     mpg123_param(handle, MPG123_REMOVE_FLAGS, MPG123_GAPLESS, 0);
     mpg123_param(handle, MPG123_RESYNC_LIMIT, kFirstFrameBytes, 0);
     mpg123_param(handle, MPG123_PREFRAMES, kRunUpFrames, 0);
@@ -75,7 +75,7 @@ SPcmFormat CMpegDecoder::readFormat() {
     long rate = 0;
     int channels = 0, encoding = 0;
     if (mpg123_getformat(handle, &rate, &channels, &encoding) != MPG123_OK) failWith("could not open");
-    // From here on nothing but this format: a file that changes it is an error and no surprise.
+    // Allow only this format from here on, so that a change within the file is reported as an error.
     mpg123_format_none(handle);
     if (mpg123_format(handle, rate, channels, MPG123_ENC_SIGNED_16) != MPG123_OK) failWith("could not open");
     return {static_cast<int>(rate), channels, kBytesPerSample};
@@ -87,7 +87,7 @@ CMpegDecoder::SIdentity CMpegDecoder::identify() const {
     return {status.st_dev, status.st_ino, status.st_size, status.st_mtim.tv_sec, status.st_mtim.tv_nsec};
 }
 
-// Headers may lie about the length and many files have none: the frames are counted.
+// Stated lengths may be wrong and many files have none, so the frames are counted.
 void CMpegDecoder::scan() {
     mpg123_handle* handle = m_handle.get();
     m_scan = {};
@@ -102,8 +102,8 @@ void CMpegDecoder::scan() {
     mpg123_getstate(handle, MPG123_ENC_PADDING, &padding, nullptr);
     if (delay >= 0 && padding >= 0) {
         const int64_t before = delay + kDecoderDelay;
-        // A file that has lost its end has lost the padding first, and one that goes on behind what was told
-        // of has it somewhere within.
+        // A truncated file has lost its padding first, and in a file longer than stated the padding is
+        // somewhere in the middle.
         const int64_t behind = told == decoded && padding > kDecoderDelay ? padding - kDecoderDelay : 0;
         if (before + behind <= decoded) {
             scan.start = before;

@@ -1,4 +1,4 @@
-// Reads MPEG audio, layers I to III, with libmpg123.
+// Decodes MPEG audio layers I to III with libmpg123.
 #pragma once
 
 #include "support/Decoder.h"
@@ -9,8 +9,8 @@
 
 namespace sonora2::plugins {
 
-// Delivers 16 bit. What an encoder put before and behind the sound is cut off where the file tells how much.
-// The first opening reads the whole file; later ones of the same file only its beginning.
+// Delivers 16 bits. Encoder delay and padding are removed where the file states them.
+// The first opening scans the whole file; later openings of the same file only read its beginning.
 class CMpegDecoder : public IDecoder {
 public:
     explicit CMpegDecoder(const SMediaFile& file) : m_file(file) {}
@@ -24,7 +24,7 @@ private:
     struct SDelete {
         void operator()(mpg123_handle* handle) const { mpg123_delete(handle); }
     };
-    // Tells a file from its successor of the same name.
+    // Distinguishes a file from one that has replaced it under the same name.
     struct SIdentity {
         uint64_t device = 0;
         uint64_t node = 0;
@@ -33,10 +33,10 @@ private:
         int64_t nanoseconds = 0;
         bool operator==(const SIdentity&) const = default;
     };
-    // What only a run through the file tells.
+    // Results of scanning the whole file.
     struct SScan {
-        SIdentity identity; // of the file that was run through
-        int64_t start = 0;  // decoded frame with which the sound begins
+        SIdentity identity; // of the scanned file
+        int64_t start = 0;  // decoded frame at which the sound begins
         int64_t frames = 0; // of the sound
         std::vector<off_t> places;
         off_t framesPerPlace = 0;
@@ -51,7 +51,7 @@ private:
     SPcmFormat m_format;
     SScan m_scan;
     std::vector<char> m_buffer;                       // of the input
-    InputFile m_input;                                // the handle reads from it
+    InputFile m_input;                                // read by the handle
     std::unique_ptr<mpg123_handle, SDelete> m_handle; // while open
 };
 

@@ -16,7 +16,7 @@ SDecodedMedia CFlacDecoder::open() {
     InputFile input = openForReading(m_file);
     m_decoder.reset(FLAC__stream_decoder_new());
     if (!m_decoder) throw std::bad_alloc();
-    // From here on the library owns the stream.
+    // The library owns the stream from here on.
     if (FLAC__stream_decoder_init_FILE(m_decoder.get(), input.release(), onFrame, onMetadata, onError,
                                        this) != FLAC__STREAM_DECODER_INIT_STATUS_OK)
         fail("could not read %s: the decoder does not start", m_file.getDisplayName());
@@ -75,12 +75,12 @@ void CFlacDecoder::seek(int64_t frame) {
     m_rest.clear();
     m_restStart = 0;
     m_damage = nullptr;
-    m_taken = 0; // all that the library delivers while it seeks is rest
+    m_taken = 0; // frames delivered during the seek go to the rest
     m_position = frame;
     if (frame >= m_total) return;
     if (FLAC__stream_decoder_seek_absolute(m_decoder.get(), static_cast<FLAC__uint64>(frame)) && !m_damage)
         return;
-    // A damaged index or frame on the way: what lies before it can still be reached from the start.
+    // The index or a frame is damaged: positions before the damage can still be reached from the start.
     rewind();
     discard(frame);
 }

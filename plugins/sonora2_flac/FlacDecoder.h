@@ -1,4 +1,4 @@
-// Reads FLAC.
+// Decodes FLAC.
 #pragma once
 
 #include "support/Decoder.h"
@@ -9,14 +9,14 @@
 
 namespace sonora2::plugins::flac {
 
-// Widths that are no whole bytes are moved to the upper end of the next one: 20 bits come as 24.
-// A damaged frame is an error behind what lies before it. What follows the last frame, such as a tag, is not
-// looked at.
+// Widths that are not whole bytes are left-justified in the next larger one: 20 bits are delivered as 24.
+// A damaged frame is reported after the sound before it. Data after the last frame, such as a tag, is
+// ignored.
 class CFlacDecoder : public IDecoder {
 public:
     explicit CFlacDecoder(const SMediaFile& file);
 
-    // A header without the length is made good by running through the file, once in the decoder's life.
+    // If the header does not state the length, the file is scanned once in the decoder's lifetime.
     SDecodedMedia open() override;
     void close() override;
     int read(uint8_t* pcm, int frames) override;
@@ -37,7 +37,7 @@ private:
     bool take(const FLAC__Frame& frame, const FLAC__int32* const planes[]);
     void rewind();
     int64_t countFrames();
-    void discard(int64_t frames); // decodes and forgets
+    void discard(int64_t frames); // decodes and drops
     [[noreturn]] void failDamaged() const;
 
     SMediaFile m_file;
@@ -45,16 +45,16 @@ private:
     SPcmFormat m_format;
     int m_bits = 0;
     int64_t m_total = 0;    // frames
-    int64_t m_scanned = -1; // frames that were counted, where the header did not tell
-    int64_t m_position = 0; // frame that the next read starts with
+    int64_t m_scanned = -1; // frames counted by scanning; -1 if not scanned
+    int64_t m_position = 0; // first frame of the next read
 
-    // What a call of the library delivers goes straight to the reader's memory; the rest waits.
+    // A decoded frame is written directly to the caller's memory; what does not fit goes to `m_rest`.
     uint8_t* m_target = nullptr;
     int m_targetFrames = 0;
     int m_taken = 0;
     std::vector<uint8_t> m_rest;
     size_t m_restStart = 0;
-    const char* m_damage = nullptr; // the first thing that was wrong
+    const char* m_damage = nullptr; // first error reported
 };
 
 } // namespace sonora2::plugins::flac

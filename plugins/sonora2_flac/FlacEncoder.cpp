@@ -14,10 +14,10 @@ namespace {
 
 constexpr int kDefaultLevel = 5;
 constexpr int kHighestLevel = 8;
-constexpr int kBlockFrames = 4096; // handed to the library at once: what stays in the cache
+constexpr int kBlockFrames = 4096; // per call of the library, so that they stay in the cache
 
-// The table is written before the length is known. It has room for so many points; when a long file has
-// filled it, every second one is dropped and the rest come at twice the distance.
+// Space for the seek table is reserved before the length is known. When a long file has filled it, every
+// second point is dropped and the spacing doubles.
 constexpr int kSeekPoints = 240;
 constexpr int kSeekSeconds = 10;
 constexpr int kSeekPointBytes = 18;
@@ -36,7 +36,7 @@ void putBigEndian(uint8_t* at, uint64_t value, int bytes) {
 CFlacEncoder::CFlacEncoder() = default;
 
 CFlacEncoder::~CFlacEncoder() {
-    m_file = nullptr; // deleting the library's encoder finishes it
+    m_file = nullptr; // deleting the library's encoder finishes the stream
 }
 
 bool CFlacEncoder::accepts(const SPcmFormat& format) const {
@@ -66,7 +66,7 @@ void CFlacEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
     FLAC__stream_encoder_set_bits_per_sample(encoder, static_cast<uint32_t>(m_format.bytesPerSample * 8));
     FLAC__stream_encoder_set_sample_rate(encoder, rate);
     FLAC__stream_encoder_set_compression_level(encoder, static_cast<uint32_t>(level));
-    // Rates that a frame's header cannot tell are legal all the same.
+    // Rates that a frame header cannot encode are still valid outside of the streamable subset.
     if (!FLAC__format_sample_rate_is_subset(rate)) FLAC__stream_encoder_set_streamable_subset(encoder, false);
     FLAC__stream_encoder_set_metadata(encoder, blocks.data(), blocks.size());
     const FLAC__StreamEncoderInitStatus status =
@@ -92,7 +92,7 @@ void CFlacEncoder::write(const uint8_t* pcm, int frames) {
 }
 
 void CFlacEncoder::finish() {
-    // The library completes length, frame sizes and checksum; the table is ours.
+    // The library completes length, frame sizes and checksum; we write the table.
     if (!FLAC__stream_encoder_finish(m_encoder.get())) failEncoding();
     writeSeekTable();
     m_file = nullptr;
@@ -146,7 +146,7 @@ FLAC__StreamEncoderWriteStatus CFlacEncoder::onWrite(const FLAC__StreamEncoder*,
         encoder->m_encoded += samples;
     } else if (encoder->m_seekTableStart < 0 && size == kBlockHeaderBytes + kSeekPoints * kSeekPointBytes &&
                (data[0] & 0x7F) == FLAC__METADATA_TYPE_SEEKTABLE) {
-        // The header goes by block by block.
+        // The header arrives one metadata block per call.
         encoder->m_seekTableStart = file->tell() + kBlockHeaderBytes;
     }
     return file->tryWrite(data, size) ? FLAC__STREAM_ENCODER_WRITE_STATUS_OK

@@ -1,4 +1,4 @@
-// Writes FLAC.
+// Encodes FLAC.
 #pragma once
 
 #include "support/Encoder.h"
@@ -10,8 +10,8 @@
 
 namespace sonora2::plugins::flac {
 
-// The quality is the compression level, 0.0 to 1.0 for 0 to 8; the sound is the same at each. Without one it
-// is 5. The file has a seek table, and room for tags, so that setting them later does not move the sound.
+// The quality selects the compression level, 0.0 to 1.0 for 0 to 8, by default 5; all are lossless. The file
+// has a seek table and padding for tags, so that adding tags later does not move the sound.
 class CFlacEncoder : public IEncoder {
 public:
     CFlacEncoder();
@@ -33,7 +33,7 @@ private:
     using MetadataBlock = std::unique_ptr<FLAC__StreamMetadata, SBlockDeleter>;
     struct SSeekPoint {
         int64_t frame;
-        int64_t offset; // bytes behind the first frame's header
+        int64_t offset; // bytes from the first frame's header
         uint32_t frames;
     };
 
@@ -47,15 +47,15 @@ private:
     void writeSeekTable();
     [[noreturn]] void failEncoding();
 
-    MetadataBlock m_seekTable; // the encoder uses both up to its end
+    MetadataBlock m_seekTable; // both must outlive the encoder
     MetadataBlock m_padding;
     std::unique_ptr<FLAC__StreamEncoder, SDeleter> m_encoder;
-    COutputFile* m_file = nullptr; // null outside a job: nothing is written then
+    COutputFile* m_file = nullptr; // null outside a job; nothing is written then
     SPcmFormat m_format;
     std::vector<int32_t> m_planes;
     std::vector<SSeekPoint> m_seekPoints;
     int64_t m_seekSpacing = 0;     // frames
-    int64_t m_seekTableStart = -1; // where the points lie in the file
+    int64_t m_seekTableStart = -1; // offset of the points in the file
     int64_t m_soundStart = -1;
     int64_t m_encoded = 0; // frames
 };

@@ -14,7 +14,7 @@ namespace {
 constexpr double kDefaultQuality = 0.8; // V2
 constexpr int kRates[] = {8000, 11025, 12000, 16000, 22050, 24000, 32000, 44100, 48000};
 
-// Whole kbit/s, the codec's unit, in which 0 would leave the choice to it.
+// The codec takes whole kbit/s; 0 would leave the choice to it.
 int toKilobits(int bitRate) {
     return std::max(bitRate / 1000, 1);
 }
@@ -31,7 +31,7 @@ bool isAverage(const SEncoderSettings& settings) {
 
 } // namespace
 
-// The codec would resample other rates by itself, and drop channels beyond the second.
+// The codec would silently resample other rates and drop channels after the second.
 bool CMp3Encoder::accepts(const SPcmFormat& format) const {
     return format.channels <= 2 &&
            std::find(std::begin(kRates), std::end(kRates), format.rate) != std::end(kRates);
@@ -50,7 +50,7 @@ void CMp3Encoder::open(COutputFile& file, const SEncoderSettings& settings) {
 
     lame_set_num_channels(encoder, m_format.channels);
     lame_set_in_samplerate(encoder, m_format.rate);
-    lame_set_out_samplerate(encoder, m_format.rate); // else low bit rates would change it
+    lame_set_out_samplerate(encoder, m_format.rate); // otherwise low bit rates would change it
     if (m_format.channels == 1) lame_set_mode(encoder, MONO);
     lame_set_write_id3tag_automatic(encoder, 0);
     if (settings.nominalBitRate > 0 && !isAverage(settings)) {
@@ -72,19 +72,19 @@ void CMp3Encoder::open(COutputFile& file, const SEncoderSettings& settings) {
 }
 
 void CMp3Encoder::write(const uint8_t* pcm, int frames) {
-    // The bound that the codec's documentation gives.
+    // The bound given in the codec's documentation.
     m_encoded.resize(static_cast<size_t>(frames) * 5 / 4 + 7200);
     const int capacity = static_cast<int>(m_encoded.size());
     const bool stereo = m_format.channels == 2;
     if (m_format.bytesPerSample == 2) {
-        auto* samples = reinterpret_cast<short*>(const_cast<uint8_t*>(pcm)); // is not written to
+        auto* samples = reinterpret_cast<short*>(const_cast<uint8_t*>(pcm)); // not modified
         writeEncoded(
             stereo
                 ? lame_encode_buffer_interleaved(m_encoder.get(), samples, frames, m_encoded.data(), capacity)
                 : lame_encode_buffer(m_encoder.get(), samples, nullptr, frames, m_encoded.data(), capacity));
         return;
     }
-    // Full range of 32 bits, whatever the width, as the codec wants its integers.
+    // The codec expects integers scaled to the full 32-bit range.
     m_samples.resize(static_cast<size_t>(frames) * static_cast<size_t>(m_format.channels));
     pcm::unpack(pcm, m_format.bytesPerSample, m_samples.data(), m_samples.size());
     const int shift = 32 - 8 * m_format.bytesPerSample;
@@ -99,7 +99,7 @@ void CMp3Encoder::finish() {
     m_encoded.resize(7200);
     writeEncoded(lame_encode_flush(m_encoder.get(), m_encoded.data(), static_cast<int>(m_encoded.size())));
 
-    // The first frame was left empty for what is known only now: length, delay, and the seek table.
+    // The first frame was reserved for what is only known now: length, delay and the seek table.
     size_t size = lame_get_lametag_frame(m_encoder.get(), nullptr, 0);
     if (size == 0) return;
     m_encoded.resize(size);
@@ -117,7 +117,7 @@ void CMp3Encoder::writeEncoded(int bytes) {
 int64_t CMp3Encoder::estimateBytes(double seconds, const SEncoderSettings& settings) const {
     double bitRate = settings.nominalBitRate;
     if (bitRate <= 0) {
-        // What V9 to V0 come to for stereo at 44.1 kHz, in kbit/s.
+        // Typical bit rates of V10 to V0 for stereo at 44.1 kHz, in kbit/s.
         static constexpr double kBitRates[] = {65, 85, 100, 115, 130, 165, 175, 190, 225, 245, 260};
         const double tenths = settings.quality.value_or(kDefaultQuality) * 10;
         const int below = std::min(static_cast<int>(tenths), static_cast<int>(std::size(kBitRates)) - 2);

@@ -1,4 +1,4 @@
-// Writes MP3 with libmp3lame.
+// Encodes MP3 with libmp3lame.
 #pragma once
 
 #include "support/Encoder.h"
@@ -9,9 +9,9 @@
 
 namespace sonora2::plugins {
 
-// A nominal bit rate alone makes a constant one; with a minimum or maximum beside it, an average one within
-// these limits. Otherwise the bit rate varies by quality: 1.0 is the encoder's V0, 0.0 the least that it has,
-// V9.999; V2 unless told.
+// A nominal bit rate alone selects a constant bit rate; with a minimum or maximum as well, an average bit
+// rate within these limits. Otherwise the bit rate varies by quality: 1.0 is V0, 0.0 is V9.999, the default
+// is V2.
 class CMp3Encoder : public IEncoder {
 public:
     bool accepts(const SPcmFormat& format) const override;

@@ -1,11 +1,11 @@
-// Vorbis and WAV order the speakers of a frame differently.
+// Vorbis and WAV store the channels of a frame in different orders.
 #pragma once
 
 namespace sonora2::plugins {
 
-// For each channel in the order of chunks (that of WAV), its index in a Vorbis stream. Source: Vorbis I,
-// section 4.3.9. Null where both agree: one, two and four channels, and the layouts that Vorbis leaves to
-// the application.
+// Maps each channel in chunk order (that of WAV) to its index in a Vorbis stream, as defined by Vorbis I,
+// section 4.3.9. Null where both orders agree: one, two and four channels, and layouts that Vorbis leaves
+// undefined.
 inline const int* getVorbisChannelOrder(int channels) {
     static constexpr int k3[] = {0, 2, 1};
     static constexpr int k5[] = {0, 2, 1, 3, 4};

@@ -35,7 +35,7 @@ SDecodedMedia CVorbisDecoder::open() {
     if (const int error = ov_open_callbacks(file.get(), &m_stream, nullptr, 0, OV_CALLBACKS_DEFAULT);
         error < 0)
         fail("could not open %s: %s", m_file.getDisplayName(), describe(error));
-    static_cast<void>(file.release()); // goes with the stream
+    static_cast<void>(file.release()); // now owned by the stream
     m_opened = true;
 
     const vorbis_info* info = ov_info(&m_stream, -1);
@@ -44,7 +44,7 @@ SDecodedMedia CVorbisDecoder::open() {
     if (info->channels > kMaxChannels)
         fail("could not open %s: it has %d channels", m_file.getDisplayName(), info->channels);
     m_format = {static_cast<int>(info->rate), info->channels, kBytesPerSample};
-    // Streams may be chained; a chunk has no place for a change of format.
+    // Streams may be chained, but chunks cannot express a change of format.
     for (int link = 0; link < ov_streams(&m_stream); ++link) {
         const vorbis_info* other = ov_info(&m_stream, link);
         if (other->rate != m_format.rate || other->channels != m_format.channels)
@@ -63,7 +63,7 @@ int CVorbisDecoder::read(uint8_t* pcm, int frames) {
     float** planes = nullptr;
     int link = 0;
     long got = OV_HOLE;
-    // A hole is a gap in the stream: lost data, after which it goes on.
+    // A hole is a gap where data was lost; decoding continues after it.
     while (got == OV_HOLE) got = ov_read_float(&m_stream, &planes, frames, &link);
     if (got < 0) fail("could not decode %s: %s", m_file.getDisplayName(), describe(got));
     if (got == 0) return 0;

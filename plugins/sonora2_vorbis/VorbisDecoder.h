@@ -1,4 +1,4 @@
-// Reads Ogg Vorbis with libvorbisfile.
+// Decodes Ogg Vorbis with libvorbisfile.
 #pragma once
 
 #include "support/Decoder.h"
@@ -7,7 +7,7 @@
 
 namespace sonora2::plugins {
 
-// Delivers 16 bit: the codec has no width of its own.
+// Delivers 16 bits; the codec has no native width.
 class CVorbisDecoder : public IDecoder {
 public:
     explicit CVorbisDecoder(const SMediaFile& file) : m_file(file) {}

@@ -15,8 +15,8 @@ namespace {
 constexpr double kDefaultQuality = 0.3;
 constexpr int kMaxChannels = 8;
 constexpr int kMaxRate = 200000;
-// The codec moves what it has not encoded yet with every block: much at once costs its square. This is what
-// its own program hands over, so that both make the same of a recording's first block.
+// The codec moves its pending input with every block, so large writes cost quadratic time. The codec's own
+// program writes this many frames at once; doing the same yields the same first block.
 constexpr int kFramesAtOnce = 1024;
 
 int orOpen(int bitRate) {
@@ -56,7 +56,7 @@ void CVorbisEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
              file.getFile().getDisplayName(), m_format.rate, m_format.channels);
     vorbis_analysis_init(&m_state, &m_info);
     vorbis_block_init(&m_state, &m_block);
-    // Streams that are joined later are told apart by this number.
+    // The serial number distinguishes streams that are chained later.
     ogg_stream_init(&m_stream, static_cast<int>(std::random_device{}()));
     writeHeaders();
 }
@@ -68,12 +68,12 @@ void CVorbisEncoder::writeHeaders() {
     ogg_stream_packetin(&m_stream, &comment);
     ogg_stream_packetin(&m_stream, &setup);
     ogg_page page;
-    while (ogg_stream_flush(&m_stream, &page)) writePage(page); // audio begins on a page of its own
+    while (ogg_stream_flush(&m_stream, &page)) writePage(page); // audio must begin on a new page
 }
 
 void CVorbisEncoder::write(const uint8_t* pcm, int frames) {
     const int* order = getVorbisChannelOrder(m_format.channels);
-    while (frames > 0) { // zero would end the stream
+    while (frames > 0) { // writing 0 frames would end the stream
         const int count = std::min(frames, kFramesAtOnce);
         float** planes = vorbis_analysis_buffer(&m_state, count);
         for (int i = 0; i < m_format.channels; ++i)
@@ -112,7 +112,7 @@ void CVorbisEncoder::writePage(const ogg_page& page) {
 
 int64_t CVorbisEncoder::estimateBytes(double seconds, const SEncoderSettings& settings) const {
     if (settings.nominalBitRate > 0) return static_cast<int64_t>(seconds * settings.nominalBitRate / 8);
-    // What the encoder aims at for stereo at 44.1 kHz, by tenths of quality, in kbit/s.
+    // The encoder's target bit rates for stereo at 44.1 kHz by tenths of quality, in kbit/s.
     static constexpr double kBitRates[] = {64, 80, 96, 112, 128, 160, 192, 224, 256, 320, 500};
     const double tenths = settings.quality.value_or(kDefaultQuality) * 10;
     const int below = std::min(static_cast<int>(tenths), static_cast<int>(std::size(kBitRates)) - 2);

@@ -1,4 +1,4 @@
-// Writes Ogg Vorbis with libvorbisenc.
+// Encodes Ogg Vorbis with libvorbisenc.
 #pragma once
 
 #include "support/Encoder.h"
@@ -7,8 +7,8 @@
 
 namespace sonora2::plugins {
 
-// Quality 0.0 to 1.0 is the codec's own; 0.3 unless told. A nominal bit rate makes an average one, limits
-// make a managed one.
+// Quality 0.0 to 1.0 is the codec's own scale, by default 0.3. A nominal bit rate selects an average bit
+// rate, limits select a managed one.
 class CVorbisEncoder : public IEncoder {
 public:
     CVorbisEncoder();

@@ -22,7 +22,7 @@ bool isOwnContainer(int format) {
     case SF_FORMAT_CAF:
         return true;
     default:
-        return false; // the library reads compressed formats too, which have plug-ins of their own
+        return false; // compressed formats that the library also reads have plug-ins of their own
     }
 }
 
@@ -52,7 +52,7 @@ SDecodedMedia CSndfileDecoder::open() {
 
     int64_t frames = info.frames;
     if (m_transfer != ETransfer::shorts) {
-        // Of linear samples there cannot be more than the file has bytes.
+        // A file cannot hold more linear samples than its size allows.
         std::error_code error;
         const uintmax_t size = std::filesystem::file_size(m_file.path, error);
         const int64_t width = m_transfer == ETransfer::doubles ? 8 : m_format.bytesPerSample;

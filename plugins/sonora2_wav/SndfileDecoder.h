@@ -1,4 +1,4 @@
-// Reads the plain sound containers.
+// Decodes WAV and similar containers with libsndfile.
 #pragma once
 
 #include "support/Decoder.h"
@@ -14,8 +14,8 @@ struct SSndfileCloser {
 };
 using SndfileHandle = std::unique_ptr<SNDFILE, SSndfileCloser>;
 
-// Linear PCM is delivered bit for bit, floating point as 32 bits, what was compressed as the 16 bits that it
-// is made for. A length in the header that the file cannot hold is cut to what is there.
+// Linear PCM is delivered bit for bit, floating point as 32 bits, compressed samples as the 16 bits that they
+// were made from. A stated length that the file cannot hold is reduced to what is there.
 class CSndfileDecoder : public IDecoder {
 public:
     explicit CSndfileDecoder(const SMediaFile& file);
@@ -26,13 +26,13 @@ public:
     void seek(int64_t frame) override;
 
 private:
-    // How the library's samples become ours.
+    // How samples are read from the library.
     enum class ETransfer { raw, rawSigned8, shorts, integers24, integers32, floats, doubles };
 
     void chooseTransfer(int sampleFormat);
 
     SMediaFile m_file;
-    InputFile m_input; // under the handle
+    InputFile m_input; // read by the handle
     SndfileHandle m_handle;
     SPcmFormat m_format;
     ETransfer m_transfer = ETransfer::raw;

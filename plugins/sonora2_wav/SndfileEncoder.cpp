@@ -38,13 +38,13 @@ sf_count_t getPosition(void* file) {
 
 } // namespace
 
-// A row per extension. The header is what the library puts around the samples when nothing but samples is
-// written; sizes are rounded up to `alignment`.
+// One row per extension. The header size is what the library writes in addition to the samples; the size of
+// the samples is rounded up to `alignment`.
 struct CSndfileEncoder::SContainer {
     const char* extension;
     int format;
     bool signed8;
-    bool below4GiB; // the sizes in its header have 32 bits
+    bool below4GiB; // its header stores 32-bit sizes
     int headerBytes;
     int alignment;
 };
@@ -141,9 +141,9 @@ void CSndfileEncoder::finish() {
     if (m_bytes % 2 != 0) correctSizes();
 }
 
-// The library counts the byte that fills an odd length as sound: readers would find one sample too many.
+// The library counts the padding byte of an odd length as sound; readers would find one sample too many.
 void CSndfileEncoder::correctSizes() {
-    constexpr int kAiffFrames = 22; // places of the counts in the library's headers
+    constexpr int kAiffFrames = 22; // offsets of the counts in the library's headers
     constexpr int kAiffDataSize = 42;
     constexpr int kCafDataSize = 4084;
     const auto put = [this](int64_t at, uint64_t value, int bytes) {

@@ -1,4 +1,4 @@
-// Writes the plain sound containers other than WAV.
+// Encodes AIFF, AU, CAF, W64 and RF64 with libsndfile.
 #pragma once
 
 #include "sonora2_wav/SndfileDecoder.h"
@@ -31,8 +31,8 @@ private:
     SPcmFormat m_format;
     COutputFile* m_file = nullptr;
     SndfileHandle m_handle;
-    bool m_swapped = false; // the container's byte order is not ours
-    int64_t m_bytes = 0;    // of samples so far
+    bool m_swapped = false; // the container's byte order differs from the host's
+    int64_t m_bytes = 0;    // sample bytes written so far
     std::vector<int32_t> m_integers;
     std::vector<uint8_t> m_signed8;
 };

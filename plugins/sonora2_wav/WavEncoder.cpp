@@ -10,15 +10,15 @@ namespace {
 
 constexpr int kPlainFormatBytes = 16;
 constexpr int kExtensibleFormatBytes = 40;
-constexpr int kSizesBytes = 28;                           // of the chunk that RF64 keeps its sizes in
-constexpr int kFixedBytes = 12 + 8 + kSizesBytes + 8 + 8; // the header without the format
+constexpr int kSizesBytes = 28;                           // of the chunk that holds the sizes of RF64
+constexpr int kFixedBytes = 12 + 8 + kSizesBytes + 8 + 8; // header size without the format
 constexpr uint16_t kPcm = 1;
 constexpr uint16_t kExtensible = 0xFFFE;
 constexpr uint32_t kInSizesChunk = 0xFFFFFFFF;
 
-// Speakers by number of channels, the usual set of each; more channels have none.
+// The usual speaker mask for each number of channels; more channels have none.
 constexpr std::array<uint32_t, 9> kSpeakers{0, 0x4, 0x3, 0x7, 0x33, 0x37, 0x3F, 0x70F, 0x63F};
-// The identity of linear PCM behind its first two bytes.
+// The subformat GUID of linear PCM without its first two bytes.
 constexpr std::array<uint8_t, 14> kSubformat{0, 0, 0, 0, 0x10, 0, 0x80, 0, 0, 0xAA, 0, 0x38, 0x9B, 0x71};
 
 bool isExtensible(const SPcmFormat& format) {
@@ -77,7 +77,7 @@ void CWavEncoder::update() {
 }
 
 void CWavEncoder::finish() {
-    if (m_dataBytes % 2 != 0) m_file->write("", 1); // chunks start at even places
+    if (m_dataBytes % 2 != 0) m_file->write("", 1); // chunks are aligned to even offsets
     m_file->seek(0);
     writeHeader();
 }
@@ -102,7 +102,7 @@ void CWavEncoder::writeHeader() {
     header.put64(large ? riffBytes : 0);
     header.put64(large ? m_dataBytes : 0);
     header.put64(large ? m_dataBytes / m_format.frameBytes() : 0);
-    header.put32(0); // no table of further chunks
+    header.put32(0); // the table of other chunks is empty
 
     const bool extensible = isExtensible(m_format);
     header.put("fmt ");

@@ -1,12 +1,12 @@
-// Writes WAV.
+// Encodes WAV.
 #pragma once
 
 #include "support/Encoder.h"
 
 namespace sonora2::plugins::wav {
 
-// Writes the header itself: it keeps room for the 64-bit sizes of RF64 and uses it only when the file has
-// really grown beyond 4 GiB, while a smaller file stays the plain WAV that every player knows.
+// The header reserves space for the 64-bit sizes of RF64. They are only used when the file has grown beyond
+// 4 GiB; smaller files remain plain WAV, which every player can read.
 class CWavEncoder : public IEncoder {
 public:
     bool accepts(const SPcmFormat& format) const override;

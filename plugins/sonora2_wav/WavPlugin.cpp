@@ -8,7 +8,7 @@ namespace sonora2::plugins::wav {
 
 namespace {
 
-// The first is what a name without any of them means.
+// The first one applies to names without a known extension.
 const Extensions kExtensions{"wav", "wave", "rf64", "w64", "aif", "aiff", "aifc", "au", "snd", "caf"};
 
 std::unique_ptr<IEncoder> makeEncoder(const SMediaFile& file) {

@@ -13,14 +13,14 @@ namespace {
 
 constexpr int kChunkFrames = 8192;
 constexpr int kChunkBytes = 256 * 1024; // wide formats get fewer frames
-// Own frames that the filter is run through before the first one that is wanted behind a seek; in downward
-// conversions it is as many times longer as the rate falls. Its length is 16 samples a side.
+// Frames of the file that fill the filter (16 samples on each side) before the first frame wanted after a
+// seek. Conversions to a lower rate need proportionally more.
 constexpr int64_t kRunUp = 64;
-// Beyond these lie damaged headers rather than sound.
+// Headers that claim more than this are damaged.
 constexpr int kMaxRatio = 1024;
 constexpr int kMaxRate = 1 << 20;
 
-// round(value * numerator / denominator) for values of any file that fits a disk.
+// round(value * numerator / denominator) without overflow for the frame counts of any file that fits a disk.
 int64_t scale(int64_t value, int64_t numerator, int64_t denominator) {
     const int64_t whole = value / denominator;
     const int64_t rest = value % denominator;
@@ -35,7 +35,7 @@ CChunkProducer::CChunkProducer(const P<common::ISonoraContext>& context, IDecode
       m_total(countDelivered(media, wanted)), m_converting(!(media.format == wanted)) {
     m_chunkFrames = std::clamp(kChunkBytes / wanted.frameBytes(), 1, kChunkFrames);
     if (m_converting) {
-        // Own frames that give about that many delivered ones.
+        // Frames of the file that convert to about one delivered chunk.
         const int64_t own = scale(m_chunkFrames, media.format.rate, wanted.rate);
         m_ownChunkFrames = static_cast<int>(std::clamp<int64_t>(own, 64, kChunkFrames));
     }
@@ -58,8 +58,8 @@ void CChunkProducer::seek(int64_t frame) {
     m_ended = false;
     int64_t own = m_position;
     if (m_converting) {
-        // The filter's phase comes round every `ownPeriod` frames: started there, a new converter gives what
-        // the old one would have given, as soon as its filter is full.
+        // The filter's phase repeats every `ownPeriod` frames. A new converter that starts at a multiple of
+        // it delivers the same samples as an uninterrupted run once its filter is full.
         const int64_t common = std::gcd(m_media.format.rate, m_wanted.rate);
         const int64_t ownPeriod = m_media.format.rate / common;
         const int64_t runUp = kRunUp * (1 + m_media.format.rate / m_wanted.rate);
@@ -96,7 +96,7 @@ P<audio::IAudioChunk> CChunkProducer::nextConverted() {
     const int ownFrameBytes = m_media.format.frameBytes();
     while (m_position < m_total) {
         P<audio::IAudioChunk> converted;
-        if (m_flushed) return nullptr; // the silence behind the end is used up
+        if (m_flushed) return nullptr; // the silence after the end is used up
         P<peru::IMemoryBlock> own = m_memory->getBlock(int64_t{m_ownChunkFrames} * ownFrameBytes);
         const int64_t left = m_media.frames - m_read;
         const int frames =
@@ -128,7 +128,7 @@ P<audio::IAudioChunk> CChunkProducer::nextConverted() {
 }
 
 int CChunkProducer::readOwn(uint8_t* pcm, int frames) {
-    // A decoder may give less than asked for; chunks are filled all the same, unless the file ends.
+    // A decoder may return fewer frames than requested; chunks are still filled unless the file ends.
     int filled = 0;
     const int frameBytes = m_media.format.frameBytes();
     while (filled < frames) {

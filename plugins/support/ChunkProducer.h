@@ -1,4 +1,4 @@
-// Turns a decoder's frames into chunks of the wanted format.
+// Turns a decoder's frames into chunks of the requested format.
 #pragma once
 
 #include "sonora2/context/ISonoraContext.h"
@@ -7,16 +7,16 @@
 
 namespace sonora2::plugins {
 
-// Frames are counted on the delivered side. The conversion adds no delay and no tail: the total is
-// round(frames * wanted rate / own rate), and a seek gives the frames that a run from the start gives.
-// One thread at a time.
+// Positions count delivered frames. The conversion adds no delay and no tail: the total is
+// round(frames * requested rate / file's rate), and a seek delivers the same samples as a run from the start.
+// Not safe for concurrent use.
 class CChunkProducer {
 public:
-    // The decoder is open, and outlives this object.
+    // The decoder must be open and outlive this object.
     CChunkProducer(const P<common::ISonoraContext>& context, IDecoder& decoder, const SDecodedMedia& media,
                    const SPcmFormat& wanted);
 
-    // Whether the sample rate converter gets from one format to the other; equal formats need none.
+    // Whether the sample rate converter supports this pair of formats. Equal formats need no conversion.
     static bool canDeliver(const SPcmFormat& own, const SPcmFormat& wanted);
     static int64_t countDelivered(const SDecodedMedia& media, const SPcmFormat& wanted);
 
@@ -36,19 +36,19 @@ private:
     IDecoder& m_decoder;
     SDecodedMedia m_media;
     SPcmFormat m_wanted;
-    int m_chunkFrames;      // delivered frames of a usual chunk
-    int64_t m_total;        // delivered frames; falls when the file ends before it should
-    int64_t m_position = 0; // delivered frame that comes next
+    int m_chunkFrames;      // delivered frames per chunk
+    int64_t m_total;        // delivered frames; lowered when the file ends early
+    int64_t m_position = 0; // next frame to deliver
     int64_t m_origin = 0;
 
-    bool m_ended = false; // the decoder has no more
-    int64_t m_read = 0;   // own frame that the decoder reads next
+    bool m_ended = false; // the decoder has reached its end
+    int64_t m_read = 0;   // frame that the decoder reads next
 
     // Only while converting.
     bool m_converting;
     P<samplerateconverter::CSampleRateConverter> m_converter;
     int m_ownChunkFrames = 0;
-    int64_t m_drop = 0; // converted frames to throw away: the run-up of a seek
+    int64_t m_drop = 0; // converted frames to discard after a seek
     bool m_flushed = false;
 };
 

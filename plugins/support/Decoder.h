@@ -1,4 +1,4 @@
-// What the author of a reading plug-in writes.
+// The interface that a reading plug-in implements.
 #pragma once
 
 #include "support/MediaFile.h"
@@ -7,24 +7,25 @@ namespace sonora2::plugins {
 
 struct SDecodedMedia {
     SPcmFormat format;
-    int64_t frames = 0;     // exact: what a run to the end delivers from a sound file
+    int64_t frames = 0;     // exact: what reading an intact file to its end delivers
     std::string codec = {}; // such as "FLAC" or "PCM signed 24 bit", for people; empty when unknown
 };
 
-// Decodes one file into PCM. CDecoderSource does everything else: states, conversion, read-ahead, time.
-// Never used by two threads at once, but not always by the same one. Failures are thrown, best by fail().
+// Decodes one file to PCM. CDecoderSource adds state checks, conversion, read-ahead and time.
+// Calls never overlap but may come from different threads. Failures are thrown, preferably with fail().
 // The destructor closes.
 class IDecoder {
 public:
     virtual ~IDecoder() = default;
 
-    // Starts at frame 0. Called again after close(): what took long to find out should be kept.
+    // Starts at frame 0. May be called again after close(), so results that were slow to obtain should be
+    // cached.
     virtual SDecodedMedia open() = 0;
-    virtual void close() = 0; // also after an open() that threw; nothing when closed
-    // Fills up to `frames` frames and answers how many; fewer are legal, 0 means the end. What could be
-    // decoded before a damaged place is delivered before the failure is thrown.
+    virtual void close() = 0; // also called after open() has thrown; no effect when closed
+    // Reads up to `frames` frames and returns the number read, which may be smaller; 0 means the end.
+    // Everything that can be decoded before a damaged place is returned before the failure is thrown.
     virtual int read(uint8_t* pcm, int frames) = 0;
-    // The next read starts at exactly that frame, 0 to the number of frames. Also legal at the end.
+    // The next read starts at exactly this frame, from 0 to the number of frames inclusive.
     virtual void seek(int64_t frame) = 0;
 };
 

@@ -13,7 +13,7 @@ namespace sonora2::plugins {
 
 namespace {
 
-// What is read ahead at most: a second, and no more than this.
+// Read-ahead is limited to one second and to this many bytes.
 constexpr int64_t kReadAheadBytes = 512 * 1024;
 
 size_t getReadAheadChunks(const SPcmFormat& format, int chunkFrames) {
@@ -133,7 +133,7 @@ bool CDecoderSource::openDecoder() {
     try {
         m_media = m_decoder->open();
     } catch (...) {
-        m_decoder->close(); // it may have come half way
+        m_decoder->close(); // open() may have acquired resources
         throw;
     }
     const SPcmFormat& own = m_media.format;
@@ -155,7 +155,7 @@ void CDecoderSource::requireOpened() const {
 }
 
 int64_t CDecoderSource::toFrame(double seconds) const {
-    // Times of frames come back as what they were, in spite of their rounding; others are moved to the next.
+    // The time of a frame maps back to that frame despite rounding; times in between map to the next frame.
     const double frame = seconds * m_delivered.rate;
     if (!(frame > 0.0)) return 0;
     if (frame >= static_cast<double>(m_total)) return m_total;
@@ -165,7 +165,7 @@ int64_t CDecoderSource::toFrame(double seconds) const {
 
 void CDecoderSource::restartAt(int64_t frame) {
     m_readAhead.reset();
-    m_delivering = m_total; // at the end, should the seek fail
+    m_delivering = m_total; // at the end if the seek fails
     m_producer->setOrigin(toFrame(m_startTime));
     m_producer->seek(frame);
     m_delivering = frame;

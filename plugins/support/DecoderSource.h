@@ -9,27 +9,27 @@
 
 namespace sonora2::plugins {
 
-// Rate, channels and width can be asked for as soon as the file has been open once.
-// With a start time the source begins there: its time 0, its duration and its timestamps count from it.
+// Rate, channels and width are known once the file has been opened for the first time.
+// Time 0, the duration and the timestamps are relative to the start time.
 class CDecoderSource : public peru::CObject, public common::IAudioSource, public common::IMediaDescription {
 public:
-    // Closed. Zeros in `wanted` stand for the file's own values.
+    // Created closed. A zero in `wanted` selects the file's own value.
     CDecoderSource(const P<common::ISonoraContext>& context, const P<peru::IString>& pluginName,
                    const SMediaFile& file, std::unique_ptr<IDecoder> decoder, const SPcmFormat& wanted);
     ~CDecoderSource() override;
 
-    // Opens the file once to see its format; false when the wanted one cannot be had from it. Throws when
-    // the file cannot be opened. Leaves the source closed.
+    // Opens the file to learn its format and returns false if it cannot be converted to the wanted one.
+    // Throws if the file cannot be opened. Leaves the source closed.
     bool probe();
 
     bool isOpened() override { return m_producer != nullptr; }
-    void open() override; // nothing on an open source
+    void open() override; // no effect on an open source
     void close() override;
     void skipToTime(double fTimestamp) override;
     double getDuration() override; // exact
     int getBufferStatus() override;
     bool isEOF() override;
-    // On an open source the delivery starts again, at the new start.
+    // On an open source, delivery restarts at the new start time.
     void setStartTime(double fStartTime) override;
     double getStartTime() override { return m_startTime; }
     P<peru::IURI> getURI() override { return m_file.uri; }
@@ -43,16 +43,16 @@ public:
     int getBytesPerSample() override { return m_delivered.bytesPerSample; }
 
     P<peru::IString> getCodecName() override;
-    int64_t getBitRate() override; // of the whole file, tags and covers included
+    int64_t getBitRate() override; // of the whole file, including tags and covers
     int getOwnSampleRate() override { return m_media.format.rate; }
     int getOwnChannelCount() override { return m_media.format.channels; }
     int getOwnBytesPerSample() override { return m_media.format.bytesPerSample; }
 
 private:
-    bool openDecoder(); // false when its format cannot become the wanted one
+    bool openDecoder(); // false if its format cannot be converted to the wanted one
     void requireOpened() const;
     int64_t toFrame(double seconds) const;
-    void restartAt(int64_t frame); // a delivered frame of the whole file
+    void restartAt(int64_t frame); // in delivered frames from the beginning of the file
 
     P<common::ISonoraContext> m_context;
     P<peru::IString> m_pluginName;
@@ -63,7 +63,7 @@ private:
     SDecodedMedia m_media;                      // known once opened
     SPcmFormat m_delivered;                     // known once opened
     int64_t m_total = 0;                        // delivered frames of the whole file
-    int64_t m_delivering = 0;                   // the frame that the consumer gets next
+    int64_t m_delivering = 0;                   // next frame for the consumer
     std::unique_ptr<CChunkProducer> m_producer; // while open
     std::unique_ptr<CReadAhead> m_readAhead;    // uses the producer
 };

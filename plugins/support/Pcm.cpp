@@ -9,7 +9,7 @@ static_assert(std::endian::native == std::endian::little, "samples are moved as 
 
 namespace {
 
-// One sample of each width. Samples of 24 bits are taken as three bytes; the dense loops below read four.
+// Single samples of each width. 24-bit samples are read as three bytes here; the dense loops below read four.
 template <int Bytes> inline int32_t load(const uint8_t* at) {
     if constexpr (Bytes == 1) {
         return static_cast<int32_t>(*at) - 128;
@@ -43,7 +43,7 @@ template <int Bytes> inline void store(int32_t value, uint8_t* at) {
     }
 }
 
-// Calls the function with the width as a constant.
+// Calls the function with the width as a compile-time constant.
 template <class Function> void withWidth(int bytesPerSample, const Function& function) {
     switch (bytesPerSample) {
     case 1:
@@ -58,7 +58,7 @@ template <class Function> void withWidth(int bytesPerSample, const Function& fun
 }
 
 template <int Bytes> constexpr float kFullScale = static_cast<float>(int64_t{1} << (8 * Bytes - 1));
-// The largest float below full scale. For 32 bits it is not the largest integer, which no float can hold.
+// The largest value below full scale that a float can hold; at 32 bits this is less than INT32_MAX.
 template <int Bytes> constexpr float kHighest = Bytes == 4
                                                     ? 2147483520.0f
                                                     : static_cast<float>((int64_t{1} << (8 * Bytes - 1)) - 1);
@@ -68,8 +68,8 @@ template <int Bytes> inline int32_t quantise(float sample) {
     value = value == value ? value : 0.0f;
     value = value < -kFullScale<Bytes> ? -kFullScale<Bytes> : value;
     value = value > kHighest<Bytes> ? kHighest<Bytes> : value;
-    // Truncation of a shifted value rounds to nearest and, unlike lrint, vectorises everywhere. From 24 bits
-    // up the float has no fraction worth rounding.
+    // Adding one half and truncating rounds to nearest and, unlike lrint, vectorises everywhere. At 24 bits
+    // and above a float has no significant fraction left.
     if constexpr (Bytes >= 3) return static_cast<int32_t>(value);
     return static_cast<int32_t>(value + (value < 0.0f ? -0.5f : 0.5f));
 }

@@ -1,4 +1,4 @@
-// The plug-in object that every plug-in library delivers.
+// Base class of the plug-in object that a plug-in library exports.
 #pragma once
 
 #include "sonora2/context/ISonoraContext.h"
@@ -12,7 +12,7 @@
 
 namespace sonora2::plugins {
 
-using Extensions = std::vector<std::string>; // lower case, without the point
+using Extensions = std::vector<std::string>; // lower case, without the dot
 
 // A plug-in for sound files. The author overrides one or both factories:
 //
@@ -26,14 +26,14 @@ using Extensions = std::vector<std::string>; // lower case, without the point
 //   };
 //   SONORA2_PLUGIN(CMyPlugin)
 //
-// Declines whatever is no sound, no local file, or no format that it can give or take.
+// Declines requests that are not for audio, not for a local file, or for a format that it does not support.
 class CPluginBase : public peru::CObject, public common::ISonoraPlugin {
 public:
     P<peru::IString> getPluginName() override { return m_name; }
     int getValidTypes() override;
     P<common::IPluginExtensions> getValidExtensions(int nTypes) override;
-    // The source comes closed. It has been open once when parameters are given, since only the file tells
-    // whether they can be met; what that throws is thrown.
+    // Returns a closed source. If parameters are given, the file is opened once to check whether they can be
+    // met, and exceptions from opening it are passed on.
     P<common::ISource> tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
                                        const SSourceParams* pParams) override;
     P<common::IFormat> tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
@@ -45,11 +45,11 @@ protected:
                 Extensions writeExtensions);
     ~CPluginBase() override;
 
-    // Empty: the plug-in does not read this. Opens nothing.
+    // Returns null if the plug-in does not read this file. Must not open it.
     virtual std::unique_ptr<IDecoder> createDecoder(const SMediaFile& file);
-    // Null: the plug-in does not write.
+    // Returns null if the plug-in does not write.
     virtual CEncoderFormat::EncoderFactory getEncoderFactory();
-    // Whether the URI can be served at all; local files by default.
+    // Whether the URI is supported at all; by default, local files are.
     virtual bool serves(const SMediaFile& file);
 
     const P<common::ISonoraContext>& getContext() const { return m_context; }
@@ -61,8 +61,8 @@ private:
     Extensions m_writeExtensions;
 };
 
-// Defines the entry point of a plug-in library. No exception crosses it: a plug-in that cannot be made is
-// an empty one.
+// Defines the entry point of a plug-in library. Exceptions do not cross it: if construction fails, the
+// plug-in is empty.
 #define SONORA2_PLUGIN(Class)                                                                                \
     extern "C" __attribute__((visibility("default"))) void sonora2_pluginCreate(                             \
         const ::peru::P<::sonora2::common::ISonoraContext>& context,                                         \

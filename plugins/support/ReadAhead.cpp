@@ -21,7 +21,7 @@ CReadAhead::~CReadAhead() {
 
 P<audio::IAudioChunk> CReadAhead::next() {
     if (!m_thread) {
-        // Nobody else is here yet. When the system has no thread to give, decoding goes on in place.
+        // No thread is running yet. If none can be created, decoding continues on the caller's thread.
         P<audio::IAudioChunk> chunk;
         if (!m_ended && produce(chunk, m_error))
             startThread();
@@ -44,7 +44,7 @@ P<audio::IAudioChunk> CReadAhead::next() {
             drained = m_chunks.size() == m_limit / 2;
         }
     }
-    // Woken at half of the queue, the thread decodes several chunks a turn.
+    // Waking the thread when the queue is half empty lets it decode several chunks per wake-up.
     if (drained) m_drained.notify_one();
     if (error) error->raise();
     return chunk;
@@ -88,7 +88,7 @@ void CReadAhead::run() {
                 m_ended = true;
             }
         }
-        m_filled.notify_one(); // behind the lock, which the consumer would else wait for at once
+        m_filled.notify_one(); // after unlocking, so that the consumer does not block on the lock
         std::unique_lock lock(m_mutex);
         if (more && m_chunks.size() >= m_limit)
             m_drained.wait(lock, [this] { return m_stopping || m_chunks.size() <= m_limit / 2; });

@@ -1,4 +1,4 @@
-// Decodes ahead of the consumer on a thread of its own.
+// Decodes ahead of the consumer on a separate thread.
 #pragma once
 
 #include "peru/threads/IThreadManager.h"
@@ -10,37 +10,37 @@
 
 namespace sonora2::plugins {
 
-// A bounded queue of chunks between one producer and one consumer. The thread starts behind the first chunk,
-// so that a source that is only test-opened, or shorter than a chunk, never has one.
+// A bounded queue of chunks between one producer and one consumer. The thread starts after the first chunk,
+// so a source that is only opened as a test, or is shorter than a chunk, never starts one.
 class CReadAhead {
 public:
-    // The producer outlives this object, and nobody else uses it meanwhile.
+    // The producer must outlive this object and must not be used by anyone else meanwhile.
     CReadAhead(CChunkProducer& producer, size_t limit);
-    ~CReadAhead(); // stops the thread; at most one chunk is decoded meanwhile
+    ~CReadAhead(); // stops the thread after the chunk that it is decoding
 
-    // Waits for the next chunk; empty at the end. What the producer threw is thrown here, behind the last
-    // chunk before it, and ends the queue.
+    // Waits for the next chunk; empty at the end. An exception of the producer is rethrown here after the
+    // chunks that precede it, and ends the queue.
     P<audio::IAudioChunk> next();
-    bool isEnded() const; // everything was handed out
-    int getFill() const;  // percent; 100 also when nothing more is to be read
+    bool isEnded() const; // everything has been delivered
+    int getFill() const;  // percent; 100 also when there is nothing left to read
 
 private:
     void startThread();
     static void runThread(peru::IBase* owner, void* argument);
     void run();
-    // One step of the producer; false behind the last one. The lock is not held.
+    // Runs one step of the producer; returns false after the last one. Called without the lock.
     bool produce(P<audio::IAudioChunk>& chunk, P<peru::CException>& error) noexcept;
 
     CChunkProducer& m_producer;
     const size_t m_limit;
-    P<peru::IThread> m_thread; // consumer's side only
+    P<peru::IThread> m_thread; // used by the consumer only
 
-    mutable std::mutex m_mutex; // guards all below
+    mutable std::mutex m_mutex; // guards everything below
     std::condition_variable m_filled;
     std::condition_variable m_drained;
     std::deque<P<audio::IAudioChunk>> m_chunks;
-    P<peru::CException> m_error; // stands behind the chunks
-    bool m_ended = false;        // the producer has no more
+    P<peru::CException> m_error; // to be thrown after the chunks
+    bool m_ended = false;        // the producer has reached its end
     bool m_stopping = false;
 };
 

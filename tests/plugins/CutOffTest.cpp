@@ -1,4 +1,4 @@
-// What is on the disk while a file is still written.
+// The state of a file on disk while it is being written.
 #include "plugins/PluginFixture.h"
 
 #include <chrono>
@@ -24,21 +24,21 @@ TEST_F(CutOff, LeavesAFileThatPlaysUpToItsLastHalfSecond) {
         ASSERT_TRUE(formats.back());
         formats.back()->open();
     }
-    // Sound that comes as slowly as a recording: what a codec holds back is its own affair.
+    // Sound arrives as slowly as in a recording. Codecs may still hold back some of it.
     std::this_thread::sleep_for(std::chrono::milliseconds(550));
     for (const P<IAudioFormat>& format : formats) format->writeAudioChunk(makeChunk(pcm));
 
     for (size_t i = 0; i < files.size(); ++i) {
         const SFormatCase& row = kFormatCases[i];
         SCOPED_TRACE(row.extension);
-        // It believes the sizes in a header, which others do not.
+        // sox relies on the sizes in the header, unlike other programs.
         const bool isContainer = std::string(row.plugin) == "sonora2_wav";
         const std::string played =
             run(isContainer ? "sox -t sndfile '" + files[i].string() + "' -t raw -"
                             : "ffmpeg -v fatal -i '" + files[i].string() + "' -f s16le -c:a pcm_s16le -");
         EXPECT_GT(played.size(), pcm.size() - pcm.size() / 6);
         EXPECT_TRUE(!row.lossless || pcm.starts_with(played));
-        // Goes on as if nothing had happened.
+        // Writing continues normally.
         formats[i]->writeAudioChunk(makeChunk(pcm));
         formats[i]->close();
         const std::string whole = readAll(openSource(files[i], shape));

@@ -1,4 +1,4 @@
-// Damaged files and disks without room.
+// Damaged files and full disks.
 #include "plugins/PluginFixture.h"
 
 #include "sonora2/context/SonoraError.h"
@@ -11,7 +11,7 @@ namespace {
 
 using sonora2::common::CSonoraError;
 
-// What a source delivers before its end or its failure, whose text is left in `error`.
+// Returns what a source delivers before its end or failure; the failure's text is stored in `error`.
 std::string readUntilError(const P<IAudioSource>& source, std::string& error) {
     std::string got;
     try {
@@ -30,11 +30,11 @@ protected:
     std::filesystem::path named(const std::string& name) {
         return folder / (name + "." + GetParam().extension);
     }
-    // Reads what a plug-in makes of a damaged file; the end must come before more than the file could hold.
+    // Reads a damaged file, which must end before delivering more than it could possibly hold.
     void survive(const std::filesystem::path& path, const std::string& what) {
         SCOPED_TRACE(what);
         P<IAudioSource> source = openSource(path, {});
-        if (!source) source = openSource(path, {48000, 1, 2}); // perhaps another shape now
+        if (!source) source = openSource(path, {48000, 1, 2}); // the damage may have changed the shape
         if (!source) return;
         try {
             const size_t limit = 64 << 20;
@@ -59,10 +59,10 @@ TEST_P(Failure, TruncatedFile_EndsWithWhatIsThere) {
         survive(path, "cut at " + std::to_string(size));
     }
     if (!GetParam().lossless) return;
-    // What lies before the cut is delivered.
+    // The sound before the cut is delivered.
     const auto path = folder.write(named("cut").filename().string(), whole.substr(0, whole.size() / 2));
     P<IAudioSource> source = openSource(path, shape);
-    if (!source) return; // refused as a whole, which is clear too
+    if (!source) return; // refusing the whole file is also acceptable
     std::string error;
     const std::string got = readUntilError(source, error);
     EXPECT_GT(got.size(), pcm.size() / 4);
@@ -79,7 +79,7 @@ TEST_P(Failure, FlippedBytes_NeverCrashOrHang) {
     std::mt19937 random(11);
     for (int i = 0; i < 100; ++i) {
         std::string bad = whole;
-        // Headers are where the harm is done.
+        // Damage to headers has the worst effects.
         const size_t range = i % 2 ? whole.size() : std::min<size_t>(whole.size(), 128);
         const size_t at = random() % range;
         bad[at] = static_cast<char>(bad[at] ^ (1 + random() % 255));
@@ -92,7 +92,8 @@ TEST_P(Failure, FullDisk_IsToldByName) {
     std::filesystem::create_symlink("/dev/full", named("full"));
     P<IAudioFormat> format = makeFormat(named("full"), shape);
     ASSERT_TRUE(format);
-    // Little: told by the end at the latest. Much: told by a write, and nothing else goes wrong behind it.
+    // With few frames close() reports the error at the latest; with many, a write does, and later calls are
+    // safe.
     for (int frames : {100, 3000000}) {
         bool told = false;
         try {
@@ -143,7 +144,7 @@ TEST_P(Failure, UseOutsideItsState_IsRefused) {
 
 INSTANTIATE_TEST_SUITE_P(Formats, Failure, ::testing::ValuesIn(kFormatCases), printName);
 
-// A reader on another thread meets the damage; it is told behind the sound that lies before it.
+// The read-ahead thread meets the damage; it is reported after the sound that precedes it.
 TEST_F(CPluginTest, DamagedFlacFrame_IsAnErrorBehindTheValidPart) {
     const SShape shape;
     const std::string pcm = makeMusic(shape, 200000);
@@ -160,7 +161,7 @@ TEST_F(CPluginTest, DamagedFlacFrame_IsAnErrorBehindTheValidPart) {
     EXPECT_TRUE(pcm.compare(0, got.size(), got) == 0);
     EXPECT_TRUE(source->isEOF());
     EXPECT_FALSE(source->getNextAudioChunk());
-    source->skipToTime(1.0); // the good part can still be had
+    source->skipToTime(1.0); // the intact part can still be read
     const std::string good = readAll(source, 1);
     EXPECT_FALSE(good.empty());
     EXPECT_TRUE(pcm.compare(44100 * 4, good.size(), good) == 0);

@@ -1,4 +1,4 @@
-// The formats that all plug-in tests run over. A new plug-in adds its rows here.
+// The formats that all plug-in tests cover. A new plug-in adds its rows here.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -14,9 +14,9 @@ struct SFormatCase {
     bool lossless;             // what is written comes back bit for bit
     std::vector<int> widths;   // bytes per sample that can be written
     std::vector<int> channels; // that can be written
-    bool exactEstimate;        // the size is known before
-    const char* magic;         // what a file starts with; empty where it varies
-    const char* check;         // a command that judges a file, appended to it; empty: ffmpeg reads it
+    bool exactEstimate;        // the estimated size is exact
+    const char* magic;         // first bytes of a file; empty if they vary
+    const char* check;         // command that validates a file given as last argument; empty: ffmpeg reads it
 };
 
 inline const std::vector<SFormatCase> kFormatCases{
@@ -32,7 +32,7 @@ inline const std::vector<SFormatCase> kFormatCases{
     {"sonora2_l3codec", "mp3", false, {1, 2, 3, 4}, {1, 2}, false, "\xff", ""},
 };
 
-// Names the instances of a test.
+// Names test instances by extension.
 inline std::string printName(const testing::TestParamInfo<SFormatCase>& row) {
     return row.param.extension;
 }

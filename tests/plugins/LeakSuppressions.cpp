@@ -1,7 +1,7 @@
-// What the leak check of the address sanitizer is to pass over.
+// Leaks of libraries that the address sanitizer should ignore.
 #ifdef TONEWRIGHT_SANITIZED
 
-// The Vorbis encoder's tables for six channels lose sight of a block for each file.
+// The Vorbis encoder leaks a block of its six-channel tables for each file.
 extern "C" __attribute__((visibility("default"))) const char* __lsan_default_suppressions() {
     return "leak:vorbis_encode_setup_init";
 }

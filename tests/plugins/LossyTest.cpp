@@ -1,4 +1,4 @@
-// MP3 and Ogg Vorbis beside the programs that know them best.
+// MP3 and Ogg Vorbis compared with their reference programs.
 #include "plugins/PluginFixture.h"
 
 #include "sonora2/context/SonoraError.h"
@@ -9,12 +9,12 @@ namespace tests {
 
 namespace {
 
-// The samples as another program reads them, 16 bit.
+// The samples as decoded by another program, 16 bit.
 std::string decodeByPeer(const std::filesystem::path& path) {
     return run("ffmpeg -v error -i '" + path.string() + "' -f s16le -c:a pcm_s16le -");
 }
 
-// The greatest difference of two samples of 16 bits, where both have one.
+// The greatest difference between two 16-bit signals over their common length.
 int getDistance(const std::string& a, const std::string& b) {
     int distance = 0;
     for (size_t i = 0; i + 1 < std::min(a.size(), b.size()); i += 2) {
@@ -29,7 +29,7 @@ int getDistance(const std::string& a, const std::string& b) {
 struct SSetting {
     const char* name;
     std::function<void(IAudioFormat&)> apply;
-    const char* lame; // the same for the encoder's own program
+    const char* lame; // the same setting for the encoder's own program
 };
 
 const std::vector<SSetting> kMp3Settings{
@@ -87,7 +87,7 @@ TEST_F(Lossy, Mp3Settings_AreThoseOfItsOwnProgram) {
             const std::string theirs = (folder / "theirs.mp3").string();
             run("lame --silent " + std::string(setting.lame) + " '" + (folder / "in.wav").string() + "' '" +
                 theirs + "'");
-            // Only the notes in the first frame may differ, such as the name of the preset.
+            // Only metadata in the first frame may differ, such as the name of the preset.
             const std::string a = readFile(folder / "ours.mp3"), b = readFile(theirs);
             ASSERT_EQ(b.size(), a.size());
             EXPECT_TRUE(a.substr(2000) == b.substr(2000));
@@ -100,8 +100,8 @@ TEST_F(Lossy, Mp3Settings_AreThoseOfItsOwnProgram) {
 
 struct SMp3File {
     const char* name;
-    const char* command; // makes x.mp3 from in.wav; plain.mp3 is what lame makes of it
-    bool exact;          // as long as the recording
+    const char* command; // makes x.mp3 from in.wav or from plain.mp3, lame's encoding of it
+    bool exact;          // has exactly the length of in.wav
 };
 
 TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
@@ -139,7 +139,8 @@ TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
         } else {
             EXPECT_NEAR(theirs.size(), ours.size(), 2 * 1152 * 4);
         }
-        // Behind a gap the first frame lacks what it refers back to, and everybody makes up something else.
+        // The first frame after a gap lacks the bits that it refers back to; decoders conceal this
+        // differently.
         const size_t first = file.name == std::string("zeros between") ? 90000 * 4 : SIZE_MAX;
         EXPECT_LE(getDistance(ours.substr(0, first), theirs), 2);
     }
@@ -168,7 +169,7 @@ TEST_F(Lossy, EverySpeakerOfOgg_StaysInItsPlace) {
     for (int channels = 1; channels <= 8; ++channels) {
         SCOPED_TRACE(channels);
         const SShape shape{44100, channels, 2};
-        // Each channel is loud in a second of its own.
+        // Each channel is audible in a different section.
         const int second = 8820;
         std::string pcm(static_cast<size_t>(second) * channels * shape.frameBytes(), '\0');
         for (int i = 0; i < second * channels; ++i) {
@@ -180,7 +181,7 @@ TEST_F(Lossy, EverySpeakerOfOgg_StaysInItsPlace) {
         const std::string ours = read(path, shape);
         ASSERT_EQ(pcm.size(), ours.size());
         EXPECT_LT(getDistance(pcm, ours), 6000);
-        // The peer orders the speakers of a WAV as we do.
+        // The peer uses the same WAV channel order.
         run("oggdec -Q '" + path.string() + "' -o '" + (folder / "peer.wav").string() + "'");
         const std::string theirs = read(folder / "peer.wav", shape);
         ASSERT_EQ(pcm.size(), theirs.size());
@@ -204,7 +205,7 @@ TEST_F(Lossy, OggSettings_AreThoseOfItsOwnProgram) {
     };
     for (const SSetting& setting : settings) {
         SCOPED_TRACE(setting.name);
-        // At once: the codec makes up what was before the first block from what it is given with it.
+        // Written at once: the codec extrapolates what precedes the first block from the first write.
         P<IAudioFormat> format = makeFormat(folder / "ours.ogg", shape);
         setting.apply(*format);
         format->open();
@@ -229,7 +230,7 @@ TEST_F(Lossy, ChainedOgg_IsOneRun) {
     writeFile(folder / "b.ogg", one.substr(0, 7001 * 4), shape);
     writeFile(folder / "c.ogg", makeMusic(mono, 3000), mono);
     const std::string a = readFile(folder / "a.ogg"), b = readFile(folder / "b.ogg");
-    writeFile(folder / "d.ogg", one, shape); // each stream of a chain has a number of its own
+    writeFile(folder / "d.ogg", one, shape); // each stream of a chain has its own serial number
     const auto path = folder.write("x.ogg", a + b + readFile(folder / "d.ogg"));
     P<IAudioSource> source = openSource(path, shape);
     ASSERT_TRUE(source);

@@ -1,4 +1,4 @@
-// Loaded plug-ins, signals, and runs through sources and formats.
+// Loads the plug-ins; generates signals; reads sources and writes formats.
 #pragma once
 
 #include "plugins/FormatCases.h"
@@ -47,7 +47,7 @@ protected:
         std::set<std::string> names;
         for (const SFormatCase& format : kFormatCases)
             if (names.insert(format.plugin).second) context->addPluginName(format.plugin);
-        context->addPluginName("sonora2_decmpa"); // reads what another one writes
+        context->addPluginName("sonora2_decmpa"); // reads what sonora2_l3codec writes
         handler = peru::make<sonora2::common::CPluginHandler>(context);
     }
 
@@ -63,7 +63,7 @@ protected:
         return peru::make<sonora2::audio::CAudioChunk>(0.0, block);
     }
 
-    // Writes PCM in chunks of changing length.
+    // Writes PCM in chunks of varying length.
     void writeAll(const P<IAudioFormat>& format, const std::string& pcm, const SShape& shape) {
         format->open();
         size_t frames = 1;
@@ -80,7 +80,7 @@ protected:
         writeAll(format, pcm, shape);
     }
 
-    // All that a source has left, its time line checked.
+    // Reads the rest of a source and checks its timestamps.
     static std::string readAll(const P<IAudioSource>& source, size_t limit = SIZE_MAX) {
         std::string pcm;
         const int frameBytes = source->getChannelCount() * source->getBytesPerSample();
@@ -103,10 +103,10 @@ protected:
 
     CTempFolder folder;
     P<sonora2::audio::CSonoraContextAudio> context;
-    P<sonora2::common::CPluginHandler> handler; // outlives every source and format of a test
+    P<sonora2::common::CPluginHandler> handler; // must outlive every source and format of a test
 };
 
-// Sums of slow sines with some noise, full range; every channel differs.
+// A sum of sines with some noise at full range; every channel is different.
 inline std::string makeMusic(const SShape& shape, int frames) {
     std::mt19937 random(static_cast<unsigned>(shape.channels * 10 + shape.bytes));
     std::string pcm;

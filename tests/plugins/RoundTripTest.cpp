@@ -1,4 +1,4 @@
-// What is written comes back, in our own eyes and in those of other programs.
+// Written files are read back by our own decoders and by other programs.
 #include "plugins/PluginFixture.h"
 
 #include "sonora2/context/SonoraError.h"
@@ -11,7 +11,7 @@ namespace {
 
 class RoundTrip : public CPluginTest, public ::testing::WithParamInterface<SFormatCase> {
 protected:
-    static constexpr int kFrames = 30011; // odd, and several chunks
+    static constexpr int kFrames = 30011; // odd and longer than a chunk
 };
 
 class LosslessRoundTrip : public RoundTrip {};
@@ -23,9 +23,9 @@ std::vector<SFormatCase> getLosslessCases() {
     return cases;
 }
 
-// The samples of a file as another program reads them.
+// The samples of a file as decoded by another program.
 std::string readByPeer(const std::filesystem::path& path, int bytes) {
-    if (path.extension() == ".flac") { // of 32 bits too, which others do not know yet
+    if (path.extension() == ".flac") { // also handles 32 bits, unlike ffmpeg
         return run("flac -sdc --force-raw-format --endian=little --sign=" +
                    std::string(bytes == 1 ? "unsigned '" : "signed '") + path.string() + "'");
     }
@@ -56,7 +56,7 @@ TEST_P(LosslessRoundTrip, IsBitExactInEveryShape) {
             EXPECT_DOUBLE_EQ(kFrames / 44100.0, source->getDuration());
             EXPECT_TRUE(readAll(source) == pcm);
             EXPECT_FALSE(source->getNextAudioChunk());
-            // Opened again it starts again.
+            // Reopening starts again at the beginning.
             source->close();
             EXPECT_EQ(channels, source->getChannelCount());
             source->open();
@@ -69,7 +69,7 @@ TEST_P(LosslessRoundTrip, IsBitExactInEveryShape) {
     }
 }
 
-// The host writes under a temporary name; the container is that of the final one.
+// The host writes under a temporary name; the final name decides the container.
 TEST_P(RoundTrip, TemporaryName_DoesNotChangeTheContainer) {
     const std::string extension = GetParam().extension;
     handler->setURISuffix("part");
@@ -78,7 +78,7 @@ TEST_P(RoundTrip, TemporaryName_DoesNotChangeTheContainer) {
     const auto path = folder / ("x.y." + extension + "part");
     writeFile(path, pcm, shape);
     EXPECT_EQ(GetParam().magic, readFile(path).substr(0, std::strlen(GetParam().magic)));
-    // The same with a point between, which the plug-in alone has to understand.
+    // The same with a dot in between, which only the plug-in itself has to handle.
     for (int i = 0; i < handler->getPluginCount(); ++i) {
         if (!handler->getPlugin(i)->getPluginName()->equals(GetParam().plugin)) continue;
         sonora2::common::ISonoraPlugin::SFormatParams params;
@@ -92,7 +92,7 @@ TEST_P(RoundTrip, TemporaryName_DoesNotChangeTheContainer) {
         writeAll(format, pcm, shape);
         if (GetParam().lossless) {
             EXPECT_TRUE(readFile(pointed) == readFile(path));
-        } else { // some files have a number of their own
+        } else { // some files contain a random serial number
             EXPECT_EQ(readFile(path).size(), readFile(pointed).size());
         }
     }
@@ -106,7 +106,7 @@ TEST_P(RoundTrip, StoppedInTheMiddle_LeavesAValidFile) {
             P<IAudioFormat> format = makeFormat(path, shape);
             format->open();
             if (!pcm.empty()) format->writeAudioChunk(makeChunk(pcm));
-            // Released without a word, as an encoder does when an exception goes through it.
+            // Released without close(), as happens when an exception leaves the encoder.
         }
         if (*GetParam().check) run(std::string(GetParam().check) + " '" + path.string() + "'");
         P<IAudioSource> source = openSource(path, shape);
@@ -121,9 +121,9 @@ INSTANTIATE_TEST_SUITE_P(Formats, LosslessRoundTrip, ::testing::ValuesIn(getLoss
 
 struct SPeerFile {
     const char* name;
-    const char* command; // makes the file from 24 bit stereo in.wav
-    int bytes;           // as it is to be delivered
-    bool exact;          // the same samples as ffmpeg's own reading
+    const char* command; // makes the file from in.wav, 24 bit stereo
+    int bytes;           // bytes per sample to expect
+    bool exact;          // the samples equal those decoded by ffmpeg
 };
 
 class PeerFile : public CPluginTest, public ::testing::WithParamInterface<SPeerFile> {};
@@ -155,7 +155,7 @@ INSTANTIATE_TEST_SUITE_P(
         SPeerFile{"j.w64", "sox in.wav -b 16 -D j.w64", 2, true},
         SPeerFile{"k.snd", "ffmpeg -v error -i in.wav -f au -c:a pcm_s16be k.snd", 2, true},
         SPeerFile{"l.flac", "flac -s8 in.wav -o l.flac", 3, true},
-        // Written into a pipe: neither length nor checksum in the header.
+        // Written to a pipe: the header has neither length nor checksum.
         SPeerFile{"n.flac", "flac -sc in.wav | cat > n.flac", 3, true},
         SPeerFile{"tagged.flac",
                   "flac -s in.wav -o tagged.flac && head -c 300 /dev/zero | tr '\\0' T >> tagged.flac", 3,
@@ -182,7 +182,7 @@ TEST_F(CPluginTest, FlacSettings_AreThoseOfItsOwnEncoder) {
             const std::string copy = file + ".bare.flac";
             std::filesystem::copy_file(file, copy, std::filesystem::copy_options::overwrite_existing);
             run("metaflac --remove-all --dont-use-padding '" + copy + "'");
-            // What is left before the frames: marker, stream information, and at most a text of the maker.
+            // Only the marker, stream information and possibly a vendor string remain before the frames.
             return readFile(copy);
         };
         EXPECT_TRUE(frames(ours.string()) == frames(theirs)) << "level " << level;

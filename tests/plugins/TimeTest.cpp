@@ -20,7 +20,7 @@ protected:
 
 TEST_P(Time, RandomSkips_EqualTheUnskippedRun) {
     const auto path = writeMusic({});
-    // The file's own shape, and conversions with a short and a long period of the filter.
+    // The file's own shape, and conversions with short and long filter periods.
     for (const SShape& shape : {SShape{}, SShape{48000, 1, 2}, SShape{22051, 2, 1}, SShape{96000, 6, 2}}) {
         SCOPED_TRACE(std::to_string(shape.rate));
         P<IAudioSource> source = openSource(path, shape);
@@ -69,13 +69,13 @@ TEST_P(Time, StartTime_MovesTheBeginning) {
     EXPECT_THROW(source->setStartTime(-1.0), sonora2::common::CSonoraError);
 }
 
-// A click stays at its time, whatever the rates; the length is that of the file.
+// A click keeps its time at any rate, and the length is that of the file.
 TEST_P(Time, Conversion_KeepsAClickInPlace) {
     for (int rate : {48000, 22050, 44100, 96000, 32000}) {
         SCOPED_TRACE(rate);
         std::string pcm(kFrames * 4, '\0');
         const int at = 60000;
-        for (int i = -2; i <= 2; ++i) { // as wide as it has to be for the lowest rate
+        for (int i = -2; i <= 2; ++i) { // wide enough for the lowest rate
             const int16_t height = static_cast<int16_t>(24000 * (3 - std::abs(i)) / 3);
             for (int channel = 0; channel < 2; ++channel)
                 std::memcpy(&pcm[((at + i) * 2 + channel) * 2], &height, 2);
@@ -92,7 +92,8 @@ TEST_P(Time, Conversion_KeepsAClickInPlace) {
         for (size_t i = 0; i < converted.size() / 2; ++i) {
             int16_t value;
             std::memcpy(&value, &converted[i * 2], 2);
-            const double energy = static_cast<double>(value) * value; // beside it, a codec's noise is nothing
+            const double energy =
+                static_cast<double>(value) * value; // squaring makes a codec's noise negligible
             weight += energy;
             moment += energy * static_cast<double>(i);
         }
@@ -109,7 +110,7 @@ TEST_P(Time, ShapesThatCannotBeHad_AreDeclined) {
     EXPECT_FALSE(openSource(missing, {}));
 }
 
-// The thread that reads ahead is stopped at any moment.
+// The read-ahead thread can be stopped at any moment.
 TEST_P(Time, ClosingWhileReadingAhead_StartsAnew) {
     const SShape shape;
     P<IAudioSource> source = openSource(writeMusic(shape), shape);
