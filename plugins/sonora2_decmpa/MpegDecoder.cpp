@@ -1,5 +1,6 @@
 #include "sonora2_decmpa/MpegDecoder.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <sys/stat.h>
 #include <utility>
@@ -61,7 +62,7 @@ SDecodedMedia CMpegDecoder::open() {
              MPG123_OK)
         failWith("could not open");
     seek(0);
-    return {m_format, m_scan.frames};
+    return {m_format, m_scan.frames, getCodecName()};
 }
 
 void CMpegDecoder::close() {
@@ -79,6 +80,12 @@ SPcmFormat CMpegDecoder::readFormat() {
     mpg123_format_none(handle);
     if (mpg123_format(handle, rate, channels, MPG123_ENC_SIGNED_16) != MPG123_OK) failWith("could not open");
     return {static_cast<int>(rate), channels, kBytesPerSample};
+}
+
+std::string CMpegDecoder::getCodecName() {
+    mpg123_frameinfo info{};
+    if (mpg123_info(m_handle.get(), &info) != MPG123_OK) return {};
+    return "MPEG audio layer " + std::string(static_cast<size_t>(std::clamp(info.layer, 1, 3)), 'I');
 }
 
 CMpegDecoder::SIdentity CMpegDecoder::identify() const {

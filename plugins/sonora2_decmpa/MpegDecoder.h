@@ -43,6 +43,7 @@ private:
     };
 
     SPcmFormat readFormat();
+    std::string getCodecName();
     SIdentity identify() const;
     void scan();
     [[noreturn]] void failWith(const char* doing);

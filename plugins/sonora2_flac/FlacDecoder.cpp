@@ -31,7 +31,7 @@ SDecodedMedia CFlacDecoder::open() {
         }
         m_total = m_scanned;
     }
-    return {m_format, m_total};
+    return {m_format, m_total, "FLAC"};
 }
 
 void CFlacDecoder::close() {

@@ -50,7 +50,7 @@ SDecodedMedia CVorbisDecoder::open() {
         if (other->rate != m_format.rate || other->channels != m_format.channels)
             fail("could not open %s: it is a chain of streams in different formats", m_file.getDisplayName());
     }
-    return {m_format, frames};
+    return {m_format, frames, "Vorbis"};
 }
 
 void CVorbisDecoder::close() {

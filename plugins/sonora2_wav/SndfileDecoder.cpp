@@ -26,6 +26,51 @@ bool isOwnContainer(int format) {
     }
 }
 
+const char* getCodecName(int sampleFormat) {
+    switch (sampleFormat) {
+    case SF_FORMAT_PCM_U8:
+        return "PCM unsigned 8 bit";
+    case SF_FORMAT_PCM_S8:
+        return "PCM signed 8 bit";
+    case SF_FORMAT_PCM_16:
+        return "PCM signed 16 bit";
+    case SF_FORMAT_PCM_24:
+        return "PCM signed 24 bit";
+    case SF_FORMAT_PCM_32:
+        return "PCM signed 32 bit";
+    case SF_FORMAT_FLOAT:
+        return "PCM float 32 bit";
+    case SF_FORMAT_DOUBLE:
+        return "PCM float 64 bit";
+    case SF_FORMAT_ULAW:
+        return "\u00b5-law";
+    case SF_FORMAT_ALAW:
+        return "A-law";
+    case SF_FORMAT_IMA_ADPCM:
+        return "IMA ADPCM";
+    case SF_FORMAT_MS_ADPCM:
+        return "Microsoft ADPCM";
+    case SF_FORMAT_GSM610:
+        return "GSM 06.10";
+    case SF_FORMAT_G721_32:
+        return "G.721 ADPCM";
+    case SF_FORMAT_G723_24:
+    case SF_FORMAT_G723_40:
+        return "G.723 ADPCM";
+    case SF_FORMAT_DWVW_12:
+    case SF_FORMAT_DWVW_16:
+    case SF_FORMAT_DWVW_24:
+        return "DWVW";
+    case SF_FORMAT_ALAC_16:
+    case SF_FORMAT_ALAC_20:
+    case SF_FORMAT_ALAC_24:
+    case SF_FORMAT_ALAC_32:
+        return "ALAC";
+    default:
+        return "";
+    }
+}
+
 int32_t quantise(double sample) {
     const double value = sample * 2147483648.0;
     if (!(value > -2147483648.0)) return value == value ? INT32_MIN : 0;
@@ -59,7 +104,7 @@ SDecodedMedia CSndfileDecoder::open() {
         if (!error)
             frames = std::min(frames, static_cast<int64_t>(size) / (width * std::max(info.channels, 1)));
     }
-    return {m_format, std::max<int64_t>(frames, 0)};
+    return {m_format, std::max<int64_t>(frames, 0), getCodecName(info.format & SF_FORMAT_SUBMASK)};
 }
 
 void CSndfileDecoder::chooseTransfer(int sampleFormat) {

@@ -41,12 +41,20 @@ CChunkProducer::CChunkProducer(const P<common::ISonoraContext>& context, IDecode
     }
 }
 
-bool CChunkProducer::canDeliver(const SPcmFormat& own, const SPcmFormat& wanted) {
-    if (own == wanted) return true;
+void CChunkProducer::requireDeliverable(const SMediaFile& file, const SPcmFormat& own,
+                                        const SPcmFormat& wanted) {
+    if (own == wanted) return;
     const auto [low, high] = std::minmax(own.rate, wanted.rate);
-    if (high / low >= kMaxRatio || high > kMaxRate) return false;
-    return (wanted.bytesPerSample == 1 || wanted.bytesPerSample == 2) &&
-           samplerateconverter::CSampleRateConverter::canConvert(own.channels, wanted.channels);
+    if (!samplerateconverter::CSampleRateConverter::canConvert(own.channels, wanted.channels))
+        fail("%s has %d channels, which cannot be mixed to %d", file.getDisplayName(), own.channels,
+             wanted.channels);
+    if (high / low >= kMaxRatio || high > kMaxRate)
+        fail("%s has a sample rate of %d Hz, which cannot be converted to %d Hz", file.getDisplayName(),
+             own.rate, wanted.rate);
+    if (wanted.bytesPerSample > 2)
+        fail("%s has %d channels at %d Hz in %d bits, which can only be converted to 8 or 16 bits, not %d",
+             file.getDisplayName(), own.channels, own.rate, own.bytesPerSample * 8,
+             wanted.bytesPerSample * 8);
 }
 
 int64_t CChunkProducer::countDelivered(const SDecodedMedia& media, const SPcmFormat& wanted) {

@@ -16,8 +16,8 @@ public:
     CChunkProducer(const P<common::ISonoraContext>& context, IDecoder& decoder, const SDecodedMedia& media,
                    const SPcmFormat& wanted);
 
-    // Whether the sample rate converter supports this pair of formats. Equal formats need no conversion.
-    static bool canDeliver(const SPcmFormat& own, const SPcmFormat& wanted);
+    // Throws if the sample rate converter does not support this pair of formats. Equal formats need none.
+    static void requireDeliverable(const SMediaFile& file, const SPcmFormat& own, const SPcmFormat& wanted);
     static int64_t countDelivered(const SDecodedMedia& media, const SPcmFormat& wanted);
 
     void seek(int64_t frame);

@@ -8,7 +8,7 @@ namespace sonora2::plugins {
 struct SDecodedMedia {
     SPcmFormat format;
     int64_t frames = 0;     // exact: what reading an intact file to its end delivers
-    std::string codec = {}; // such as "FLAC" or "PCM signed 24 bit", for people; empty when unknown
+    std::string codec = {}; // to show to users, such as "FLAC" or "PCM signed 24 bit"; empty when unknown
 };
 
 // Decodes one file to PCM. CDecoderSource adds state checks, conversion, read-ahead and time.

@@ -35,26 +35,15 @@ CDecoderSource::~CDecoderSource() {
     m_producer.reset();
 }
 
-bool CDecoderSource::probe() {
-    const bool deliverable = openDecoder();
-    m_decoder->close();
-    return deliverable;
-}
-
 void CDecoderSource::open() {
     if (isOpened()) return;
-    if (!openDecoder()) {
-        m_decoder->close();
-        const SPcmFormat& own = m_media.format;
-        fail("%s has %d channels of %d bytes, which cannot be converted to %d channels of %d bytes",
-             m_file.getDisplayName(), own.channels, own.bytesPerSample, m_delivered.channels,
-             m_delivered.bytesPerSample);
-    }
     try {
+        openDecoder();
         m_producer = std::make_unique<CChunkProducer>(m_context, *m_decoder, m_media, m_delivered);
         restartAt(toFrame(m_startTime));
     } catch (...) {
-        close();
+        m_producer.reset();
+        m_decoder->close(); // also after an open() that threw
         throw;
     }
 }
@@ -129,25 +118,18 @@ P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {
     return chunk;
 }
 
-bool CDecoderSource::openDecoder() {
-    try {
-        m_media = m_decoder->open();
-    } catch (...) {
-        m_decoder->close(); // open() may have acquired resources
-        throw;
-    }
+void CDecoderSource::openDecoder() {
+    m_media = m_decoder->open();
     const SPcmFormat& own = m_media.format;
     const bool sound = own.rate > 0 && own.channels > 0 && own.bytesPerSample >= 1 &&
                        own.bytesPerSample <= 4 && m_media.frames >= 0;
-    if (!sound) {
-        m_decoder->close();
+    if (!sound)
         fail("%s: %d channels at %d Hz are no sound", m_file.getDisplayName(), own.channels, own.rate);
-    }
     const auto choose = [](int wanted, int ownValue) { return wanted > 0 ? wanted : ownValue; };
     m_delivered = {choose(m_wanted.rate, own.rate), choose(m_wanted.channels, own.channels),
                    choose(m_wanted.bytesPerSample, own.bytesPerSample)};
     m_total = CChunkProducer::countDelivered(m_media, m_delivered);
-    return CChunkProducer::canDeliver(own, m_delivered);
+    CChunkProducer::requireDeliverable(m_file, own, m_delivered);
 }
 
 void CDecoderSource::requireOpened() const {

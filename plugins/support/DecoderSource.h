@@ -18,12 +18,9 @@ public:
                    const SMediaFile& file, std::unique_ptr<IDecoder> decoder, const SPcmFormat& wanted);
     ~CDecoderSource() override;
 
-    // Opens the file to learn its format and returns false if it cannot be converted to the wanted one.
-    // Throws if the file cannot be opened. Leaves the source closed.
-    bool probe();
-
     bool isOpened() override { return m_producer != nullptr; }
-    void open() override; // no effect on an open source
+    // No effect on an open source. Throws if the file cannot be read or its format cannot be converted.
+    void open() override;
     void close() override;
     void skipToTime(double fTimestamp) override;
     double getDuration() override; // exact
@@ -49,7 +46,7 @@ public:
     int getOwnBytesPerSample() override { return m_media.format.bytesPerSample; }
 
 private:
-    bool openDecoder(); // false if its format cannot be converted to the wanted one
+    void openDecoder();
     void requireOpened() const;
     int64_t toFrame(double seconds) const;
     void restartAt(int64_t frame); // in delivered frames from the beginning of the file

@@ -31,8 +31,8 @@ P<common::IPluginExtensions> CPluginBase::getValidExtensions(int nTypes) {
     return extensions;
 }
 
-P<common::ISource> CPluginBase::tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool,
-                                                const SSourceParams* pParams) {
+P<common::ISource> CPluginBase::tryCreateSource(const P<peru::IURI>& uri, int nTypes,
+                                                bool bDontCloseAfterTesting, const SSourceParams* pParams) {
     if (!(nTypes & common::kAudioSource) || !uri) return nullptr;
     const SMediaFile file(uri);
     if (!serves(file)) return nullptr;
@@ -41,7 +41,9 @@ P<common::ISource> CPluginBase::tryCreateSource(const P<peru::IURI>& uri, int nT
     const SSourceParams params = common::receiveRecord(pParams);
     const SPcmFormat wanted{params.nSampleRate, params.nChannelCount, params.nBytesPerSample};
     auto source = peru::make<CDecoderSource>(m_context, m_name, file, std::move(decoder), wanted);
-    if (pParams && !source->probe()) return nullptr;
+    if (!pParams) return source;
+    source->open();
+    if (!bDontCloseAfterTesting) source->close();
     return source;
 }
 

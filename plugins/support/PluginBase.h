@@ -32,8 +32,8 @@ public:
     P<peru::IString> getPluginName() override { return m_name; }
     int getValidTypes() override;
     P<common::IPluginExtensions> getValidExtensions(int nTypes) override;
-    // Returns a closed source. If parameters are given, the file is opened once to check whether they can be
-    // met, and exceptions from opening it are passed on.
+    // If parameters are given, the source is opened to check whether they can be met, and stays open if
+    // bDontCloseAfterTesting is set. Throws the reason if the file cannot be read in the requested format.
     P<common::ISource> tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
                                        const SSourceParams* pParams) override;
     P<common::IFormat> tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,

@@ -133,6 +133,8 @@ TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
         run(cd + file.command);
         const SShape delivered{file.name == std::string("low rate") ? 22050 : 44100, 2, 2};
         const std::string ours = read(folder / "x.mp3", delivered);
+        const std::string layer = file.name == std::string("layer II") ? "II" : "III";
+        EXPECT_EQ("MPEG audio layer " + layer, codecOf(openSource(folder / "x.mp3", delivered)));
         const std::string theirs = decodeByPeer(folder / "x.mp3");
         if (file.exact) {
             EXPECT_EQ(pcm.size(), ours.size());

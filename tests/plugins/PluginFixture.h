@@ -1,9 +1,11 @@
 // Loads the plug-ins; generates signals; reads sources and writes formats.
 #pragma once
 
+#include "peru/IInterfaceQuery.h"
 #include "plugins/FormatCases.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/media/AudioChunk.h"
+#include "sonora2/media/IMediaDescription.h"
 #include "sonora2/plugins/PluginHandler.h"
 #include "support/Files.h"
 #include "support/TempFolder.h"
@@ -16,6 +18,8 @@
 #include <set>
 #include <stdexcept>
 #include <string>
+#include <sys/inotify.h>
+#include <unistd.h>
 
 namespace tests {
 
@@ -40,6 +44,25 @@ inline std::string run(const std::string& command) {
     return out;
 }
 
+// Counts how often a file is opened.
+class COpenCounter {
+public:
+    explicit COpenCounter(const std::filesystem::path& path) : m_queue(inotify_init1(IN_NONBLOCK)) {
+        // Equal events in a row would be merged; a close in between keeps them apart.
+        inotify_add_watch(m_queue, path.c_str(), IN_OPEN | IN_CLOSE);
+    }
+    ~COpenCounter() { ::close(m_queue); }
+    int count() {                 // since the last call
+        inotify_event events[64]; // without names, as of a single file
+        const ssize_t got = std::max<ssize_t>(::read(m_queue, events, sizeof(events)), 0);
+        return static_cast<int>(std::count_if(events, events + got / sizeof(*events),
+                                              [](const auto& event) { return event.mask & IN_OPEN; }));
+    }
+
+private:
+    int m_queue;
+};
+
 class CPluginTest : public ::testing::Test {
 protected:
     CPluginTest() : context(peru::make<sonora2::audio::CSonoraContextAudio>()) {
@@ -56,6 +79,9 @@ protected:
     }
     P<IAudioFormat> makeFormat(const std::filesystem::path& path, const SShape& shape) {
         return handler->createAudioFormat(toURI(path), shape.rate, shape.channels, shape.bytes);
+    }
+    static std::string codecOf(const P<IAudioSource>& source) {
+        return text(peru::interfaceCast<sonora2::common::IMediaDescription>(source)->getCodecName());
     }
     P<sonora2::audio::IAudioChunk> makeChunk(const std::string& pcm) {
         P<peru::IMemoryBlock> block = context->getMemoryManager()->getBlock(pcm.size());

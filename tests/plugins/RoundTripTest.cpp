@@ -124,6 +124,7 @@ struct SPeerFile {
     const char* command; // makes the file from in.wav, 24 bit stereo
     int bytes;           // bytes per sample to expect
     bool exact;          // the samples equal those decoded by ffmpeg
+    const char* codec = "PCM signed 16 bit";
 };
 
 class PeerFile : public CPluginTest, public ::testing::WithParamInterface<SPeerFile> {};
@@ -137,6 +138,7 @@ TEST_P(PeerFile, IsReadAsItsOwnProgramReadsIt) {
     ASSERT_TRUE(source);
     const std::string pcm = readAll(source);
     ASSERT_EQ(20011u * 2 * file.bytes, pcm.size());
+    EXPECT_EQ(file.codec, codecOf(source));
     if (file.exact) {
         EXPECT_TRUE(pcm == readByPeer(folder / file.name, file.bytes));
     }
@@ -145,21 +147,21 @@ TEST_P(PeerFile, IsReadAsItsOwnProgramReadsIt) {
 INSTANTIATE_TEST_SUITE_P(
     Files, PeerFile,
     ::testing::Values(
-        SPeerFile{"a.wav", "ffmpeg -v error -i in.wav -c:a pcm_u8 a.wav", 1, true},
-        SPeerFile{"c.wav", "ffmpeg -v error -i in.wav -c:a pcm_f32le c.wav", 4, true},
-        SPeerFile{"d.wav", "ffmpeg -v error -i in.wav -c:a pcm_f64le d.wav", 4, true},
+        SPeerFile{"a.wav", "ffmpeg -v error -i in.wav -c:a pcm_u8 a.wav", 1, true, "PCM unsigned 8 bit"},
+        SPeerFile{"c.wav", "ffmpeg -v error -i in.wav -c:a pcm_f32le c.wav", 4, true, "PCM float 32 bit"},
+        SPeerFile{"d.wav", "ffmpeg -v error -i in.wav -c:a pcm_f64le d.wav", 4, true, "PCM float 64 bit"},
         SPeerFile{"f.wav", "ffmpeg -v error -i in.wav -c:a pcm_s16le -rf64 always f.wav", 2, true},
         SPeerFile{"stream.wav", "ffmpeg -v error -i in.wav -f wav -c:a pcm_s16le - > stream.wav", 2, true},
-        SPeerFile{"g.aiff", "sox in.wav -b 8 -D g.aiff", 1, true},
-        SPeerFile{"i.caf", "ffmpeg -v error -i in.wav -c:a pcm_s24be i.caf", 3, true},
+        SPeerFile{"g.aiff", "sox in.wav -b 8 -D g.aiff", 1, true, "PCM signed 8 bit"},
+        SPeerFile{"i.caf", "ffmpeg -v error -i in.wav -c:a pcm_s24be i.caf", 3, true, "PCM signed 24 bit"},
         SPeerFile{"j.w64", "sox in.wav -b 16 -D j.w64", 2, true},
         SPeerFile{"k.snd", "ffmpeg -v error -i in.wav -f au -c:a pcm_s16be k.snd", 2, true},
-        SPeerFile{"l.flac", "flac -s8 in.wav -o l.flac", 3, true},
+        SPeerFile{"l.flac", "flac -s8 in.wav -o l.flac", 3, true, "FLAC"},
         // Written to a pipe: the header has neither length nor checksum.
-        SPeerFile{"n.flac", "flac -sc in.wav | cat > n.flac", 3, true},
+        SPeerFile{"n.flac", "flac -sc in.wav | cat > n.flac", 3, true, "FLAC"},
         SPeerFile{"tagged.flac",
                   "flac -s in.wav -o tagged.flac && head -c 300 /dev/zero | tr '\\0' T >> tagged.flac", 3,
-                  false}),
+                  false, "FLAC"}),
     [](const auto& row) {
         std::string name = row.param.name;
         std::ranges::replace(name, '.', '_');

@@ -110,6 +110,17 @@ TEST_P(Time, ShapesThatCannotBeHad_AreDeclined) {
     EXPECT_FALSE(openSource(missing, {}));
 }
 
+TEST_P(Time, AcceptedFile_IsOpenedOnce) {
+    const auto path = writeMusic({});
+    COpenCounter counter(path);
+    P<IAudioSource> source = openSource(path, {});
+    EXPECT_TRUE(source->isOpened());
+    EXPECT_EQ(kFrames * 4u, readAll(source).size());
+    EXPECT_EQ(1, counter.count());
+    EXPECT_FALSE(handler->createAudioSource(toURI(path), 44100, 2, 2, false)->isOpened());
+    EXPECT_EQ(1, counter.count());
+}
+
 // The read-ahead thread can be stopped at any moment.
 TEST_P(Time, ClosingWhileReadingAhead_StartsAnew) {
     const SShape shape;
