@@ -36,7 +36,7 @@ off_t seekInput(void* input, off_t offset, int whence) {
 
 } // namespace
 
-SDecodedMedia CMpegDecoder::open() {
+SDecodedMedia CMpegDecoder::open(const SDecoderOptions&) {
     close();
     m_input = openForReading(m_file);
     m_buffer.resize(kInputBufferBytes); // the C library's default buffer is small

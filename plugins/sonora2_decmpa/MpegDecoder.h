@@ -15,7 +15,7 @@ class CMpegDecoder : public IDecoder {
 public:
     explicit CMpegDecoder(const SMediaFile& file) : m_file(file) {}
 
-    SDecodedMedia open() override;
+    SDecodedMedia open(const SDecoderOptions& options) override;
     void close() override;
     int read(uint8_t* pcm, int frames) override;
     void seek(int64_t frame) override;

@@ -11,7 +11,7 @@ namespace sonora2::plugins::flac {
 
 CFlacDecoder::CFlacDecoder(const SMediaFile& file) : m_file(file) {}
 
-SDecodedMedia CFlacDecoder::open() {
+SDecodedMedia CFlacDecoder::open(const SDecoderOptions&) {
     close();
     InputFile input = openForReading(m_file);
     m_decoder.reset(FLAC__stream_decoder_new());

@@ -17,7 +17,7 @@ public:
     explicit CFlacDecoder(const SMediaFile& file);
 
     // If the header does not state the length, the file is scanned once in the decoder's lifetime.
-    SDecodedMedia open() override;
+    SDecodedMedia open(const SDecoderOptions& options) override;
     void close() override;
     int read(uint8_t* pcm, int frames) override;
     void seek(int64_t frame) override;

@@ -29,7 +29,7 @@ const char* describe(long error) {
 
 } // namespace
 
-SDecodedMedia CVorbisDecoder::open() {
+SDecodedMedia CVorbisDecoder::open(const SDecoderOptions&) {
     close();
     InputFile file = openForReading(m_file);
     if (const int error = ov_open_callbacks(file.get(), &m_stream, nullptr, 0, OV_CALLBACKS_DEFAULT);

@@ -13,7 +13,7 @@ public:
     explicit CVorbisDecoder(const SMediaFile& file) : m_file(file) {}
     ~CVorbisDecoder() override { close(); }
 
-    SDecodedMedia open() override;
+    SDecodedMedia open(const SDecoderOptions& options) override;
     void close() override;
     int read(uint8_t* pcm, int frames) override;
     void seek(int64_t frame) override;

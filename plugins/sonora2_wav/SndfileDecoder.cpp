@@ -5,7 +5,8 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
-#include <filesystem>
+#include <string>
+#include <sys/stat.h>
 
 namespace sonora2::plugins::wav {
 
@@ -71,6 +72,51 @@ const char* getCodecName(int sampleFormat) {
     }
 }
 
+// 0 for compressed samples.
+int getLinearBytes(int sampleFormat) {
+    switch (sampleFormat) {
+    case SF_FORMAT_PCM_U8:
+    case SF_FORMAT_PCM_S8:
+        return 1;
+    case SF_FORMAT_PCM_16:
+        return 2;
+    case SF_FORMAT_PCM_24:
+        return 3;
+    case SF_FORMAT_PCM_32:
+    case SF_FORMAT_FLOAT:
+        return 4;
+    case SF_FORMAT_DOUBLE:
+        return 8;
+    default:
+        return 0;
+    }
+}
+
+struct SChunk {
+    std::string id;
+    int64_t size = -1; // -1 when there are no 8 bytes left
+};
+
+SChunk readChunk(std::FILE* file, int64_t at, bool bigEndian) {
+    std::array<uint8_t, 8> bytes{};
+    if (::fseeko(file, at, SEEK_SET) != 0 || std::fread(bytes.data(), 1, bytes.size(), file) != bytes.size())
+        return {};
+    uint32_t size = 0;
+    for (size_t i = 0; i < 4; ++i) size |= uint32_t{bytes[4 + i]} << (bigEndian ? 24 - 8 * i : 8 * i);
+    return {std::string(bytes.begin(), bytes.begin() + 4), size};
+}
+
+// Whether the rest of the file consists of whole chunks.
+bool isChunkList(std::FILE* file, int64_t at, int64_t end, bool bigEndian) {
+    while (at < end) {
+        const SChunk chunk = readChunk(file, at, bigEndian);
+        const auto isPrintable = [](char c) { return c >= ' ' && c <= '~'; };
+        if (chunk.size < 0 || !std::ranges::all_of(chunk.id, isPrintable)) return false;
+        at += 8 + chunk.size + chunk.size % 2;
+    }
+    return at <= end + 1; // the last padding byte may be missing
+}
+
 int32_t quantise(double sample) {
     const double value = sample * 2147483648.0;
     if (!(value > -2147483648.0)) return value == value ? INT32_MIN : 0;
@@ -81,11 +127,13 @@ int32_t quantise(double sample) {
 
 CSndfileDecoder::CSndfileDecoder(const SMediaFile& file) : m_file(file) {}
 
-SDecodedMedia CSndfileDecoder::open() {
+SDecodedMedia CSndfileDecoder::open(const SDecoderOptions& options) {
     close();
+    m_options = options;
     m_input = openForReading(m_file);
+    m_patch = findMissingSize(m_input.get());
     SF_INFO info{};
-    m_handle.reset(sf_open_fd(fileno(m_input.get()), SFM_READ, &info, SF_FALSE));
+    m_handle.reset(openHandle(info));
     if (!m_handle)
         fail("could not read %s: %s", m_file.getDisplayName(), peru::CString::fromUTF8(sf_strerror(nullptr)));
     if (!isOwnContainer(info.format)) {
@@ -95,16 +143,12 @@ SDecodedMedia CSndfileDecoder::open() {
     m_format = {info.samplerate, info.channels, 0};
     chooseTransfer(info.format & SF_FORMAT_SUBMASK);
 
-    int64_t frames = info.frames;
-    if (m_transfer != ETransfer::shorts) {
-        // A file cannot hold more linear samples than its size allows.
-        std::error_code error;
-        const uintmax_t size = std::filesystem::file_size(m_file.path, error);
-        const int64_t width = m_transfer == ETransfer::doubles ? 8 : m_format.bytesPerSample;
-        if (!error)
-            frames = std::min(frames, static_cast<int64_t>(size) / (width * std::max(info.channels, 1)));
-    }
-    return {m_format, std::max<int64_t>(frames, 0), getCodecName(info.format & SF_FORMAT_SUBMASK)};
+    // A file cannot hold more linear samples than its size allows.
+    const int sampleFormat = info.format & SF_FORMAT_SUBMASK;
+    const int64_t frameBytes = getLinearBytes(sampleFormat) * std::max<int64_t>(info.channels, 1);
+    m_frames = std::max<int64_t>(info.frames, 0);
+    if (frameBytes > 0) m_frames = std::min(m_frames, getLength(this) / frameBytes);
+    return {m_format, m_frames, getCodecName(sampleFormat)};
 }
 
 void CSndfileDecoder::chooseTransfer(int sampleFormat) {
@@ -139,8 +183,10 @@ void CSndfileDecoder::chooseTransfer(int sampleFormat) {
 }
 
 void CSndfileDecoder::close() {
+    reportClipping();
     m_handle.reset();
     m_input.reset();
+    m_position = m_checked = 0;
 }
 
 int CSndfileDecoder::read(uint8_t* pcm, int frames) {
@@ -148,6 +194,7 @@ int CSndfileDecoder::read(uint8_t* pcm, int frames) {
     const size_t samples = static_cast<size_t>(frames) * m_format.channels;
     const auto countSamples = [&](sf_count_t got) { return static_cast<size_t>(got) * m_format.channels; };
     sf_count_t got = 0;
+    frames = static_cast<int>(std::min<int64_t>(frames, m_frames - m_position));
     switch (m_transfer) {
     case ETransfer::raw:
     case ETransfer::rawSigned8: {
@@ -173,11 +220,13 @@ int CSndfileDecoder::read(uint8_t* pcm, int frames) {
     case ETransfer::floats:
         m_floats.resize(samples);
         got = sf_readf_float(handle, m_floats.data(), frames);
+        checkClipping(m_floats.data(), got);
         pcm::packFloat(m_floats.data(), pcm, 4, countSamples(got));
         break;
     case ETransfer::doubles: {
         m_doubles.resize(samples);
         got = sf_readf_double(handle, m_doubles.data(), frames);
+        checkClipping(m_doubles.data(), got);
         const size_t count = countSamples(got);
         for (size_t i = 0; i < count; ++i) {
             const int32_t value = quantise(m_doubles[i]);
@@ -186,13 +235,114 @@ int CSndfileDecoder::read(uint8_t* pcm, int frames) {
         break;
     }
     }
-    return static_cast<int>(std::max<sf_count_t>(got, 0));
+    got = std::max<sf_count_t>(got, 0);
+    m_position += got;
+    if (m_position >= m_frames) reportClipping();
+    return static_cast<int>(got);
 }
 
 void CSndfileDecoder::seek(int64_t frame) {
     if (sf_seek(m_handle.get(), frame, SEEK_SET) != frame)
         fail("could not find frame %d of %s: %s", frame, m_file.getDisplayName(),
              peru::CString::fromUTF8(sf_strerror(m_handle.get())));
+    m_position = frame;
+}
+
+template <class Sample> void CSndfileDecoder::checkClipping(const Sample* samples, sf_count_t frames) {
+    const int64_t known = std::clamp<int64_t>(m_checked - m_position, 0, std::max<int64_t>(frames, 0));
+    Sample peak = 0;
+    int64_t clipped = 0;
+    for (int64_t i = known * m_format.channels; i < frames * m_format.channels; ++i) {
+        const Sample level = std::fabs(samples[i]);
+        if (!(level > Sample{1})) continue; // NaN is converted to 0
+        ++clipped;
+        peak = std::max(peak, level);
+    }
+    m_clipped += clipped;
+    m_peak = std::max<double>(m_peak, peak);
+    m_checked = std::max(m_checked, m_position + frames);
+}
+
+void CSndfileDecoder::reportClipping() {
+    if (m_clipped == 0) return;
+    m_options.warn("%s: clipped %d samples, peak +%.1f dB", m_file.getDisplayName(), m_clipped,
+                   20.0 * std::log10(m_peak));
+    m_clipped = 0;
+    m_peak = 0.0;
+}
+
+SNDFILE* CSndfileDecoder::openHandle(SF_INFO& info) {
+    if (m_patch.size > 0)
+        m_options.warn("%s was not completed by its writer and is read to its end", m_file.getDisplayName());
+    SF_VIRTUAL_IO io{getLength, seekInput, readInput, writeNothing, tellInput};
+    return sf_open_virtual(&io, SFM_READ, &info, this);
+}
+
+// A size of 0 is correct if the data chunk is followed by nothing or by other chunks.
+CSndfileDecoder::SPatch CSndfileDecoder::findMissingSize(std::FILE* file) {
+    std::array<char, 12> start{};
+    const size_t got = std::fread(start.data(), 1, start.size(), file);
+    const std::string form(start.data(), 4);
+    SPatch patch;
+    if (got == start.size() && (form == "RIFF" || form == "RIFX" || form == "RF64") &&
+        std::string(&start[8], 4) == "WAVE") {
+        const bool bigEndian = form == "RIFX";
+        const int64_t end = ::fseeko(file, 0, SEEK_END) == 0 ? ::ftello(file) : 0;
+        int64_t largeSize = 0; // offset of the size that is used in place of the data chunk's own
+        int64_t at = start.size();
+        SChunk chunk = readChunk(file, at, bigEndian);
+        for (; chunk.size >= 0 && chunk.id != "data"; chunk = readChunk(file, at, bigEndian)) {
+            if (chunk.id == "ds64") largeSize = at + 16;
+            at += 8 + chunk.size + chunk.size % 2;
+        }
+        at += 8;
+        std::array<uint8_t, 8> large{};
+        const bool isMissing = form != "RF64" ? chunk.size == 0
+                                              : largeSize > 0 && ::fseeko(file, largeSize, SEEK_SET) == 0 &&
+                                                    std::fread(large.data(), 1, 8, file) == 8 &&
+                                                    large == decltype(large){};
+        if (isMissing && at < end && !isChunkList(file, at, end, bigEndian)) {
+            patch = {form == "RF64" ? largeSize : at - 4, form == "RF64" ? size_t{8} : size_t{4}, {}};
+            // The library reduces a size of all ones to the rest of the file.
+            patch.bytes.fill(0xFF);
+            const int64_t rest = end - at;
+            if (form == "RF64") std::memcpy(patch.bytes.data(), &rest, sizeof(rest));
+        }
+    }
+    std::rewind(file);
+    return patch;
+}
+
+sf_count_t CSndfileDecoder::getLength(void* self) {
+    struct stat status {};
+    return ::fstat(::fileno(static_cast<CSndfileDecoder*>(self)->m_input.get()), &status) == 0
+               ? status.st_size
+               : 0;
+}
+
+sf_count_t CSndfileDecoder::seekInput(sf_count_t offset, int whence, void* self) {
+    std::FILE* file = static_cast<CSndfileDecoder*>(self)->m_input.get();
+    return ::fseeko(file, offset, whence) == 0 ? ::ftello(file) : -1;
+}
+
+sf_count_t CSndfileDecoder::readInput(void* data, sf_count_t size, void* self) {
+    const CSndfileDecoder& decoder = *static_cast<CSndfileDecoder*>(self);
+    const int64_t at = tellInput(self);
+    const auto got =
+        static_cast<int64_t>(std::fread(data, 1, static_cast<size_t>(size), decoder.m_input.get()));
+    for (size_t i = 0; i < decoder.m_patch.size; ++i) {
+        const int64_t place = decoder.m_patch.offset + static_cast<int64_t>(i) - at;
+        if (place >= 0 && place < got) static_cast<uint8_t*>(data)[place] = decoder.m_patch.bytes[i];
+    }
+    return got;
+}
+
+sf_count_t CSndfileDecoder::writeNothing(const void*, sf_count_t, void*) {
+    return 0;
+}
+
+sf_count_t CSndfileDecoder::tellInput(void* self) {
+    return ::ftello(static_cast<CSndfileDecoder*>(self)->m_input.get());
 }
 
 } // namespace sonora2::plugins::wav

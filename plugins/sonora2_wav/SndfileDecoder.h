@@ -5,6 +5,7 @@
 
 #include <sndfile.h>
 
+#include <array>
 #include <vector>
 
 namespace sonora2::plugins::wav {
@@ -19,8 +20,10 @@ using SndfileHandle = std::unique_ptr<SNDFILE, SSndfileCloser>;
 class CSndfileDecoder : public IDecoder {
 public:
     explicit CSndfileDecoder(const SMediaFile& file);
+    ~CSndfileDecoder() override { close(); }
 
-    SDecodedMedia open() override;
+    // A WAV file whose writer was killed before it stored the sizes is read to the end of the file.
+    SDecodedMedia open(const SDecoderOptions& options) override;
     void close() override;
     int read(uint8_t* pcm, int frames) override;
     void seek(int64_t frame) override;
@@ -29,16 +32,42 @@ private:
     // How samples are read from the library.
     enum class ETransfer { raw, rawSigned8, shorts, integers24, integers32, floats, doubles };
 
+    // Bytes that the library sees in place of those in the file.
+    struct SPatch {
+        int64_t offset = 0;
+        size_t size = 0;
+        std::array<uint8_t, 8> bytes{};
+    };
+
+    static SPatch findMissingSize(std::FILE* file);
+    static sf_count_t getLength(void* self);
+    static sf_count_t seekInput(sf_count_t offset, int whence, void* self);
+    static sf_count_t readInput(void* data, sf_count_t size, void* self);
+    static sf_count_t writeNothing(const void* data, sf_count_t size, void* self);
+    static sf_count_t tellInput(void* self);
+
+    SNDFILE* openHandle(SF_INFO& info);
     void chooseTransfer(int sampleFormat);
+    template <class Sample> void checkClipping(const Sample* samples, sf_count_t frames);
+    void reportClipping();
 
     SMediaFile m_file;
+    SDecoderOptions m_options;
     InputFile m_input; // read by the handle
+    SPatch m_patch;
     SndfileHandle m_handle;
     SPcmFormat m_format;
+    int64_t m_frames = 0;
+    int64_t m_position = 0; // next frame to read
     ETransfer m_transfer = ETransfer::raw;
     std::vector<int32_t> m_integers; // reused by every read
     std::vector<float> m_floats;
     std::vector<double> m_doubles;
+
+    // Samples beyond full scale in the frames before `m_checked`.
+    int64_t m_checked = 0;
+    int64_t m_clipped = 0;
+    double m_peak = 0.0;
 };
 
 } // namespace sonora2::plugins::wav

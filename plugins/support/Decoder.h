@@ -1,6 +1,7 @@
 // The interface that a reading plug-in implements.
 #pragma once
 
+#include "sonora2/context/ILogManager.h"
 #include "support/MediaFile.h"
 
 namespace sonora2::plugins {
@@ -9,6 +10,15 @@ struct SDecodedMedia {
     SPcmFormat format;
     int64_t frames = 0;     // exact: what reading an intact file to its end delivers
     std::string codec = {}; // to show to users, such as "FLAC" or "PCM signed 24 bit"; empty when unknown
+};
+
+struct SDecoderOptions {
+    P<common::ILogManager> log; // may be empty
+
+    // Reports something that does not stop the decoding.
+    template <class... Args> void warn(const char* text, const Args&... args) const {
+        if (log) log->log(common::kSeverityWarning, peru::format(text, args...));
+    }
 };
 
 // Decodes one file to PCM. CDecoderSource adds state checks, conversion, read-ahead and time.
@@ -20,7 +30,7 @@ public:
 
     // Starts at frame 0. May be called again after close(), so results that were slow to obtain should be
     // cached.
-    virtual SDecodedMedia open() = 0;
+    virtual SDecodedMedia open(const SDecoderOptions& options) = 0;
     virtual void close() = 0; // also called after open() has thrown; no effect when closed
     // Reads up to `frames` frames and returns the number read, which may be smaller; 0 means the end.
     // Everything that can be decoded before a damaged place is returned before the failure is thrown.

@@ -119,7 +119,7 @@ P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {
 }
 
 void CDecoderSource::openDecoder() {
-    m_media = m_decoder->open();
+    m_media = m_decoder->open({m_context->getLogManager()});
     const SPcmFormat& own = m_media.format;
     const bool sound = own.rate > 0 && own.channels > 0 && own.bytesPerSample >= 1 &&
                        own.bytesPerSample <= 4 && m_media.frames >= 0;

@@ -14,6 +14,7 @@
 #include <cmath>
 #include <cstdio>
 #include <cstring>
+#include <mutex>
 #include <random>
 #include <set>
 #include <stdexcept>
@@ -63,9 +64,23 @@ private:
     int m_queue;
 };
 
+class CLogLines : public peru::CObject, public sonora2::common::ILogManager {
+public:
+    void log(int32_t, const P<peru::IString>& line) override {
+        std::lock_guard lock(m_mutex);
+        lines.push_back(text(line));
+    }
+    void logException(const peru::CException& exception) override { log(0, exception.getDescription()); }
+    std::vector<std::string> lines;
+
+private:
+    std::mutex m_mutex;
+};
+
 class CPluginTest : public ::testing::Test {
 protected:
     CPluginTest() : context(peru::make<sonora2::audio::CSonoraContextAudio>()) {
+        context->setLogManager(log);
         context->getBaseDirectories()->setPluginDirectory(toURI(TONEWRIGHT_PLUGIN_DIR "/"));
         std::set<std::string> names;
         for (const SFormatCase& format : kFormatCases)
@@ -128,6 +143,7 @@ protected:
     }
 
     CTempFolder folder;
+    P<CLogLines> log = peru::make<CLogLines>();
     P<sonora2::audio::CSonoraContextAudio> context;
     P<sonora2::common::CPluginHandler> handler; // must outlive every source and format of a test
 };

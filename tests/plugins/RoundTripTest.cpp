@@ -3,6 +3,7 @@
 
 #include "sonora2/context/SonoraError.h"
 
+#include <sndfile.h>
 #include <vector>
 
 namespace tests {
@@ -29,6 +30,7 @@ std::string readByPeer(const std::filesystem::path& path, int bytes) {
         return run("flac -sdc --force-raw-format --endian=little --sign=" +
                    std::string(bytes == 1 ? "unsigned '" : "signed '") + path.string() + "'");
     }
+    if (path.filename() == "rifx.wav") return run("sox '" + path.string() + "' -t raw -L -");
     static const char* const kCoders[] = {"", "u8", "s16le", "s24le", "s32le"};
     const std::string coder = kCoders[bytes];
     return run("ffmpeg -v error -i '" + path.string() + "' -f " + coder + " -c:a pcm_" + coder + " -");
@@ -152,6 +154,10 @@ INSTANTIATE_TEST_SUITE_P(
         SPeerFile{"d.wav", "ffmpeg -v error -i in.wav -c:a pcm_f64le d.wav", 4, true, "PCM float 64 bit"},
         SPeerFile{"f.wav", "ffmpeg -v error -i in.wav -c:a pcm_s16le -rf64 always f.wav", 2, true},
         SPeerFile{"stream.wav", "ffmpeg -v error -i in.wav -f wav -c:a pcm_s16le - > stream.wav", 2, true},
+        SPeerFile{"pipe64.wav", "ffmpeg -v error -i in.wav -f wav -rf64 always - > pipe64.wav", 2, false},
+        SPeerFile{"rifx.wav", "sox in.wav -B -b 16 -D rifx.wav", 2, true},
+        SPeerFile{"mu.wav", "ffmpeg -v error -i in.wav -c:a pcm_mulaw mu.wav", 2, true, "\u00b5-law"},
+        SPeerFile{"al.caf", "ffmpeg -v error -i in.wav -c:a pcm_alaw al.caf", 2, true, "A-law"},
         SPeerFile{"g.aiff", "sox in.wav -b 8 -D g.aiff", 1, true, "PCM signed 8 bit"},
         SPeerFile{"i.caf", "ffmpeg -v error -i in.wav -c:a pcm_s24be i.caf", 3, true, "PCM signed 24 bit"},
         SPeerFile{"j.w64", "sox in.wav -b 16 -D j.w64", 2, true},
@@ -167,6 +173,73 @@ INSTANTIATE_TEST_SUITE_P(
         std::ranges::replace(name, '.', '_');
         return name;
     });
+
+// Sizes in a header of 44 bytes, over two frames of 16 bit stereo and what follows them.
+TEST_F(CPluginTest, WavSizes_AreCheckedAgainstTheFile) {
+    const std::string sound("\1\2\3\4\5\6\7\10", 8), list("LIST\4\0\0\0INFO", 12);
+    struct {
+        uint32_t riff, data;
+        std::string body, expected;
+    } const cases[] = {
+        {44, 8, sound, sound},
+        {46, 10, sound, sound},                          // too large
+        {1044, 1008, sound, sound},                      // far too large
+        {44, 8, sound.substr(0, 7), sound.substr(0, 4)}, // truncated
+        {0xFFFFFFFF, 0xFFFFFFFF, sound, sound},          // written to a pipe
+        {0, 0, sound, sound},                            // never completed
+        {36, 0, sound, sound},                           // the same with the size of the header
+        {48, 0, list, ""},                               // empty, with a list behind
+        {36, 0, "", ""},                                 // empty
+        {56, 8, sound + list, sound},
+    };
+    for (const auto& row : cases) {
+        SCOPED_TRACE(std::to_string(row.riff) + ", " + std::to_string(row.data));
+        const auto number = [](uint32_t value) { return std::string(reinterpret_cast<char*>(&value), 4); };
+        const auto path = folder.write("x.wav", "RIFF" + number(row.riff) + "WAVEfmt " + number(16) +
+                                                    number(0x20001) + number(44100) + number(176400) +
+                                                    number(0x100004) + "data" + number(row.data) + row.body);
+        P<IAudioSource> source = openSource(path, {});
+        ASSERT_TRUE(source);
+        EXPECT_EQ(row.expected.size() / 4 / 44100.0, source->getDuration());
+        EXPECT_EQ(row.expected, readAll(source));
+    }
+}
+
+TEST_F(CPluginTest, Alac_KeepsAllFrames) {
+    const std::string pcm = makeMusic({}, 20011);
+    const std::pair<int, size_t> formats[] = {
+        {SF_FORMAT_ALAC_16, 2}, {SF_FORMAT_ALAC_24, 3}, {SF_FORMAT_ALAC_32, 4}};
+    for (const auto& [format, bytes] : formats) {
+        SF_INFO info{0, 44100, 2, SF_FORMAT_CAF | format, 0, 0};
+        SNDFILE* file = sf_open((folder / "x.caf").c_str(), SFM_WRITE, &info);
+        sf_writef_short(file, reinterpret_cast<const short*>(pcm.data()), 20011);
+        sf_close(file);
+        P<IAudioSource> source = openSource(folder / "x.caf", {44100, 2, static_cast<int>(bytes)});
+        ASSERT_TRUE(source);
+        EXPECT_EQ("ALAC", codecOf(source));
+        const std::string got = readAll(source);
+        std::string upper;
+        for (size_t i = bytes - 2; i < got.size(); i += bytes) upper += got.substr(i, 2);
+        EXPECT_TRUE(pcm == upper) << bytes << " bytes, " << got.size() / bytes / 2 << " frames";
+    }
+}
+
+TEST_F(CPluginTest, FloatBeyondFullScale_IsReported) {
+    // 0.5 s at 6 dB above full scale, then 0.5 s at half of it.
+    for (const char* coder : {"pcm_f32le", "pcm_f64le"}) {
+        const auto path = folder / "x.wav";
+        run("ffmpeg -v error -y -f lavfi -i 'aevalsrc=exprs=if(lt(t\\,0.5)\\,2\\,0.5):s=8000:d=1' -c:a " +
+            std::string(coder) + " '" + path.string() + "'");
+        log->lines.clear();
+        P<IAudioSource> source = openSource(path, {8000, 1, 4});
+        readAll(source);
+        source->skipToTime(0.0);
+        readAll(source);
+        source->close();
+        ASSERT_EQ(1u, log->lines.size());
+        EXPECT_EQ(path.string() + ": clipped 4000 samples, peak +6.0 dB", log->lines.front());
+    }
+}
 
 TEST_F(CPluginTest, FlacSettings_AreThoseOfItsOwnEncoder) {
     const SShape shape;
