@@ -1,5 +1,5 @@
-// Reading and storing tags, beside TagLib alone and a plain copy. Files are made by lame, flac, oggenc,
-// ffmpeg and sox in the temporary folder.
+// Reading and storing tags, compared with TagLib alone and with a plain copy. The files are made by lame,
+// flac, oggenc, ffmpeg and sox in the temporary folder.
 #include "filetag/FileTagFactory.h"
 #include "peru/system/IPathes.h"
 
@@ -47,7 +47,7 @@ void run(const std::string& command) {
     if (std::system(("cd '" + getFolder().string() + "' && " + command).c_str()) != 0) std::abort();
 }
 
-// A sound of that length without a tag.
+// A sound of the given length without a tag.
 fs::path makeSound(const std::string& extension, int seconds) {
     const std::string name = std::to_string(seconds) + "." + extension;
     if (fs::exists(getFolder() / name)) return getFolder() / name;
@@ -63,7 +63,7 @@ P<IURI> toURI(const fs::path& path) {
     return getPathes()->fromPlatformPath(CString::fromUTF8(path.string()));
 }
 
-// Folders of files with all fields filled.
+// Copies of one file with all fields filled.
 const std::vector<fs::path>& getFiles(int64_t format) {
     static std::vector<fs::path> files[std::size(kExtensions)];
     std::vector<fs::path>& list = files[format];
@@ -180,7 +180,7 @@ void BM_StoreShortTitle(benchmark::State& state) {
 }
 BENCHMARK(BM_StoreShortTitle)->DenseRange(0, 3)->Unit(benchmark::kMillisecond)->UseRealTime();
 
-// Longer than any padding.
+// The title is longer than any padding.
 void BM_StoreLongTitle(benchmark::State& state) {
     storeTitles(state, CString::fromUTF8(std::string(300000, 'x')), newString("short"));
 }

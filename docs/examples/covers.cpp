@@ -4,7 +4,7 @@
 //     covers extract FILE INDEX PICTURE
 //     covers add FILE PICTURE
 //
-// Links filetag and peru, nothing else.
+// Links only filetag and peru.
 #include "filetag/FileTagFactory.h"
 #include "filetag/ICoverArtFileTag.h"
 #include "peru/Errors.h"
@@ -26,10 +26,10 @@ using peru::P;
 namespace {
 
 P<ICoverArtFileTag> openTag(const char* path) {
-    const std::string absolute = std::filesystem::absolute(path); // a tag wants a complete URI
+    const std::string absolute = std::filesystem::absolute(path); // tags need an absolute URI
     const P<peru::IURI> uri = peru::getPathes()->fromPlatformPath(peru::CString::fromUTF8(absolute));
     const P<filetag::IFileTag> tag = filetag::CFileTagFactory::get()->create(uri);
-    // Every kind of tag but that of WAV holds pictures.
+    // Every tag except that of a WAV file can hold pictures.
     const P<ICoverArtFileTag> pictures = peru::interfaceCast<ICoverArtFileTag>(tag);
     if (!pictures) throw peru::CFileFormatNotSupportedError(uri);
     return pictures;
@@ -51,7 +51,7 @@ bool extract(const P<ICoverArtFileTag>& tag, int32_t index, const char* path) {
     const P<peru::CMemoryBlock> data = picture->getData();
     std::ofstream file(path, std::ios::binary);
     file.write(reinterpret_cast<const char*>(data->getData()), data->getSize());
-    file.close(); // tells what could not be written
+    file.close(); // flushes, so that good() covers every write
     return file.good();
 }
 
@@ -62,7 +62,7 @@ bool add(const P<ICoverArtFileTag>& tag, const char* path) {
     const auto data = peru::make<peru::CMemoryBlock>(static_cast<int64_t>(bytes.size()));
     std::memcpy(data->getData(), bytes.data(), bytes.size());
     tag->addCoverArt(data, bytes.starts_with("\x89PNG") ? "image/png" : "image/jpeg", filetag::kFrontCover);
-    tag->store(); // until here the file is as it was
+    tag->store(); // the file is unchanged until here
     return true;
 }
 

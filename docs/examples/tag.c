@@ -1,8 +1,8 @@
-/* Shows the title of a sound file and gives it another: tag FILE TITLE, both of ASCII letters. */
+/* Prints the title of a sound file and sets a new one: tag FILE TITLE, both in ASCII. */
 #include <stdio.h>
 #include <tonewright/tonewright.h>
 
-/* What is no letter of ASCII would have to be converted, and escaped in a URI. */
+/* Anything but ASCII would have to be converted, and escaped in a URI. */
 static const char16_t* widen(const char* start, const char* text, char16_t* wide, size_t capacity) {
     size_t length = 0;
     for (; *start && length + 1 < capacity; ++start) wide[length++] = (char16_t)*start;

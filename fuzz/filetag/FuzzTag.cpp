@@ -1,5 +1,5 @@
-// Arbitrary bytes as a file of one kind: reading its tag ends with texts and pictures or with an error of its
-// own, and what is set and stored comes back.
+// Treats arbitrary bytes as a file of one format: reading its tag must return texts and pictures or throw a
+// CException, and fields that were set and stored must read back.
 #include "filetag/FileTagFactory.h"
 #include "filetag/ICoverArtFileTag.h"
 #include "peru/Errors.h"
@@ -22,7 +22,7 @@ void require(bool condition) {
     if (!condition) std::abort();
 }
 
-// In memory where the system has such a folder: what is tried is the tag and not the disk.
+// Stored in memory where possible, because the test is about tags and not about the disk.
 class CFuzzedFile {
 public:
     CFuzzedFile() {
@@ -78,8 +78,8 @@ void readAll(const P<filetag::IFileTag>& tag) {
     require(!covers->getCoverArt(count));
 }
 
-// An ID3v1 tag stands where the file ends, also when something before it says to reach beyond its begin.
-// TagLib writes one over the other then, and which of them survives is nobody's promise.
+// An ID3v1 tag is at the end of the file even if an earlier structure claims to extend into it. TagLib then
+// overwrites one with the other, and which of them survives is unspecified.
 bool hasOldTag(const uint8_t* data, size_t size) {
     constexpr size_t kOldTag = 128;
     return size >= kOldTag &&

@@ -1,4 +1,4 @@
-// Marks what leaves libfiletag. Everything is compiled with hidden visibility.
+// Export macro of libfiletag. Everything else is compiled with hidden visibility.
 #pragma once
 
 #define FILETAG_API __attribute__((visibility("default")))

@@ -42,7 +42,7 @@ void CFileTagFactory::setTempExtension(const P<IString>& extension) {
 }
 
 P<IFileTag> CFileTagFactory::create(const P<IURI>& file) {
-    // Of the whole name, since the temporary extension is one of its own in most cases.
+    // Applied to the whole name, because the temporary suffix usually is an extension of its own.
     P<IString> name = file->getFileName();
     if (!m_tempExtension->isEmpty() && name->endsWith(m_tempExtension))
         name = name->remove(name->getPosition(name->getLength() - m_tempExtension->getLength()));

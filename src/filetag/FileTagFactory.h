@@ -1,4 +1,4 @@
-// Picks the tag class for a file.
+// Selects the tag class for a file.
 #pragma once
 
 #include "filetag/IFileTag.h"
@@ -6,7 +6,7 @@
 
 namespace filetag {
 
-// A singleton of the global object factory. Any thread, once the temporary extension is set.
+// A singleton of the global object factory. May be used from any thread once the temporary extension is set.
 class FILETAG_API CFileTagFactory : public peru::CObject {
 public:
     static P<CFileTagFactory> get();
@@ -14,11 +14,11 @@ public:
     CFileTagFactory();
     ~CFileTagFactory() override;
 
-    // The opened tag of a file, by its extension in any case: mp3, wav, flac, ogg, wma and asf. Empty for any
-    // other extension. Throws what IFileTag::open throws.
+    // Returns the opened tag of a file, selected by its extension regardless of case: mp3, wav, flac, ogg,
+    // wma or asf. Returns an empty handle for any other extension. Throws what IFileTag::open throws.
     P<IFileTag> create(const P<peru::IURI>& file);
 
-    // An ending of file names under work, such as ".part": it is cut off before the extension is compared.
+    // Suffix of files still being written, such as ".part": it is removed before the extension is compared.
     void setTempExtension(const P<peru::IString>& extension);
 
 private:

@@ -9,14 +9,14 @@ namespace filetag {
 
 using peru::P;
 
-// What a picture shows. In the files stand the numbers of the ID3v2 APIC frame.
+// What a picture shows. Files store the number of the ID3v2 APIC frame instead.
 enum EPictureType : int32_t {
     kFrontCover = 0,    // 3 in the file
     kBackCover = 1,     // 4
     kOtherPicture = 2,  // 0
     kFileIcon = 3,      // 1
     kOtherFileIcon = 4, // 2
-    // From here on the number in the file.
+    // From here on the value equals the number in the file.
     kLeafletPage = 5,
     kMedia = 6,
     kLeadArtist = 7,
@@ -31,8 +31,8 @@ enum EPictureType : int32_t {
     kScreenCapture = 16
 };
 
-// Writes through to the tag that gave it; valid for as long as that is open. The file changes when the tag is
-// stored.
+// Writes through to the tag that returned it and is valid as long as that tag is open. The file changes when
+// the tag is stored.
 class FILETAG_API ICoverArt : public virtual peru::IBase {
 public:
     virtual P<peru::CMemoryBlock> getData() const = 0; // the bytes of the picture file

@@ -8,21 +8,21 @@ namespace filetag {
 
 using peru::P;
 
-// Made closed. Setters change the object only; the file changes at store. All fields are texts in every tag
-// system, track number and year too: nothing is parsed or checked. A field that is absent, and one that the
-// tag system does not have, reads as the empty text; setting the empty text removes a field. One thread at a
-// time.
+// Objects are created closed. Setters change only the object; the file changes on store(). All fields are
+// texts in every tag system, including track number and year: nothing is parsed or checked. A field that is
+// missing, or that the tag system does not support, reads as the empty text; setting the empty text removes a
+// field. Only one thread may use an object at a time.
 class FILETAG_API IFileTag : public virtual peru::IBase {
 public:
     virtual bool isOpened() const = 0;
     // Reads the file's tag. Throws CFileError: CFileNotFoundError, CFileAccessDeniedError, and
     // CFileFormatNotSupportedError for content that does not fit the file's extension.
     virtual void open() = 0;
-    virtual void close() = 0; // changes that were not stored are lost
+    virtual void close() = 0; // discards changes that were not stored
     virtual P<peru::IURI> getURI() const = 0;
-    // Writes the changes: afterwards the file is the new one, whole, or after an error, which is thrown as
-    // CFileError, the old one as it was. Costs a copy of the file where the tag's length in it changes.
-    // Needs an open before the next store.
+    // Writes the changes to the file. On success the file is completely new; on an error, which is thrown as
+    // CFileError, the old file is unchanged. Copies the file if the length of the tag changes. After a store
+    // the tag must be opened again before the next one.
     virtual void store() = 0;
 
     virtual void setTitle(const peru::CStringArg& title) = 0;
@@ -41,7 +41,7 @@ public:
     virtual P<peru::IString> getGenre() const = 0;
     virtual void setComment(const peru::CStringArg& comment) = 0;
     virtual P<peru::IString> getComment() const = 0;
-    // What kind of tag the file has, such as "ID3v2.3"; empty for a file without one.
+    // The kind of tag in the file, such as "ID3v2.3"; empty for a file without a tag.
     virtual P<peru::IString> getTagType() const = 0;
 };
 

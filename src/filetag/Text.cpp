@@ -8,13 +8,13 @@ namespace filetag {
 
 namespace {
 
-// 0x80 to 0x9F in code page 1252; the five that it leaves open stay the control characters of Latin-1.
+// 0x80 to 0x9F in code page 1252. The five undefined bytes map to the control characters of Latin-1.
 constexpr char16_t kWindowsCharacters[] = {0x20AC, 0x0081, 0x201A, 0x0192, 0x201E, 0x2026, 0x2020, 0x2021,
                                            0x02C6, 0x2030, 0x0160, 0x2039, 0x0152, 0x008D, 0x017D, 0x008F,
                                            0x0090, 0x2018, 0x2019, 0x201C, 0x201D, 0x2022, 0x2013, 0x2014,
                                            0x02DC, 0x2122, 0x0161, 0x203A, 0x0153, 0x009D, 0x017E, 0x0178};
 
-// False for bytes that are not UTF-8.
+// Returns false if the bytes are not valid UTF-8.
 bool decodeUTF8(std::string_view bytes, std::u16string& text) {
     using Converter = std::codecvt<char16_t, char8_t, std::mbstate_t>;
     const Converter& converter = std::use_facet<Converter>(std::locale::classic());

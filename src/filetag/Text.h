@@ -1,4 +1,4 @@
-// Between texts and the bytes that stand for them in files.
+// Decodes the narrow texts found in files.
 #pragma once
 
 #include "filetag/Api.h"
@@ -10,9 +10,9 @@ namespace filetag {
 
 using peru::P;
 
-// The text of UTF-8, or of bytes that are none as Western Windows programs write them (code page 1252). A
-// UTF-16 string, which holds every character that UTF-8 has: the foundation's own UTF-8 reads emoji and some
-// scripts as malformed.
+// Decodes UTF-8; bytes that are not valid UTF-8 are decoded as code page 1252, which Western Windows programs
+// write. Returns a UTF-16 string because it can hold every character: the UTF-8 decoder of peru rejects emoji
+// and some scripts as malformed.
 FILETAG_API P<peru::IString> readNarrowText(std::string_view bytes);
 
 } // namespace filetag

@@ -31,7 +31,7 @@ constexpr int kFileCalls[] = {
     SYS_renameat,  SYS_renameat2, SYS_ftruncate, SYS_fallocate, SYS_copy_file_range,
     SYS_fsetxattr, SYS_setxattr,  SYS_utimensat};
 
-// The descriptor on which the kernel asks about each of these calls of the process; -1 where it does not.
+// Returns the descriptor on which the kernel notifies about each of these calls; -1 if unsupported.
 int watchFileCalls() {
     std::vector<sock_filter> filter = {BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr))};
     for (const int call : kFileCalls) {
@@ -45,7 +45,7 @@ int watchFileCalls() {
         ::syscall(SYS_seccomp, SECCOMP_SET_MODE_FILTER, SECCOMP_FILTER_FLAG_NEW_LISTENER, &program));
 }
 
-// Sending and receiving are not among the calls that are watched.
+// send and recv are not among the intercepted calls.
 [[noreturn]] void runChild(int channel, const std::function<std::function<std::string()>()>& prepare) {
     const std::function<std::string()> operation = prepare();
     const int listener = watchFileCalls();
@@ -63,7 +63,7 @@ bool isRenaming(int call) {
     return call == SYS_renameat || call == SYS_renameat2;
 }
 
-// A sanitizer finds out by writing to a pipe whether memory can be read; nothing else here has one.
+// A sanitizer writes to a pipe to find out whether memory is readable; nothing else here uses pipes.
 bool isOfSanitizer(const seccomp_notif& question) {
     if (question.data.nr != SYS_write) return false;
     const std::string link =
@@ -73,7 +73,7 @@ bool isOfSanitizer(const seccomp_notif& question) {
            std::string(target.data()).starts_with("pipe:");
 }
 
-// Answers one question of the kernel's; `counted` is the number of the call.
+// Answers one notification: lets the call continue, fails it, or kills the child.
 void answer(int listener, const seccomp_notif& question, const SFault& fault, bool strikes, pid_t child) {
     if (strikes && fault.error == 0) {
         ::kill(child, SIGKILL);
@@ -92,7 +92,7 @@ void answerAll(int listener, const SFault& fault, pid_t child, SFaultyRun& run) 
     for (int calls = 0;;) {
         pollfd waiting{listener, POLLIN, 0};
         if (::poll(&waiting, 1, 60'000) <= 0) {
-            ::kill(child, SIGKILL); // it hangs
+            ::kill(child, SIGKILL); // timed out
             return;
         }
         if (waiting.revents & POLLHUP) return;

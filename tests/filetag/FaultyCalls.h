@@ -1,4 +1,4 @@
-// Runs an operation whose system calls on files fail at will.
+// Runs an operation and makes selected file system calls of it fail.
 #pragma once
 
 #include <functional>
@@ -7,22 +7,23 @@
 namespace tests {
 
 struct SFault {
-    int call = 0;         // the first file call that is struck, counted from 1; 0 for none
-    int error = 0;        // what it fails with, an errno value; 0 kills the process in its place
-    bool forGood = false; // all that follow fail too
+    int call = 0;         // the first file call that fails, counted from 1; 0 for none
+    int error = 0;        // the errno it fails with; 0 kills the process instead
+    bool forGood = false; // all later calls fail as well
 };
 
 struct SFaultyRun {
-    bool supported = true; // clear where the kernel does not let a process watch another's calls
-    bool struck = false;   // the run came as far as the fault
-    bool renaming = false; // the call that was struck first is one that renames
-    int status = 0;        // as waitpid tells it
-    std::string report;    // what the operation returned; empty when it did not come to its end
+    bool supported = true; // false if the kernel does not let a process intercept another's calls
+    bool struck = false;   // the run reached the fault
+    bool renaming = false; // the first failed call is a rename
+    int status = 0;        // from waitpid
+    std::string report;    // what the operation returned; empty if it did not finish
 };
 
-// In a child process. The calls are caught at the kernel's door, whichever library makes them: opening,
-// reading, writing, copying, syncing, naming, cutting files and changing their owner and mode. Closing and
-// removing always work, as they do on a disk that is full or broken. `prepare` runs before calls are counted.
+// Runs the operation in a child process. Calls are intercepted in the kernel, whichever library makes them:
+// opening, reading, writing, copying, syncing, renaming and truncating files and changing their owner and
+// mode. Closing and removing always work, as they do on a full or broken disk. `prepare` runs before the
+// counting starts.
 SFaultyRun runWithFault(const SFault& fault, const std::function<std::function<std::string()>()>& prepare);
 
 } // namespace tests

@@ -1,4 +1,4 @@
-// What holds for the tags of all formats that TagLib knows, with other programs as judges.
+// Tests for all formats handled by TagLib, checked with other programs.
 #include "Support.h"
 #include "filetag/FileTagFactory.h"
 
@@ -39,7 +39,7 @@ constexpr size_t kTextCount = std::size(kTexts);
 constexpr const char* kNamesOfFFmpeg[] = {"title", "artist", "album", "album_artist",
                                           "track", "date",   "genre", "comment"};
 
-// Judges give years, track numbers and genres a form of their own.
+// The other programs reformat years, track numbers and genres.
 std::string getText(size_t field, size_t round) {
     if (std::string(kFields[field].name) == "year") return std::to_string(1990 + round);
     if (std::string(kFields[field].name) == "trackNumber") return std::to_string(round + 1) + "/12";
@@ -67,7 +67,7 @@ void store(const std::filesystem::path& file, const CTexts& texts) {
     tag->store();
 }
 
-// By the names of this system.
+// Keyed by our own field names.
 CTexts readWithFFprobe(const std::filesystem::path& file) {
     const auto found = nlohmann::json::parse(tests::run({"ffprobe", "-v", "error", "-of", "json",
                                                          "-show_entries", "format_tags:stream_tags", file})
@@ -121,7 +121,7 @@ TEST_P(FileTag, OthersReadWhatIsWritten) {
         EXPECT_EQ(tests::readFields(*open(copy))["title"], "");
         store(copy, makeTexts(round));
         EXPECT_EQ(tests::readFields(*open(copy)), makeTexts(round));
-        // Once more over what is there, now shorter or longer.
+        // Overwrite with shorter and longer texts.
         store(copy, makeTexts(round + 1));
         command.push_back(copy);
         EXPECT_EQ(readWithFFprobe(copy), makeTexts(round + 1));
@@ -213,7 +213,7 @@ TEST_P(FileTag, HoldsPictures) {
     gone->setMimeType("image/gone");
     tag->store();
 
-    // ASF has no order among pictures.
+    // ASF pictures have no order.
     const bool ordered = GetParam() != std::string("wma");
     const P<ICoverArtFileTag> read(open(m_file));
     ASSERT_EQ(read->getCoverArtCount(), 2);
@@ -236,7 +236,7 @@ TEST_P(FileTag, HoldsPictures) {
     const std::set<std::string> pictures{toString(again->getCoverArt(0)), toString(again->getCoverArt(1))};
     EXPECT_EQ(pictures, (std::set<std::string>{"9 image/png front", "3 image/gif new"}));
     EXPECT_EQ(tests::hashSound(m_file), sound);
-    // The numbers that stand in the file, by another reader.
+    // The numbers in the file, according to another reader.
     const std::string list = tests::run({"exiftool", "-a", "-n", "-PictureType", "-s3", m_file}).out;
     if (ordered) {
         EXPECT_EQ(list, "9\n1\n");
@@ -281,7 +281,7 @@ TEST_P(FileTag, RefusesContentOfAnotherFormat) {
         m_folder.write(m_file.filename(), content);
         EXPECT_THROW(open(m_file), CFileFormatNotSupportedError) << content.substr(0, 30);
     }
-    // Cut anywhere it is read or refused, and a store leaves it readable.
+    // A truncated file is either read or refused, and stays readable after a store.
     for (size_t size = 1; size < 6000; size = size * 3 / 2 + 1) {
         m_folder.write(m_file.filename(), sound.substr(0, size));
         try {
@@ -301,7 +301,7 @@ TEST_P(FileTag, RefusesContentOfAnotherFormat) {
 INSTANTIATE_TEST_SUITE_P(Formats, FileTag, testing::Values("mp3", "flac", "ogg", "wma"),
                          [](const auto& instance) { return std::string(instance.param); });
 
-// Programs know one of two names each. No old comment may show in any of them.
+// Programs read one of two names. None of them may still see the old comment.
 TEST(XiphTag, CommentsOfBothNamesGo) {
     const CTempFolder folder;
     const auto file = tests::makeSound(folder, "flac");

@@ -1,4 +1,4 @@
-// What is peculiar to MP3: two tags in one file, three versions of one of them.
+// Special cases of MP3: two tags in one file, and three versions of ID3v2.
 #include "Support.h"
 #include "filetag/FileTagFactory.h"
 
@@ -15,7 +15,7 @@ P<IFileTag> open(const std::filesystem::path& file) {
     return CFileTagFactory::get()->create(toURI(file));
 }
 
-// By another reader that tells the two tags apart.
+// exiftool distinguishes the two tags.
 std::string readWithExiftool(const std::filesystem::path& file, const std::string& name) {
     const std::string out = tests::run({"exiftool", "-s3", "-" + name, file}).out;
     return out.substr(0, out.find('\n'));
@@ -57,7 +57,7 @@ TEST(Mp3Tag, BringsBothTagsInStep) {
     EXPECT_EQ(tests::text(tag->getTagType()), "") << "no empty tag stays";
 }
 
-// The old tag has numbers only, and must not take the texts along.
+// ID3v1 can only hold numbers, which must not replace the texts.
 TEST(Mp3Tag, KeepsTextsThatAreNoNumbers) {
     const CTempFolder folder;
     const auto file = tests::makeSound(folder, "mp3");

@@ -18,7 +18,7 @@ std::string word(uint32_t value) {
     return {reinterpret_cast<const char*>(&value), sizeof value};
 }
 
-// With the body's own size, or one that lies. Pad bytes are part of what the tests write down.
+// The size is that of the body or a wrong one. Pad bytes are spelled out by the tests.
 std::string chunk(const std::string& id, const std::string& body) {
     return id + word(static_cast<uint32_t>(body.size())) + body;
 }
@@ -30,7 +30,7 @@ std::string wave(const std::string& chunks) {
     return "RIFF" + word(static_cast<uint32_t>(4 + chunks.size())) + "WAVE" + chunks;
 }
 
-// The start of a file whose writer never came to tell its size.
+// A file whose writer never got to fill in the RIFF size.
 std::string untold(const std::string& chunks) {
     return "RIFF" + word(0) + "WAVE" + chunks;
 }
@@ -133,7 +133,7 @@ TEST(RiffTag, StoringMovesTheListToTheEndAndKeepsTheRest) {
     }
 }
 
-// Each value is to be there before another field is set, and together with it afterwards.
+// Every value must be readable before another field is set, and together with it afterwards.
 TEST(RiffTag, ListsOfOtherProgramsAreReadAndExtended) {
     const std::string artist = chunk("IART", "Them" + kZero);
     const struct {
@@ -207,7 +207,7 @@ TEST(RiffTag, WhatIsNoWaveFileIsRefusedByName) {
         EXPECT_THAT(tests::errorOf([&] { tag->open(); }), testing::HasSubstr("bad%20name.wav"));
         EXPECT_FALSE(tag->isOpened());
 
-        // The file may have become another one since it was opened.
+        // The file may have been replaced since it was opened.
         folder.write("bad name.wav", good);
         tag->open();
         tag->setTitle("Title");
@@ -219,7 +219,7 @@ TEST(RiffTag, WhatIsNoWaveFileIsRefusedByName) {
     EXPECT_THROW(openTag(folder.path()), CFileError);
 }
 
-// Holes take no room: the list stands behind 3 GB, and then there is none for it below 4 GB.
+// Sparse files: first the list follows 3 GB of data, then there is no room for it below 4 GB.
 TEST(RiffTag, LargeFilesAreReadUpToTheLimitOfTheFormat) {
     const tests::CTempFolder folder;
     const auto grow = [&](const char* name, uint32_t dataSize, const std::string& tail) {
@@ -239,7 +239,7 @@ TEST(RiffTag, LargeFilesAreReadUpToTheLimitOfTheFormat) {
     EXPECT_EQ(std::filesystem::file_size(full), 20 + uint64_t{0xFFFFFFFF - 50});
 
     const auto list = grow("list.wav", 100'000'000, "");
-    { // the hole is the list
+    { // turn the hole into the list
         std::fstream file(list, std::ios::binary | std::ios::in | std::ios::out);
         file.seekp(12) << "LIST" << word(100'000'000) << "INFO";
     }
@@ -248,7 +248,7 @@ TEST(RiffTag, LargeFilesAreReadUpToTheLimitOfTheFormat) {
 
 TEST(RiffTag, OtherProgramsReadTextsAndSound) {
     const struct {
-        const char* bits; // of 2001 samples: an odd number of bytes, so that a pad byte follows
+        const char* bits; // for 2001 samples: an odd number of bytes, so a pad byte follows
         const char16_t* title;
     } cases[] = {{"8", u"plain"}, {"24", u"Füße"}, {"8", u"Привет, мир"}, {"24", u"日本語のタイトル"},
                  {"8", u"क ख ग"}, {"24", u"🎵 𝄞 🎷"}};
@@ -271,7 +271,7 @@ TEST(RiffTag, OtherProgramsReadTextsAndSound) {
         const P<CRIFFTag> tag = openTag(file);
         tag->setTitle(c.title);
         tag->setArtist("Artist");
-        // exiftool does without the list when it is odd and the file ends there.
+        // exiftool ignores an odd-sized list at the end of the file.
         tag->setComment(title.size() % 2 == 0 ? "odd" : "even");
         tag->store();
         EXPECT_EQ(CString::toStdU16String(openTag(file)->getTitle()), c.title);

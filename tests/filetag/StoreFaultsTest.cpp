@@ -1,5 +1,5 @@
-// What is on the disk after a store that went wrong, in every format: the old file or the new one, whole, and
-// nothing else.
+// After a failed store the disk holds the complete old or the complete new file and nothing else, in every
+// format.
 #include "FaultyCalls.h"
 #include "filetag/FileTagFactory.h"
 #include "support/Files.h"
@@ -18,7 +18,7 @@ using namespace peru;
 
 namespace {
 
-// Half a second of sound with a title, made by programs that others use.
+// Half a second of sound with a title, made by common encoders.
 std::string makeSound(const std::filesystem::path& folder, const std::string& extension) {
     const auto wave = folder / "source.wav";
     const auto file = folder / ("made." + extension);
@@ -55,8 +55,8 @@ protected:
     std::filesystem::path getFile() const { return m_folder / (std::string(kName) + "." + GetParam()); }
     void reset() const { m_folder.write(getFile().filename(), m_old); }
 
-    // The store of a changed title, and an added text that makes the tag larger than it was. It reports
-    // "stored" or the error's text.
+    // Changes the title and adds a text that makes the tag larger. The returned operation stores the tag and
+    // reports "stored" or the error text.
     std::function<std::string()> prepare() const {
         const P<filetag::IFileTag> tag = make<filetag::CFileTagFactory>()->create(tests::toURI(getFile()));
         tag->setTitle("Another title");
@@ -84,8 +84,8 @@ protected:
         const std::string found = tests::readFile(getFile());
         if (run.report.empty()) { // killed
             EXPECT_TRUE(found == m_old || found == m_new);
-            // A name is taken over only from another name: here alone there are two, and what the second one
-            // stands for is whole.
+            // Only a rename needs a second name. If the process is killed there, the file with that name must
+            // be complete.
             if (run.renaming && others.size() == 1) {
                 EXPECT_TRUE(tests::readFile(others[0]) == m_new);
                 std::filesystem::remove(others[0]);
@@ -152,7 +152,7 @@ TEST_P(StoreFaults, ErrorsOfThePlaceNameTheFile) {
         std::filesystem::permissions(getFile(), std::filesystem::perms(0600));
         expectOldOrNew(run);
     };
-    // The store, by one to whom the modes of files matter.
+    // Stores as a user for whom file permissions apply.
     const auto prepareAsUser = [this] {
         const std::function<std::string()> store = prepare();
         if (::getuid() == 0 && ::setuid(65534) != 0) ::_exit(1);

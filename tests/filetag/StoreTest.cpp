@@ -1,4 +1,4 @@
-// How changes reach the disk.
+// How changes are written to disk.
 #include "Support.h"
 #include "filetag/FileTagFactory.h"
 #include "filetag/taglib/TagLibIOStream.h"
@@ -16,7 +16,7 @@ using tests::toURI;
 
 namespace {
 
-// Whether the operation writes into the file, and not into one that takes its name. A second name tells.
+// Whether the operation writes to the file itself instead of replacing it, detected with a hard link.
 template <class Operation> bool isInPlace(const std::filesystem::path& file, Operation operation) {
     const std::filesystem::path second = file.string() + ".second";
     std::filesystem::remove(second);
@@ -37,7 +37,7 @@ std::string toStdString(const TagLib::ByteVector& bytes) {
 
 } // namespace
 
-// TagLib's own stream in memory is the measure.
+// Compared with TagLib's own memory stream.
 TEST(TagStream, DoesWhatAFileDoes) {
     const CTempFolder folder;
     std::mt19937 random(7);
@@ -85,7 +85,7 @@ TEST(TagStream, DoesWhatAFileDoes) {
             case 6: {
                 stream.seek(position, TagLib::IOStream::Beginning);
                 model.seek(position);
-                // Inside only: beyond the end the one in memory leaves what it had there before.
+                // Not beyond the end, where the memory stream exposes old content.
                 const TagLib::ByteVector bytes =
                     makeBytes(below(std::min(model.length() - position, 300L) + 1));
                 stream.writeBlock(bytes);
@@ -131,7 +131,7 @@ TEST(TagStream, WritesSmallChangesInPlaceAndOthersAside) {
         SCOPED_TRACE(change.position);
         const auto file = folder.write("file", old);
         CTagLibIOStream stream(toURI(file));
-        // The rest of it is written as it is, as TagLib writes whole tags.
+        // The rest is rewritten unchanged, as TagLib does when it writes whole tags.
         const TagLib::ByteVector bytes(static_cast<unsigned int>(change.size), 'n');
         stream.insert(TagLib::ByteVector(old.c_str(), static_cast<unsigned int>(old.size())), 0, old.size());
         stream.seek(change.position, TagLib::IOStream::Beginning);
@@ -148,7 +148,7 @@ TEST(TagStore, FollowsLinksAndUsesPadding) {
     const auto file = tests::makeSound(folder, "flac");
     std::filesystem::create_symlink("sound.flac", folder / "link.flac");
     const auto link = folder / "link.flac";
-    // Cuts the padding to what a short file should have.
+    // TagLib reduces the padding of a short file.
     EXPECT_FALSE(isInPlace(file, [&] { setTitle(link, "First"); }));
     EXPECT_TRUE(isInPlace(file, [&] { setTitle(link, "Another"); }));
     EXPECT_EQ(tests::run({"metaflac", "--show-tag=TITLE", file}).out, "TITLE=Another\n");
@@ -157,7 +157,7 @@ TEST(TagStore, FollowsLinksAndUsesPadding) {
     EXPECT_EQ(tests::run({"flac", "-t", "-s", file}).exitCode, 0);
 }
 
-// The comment outgrows its page, so that all pages behind it get new numbers and checksums.
+// The comment outgrows its page, so all later pages need new numbers and checksums.
 TEST(TagStore, RenumbersThePagesOfALongOggFile) {
     const CTempFolder folder;
     const auto wave = folder / "a.wav";

@@ -1,4 +1,4 @@
-// Sound files of every format, and other programs that read and write their tags.
+// Sound files of every format, and access to other programs that read and write their tags.
 #pragma once
 
 #include "filetag/ICoverArtFileTag.h"
@@ -18,7 +18,7 @@ namespace tests {
 using peru::P;
 
 struct SField {
-    const char* name; // the judges'
+    const char* name; // used by judge.py
     void (filetag::IFileTag::*set)(const peru::CStringArg& text);
     P<peru::IString> (filetag::IFileTag::*get)() const;
 };
@@ -36,7 +36,7 @@ inline constexpr SField kFields[] = {
 
 using CTexts = std::map<std::string, std::string>; // by the field's name, in UTF-8
 
-// Standard UTF-8 to a string that holds every character.
+// Converts standard UTF-8 to a string that can hold every character.
 inline P<peru::IString> fromStandard(const std::string& utf8) {
     std::u16string units;
     for (size_t i = 0; i < utf8.size();) {
@@ -54,7 +54,7 @@ inline P<peru::IString> fromStandard(const std::string& utf8) {
 }
 
 inline std::string toStandard(const P<peru::IString>& text) {
-    // JSON's writer turns surrogates' escapes into UTF-8.
+    // The JSON parser converts escaped surrogate pairs to UTF-8.
     std::string escaped = "\"";
     for (const char16_t unit : peru::CString::toStdU16String(text)) {
         char code[8];
@@ -70,7 +70,7 @@ inline CTexts readFields(const filetag::IFileTag& tag) {
     return texts;
 }
 
-// A second of sound without a tag. What does not depend on the test is made once.
+// One second of sound without a tag. Each format is encoded only once per process.
 inline std::filesystem::path makeSound(const CTempFolder& folder, const std::string& extension) {
     static const CTempFolder made;
     const std::filesystem::path source = made / ("sound." + extension);
@@ -89,7 +89,7 @@ inline std::filesystem::path makeSound(const CTempFolder& folder, const std::str
     return file;
 }
 
-// What mutagen says or does; see the script.
+// Runs judge.py, which reads and writes tags with mutagen, and returns its JSON output.
 inline nlohmann::json judge(std::vector<std::string> arguments) {
     arguments.insert(arguments.begin(),
                      {"/usr/bin/python3", std::string(TONEWRIGHT_TEST_DATA) + "/filetag/judge.py"});
@@ -98,7 +98,7 @@ inline nlohmann::json judge(std::vector<std::string> arguments) {
     return result.out.empty() ? nlohmann::json() : nlohmann::json::parse(result.out);
 }
 
-// Of all decoded samples.
+// Hash of all decoded samples.
 inline std::string hashSound(const std::filesystem::path& file) {
     return run({"ffmpeg", "-v", "error", "-i", file, "-map", "0:a", "-f", "md5", "-"}).out;
 }

@@ -15,7 +15,7 @@ using namespace peru;
 
 namespace {
 
-// The length of a block has 24 bits.
+// The block length field has 24 bits.
 constexpr unsigned int kLargestBlock = 0xffffff;
 
 } // namespace
@@ -39,7 +39,7 @@ void CFLACTag::dropTags() {
     m_flac = nullptr;
 }
 
-// TagLib would write what is too long with a length that leads into the middle of it.
+// TagLib would write a truncated length for a longer block, and readers would continue in the middle of it.
 bool CFLACTag::save(TagLib::File& file) {
     unsigned int largest = m_comment ? m_comment->render(false).size() : 0;
     for (const TagLib::FLAC::Picture* picture : getPictures())

@@ -45,7 +45,7 @@ const char* getFrameId(EField field) {
     return "";
 }
 
-// The name behind a number of the old genres.
+// Converts an ID3v1 genre number to its name.
 TagLib::String toGenre(const TagLib::String& text) {
     bool isNumber = false;
     const int number = text.toInt(&isNumber);
@@ -56,7 +56,7 @@ TagLib::String toGenre(const TagLib::String& text) {
 constexpr EField kFields[] = {EField::title,       EField::artist, EField::album, EField::albumArtist,
                               EField::trackNumber, EField::year,   EField::genre, EField::comment};
 
-// Some programs write the comment as a text that is named so.
+// Some programs write the comment as a user text frame named "comment".
 UserTextIdentificationFrame* findOtherComment(TagLib::ID3v2::Tag* tag) {
     return UserTextIdentificationFrame::find(tag, "comment");
 }
@@ -71,7 +71,7 @@ CID3Tag::~CID3Tag() {
 
 std::unique_ptr<TagLib::File> CID3Tag::openFile(TagLib::IOStream& stream) {
     auto file = std::make_unique<TagLib::MPEG::File>(&stream, TagLib::ID3v2::FrameFactory::instance());
-    // TagLib takes any bytes for an MP3 file; one with neither a tag nor a frame of sound is none.
+    // TagLib accepts any bytes as an MP3 file; reject a file with neither a tag nor an audio frame.
     const TagLib::MPEG::Properties* properties = file->audioProperties();
     const bool sound = properties && properties->sampleRate() > 0;
     if (!file->isValid() || (!sound && !file->hasID3v2Tag() && !file->hasID3v1Tag() && !file->hasAPETag()))
@@ -99,7 +99,7 @@ P<IString> CID3Tag::getTagType() const {
     return m_mpeg->hasID3v1Tag() ? newString("ID3v1") : CString::empty();
 }
 
-// Programs keep notes of their own in comments with a description.
+// Programs store their own data in comments with a description.
 CommentsFrame* CID3Tag::findComment() const {
     CommentsFrame* found = nullptr;
     for (TagLib::ID3v2::Frame* frame : m_tag->frameList("COMM")) {
@@ -163,12 +163,12 @@ void CID3Tag::writeFrame(EField field, const TagLib::String& text) {
 
 void CID3Tag::writeField(EField field, const TagLib::String& text) {
     writeFrame(field, text);
-    // Else a text that was removed would still be read from there.
+    // Otherwise a removed text would still be read from there.
     if (m_oldTag) writeOldField(*m_oldTag, field, text);
 }
 
-// What one tag has and the other lacks is entered there. TagLib would do so by numbers and lose years and
-// track numbers that are none.
+// Copies fields that only one of the two tags has to the other. TagLib would do so with integers and lose
+// years and track numbers that are not numeric.
 bool CID3Tag::save(TagLib::File&) {
     for (const EField field : kFields) {
         const TagLib::String text = readField(field);

@@ -12,7 +12,7 @@ TagLib::String toText(unsigned int number) {
     return number == 0 ? TagLib::String() : TagLib::String(std::to_string(number));
 }
 
-// 0 for what does not start with a number, or with one that does not fit.
+// Returns 0 if the text does not start with a number or the number is too large.
 unsigned int toNumber(const TagLib::String& text, unsigned int largest) {
     unsigned int number = 0;
     for (const wchar_t digit : text) {

@@ -7,8 +7,8 @@
 
 namespace filetag::id3tag {
 
-// Year and track number are numbers there: 0 reads as the empty text, and of a text its leading digits are
-// written. Texts are cut and Latin-1; a field that the tag does not have is empty.
+// ID3v1 stores year and track number as numbers: 0 reads as the empty text, and only the leading digits of a
+// text are written. Texts are Latin-1 and are truncated; a field that ID3v1 does not have reads as empty.
 TagLib::String readOldField(const TagLib::ID3v1::Tag& tag, taglib::EField field);
 void writeOldField(TagLib::ID3v1::Tag& tag, taglib::EField field, const TagLib::String& text);
 

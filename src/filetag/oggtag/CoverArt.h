@@ -1,4 +1,4 @@
-// A picture of a Ogg Vorbis file.
+// A picture of an Ogg Vorbis file.
 #pragma once
 
 #include "filetag/oggtag/OGGTag.h"

@@ -1,4 +1,4 @@
-// The tag of an Ogg Vorbis file. Pictures are fields of the comment, "METADATA_BLOCK_PICTURE".
+// The tag of an Ogg Vorbis file. Pictures are stored in the comment as METADATA_BLOCK_PICTURE fields.
 #pragma once
 
 #include "filetag/taglib/XiphTag.h"
@@ -19,7 +19,7 @@ public:
                      EPictureType type) override;
     void removeCoverArt(int32_t index) override;
 
-    bool holds(const TagLib::FLAC::Picture* picture) const; // is one of the open tag's
+    bool holds(const TagLib::FLAC::Picture* picture) const; // belongs to the open tag
 
 protected:
     std::unique_ptr<TagLib::File> openFile(TagLib::IOStream& stream) override;
@@ -27,7 +27,7 @@ protected:
 
 private:
     TagLib::List<TagLib::FLAC::Picture*> getPictures() const;
-    TagLib::FLAC::Picture* getPicture(int32_t index) const; // null outside the list
+    TagLib::FLAC::Picture* getPicture(int32_t index) const; // null if out of range
 };
 
 } // namespace filetag::oggtag

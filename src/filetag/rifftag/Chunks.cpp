@@ -5,7 +5,7 @@
 
 namespace filetag::rifftag {
 
-// Headers are read and written as they lie in memory.
+// Headers are read and written in memory order.
 static_assert(std::endian::native == std::endian::little);
 
 CChunkReader::CChunkReader(const P<peru::ISeekableInStream>& stream)

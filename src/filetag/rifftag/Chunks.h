@@ -1,4 +1,4 @@
-// The chunks of a WAVE file, as they stand in the file and not only as their sizes say.
+// Reads the chunks of a WAVE file, also where their sizes are wrong.
 #pragma once
 
 #include "peru/streams/IStreams.h"
@@ -20,41 +20,41 @@ static_assert(sizeof(SChunkHeader) == 8);
 struct SChunk {
     int64_t offset; // of the header
     FourCC id;
-    uint32_t toldSize; // of the body, as its header tells it
-    int64_t size;      // of the body, as far as the file holds it
-    bool info;         // a list of descriptive texts with at least one byte behind its type
+    uint32_t toldSize; // of the body, according to its header
+    int64_t size;      // of the body, limited to the end of the file
+    bool info;         // a LIST of type INFO with a size above 4
 };
 
-// Walks a file's chunks. Whatever the bytes are, it comes to the end of the file and no further, and takes no
-// memory for them.
+// Iterates over the chunks of a file. It always ends at the end of the file, whatever the bytes are, and does
+// not load chunk bodies.
 //
-// A chunk of odd size has a pad byte behind it in files of most programs and none in those of others. One
-// follows where a zero stands, with which no id begins, where the last byte of the file stands, and where no
-// id can be read at once but one a byte later.
+// Most programs write a pad byte behind a chunk of odd size, but some do not. The byte behind such a chunk is
+// taken as padding if it is zero (no id starts with a zero), if it is the last byte of the file, or if an id
+// can only be read one byte later.
 //
-// A "data" chunk of size 0 with something behind it that is no chunk, in a file whose own size is not told
-// rightly either, was written by a program that never came to tell sizes: it reaches to the end of the file.
+// A "data" chunk of size 0 that is not followed by a chunk, in a file whose RIFF size is wrong as well, comes
+// from a program that never got to write the sizes: it extends to the end of the file.
 class CChunkReader {
 public:
     static constexpr int64_t kHeaderSize = 12; // "RIFF", a size, "WAVE"
 
-    // False when the stream is no WAVE file; the reader is of no use then. Throws CStreamError, here and
-    // below.
+    // If isWave() returns false the stream is not a WAVE file and the reader must not be used. The
+    // constructor and next() throw CStreamError.
     explicit CChunkReader(const P<peru::ISeekableInStream>& stream);
     bool isWave() const { return m_wave; }
-    // False at the end of the file. Up to seven bytes that are no chunk may be left there.
+    // Returns false at the end of the file. Up to seven trailing bytes may remain there.
     bool next(SChunk& chunk);
 
 private:
     bool isIdAt(int64_t offset);
     bool isPadAt(int64_t offset);
-    bool readAt(int64_t offset, void* bytes, int64_t size); // false when the file ends before
+    bool readAt(int64_t offset, void* bytes, int64_t size); // false if the file is too short
 
     P<peru::ISeekableInStream> m_stream;
     int64_t m_fileSize;
     int64_t m_offset = kHeaderSize;
     bool m_wave = false;
-    bool m_sizeTold = false; // the file is as long as its header says
+    bool m_sizeTold = false; // the size in the RIFF header is correct
 };
 
 } // namespace filetag::rifftag

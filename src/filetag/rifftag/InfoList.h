@@ -1,4 +1,4 @@
-// The list of descriptive texts of a WAVE file.
+// The LIST/INFO chunk of a WAVE file.
 #pragma once
 
 #include "filetag/Api.h"
@@ -10,35 +10,35 @@
 
 namespace filetag::rifftag {
 
-// A LIST chunk of type INFO in the form that it has in files: "LIST", its size, "INFO", then the entries,
-// each an id, a size and so many bytes. Entries of odd size are written without a pad byte behind them. Other
-// programs write one; as no id begins with a zero, zeros behind an entry are passed over and go with it.
+// A LIST chunk of type INFO as it is stored in files: "LIST", its size, "INFO", then the entries, each with
+// an id, a size and that many bytes. Entries of odd size are written without a pad byte. Other programs write
+// one; because no id starts with a zero byte, zeros behind an entry are skipped and count as part of it.
 class FILETAG_API CInfoList {
 public:
     CInfoList(); // without entries
-    // The chunk as it was read, with its header of 12 bytes. Sizes in it may be anything.
+    // Takes the chunk as read, including its 12-byte header. The sizes in it need not be valid.
     explicit CInfoList(std::vector<uint8_t> chunk);
 
-    // Up to the terminating zero; empty when there is no such entry.
+    // The value up to its terminating zero; empty if there is no such entry.
     std::string_view get(const FourCC& id) const;
-    // Replaces the first entry of that id, or appends one. The value is written with a terminating zero.
+    // Replaces the first entry with this id or appends a new one. Adds a terminating zero to the value.
     void set(const FourCC& id, std::string_view value);
-    // The chunk for the file, its size set right.
+    // The chunk to be written, with a correct size.
     const std::vector<uint8_t>& getChunk();
 
 private:
     struct SEntry {
         size_t offset; // of its header
-        size_t size;   // of the value, as far as the list holds it
-        size_t end;    // where the next one begins
+        size_t size;   // of the value, limited to the end of the list
+        size_t end;    // start of the next entry
     };
 
-    // The entry that begins at the offset; false when no header is left there.
+    // Reads the entry at the offset. Returns false if there is no room for a header.
     bool getEntry(size_t offset, SEntry& entry) const;
     bool find(const FourCC& id, SEntry& entry) const;
-    // Makes what stands at the end of the list an entry that ends there, so that another may follow.
+    // Corrects the size of a cut last entry and drops trailing garbage, so that an entry can be appended.
     void closeEnd();
-    void setSize(size_t offset, size_t size); // of the chunk or entry whose header stands there
+    void setSize(size_t offset, size_t size); // in the chunk or entry header at the offset
 
     std::vector<uint8_t> m_chunk;
 };

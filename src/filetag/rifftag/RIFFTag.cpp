@@ -20,7 +20,7 @@ constexpr FourCC kYear{'I', 'C', 'R', 'D'};
 constexpr FourCC kGenre{'I', 'G', 'N', 'R'};
 constexpr FourCC kComment{'I', 'C', 'M', 'T'};
 
-// Texts are held in memory whole. No program writes a list that comes near this.
+// The list is held in memory. No program writes one anywhere near this size.
 constexpr int64_t kMaxList = 64 * 1024 * 1024;
 constexpr int64_t kChunkHeader = sizeof(SChunkHeader);
 constexpr int64_t kMaxFile = int64_t{0xFFFFFFFF} + kChunkHeader;
@@ -31,7 +31,7 @@ constexpr int64_t kMaxFile = int64_t{0xFFFFFFFF} + kChunkHeader;
                            file);
 }
 
-// Runs the operation; an error of its streams comes out as an error of the file.
+// Runs the operation and rethrows stream errors as file errors.
 template <class Operation> void withFileErrors(const P<peru::IURI>& file, Operation&& operation) {
     try {
         operation();
@@ -50,8 +50,8 @@ CChunkReader readChunks(const P<peru::ISeekableInStream>& stream, const P<peru::
     return chunks;
 }
 
-// As the chunk is to stand in the new file: with its size told as it is, and with a zero behind it when that
-// is odd, so that every other program finds what follows, the list at the end above all.
+// In the new file every chunk has its real size and is padded with a zero if that is odd, so that other
+// programs find the chunks behind it, especially the list at the end.
 bool needsPad(const SChunk& chunk) {
     return chunk.size % 2 != 0;
 }
@@ -66,7 +66,7 @@ int64_t getNewSize(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& 
     return size;
 }
 
-// Copies neighbours together: a file may consist of any number of small chunks.
+// Joins adjacent ranges into one copy, since a file may consist of very many small chunks.
 class CCopier {
 public:
     explicit CCopier(const P<peru::IFileReplacement>& target) : m_target(target) {}
@@ -172,7 +172,7 @@ P<peru::IString> CRIFFTag::get(const FourCC& id) const {
 void CRIFFTag::set(const FourCC& id, const peru::CStringArg& value) {
     if (!m_opened) return;
     const std::string bytes = peru::CString::toStdString(value);
-    // One text alone may fill the list: a list that was stored can be opened again.
+    // Checked here, so that every list that was stored can be opened again.
     const int64_t used = m_list ? static_cast<int64_t>(m_list->getChunk().size()) : 0;
     if (used + static_cast<int64_t>(bytes.size()) + 32 > kMaxList) throwListTooLarge(m_uri);
     if (!m_list) m_list.emplace();

@@ -9,11 +9,11 @@
 
 namespace filetag::rifftag {
 
-// Reads the file's first list of type INFO; storing writes it as the file's last chunk and drops all others
-// of that type. Texts are written in UTF-8. A WAVE file has neither album nor album artist here. An empty
-// text stays in the file as an entry without characters.
+// Reads the first LIST chunk of type INFO. store() writes it as the last chunk of the file and removes all
+// others of that type. Texts are written as UTF-8. Album and album artist are not supported. Setting an empty
+// text writes an entry without characters.
 //
-// RF64, which holds what is over 4 GB, is no WAVE file for this class.
+// RF64, the variant for files over 4 GB, is not supported.
 class FILETAG_API CRIFFTag : public peru::CObject, public IFileTag {
 public:
     explicit CRIFFTag(const P<peru::IURI>& file);
@@ -23,7 +23,7 @@ public:
     void open() override;
     void close() override;
     P<peru::IURI> getURI() const override { return m_uri; }
-    // Also when nothing was set: then the file is not touched. The tag stays open.
+    // Does not touch the file if nothing was set. The tag stays open.
     void store() override;
 
     void setTitle(const peru::CStringArg& title) override;
@@ -51,7 +51,7 @@ private:
     P<peru::IURI> m_uri;
     bool m_opened = false;
     bool m_modified = false;
-    std::optional<CInfoList> m_list; // empty when the file has none
+    std::optional<CInfoList> m_list; // empty if the file has none
 };
 
 } // namespace filetag::rifftag

@@ -1,4 +1,4 @@
-// The picture of a tag, over the picture classes of TagLib, which differ in little.
+// Implements ICoverArt on top of TagLib's picture classes, which differ only slightly.
 #pragma once
 
 #include "filetag/ICoverArt.h"
@@ -21,7 +21,7 @@ inline TagLib::ByteVector getPictureBytes(const TagLib::FLAC::Picture& picture) 
 }
 inline void setPictureBytes(TagLib::FLAC::Picture& picture, const TagLib::ByteVector& bytes) {
     picture.setData(bytes);
-    // Zeros say that nobody has looked; the old picture's measures would be wrong.
+    // Zero means unknown; the old picture's dimensions would be wrong.
     picture.setWidth(0);
     picture.setHeight(0);
     picture.setColorDepth(0);

@@ -31,7 +31,7 @@ CPieceTable::Map::iterator CPieceTable::split(int64_t position) {
 
 void CPieceTable::erase(int64_t position, int64_t size) {
     const Map::iterator first = split(position);
-    // The second split may divide the first's piece but leaves the part that starts there.
+    // The second split may divide the same piece, but `first` still refers to the part that starts here.
     m_pieces.erase(first, split(position + size));
 }
 

@@ -1,4 +1,4 @@
-// A file's content under work: what stays of the old file, and what is new.
+// The content of a file being edited, as ranges of the old file and new bytes.
 #pragma once
 
 #include <cstdint>
@@ -8,34 +8,34 @@
 
 namespace filetag::taglib {
 
-// Holds the new bytes only. Overwriting costs O(log pieces), since whole files of page headers are rewritten
-// by that; whatever moves the bytes behind it costs O(pieces).
+// Only the new bytes are held in memory. Overwriting costs O(log pieces), because every page header of an Ogg
+// file may be rewritten that way; an operation that moves the bytes behind it costs O(pieces).
 class CPieceTable {
 public:
     struct SPiece {
         int64_t size;
-        int64_t source; // offset in the old file, or among the new bytes
+        int64_t source; // offset in the old file or in the new bytes
         bool isNew;
     };
-    using Map = std::map<int64_t, SPiece>; // by position; without holes, no piece is empty
+    using Map = std::map<int64_t, SPiece>; // by position; no gaps, no empty pieces
 
     explicit CPieceTable(int64_t oldSize);
 
     int64_t getSize() const { return m_size; }
     bool isChanged() const { return m_changed; }
     const Map& getPieces() const { return m_pieces; }
-    // The piece that holds the position, or the end.
+    // The piece that contains the position, or end().
     Map::const_iterator find(int64_t position) const;
-    std::string_view getBytes(const SPiece& piece) const; // of a new one
+    std::string_view getBytes(const SPiece& piece) const; // the piece must be new
 
-    // Overwrites and extends; a gap before the position is filled with zeros.
+    // Overwrites bytes and extends the content if necessary; a gap before the position is filled with zeros.
     void write(int64_t position, std::string_view bytes);
-    // Puts the bytes in the place of `replaced` ones, fewer at the end.
+    // Replaces `replaced` bytes, or as many as there are before the end, with the given ones.
     void insert(int64_t position, std::string_view bytes, int64_t replaced);
-    void setSize(int64_t size); // cuts or extends with zeros
+    void setSize(int64_t size); // truncates, or extends with zeros
 
 private:
-    Map::iterator split(int64_t position); // the piece that starts there
+    Map::iterator split(int64_t position); // returns the piece that then starts there
     void erase(int64_t position, int64_t size);
     void enter(int64_t position, std::string_view bytes);
     void moveTail(int64_t position, int64_t distance);
@@ -43,7 +43,7 @@ private:
     int64_t m_size;
     bool m_changed = false;
     Map m_pieces;
-    std::string m_new; // only grows
+    std::string m_new; // append-only
 };
 
 } // namespace filetag::taglib

@@ -15,9 +15,9 @@ namespace {
 
 using namespace peru;
 
-// The unit in which the system keeps files in memory: a write that stays within one is done or not done.
+// Size of a page in the page cache: a write within one page happens completely or not at all.
 constexpr int64_t kPageSize = 4096;
-// Shorter ranges of the old file are gathered in memory; longer ones are copied inside the system.
+// Shorter ranges of the old file are copied through memory, longer ones inside the kernel.
 constexpr int64_t kCopiedInside = 128 * 1024;
 
 std::string getPath(const P<IURI>& file) {
@@ -35,7 +35,7 @@ std::string_view toView(const TagLib::ByteVector& bytes) {
 CTagLibIOStream::CTagLibIOStream(const P<IURI>& file) : m_uri(file), m_file(getPath(file).c_str(), true) {
     if (!m_file.isOpen()) {
         try {
-            getStreamManager()->getInStream(file); // tells the reason
+            getStreamManager()->getInStream(file); // throws with the reason
         } catch (const CStreamError& error) {
             throw CFileError(error.getDescription(), file);
         }
@@ -62,7 +62,7 @@ TagLib::ByteVector CTagLibIOStream::readBlock(unsigned long length) {
     return TagLib::ByteVector(bytes.data(), static_cast<unsigned int>(bytes.size()));
 }
 
-// The first change is where the position passes over from the file.
+// The first change takes over the position from the file.
 void CTagLibIOStream::writeBlock(const TagLib::ByteVector& data) {
     m_position = tell();
     change().write(m_position, toView(data));
@@ -102,7 +102,7 @@ long CTagLibIOStream::tell() const {
     return m_pieces ? m_position : m_file.tell();
 }
 
-// TagLib asks again and again; its own stream would go to the end and back each time.
+// TagLib calls this often, and its own stream would seek to the end and back every time.
 long CTagLibIOStream::length() {
     return m_pieces ? m_pieces->getSize() : m_oldSize;
 }
@@ -164,7 +164,7 @@ CTagLibIOStream::SRange CTagLibIOStream::findDifference() {
     return range;
 }
 
-// The pieces tell of the file that was opened and would tear any other.
+// The pieces refer to the file that was opened; combined with any other they would corrupt it.
 void CTagLibIOStream::checkUnchanged() const {
     std::error_code error;
     const auto time = std::filesystem::last_write_time(m_file.name(), error);
@@ -177,8 +177,8 @@ void CTagLibIOStream::checkUnchanged() const {
                          m_uri);
 }
 
-// Does not wait for the medium, which costs twenty times the rest: after a power failure the page is the old
-// or the new one, and either is a whole tag.
+// Does not sync, which would take twenty times as long as everything else: after a power failure the page is
+// either the old or the new one, and both contain a complete tag.
 void CTagLibIOStream::writePage(const SRange& range) {
     const auto write = [&](const std::string& bytes) {
         const P<ISeekableIOStream> stream = getStreamManager()->getSeekableIOStream(m_uri, EOpenMode::open);
@@ -194,7 +194,7 @@ void CTagLibIOStream::writePage(const SRange& range) {
         try {
             write(old);
         } catch (const CException&) {
-            // Nothing has reached the file, or the medium takes nothing more; the first error tells it.
+            // Either nothing was written or the medium no longer accepts writes; report the first error.
         }
         throw CFileError(error.getDescription(), m_uri);
     }

@@ -1,4 +1,4 @@
-// The file of a tag, as TagLib sees it.
+// The stream through which TagLib accesses a file.
 #pragma once
 
 #include "filetag/Api.h"
@@ -15,17 +15,18 @@ namespace filetag::taglib {
 
 using peru::P;
 
-// Reads from the file; what TagLib writes is kept in memory until commit(), so that the file on the disk
-// never is half changed. Nothing but IOStream's own operations is TagLib's to call.
+// Reads from the file. What TagLib writes stays in memory until commit(), so the file on disk is never partly
+// changed. TagLib calls only the operations of IOStream.
 class FILETAG_API CTagLibIOStream : public TagLib::IOStream {
 public:
-    // Throws CFileError when the file cannot be read.
+    // Throws CFileError if the file cannot be read.
     explicit CTagLibIOStream(const P<peru::IURI>& file);
     ~CTagLibIOStream() override;
 
-    // Brings the changes to the disk. A change within one page of the file is written in its place by one
-    // call, which nothing can tear; others cost a copy of the file, which then takes its place. Throws
-    // CFileError with the file as it was, also when another program has changed it since it was opened.
+    // Writes the changes to disk. A change within one page of the file is written in place by a single call,
+    // which cannot be torn; any other change makes a copy of the file, which then replaces it. Throws
+    // CFileError and leaves the file unchanged on failure, and also if another program has changed it since
+    // it was opened.
     void commit();
 
     TagLib::FileName name() const override;
@@ -33,7 +34,7 @@ public:
     void writeBlock(const TagLib::ByteVector& data) override;
     void insert(const TagLib::ByteVector& data, unsigned long start, unsigned long replace) override;
     void removeBlock(unsigned long start, unsigned long length) override;
-    bool readOnly() const override; // never: whether the user may write shows when it is done
+    bool readOnly() const override; // always false: missing permission is reported by commit()
     bool isOpen() const override;
     void seek(long offset, Position from) override;
     void clear() override;
@@ -49,7 +50,7 @@ private:
 
     CPieceTable& change();
     std::string readOld(int64_t offset, int64_t size);
-    // What differs from the old file, from the first byte to the last; the content is as long as that.
+    // The range from the first to the last byte that differs from the old file. Requires equal lengths.
     SRange findDifference();
     std::string readNew(const SRange& range);
     void checkUnchanged() const;
@@ -59,9 +60,9 @@ private:
     P<peru::IURI> m_uri;
     TagLib::FileStream m_file;
     int64_t m_oldSize = 0;
-    std::filesystem::file_time_type m_oldTime; // of the last change
-    std::optional<CPieceTable> m_pieces;       // from the first change on: most files are only read
-    int64_t m_position = 0;                    // once there are changes; the file's own before
+    std::filesystem::file_time_type m_oldTime; // modification time
+    std::optional<CPieceTable> m_pieces;       // set by the first change, since most files are only read
+    int64_t m_position = 0;                    // used once there are changes; before that the file's own
 };
 
 } // namespace filetag::taglib

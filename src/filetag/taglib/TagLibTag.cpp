@@ -32,9 +32,9 @@ void CTagLibTag::store() {
         throw CFileError(localize("filetag.CTagLibTag.NotOpened", "The tag of '%FILE%' is not open.",
                                   {{"%FILE%", getShownName(m_uri)}}),
                          m_uri);
-    // The stream goes in any case: after an error the objects and the file no longer tell the same.
+    // The stream is released in any case: after an error the objects no longer match the file.
     const std::unique_ptr<CTagLibIOStream> stream = std::move(m_stream);
-    // Without this TagLib would still bring an old kind of tag up to date.
+    // Without this check TagLib would still upgrade the tag to its newest version.
     if (!std::exchange(m_changed, false)) return;
     if (!save(*m_file))
         throw CFileError(localize("filetag.CTagLibTag.StoreError", "The tag of '%FILE%' could not be stored.",

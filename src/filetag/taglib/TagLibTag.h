@@ -1,4 +1,4 @@
-// What the tags on top of TagLib have in common.
+// Common base of the tags that use TagLib.
 #pragma once
 
 #include "filetag/ICoverArtFileTag.h"
@@ -13,8 +13,8 @@ namespace filetag::taglib {
 
 enum class EField { title, artist, album, albumArtist, trackNumber, year, genre, comment };
 
-// A derived class maps fields and pictures to its format; its destructor closes. Before open, and for a file
-// without a tag, fields are empty and there are no pictures.
+// A derived class maps fields and pictures to its format and calls close() in its destructor. Before open(),
+// and for a file without a tag, all fields are empty and there are no pictures.
 class CTagLibTag : public peru::CObject, public ICoverArtFileTag {
 public:
     bool isOpened() const override { return m_file != nullptr; }
@@ -43,17 +43,17 @@ public:
     void replaceCoverArt(int32_t index, const P<peru::CMemoryBlock>& data, const peru::CStringArg& mimeType,
                          EPictureType type) override;
 
-    // For pictures, which write through: something is to be stored.
+    // Called by pictures, which write through to the tag: there is something to store.
     void markChanged() const { m_changed = true; }
 
 protected:
     explicit CTagLibTag(const P<peru::IURI>& file) : m_uri(file) {}
 
-    // Reads the file through the stream, with its audio properties, and fetches the tags. Empty when the
-    // content is of another format.
+    // Reads the file through the stream, including its audio properties, and fetches the tags. Returns null
+    // if the content has another format.
     virtual std::unique_ptr<TagLib::File> openFile(TagLib::IOStream& stream) = 0;
-    virtual void dropTags() = 0; // before the file goes
-    // Both are called for an open tag only. The empty text removes the field.
+    virtual void dropTags() = 0; // called before the file object is deleted
+    // Only called while the tag is open. Writing the empty text removes the field.
     virtual TagLib::String readField(EField field) const = 0;
     virtual void writeField(EField field, const TagLib::String& text) = 0;
     virtual bool save(TagLib::File& file) { return file.save(); }
@@ -63,7 +63,7 @@ private:
     P<peru::IString> get(EField field) const;
 
     P<peru::IURI> m_uri;
-    std::unique_ptr<CTagLibIOStream> m_stream; // gone after store; outlives the file otherwise
+    std::unique_ptr<CTagLibIOStream> m_stream; // null after store; otherwise outlives m_file
     std::unique_ptr<TagLib::File> m_file;
     mutable bool m_changed = false;
 };

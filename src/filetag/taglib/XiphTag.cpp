@@ -4,7 +4,7 @@ namespace filetag::taglib {
 namespace {
 
 struct SNames {
-    const char* first; // is read before the second
+    const char* first; // takes precedence when reading
     const char* second;
 };
 
@@ -48,7 +48,7 @@ TagLib::String CXiphTag::readField(EField field) const {
 void CXiphTag::writeField(EField field, const TagLib::String& text) {
     if (!m_comment) return;
     const SNames names = getNames(field);
-    // A comment stays under the name that has it, since players know only one of the two.
+    // Keep the name that the file uses: most players know only one of the two.
     const bool underSecond = field == EField::comment && getFirst(*m_comment, names.first).isEmpty();
     m_comment->removeFields(names.first);
     if (names.second) m_comment->removeFields(names.second);

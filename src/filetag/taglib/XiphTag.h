@@ -1,4 +1,4 @@
-// The fields of a Vorbis comment, which FLAC and Ogg share.
+// The fields of a Vorbis comment, used by FLAC and Ogg.
 #pragma once
 
 #include "filetag/taglib/TagLibTag.h"
@@ -15,7 +15,7 @@ protected:
     TagLib::String readField(EField field) const override;
     void writeField(EField field, const TagLib::String& text) override;
 
-    TagLib::Ogg::XiphComment* m_comment = nullptr; // of the open file; empty for a file without one
+    TagLib::Ogg::XiphComment* m_comment = nullptr; // of the open file; null if it has none
 };
 
 } // namespace filetag::taglib

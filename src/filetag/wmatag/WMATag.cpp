@@ -15,11 +15,11 @@ using taglib::EField;
 namespace {
 
 constexpr char kPicture[] = "WM/Picture";
-// Title, artist and comment stand in an object whose lengths have 16 bits and count a zero at the end.
+// Title, artist and comment have 16-bit lengths in bytes that include a terminating zero.
 constexpr unsigned int kLongestText = 0xffff / 2 - 1;
 
-// The attribute that is written, empty for what TagLib keeps apart from attributes. The others are read where
-// it is missing, and go when the field is set: values after the first, and what other programs write.
+// `first` is the attribute that is written, null for the fields that TagLib stores separately. `others` are
+// read if it is missing and removed when the field is set: further values, and names that other programs use.
 struct SNames {
     const char* first;
     std::array<const char*, 2> others;
@@ -47,7 +47,7 @@ SNames getNames(EField field) {
     return {nullptr, {}};
 }
 
-// Some programs write numbers as numbers.
+// Some programs write numbers as integer attributes.
 TagLib::String toText(const TagLib::ASF::Attribute& attribute) {
     switch (attribute.type()) {
     case TagLib::ASF::Attribute::WordType:
@@ -125,7 +125,7 @@ void CWMATag::writeField(EField field, const TagLib::String& text) {
     }
 }
 
-// TagLib would write what is too long with a length that leads into the middle of it.
+// TagLib would write a truncated length for a longer text, and readers would continue in the middle of it.
 bool CWMATag::save(TagLib::File& file) {
     for (const TagLib::String& text : {m_tag->title(), m_tag->artist(), m_tag->comment()})
         if (text.size() > kLongestText)

@@ -19,7 +19,7 @@ public:
                      EPictureType type) override;
     void removeCoverArt(int32_t index) override;
 
-    // Pictures share their content with the tag's; one that was removed is written to in vain.
+    // A picture shares its data with the tag's attribute; writing to a removed one has no effect.
     bool holds(const TagLib::ASF::Picture*) const { return isOpened(); }
 
 protected:

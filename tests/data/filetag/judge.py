@@ -1,9 +1,9 @@
-"""Reads and writes tags with mutagen, so that another reader and writer judges ours.
+"""Reads and writes tags with mutagen, to check ours against another implementation.
 
-judge.py fields FILE...        the texts of each file, a list of JSON objects
-judge.py set FILE JSON         enters such texts, lists of them too
-judge.py extras FILE           enters what a file tag of ours does not know
-judge.py others FILE           all that is in the file besides the texts, as JSON
+judge.py fields FILE...        prints the texts of each file as a list of JSON objects
+judge.py set FILE JSON         sets such texts; a value may be a list
+judge.py extras FILE           adds fields, frames and blocks that our tags do not support
+judge.py others FILE           prints everything in the tag except the texts, as JSON
 """
 import hashlib
 import json
@@ -107,7 +107,7 @@ def get_others(name):
         if key.lower() in known or key == "WM/EncodingSettings":
             continue
         value = file.tags[key]
-        if kind == "asf":  # whose values have no order, and which has fields without text
+        if kind == "asf":  # values have no order, and some fields have no text
             value = sorted(value)
             if not str(value[0]):
                 continue
