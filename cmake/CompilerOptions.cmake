@@ -11,7 +11,7 @@ set(CMAKE_POSITION_INDEPENDENT_CODE ON)
 if(NOT CMAKE_BUILD_TYPE)
     set(CMAKE_BUILD_TYPE RelWithDebInfo CACHE STRING "Build type" FORCE)
 endif()
-# -O3 in place of -O2: the sample and character loops are written to be vectorised.
+# -O3 instead of -O2: the sample and character loops are written to be vectorised.
 set(CMAKE_CXX_FLAGS_RELWITHDEBINFO "-O3 -g -DNDEBUG")
 set(CMAKE_C_FLAGS_RELWITHDEBINFO "-O3 -g -DNDEBUG")
 
@@ -29,7 +29,7 @@ if(TONEWRIGHT_SANITIZERS)
     add_compile_definitions(TONEWRIGHT_SANITIZED)
 endif()
 if(TONEWRIGHT_FUZZERS)
-    # The libraries report what they run; a fuzzer that sees its own lines only tries inputs blindly.
+    # Coverage feedback from the libraries, not only from the target's own source file.
     add_compile_options(-fsanitize=fuzzer-no-link)
 endif()
 if(TONEWRIGHT_COVERAGE)
@@ -39,7 +39,8 @@ endif()
 
 find_program(TONEWRIGHT_CCACHE ccache)
 if(TONEWRIGHT_CCACHE AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
-    # Precompiled headers need the sloppiness; the base directory lets several checkouts share the cache.
+    # ccache needs this sloppiness to cache precompiled headers. The base directory lets several checkouts share
+    # one cache.
     set(launcher
         ${CMAKE_COMMAND} -E env CCACHE_SLOPPINESS=pch_defines,time_macros,include_file_mtime,include_file_ctime
         CCACHE_BASEDIR=${CMAKE_SOURCE_DIR} CCACHE_NOHASHDIR=1 ${TONEWRIGHT_CCACHE}

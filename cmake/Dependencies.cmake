@@ -1,4 +1,4 @@
-# What the system calls and does not contain. All of it are Debian packages: scripts/dependencies.txt.
+# External libraries. All of them are Debian packages, listed in scripts/dependencies.txt.
 find_package(PkgConfig REQUIRED)
 find_package(Threads REQUIRED)
 

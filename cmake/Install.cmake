@@ -1,5 +1,5 @@
-# What is installed where: the libraries in lib, plug-ins in lib/tonewright, companions in libexec/tonewright,
-# headers in include/tonewright, a pkg-config file and a CMake package.
+# Installation: libraries in lib, plug-ins in lib/tonewright, companions in libexec/tonewright, headers in
+# include/tonewright, a pkg-config file and a CMake package.
 include(CMakePackageConfigHelpers)
 
 if(NOT TARGET tonewright)
@@ -35,7 +35,7 @@ install(
     DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
     COMPONENT development
 )
-# Hosts and plug-ins written in C++ include "peru/..." and its like from here.
+# C++ hosts and plug-ins include "peru/...", "sonora2/..." and "filetag/..." from this directory.
 foreach(library peru sonora2 filetag)
     install(
         DIRECTORY ${CMAKE_SOURCE_DIR}/src/${library}
@@ -82,7 +82,7 @@ set(CPACK_DEBIAN_ENABLE_COMPONENT_DEPENDS ON)
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_NAME tonewright)
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION sound)
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_SHLIBDEPS ON)
-# The private libraries stand in the same package; they are found in the build tree while it is made.
+# The package contains these libraries itself; dpkg-shlibdeps finds them in the build tree.
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${TONEWRIGHT_LIBRARY_DIR})
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_NAME tonewright-dev)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)

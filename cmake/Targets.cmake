@@ -1,12 +1,12 @@
-# The kinds of target that the system consists of.
+# Functions that define the project's targets: libraries, plug-ins, tests, benchmarks and fuzzers.
 include(GoogleTest)
 
 set(TONEWRIGHT_LIBRARY_DIR ${CMAKE_BINARY_DIR}/lib)
 set(CMAKE_RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/bin)
 set(CMAKE_LIBRARY_OUTPUT_DIRECTORY ${TONEWRIGHT_LIBRARY_DIR})
 
-# tw_sources(VARIABLE [FOLDER...]): the sources of the calling folder, or of the folders given, each with the platform code
-# in its posix/.
+# tw_sources(VARIABLE [FOLDER...]): sets VARIABLE to the sources of the given folders (by default the current one),
+# including the platform code in their posix/.
 macro(tw_sources variable)
     set(folders ${ARGN})
     if(NOT folders)
@@ -20,12 +20,13 @@ macro(tw_sources variable)
     endforeach()
 endmacro()
 
-# A symbol that nobody defines is an error of the build and not of the first call. Sanitizers bring theirs later.
+# An undefined symbol fails the build instead of the first call. Sanitizer runtimes are only linked into the
+# executable, so their symbols are undefined here.
 if(NOT TONEWRIGHT_SANITIZERS)
     set(TONEWRIGHT_LINK_STRICTLY -Wl,--no-undefined)
 endif()
 
-# tw_library(NAME FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library, also known as tw::NAME.
+# tw_library(NAME FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library with the alias tw::NAME.
 function(tw_library name)
     cmake_parse_arguments(arg "" "" "FOLDERS;PUBLIC;PRIVATE" ${ARGN})
     tw_sources(sources ${arg_FOLDERS})
@@ -48,7 +49,7 @@ function(tw_library name)
     )
 endfunction()
 
-# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...]): one test binary of the calling folder's sources.
+# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...]): a test binary built from the current folder.
 function(tw_test name)
     cmake_parse_arguments(arg "" "" "FOLDERS;PRIVATE;LABELS" ${ARGN})
     tw_sources(sources ${arg_FOLDERS})
@@ -59,22 +60,22 @@ function(tw_test name)
     target_link_libraries(${name} PRIVATE ${arg_PRIVATE} GTest::gmock GTest::gtest_main)
     target_include_directories(${name} PRIVATE ${CMAKE_SOURCE_DIR}/tests)
     target_compile_definitions(${name} PRIVATE TONEWRIGHT_TEST_DATA="${CMAKE_SOURCE_DIR}/tests/data")
-    # A test is compiled more often than it runs long: twice as fast this way. Undefined behaviour is looked for in
-    # the code under test.
+    # Tests spend more time compiling than running, and -O1 halves the compile time. The undefined behaviour
+    # sanitizer covers the code under test only.
     target_compile_options(${name} PRIVATE -O1 -g1 -fno-sanitize=undefined)
     target_precompile_headers(${name} PRIVATE <gtest/gtest.h> <string> <vector>)
     gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 NO_PRETTY_VALUES PROPERTIES TIMEOUT 600 LABELS "${name};${arg_LABELS}")
 endfunction()
 
-# tw_benchmark(NAME lib...): one Google Benchmark binary of the calling folder's sources.
+# tw_benchmark(NAME lib...): a Google Benchmark binary built from the current folder.
 function(tw_benchmark name)
     tw_sources(sources)
     add_executable(${name} ${sources})
     target_link_libraries(${name} PRIVATE ${ARGN} benchmark::benchmark benchmark::benchmark_main)
 endfunction()
 
-# tw_fuzzer(NAME source... LIBRARIES lib... [RUNS count]): a libFuzzer target; its seeds are in fuzz/corpus/NAME.
-# The test runs it over the seeds and a bounded number of inputs made from them, which are kept in the build folder.
+# tw_fuzzer(NAME source... LIBRARIES lib... [RUNS count]): a libFuzzer target with seeds in fuzz/corpus/NAME. Its
+# test runs the seeds and a bounded number of mutations; new inputs are stored in the build directory.
 function(tw_fuzzer name)
     cmake_parse_arguments(arg "" "RUNS" "LIBRARIES" ${ARGN})
     if(NOT arg_RUNS)
@@ -91,7 +92,8 @@ function(tw_fuzzer name)
     set_tests_properties(${name} PROPERTIES LABELS fuzz TIMEOUT 600)
 endfunction()
 
-# tw_plugin(NAME lib...): a media plug-in of the calling folder's sources, found beside the front library.
+# tw_plugin(NAME lib...): a media plug-in built from the current folder and placed next to the front library, where
+# the plug-in handler looks for it.
 function(tw_plugin name)
     tw_sources(sources)
     add_library(${name} MODULE ${sources})

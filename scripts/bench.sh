@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
-# Whole jobs against their peers in one run, as ratios, then where start-up time goes and the benchmarks of parts.
-# Arguments go to bench/jobs/jobs.py: scripts/bench.sh --minutes 2 --only FLAC
+# Compares whole jobs with peer programs in the same run, then measures start-up and runs the benchmarks of parts.
+# Arguments are passed to bench/jobs/jobs.py, and then only that runs: scripts/bench.sh --minutes 2 --only FLAC
 set -euo pipefail
 
 cd "$(dirname "$0")/.."

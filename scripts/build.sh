@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# Everything from a fresh machine up to a built tree: build.sh [PRESET [TARGET...]]
+# Installs missing packages, configures and builds: build.sh [PRESET [TARGET...]]
 set -euo pipefail
 
 cd "$(dirname "$0")/.."

@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
-# The first thing to run: sets up, builds, converts real recordings into four formats, and mixes three of them.
-# Leaves the results in the folder given, or in build/demo.
+# A first demonstration: installs missing packages, builds, converts real recordings to four formats and mixes three
+# of them. The results go to the given folder, by default build/demo.
 set -euo pipefail
 
 cd "$(dirname "$0")/.."
@@ -27,7 +27,7 @@ for line in sys.stdin:
         print("%-28s %-12s %9.2f %10d %14.0f" % (name, event["codec"], event["duration"], event["bytes"], speed))
 '
 
-# An alarm that fades in and out, a voice above it and, behind a gap, a telephone at half its level.
+# An alarm that fades in and out with a voice over it and, after a gap, a telephone at half level.
 arrangement=docs/examples/arrangement.xml
 printf '\n%s mixed:\n' "$arrangement"
 "$tonewright" mix "$arrangement" -o "$target/mixed.flac" --force
@@ -35,7 +35,7 @@ printf '\n%s mixed:\n' "$arrangement"
 cat <<TEXT
 Its waveform is in $target/mixed.png.
 
-The files lie in $target. Go on with:
+The files are in $target. Some commands to try next:
   $tonewright --help
   $tonewright convert YOUR.flac -o YOUR.mp3 --quality 0.8
   $tonewright info $target/*

@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
-# Builds the fuzz targets and runs each over its seeds and a bounded number of inputs made from them. What was
-# found stays in build/fuzz/corpus and is tried again next time. Arguments go to ctest.
+# Builds the fuzz targets and runs each on its seeds and a bounded number of mutations. New inputs are stored in
+# build/fuzz/corpus and used again by the next run. Arguments are passed to ctest.
 set -euo pipefail
 
 cd "$(dirname "$0")/.."

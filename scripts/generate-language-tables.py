@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Writes src/zvr_lang_manager/LanguageTables.cpp from the JSON files of Debian's package iso-codes.
 
-The result is committed; run this again, with that package installed, when the standards change.
+The result is committed. Run this again, with iso-codes installed, when the standards change.
 """
 
 import json
@@ -25,7 +25,7 @@ for entry in json.loads((ISO / "iso_639-2.json").read_text())["639-2"]:
     code = entry["alpha_3"]
     if entry.get("bibliographic", code) != code:
         code = entry["bibliographic"] + "/" + code
-    # "qaa-qtz" is a range for local use and names no language.
+    # "qaa-qtz" is a range reserved for local use, not a language.
     if len(code) == 3 or "/" in code:
         languages.append((code, entry.get("alpha_2", ""), entry["name"]))
 countries = [

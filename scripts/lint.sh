@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# Checks the code with clang-tidy; arguments are files, by default every source but the tests.
+# Checks the given files with clang-tidy, by default all sources except tests.
 set -euo pipefail
 
 cd "$(dirname "$0")/.."

@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# Installs the packages of dependencies.txt that are missing; does nothing when none is.
+# Installs the packages listed in dependencies.txt that are missing.
 set -euo pipefail
 
 list="$(dirname "$0")/dependencies.txt"

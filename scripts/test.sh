@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
-# Builds and runs every test. Arguments go to ctest: scripts/test.sh -R Strings
-# TONEWRIGHT_PRESET=asan or tsan runs the same tests under a sanitizer.
+# Builds and runs all tests. Arguments are passed to ctest: scripts/test.sh -R Strings
+# TONEWRIGHT_PRESET=asan or tsan runs them under a sanitizer.
 set -euo pipefail
 
 cd "$(dirname "$0")/.."

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""Whole jobs beside their peers, in one run: processor time, wall time and peak memory as ratios.
+"""Compares whole jobs with peer programs in the same run: ratios of processor and wall time, and peak memory.
 
-Called by scripts/bench.sh; takes the build folder. A ratio below 1 means that we need less than the peer.
+Called by scripts/bench.sh with the build folder. A ratio below 1 means that Tonewright needs less than the peer.
 """
 
 import argparse
@@ -19,8 +19,8 @@ RATE = 44100
 
 
 def run(command):
-    """Processor seconds, wall seconds and peak resident KiB of one run."""
-    # The program "time" starts the command from a small process: a child of this one would inherit its peak.
+    """Runs a command; returns processor seconds, wall seconds and peak resident KiB."""
+    # A direct child of this process would inherit its peak memory; "time" is a small process.
     with tempfile.NamedTemporaryFile() as report:
         start = time.perf_counter()
         result = subprocess.run(
@@ -37,12 +37,12 @@ def run(command):
 
 
 def best(results):
-    """The least of each figure: what the job costs without the neighbours' noise."""
+    """The minimum of each figure over all runs, which is least affected by other load."""
     return tuple(min(column) for column in zip(*results))
 
 
 def make_material(work, minutes):
-    """Real recordings one after the other, repeated to the wanted length, over quiet noise."""
+    """Concatenates real recordings, repeats them up to the wanted length, and encodes the result."""
     wav = work / "material.wav"
     if not wav.exists():
         parts = []
@@ -67,7 +67,7 @@ def make_material(work, minutes):
 
 
 def sparse_silence(path, seconds):
-    """A WAV of silence that takes no room on the disk."""
+    """Writes a WAV file of silence as a sparse file."""
     size = seconds * RATE * 4
     header = b"RIFF" + (size + 36).to_bytes(4, "little") + b"WAVEfmt " + (16).to_bytes(4, "little")
     header += (1).to_bytes(2, "little") + (2).to_bytes(2, "little") + RATE.to_bytes(4, "little")
@@ -90,7 +90,7 @@ TAG_FILES, PROBE_FILES = 1000, 20
 
 
 def compare(title, repeat, ours, peer, theirs, prepare=lambda: None):
-    """One line of ratios. The commands may be functions that give a new command each time."""
+    """Prints one line of ratios. A command may be a function that returns a new command for each run."""
     pairs = []
     for _ in range(repeat):
         pair = []
@@ -120,7 +120,7 @@ def bench_tags(host, work, wav, repeat):
         title = f"show, {TAG_FILES} {extension} files"
         ours = [host, "tag", "show", "--json", *files]
         compare(title, repeat, ours, "mutagen", ["/usr/bin/python3", "-c", MUTAGEN_SHOW, *files])
-        # A process for each file, as there is no other way: of fewer files.
+        # ffprobe takes one file per process, so it gets fewer files.
         few = files[:PROBE_FILES]
         compare(f"show, {PROBE_FILES}", repeat, [host, "tag", "show", "--json", *few], "ffprobe", ["sh", "-c", PROBE_SHOW, "sh", *few])
 
@@ -148,7 +148,7 @@ def bench_tags(host, work, wav, repeat):
 
 
 def make_tracks(work, wav, minutes, count):
-    """Stereo files, each the material from another place on."""
+    """Makes stereo files, each the material rotated by a different offset."""
     files = []
     for i in range(count):
         files.append(work / f"track{i}.wav")
@@ -164,7 +164,7 @@ def write_arrangement(path, files, seconds):
 
 
 def bench_mixing(host, work, wav, minutes, repeat):
-    """Files of a fifth of the length, as there are up to 32 of them."""
+    """Mixes up to 32 files, each a fifth of the material's length."""
     part = work / "part.wav"
     seconds = minutes * 12
     subprocess.run(["sox", wav, part, "trim", "0", str(seconds)], check=True)
@@ -193,7 +193,7 @@ def main():
     parser.add_argument("build", type=pathlib.Path)
     parser.add_argument("--minutes", type=int, default=10, help="length of the material")
     parser.add_argument("--repeat", type=int, default=3, help="runs of each job, interleaved with its peer")
-    parser.add_argument("--only", default="", help="jobs whose name holds this text; tags and mixing for those")
+    parser.add_argument("--only", default="", help="only jobs whose name contains this text; \"tags\" and \"mixing\" select those groups")
     arguments = parser.parse_args()
 
     host = arguments.build / "bin/tonewright"

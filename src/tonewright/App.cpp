@@ -16,7 +16,7 @@ using sonora2::common::ISonoraContext;
 
 namespace {
 
-// What the flag words switch on is the plug-ins' matter.
+// Passed to the plug-ins, which interpret them.
 constexpr uint64_t kReadFlags = 0x23E8;
 constexpr uint64_t kWriteFlags = 0x3C8;
 

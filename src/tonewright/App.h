@@ -1,4 +1,4 @@
-// The application object: what stands behind the exports.
+// The application object, the state that the exports share.
 #pragma once
 
 #include "peru/threads/IMutex.h"
@@ -15,22 +15,22 @@ namespace tonewright {
 
 using peru::P;
 
-// What the library can do, for the host, which reads the flags by position.
+// Feature flags of the library. Hosts read them by position.
 struct __attribute__((packed)) SFeatures {
     uint32_t size = sizeof(SFeatures);
     uint8_t flags[5] = {1, 1, 1, 1, 1};
 };
 static_assert(sizeof(SFeatures) == 9);
 
-// A singleton of the global object factory. Started and shut down by one thread while no other uses it; in
-// between its operations are safe from any thread, unless told otherwise.
+// A singleton of the global object factory. init and shutdown must not run concurrently with anything else;
+// between them all operations are thread-safe unless stated otherwise.
 class CApp : public peru::CObject {
 public:
     static P<CApp> get();
 
-    // Makes contexts, plug-in handlers and the autoplay canceller. False after a failure, which is in the
-    // log; what was made before it stays. Throws what the canceller throws. A started application stays as
-    // it is.
+    // Creates contexts, plug-in handlers and the autoplay canceller. Logs a failure and returns false;
+    // objects created before it remain. Exceptions of the canceller propagate. No effect when already
+    // started.
     bool init();
     void shutdown();
 
@@ -39,14 +39,14 @@ public:
     P<sonora2::common::ISonoraContext> getWriteContext() const { return require(m_writeContext); }
     P<sonora2::common::CPluginHandler> getReadPluginHandler() const { return require(m_readPluginHandler); }
     P<sonora2::common::CPluginHandler> getWritePluginHandler() const { return require(m_writePluginHandler); }
-    // Keeps plug-in and source state from being opened and closed by two threads at the same time.
+    // Serialises opening and closing of plug-ins and sources.
     P<peru::IMutex> getServiceLock() const { return require(m_serviceLock); }
 
     P<peru::IURI> getProgramFolder() const { return m_programFolder; }
     P<peru::IURI> getProductDataFolder() const { return m_productDataFolder; }
     const SFeatures& getFeatures() const { return m_features; }
 
-    // Both belong to the host's window thread.
+    // Language and user data path are only accessed by the host's window thread.
     void setLanguageId(const zvr_lang::SLanguageId& id) { m_languageId = id; }
     const zvr_lang::SLanguageId& getLanguageId() const { return m_languageId; }
     void setUserDataPath(const P<peru::IString>& path) { m_userDataPath = path; }
@@ -70,7 +70,7 @@ private:
     const SFeatures m_features;
     zvr_lang::SLanguageId m_languageId;
     P<peru::IString> m_userDataPath;
-    P<sonora2::common::ILogManager> m_logProxy; // both contexts write to it
+    P<sonora2::common::ILogManager> m_logProxy; // used by both contexts
     P<sonora2::common::ISonoraContext> m_readContext;
     P<sonora2::common::ISonoraContext> m_writeContext;
     P<sonora2::common::CPluginHandler> m_readPluginHandler;
@@ -79,7 +79,7 @@ private:
     P<peru::IURI> m_programFolder;
     P<peru::IURI> m_productDataFolder;
     std::atomic<TONEWRIGHT_DriveChangedCallback> m_driveChanged{nullptr};
-    P<cap::CCancelAutoplay2> m_cancelAutoplay; // the last thing that init makes
+    P<cap::CCancelAutoplay2> m_cancelAutoplay; // created last, so it marks a complete init
 };
 
 } // namespace tonewright

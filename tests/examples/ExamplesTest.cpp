@@ -38,7 +38,7 @@ TEST(Examples, Covers_AddsListsAndExtractsWhatPeersSee) {
          "pictures = mutagen.File('a.mp3').tags.getall('APIC')\n"
          "assert [(p.type, p.mime) for p in pictures] == [(3, 'image/png'), (3, 'image/jpeg')]\n"
          "assert [p.data for p in pictures] == [open(f, 'rb').read() for f in ('red.png', 'blue.jpg')]\n"});
-    // Kinds without pictures, and what is no sound
+    // A format without pictures, a text file and a missing file
     for (const char* file : {"a.wav", "a.txt", "missing.flac"}) {
         if (file == std::string("a.wav"))
             succeed({"ffmpeg", "-v", "error", "-f", "lavfi", "-i", "sine=d=0.2", file});

@@ -1,7 +1,7 @@
 #include <stdio.h>
 #include <tonewright/tonewright.h>
 
-/* A path of ASCII letters as the "file:" URI that the library takes; relative to the current folder. */
+/* Widens an ASCII path, which serves as a URI reference relative to the current folder. */
 static const char16_t* uri(const char* path, char16_t* text) {
     size_t i = 0;
     for (; path[i]; ++i) text[i] = (char16_t)path[i];

@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
-# Installs into a folder of its own, builds a ten-line C host by pkg-config and by the CMake package, and converts
-# a file with each, and a C++ host of the tag library: run.sh BUILD_DIR SOURCE_DIR CMAKE
+# Installs to a temporary folder, builds a small C host with pkg-config and with the CMake package, converts a file
+# with each, and builds and runs a C++ host of the tag library: run.sh BUILD_DIR SOURCE_DIR CMAKE
 set -euo pipefail
 
 build=$1 source=$2 cmake=$3
@@ -23,7 +23,7 @@ for host in "$work/by-pkg-config" "$work/build/host"; do
     flac -t -s "$work/tone.flac"
 done
 
-# The installed program finds everything it needs by itself.
+# The installed program finds its libraries, plug-ins and companions without help from the environment.
 "$work/usr/bin/tonewright" convert --force "$work/tone.wav" -o "$work/tone.flac"
 flac -t -s "$work/tone.flac"
 
