@@ -1,8 +1,8 @@
 // Arrangements of an editor: XML files that tell which parts of which sounds are heard when.
 #pragma once
 
-#include "AudioFile.h"
 #include "Library.h"
+#include "SoundFile.h"
 
 #include <filesystem>
 #include <string>

@@ -11,14 +11,4 @@ bool isCancelled();
 // Called in the signal's handler when that happens; null: nothing is.
 void onCancel(void (*react)());
 
-// What the program tells its caller.
-enum EExitCode {
-    kExitSuccess = 0,
-    kExitFailure = 1, // at least one file failed
-    kExitUsage = 2,
-    kExitNoDevice = 3,  // no sound device, or not the wanted one
-    kExitNoLibrary = 4, // the library is missing or cannot be started
-    kExitCancelled = 130,
-};
-
 } // namespace host

@@ -1,9 +1,11 @@
-#include "AudioFile.h"
 #include "Cancel.h"
 #include "Commands.h"
 #include "EncodeJob.h"
+#include "ExitCodes.h"
+#include "Failure.h"
 #include "FileTag.h"
-#include "HostLog.h"
+#include "OutputPlace.h"
+#include "SoundFile.h"
 #include "Text.h"
 
 #include <algorithm>
@@ -31,13 +33,9 @@ private:
     struct SEnds {
         CHandle source;
         CHandle format;
-        SSampleFormat samples;
     };
 
     void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
-    std::string tellWhyNotReadable(const fs::path& input, const SSampleFormat& wanted) const;
-    std::string tellWhyNotWritable(const fs::path& input, const std::u16string& outputURI,
-                                   const fs::path& output) const;
     void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
                   CProgress::Job job);
     SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
@@ -75,44 +73,34 @@ std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) 
     return candidates;
 }
 
+// The format that the target can hold and that the user wants, and a source of it. A file that is converted
+// to its own format is opened once.
 CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& temporary,
                                        const fs::path& output) {
-    const std::u16string inputURI = toURI(input);
-    std::optional<SSampleFormat> writable; // the first that the target can hold
-    for (const SSampleFormat& samples : listCandidates(readSampleFormat(input))) {
-        CHandle format = createFormat(m_library, temporary, samples, m_options);
-        if (!format) continue;
-        CHandle source(m_library.CreateAudioSourceFromURI(inputURI.c_str(), samples.rate, samples.channels,
-                                                          samples.bytesPerSample, 1));
-        if (source) return {std::move(source), std::move(format), samples};
-        // A file that cannot be read at all is not tried in every other shape.
-        if (std::string reason = CHostLog::takeReason(); !reason.empty())
-            throw std::runtime_error(asReason(std::move(reason), input));
-        if (!writable) writable = samples;
+    SSoundFile sound = openSoundFile(input);
+    const std::u16string target = toURI(temporary);
+    const std::vector<SSampleFormat> candidates = listCandidates(sound.samples);
+    const auto fits = [&](const SSampleFormat& samples) {
+        return TONEWRIGHT_Host_CanWrite(target.c_str(), samples.rate, samples.channels,
+                                        samples.bytesPerSample) == 1;
+    };
+    const auto found = std::find_if(candidates.begin(), candidates.end(), fits);
+    const SSampleFormat samples = found == candidates.end() ? candidates.front() : *found;
+
+    SEnds ends;
+    ends.format = requireFormat(m_library, temporary, samples, m_options, output, output.string());
+    if (samples == sound.samples) {
+        ends.source = std::move(sound.source);
+        return ends;
     }
-    if (writable) throw std::runtime_error(tellWhyNotReadable(input, *writable));
-    throw std::runtime_error(tellWhyNotWritable(input, toURI(temporary), output));
-}
-
-// A kind that nobody reads is another matter than a conversion that its reader does not do.
-std::string CConverter::tellWhyNotReadable(const fs::path& input, const SSampleFormat& wanted) const {
-    const SSampleFormat own = readSampleFormat(input);
-    const CHandle source(m_library.CreateAudioSourceFromURI(toURI(input).c_str(), own.rate, own.channels,
-                                                            own.bytesPerSample, 0));
-    if (!source) return CHostLog::takeReadReason(input);
-    return "Cannot be converted from " + describe(own) + " to " + describe(wanted);
-}
-
-// An extension that nobody writes is another matter than a sound that it cannot hold.
-std::string CConverter::tellWhyNotWritable(const fs::path& input, const std::u16string& outputURI,
-                                           const fs::path& output) const {
-    const SSampleFormat usual;
-    const CHandle format(m_library.CreateAudioFormatFromURI(outputURI.c_str(), usual.rate, usual.channels,
-                                                            usual.bytesPerSample, 0.0, 0, 0, 0));
-    if (!format) return "No plug-in writes " + describeKind(output);
-    std::string reason = asReason(CHostLog::takeReason(), input);
-    if (!reason.empty()) return reason;
-    return output.string() + " cannot hold " + describe(listCandidates(readSampleFormat(input)).front());
+    sound.source.reset();
+    clearFailure();
+    ends.source = CHandle(m_library.CreateAudioSourceFromURI(toURI(input).c_str(), samples.rate,
+                                                             samples.channels, samples.bytesPerSample, 1));
+    if (!ends.source)
+        throw std::runtime_error(takeFailure(
+            "Cannot be converted from " + describe(sound.samples) + " to " + describe(samples), input));
+    return ends;
 }
 
 // A tag that cannot be read does not keep the sound from being converted; what the output's kind of tag does

@@ -1,33 +1,22 @@
 #include "Devices.h"
+#include "ExitCodes.h"
 
 #include "Cancel.h"
 #include "Commands.h"
 #include "Text.h"
-#include "peru/media/Errors.h"
-#include "peru/media/ISystem.h"
-#include "peru/strings/String.h"
 
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <string_view>
+#include <tonewright/host.h>
 #include <unistd.h>
-#include <utility>
 
 namespace host {
 
-using peru::P;
-using peru::media::IAudioDevice;
-using peru::media::IAudioInDevice;
-using peru::media::IAudioOutDevice;
-
 namespace {
 
-std::string toText(const P<peru::IString>& text) {
-    return text ? peru::CString::toStdString(text) : std::string();
-}
-
-// What of a line is not the sound engine's goes to standard error.
+// Passes on everything but the sound engine's own lines.
 ssize_t writeUnlessEngines(void*, const char* data, size_t size) {
     if (std::string_view(data, size).starts_with("Expression '")) return static_cast<ssize_t>(size);
     for (size_t done = 0; done < size;) {
@@ -38,8 +27,8 @@ ssize_t writeUnlessEngines(void*, const char* data, size_t size) {
     return static_cast<ssize_t>(size);
 }
 
-// The engine prints the source line of each error that it returns as well, on threads of its own, and cannot
-// be told not to. The descriptor stays what it is for everybody else.
+// The engine also prints the source line of each error that it returns, on threads of its own, and has no
+// switch for that. The file descriptor itself stays as it is.
 void hushEngine() {
     static FILE* const s_filter = [] {
         cookie_io_functions_t functions = {};
@@ -52,67 +41,75 @@ void hushEngine() {
 }
 
 // A sound system that cannot be reached has no devices.
-template <class Operation> auto ask(Operation operation) {
-    hushEngine();
-    try {
-        return operation(*peru::media::getSystem());
-    } catch (const peru::CException& error) {
-        throw CNoDevice("The sound system cannot be reached: " + toText(error.getDescription()));
-    }
+[[noreturn]] void throwUnreachable() {
+    TONEWRIGHT_Failure failure = {};
+    failure.size = sizeof failure;
+    TONEWRIGHT_Host_GetLastFailure(&failure);
+    throw CNoDevice("The sound system cannot be reached: " + std::string(failure.message));
 }
 
-void print(const IAudioDevice& device, const char* direction, bool json) {
-    const std::string id = toText(device.getId()), api = toText(device.getHostApi()),
-                      name = toText(device.getName());
+class CDeviceList {
+public:
+    explicit CDeviceList(int32_t direction) {
+        hushEngine();
+        m_list = CHandle(TONEWRIGHT_Host_ListDevices(direction));
+        if (!m_list) throwUnreachable();
+    }
+    int32_t getCount() const { return TONEWRIGHT_Host_GetDeviceCount(m_list.get()); }
+    TONEWRIGHT_DeviceInfo get(int32_t index) const {
+        TONEWRIGHT_DeviceInfo info = {};
+        info.size = sizeof info;
+        TONEWRIGHT_Host_GetDevice(m_list.get(), index, &info);
+        return info;
+    }
+
+private:
+    CHandle m_list;
+};
+
+void print(const TONEWRIGHT_DeviceInfo& device, const char* direction, bool json) {
     if (json)
         std::printf("%s\n", toLine({{"direction", direction},
-                                    {"id", id},
-                                    {"name", name},
-                                    {"api", api},
-                                    {"channels", device.getMaxChannelCount()},
-                                    {"default", device.isDefault()}})
+                                    {"id", device.id},
+                                    {"name", device.name},
+                                    {"api", device.api},
+                                    {"channels", device.channelCount},
+                                    {"default", device.isDefault != 0}})
                                 .c_str());
     else
-        std::printf("%-9s %4s %-8s %9d  %-10s  %s\n", direction, id.c_str(),
-                    device.isDefault() ? "default" : "", device.getMaxChannelCount(), api.c_str(),
-                    toPrintable(name).c_str());
+        std::printf("%-9s %4s %-8s %9d  %-10s  %s\n", direction, device.id, device.isDefault ? "default" : "",
+                    device.channelCount, device.api, toPrintable(device.name).c_str());
 }
 
 } // namespace
 
 void requireOutDevice() {
-    // What plays files has no need to answer within milliseconds, and with the few that the device asks for a
-    // busy machine lets gaps in. With more than a chunk of sound the beginning has one, and from 150 on the
-    // server's delay is told too short, so that the last samples may be cut off.
+    // A file player needs no answer within milliseconds, and with the small latency that the device asks for,
+    // a busy machine causes gaps. A latency above one chunk of sound causes a gap at the beginning, and from
+    // 150 ms on the server reports a delay that is too short, so that the last samples may be cut off.
     ::setenv("PULSE_LATENCY_MSEC", "100", 0);
-    if (!ask([](auto& system) { return system.getDefaultOutDevice(); }))
-        throw CNoDevice("There is no sound device to play on");
+    const CDeviceList devices(TONEWRIGHT_DEVICE_OUTPUT);
+    for (int32_t i = 0; i < devices.getCount(); ++i)
+        if (devices.get(i).isDefault) return;
+    throw CNoDevice("There is no sound device to play on");
 }
 
-P<IAudioInDevice> findInDevice(const std::string& id) {
-    return ask([&](auto& system) {
-        // Where none is the default one, others may still be named.
-        peru::WEnum<IAudioInDevice> devices = system.getInDevices();
-        P<IAudioInDevice> device = id.empty() ? system.getDefaultInDevice() : nullptr;
-        if (id.empty() ? !device : !devices.hasMore())
-            throw CNoDevice("There is no sound device to record from");
-        if (device) return device;
-        while (devices.hasMore()) {
-            device = devices.getNext();
-            if (toText(device->getId()) == id) return device;
-        }
-        throw CNoDevice("There is no input device " + toPrintable(id) + "; tonewright devices lists them");
-    });
+CHandle openInDevice(const std::string& id) {
+    if (CDeviceList(TONEWRIGHT_DEVICE_INPUT).getCount() == 0)
+        throw CNoDevice("There is no sound device to record from");
+    CHandle device(TONEWRIGHT_Host_OpenInputDevice(id.c_str()));
+    if (device) return device;
+    if (id.empty()) throw CNoDevice("There is no sound device to record from");
+    throw CNoDevice("There is no input device " + toPrintable(id) + "; tonewright devices lists them");
 }
 
 int listDevices(bool json) {
-    const auto [outs, ins] =
-        ask([](auto& system) { return std::pair(system.getOutDevices(), system.getInDevices()); });
-    if (!outs.hasMore() && !ins.hasMore()) throw CNoDevice("There is no sound device");
+    const CDeviceList outs(TONEWRIGHT_DEVICE_OUTPUT), ins(TONEWRIGHT_DEVICE_INPUT);
+    if (outs.getCount() == 0 && ins.getCount() == 0) throw CNoDevice("There is no sound device");
     if (!json)
         std::printf("%-9s %4s %-8s %9s  %-10s  %s\n", "direction", "id", "", "channels", "host API", "name");
-    for (auto devices = outs; devices.hasMore();) print(*devices.getNext(), "output", json);
-    for (auto devices = ins; devices.hasMore();) print(*devices.getNext(), "input", json);
+    for (int32_t i = 0; i < outs.getCount(); ++i) print(outs.get(i), "output", json);
+    for (int32_t i = 0; i < ins.getCount(); ++i) print(ins.get(i), "input", json);
     flushOutput();
     return kExitSuccess;
 }

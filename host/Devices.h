@@ -2,8 +2,6 @@
 #pragma once
 
 #include "Library.h"
-#include "peru/IInstanceWrapper.h"
-#include "peru/media/IAudioInDevice.h"
 
 #include <stdexcept>
 #include <string>
@@ -19,18 +17,6 @@ struct CNoDevice : std::runtime_error {
 void requireOutDevice();
 
 // The input device with that id, the default one for an empty id. Throws CNoDevice.
-peru::P<peru::media::IAudioInDevice> findInDevice(const std::string& id);
-
-// A handle of a device for the library, for one call.
-class CDeviceHandle {
-public:
-    explicit CDeviceHandle(const peru::P<peru::media::IAudioInDevice>& device) : m_wrapper(device) {}
-    TONEWRIGHT_Handle get() {
-        return reinterpret_cast<TONEWRIGHT_Handle>(static_cast<peru::IInstanceWrapper*>(&m_wrapper));
-    }
-
-private:
-    peru::CInstanceWrapper m_wrapper;
-};
+CHandle openInDevice(const std::string& id);
 
 } // namespace host

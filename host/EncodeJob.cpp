@@ -1,7 +1,7 @@
 #include "EncodeJob.h"
 
 #include "Cancel.h"
-#include "HostLog.h"
+#include "Failure.h"
 #include "Text.h"
 
 #include <algorithm>
@@ -30,8 +30,7 @@ bool onProgress(double fraction, int32_t) {
 
 // Messages name the file that the user knows.
 std::string tellReason(const SEncodeFiles& files, const std::string& temporaryEnding) {
-    std::string reason = CHostLog::takeReason();
-    if (reason.empty()) return "The conversion failed";
+    std::string reason = takeFailure("The conversion failed");
     const fs::path absolute = fs::absolute(files.temporary);
     for (const std::string& shown : {absolute.lexically_normal().native(), absolute.native()})
         replaceAll(reason, shown, files.output.native());
@@ -50,27 +49,22 @@ std::string setTemporaryEnding(CLibrary& library) {
 CHandle createFormat(CLibrary& library, const fs::path& temporary, const SSampleFormat& samples,
                      const SFormatOptions& options) {
     const double quality = options.quality ? std::max(*options.quality, 1e-9) : 0.0; // 0.0 means unset
-    CHostLog::takeReason();
+    clearFailure();
     return CHandle(library.CreateAudioFormatFromURI(toURI(temporary).c_str(), samples.rate, samples.channels,
                                                     samples.bytesPerSample, quality, options.bitRate,
                                                     options.minBitRate, options.maxBitRate));
 }
 
-// An extension that nobody writes is another matter than a sound that it cannot hold.
 CHandle requireFormat(CLibrary& library, const fs::path& temporary, const SSampleFormat& samples,
                       const SFormatOptions& options, const fs::path& output, const std::string& subject) {
     CHandle format = createFormat(library, temporary, samples, options);
     if (format) return format;
-    if (const std::string reason = CHostLog::takeReason(); !reason.empty())
-        throw std::runtime_error(asReason(reason, temporary));
-    if (createFormat(library, temporary, SSampleFormat(), options))
-        throw std::runtime_error(subject + " cannot hold " + describe(samples));
-    throw std::runtime_error("No plug-in writes " + describeKind(output));
+    throw std::runtime_error(takeFailure(subject + " cannot hold " + describe(samples), temporary));
 }
 
 bool encode(CLibrary& library, const CHandle& source, const CHandle& format, CProgress& progress,
             CProgress::Job job, const SEncodeFiles& files, const std::string& temporaryEnding) {
-    CHostLog::takeReason();
+    clearFailure();
     SRunning running{&progress, job};
     t_running = &running;
     int32_t result = TONEWRIGHT_ENCODER_FAILED;

@@ -1,8 +1,8 @@
 // What every command that writes a sound file does alike.
 #pragma once
 
-#include "AudioFile.h"
 #include "Commands.h"
+#include "SoundFile.h"
 
 #include <filesystem>
 #include <string>

@@ -1,6 +1,6 @@
 #include "FileTag.h"
 
-#include "HostLog.h"
+#include "Failure.h"
 #include "Text.h"
 
 #include <fstream>
@@ -33,11 +33,10 @@ const std::vector<STagField>& getTagFields() {
 
 CFileTag::CFileTag(CLibrary& library, const fs::path& file) : m_library(library), m_file(file) {
     if (isWideWav(file)) return;
-    CHostLog::takeReason();
+    clearFailure();
     m_tag = CHandle(library.CreateFileTag(toURI(file).c_str()));
     if (m_tag) return;
-    if (std::string reason = CHostLog::takeReason(); !reason.empty())
-        throw std::runtime_error(asReason(std::move(reason), file));
+    if (const std::string reason = takeFailure("", file); !reason.empty()) throw std::runtime_error(reason);
 }
 
 std::u16string CFileTag::get(const STagField& field) const {
@@ -51,10 +50,9 @@ void CFileTag::set(const STagField& field, const std::u16string& text) {
 }
 
 void CFileTag::store() {
-    CHostLog::takeReason();
+    clearFailure();
     if (m_library.StoreFileTag(m_tag.get()) == TONEWRIGHT_OK) return;
-    const std::string reason = CHostLog::takeReason();
-    throw std::runtime_error(reason.empty() ? "The tag could not be written" : asReason(reason, m_file));
+    throw std::runtime_error(takeFailure("The tag could not be written", m_file));
 }
 
 } // namespace host

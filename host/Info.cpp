@@ -1,7 +1,8 @@
-#include "AudioFile.h"
 #include "Cancel.h"
 #include "Commands.h"
-#include "HostLog.h"
+#include "ExitCodes.h"
+#include "Failure.h"
+#include "SoundFile.h"
 #include "Text.h"
 
 #include <algorithm>
@@ -16,22 +17,12 @@ namespace fs = std::filesystem;
 
 namespace {
 
-struct SInfo {
-    SSampleFormat samples;
-    double duration = 0;
-    uint64_t bytes = 0;
-};
+std::string codecOf(const SSoundFile& sound, const fs::path& file) {
+    return *sound.info.codec ? sound.info.codec : codecName(file);
+}
 
-SInfo readInfo(CLibrary& library, const fs::path& file) {
-    checkInput(file);
-    CHostLog::takeReason();
-    SInfo info{readSampleFormat(file), 0, fs::file_size(file)};
-    const SSampleFormat& samples = info.samples;
-    CHandle source(library.CreateAudioSourceFromURI(toURI(file).c_str(), samples.rate, samples.channels,
-                                                    samples.bytesPerSample, 1));
-    if (source) info.duration = library.AudioSource_GetDuration(source.get());
-    if (!source || info.duration < 0) throw std::runtime_error(CHostLog::takeReadReason(file));
-    return info;
+std::string formatBitRate(int64_t bitsPerSecond) { // 320 kbit/s
+    return bitsPerSecond > 0 ? std::to_string((bitsPerSecond + 500) / 1000) + " kbit/s" : "-";
 }
 
 } // namespace
@@ -63,23 +54,28 @@ int forEachFile(const std::vector<fs::path>& files, bool json, EReader reader,
 int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
     bool hasHeading = json;
     return forEachFile(files, json, EReader::needed, [&](const fs::path& file) {
-        const SInfo info = readInfo(library, file);
+        const SSoundFile sound = openSoundFile(file);
+        const TONEWRIGHT_MediaInfo& info = sound.info;
+        const uint64_t bytes = fs::file_size(file);
         if (!std::exchange(hasHeading, true))
-            std::printf("%11s %7s %8s %5s %10s  %s\n", "duration", "rate", "channels", "bits", "size",
-                        "file");
+            std::printf("%11s %7s %8s %5s %10s %10s  %-12s  %s\n", "duration", "rate", "channels", "bits",
+                        "bit rate", "size", "codec", "file");
         if (json)
             std::printf("%s\n", toLine({{"file", file.native()},
-                                        {"codec", codecName(file)},
+                                        {"codec", codecOf(sound, file)},
                                         {"duration", info.duration},
-                                        {"rate", info.samples.rate},
-                                        {"channels", info.samples.channels},
-                                        {"bits", info.samples.bytesPerSample * 8},
-                                        {"bytes", info.bytes}})
+                                        {"rate", info.sampleRate},
+                                        {"channels", info.channelCount},
+                                        {"bits", info.bytesPerSample * 8},
+                                        {"bit_rate", info.bitRate},
+                                        {"bytes", bytes},
+                                        {"plugin", info.plugin}})
                                     .c_str());
         else
-            std::printf("%11s %7d %8d %5d %10s  %s\n", formatDuration(info.duration).c_str(),
-                        info.samples.rate, info.samples.channels, info.samples.bytesPerSample * 8,
-                        formatSize(info.bytes).c_str(), toPrintable(file.native()).c_str());
+            std::printf("%11s %7d %8d %5d %10s %10s  %-12s  %s\n", formatDuration(info.duration).c_str(),
+                        info.sampleRate, info.channelCount, info.bytesPerSample * 8,
+                        formatBitRate(info.bitRate).c_str(), formatSize(bytes).c_str(),
+                        codecOf(sound, file).c_str(), toPrintable(file.native()).c_str());
     });
 }
 
@@ -88,8 +84,7 @@ int listFormats(CLibrary& library, bool json) {
     std::set<std::string> names;
     for (int32_t i = 0; i < library.getExtensionCount(extensions.get()); ++i) {
         CHandle text(library.getExtension(extensions.get(), i));
-        if (text)
-            names.insert(toUTF8({TONEWRIGHT_GetText(text.get()), TONEWRIGHT_GetTextLength(text.get())}));
+        if (text) names.insert(toUTF8(TONEWRIGHT_GetText(text.get())));
     }
     if (json) {
         std::printf("%s\n", toLine({{"read", names}}).c_str());

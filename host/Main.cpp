@@ -3,6 +3,7 @@
 #include "Cancel.h"
 #include "Commands.h"
 #include "Devices.h"
+#include "ExitCodes.h"
 #include "FileTag.h"
 #include "HostLog.h"
 #include "Text.h"
@@ -17,19 +18,20 @@
 #include <map>
 #include <set>
 #include <thread>
+#include <tonewright/host.h>
 
 namespace {
 
 using namespace host;
 
 const std::map<std::string, int32_t> kLogLevels{
-    {"trace", peru::kLogTrace},     {"debug", peru::kLogDebug},
-    {"info", peru::kLogInfo},       {"warning", peru::kLogWarning},
-    {"error", peru::kLogException}, {"off", std::numeric_limits<int32_t>::max()}};
+    {"trace", TONEWRIGHT_LOG_TRACE},     {"debug", TONEWRIGHT_LOG_DEBUG},
+    {"info", TONEWRIGHT_LOG_INFO},       {"warning", TONEWRIGHT_LOG_WARNING},
+    {"error", TONEWRIGHT_LOG_EXCEPTION}, {"off", std::numeric_limits<int32_t>::max()}};
 
 using Run = std::function<int(CLibrary&)>;
 
-// A range lets what is none pass.
+// CLI::Range accepts NaN.
 std::string isNumber(const std::string& text) {
     return std::isnan(std::strtod(text.c_str(), nullptr)) ? "is not a number" : "";
 }

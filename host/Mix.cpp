@@ -3,6 +3,8 @@
 #include "Cancel.h"
 #include "Commands.h"
 #include "EncodeJob.h"
+#include "ExitCodes.h"
+#include "OutputPlace.h"
 
 #include <chrono>
 #include <stdexcept>

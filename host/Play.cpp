@@ -1,11 +1,12 @@
 #include "Arrangement.h"
-#include "AudioFile.h"
 #include "Cancel.h"
 #include "Commands.h"
 #include "Devices.h"
-#include "HostLog.h"
+#include "ExitCodes.h"
+#include "Failure.h"
 #include "Keyboard.h"
 #include "LiveLine.h"
+#include "SoundFile.h"
 #include "Text.h"
 
 #include <algorithm>
@@ -58,10 +59,10 @@ public:
     static bool isAnyAlive() { return s_alive > 0; }
 
     void play() { // returns at the end
-        CHostLog::takeReason();
+        clearFailure();
         m_failed = m_library.Player_Play(m_player.get()) != TONEWRIGHT_OK;
         if (m_failed) {
-            m_reason = CHostLog::takeReason();
+            m_reason = takeFailure("It cannot be played");
             m_library.Player_SetCallback(m_player.get(), nullptr);
         }
         m_ended = true;
@@ -95,7 +96,6 @@ public:
 
 private:
     CHandle makePlayer(const fs::path& file);
-    std::string findReason(const fs::path& file);
     void watch(const std::shared_ptr<CSession>& session);
     void show();
 
@@ -112,15 +112,6 @@ void CJukebox::show() {
     m_line.update(
         at + " / " + all + (isPaused ? "  paused" : ""), at + " of " + all,
         {{"position", position}, {"duration", duration}, {"state", isPaused ? "paused" : "playing"}});
-}
-
-// A player that cannot be made says of its file only that it does not open; a source of the file says why.
-std::string CJukebox::findReason(const fs::path& file) {
-    const std::string reason = CHostLog::takeReadReason(file);
-    const SSampleFormat samples;
-    const CHandle source(m_library.CreateAudioSourceFromURI(toURI(file).c_str(), samples.rate,
-                                                            samples.channels, samples.bytesPerSample, 0));
-    return source ? reason : CHostLog::takeReadReason(file);
 }
 
 // Shows and obeys until playing has ended.
@@ -146,14 +137,14 @@ void CJukebox::watch(const std::shared_ptr<CSession>& session) {
 CHandle CJukebox::makePlayer(const fs::path& file) {
     checkInput(file);
     if (!isArrangement(file)) {
-        CHostLog::takeReason();
+        clearFailure();
         CHandle player(m_library.CreatePlayerFromURI(toURI(file).c_str()));
-        if (!player) throw std::runtime_error(findReason(file));
+        if (!player) throw std::runtime_error(takeFailure("It cannot be played", file));
         return player;
     }
     const CHandle source = openArrangement(m_library, file, SSampleFormat());
     CHandle player(m_library.CreatePlayerFromAudioSource(source.get()));
-    if (!player) throw std::runtime_error(asReason(CHostLog::takeReason(), file));
+    if (!player) throw std::runtime_error(takeFailure("It cannot be played", file));
     return player;
 }
 
@@ -166,8 +157,7 @@ bool CJukebox::play(const fs::path& file) {
         watch(session);
         thread.join();
         if (session->hasFailed()) {
-            const std::string& reason = session->getReason();
-            throw std::runtime_error(reason.empty() ? "It cannot be played" : asReason(reason, file));
+            throw std::runtime_error(asReason(session->getReason(), file));
         }
     } catch (const std::exception& failure) {
         m_line.fail(failure.what());

@@ -1,11 +1,13 @@
-#include "AudioFile.h"
 #include "Cancel.h"
 #include "Commands.h"
 #include "Devices.h"
 #include "EncodeJob.h"
-#include "HostLog.h"
+#include "ExitCodes.h"
+#include "Failure.h"
 #include "Keyboard.h"
 #include "LiveLine.h"
+#include "OutputPlace.h"
+#include "SoundFile.h"
 #include "Text.h"
 
 #include <algorithm>
@@ -72,11 +74,11 @@ public:
 
     // Returns when it was stopped. Throws std::runtime_error for any other end; what was recorded until then
     // stays.
-    void run(const peru::P<peru::media::IAudioInDevice>& device);
+    void run(const CHandle& device);
 
 private:
-    CHandle openSource(const peru::P<peru::media::IAudioInDevice>& device);
-    void encode(const peru::P<peru::media::IAudioInDevice>& device);
+    CHandle openSource(const CHandle& device);
+    void encode(const CHandle& device);
     void watch(const std::atomic<bool>& hasEnded);
     uint64_t countBytes() const {
         std::error_code none;
@@ -91,16 +93,16 @@ private:
     CLiveLine& m_line;
 };
 
-CHandle CRecorder::openSource(const peru::P<peru::media::IAudioInDevice>& device) {
-    CHostLog::takeReason();
-    CHandle source(m_library.CreateAudioSoureFromAudioInDevice(CDeviceHandle(device).get(), m_samples.rate,
+CHandle CRecorder::openSource(const CHandle& device) {
+    clearFailure();
+    CHandle source(m_library.CreateAudioSoureFromAudioInDevice(device.get(), m_samples.rate,
                                                                m_samples.channels, m_samples.bytesPerSample));
     if (source) {
         m_library.AudioSource_SetRecordingCallback(source.get(), onRecorded);
         m_library.AudioSource_SetRecordingVolumeCallback(source.get(), onVolume);
         if (m_library.AudioSource_Open(source.get()) == TONEWRIGHT_OK) return source;
     }
-    const std::string reason = CHostLog::takeReason();
+    const std::string reason = takeFailure("");
     throw std::runtime_error("The sound device cannot record " + describe(m_samples) +
                              (reason.empty() ? "" : ": " + reason));
 }
@@ -122,7 +124,7 @@ void CRecorder::watch(const std::atomic<bool>& hasEnded) {
 }
 
 // Returns when the device delivers no more and all that it delivered is in the file.
-void CRecorder::encode(const peru::P<peru::media::IAudioInDevice>& device) {
+void CRecorder::encode(const CHandle& device) {
     const CHandle format =
         requireFormat(m_library, m_place.getTemporary(), m_samples, m_options, m_options.output, "It");
     const CHandle source = openSource(device);
@@ -131,19 +133,18 @@ void CRecorder::encode(const peru::P<peru::media::IAudioInDevice>& device) {
     std::string reason;
     std::atomic<bool> hasEnded{false};
     std::thread thread([&] {
-        CHostLog::takeReason();
+        clearFailure();
         result = m_library.AudioEncoder_Encode(encoder.get());
-        reason = CHostLog::takeReason();
+        reason = takeFailure("The recording failed");
         hasEnded = true;
     });
     watch(hasEnded);
     thread.join();
     if (result == TONEWRIGHT_OK) return;
-    throw std::runtime_error(reason.empty() ? "The recording failed"
-                                            : asReason(reason, m_place.getTemporary()));
+    throw std::runtime_error(asReason(reason, m_place.getTemporary()));
 }
 
-void CRecorder::run(const peru::P<peru::media::IAudioInDevice>& device) {
+void CRecorder::run(const CHandle& device) {
     g_told.limit = m_options.seconds;
     try {
         encode(device);
@@ -176,7 +177,7 @@ std::string toReason(const std::string& message, const fs::path& output) {
 } // namespace
 
 int record(CLibrary& library, const SRecordOptions& options) {
-    const peru::P<peru::media::IAudioInDevice> device = findInDevice(options.device);
+    const CHandle device = openInDevice(options.device);
     CLiveLine line(options.show, "output");
     line.start(options.output, nlohmann::json::object());
     try {

@@ -1,6 +1,6 @@
-#include "AudioFile.h"
 #include "Commands.h"
 #include "FileTag.h"
+#include "SoundFile.h"
 #include "Text.h"
 
 #include <cstdio>
@@ -27,13 +27,13 @@ void show(CLibrary& library, const fs::path& file, bool json) {
     const CFileTag tag = openTag(library, file);
     if (json) {
         nlohmann::json line{{"file", file.native()}};
-        for (const STagField& field : getTagFields()) line[field.key] = toUTF8(tag.get(field));
+        for (const STagField& field : getTagFields()) line[field.key] = toUTF8(tag.get(field).c_str());
         std::printf("%s\n", toLine(line).c_str());
         return;
     }
     std::string lines;
     for (const STagField& field : getTagFields()) {
-        const std::string text = toPrintable(toUTF8(tag.get(field)));
+        const std::string text = toPrintable(toUTF8(tag.get(field).c_str()));
         if (text.empty()) continue;
         std::string title = field.title;
         title.resize(kTitleColumns, ' ');

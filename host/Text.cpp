@@ -1,11 +1,14 @@
 #include "Text.h"
 
+#include <tonewright/host.h>
+
 #include <array>
 #include <cctype>
 #include <cerrno>
 #include <cmath>
 #include <cstdio>
 #include <cstring>
+#include <memory>
 #include <stdexcept>
 
 namespace host {
@@ -23,83 +26,28 @@ int hexDigit(char c) {
     return -1;
 }
 
-void appendUTF8(std::string& text, char32_t c) {
-    if (c < 0x80) {
-        text += static_cast<char>(c);
-    } else if (c < 0x800) {
-        text += static_cast<char>(0xC0 | c >> 6);
-        text += static_cast<char>(0x80 | (c & 0x3F));
-    } else if (c < 0x10000) {
-        text += static_cast<char>(0xE0 | c >> 12);
-        text += static_cast<char>(0x80 | (c >> 6 & 0x3F));
-        text += static_cast<char>(0x80 | (c & 0x3F));
-    } else {
-        text += static_cast<char>(0xF0 | c >> 18);
-        text += static_cast<char>(0x80 | (c >> 12 & 0x3F));
-        text += static_cast<char>(0x80 | (c >> 6 & 0x3F));
-        text += static_cast<char>(0x80 | (c & 0x3F));
-    }
-}
+struct SFree {
+    void operator()(void* memory) const { TONEWRIGHT_Host_Free(memory); }
+};
+template <class Char> using Owned = std::unique_ptr<Char, SFree>;
 
 } // namespace
 
 std::u16string toURI(const std::filesystem::path& path) {
-    static constexpr char kDigits[] = "0123456789ABCDEF";
-    std::u16string uri = u"file://";
-    const std::filesystem::path absolute = std::filesystem::absolute(path);
-    for (unsigned char c : absolute.native()) {
-        if (isPlain(c)) {
-            uri += static_cast<char16_t>(c);
-            continue;
-        }
-        uri += u'%';
-        uri += static_cast<char16_t>(kDigits[c >> 4]);
-        uri += static_cast<char16_t>(kDigits[c & 15]);
-    }
-    return uri;
+    const Owned<char16_t> uri(TONEWRIGHT_Host_PathToURI(path.c_str()));
+    if (!uri) throw std::runtime_error("The name cannot be used");
+    return uri.get();
 }
 
-std::string toUTF8(std::u16string_view text) {
-    std::string result;
-    result.reserve(text.size());
-    for (size_t i = 0; i < text.size(); ++i) {
-        char32_t c = text[i];
-        if (c >= 0xD800 && c < 0xE000) {
-            const bool paired =
-                c < 0xDC00 && i + 1 < text.size() && text[i + 1] >= 0xDC00 && text[i + 1] < 0xE000;
-            c = paired ? 0x10000 + ((c - 0xD800) << 10) + (text[++i] - 0xDC00) : 0xFFFD;
-        }
-        appendUTF8(result, c);
-    }
-    return result;
+std::string toUTF8(const char16_t* text) {
+    const Owned<char> utf8(TONEWRIGHT_Host_ToUTF8(text));
+    return utf8 ? utf8.get() : "";
 }
 
-std::optional<std::u16string> toUTF16(std::string_view utf8) {
-    std::u16string result;
-    for (size_t i = 0; i < utf8.size();) {
-        const unsigned char first = static_cast<unsigned char>(utf8[i++]);
-        const int more = first < 0x80                     ? 0
-                         : first >= 0xC2 && first < 0xE0  ? 1
-                         : first >= 0xE0 && first < 0xF0  ? 2
-                         : first >= 0xF0 && first <= 0xF4 ? 3
-                                                          : -1;
-        if (more < 0) return std::nullopt;
-        char32_t c = more == 0 ? first : first & (0x3F >> more);
-        for (int rest = more; rest > 0; --rest, ++i) {
-            if (i == utf8.size() || (utf8[i] & 0xC0) != 0x80) return std::nullopt;
-            c = c << 6 | (utf8[i] & 0x3F);
-        }
-        // Longer than needed, half of a pair, or beyond the last character
-        if ((more == 2 && c < 0x800) || (more == 3 && c < 0x10000) || (c >= 0xD800 && c < 0xE000) ||
-            c > 0x10FFFF)
-            return std::nullopt;
-        if (c >= 0x10000) {
-            result += static_cast<char16_t>(0xD7C0 + (c >> 10));
-            c = 0xDC00 + (c & 0x3FF);
-        }
-        result += static_cast<char16_t>(c);
-    }
-    return result;
+std::optional<std::u16string> toUTF16(const std::string& utf8) {
+    const Owned<char16_t> text(TONEWRIGHT_Host_ToUTF16(utf8.c_str()));
+    if (!text) return std::nullopt;
+    return text.get();
 }
 
 std::string toPrintable(std::string_view text) {

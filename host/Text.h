@@ -8,13 +8,12 @@
 
 namespace host {
 
-// The "file:" URI of a path, relative ones from the current folder. Every byte that is not plain ASCII in a
-// name is escaped, so that names need not be valid UTF-8.
+// The "file:" URI of a path, which need not be valid UTF-8; a relative path counts from the current folder.
 std::u16string toURI(const std::filesystem::path& path);
-// Empty for bytes that are no UTF-8.
-std::optional<std::u16string> toUTF16(std::string_view utf8);
+// Empty for bytes that are not UTF-8.
+std::optional<std::u16string> toUTF16(const std::string& utf8);
 // Unpaired surrogates become U+FFFD.
-std::string toUTF8(std::u16string_view text);
+std::string toUTF8(const char16_t* text);
 // For a line on a terminal: control characters are shown as \xNN.
 std::string toPrintable(std::string_view text);
 // "file:" URIs within a message as the paths they stand for.

@@ -1,7 +1,9 @@
-#include "AudioFile.h"
 #include "Cancel.h"
 #include "Commands.h"
-#include "HostLog.h"
+#include "ExitCodes.h"
+#include "Failure.h"
+#include "OutputPlace.h"
+#include "SoundFile.h"
 #include "Text.h"
 
 #include <algorithm>
@@ -126,16 +128,17 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     if (isSameFile(options.input, options.output))
         throw std::runtime_error("Input and output are the same file");
     COutputPlace place(options.output, ".part" + std::to_string(::getpid()), options.force);
-    SSampleFormat samples = readSampleFormat(options.input);
-    CHostLog::takeReason();
-    const auto createSource = [&](int channels) {
-        return CHandle(
-            library.CreateAudioSourceFromURI(toURI(options.input).c_str(), samples.rate, channels, 2, 1));
-    };
-    CHandle source = createSource(samples.channels);
-    if (!source && samples.channels > 2) source = createSource(samples.channels = 2);
-    const double duration = source ? library.AudioSource_GetDuration(source.get()) : -1;
-    if (duration < 0) throw std::runtime_error(CHostLog::takeReadReason(options.input));
+    SSoundFile sound = openSoundFile(options.input);
+    const SSampleFormat samples = sound.samples;
+    const double duration = sound.info.duration;
+    // The library draws sounds of 16 bits only.
+    if (samples.bytesPerSample != 2) {
+        sound.source.reset();
+        sound.source = CHandle(library.CreateAudioSourceFromURI(toURI(options.input).c_str(), samples.rate,
+                                                                samples.channels, 2, 1));
+        if (!sound.source) throw std::runtime_error(takeFailure("It cannot be read", options.input));
+    }
+    const CHandle& source = sound.source;
 
     const double frames = duration * samples.rate;
     const double step =
@@ -146,11 +149,7 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     const bool complete = library.AudioSource_FetchStreamSamples(source.get(), onSamples,
                                                                  (step + 0.5) / samples.rate, &wave) != 0;
     if (isCancelled()) return;
-    if (!complete) {
-        const std::string reason = CHostLog::takeReason();
-        throw std::runtime_error(reason.empty() ? "The samples could not be read"
-                                                : asReason(reason, options.input));
-    }
+    if (!complete) throw std::runtime_error(takeFailure("The samples could not be read", options.input));
     const CPicture picture = draw(wave, options.height);
     try {
         picture.write(place.getTemporary());

@@ -234,6 +234,24 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetRecordingProgress(TONEWRIGHT_Handle so
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetRecordingLevels(TONEWRIGHT_Handle source,
                                                           TONEWRIGHT_RecordingLevels callback, void* user);
 
+/* --- What a player program needs ------------------------------------------------------------------ */
+
+/* Any thread, also from the player's progress callback. */
+
+/* Continues at another time, playing or paused; sound that waits in the queue is dropped. On a stopped
+ * player: where the next TONEWRIGHT_Player_Play begins. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_SeekPlayer(TONEWRIGHT_Handle player, double seconds);
+/* A factor on the samples, effective at once; 1.0 leaves them unchanged. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetPlayerVolume(TONEWRIGHT_Handle player, double factor);
+/* Has a stopped player use the output device with that id. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetPlayerDevice(TONEWRIGHT_Handle player, const char* id);
+/* Plays the source after everything that is queued already, without a gap. 0, and nothing queued, when its
+ * format is not the current one's. To be called before the last second of the current source is heard. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_EnqueueSource(TONEWRIGHT_Handle player, TONEWRIGHT_Handle source);
+/* How many queued sources have begun to be heard; progress reports are about the one that is heard. -1 on
+ * failure. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetPlayerSourceIndex(TONEWRIGHT_Handle player);
+
 /* --- Arrangements -------------------------------------------------------------------------------- */
 
 /* An editor's XML for TONEWRIGHT_CreateAudioSourceFromEditorXml, read from a file: media that it names by

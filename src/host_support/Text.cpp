@@ -15,24 +15,31 @@ template <class Char> Char* duplicate(const std::basic_string<Char>& text) {
     return copy;
 }
 
-// The library reads UTF-8 leniently; a caller wants to know.
-bool isUTF8(const char* text) {
-    const auto* byte = reinterpret_cast<const unsigned char*>(text);
-    while (*byte) {
+// The library's own decoder is stricter than the standard (it rejects the lead bytes E0 and F0, which
+// includes every emoji), so that text from outside is decoded here. Throws CError for anything but
+// well-formed UTF-8.
+std::u16string decodeUTF8(const char* text) {
+    std::u16string result;
+    for (const auto* byte = reinterpret_cast<const unsigned char*>(text); *byte;) {
         const unsigned char first = *byte++;
-        if (first < 0x80) continue;
-        const int more = first >= 0xF0 ? 3 : first >= 0xE0 ? 2 : 1;
-        char32_t character = first & (0x3F >> more);
-        for (int i = 0; i < more; ++i, ++byte) {
-            if ((*byte & 0xC0) != 0x80) return false;
-            character = character << 6 | (*byte & 0x3F);
+        const int more = first < 0x80 ? 0 : first >= 0xF0 ? 3 : first >= 0xE0 ? 2 : 1;
+        char32_t character = more == 0 ? first : first & (0x3F >> more);
+        bool isValid = more == 0 || (first >= 0xC2 && first <= 0xF4);
+        for (int i = 0; isValid && i < more; ++i) {
+            isValid = (*byte & 0xC0) == 0x80;
+            if (isValid) character = character << 6 | (*byte++ & 0x3F);
         }
         static constexpr char32_t kLeast[] = {0, 0x80, 0x800, 0x10000};
         const bool isSurrogate = character >= 0xD800 && character < 0xE000;
-        if (first < 0xC2 || first > 0xF4 || character < kLeast[more] || isSurrogate || character > 0x10FFFF)
-            return false;
+        if (!isValid || character < kLeast[more] || isSurrogate || character > 0x10FFFF)
+            throw peru::CError("The text is not UTF-8");
+        if (character >= 0x10000) {
+            result += static_cast<char16_t>(0xD7C0 + (character >> 10));
+            character = 0xDC00 + (character & 0x3FF);
+        }
+        result += static_cast<char16_t>(character);
     }
-    return true;
+    return result;
 }
 
 } // namespace
@@ -67,10 +74,7 @@ char* TONEWRIGHT_Host_ToUTF8(const char16_t* text) {
 
 char16_t* TONEWRIGHT_Host_ToUTF16(const char* text) {
     if (!text) return nullptr;
-    return guard<char16_t*>(nullptr, [&]() -> char16_t* {
-        if (!isUTF8(text)) throw peru::CError("The text is not UTF-8");
-        return duplicate(peru::CString::toStdU16String(peru::CString::fromUTF8(text)));
-    });
+    return guard<char16_t*>(nullptr, [&] { return duplicate(decodeUTF8(text)); });
 }
 
 char16_t* TONEWRIGHT_Host_PathToURI(const char* path) {

@@ -1,6 +1,4 @@
-#include "AudioFile.h"
-
-#include "PlainHeader.h"
+#include "OutputPlace.h"
 
 #include <algorithm>
 #include <atomic>
@@ -11,13 +9,6 @@
 #include <stdexcept>
 #include <sys/stat.h>
 #include <unistd.h>
-
-// First, since the others lean on it.
-#include <taglib/fileref.h>
-
-#include <taglib/aiffproperties.h>
-#include <taglib/flacproperties.h>
-#include <taglib/wavproperties.h>
 
 namespace host {
 
@@ -39,69 +30,7 @@ fs::path nameTemporary(const fs::path& target, const std::string& ending) {
     return target.parent_path() / (name.substr(0, NAME_MAX - std::min<size_t>(end.size(), NAME_MAX)) + end);
 }
 
-int bitsPerSample(const TagLib::AudioProperties& properties) {
-    if (auto* wav = dynamic_cast<const TagLib::RIFF::WAV::Properties*>(&properties))
-        return wav->bitsPerSample();
-    if (auto* aiff = dynamic_cast<const TagLib::RIFF::AIFF::Properties*>(&properties))
-        return aiff->bitsPerSample();
-    if (auto* flac = dynamic_cast<const TagLib::FLAC::Properties*>(&properties)) return flac->bitsPerSample();
-    return 16;
-}
-
 } // namespace
-
-SSampleFormat readSampleFormat(const fs::path& file) {
-    if (const auto plain = readPlainHeader(file)) return *plain;
-    SSampleFormat format;
-    TagLib::FileRef reader(file.c_str(), true, TagLib::AudioProperties::Fast);
-    if (reader.isNull() || !reader.audioProperties()) return format;
-    const TagLib::AudioProperties& properties = *reader.audioProperties();
-    if (properties.sampleRate() > 0) format.rate = properties.sampleRate();
-    if (properties.channels() > 0) format.channels = properties.channels();
-    if (const int bits = bitsPerSample(properties); bits > 0)
-        format.bytesPerSample = std::clamp((bits + 7) / 8, 1, 4);
-    return format;
-}
-
-void checkInput(const fs::path& file) {
-    struct stat status;
-    if (::stat(file.c_str(), &status) != 0) throwSystem(errno);
-    if (S_ISDIR(status.st_mode)) throwSystem(EISDIR);
-    if (!S_ISREG(status.st_mode)) throw std::runtime_error("Is not a regular file");
-    if (status.st_size == 0) throw std::runtime_error("The file is empty");
-    if (::access(file.c_str(), R_OK) != 0) throwSystem(errno);
-}
-
-std::string describe(const SSampleFormat& samples) {
-    return std::to_string(samples.rate) + " Hz, " + std::to_string(samples.channels) +
-           (samples.channels == 1 ? " channel and " : " channels and ") +
-           std::to_string(samples.bytesPerSample * 8) + " bits";
-}
-
-std::string describeKind(const fs::path& file) {
-    return file.has_extension() ? file.extension().string() + " files" : "files without an extension";
-}
-
-std::string codecName(const fs::path& file) {
-    std::string extension = file.extension();
-    std::transform(extension.begin(), extension.end(), extension.begin(),
-                   [](unsigned char c) { return std::tolower(c); });
-    static constexpr struct {
-        const char* extension;
-        const char* codec;
-    } kCodecs[] = {{".flac", "FLAC"}, {".mp3", "MP3"},  {".ogg", "Ogg Vorbis"}, {".oga", "Ogg Vorbis"},
-                   {".wav", "WAV"},   {".wave", "WAV"}, {".aif", "AIFF"},       {".aiff", "AIFF"},
-                   {".au", "AU"},     {".snd", "AU"},   {".caf", "CAF"},        {".w64", "Wave64"},
-                   {".rf64", "RF64"}};
-    for (const auto& known : kCodecs)
-        if (extension == known.extension) return known.codec;
-    return extension.empty() ? "unknown" : extension.substr(1);
-}
-
-bool isSameFile(const fs::path& a, const fs::path& b) {
-    std::error_code none;
-    return fs::equivalent(a, b, none);
-}
 
 COutputPlace::COutputPlace(const fs::path& target, const std::string& temporaryEnding, bool replace)
     : m_target(target), m_replace(replace) {
