@@ -1,5 +1,6 @@
 #include "peru/threads/IMutex.h"
 #include "peru/threads/IThreadManager.h"
+#include "support/Environment.h"
 #include "support/Files.h"
 #include "support/TempFolder.h"
 
@@ -19,19 +20,23 @@ namespace {
 
 class GlobalMutex : public testing::Test {
 protected:
-    void SetUp() override {
-        std::filesystem::permissions(m_folder.path(), std::filesystem::perms::owner_all);
-        setenv("XDG_RUNTIME_DIR", m_folder.path().c_str(), 1);
+    ~GlobalMutex() override {
+        umask(m_mask);
+        EXPECT_EQ(files().size(), m_left) << "the last user removes the file";
+        for (const auto& file : files()) std::filesystem::remove(file);
     }
-    void TearDown() override { unsetenv("XDG_RUNTIME_DIR"); }
 
+    // Every test has names of its own.
+    static std::string unique(const std::string& name) {
+        return testing::UnitTest::GetInstance()->current_test_info()->name() + std::to_string(s_id) + name;
+    }
     static P<IMutex> open(const std::string& name) {
-        return getMutexFactory()->createGlobalMutex(CString::fromUTF8(name));
+        return getMutexFactory()->createGlobalMutex(CString::fromUTF8(unique(name)));
     }
     std::vector<std::filesystem::path> files() const {
         std::vector<std::filesystem::path> result;
-        for (const auto& entry : std::filesystem::directory_iterator(m_folder.path()))
-            result.push_back(entry.path());
+        for (const auto& entry : std::filesystem::directory_iterator("/dev/shm"))
+            if (entry.path().string().find(m_prefix) != std::string::npos) result.push_back(entry.path());
         return result;
     }
     // Runs `function` in a child process that ends without clean-up; returns the wait status.
@@ -54,8 +59,22 @@ protected:
         return runChild([name] { _exit(open(name)->tryLock() ? 0 : 1); }) == 0;
     }
 
+    static inline const pid_t s_id = getpid(); // of the parent
+    const std::string m_prefix = unique("");
+    const mode_t m_mask = umask(0077);
     tests::CTempFolder m_folder;
+    size_t m_left = 0;
 };
+
+TEST_F(GlobalMutex, ExcludesProcessesWithAnotherEnvironment) {
+    P<IMutex> mutex = open("environment");
+    mutex->lock();
+    for (const char* folder : {"/", m_folder.path().c_str(), ""}) {
+        const tests::CEnvironment environment("XDG_RUNTIME_DIR", *folder ? folder : nullptr);
+        EXPECT_FALSE(isFreeElsewhere("environment")) << folder;
+    }
+    mutex->unlock();
+}
 
 TEST_F(GlobalMutex, AbandonedByDeadProcess_NextOwnerGetsItWithoutError) {
     P<IMutex> mutex = open("abandoned");
@@ -119,6 +138,7 @@ TEST_F(GlobalMutex, IsReentrantAlsoThroughASecondHandle) {
 }
 
 TEST_F(GlobalMutex, LastHandleDroppedWhileLocked_StaysLockedUntilTheThreadEnds) {
+    m_left = 1; // it is still mapped
     std::thread([] {
         open("dropped")->lock();
         EXPECT_FALSE(isFreeElsewhere("dropped"));
@@ -141,10 +161,10 @@ TEST_F(GlobalMutex, AnyText_IsANameOfItsOwn) {
     for (const P<IMutex>& mutex : held) mutex->unlock();
 }
 
-TEST_F(GlobalMutex, Segment_IsPrivateAlsoUnderAnOpenMask) {
-    mode_t before = umask(0);
-    open("private");
-    umask(before);
+TEST_F(GlobalMutex, Segment_IsPrivateAndStaysForTheOtherUsers) {
+    umask(0);
+    P<IMutex> mutex = open("private");
+    ASSERT_TRUE(isFreeElsewhere("private")); // this user ends first and leaves the file
     ASSERT_EQ(files().size(), 1u);
     struct stat status;
     ASSERT_EQ(stat(files()[0].c_str(), &status), 0);
@@ -154,9 +174,10 @@ TEST_F(GlobalMutex, Segment_IsPrivateAlsoUnderAnOpenMask) {
 
 // Left behind by a process that died during initialisation, or from before a reboot.
 TEST_F(GlobalMutex, HalfMadeSegment_IsMadeAnew) {
-    open("half");
+    P<IMutex> made = open("half");
     std::filesystem::path file = files().at(0);
     const std::string ready = tests::readFile(file);
+    made.reset();
     std::string noStamp = ready, otherRun = ready;
     noStamp.replace(0, 4, 4, '\0');
     otherRun[10] ^= 1;                                                  // within the boot id
@@ -170,16 +191,17 @@ TEST_F(GlobalMutex, HalfMadeSegment_IsMadeAnew) {
 }
 
 TEST_F(GlobalMutex, WhatIsNotTheUsersOwnFile_IsRefused) {
-    open("refused");
+    P<IMutex> made = open("refused");
     std::filesystem::path file = files().at(0);
-    const std::string message = "Error createing global mutex refused";
+    made.reset();
+    const std::string message = "Error createing global mutex " + unique("refused");
     auto make = [] { open("refused"); };
 
+    std::ofstream(file) << "";
     chmod(file.c_str(), 0666);
     EXPECT_EQ(tests::errorOf(make), message);
-    std::filesystem::rename(file, m_folder / "elsewhere");
-    chmod((m_folder / "elsewhere").c_str(), 0600);
-    std::filesystem::create_symlink(m_folder / "elsewhere", file);
+    std::filesystem::remove(file);
+    std::filesystem::create_symlink(m_folder.write("elsewhere", ""), file);
     EXPECT_EQ(tests::errorOf(make), message);
     std::filesystem::remove(file);
     std::filesystem::create_directory(file);

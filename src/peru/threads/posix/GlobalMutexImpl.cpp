@@ -12,8 +12,10 @@ namespace {
 
 // Takes over a mutex from an owner that died. If this process dies before the call, the mutex stays
 // abandoned.
-int recover(pthread_mutex_t* mutex, int result) {
-    return result == EOWNERDEAD ? pthread_mutex_consistent(mutex) : result;
+int recover(CMutexSegment& segment, int result) {
+    if (result != EOWNERDEAD) return result;
+    segment.forgetLocks();
+    return pthread_mutex_consistent(segment.getMutex());
 }
 
 } // namespace
@@ -26,8 +28,7 @@ CGlobalMutexImpl::CGlobalMutexImpl(const P<IString>& name)
 CGlobalMutexImpl::~CGlobalMutexImpl() = default;
 
 void CGlobalMutexImpl::lock() {
-    pthread_mutex_t* mutex = m_segment->getMutex();
-    if (recover(mutex, pthread_mutex_lock(mutex)) != 0) throwLockError();
+    if (recover(*m_segment, pthread_mutex_lock(m_segment->getMutex())) != 0) throwLockError();
     m_segment->countLock();
 }
 
@@ -36,10 +37,9 @@ void CGlobalMutexImpl::unlock() {
 }
 
 bool CGlobalMutexImpl::tryLock() {
-    pthread_mutex_t* mutex = m_segment->getMutex();
-    int result = pthread_mutex_trylock(mutex);
+    const int result = pthread_mutex_trylock(m_segment->getMutex());
     if (result == EBUSY) return false;
-    if (recover(mutex, result) != 0) throwLockError();
+    if (recover(*m_segment, result) != 0) throwLockError();
     m_segment->countLock();
     return true;
 }

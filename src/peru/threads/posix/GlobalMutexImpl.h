@@ -11,9 +11,8 @@ namespace peru::posix {
 
 class CMutexSegment;
 
-// Stored in a small file that only the user may open, in $XDG_RUNTIME_DIR or, if that is not set, in
-// /dev/shm. The file remains when the last process has gone. If an owner dies, the next one gets the lock
-// without an error.
+// Stored in a small file in /dev/shm that only the user may open; the last process that uses it removes it.
+// If an owner dies, the next one gets the lock without an error. Thread-safe.
 class CGlobalMutexImpl : public CObject, public IMutex {
 public:
     // Any text is a valid name. Throws CException.

@@ -34,12 +34,6 @@ namespace {
 constexpr uint32_t kVersion = 1;
 constexpr size_t kLongestName = 150;
 
-bool isPrivateFolder(const char* path) {
-    struct stat status;
-    return path && path[0] == '/' && stat(path, &status) == 0 && S_ISDIR(status.st_mode) &&
-           status.st_uid == geteuid() && (status.st_mode & (S_IWGRP | S_IWOTH)) == 0;
-}
-
 // Maps each name to a distinct file name: characters that are special in paths are written in hexadecimal,
 // and a name that is too long is cut and ends in a hash of the whole name.
 std::string getFileName(const std::string& name) {
@@ -63,26 +57,55 @@ std::string getFileName(const std::string& name) {
     return result + '.' + std::to_string(name.size());
 }
 
+// The same for every process, whatever its environment: processes with different folders would not exclude
+// each other.
 std::string getPath(const std::string& name) {
-    const char* folder = std::getenv("XDG_RUNTIME_DIR");
-    return std::string(isPrivateFolder(folder) ? folder : "/dev/shm") + "/" + getFileName(name);
+    struct stat status;
+    const bool hasSharedMemory = ::stat("/dev/shm", &status) == 0 && S_ISDIR(status.st_mode);
+    return (hasSharedMemory ? "/dev/shm/" : "/tmp/") + getFileName(name);
 }
 
-// Excludes other processes during initialisation. Unlocks explicitly: a mapping would keep the lock alive
+bool isUsable(const struct stat& status) {
+    return S_ISREG(status.st_mode) && status.st_uid == ::geteuid() && (status.st_mode & 0077) == 0;
+}
+
+// Follows no link and accepts only a regular file owned by the user, so that nobody else with write access to
+// the folder can substitute the file.
+CFileHandle openFile(const std::string& path, int flags) {
+    CFileHandle file(::open(path.c_str(), O_RDWR | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | flags, 0600));
+    struct stat status;
+    if (file.isOpen() && (::fstat(file.get(), &status) != 0 || !isUsable(status))) file.close();
+    return file;
+}
+
+bool isRemoved(int file) {
+    struct stat status;
+    return ::fstat(file, &status) == 0 && status.st_nlink == 0;
+}
+
+// Held while a process starts or ends using the file. Unlocks explicitly: a mapping would keep the lock alive
 // after the file is closed.
 class CFileLock {
 public:
     explicit CFileLock(int descriptor) : m_descriptor(descriptor) {
-        do m_locked = flock(m_descriptor, LOCK_EX) == 0;
+        do m_locked = set(F_WRLCK);
         while (!m_locked && errno == EINTR);
     }
-    ~CFileLock() { flock(m_descriptor, LOCK_UN); }
+    ~CFileLock() { set(F_UNLCK); }
     CFileLock(const CFileLock&) = delete;
     CFileLock& operator=(const CFileLock&) = delete;
 
     bool isLocked() const { return m_locked; }
 
 private:
+    bool set(short type) const {
+        struct flock range = {};
+        range.l_type = type;
+        range.l_whence = SEEK_SET;
+        range.l_len = 1;
+        return ::fcntl(m_descriptor, F_OFD_SETLKW, &range) == 0;
+    }
+
     int m_descriptor;
     bool m_locked = false;
 };
@@ -136,26 +159,28 @@ bool CMutexSegment::prepare(SLayout& layout) {
 }
 
 CMutexSegment::SLayout* CMutexSegment::map(const std::string& path) {
-    // Follows no link and accepts only a regular file owned by the user, so that nobody else with write
-    // access to the folder can substitute the file.
-    CFileHandle file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600));
-    if (!file.isOpen()) return nullptr;
-    CFileLock lock(file.get());
-    if (!lock.isLocked()) return nullptr;
-    struct stat status;
-    if (fstat(file.get(), &status) != 0 || !S_ISREG(status.st_mode) || status.st_uid != geteuid() ||
-        (status.st_mode & 0077) != 0)
+    for (;;) {
+        const CFileHandle file = openFile(path, O_CREAT);
+        if (!file.isOpen()) return nullptr;
+        const CFileLock lock(file.get());
+        if (!lock.isLocked()) return nullptr;
+        if (isRemoved(file.get())) continue; // by its last user, while this process waited for the lock
+        struct stat status;
+        if (::fstat(file.get(), &status) != 0) return nullptr;
+        constexpr auto size = static_cast<off_t>(sizeof(SLayout));
+        // Allocated rather than only extended: a full disk is then an error here and not a SIGBUS on first
+        // access.
+        if (status.st_size < size && ::posix_fallocate(file.get(), 0, size) != 0) return nullptr;
+        // Marks the file as in use. The mapping keeps this lock alive after the file is closed, also in
+        // children.
+        if (::flock(file.get(), LOCK_SH | LOCK_NB) != 0) return nullptr;
+        void* memory = ::mmap(nullptr, sizeof(SLayout), PROT_READ | PROT_WRITE, MAP_SHARED, file.get(), 0);
+        if (memory == MAP_FAILED) return nullptr;
+        auto* layout = static_cast<SLayout*>(memory);
+        if (prepare(*layout)) return layout;
+        ::munmap(memory, sizeof(SLayout));
         return nullptr;
-    constexpr auto size = static_cast<off_t>(sizeof(SLayout));
-    // Allocated rather than only extended: a full disk is then an error here and not a SIGBUS on first
-    // access.
-    if (status.st_size < size && posix_fallocate(file.get(), 0, size) != 0) return nullptr;
-    void* memory = mmap(nullptr, sizeof(SLayout), PROT_READ | PROT_WRITE, MAP_SHARED, file.get(), 0);
-    if (memory == MAP_FAILED) return nullptr;
-    auto* layout = static_cast<SLayout*>(memory);
-    if (prepare(*layout)) return layout;
-    munmap(memory, sizeof(SLayout));
-    return nullptr;
+    }
 }
 
 std::shared_ptr<CMutexSegment> CMutexSegment::open(const std::string& name) {
@@ -168,14 +193,24 @@ std::shared_ptr<CMutexSegment> CMutexSegment::open(const std::string& name) {
     if (segment) return segment;
     SLayout* layout = map(path);
     if (layout) {
-        segment.reset(new CMutexSegment(layout));
+        segment.reset(new CMutexSegment(path, layout));
         entry = segment;
     }
     return segment;
 }
 
 CMutexSegment::~CMutexSegment() {
-    if (m_locks.load(std::memory_order_relaxed) == 0) munmap(m_layout, sizeof(SLayout));
+    if (m_locks.load(std::memory_order_relaxed) != 0) return;
+    const CFileHandle file = openFile(m_path, 0);
+    if (!file.isOpen()) {
+        ::munmap(m_layout, sizeof(SLayout));
+        return;
+    }
+    const CFileLock lock(file.get());
+    ::munmap(m_layout, sizeof(SLayout));
+    // Nobody starts using the file while this process holds the lock.
+    const bool isLastUser = ::flock(file.get(), LOCK_EX | LOCK_NB) == 0;
+    if (isLastUser && lock.isLocked() && !isRemoved(file.get())) ::unlink(m_path.c_str());
 }
 
 pthread_mutex_t* CMutexSegment::getMutex() const {

@@ -5,6 +5,7 @@
 #include <memory>
 #include <pthread.h>
 #include <string>
+#include <utility>
 
 namespace peru::posix {
 
@@ -20,16 +21,19 @@ public:
 
     pthread_mutex_t* getMutex() const;
     // If the segment object is destroyed while this process holds the mutex, the memory stays mapped because
-    // the owner's list still refers to it; the lock counts as abandoned when the owning thread ends.
+    // the owner's list still refers to it; the lock counts as abandoned when the owning thread ends. The file
+    // then stays until its next user removes it.
     void countLock() { m_locks.fetch_add(1, std::memory_order_relaxed); }
     void countUnlock() { m_locks.fetch_sub(1, std::memory_order_relaxed); }
+    void forgetLocks() { m_locks.store(0, std::memory_order_relaxed); } // those of an owner that died
 
 private:
     struct SLayout;
-    explicit CMutexSegment(SLayout* layout) : m_layout(layout) {}
+    CMutexSegment(std::string path, SLayout* layout) : m_path(std::move(path)), m_layout(layout) {}
     static SLayout* map(const std::string& path);
     static bool prepare(SLayout& layout);
 
+    const std::string m_path;
     SLayout* m_layout;
     std::atomic<int> m_locks{0};
 };
