@@ -1,8 +1,10 @@
 #include "crashhandler/CrashHandler.h"
 
+#include "crashhandler/Mappings.h"
 #include "crashhandler/MiniDump.h"
 #include "crashhandler/SafeWriter.h"
 #include "crashhandler/Threads.h"
+#include "peru/threads/AlternateStack.h"
 
 #include <atomic>
 #include <csignal>
@@ -16,7 +18,7 @@
 #include <limits>
 #include <sstream>
 #include <string>
-#include <sys/mman.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 namespace crashhandler {
@@ -41,7 +43,8 @@ struct SInstalled {
 
 SInstalled g_installed;
 bool g_isInstalled = false;
-std::atomic_flag g_crashed = ATOMIC_FLAG_INIT;
+std::atomic<pid_t> g_crashed{0};     // the thread that writes the files
+std::atomic<bool> g_finished{false}; // the files are complete
 char g_exception[1024] = {};
 SThreadState g_threads[kMaxThreads];
 
@@ -75,6 +78,21 @@ void onTerminate() {
     std::abort();
 }
 
+// The address and its place in the module's file. Names of functions would need the loader's lock, which
+// another thread may hold.
+void writeFrame(CSafeWriter& out, uintptr_t address) {
+    out.text("0x");
+    out.number(address, 16);
+    forEachMapping([&](const SMapping& mapping) {
+        if (address < mapping.start || address >= mapping.end || !mapping.path[0]) return;
+        out.text(" ");
+        out.text(mapping.path);
+        out.text("+0x");
+        out.number(address - mapping.start + mapping.offset, 16);
+    });
+    out.text("\n");
+}
+
 void writeReport(size_t signalIndex, const siginfo_t& signal, size_t threadCount) {
     CSafeWriter out(g_installed.report);
     out.text(g_installed.application);
@@ -99,27 +117,91 @@ void writeReport(size_t signalIndex, const siginfo_t& signal, size_t threadCount
     out.text("\n\nCalls, innermost first:\n");
     void* frames[128];
     const int count = ::backtrace(frames, std::size(frames));
-    if (out.isGood()) ::backtrace_symbols_fd(frames, count, out.getFile());
-    ::lseek(out.getFile(), 0, SEEK_END);
+    for (int i = 0; i < count; ++i) writeFrame(out, reinterpret_cast<uintptr_t>(frames[i]));
     out.text("\nModules:\n");
     out.writeFile("/proc/self/maps");
 }
 
-void onSignal(int number, siginfo_t* signal, void* context) {
+size_t getIndex(int signal) {
     size_t index = 0;
-    while (index + 1 < kSignalCount && kSignals[index] != number) ++index;
+    while (index + 1 < kSignalCount && kSignals[index] != signal) ++index;
+    return index;
+}
 
-    // A second crash, in another thread or in here, goes straight to the old handler.
-    if (!g_crashed.test_and_set()) {
-        const size_t threads = captureThreads(*static_cast<ucontext_t*>(context), g_threads, kMaxThreads);
-        {
-            CSafeWriter dump(g_installed.dump);
-            writeMiniDump(dump, *signal, g_threads, threads, g_installed.stackLimit);
-        }
-        writeReport(index, *signal, threads);
+void endProcess(int signal) {
+    std::signal(signal, SIG_DFL);
+    sigset_t set;
+    sigemptyset(&set);
+    sigaddset(&set, signal);
+    ::pthread_sigmask(SIG_UNBLOCK, &set, nullptr);
+    ::raise(signal);
+}
+
+// Ends the process if writing takes too long, such as on a file system that does not respond.
+class CWatchdog {
+public:
+    explicit CWatchdog(int signal) {
+        s_signal = signal;
+        struct sigaction action = {};
+        action.sa_handler = [](int) { endProcess(s_signal); };
+        action.sa_flags = SA_ONSTACK;
+        ::sigaction(SIGALRM, &action, &m_action);
+        sigset_t set;
+        sigemptyset(&set);
+        sigaddset(&set, SIGALRM);
+        ::pthread_sigmask(SIG_UNBLOCK, &set, &m_mask);
+        m_alarm = ::alarm(kLongestTime);
     }
+    ~CWatchdog() {
+        ::alarm(0);
+        ::pthread_sigmask(SIG_SETMASK, &m_mask, nullptr);
+        ::sigaction(SIGALRM, &m_action, nullptr);
+        ::alarm(m_alarm);
+    }
+    CWatchdog(const CWatchdog&) = delete;
+    CWatchdog& operator=(const CWatchdog&) = delete;
+
+private:
+    static constexpr unsigned kLongestTime = 30; // seconds
+    static inline int s_signal = 0;
+
+    struct sigaction m_action = {};
+    sigset_t m_mask = {};
+    unsigned m_alarm = 0;
+};
+
+// From here on crashes are the previous handlers' affair.
+void finish() {
+    ::alarm(0);
     for (size_t i = 0; i < kSignalCount; ++i) ::sigaction(kSignals[i], &g_installed.previous[i], nullptr);
-    const struct sigaction& previous = g_installed.previous[index];
+    g_finished = true;
+    releaseThreads();
+}
+
+void writeFiles(int number, const siginfo_t& signal, const ucontext_t& context) {
+    const CWatchdog watchdog(number);
+    const size_t threads = captureThreads(context, g_threads, kMaxThreads);
+    {
+        CSafeWriter dump(g_installed.dump);
+        writeMiniDump(dump, signal, g_threads, threads, g_installed.stackLimit);
+    }
+    writeReport(getIndex(number), signal, threads);
+    finish();
+}
+
+void onSignal(int number, siginfo_t* signal, void* context) {
+    const pid_t self = static_cast<pid_t>(::syscall(SYS_gettid));
+    pid_t writer = 0;
+    if (g_crashed.compare_exchange_strong(writer, self)) {
+        writeFiles(number, *signal, *static_cast<ucontext_t*>(context));
+    } else if (writer == self && !g_finished) {
+        finish(); // a crash while writing
+    } else {
+        // A second thread has crashed; the files of the first one come first.
+        const timespec pause{0, 1'000'000};
+        while (!g_finished) ::nanosleep(&pause, nullptr);
+    }
+    const struct sigaction& previous = g_installed.previous[getIndex(number)];
     if (previous.sa_flags & SA_SIGINFO)
         previous.sa_sigaction(number, signal, context);
     else if (previous.sa_handler != SIG_DFL && previous.sa_handler != SIG_IGN)
@@ -143,21 +225,11 @@ uintptr_t findStackStart() {
     return start ? start : std::numeric_limits<uintptr_t>::max();
 }
 
-void useAlternateStack() {
-    constexpr size_t kSize = 128 * 1024;
-    stack_t current = {};
-    if (::sigaltstack(nullptr, &current) == 0 && !(current.ss_flags & SS_DISABLE) && current.ss_size >= kSize)
-        return;
-    void* memory =
-        ::mmap(nullptr, kSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS | MAP_STACK, -1, 0);
-    if (memory == MAP_FAILED) return;
-    stack_t stack = {};
-    stack.ss_sp = memory;
-    stack.ss_size = kSize;
-    ::sigaltstack(&stack, nullptr);
-}
-
 } // namespace
+
+void useAlternateStack() {
+    peru::CAlternateStack::useForCurrentThread();
+}
 
 void install(const SNames& names) {
     copyText(g_installed.application, sizeof g_installed.application, names.application);
@@ -169,7 +241,7 @@ void install(const SNames& names) {
     g_installed.stackLimit = findStackStart();
     void* frame = nullptr;
     ::backtrace(&frame, 1); // loads its library now rather than in the handler
-    useAlternateStack();    // lets the handler run after a stack overflow of the calling thread
+    useAlternateStack();
     g_installed.previousTerminate = std::set_terminate(onTerminate);
     struct sigaction action = {};
     action.sa_sigaction = onSignal;

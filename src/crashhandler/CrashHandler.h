@@ -11,8 +11,15 @@ struct SNames {
 };
 
 // Installs handlers for the fatal signals and the terminate handler of the process. A crash writes both
-// files, replacing existing ones, then calls the previous handlers, so that the host's own still run. A
-// second call only changes the names. Must not be called by two threads at the same time.
+// files, replacing existing ones, then calls the previous handlers, so that the host's own still run. All
+// other threads stop while the files are written and continue afterwards; a process that cannot write them
+// within half a minute ends. Only the first crash is reported. A second call only changes the names. Must not
+// be called by two threads at the same time.
 void install(const SNames& names);
+
+// Lets the handler run after a stack overflow of the calling thread. install() does this, and so do all
+// threads that the library creates. A host's thread whose stack overflows leaves no files unless it has
+// called this: the signal has no stack to run on. Cheap after the first call of a thread.
+void useAlternateStack();
 
 } // namespace crashhandler

@@ -1,5 +1,6 @@
 #include "crashhandler/MiniDump.h"
 
+#include "crashhandler/Mappings.h"
 #include "crashhandler/SafeWriter.h"
 
 #include <algorithm>
@@ -123,59 +124,6 @@ enum EStream : uint32_t {
 constexpr size_t kMaxThreads = 256;
 constexpr size_t kMaxModules = 512;
 constexpr size_t kMaxStack = 256 * 1024;
-
-// One line of /proc/self/maps.
-struct SMapping {
-    uintptr_t start = 0;
-    uintptr_t end = 0;
-    uint64_t offset = 0;
-    char path[512] = {};
-};
-
-uint64_t parseHex(const char*& text) {
-    uint64_t value = 0;
-    for (;; ++text) {
-        const char c = *text;
-        if (c >= '0' && c <= '9')
-            value = value * 16 + static_cast<uint64_t>(c - '0');
-        else if (c >= 'a' && c <= 'f')
-            value = value * 16 + static_cast<uint64_t>(c - 'a' + 10);
-        else
-            return value;
-    }
-}
-
-SMapping parseMapping(const char* line) {
-    SMapping mapping;
-    mapping.start = parseHex(line);
-    ++line; // "-"
-    mapping.end = parseHex(line);
-    line += 6; // " r-xp "
-    mapping.offset = parseHex(line);
-    if (const char* path = std::strchr(line, '/')) std::strncpy(mapping.path, path, sizeof mapping.path - 1);
-    return mapping;
-}
-
-// Calls `callback` for every mapping of the process, without allocating.
-template <class Callback> void forEachMapping(Callback callback) {
-    const int file = ::open("/proc/self/maps", O_RDONLY | O_CLOEXEC);
-    if (file < 0) return;
-    char line[1024] = {};
-    size_t length = 0;
-    char buffer[4096];
-    for (ssize_t got; (got = ::read(file, buffer, sizeof buffer)) > 0;) {
-        for (ssize_t i = 0; i < got; ++i) {
-            if (buffer[i] != '\n') {
-                if (length + 1 < sizeof line) line[length++] = buffer[i];
-                continue;
-            }
-            line[length] = '\0';
-            length = 0;
-            callback(parseMapping(line));
-        }
-    }
-    ::close(file);
-}
 
 bool readMemory(uintptr_t address, void* buffer, size_t size) {
     const iovec local{buffer, size};

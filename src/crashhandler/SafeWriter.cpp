@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <sys/uio.h>
 #include <unistd.h>
 
@@ -23,10 +24,23 @@ bool writeFully(int file, const char* data, size_t size, int64_t position) {
     return true;
 }
 
+// A new file if possible: one that exists may be open elsewhere. Never blocks, and follows no link.
+int openPrivate(const char* path) {
+    struct stat status;
+    if (::lstat(path, &status) == 0 && S_ISREG(status.st_mode)) ::unlink(path);
+    const int file = ::open(path, O_WRONLY | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600);
+    if (file < 0) return -1;
+    const bool isUsable = ::fstat(file, &status) == 0 && S_ISREG(status.st_mode) &&
+                          status.st_uid == ::geteuid() && ::fchmod(file, 0600) == 0 &&
+                          ::ftruncate(file, 0) == 0;
+    if (isUsable) return file;
+    ::close(file);
+    return -1;
+}
+
 } // namespace
 
-CSafeWriter::CSafeWriter(const char* path)
-    : m_file(::open(path, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, 0600)) {}
+CSafeWriter::CSafeWriter(const char* path) : m_file(openPrivate(path)) {}
 
 CSafeWriter::~CSafeWriter() {
     if (m_file >= 0) ::close(m_file);

@@ -11,7 +11,9 @@ namespace crashhandler {
 // do nothing.
 class CSafeWriter {
 public:
-    explicit CSafeWriter(const char* path); // replaces an existing file; mode 0600
+    // Replaces an existing file; only the user has access to the new one. Fails for anything but a regular
+    // file.
+    explicit CSafeWriter(const char* path);
     ~CSafeWriter();
     CSafeWriter(const CSafeWriter&) = delete;
     CSafeWriter& operator=(const CSafeWriter&) = delete;

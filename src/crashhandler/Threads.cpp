@@ -2,11 +2,14 @@
 
 #include <algorithm>
 #include <atomic>
+#include <cerrno>
 #include <charconv>
 #include <csignal>
 #include <cstring>
 #include <ctime>
 #include <fcntl.h>
+#include <limits>
+#include <linux/futex.h>
 #include <string_view>
 #include <sys/syscall.h>
 #include <unistd.h>
@@ -18,16 +21,20 @@ namespace {
 SThreadState* g_threads = nullptr;
 size_t g_count = 0;
 std::atomic<size_t> g_answers{0};
+std::atomic<int> g_released{0}; // a futex
 
 void holdThread(int, siginfo_t*, void* context) {
+    const int error = errno;
     const pid_t self = static_cast<pid_t>(::syscall(SYS_gettid));
     for (size_t i = 1; i < g_count; ++i) {
         if (g_threads[i].id != self) continue;
         g_threads[i].context = *static_cast<ucontext_t*>(context);
         g_threads[i].hasContext = true;
         g_answers.fetch_add(1, std::memory_order_release);
-        for (;;) ::pause();
+        while (g_released.load() == 0) ::syscall(SYS_futex, &g_released, FUTEX_WAIT, 0, nullptr, nullptr, 0);
+        break;
     }
+    errno = error;
 }
 
 // The numeric names in /proc/self/task, without opendir, which allocates.
@@ -68,7 +75,7 @@ size_t captureThreads(const ucontext_t& crashed, SThreadState* threads, size_t c
     const int signal = SIGRTMAX - 1;
     struct sigaction action = {};
     action.sa_sigaction = holdThread;
-    action.sa_flags = SA_SIGINFO | SA_ONSTACK;
+    action.sa_flags = SA_SIGINFO | SA_ONSTACK | SA_RESTART;
     sigfillset(&action.sa_mask);
     ::sigaction(signal, &action, nullptr);
     size_t asked = 0;
@@ -81,6 +88,11 @@ size_t captureThreads(const ucontext_t& crashed, SThreadState* threads, size_t c
     for (int i = 0; i < kRounds && g_answers.load(std::memory_order_acquire) < asked; ++i)
         ::nanosleep(&pause, nullptr);
     return g_count;
+}
+
+void releaseThreads() {
+    g_released.store(1);
+    ::syscall(SYS_futex, &g_released, FUTEX_WAKE, std::numeric_limits<int>::max(), nullptr, nullptr, 0);
 }
 
 } // namespace crashhandler

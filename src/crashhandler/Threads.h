@@ -14,8 +14,10 @@ struct SThreadState {
     ucontext_t context = {};
 };
 
-// Stops all other threads of the process in a signal handler and records their registers. They stay stopped,
-// since the process is about to end. Returns the number of entries; the crashing thread comes first.
+// Stops all other threads of the process in a signal handler and records their registers. Returns the number
+// of entries; the crashing thread comes first. To be called once.
 size_t captureThreads(const ucontext_t& crashed, SThreadState* threads, size_t capacity);
+// Lets them continue, for a host that recovers from the crash.
+void releaseThreads();
 
 } // namespace crashhandler

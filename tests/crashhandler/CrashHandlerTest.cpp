@@ -3,6 +3,7 @@
 
 #include <cstring>
 #include <map>
+#include <sys/stat.h>
 
 namespace {
 
@@ -45,9 +46,13 @@ TEST(CrashHandler, LeavesReportAndDumpForEveryKindOfCrash) {
         const char* kind;
         int signal;
         const char* inReport;
+        uint32_t threads = 2;
     } cases[] = {{"segv", SIGSEGV, "Signal: SIGSEGV"},
                  {"abort", SIGABRT, "Signal: SIGABRT"},
                  {"overflow", SIGSEGV, "Signal: SIGSEGV"},
+                 {"thread overflow", SIGSEGV, "Signal: SIGSEGV", 3},
+                 {"loading", SIGSEGV, "Signal: SIGSEGV", 3}, // while another thread loads a library
+                 {"together", SIGSEGV, "Signal: SIGSEGV", 10},
                  {"unloaded", SIGSEGV, "Signal: SIGSEGV"}, // after the host has closed the library
                  {"throw", SIGABRT, "Exception: std::runtime_error: nobody catches this"}};
     for (const auto& test : cases) {
@@ -59,13 +64,14 @@ TEST(CrashHandler, LeavesReportAndDumpForEveryKindOfCrash) {
         const std::string report = readFile(folder / "report.txt");
         EXPECT_EQ(report.find("Crashing 1.0\n"), 0u);
         EXPECT_NE(report.find(test.inReport), std::string::npos) << report;
-        EXPECT_NE(report.find("crashing("), std::string::npos) << report; // a frame of the program itself
+        EXPECT_NE(report.find("/crashing+0x"), std::string::npos) << report; // a frame of the program itself
+        EXPECT_NE(report.find("[stack]"), std::string::npos) << report;      // near the end of the modules
 
         const CDump dump(readFile(folder / "dump.dmp"));
         for (uint32_t stream : {kThreads, kModules, kMemory, kException, kSystem, kMaps})
             ASSERT_TRUE(dump.has(stream)) << stream;
         EXPECT_EQ(dump.at<uint32_t>(dump.position(kException) + 8), static_cast<uint32_t>(test.signal));
-        EXPECT_EQ(dump.at<uint32_t>(dump.position(kThreads)), 2u);
+        EXPECT_EQ(dump.at<uint32_t>(dump.position(kThreads)), test.threads);
         EXPECT_GE(dump.at<uint32_t>(dump.position(kMemory)), 2u); // both stacks
         EXPECT_NE(dump.text(kMaps).find("libc.so"), std::string::npos);
     }
@@ -79,8 +85,19 @@ TEST(CrashHandler, KeepsTheEnvironmentToItself) {
     EXPECT_EQ(dump.bytes().find("hunter2-hunter2"), std::string::npos);
 }
 
-TEST(CrashHandler, GoesOnToTheHandlerThatStoodBefore) {
+TEST(CrashHandler, LetsAHostRecoverWithAllItsThreads) {
     CTempFolder folder;
-    EXPECT_EQ(run({CRASHING_PROGRAM, "chain", folder.path()}).exitCode, 77);
+    EXPECT_EQ(run({CRASHING_PROGRAM, "recover", folder.path()}).exitCode, 77);
     EXPECT_TRUE(CDump(readFile(folder / "dump.dmp")).has(kException));
+}
+
+TEST(CrashHandler, WritesOnlyPrivateFilesAndWaitsForNoReader) {
+    namespace fs = std::filesystem;
+    CTempFolder folder;
+    fs::permissions(folder.write("report.txt", "old"), fs::perms(0666));
+    ASSERT_EQ(::mkfifo((folder / "dump.dmp").c_str(), 0600), 0);
+    run({CRASHING_PROGRAM, "segv", folder.path()});
+    EXPECT_EQ(fs::status(folder / "report.txt").permissions(), fs::perms(0600));
+    EXPECT_EQ(readFile(folder / "report.txt").find("Crashing 1.0\n"), 0u);
+    EXPECT_TRUE(fs::is_fifo(folder / "dump.dmp"));
 }

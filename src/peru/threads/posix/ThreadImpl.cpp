@@ -4,6 +4,7 @@
 #include "peru/log/ILog.h"
 #include "peru/posix/PlatformFile.h"
 #include "peru/strings/IStringLocalizer.h"
+#include "peru/threads/AlternateStack.h"
 #include "peru/threads/ThreadLocalStorageManager.h"
 #include "peru/threads/posix/ThreadPriority.h"
 
@@ -92,6 +93,7 @@ P<CThreadImpl> CThreadImpl::getCurrent() {
 
 void* CThreadImpl::enter(void* self) {
     P<CThreadImpl> thread(static_cast<CThreadImpl*>(self));
+    CAlternateStack::useForCurrentThread();
     t_current.thread = thread;
     thread->m_id = gettid();
     thread->m_id.notify_all();
