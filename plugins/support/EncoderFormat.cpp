@@ -32,7 +32,6 @@ void CEncoderFormat::open() {
     auto encoder = m_makeEncoder(m_file);
     try {
         encoder->open(*output, m_settings);
-        output->commit();
     } catch (...) {
         encoder.reset();
         output->discard();
@@ -49,8 +48,19 @@ void CEncoderFormat::close() {
     const std::unique_ptr<IEncoder> encoder = std::move(m_encoder);
     // The failed write has already been reported, and the rest cannot be completed.
     if (!output || m_failed) return;
-    encoder->finish();
-    output->close();
+    try {
+        encoder->finish();
+        output->close();
+    } catch (...) {
+        output->discard();
+        throw;
+    }
+}
+
+void CEncoderFormat::discard() noexcept {
+    m_encoder.reset();
+    if (m_output) m_output->discard();
+    m_output.reset();
 }
 
 int64_t CEncoderFormat::getEstimatedSizeBytes(double fDuration) {
@@ -90,10 +100,11 @@ void CEncoderFormat::writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) {
     try {
         m_encoder->write(pAudioChunk->getData(), static_cast<int>(size / frameBytes));
         m_output->throwFailure();
-        if (const auto now = std::chrono::steady_clock::now(); now - m_updated >= kUpdate) {
+        if (const auto now = std::chrono::steady_clock::now();
+            m_output->growsInPlace() && now - m_updated >= kUpdate) {
+            m_updated = now;
             m_encoder->update();
             m_output->flush();
-            m_updated = now;
         }
     } catch (...) {
         m_failed = true;

@@ -3,6 +3,7 @@
 
 #include "sonora2/context/ISonoraContext.h"
 #include "sonora2/media/IAudioFormat.h"
+#include "sonora2/media/IDiscardable.h"
 #include "support/Encoder.h"
 
 #include <chrono>
@@ -10,22 +11,22 @@
 
 namespace sonora2::plugins {
 
-// Opening makes or replaces the file once the encoder has accepted its settings; closing completes it, also
-// in the middle of a job. What is slowly written, as a recording is, lies complete on the disk twice a
-// second: a process that is killed leaves a file that plays. A failure to write is thrown by the write that
-// meets it or at last by close(). Quality and bit rates are taken while closed. Each opening starts the file
-// anew.
-class CEncoderFormat : public peru::CObject, public common::IAudioFormat {
+// Opening creates the file; closing completes it, also in the middle of a job. A file that exists is replaced
+// by close(), as a whole. A new one is complete on the disk twice a second while it grows, so that a
+// recording whose process is killed can still be played. A failed write throws at once or at the latest from
+// close(). Quality and bit rates can be set while closed. Each opening starts a new file.
+class CEncoderFormat : public peru::CObject, public common::IAudioFormat, public common::IDiscardable {
 public:
-    // Closed. `makeEncoder` gives a fresh encoder for each opening.
+    // Created closed. `makeEncoder` returns a new encoder for each opening.
     using EncoderFactory = std::unique_ptr<IEncoder> (*)(const SMediaFile& file);
     CEncoderFormat(const P<peru::IString>& pluginName, const SMediaFile& file, EncoderFactory makeEncoder,
                    const SPcmFormat& format);
-    ~CEncoderFormat() override; // closes without a word
+    ~CEncoderFormat() override; // closes; errors are ignored
 
     bool isOpened() override { return m_output != nullptr; }
     void open() override; // does nothing on an open format
     void close() override;
+    void discard() noexcept override;
     P<peru::IURI> getURI() override { return m_file.uri; }
     P<peru::IString> getPluginName() override { return m_pluginName; }
     int64_t getEstimatedSizeBytes(double fDuration) override;
@@ -47,8 +48,8 @@ private:
     SEncoderSettings m_settings;
     std::unique_ptr<COutputFile> m_output;           // while open
     std::unique_ptr<IEncoder> m_encoder;             // writes to the output
-    std::chrono::steady_clock::time_point m_updated; // when the file was last complete on the disk
-    bool m_failed = false;                           // a write has thrown: nothing is to be finished
+    std::chrono::steady_clock::time_point m_updated; // when the file was last complete on disk
+    bool m_failed = false;                           // a write has thrown: the file cannot be completed
 };
 
 } // namespace sonora2::plugins

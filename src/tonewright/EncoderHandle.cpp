@@ -1,16 +1,31 @@
 #include "tonewright/EncoderHandle.h"
 
+#include "peru/strings/StringFormat.h"
+#include "peru/system/IPathes.h"
+#include "sonora2/context/SonoraError.h"
 #include "sonora2/media/IDiscardable.h"
+
+#include <filesystem>
 
 namespace tonewright {
 
 using sonora2::common::CAudioEncoder;
+using sonora2::common::CSonoraError;
 using sonora2::common::IDiscardable;
+
+namespace {
+
+// Empty unless it is a local file.
+std::string toPath(const P<peru::IURI>& uri) {
+    return uri ? peru::CString::toStdString(peru::getPathes()->toPlatformPath(uri)) : std::string();
+}
+
+} // namespace
 
 CEncoderHandle::CEncoderHandle(const P<sonora2::common::ISonoraContext>& context,
                                const P<sonora2::common::IAudioSource>& source,
                                const P<sonora2::common::IAudioFormat>& format)
-    : m_format(format), m_encoder(peru::make<CAudioEncoder>(context, source, format)) {
+    : m_source(source), m_format(format), m_encoder(peru::make<CAudioEncoder>(context, source, format)) {
     m_encoder->addListener(this);
 }
 
@@ -21,11 +36,33 @@ CEncoderHandle::~CEncoderHandle() {
 void CEncoderHandle::run() {
     m_isDiscarding = false;
     try {
+        requireOtherFile();
+        requireSameFormat();
         m_encoder->encode();
     } catch (...) {
         discard();
         throw;
     }
+}
+
+// Links included: the job would read what it replaces.
+void CEncoderHandle::requireOtherFile() const {
+    const std::string from = toPath(m_source->getURI()), to = toPath(m_format->getURI());
+    std::error_code none;
+    if (!from.empty() && !to.empty() && std::filesystem::equivalent(from, to, none))
+        throw CSonoraError(
+            peru::format("%s cannot be written: it is the source of the same export", to.c_str()));
+}
+
+// Nothing between the two converts: the samples would be written as what they are not.
+void CEncoderHandle::requireSameFormat() const {
+    const auto describe = [](auto& media) {
+        return peru::format("%d Hz, %d channels, %d bytes per sample", media.getSampleRate(),
+                            media.getChannelCount(), media.getBytesPerSample());
+    };
+    const P<peru::IString> from = describe(*m_encoder), to = describe(*m_format);
+    if (!from->equals(to))
+        throw CSonoraError(peru::format("the source delivers %s, but the format expects %s", from, to));
 }
 
 void CEncoderHandle::discard() noexcept {

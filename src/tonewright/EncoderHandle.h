@@ -37,8 +37,11 @@ public:
     bool onProgress(double fraction, int32_t reserved) override;
 
 private:
+    void requireOtherFile() const;
+    void requireSameFormat() const;
     void discard() noexcept;
 
+    P<sonora2::common::IAudioSource> m_source;
     P<sonora2::common::IAudioFormat> m_format;
     P<sonora2::common::CAudioEncoder> m_encoder;
     std::atomic<TONEWRIGHT_EncoderCallback> m_callback{nullptr};

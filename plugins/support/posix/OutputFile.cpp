@@ -1,7 +1,10 @@
 #include "support/OutputFile.h"
 
+#include "peru/system/ISystem.h"
+
 #include <algorithm>
 #include <cerrno>
+#include <climits>
 #include <cstring>
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -13,17 +16,47 @@ namespace sonora2::plugins {
 namespace {
 
 constexpr size_t kBufferSize = 256 * 1024;
+constexpr int kMostLinks = 40;
+
+// The path at the end of symbolic links, which need not exist.
+std::string followLinks(std::string path) {
+    char target[PATH_MAX];
+    for (int i = 0; i < kMostLinks; ++i) {
+        const ssize_t size = ::readlink(path.c_str(), target, sizeof(target));
+        if (size <= 0) break;
+        const std::string next(target, static_cast<size_t>(size));
+        path = next.front() == '/' ? next : path.substr(0, path.rfind('/') + 1) + next;
+    }
+    return path;
+}
 
 } // namespace
 
 COutputFile::COutputFile(const SMediaFile& file) : m_file(file) {
     constexpr mode_t kMode = 0666; // less the process's mask
-    m_handle = ::open(file.path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, kMode);
-    m_made = m_handle >= 0;
-    if (!m_made && errno == EEXIST)
-        m_handle = ::open(file.path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, kMode);
-    if (m_handle < 0) failSystem("could not create", file, errno);
     m_buffer.resize(kBufferSize);
+    const std::string path = followLinks(file.path);
+    m_handle = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, kMode);
+    struct stat status {};
+    if (m_handle >= 0) {
+        m_created = path;
+        ::fstat(m_handle, &status);
+        m_identity[0] = status.st_dev;
+        m_identity[1] = status.st_ino;
+        return;
+    }
+    if (errno != EEXIST) failSystem("could not create", file, errno);
+    if (::stat(path.c_str(), &status) != 0) failSystem("could not create", file, errno);
+    if (S_ISREG(status.st_mode)) {
+        try {
+            m_replacement = peru::getSystem()->startReplacement(file.uri);
+        } catch (const peru::CException& error) {
+            fail("could not create %s: %s", file.getDisplayName(), error.getDescription());
+        }
+        return;
+    }
+    m_handle = ::open(path.c_str(), O_WRONLY | O_CLOEXEC);
+    if (m_handle < 0) failSystem("could not create", file, errno);
 }
 
 COutputFile::~COutputFile() {
@@ -42,80 +75,97 @@ int64_t COutputFile::getSize() const {
     return std::max(m_size, tell());
 }
 
-void COutputFile::commit() {
-    if (truncateOnce() != 0) throwFailure();
-}
-
 void COutputFile::flush() {
-    if (flushBuffer() != 0) throwFailure();
+    if (!flushBuffer()) throwFailure();
 }
 
 void COutputFile::close() {
-    if (m_handle < 0) return throwFailure();
     flushBuffer();
-    // What the system could not store is told here at the latest.
-    if (::close(m_handle) != 0 && m_error == 0) m_error = errno;
-    m_handle = -1;
+    // Errors that the system has deferred are reported here at the latest.
+    if (const int handle = std::exchange(m_handle, -1); handle >= 0 && ::close(handle) != 0) keepError(errno);
     throwFailure();
+    const P<peru::IFileReplacement> replacement = std::move(m_replacement);
+    if (!replacement) return;
+    try {
+        replacement->commit();
+    } catch (const peru::CException& error) {
+        m_reason = error.getDescription();
+        keepError(0);
+        throwFailure();
+    }
 }
 
 bool COutputFile::tryWrite(const void* data, size_t size) noexcept {
-    if (m_error != 0) return false;
+    if (m_hasFailed) return false;
     const uint8_t* bytes = static_cast<const uint8_t*>(data);
-    if (size > m_buffer.size() - m_fill && flushBuffer() != 0) return false;
-    if (size >= m_buffer.size()) return writeThrough(bytes, size) == 0;
+    if (size > m_buffer.size() - m_fill && !flushBuffer()) return false;
+    if (size >= m_buffer.size()) return writeThrough(bytes, size);
     std::memcpy(m_buffer.data() + m_fill, bytes, size);
     m_fill += size;
     return true;
 }
 
 bool COutputFile::trySeek(int64_t position) noexcept {
-    if (m_error != 0) return false;
+    if (m_hasFailed) return false;
     if (position == tell()) return true;
-    if (flushBuffer() != 0) return false;
+    if (!flushBuffer()) return false;
     m_position = position;
     return true;
 }
 
 void COutputFile::throwFailure() const {
-    if (m_error != 0) failSystem("could not write", m_file, m_error);
+    if (!m_hasFailed) return;
+    if (m_reason) fail("could not write %s: %s", m_file.getDisplayName(), m_reason);
+    failSystem("could not write", m_file, m_error);
 }
 
 void COutputFile::discard() noexcept {
-    if (m_handle < 0) return;
-    ::close(m_handle);
-    m_handle = -1;
-    if (m_made) ::unlink(m_file.path.c_str());
+    m_replacement.reset();
+    // Not a file that somebody else has put there meanwhile.
+    struct stat status {};
+    if (!m_created.empty() && ::lstat(m_created.c_str(), &status) == 0 && status.st_dev == m_identity[0] &&
+        status.st_ino == m_identity[1])
+        ::unlink(m_created.c_str());
+    m_created.clear();
+    if (const int handle = std::exchange(m_handle, -1); handle >= 0) ::close(handle);
 }
 
-int COutputFile::flushBuffer() noexcept {
-    if (m_fill == 0 || m_error != 0) return m_error;
+bool COutputFile::keepError(int error) noexcept {
+    if (!m_hasFailed) m_error = error;
+    m_hasFailed = true;
+    return false;
+}
+
+bool COutputFile::flushBuffer() noexcept {
+    if (m_hasFailed) return false;
     const size_t fill = std::exchange(m_fill, 0);
-    return writeThrough(m_buffer.data(), fill);
+    return fill == 0 || writeThrough(m_buffer.data(), fill);
 }
 
-int COutputFile::writeThrough(const uint8_t* data, size_t size) noexcept {
-    if (truncateOnce() != 0) return m_error;
-    while (size > 0) {
+bool COutputFile::writeThrough(const uint8_t* data, size_t size) noexcept {
+    if (m_replacement) {
+        try {
+            const P<peru::ISeekableIOStream> stream = m_replacement->getStream();
+            stream->seek(m_position);
+            stream->write(data, static_cast<int64_t>(size));
+        } catch (const peru::CException& error) {
+            m_reason = error.getDescription();
+            return keepError(0);
+        } catch (...) {
+            return keepError(ENOMEM);
+        }
+        m_position += static_cast<int64_t>(size);
+    }
+    while (!m_replacement && size > 0) {
         const ssize_t written = ::pwrite(m_handle, data, size, m_position);
         if (written < 0 && errno == EINTR) continue;
-        if (written <= 0) return m_error = written < 0 ? errno : EIO;
+        if (written <= 0) return keepError(written < 0 ? errno : EIO);
         data += written;
         size -= static_cast<size_t>(written);
         m_position += written;
-        m_size = std::max(m_size, m_position);
     }
-    return 0;
-}
-
-int COutputFile::truncateOnce() noexcept {
-    if (m_truncated) return m_error;
-    struct stat status {};
-    // Devices have no length to cut.
-    const bool regular = ::fstat(m_handle, &status) == 0 && S_ISREG(status.st_mode);
-    if (regular && status.st_size > 0 && ::ftruncate(m_handle, 0) != 0) return m_error = errno;
-    m_truncated = true;
-    return 0;
+    m_size = std::max(m_size, m_position);
+    return true;
 }
 
 } // namespace sonora2::plugins

@@ -1,0 +1,146 @@
+// What exports do to the files of a user, with the real plug-ins.
+#include "Library.h"
+#include "support/Files.h"
+#include "tonewright/ICallbackTargets.h"
+
+#include <gmock/gmock.h>
+
+namespace {
+
+using namespace tests;
+namespace fs = std::filesystem;
+
+class ExportFiles : public testing::TestWithParam<const char*> {
+protected:
+    void SetUp() override { ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK); }
+    void TearDown() override { TONEWRIGHT_DeInitAll(); }
+
+    static std::u16string toUri(const fs::path& path) {
+        return fs::path("file://" + path.string()).u16string();
+    }
+    static CHandle makeFormat(const fs::path& path, int32_t rate = 44100, int32_t bitRate = 0) {
+        return CHandle(TONEWRIGHT_CreateAudioFormatFromURI(toUri(path).c_str(), rate, 2, 2, 0.0, bitRate,
+                                                           bitRate, bitRate));
+    }
+    // Ten seconds; fails, if it does, after half of them.
+    static CHandle makeSource(bool fails = false) {
+        auto position = std::make_shared<int>(0);
+        SFakeSource script{.rate = 44100, .frames = 441000, .chunkFrames = 4410};
+        script.onRead = [position, fails] {
+            if (++*position > 50 && fails) throw std::runtime_error("scratched");
+        };
+        return wrap(peru::make<CFakeSource>(script));
+    }
+    // Calls `during` half-way, which may ask the encoder to stop.
+    using During = std::function<bool(tonewright::IEncoderProgressTarget&)>;
+    static int32_t encode(const CHandle& source, const CHandle& format, const During& during = {}) {
+        const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), format.get()));
+        const auto target = behind<tonewright::IEncoderProgressTarget>(encoder);
+        bool isDone = !during;
+        target->setProgressFunction([&](double fraction) {
+            if (isDone || fraction < 0.4) return true;
+            isDone = true;
+            return during(*target);
+        });
+        return TONEWRIGHT_AudioEncoder_Encode(encoder.get());
+    }
+    std::vector<std::string> list() const {
+        std::vector<std::string> names;
+        for (const auto& entry : fs::directory_iterator(folder.path()))
+            names.push_back(entry.path().filename());
+        std::sort(names.begin(), names.end());
+        return names;
+    }
+    // Seconds of sound in a file; negative if it is none.
+    static double getDuration(const fs::path& path) {
+        return TONEWRIGHT_AudioSource_GetDuration(
+            CHandle(TONEWRIGHT_CreateAudioSourceFromURI(toUri(path).c_str(), 44100, 2, 2, 0)).get());
+    }
+
+    CTempFolder folder;
+    const std::string name = std::string("x.") + GetParam();
+    const fs::path target = folder / name;
+};
+
+TEST_P(ExportFiles, ExistingTarget_IsReplacedOnlyByAResult) {
+    enum EEnd { kWhole, kStopped, kDiscarded, kFailed };
+    for (const EEnd end : {kWhole, kStopped, kDiscarded, kFailed})
+        for (const bool exists : {true, false}) {
+            SCOPED_TRACE(testing::Message() << GetParam() << " " << end << " " << exists);
+            fs::remove(target);
+            if (exists) {
+                folder.write(name, "dear to somebody");
+                fs::permissions(target, fs::perms(0600));
+            }
+            const auto during = [&](tonewright::IEncoderProgressTarget& job) {
+                EXPECT_EQ(list(), std::vector{name}) << "a process that is killed leaves nothing else";
+                if (exists) {
+                    EXPECT_EQ(readFile(target), "dear to somebody");
+                }
+                if (end == kDiscarded) job.stopAndDiscard();
+                return end != kStopped;
+            };
+            EXPECT_EQ(encode(makeSource(end == kFailed), makeFormat(target), during),
+                      end == kFailed ? 11 : 0);
+            if (end == kWhole || end == kStopped) {
+                EXPECT_NEAR(getDuration(target), end == kWhole ? 10.0 : 4.0, 0.2);
+                EXPECT_EQ(fs::status(target).permissions() == fs::perms(0600), exists);
+            } else if (exists) {
+                EXPECT_EQ(readFile(target), "dear to somebody");
+            }
+            EXPECT_EQ(list().size(), exists || end < kDiscarded ? 1u : 0u);
+        }
+}
+
+TEST_P(ExportFiles, SourceAsTarget_IsRefusedUnderEveryName) {
+    ASSERT_EQ(encode(makeSource(), makeFormat(target)), 0);
+    const std::string before = readFile(target);
+    const fs::path hard = folder / ("hard." + std::string(GetParam())),
+                   soft = folder / ("soft." + std::string(GetParam()));
+    fs::create_hard_link(target, hard);
+    fs::create_symlink(target.filename(), soft);
+    for (const fs::path& path : {target, fs::path(folder.path() / "." / name), hard, soft}) {
+        const CHandle source(TONEWRIGHT_CreateAudioSourceFromURI(toUri(target).c_str(), 44100, 2, 2, 0));
+        EXPECT_EQ(encode(source, makeFormat(path)), 11) << path;
+        EXPECT_TRUE(readFile(target) == before);
+    }
+    EXPECT_TRUE(fs::is_symlink(soft));
+}
+
+TEST_P(ExportFiles, JobsOfOneTarget_EachFinishAsAWhole) {
+    const fs::path link = folder / ("link." + std::string(GetParam()));
+    fs::create_symlink(target.filename(), link); // leads nowhere at first
+    for (int round = 0; round < 2; ++round) {
+        const auto during = [&](auto&) {
+            EXPECT_EQ(encode(makeSource(), makeFormat(target), [](auto&) { return false; }), 0);
+            EXPECT_NEAR(getDuration(target), 4.0, 0.2);
+            return true;
+        };
+        EXPECT_EQ(encode(makeSource(), makeFormat(link), during), 0);
+        EXPECT_NEAR(getDuration(target), round == 0 ? 4.0 : 10.0, 0.2);
+        EXPECT_EQ(list().size(), 2u);
+    }
+    // What has taken the place of a new file is not removed with it.
+    fs::remove(target);
+    const auto during = [&](tonewright::IEncoderProgressTarget& job) {
+        fs::rename(target, folder / "elsewhere");
+        folder.write(name, "dear to somebody");
+        job.stopAndDiscard();
+        return true;
+    };
+    EXPECT_EQ(encode(makeSource(), makeFormat(target), during), 0);
+    EXPECT_EQ(readFile(target), "dear to somebody");
+}
+
+TEST_P(ExportFiles, FormatThatDoesNotFit_LeavesNothing) {
+    EXPECT_EQ(encode(makeSource(), makeFormat(target, 48000)), 11) << "it would play at another speed";
+    if (std::string(GetParam()) == "ogg") {
+        EXPECT_EQ(TONEWRIGHT_AudioFormat_Open(makeFormat(target, 44100, 1).get()), 5) << "one bit per second";
+    }
+    EXPECT_TRUE(list().empty());
+}
+
+INSTANTIATE_TEST_SUITE_P(Formats, ExportFiles, testing::Values("wav", "flac", "ogg", "mp3"),
+                         [](const auto& made) { return std::string(made.param); });
+
+} // namespace
