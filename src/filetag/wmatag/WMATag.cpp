@@ -1,5 +1,6 @@
 #include "filetag/wmatag/WMATag.h"
 
+#include "filetag/taglib/AsfObjects.h"
 #include "filetag/wmatag/CoverArt.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
@@ -76,6 +77,7 @@ CWMATag::~CWMATag() {
 }
 
 std::unique_ptr<TagLib::File> CWMATag::openFile(TagLib::IOStream& stream) {
+    taglib::orderAsfObjects(stream);
     auto file = std::make_unique<TagLib::ASF::File>(&stream);
     if (!file->isValid()) return nullptr;
     m_tag = file->tag();

@@ -1,0 +1,231 @@
+#include "filetag/TagTransfer.h"
+
+#include "filetag/taglib/AnyTagFile.h"
+#include "filetag/taglib/Texts.h"
+#include "peru/Errors.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/system/IPathes.h"
+
+#include <algorithm>
+
+namespace filetag {
+
+using namespace peru;
+using taglib::CAnyTagFile;
+using taglib::fromTagText;
+using TagLib::PropertyMap;
+using taglib::SPicture;
+using TagLib::String;
+using TagLib::StringList;
+using taglib::toTagText;
+
+namespace {
+
+// These describe how the source was encoded, which does not apply to the target.
+constexpr const char* kTechnical[] = {"ENCODER",
+                                      "ENCODING",
+                                      "ENCODERSETTINGS",
+                                      "LENGTH",
+                                      "FILETYPE",
+                                      "COMMENT:ITUNSMPB",
+                                      "ITUNSMPB",
+                                      "ISVBR",
+                                      "WMFSDKVERSION",
+                                      "WMFSDKNEEDED",
+                                      "WM/ENCODINGSETTINGS",
+                                      "WM/ENCODINGTIME",
+                                      "DEVICECONFORMANCETEMPLATE",
+                                      "WAVEFORMATEXTENSIBLE_CHANNEL_MASK",
+                                      "MAJOR_BRAND",
+                                      "MINOR_VERSION",
+                                      "COMPATIBLE_BRANDS"};
+// Names of pictures, which TagLib reports as fields without a key in some formats.
+constexpr const char* kPictures[] = {
+    "APIC", "PIC", "WM/PICTURE", "COVR", "COVER ART (FRONT)", "COVER ART (BACK)"};
+// Stored as numbers by some formats.
+constexpr const char* kNumbers[] = {"TRACKNUMBER", "DISCNUMBER", "BPM", "COMPILATION", "MOVEMENTNUMBER"};
+
+template <size_t count> bool contains(const char* const (&names)[count], const String& key) {
+    return std::any_of(std::begin(names), std::end(names),
+                       [&](const char* name) { return key.upper() == name; });
+}
+
+STagPicture toPublic(const SPicture& picture) {
+    return {taglib::fromTagBytes(picture.data),
+            fromTagText(picture.mimeType),
+            fromTagText(picture.description),
+            picture.type,
+            picture.width,
+            picture.height,
+            picture.colorDepth,
+            picture.colorCount};
+}
+
+SPicture fromPublic(const STagPicture& picture) {
+    const auto toText = [](const P<IString>& text) { return text ? toTagText(text) : String(); };
+    return {taglib::toTagBytes(picture.data),
+            toText(picture.mimeType),
+            toText(picture.description),
+            picture.fileType,
+            picture.width,
+            picture.height,
+            picture.colorDepth,
+            picture.colorCount};
+}
+
+std::vector<SPicture> fromPublic(const std::vector<STagPicture>& pictures) {
+    std::vector<SPicture> result;
+    for (const STagPicture& picture : pictures) result.push_back(fromPublic(picture));
+    return result;
+}
+
+// "03/12" and "3/12" are the same number, and so are "3/0" and "3".
+String toNumber(const String& text) {
+    String number;
+    for (const String& part : text.split("/")) {
+        bool valid = false;
+        const int value = part.toInt(&valid);
+        if (!valid) return text;
+        if (number.isEmpty() || value != 0) number += (number.isEmpty() ? "" : "/") + String::number(value);
+    }
+    return number;
+}
+
+bool isSame(const String& key, const StringList& one, const StringList& other) {
+    if (one == other) return true;
+    if (!contains(kNumbers, key) || one.size() != other.size()) return false;
+    return std::equal(one.begin(), one.end(), other.begin(),
+                      [](const String& a, const String& b) { return toNumber(a) == toNumber(b); });
+}
+
+std::vector<P<IString>> findLostFields(const PropertyMap& wanted, const PropertyMap& found) {
+    std::vector<P<IString>> lost;
+    for (const auto& [key, values] : wanted)
+        if (!values.isEmpty() && (!found.contains(key) || !isSame(key, values, found[key])))
+            lost.push_back(fromTagText(key));
+    return lost;
+}
+
+std::vector<STagPicture> findLostPictures(const std::vector<SPicture>& wanted, std::vector<SPicture> found) {
+    std::vector<STagPicture> lost;
+    for (const SPicture& picture : wanted) {
+        const auto same = std::find_if(found.begin(), found.end(),
+                                       [&](const SPicture& other) { return other.data == picture.data; });
+        if (same == found.end())
+            lost.push_back(toPublic(picture));
+        else
+            found.erase(same);
+    }
+    return lost;
+}
+
+STransferReport write(CAnyTagFile& file, const PropertyMap& fields, const std::vector<SPicture>* pictures) {
+    file.write(fields, pictures);
+    STransferReport report;
+    report.lostFields = findLostFields(fields, file.readFields());
+    if (pictures) report.lostPictures = findLostPictures(*pictures, file.readPictures());
+    return report;
+}
+
+// Formats have two names for some fields. A field that the target knows only by the other name would be
+// invisible to most programs.
+void useCommonNames(PropertyMap& fields) {
+    constexpr struct {
+        const char* rare;
+        const char* common;
+    } kNames[] = {{"DESCRIPTION", "COMMENT"},
+                  {"TRACKNUM", "TRACKNUMBER"},
+                  {"YEAR", "DATE"},
+                  {"ALBUM ARTIST", "ALBUMARTIST"}};
+    const auto rename = [&fields](const String& rare, const String& common) {
+        const StringList values = fields[rare];
+        fields.erase(rare);
+        fields.insert(common, values);
+    };
+    for (const auto& names : kNames)
+        if (fields.contains(names.rare) && !fields.contains(names.common)) rename(names.rare, names.common);
+    // Comments with a description are notes of programs, except where there is no other comment.
+    if (fields.contains("COMMENT")) return;
+    for (const auto& [key, values] : PropertyMap(fields))
+        if (key.startsWith("COMMENT:") && !key.startsWith("COMMENT:ITUN")) return rename(key, "COMMENT");
+}
+
+} // namespace
+
+STags readAllTags(const P<IURI>& file) {
+    const CAnyTagFile source(file);
+    const PropertyMap fields = source.readFields();
+    STags tags;
+    for (const auto& [key, values] : fields) {
+        STagField& field = tags.fields.emplace_back(STagField{fromTagText(key), {}});
+        for (const String& value : values) field.values.push_back(fromTagText(value));
+    }
+    for (const SPicture& picture : source.readPictures()) tags.pictures.push_back(toPublic(picture));
+    for (const String& name : fields.unsupportedData())
+        if (!contains(kPictures, name)) tags.others.push_back(fromTagText(name));
+    return tags;
+}
+
+STransferReport writeAllTags(const P<IURI>& file, const STags& tags) {
+    PropertyMap fields;
+    for (const STagField& field : tags.fields)
+        for (const P<IString>& value : field.values) fields.insert(toTagText(field.key), toTagText(value));
+    const std::vector<SPicture> pictures = fromPublic(tags.pictures);
+    CAnyTagFile target(file);
+    STransferReport report = write(target, fields, &pictures);
+    target.commit();
+    return report;
+}
+
+void setTagField(const P<IURI>& file, const CStringArg& key, const std::vector<P<IString>>& values) {
+    CAnyTagFile target(file);
+    PropertyMap fields = target.readFields();
+    const String name = toTagText(key).upper();
+    fields.erase(name);
+    PropertyMap wanted;
+    for (const P<IString>& value : values)
+        if (value && !value->isEmpty()) wanted.insert(name, toTagText(value));
+    fields.merge(wanted);
+    target.write(fields, nullptr);
+    if (!findLostFields(wanted, target.readFields()).empty())
+        throw CFileError(localize("filetag.SetTagField.NotSupported",
+                                  "The field '%FIELD%' cannot be stored in the file '%FILE%'.",
+                                  {{"%FIELD%", key}, {"%FILE%", getShownName(file)}}),
+                         file);
+    target.commit();
+}
+
+std::vector<STagPicture> setTagPictures(const P<IURI>& file, const std::vector<STagPicture>& pictures) {
+    const std::vector<SPicture> wanted = fromPublic(pictures);
+    CAnyTagFile target(file);
+    STransferReport report = write(target, target.readFields(), &wanted);
+    target.commit();
+    return std::move(report.lostPictures);
+}
+
+STransferReport transferTags(const P<IURI>& source, const P<IURI>& target) {
+    const CAnyTagFile from(source);
+    CAnyTagFile to(target);
+    PropertyMap carried = from.readFields();
+    for (const char* key : kTechnical) carried.erase(key);
+    const StringList others = carried.unsupportedData();
+    useCommonNames(carried);
+
+    PropertyMap fields = to.readFields();
+    for (const auto& [key, values] : carried) fields.replace(key, values);
+    const std::vector<SPicture> carriedPictures = from.readPictures();
+    std::vector<SPicture> pictures = carriedPictures;
+    for (const SPicture& picture : to.readPictures())
+        if (std::none_of(pictures.begin(), pictures.end(),
+                         [&](const SPicture& other) { return other.data == picture.data; }))
+            pictures.push_back(picture);
+
+    STransferReport report = write(to, fields, &pictures);
+    for (const String& name : others)
+        if (!contains(kPictures, name) && !contains(kTechnical, name))
+            report.lostFields.push_back(fromTagText(name));
+    to.commit();
+    return report;
+}
+
+} // namespace filetag

@@ -1,0 +1,37 @@
+// A file of any format that TagLib knows, with all its fields and pictures.
+#pragma once
+
+#include "filetag/taglib/Pictures.h"
+#include "filetag/taglib/TagLibIOStream.h"
+
+#include <fileref.h>
+#include <tpropertymap.h>
+
+namespace filetag::taglib {
+
+using TagLib::PropertyMap;
+
+// Writing changes the file in memory; commit() writes it to disk. One thread at a time.
+class CAnyTagFile {
+public:
+    // Throws CFileError.
+    explicit CAnyTagFile(const P<peru::IURI>& uri);
+
+    // Names without a key are in unsupportedData().
+    PropertyMap readFields() const;
+    std::vector<SPicture> readPictures() const;
+
+    // Replaces all fields and, if given, all pictures, and reads the result back, which shows what the format
+    // does not hold.
+    void write(const PropertyMap& fields, const std::vector<SPicture>* pictures);
+    void commit() { m_stream.commit(); }
+
+private:
+    void open();
+
+    P<peru::IURI> m_uri;
+    CTagLibIOStream m_stream;
+    TagLib::FileRef m_file; // before the stream in the order of destruction
+};
+
+} // namespace filetag::taglib
