@@ -3,7 +3,9 @@
 #include "filetag/FileTagFactory.h"
 
 #include <cctype>
+#include <mutex>
 #include <set>
+#include <thread>
 
 using namespace peru;
 using filetag::CFileTagFactory;
@@ -265,12 +267,38 @@ TEST_P(FileTag, StoresOnceAndOnlyChanges) {
 }
 
 TEST_P(FileTag, LeavesAFileThatAnotherProgramChanged) {
-    const P<IFileTag> tag = open(m_file);
-    tag->setTitle(tests::fromStandard(repeat("new ", 3000)));
-    const std::string other = tests::readFile(m_file) + "more";
-    m_folder.write(m_file.filename(), other);
-    EXPECT_NE(tests::errorOf([&] { tag->store(); }).find("sound"), std::string::npos);
-    EXPECT_TRUE(tests::readFile(m_file) == other);
+    const std::string old = tests::readFile(m_file);
+    for (const std::string& other : {old + "more", std::string(old).replace(old.size() / 2, 4, "else")}) {
+        m_folder.write(m_file.filename(), old);
+        const auto time = std::filesystem::last_write_time(m_file);
+        const P<IFileTag> tag = open(m_file);
+        tag->setTitle(tests::fromStandard(repeat("new ", 3000)));
+        m_folder.write(m_file.filename(), other);
+        std::filesystem::last_write_time(m_file, time);
+        EXPECT_NE(tests::errorOf([&] { tag->store(); }).find("sound"), std::string::npos);
+        EXPECT_TRUE(tests::readFile(m_file) == other);
+    }
+}
+
+TEST_P(FileTag, StoresOfSeveralThreadsAreKeptOrRefused) {
+    std::set<std::string> stored;
+    std::mutex mutex;
+    std::vector<std::thread> threads;
+    for (const char* text : {"title", "artist", "album", "genre", "comment"})
+        threads.emplace_back([&, text] {
+            for (bool done = false; !done;) {
+                try {
+                    store(m_file, {{text, text}});
+                    done = true;
+                } catch (const CFileError&) {
+                }
+            }
+            const std::lock_guard lock(mutex);
+            stored.insert(text);
+        });
+    for (std::thread& thread : threads) thread.join();
+    const CTexts found = tests::readFields(*open(m_file));
+    for (const std::string& text : stored) EXPECT_EQ(found.at(text), text);
 }
 
 TEST_P(FileTag, RefusesContentOfAnotherFormat) {
@@ -296,6 +324,8 @@ TEST_P(FileTag, RefusesContentOfAnotherFormat) {
     EXPECT_THROW(open(m_file), CFileNotFoundError);
     std::filesystem::create_directory(m_file);
     EXPECT_THROW(open(m_file), CFileError);
+    ASSERT_EQ(tests::run({"mkfifo", m_file.string() + "." + GetParam()}).exitCode, 0);
+    EXPECT_THROW(open(m_file.string() + "." + GetParam()), CFileError) << "does not wait for a writer";
 }
 
 INSTANTIATE_TEST_SUITE_P(Formats, FileTag, testing::Values("mp3", "flac", "ogg", "wma"),

@@ -215,6 +215,18 @@ TEST(RiffTag, WhatIsNoWaveFileIsRefusedByName) {
         EXPECT_THROW(tag->store(), CFileFormatNotSupportedError);
         EXPECT_EQ(tests::readFile(file), c.bytes);
     }
+    const auto file = folder.write("b.wav", good);
+    const P<CRIFFTag> one = openTag(file);
+    const P<CRIFFTag> other = openTag(file);
+    one->setTitle("one");
+    one->store();
+    other->setArtist("other");
+    EXPECT_THROW(other->store(), CFileError) << "would undo the first store";
+    one->setArtist("one");
+    one->store();
+    EXPECT_EQ(text(openTag(file)->getTitle()), "one");
+    ASSERT_EQ(tests::run({"mkfifo", folder / "pipe.wav"}).exitCode, 0);
+    EXPECT_THROW(openTag(folder / "pipe.wav"), CFileError);
     EXPECT_THROW(openTag(folder / "missing.wav"), CFileNotFoundError);
     EXPECT_THROW(openTag(folder.path()), CFileError);
 }

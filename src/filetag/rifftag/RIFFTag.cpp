@@ -1,6 +1,7 @@
 #include "filetag/rifftag/RIFFTag.h"
 
 #include "filetag/Text.h"
+#include "filetag/posix/OpenedFile.h"
 #include "peru/Errors.h"
 #include "peru/files/IFileReplacement.h"
 #include "peru/streams/IStreamManager.h"
@@ -54,6 +55,20 @@ CChunkReader readChunks(const P<peru::ISeekableInStream>& stream, const P<peru::
 // programs find the chunks behind it, especially the list at the end.
 bool needsPad(const SChunk& chunk) {
     return chunk.size % 2 != 0;
+}
+
+// The first list of descriptive texts; empty if there is none.
+std::vector<uint8_t> readList(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri) {
+    CChunkReader chunks = readChunks(file, uri);
+    for (SChunk chunk; chunks.next(chunk);) {
+        if (!chunk.info) continue;
+        if (chunk.size > kMaxList) throwListTooLarge(uri);
+        std::vector<uint8_t> bytes(static_cast<size_t>(kChunkHeader + chunk.size));
+        file->seek(chunk.offset);
+        file->read(bytes.data(), static_cast<int64_t>(bytes.size()));
+        return bytes;
+    }
+    return {};
 }
 
 int64_t getNewSize(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri, int64_t listSize) {
@@ -118,17 +133,10 @@ CRIFFTag::~CRIFFTag() = default;
 void CRIFFTag::open() {
     close();
     withFileErrors(m_uri, [this] {
-        const P<peru::ISeekableInStream> stream = openFile(m_uri);
-        CChunkReader chunks = readChunks(stream, m_uri);
-        for (SChunk chunk; !m_list && chunks.next(chunk);) {
-            if (!chunk.info) continue;
-            if (chunk.size > kMaxList) throwListTooLarge(m_uri);
-            std::vector<uint8_t> bytes(static_cast<size_t>(kChunkHeader + chunk.size));
-            stream->seek(chunk.offset);
-            stream->read(bytes.data(), static_cast<int64_t>(bytes.size()));
-            m_list.emplace(std::move(bytes));
-        }
+        const posix::COpenedFile file(m_uri);
+        m_stored = readList(openFile(m_uri), m_uri);
     });
+    if (!m_stored.empty()) m_list.emplace(m_stored);
     m_opened = true;
 }
 
@@ -136,6 +144,7 @@ void CRIFFTag::close() {
     m_opened = false;
     m_modified = false;
     m_list.reset();
+    m_stored.clear();
 }
 
 void CRIFFTag::store() {
@@ -143,6 +152,9 @@ void CRIFFTag::store() {
     withFileErrors(m_uri, [this] {
         const std::vector<uint8_t>& list = m_list->getChunk();
         const auto listSize = static_cast<int64_t>(list.size());
+        const posix::COpenedFile file(m_uri);
+        const posix::COpenedFile::CLock lock(file);
+        file.checkUnchanged();
         const P<peru::ISeekableInStream> old = openFile(m_uri);
         const int64_t size = getNewSize(old, m_uri, listSize);
         if (size > kMaxFile)
@@ -152,6 +164,8 @@ void CRIFFTag::store() {
                                "file cannot hold."),
                 m_uri);
 
+        // Other chunks are copied as they are now, but the list would undo what another program has stored.
+        if (readList(old, m_uri) != m_stored) file.failChanged();
         const P<peru::IFileReplacement> replacement = peru::getSystem()->startReplacement(m_uri);
         CCopier copier(replacement);
         const auto riffSize = static_cast<uint32_t>(size - kChunkHeader);
@@ -161,6 +175,7 @@ void CRIFFTag::store() {
         copyChunks(old, m_uri, copier);
         copier.write(list.data(), listSize);
         replacement->commit();
+        m_stored = list;
     });
     m_modified = false;
 }

@@ -52,6 +52,7 @@ private:
     bool m_opened = false;
     bool m_modified = false;
     std::optional<CInfoList> m_list; // empty if the file has none
+    std::vector<uint8_t> m_stored;   // the list in the file, empty if it has none
 };
 
 } // namespace filetag::rifftag

@@ -8,7 +8,6 @@
 
 #include <algorithm>
 #include <limits>
-#include <system_error>
 
 namespace filetag::taglib {
 namespace {
@@ -20,36 +19,20 @@ constexpr int64_t kPageSize = 4096;
 // Shorter ranges of the old file are copied through memory, longer ones inside the kernel.
 constexpr int64_t kCopiedInside = 128 * 1024;
 
-std::string getPath(const P<IURI>& file) {
-    const std::string path = CString::toStdString(getPathes()->toPlatformPath(file));
-    if (path.empty()) throw CURITypeNotSupportedError(file);
-    return path;
-}
-
 std::string_view toView(const TagLib::ByteVector& bytes) {
     return {bytes.data(), bytes.size()};
 }
 
 } // namespace
 
-CTagLibIOStream::CTagLibIOStream(const P<IURI>& file) : m_uri(file), m_file(getPath(file).c_str(), true) {
-    if (!m_file.isOpen()) {
-        try {
-            getStreamManager()->getInStream(file); // throws with the reason
-        } catch (const CStreamError& error) {
-            throw CFileError(error.getDescription(), file);
-        }
-        throw CFileAccessDeniedError(file);
-    }
-    std::error_code error;
-    m_oldTime = std::filesystem::last_write_time(m_file.name(), error);
-    m_oldSize = m_file.length();
-}
+CTagLibIOStream::CTagLibIOStream(const P<IURI>& file)
+    : m_uri(file), m_opened(file), m_path(CString::toStdString(getPathes()->toPlatformPath(file))),
+      m_file(m_opened.duplicate(), true), m_oldSize(m_file.length()) {}
 
 CTagLibIOStream::~CTagLibIOStream() = default;
 
 TagLib::FileName CTagLibIOStream::name() const {
-    return m_file.name();
+    return m_path.c_str();
 }
 
 TagLib::ByteVector CTagLibIOStream::readBlock(unsigned long length) {
@@ -164,19 +147,6 @@ CTagLibIOStream::SRange CTagLibIOStream::findDifference() {
     return range;
 }
 
-// The pieces refer to the file that was opened; combined with any other they would corrupt it.
-void CTagLibIOStream::checkUnchanged() const {
-    std::error_code error;
-    const auto time = std::filesystem::last_write_time(m_file.name(), error);
-    if (error) throw CFileNotFoundError(m_uri);
-    const auto size = static_cast<int64_t>(std::filesystem::file_size(m_file.name(), error));
-    if (error || size != m_oldSize || time != m_oldTime)
-        throw CFileError(localize("filetag.CTagLibIOStream.FileChanged",
-                                  "The file '%FILE%' was changed by another program.",
-                                  {{"%FILE%", getShownName(m_uri)}}),
-                         m_uri);
-}
-
 // Does not sync, which would take twenty times as long as everything else: after a power failure the page is
 // either the old or the new one, and both contain a complete tag.
 void CTagLibIOStream::writePage(const SRange& range) {
@@ -217,7 +187,9 @@ void CTagLibIOStream::replaceFile() {
 
 void CTagLibIOStream::commit() {
     if (!m_pieces || !m_pieces->isChanged()) return;
-    checkUnchanged();
+    // The pieces refer to the file that was opened; combined with any other they would corrupt it.
+    const posix::COpenedFile::CLock lock(m_opened);
+    m_opened.checkUnchanged();
     if (m_pieces->getSize() == m_oldSize) {
         const SRange range = findDifference();
         if (range.end == 0) return;

@@ -2,12 +2,12 @@
 #pragma once
 
 #include "filetag/Api.h"
+#include "filetag/posix/OpenedFile.h"
 #include "filetag/taglib/PieceTable.h"
 #include "peru/uri/IURI.h"
 
 #include <tfilestream.h>
 
-#include <filesystem>
 #include <optional>
 #include <string>
 
@@ -53,16 +53,16 @@ private:
     // The range from the first to the last byte that differs from the old file. Requires equal lengths.
     SRange findDifference();
     std::string readNew(const SRange& range);
-    void checkUnchanged() const;
     void writePage(const SRange& range);
     void replaceFile();
 
     P<peru::IURI> m_uri;
+    posix::COpenedFile m_opened;
+    std::string m_path;
     TagLib::FileStream m_file;
     int64_t m_oldSize = 0;
-    std::filesystem::file_time_type m_oldTime; // modification time
-    std::optional<CPieceTable> m_pieces;       // set by the first change, since most files are only read
-    int64_t m_position = 0;                    // used once there are changes; before that the file's own
+    std::optional<CPieceTable> m_pieces; // set by the first change, since most files are only read
+    int64_t m_position = 0;              // used once there are changes; before that the file's own
 };
 
 } // namespace filetag::taglib
