@@ -9,6 +9,9 @@ namespace filetag::flactag {
 class CCoverArt : public taglib::TCoverArtOf<CFLACTag, TagLib::FLAC::Picture> {
 public:
     using TCoverArtOf::TCoverArtOf;
+
+protected:
+    bool isHeld() const override { return getTag()->holds(getPicture()); }
 };
 
 } // namespace filetag::flactag

@@ -1,24 +1,17 @@
 #include "filetag/flactag/FLACTag.h"
 
 #include "filetag/flactag/CoverArt.h"
+#include "filetag/taglib/CommentFields.h"
+#include "filetag/taglib/FlacBlocks.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/system/IPathes.h"
 
 #include <id3v2framefactory.h>
 
-#include <algorithm>
-
 namespace filetag::flactag {
 
 using namespace peru;
-
-namespace {
-
-// The block length field has 24 bits.
-constexpr unsigned int kLargestBlock = 0xffffff;
-
-} // namespace
 
 CFLACTag::CFLACTag(const P<IURI>& file) : CXiphTag(file) {}
 
@@ -27,10 +20,12 @@ CFLACTag::~CFLACTag() {
 }
 
 std::unique_ptr<TagLib::File> CFLACTag::openFile(TagLib::IOStream& stream) {
+    taglib::hideUnreadablePictures(stream);
     auto file = std::make_unique<TagLib::FLAC::File>(&stream, TagLib::ID3v2::FrameFactory::instance());
     if (!file->isValid()) return nullptr;
     m_flac = file.get();
     m_comment = file->xiphComment(false);
+    if (m_comment) taglib::addDroppedFields(*m_comment, taglib::readFlacComment(stream));
     return file;
 }
 
@@ -39,16 +34,14 @@ void CFLACTag::dropTags() {
     m_flac = nullptr;
 }
 
-// TagLib would write a truncated length for a longer block, and readers would continue in the middle of it.
-bool CFLACTag::save(TagLib::File& file) {
-    unsigned int largest = m_comment ? m_comment->render(false).size() : 0;
-    for (const TagLib::FLAC::Picture* picture : getPictures())
-        largest = std::max(largest, picture->render().size());
-    if (largest > kLargestBlock)
+bool CFLACTag::save(TagLib::File& file, TagLib::IOStream& stream) {
+    if (!taglib::fitsFlacBlocks(*m_flac))
         throw CFileError(localize("filetag.CFLACTag.TooLong", "The tag is too long for the file '%FILE%'.",
                                   {{"%FILE%", getShownName(getURI())}}),
                          getURI());
-    return file.save();
+    if (!taglib::saveFlac(*m_flac)) return false;
+    taglib::restorePictures(stream);
+    return true;
 }
 
 P<IString> CFLACTag::getTagType() const {
@@ -90,7 +83,8 @@ void CFLACTag::addCoverArt(const P<CMemoryBlock>& data, const CStringArg& mimeTy
 void CFLACTag::removeCoverArt(int32_t index) {
     TagLib::FLAC::Picture* picture = getPicture(index);
     if (!picture) return;
-    m_flac->removePicture(picture);
+    m_flac->removePicture(picture, false);
+    m_removedPictures.emplace_back(picture);
     markChanged();
 }
 

@@ -24,7 +24,7 @@ public:
 protected:
     std::unique_ptr<TagLib::File> openFile(TagLib::IOStream& stream) override;
     void dropTags() override;
-    bool save(TagLib::File& file) override;
+    bool save(TagLib::File& file, TagLib::IOStream& stream) override;
 
 private:
     TagLib::List<TagLib::FLAC::Picture*> getPictures() const;

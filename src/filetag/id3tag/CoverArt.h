@@ -9,6 +9,9 @@ namespace filetag::id3tag {
 class CCoverArt : public taglib::TCoverArtOf<CID3Tag, TagLib::ID3v2::AttachedPictureFrame> {
 public:
     using TCoverArtOf::TCoverArtOf;
+
+protected:
+    bool isHeld() const override { return getTag()->holds(getPicture()); }
 };
 
 } // namespace filetag::id3tag

@@ -86,6 +86,7 @@ void CID3Tag::dropTags() {
     m_mpeg = nullptr;
     m_tag = nullptr;
     m_oldTag = nullptr;
+    m_removedPictures.clear();
 }
 
 void CID3Tag::createTag() {
@@ -169,7 +170,7 @@ void CID3Tag::writeField(EField field, const TagLib::String& text) {
 
 // Copies fields that only one of the two tags has to the other. TagLib would do so with integers and lose
 // years and track numbers that are not numeric.
-bool CID3Tag::save(TagLib::File&) {
+bool CID3Tag::save(TagLib::File&, TagLib::IOStream&) {
     for (const EField field : kFields) {
         const TagLib::String text = readField(field);
         if (text.isEmpty()) continue;
@@ -223,7 +224,8 @@ void CID3Tag::addCoverArt(const P<CMemoryBlock>& data, const CStringArg& mimeTyp
 void CID3Tag::removeCoverArt(int32_t index) {
     AttachedPictureFrame* picture = getPicture(index);
     if (!picture) return;
-    m_tag->removeFrame(picture);
+    m_tag->removeFrame(picture, false);
+    m_removedPictures.emplace_back(picture);
     markChanged();
 }
 

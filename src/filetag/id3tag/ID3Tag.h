@@ -32,7 +32,7 @@ protected:
     void dropTags() override;
     TagLib::String readField(taglib::EField field) const override;
     void writeField(taglib::EField field, const TagLib::String& text) override;
-    bool save(TagLib::File& file) override;
+    bool save(TagLib::File& file, TagLib::IOStream& stream) override;
 
 private:
     std::vector<TagLib::ID3v2::AttachedPictureFrame*> getPictures() const;
@@ -47,6 +47,8 @@ private:
     TagLib::MPEG::File* m_mpeg = nullptr; // the open file
     TagLib::ID3v2::Tag* m_tag = nullptr;  // null if the file has none, until something is written
     TagLib::ID3v1::Tag* m_oldTag = nullptr;
+    // Kept until close(), so that no new picture gets the address that identifies a removed one.
+    std::vector<std::unique_ptr<TagLib::ID3v2::AttachedPictureFrame>> m_removedPictures;
 };
 
 } // namespace filetag::id3tag

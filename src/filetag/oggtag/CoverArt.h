@@ -9,6 +9,9 @@ namespace filetag::oggtag {
 class CCoverArt : public taglib::TCoverArtOf<COGGTag, TagLib::FLAC::Picture> {
 public:
     using TCoverArtOf::TCoverArtOf;
+
+protected:
+    bool isHeld() const override { return getTag()->holds(getPicture()); }
 };
 
 } // namespace filetag::oggtag

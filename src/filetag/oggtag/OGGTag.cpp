@@ -1,6 +1,7 @@
 #include "filetag/oggtag/OGGTag.h"
 
 #include "filetag/oggtag/CoverArt.h"
+#include "filetag/taglib/CommentFields.h"
 
 namespace filetag::oggtag {
 
@@ -16,6 +17,7 @@ std::unique_ptr<TagLib::File> COGGTag::openFile(TagLib::IOStream& stream) {
     auto file = std::make_unique<TagLib::Ogg::Vorbis::File>(&stream);
     if (!file->isValid()) return nullptr;
     m_comment = file->tag();
+    taglib::addDroppedFields(*m_comment, taglib::readOggComment(*file));
     return file;
 }
 
@@ -62,7 +64,8 @@ void COGGTag::addCoverArt(const P<CMemoryBlock>& data, const CStringArg& mimeTyp
 void COGGTag::removeCoverArt(int32_t index) {
     TagLib::FLAC::Picture* picture = getPicture(index);
     if (!picture) return;
-    m_comment->removePicture(picture);
+    m_comment->removePicture(picture, false);
+    m_removedPictures.emplace_back(picture);
     markChanged();
 }
 

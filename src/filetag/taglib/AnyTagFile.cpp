@@ -1,6 +1,8 @@
 #include "filetag/taglib/AnyTagFile.h"
 
 #include "filetag/taglib/AsfObjects.h"
+#include "filetag/taglib/CommentFields.h"
+#include "filetag/taglib/FlacBlocks.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/system/IPathes.h"
@@ -32,7 +34,6 @@ constexpr char kFreeForm[] = "----:";
 constexpr char kFreeFormOfPrograms[] = "----:com.apple.iTunes:";
 // Texts of the ASF content description have 16-bit lengths in bytes that include a terminating zero.
 constexpr unsigned int kLongestAsfText = 0xffff / 2 - 1;
-constexpr unsigned int kLargestFlacBlock = 0xffffff;
 
 struct SInfoField {
     const char* id;
@@ -153,6 +154,11 @@ void writeWave(TagLib::RIFF::WAV::File& file, const PropertyMap& fields, bool pi
     if (file.hasID3v2Tag() || pictures || !others.isEmpty()) file.ID3v2Tag()->setProperties(fields);
 }
 
+TagLib::Ogg::XiphComment* getComment(TagLib::File& file) {
+    if (auto* flac = dynamic_cast<TagLib::FLAC::File*>(&file)) return flac->xiphComment(false);
+    return dynamic_cast<TagLib::Ogg::XiphComment*>(file.tag());
+}
+
 // TagLib accepts some content by the extension alone.
 bool isPlausible(TagLib::File& file, TagLib::IOStream& stream) {
     if (!file.isValid()) return false;
@@ -185,6 +191,8 @@ bool save(TagLib::File& file) {
     if (auto* mpeg = dynamic_cast<TagLib::MPEG::File*>(&file))
         return mpeg->save(TagLib::MPEG::File::AllTags, TagLib::MPEG::File::StripOthers, TagLib::ID3v2::v4,
                           TagLib::MPEG::File::DoNotDuplicate);
+    if (auto* flac = dynamic_cast<TagLib::FLAC::File*>(&file))
+        return fitsFlacBlocks(*flac) && saveFlac(*flac);
     if (auto* flac = dynamic_cast<TagLib::Ogg::FLAC::File*>(&file)) return saveOggFlac(*flac);
     return file.save();
 }
@@ -197,14 +205,28 @@ CAnyTagFile::CAnyTagFile(const P<IURI>& uri) : m_uri(uri), m_stream(uri) {
 
 void CAnyTagFile::open() {
     orderAsfObjects(m_stream);
+    hideUnreadablePictures(m_stream);
     m_file = TagLib::FileRef(&m_stream);
     if (m_file.isNull() || !isPlausible(*m_file.file(), m_stream)) throw CFileFormatNotSupportedError(m_uri);
+    if (auto* comment = getComment(*m_file.file())) {
+        auto* ogg = dynamic_cast<TagLib::Ogg::File*>(m_file.file());
+        addDroppedFields(*comment, ogg ? readOggComment(*ogg) : readFlacComment(m_stream));
+    }
+}
+
+void CAnyTagFile::commit() {
+    restorePictures(m_stream);
+    m_stream.commit();
 }
 
 PropertyMap CAnyTagFile::readFields() const {
     TagLib::File* file = m_file.file();
     if (const auto* wave = dynamic_cast<TagLib::RIFF::WAV::File*>(file)) return readWave(*wave);
     PropertyMap fields = file->properties();
+    if (fields.contains(kPictureField)) { // one that TagLib cannot decode
+        fields.erase(kPictureField);
+        fields.unsupportedData().append(kPictureField);
+    }
     if (const auto* mp4 = dynamic_cast<TagLib::MP4::File*>(file)) readFreeFields(*mp4->tag(), fields);
     if (const auto* asf = dynamic_cast<TagLib::ASF::File*>(file)) readFreeFields(*asf->tag(), fields);
     return fields;
@@ -220,7 +242,10 @@ void CAnyTagFile::write(const PropertyMap& fields, const std::vector<SPicture>* 
         writeWave(*wave, fields, pictures && !pictures->empty());
     } else {
         const PropertyMap before = readFields();
+        auto* comment = getComment(*file);
+        const StringList unreadable = comment ? comment->fieldListMap()[kPictureField] : StringList();
         const PropertyMap unsupported = file->setProperties(fields);
+        for (const String& picture : unreadable) comment->addField(kPictureField, picture, false);
         if (auto* mp4 = dynamic_cast<TagLib::MP4::File*>(file))
             writeFreeFields(*mp4->tag(), fields, unsupported);
         if (auto* asf = dynamic_cast<TagLib::ASF::File*>(file))
@@ -229,11 +254,7 @@ void CAnyTagFile::write(const PropertyMap& fields, const std::vector<SPicture>* 
             mpeg->APETag()->setProperties(fields);
     }
     if (pictures) writePictures(*file, *pictures);
-    const auto* flac = dynamic_cast<TagLib::FLAC::File*>(file);
-    const bool tooLong =
-        flac && flac->hasXiphComment() &&
-        const_cast<TagLib::FLAC::File*>(flac)->xiphComment()->render(false).size() > kLargestFlacBlock;
-    if (tooLong || !save(*file))
+    if (!save(*file))
         throw CFileError(localize("filetag.CTagLibTag.StoreError", "The tag of '%FILE%' could not be stored.",
                                   {{"%FILE%", getShownName(m_uri)}}),
                          m_uri);

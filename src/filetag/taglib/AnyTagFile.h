@@ -24,7 +24,7 @@ public:
     // Replaces all fields and, if given, all pictures, and reads the result back, which shows what the format
     // does not hold.
     void write(const PropertyMap& fields, const std::vector<SPicture>* pictures);
-    void commit() { m_stream.commit(); }
+    void commit(); // write() must not be called afterwards
 
 private:
     void open();

@@ -38,7 +38,8 @@ template <class Picture> void fillPicture(Picture& picture, const P<peru::CMemor
 // Keeps the tag object alive. A picture that was removed, or whose tag was closed, reads as empty.
 template <class Tag, class Picture> class TCoverArtOf : public peru::CObject, public ICoverArt {
 public:
-    TCoverArtOf(const P<const Tag>& tag, Picture* picture) : m_tag(tag), m_picture(picture) {}
+    TCoverArtOf(const P<const Tag>& tag, Picture* picture)
+        : m_tag(tag), m_picture(picture), m_session(tag->getSession()) {}
 
     P<peru::CMemoryBlock> getData() const override {
         return fromTagBytes(isThere() ? getPictureBytes(*m_picture) : TagLib::ByteVector());
@@ -69,11 +70,16 @@ public:
     }
 
 protected:
-    bool isThere() const { return m_tag->holds(m_picture); }
+    Picture* getPicture() const { return m_picture; }
+    const P<const Tag>& getTag() const { return m_tag; }
+    virtual bool isHeld() const = 0; // the picture has not been removed from the open tag
+
+    bool isThere() const { return m_session == m_tag->getSession() && isHeld(); }
 
 private:
     P<const Tag> m_tag;
     Picture* m_picture;
+    uint32_t m_session;
 };
 
 } // namespace filetag::taglib

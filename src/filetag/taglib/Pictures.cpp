@@ -1,5 +1,7 @@
 #include "filetag/taglib/Pictures.h"
 
+#include "filetag/taglib/FlacBlocks.h"
+
 #include <aifffile.h>
 #include <apefile.h>
 #include <apetag.h>
@@ -29,7 +31,6 @@ constexpr int kFront = 3;
 constexpr int kBack = 4;
 constexpr char kAsfPicture[] = "WM/Picture";
 constexpr char kMp4Pictures[] = "covr";
-constexpr unsigned int kLargestFlacBlock = 0xffffff;
 
 struct SSignature {
     const char* bytes;
@@ -202,7 +203,7 @@ void writePictures(TagLib::File& file, const std::vector<SPicture>& pictures) {
     } else if (holder.flac) {
         holder.flac->removePictures();
         for (const SPicture& source : pictures)
-            if (auto picture = toFlac(source); picture->render().size() <= kLargestFlacBlock)
+            if (auto picture = toFlac(source); fitsFlacBlock(picture->render().size()))
                 holder.flac->addPicture(picture.release());
     } else if (holder.xiph) {
         holder.xiph->removeAllPictures();

@@ -21,6 +21,7 @@ void CTagLibTag::open() {
 }
 
 void CTagLibTag::close() {
+    ++m_session;
     dropTags();
     m_file.reset();
     m_stream.reset();
@@ -36,7 +37,7 @@ void CTagLibTag::store() {
     const std::unique_ptr<CTagLibIOStream> stream = std::move(m_stream);
     // Without this check TagLib would still upgrade the tag to its newest version.
     if (!std::exchange(m_changed, false)) return;
-    if (!save(*m_file))
+    if (!save(*m_file, *stream))
         throw CFileError(localize("filetag.CTagLibTag.StoreError", "The tag of '%FILE%' could not be stored.",
                                   {{"%FILE%", getShownName(m_uri)}}),
                          m_uri);

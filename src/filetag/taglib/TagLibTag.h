@@ -45,6 +45,8 @@ public:
 
     // Called by pictures, which write through to the tag: there is something to store.
     void markChanged() const { m_changed = true; }
+    // Changes with every open() and close(), which end the validity of pictures.
+    uint32_t getSession() const { return m_session; }
 
 protected:
     explicit CTagLibTag(const P<peru::IURI>& file) : m_uri(file) {}
@@ -56,7 +58,7 @@ protected:
     // Only called while the tag is open. Writing the empty text removes the field.
     virtual TagLib::String readField(EField field) const = 0;
     virtual void writeField(EField field, const TagLib::String& text) = 0;
-    virtual bool save(TagLib::File& file) { return file.save(); }
+    virtual bool save(TagLib::File& file, TagLib::IOStream&) { return file.save(); }
 
 private:
     void set(EField field, const peru::CStringArg& text);
@@ -65,6 +67,7 @@ private:
     P<peru::IURI> m_uri;
     std::unique_ptr<CTagLibIOStream> m_stream; // null after store; otherwise outlives m_file
     std::unique_ptr<TagLib::File> m_file;
+    uint32_t m_session = 0;
     mutable bool m_changed = false;
 };
 

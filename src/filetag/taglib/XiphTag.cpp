@@ -38,6 +38,11 @@ TagLib::String getFirst(const TagLib::Ogg::XiphComment& comment, const char* nam
 
 } // namespace
 
+void CXiphTag::dropTags() {
+    m_comment = nullptr;
+    m_removedPictures.clear();
+}
+
 TagLib::String CXiphTag::readField(EField field) const {
     if (!m_comment) return {};
     const SNames names = getNames(field);

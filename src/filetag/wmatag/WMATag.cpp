@@ -6,6 +6,7 @@
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/system/IPathes.h"
 
+#include <algorithm>
 #include <array>
 
 namespace filetag::wmatag {
@@ -81,7 +82,17 @@ std::unique_ptr<TagLib::File> CWMATag::openFile(TagLib::IOStream& stream) {
     auto file = std::make_unique<TagLib::ASF::File>(&stream);
     if (!file->isValid()) return nullptr;
     m_tag = file->tag();
+    for (int32_t count = getCoverArtCount(); count > 0; --count) m_pictureIds.push_back(++m_lastPictureId);
     return file;
+}
+
+void CWMATag::dropTags() {
+    m_tag = nullptr;
+    m_pictureIds.clear();
+}
+
+bool CWMATag::holdsPicture(uint32_t id) const {
+    return std::find(m_pictureIds.begin(), m_pictureIds.end(), id) != m_pictureIds.end();
 }
 
 P<IString> CWMATag::getTagType() const {
@@ -128,7 +139,7 @@ void CWMATag::writeField(EField field, const TagLib::String& text) {
 }
 
 // TagLib would write a truncated length for a longer text, and readers would continue in the middle of it.
-bool CWMATag::save(TagLib::File& file) {
+bool CWMATag::save(TagLib::File& file, TagLib::IOStream&) {
     for (const TagLib::String& text : {m_tag->title(), m_tag->artist(), m_tag->comment()})
         if (text.size() > kLongestText)
             throw CFileError(localize("filetag.CWMATag.TooLong", "The tag is too long for the file '%FILE%'.",
@@ -145,7 +156,8 @@ P<ICoverArt> CWMATag::getCoverArt(int32_t index) const {
     if (index < 0 || index >= getCoverArtCount()) return nullptr;
     const TagLib::ASF::AttributeList pictures = m_tag->attribute(kPicture);
     return make<CCoverArt>(P<const CWMATag>::share(this),
-                           pictures[static_cast<unsigned int>(index)].toPicture());
+                           pictures[static_cast<unsigned int>(index)].toPicture(),
+                           m_pictureIds[static_cast<size_t>(index)]);
 }
 
 void CWMATag::addCoverArt(const P<CMemoryBlock>& data, const CStringArg& mimeType, EPictureType type) {
@@ -153,6 +165,7 @@ void CWMATag::addCoverArt(const P<CMemoryBlock>& data, const CStringArg& mimeTyp
     TagLib::ASF::Picture picture;
     taglib::fillPicture(picture, data, mimeType, type);
     m_tag->addAttribute(kPicture, TagLib::ASF::Attribute(picture));
+    m_pictureIds.push_back(++m_lastPictureId);
     markChanged();
 }
 
@@ -162,6 +175,7 @@ void CWMATag::removeCoverArt(int32_t index) {
     auto picture = pictures.begin();
     std::advance(picture, index);
     pictures.erase(picture);
+    m_pictureIds.erase(m_pictureIds.begin() + index);
     if (pictures.isEmpty())
         m_tag->removeItem(kPicture);
     else

@@ -5,6 +5,8 @@
 
 #include <asffile.h>
 
+#include <vector>
+
 namespace filetag::wmatag {
 
 class FILETAG_API CWMATag : public taglib::CTagLibTag {
@@ -19,20 +21,21 @@ public:
                      EPictureType type) override;
     void removeCoverArt(int32_t index) override;
 
-    // A picture shares its data with the tag's attribute; writing to a removed one has no effect.
-    bool holds(const TagLib::ASF::Picture*) const { return isOpened(); }
+    bool holdsPicture(uint32_t id) const;
 
 protected:
     std::unique_ptr<TagLib::File> openFile(TagLib::IOStream& stream) override;
-    void dropTags() override { m_tag = nullptr; }
+    void dropTags() override;
     TagLib::String readField(taglib::EField field) const override;
     void writeField(taglib::EField field, const TagLib::String& text) override;
-    bool save(TagLib::File& file) override;
+    bool save(TagLib::File& file, TagLib::IOStream& stream) override;
 
 private:
     TagLib::String readOwnField(taglib::EField field) const;
 
-    TagLib::ASF::Tag* m_tag = nullptr; // of the open file
+    TagLib::ASF::Tag* m_tag = nullptr;  // of the open file
+    std::vector<uint32_t> m_pictureIds; // one for each picture, in order
+    uint32_t m_lastPictureId = 0;
 };
 
 } // namespace filetag::wmatag

@@ -3,8 +3,10 @@
 judge.py fields FILE...        prints the texts of each file as a list of JSON objects
 judge.py set FILE JSON         sets such texts; a value may be a list
 judge.py extras FILE           adds fields, frames and blocks that our tags do not support
+judge.py broken FILE           adds pictures that cannot be decoded, to FLAC and Ogg
 judge.py others FILE           prints everything in the tag except the texts, as JSON
 """
+import base64
 import hashlib
 import json
 import sys
@@ -87,7 +89,6 @@ def add_extras(name):
         for key, value in texts.items():
             file.tags[key] = [value, value + " again"]
         if isinstance(file, OggVorbis):
-            import base64
             file.tags["metadata_block_picture"] = [
                 base64.b64encode(entry.write()).decode() for entry in (picture, second)]
         else:
@@ -99,6 +100,19 @@ def add_extras(name):
     file.save()
 
 
+def add_broken(name):
+    file, _ = open_file(name)
+    picture = b"\0\0\0\3\0\0\xff\xffbroken"
+    if isinstance(file, OggVorbis):
+        file.tags["metadata_block_picture"] = ["!not base64!", base64.b64encode(picture).decode()]
+        file.tags["composer"] = ["Somebody"]
+    else:
+        block = flac.MetadataBlock(picture)
+        block.code = 6
+        file.metadata_blocks.append(block)
+    file.save()
+
+
 def get_others(name):
     file, kind = open_file(name)
     known = set(key.lower() for key in NAMES[kind])
@@ -107,10 +121,8 @@ def get_others(name):
         if key.lower() in known or key == "WM/EncodingSettings":
             continue
         value = file.tags[key]
-        if kind == "asf":  # values have no order, and some fields have no text
-            value = sorted(value)
-            if not str(value[0]):
-                continue
+        if kind == "asf" and not str(value[0]):
+            continue
         result[key] = hashlib.sha1(repr(value).encode()).hexdigest() + " " + repr(value)[:200]
     if isinstance(file, flac.FLAC):
         for number, block in enumerate(file.metadata_blocks):
@@ -126,5 +138,7 @@ elif command == "set":
     set_fields(name, json.loads(sys.argv[3]))
 elif command == "extras":
     add_extras(name)
+elif command == "broken":
+    add_broken(name)
 elif command == "others":
     print(json.dumps(get_others(name), indent=1, sort_keys=True))
