@@ -1,4 +1,4 @@
-# Language level, warnings, visibility, sanitizers and the compiler cache, for every target.
+# Language level, warnings, visibility, hardening, sanitizers and the compiler cache, for every target.
 set(CMAKE_CXX_STANDARD 20)
 set(CMAKE_CXX_STANDARD_REQUIRED ON)
 set(CMAKE_CXX_EXTENSIONS OFF)
@@ -8,19 +8,31 @@ set(CMAKE_CXX_VISIBILITY_PRESET hidden)
 set(CMAKE_VISIBILITY_INLINES_HIDDEN ON)
 set(CMAKE_POSITION_INDEPENDENT_CODE ON)
 
-if(NOT CMAKE_BUILD_TYPE)
+if(NOT CMAKE_BUILD_TYPE AND PROJECT_IS_TOP_LEVEL)
     set(CMAKE_BUILD_TYPE RelWithDebInfo CACHE STRING "Build type" FORCE)
 endif()
 # -O3 instead of -O2: the sample and character loops are written to be vectorised.
 set(CMAKE_CXX_FLAGS_RELWITHDEBINFO "-O3 -g -DNDEBUG")
 set(CMAKE_C_FLAGS_RELWITHDEBINFO "-O3 -g -DNDEBUG")
 
-add_compile_options(-Wall -Wextra -Wpedantic -Werror $<$<COMPILE_LANGUAGE:CXX>:-Wnon-virtual-dtor> -Wno-unused-parameter)
+add_compile_options(-Wall -Wextra -Wpedantic $<$<COMPILE_LANGUAGE:CXX>:-Wnon-virtual-dtor> -Wno-unused-parameter)
+if(TONEWRIGHT_WERROR)
+    add_compile_options(-Werror)
+endif()
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
     add_compile_options(-Wshadow=local)
     # Interfaces have protected, virtual destructors; GCC 12 reports false positives inside its
     # std::string, more of them with precompiled headers.
     add_compile_options(-Wno-maybe-uninitialized -Wno-restrict -Wno-stringop-overflow -Wno-array-bounds $<$<COMPILE_LANGUAGE:CXX>:-Wno-non-virtual-dtor>)
+endif()
+
+if(TONEWRIGHT_HARDENING AND NOT TONEWRIGHT_SANITIZERS)
+    include(CheckPIESupported)
+    check_pie_supported()
+    # Distributions pass a fortify level of their own, and a second definition would be a warning. Without optimisation
+    # glibc cannot check anything and warns about that.
+    add_compile_options(-fstack-protector-strong $<$<NOT:$<CONFIG:Debug>>:-U_FORTIFY_SOURCE> $<$<NOT:$<CONFIG:Debug>>:-D_FORTIFY_SOURCE=2>)
+    add_link_options(-Wl,-z,relro,-z,now)
 endif()
 
 if(TONEWRIGHT_SANITIZERS)
@@ -43,7 +55,7 @@ if(TONEWRIGHT_CCACHE AND NOT CMAKE_CXX_COMPILER_LAUNCHER)
     # one cache.
     set(launcher
         ${CMAKE_COMMAND} -E env CCACHE_SLOPPINESS=pch_defines,time_macros,include_file_mtime,include_file_ctime
-        CCACHE_BASEDIR=${CMAKE_SOURCE_DIR} CCACHE_NOHASHDIR=1 ${TONEWRIGHT_CCACHE}
+        CCACHE_BASEDIR=${PROJECT_SOURCE_DIR} CCACHE_NOHASHDIR=1 ${TONEWRIGHT_CCACHE}
     )
     set(CMAKE_C_COMPILER_LAUNCHER ${launcher})
     set(CMAKE_CXX_COMPILER_LAUNCHER ${launcher})
