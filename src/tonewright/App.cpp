@@ -9,6 +9,12 @@
 #include "sonora2/plugins/MediaEnvironment.h"
 #include "tonewright/SonoraLogManagerProxy.h"
 
+#include <algorithm>
+#include <cstdlib>
+#include <filesystem>
+#include <set>
+#include <string_view>
+
 namespace tonewright {
 
 using sonora2::common::CPluginHandler;
@@ -20,7 +26,41 @@ namespace {
 constexpr uint64_t kReadFlags = 0x23E8;
 constexpr uint64_t kWriteFlags = 0x3C8;
 
+// In order of preference.
+constexpr const char* kReadPlugins[] = {"sonora2_flac", "sonora2_decmpa",  "sonora2_vorbis", "sonora2_wav",
+                                        "sonora2_wmf",  "sonora2_dsgraph", "sonora2_discio"};
+constexpr const char* kWritePlugins[] = {"sonora2_flac", "sonora2_l3codec", "sonora2_vorbis", "sonora2_wav",
+                                         "sonora2_wmf"};
+
 constexpr const char* kProductFolder = "Zelvanor Tonewright 4/";
+
+bool isStandardPlugin(std::string_view name) {
+    return std::ranges::count(kReadPlugins, name) + std::ranges::count(kWritePlugins, name) > 0;
+}
+
+// Names of the plug-ins that the user has added, in alphabetical order: every NAME.so in the folders of
+// TONEWRIGHT_PLUGIN_PATH that is not a standard plug-in. Ordinary shared libraries (lib*.so) are skipped, so
+// the folder of a build tree may be named as well.
+std::set<std::string> findAddedPlugins() {
+    std::set<std::string> names;
+    const char* value = std::getenv("TONEWRIGHT_PLUGIN_PATH");
+    std::string_view list = value ? value : "";
+    while (!list.empty()) {
+        const std::filesystem::path folder = list.substr(0, list.find(':'));
+        list.remove_prefix(std::min(list.size(), folder.native().size() + 1));
+        if (!folder.is_absolute()) continue;
+        std::error_code error; // an unreadable folder has no plug-ins
+        for (auto i = std::filesystem::directory_iterator(folder, error);
+             !error && i != std::filesystem::directory_iterator(); i.increment(error)) {
+            const std::string name = i->path().stem();
+            std::error_code ignored;
+            if (i->path().extension() == ".so" && !name.starts_with("lib") && !isStandardPlugin(name) &&
+                i->is_regular_file(ignored))
+                names.insert(name);
+        }
+    }
+    return names;
+}
 
 bool fail(const char* text) {
     peru::getLogManager()->info(peru::CString::fromUTF8("tonewright_shared"), text);
@@ -53,16 +93,12 @@ bool CApp::init() {
                               ->resolveAgainst(system->getDataFolder());
 
     m_logProxy = peru::make<CSonoraLogManagerProxy>();
-    // In order of preference.
-    m_readContext =
-        makeContext(kReadFlags, {"sonora2_flac", "sonora2_decmpa", "sonora2_vorbis", "sonora2_wav",
-                                 "sonora2_wmf", "sonora2_dsgraph", "sonora2_discio"});
+    m_readContext = makeContext(kReadFlags, kReadPlugins);
     if (!m_readContext) return fail("CApp::init could not create SonoraReadContext");
     m_readPluginHandler = peru::make<CPluginHandler>(m_readContext, false);
     if (!m_readPluginHandler) return fail("CApp::init could not create SonoraReadPluginHandler");
 
-    m_writeContext = makeContext(
-        kWriteFlags, {"sonora2_flac", "sonora2_l3codec", "sonora2_vorbis", "sonora2_wav", "sonora2_wmf"});
+    m_writeContext = makeContext(kWriteFlags, kWritePlugins);
     if (!m_writeContext) return fail("CApp::init could not create SonoraWriteContext");
     m_writePluginHandler = peru::make<CPluginHandler>(m_writeContext, false);
     if (!m_writePluginHandler) return fail("CApp::init could not create SonoraWritePluginHandler");
@@ -75,11 +111,12 @@ bool CApp::init() {
     return true;
 }
 
-P<ISonoraContext> CApp::makeContext(uint64_t flags, std::initializer_list<const char*> plugins) const {
+P<ISonoraContext> CApp::makeContext(uint64_t flags, std::span<const char* const> plugins) const {
     P<ISonoraContext> context = peru::make<sonora2::audio::CSonoraContextAudio>();
     context->setLogManager(m_logProxy);
     context->setFlags(flags);
     for (const char* name : plugins) context->addPluginName(name);
+    for (const std::string& name : findAddedPlugins()) context->addPluginName(peru::CString::fromUTF8(name));
     context->setSwitchB(true);
     return context;
 }

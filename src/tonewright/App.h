@@ -10,6 +10,7 @@
 #include "zvr_lang_manager/LanguageId.h"
 
 #include <atomic>
+#include <span>
 
 namespace tonewright {
 
@@ -65,7 +66,7 @@ private:
     }
     [[noreturn]] void throwNotStarted() const;
     P<sonora2::common::ISonoraContext> makeContext(uint64_t flags,
-                                                   std::initializer_list<const char*> plugins) const;
+                                                   std::span<const char* const> plugins) const;
 
     const SFeatures m_features;
     zvr_lang::SLanguageId m_languageId;
