@@ -1,92 +1,96 @@
 # Installation: libraries in lib, plug-ins in lib/tonewright, companions in libexec/tonewright, headers in
-# include/tonewright, a pkg-config file and a CMake package.
+# include/tonewright, documentation in share/doc/tonewright, a pkg-config file and a CMake package.
+#
+# Libraries that plug-ins and C++ hosts link (peru, peru_media, sonora2, filetag) are public and have a soname in lib. The
+# others are installed next to the plug-ins, where only the front library finds them.
 include(CMakePackageConfigHelpers)
+include(PublicHeaders)
 
-if(NOT TARGET tonewright)
-    return()
-endif()
-
-install(
-    TARGETS tonewright
-    EXPORT tonewright-targets
-    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
-    INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
-)
-install(
-    TARGETS peru peru_media sonora2 filetag zvr_lang
-    EXPORT tonewright-targets
-    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
-    INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/tonewright
-)
-get_property(plugins GLOBAL PROPERTY TONEWRIGHT_PLUGINS)
-if(plugins)
-    install(TARGETS ${plugins} LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}/tonewright COMPONENT runtime)
-endif()
-get_property(companions GLOBAL PROPERTY TONEWRIGHT_COMPANIONS)
-if(companions)
-    install(TARGETS ${companions} RUNTIME DESTINATION ${CMAKE_INSTALL_LIBEXECDIR}/tonewright COMPONENT runtime)
-endif()
-if(TARGET tonewright_host)
-    install(TARGETS tonewright_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT runtime)
-endif()
-
-install(
-    DIRECTORY ${CMAKE_SOURCE_DIR}/include/tonewright
-    DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
-    COMPONENT development
-)
-# C++ hosts and plug-ins include "peru/...", "sonora2/..." and "filetag/..." from this directory.
-foreach(library peru sonora2 filetag)
-    install(
-        DIRECTORY ${CMAKE_SOURCE_DIR}/src/${library}
-        DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/tonewright
-        COMPONENT development
-        FILES_MATCHING PATTERN "*.h" PATTERN "posix" EXCLUDE
-    )
-endforeach()
-
-file(RELATIVE_PATH TONEWRIGHT_PC_TO_PREFIX /prefix/${CMAKE_INSTALL_LIBDIR}/pkgconfig /prefix)
-configure_file(cmake/tonewright.pc.in tonewright.pc @ONLY)
-install(
-    FILES ${CMAKE_BINARY_DIR}/tonewright.pc
-    DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig
-    COMPONENT development
-)
-
+set(include_dir ${CMAKE_INSTALL_INCLUDEDIR}/tonewright)
 set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/Tonewright)
+set(doc_dir ${CMAKE_INSTALL_DATAROOTDIR}/doc)
+
+get_property(libraries GLOBAL PROPERTY TONEWRIGHT_LIBRARIES)
+get_property(internal_libraries GLOBAL PROPERTY TONEWRIGHT_INTERNAL_LIBRARIES)
+get_property(plugins GLOBAL PROPERTY TONEWRIGHT_PLUGINS)
+get_property(companions GLOBAL PROPERTY TONEWRIGHT_COMPANIONS)
+
+# tonewright::tonewright serves C hosts, which have no C++ compiler: no C++ requirements on it.
+list(REMOVE_ITEM libraries tonewright)
+foreach(library ${libraries})
+    target_include_directories(${library} INTERFACE $<INSTALL_INTERFACE:${include_dir}>)
+    target_compile_features(${library} INTERFACE cxx_std_20)
+endforeach()
+target_include_directories(tonewright INTERFACE $<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}>)
+target_include_directories(plugin_support INTERFACE $<INSTALL_INTERFACE:${include_dir}/plugin>)
+
 install(
+    TARGETS tonewright ${libraries}
     EXPORT tonewright-targets
-    NAMESPACE tonewright::
-    DESTINATION ${package_dir}
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT libraries NAMELINK_COMPONENT development
+)
+if(internal_libraries)
+    install(
+        TARGETS ${internal_libraries}
+        EXPORT tonewright-targets
+        LIBRARY DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER} COMPONENT libraries NAMELINK_SKIP
+    )
+endif()
+install(TARGETS ${plugins} LIBRARY DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER} COMPONENT libraries)
+install(TARGETS ${companions} RUNTIME DESTINATION ${TONEWRIGHT_COMPANION_FOLDER} COMPONENT libraries)
+install(TARGETS tonewright_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT program)
+install(
+    TARGETS plugin_support
+    EXPORT tonewright-plugin-support-targets
+    ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT development
+)
+
+install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/tonewright DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development)
+function(install_headers from to)
+    foreach(header ${ARGN})
+        get_filename_component(folder ${header} DIRECTORY)
+        install(FILES ${PROJECT_SOURCE_DIR}/${from}/${header} DESTINATION ${to}/${folder} COMPONENT development)
+    endforeach()
+endfunction()
+install_headers(src ${include_dir} ${TONEWRIGHT_PUBLIC_HEADERS})
+# A folder of its own: "support/..." is too common a name for the include path of every host.
+install_headers(plugins ${include_dir}/plugin ${TONEWRIGHT_PLUGIN_HEADERS})
+
+# Written during installation, since --prefix may name another place than the one configured.
+install(
+    CODE "set(PROJECT_VERSION \"${PROJECT_VERSION}\")
+set(PROJECT_DESCRIPTION \"${PROJECT_DESCRIPTION}\")
+set(LIBDIR \"${CMAKE_INSTALL_LIBDIR}\")
+set(INCLUDEDIR \"${CMAKE_INSTALL_INCLUDEDIR}\")
+configure_file(\"${PROJECT_SOURCE_DIR}/cmake/tonewright.pc.in\" \"${PROJECT_BINARY_DIR}/tonewright.pc\" @ONLY)"
     COMPONENT development
 )
-configure_package_config_file(cmake/TonewrightConfig.cmake.in TonewrightConfig.cmake INSTALL_DESTINATION ${package_dir})
-write_basic_package_version_file(TonewrightConfigVersion.cmake COMPATIBILITY SameMinorVersion)
+install(FILES ${PROJECT_BINARY_DIR}/tonewright.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
+
+foreach(set tonewright-targets tonewright-plugin-support-targets)
+    install(EXPORT ${set} NAMESPACE tonewright:: DESTINATION ${package_dir} COMPONENT development)
+endforeach()
+configure_package_config_file(
+    ${PROJECT_SOURCE_DIR}/cmake/TonewrightConfig.cmake.in ${PROJECT_BINARY_DIR}/TonewrightConfig.cmake
+    INSTALL_DESTINATION ${package_dir}
+)
+write_basic_package_version_file(
+    ${PROJECT_BINARY_DIR}/TonewrightConfigVersion.cmake COMPATIBILITY SameMinorVersion
+)
 install(
-    FILES ${CMAKE_BINARY_DIR}/TonewrightConfig.cmake ${CMAKE_BINARY_DIR}/TonewrightConfigVersion.cmake
+    FILES ${PROJECT_BINARY_DIR}/TonewrightConfig.cmake ${PROJECT_BINARY_DIR}/TonewrightConfigVersion.cmake
+          ${PROJECT_SOURCE_DIR}/cmake/TonewrightPlugin.cmake
     DESTINATION ${package_dir}
     COMPONENT development
 )
 
-# cpack -G DEB: tonewright (libraries, plug-ins, program) and tonewright-dev (headers, link names).
-set(CPACK_GENERATOR DEB)
-set(CPACK_PACKAGE_NAME tonewright)
-set(CPACK_PACKAGE_CONTACT "Tonewright maintainers <maintainers@tonewright.invalid>")
-set(CPACK_PACKAGE_DIRECTORY ${CMAKE_SOURCE_DIR}/dist)
-set(CPACK_STRIP_FILES ON)
-set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
-set(CPACK_COMPONENTS_ALL runtime development)
-set(CPACK_DEB_COMPONENT_INSTALL ON)
-set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
-set(CPACK_DEBIAN_ENABLE_COMPONENT_DEPENDS ON)
-set(CPACK_DEBIAN_RUNTIME_PACKAGE_NAME tonewright)
-set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION sound)
-set(CPACK_DEBIAN_RUNTIME_PACKAGE_SHLIBDEPS ON)
-# The package contains these libraries itself; dpkg-shlibdeps finds them in the build tree.
-set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${TONEWRIGHT_LIBRARY_DIR})
-set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_NAME tonewright-dev)
-set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
-set(CPACK_COMPONENT_RUNTIME_DESCRIPTION "${PROJECT_DESCRIPTION}: libraries, plug-ins and the command line program")
-set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION "${PROJECT_DESCRIPTION}: headers")
-set(CPACK_COMPONENT_DEVELOPMENT_DEPENDS runtime)
-include(CPack)
+install(
+    FILES ${PROJECT_SOURCE_DIR}/README.md ${PROJECT_SOURCE_DIR}/CHANGELOG.md ${PROJECT_SOURCE_DIR}/packaging/copyright
+    DESTINATION ${doc_dir}/tonewright
+    COMPONENT program
+)
+install(DIRECTORY ${PROJECT_SOURCE_DIR}/docs DESTINATION ${doc_dir}/tonewright COMPONENT development)
+
+if(PROJECT_IS_TOP_LEVEL)
+    include(Packages)
+endif()

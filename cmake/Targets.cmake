@@ -1,9 +1,15 @@
 # Functions that define the project's targets: libraries, plug-ins, tests, benchmarks and fuzzers.
 include(GoogleTest)
+include(TonewrightPlugin)
 
-set(TONEWRIGHT_LIBRARY_DIR ${CMAKE_BINARY_DIR}/lib)
-set(CMAKE_RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/bin)
+# The build tree has the layout of an installation, so one relative run path serves both. A run path that CMake changes
+# during installation is padded with colons, and the loader searches the working directory for an empty entry.
+set(TONEWRIGHT_LIBRARY_DIR ${PROJECT_BINARY_DIR}/${CMAKE_INSTALL_LIBDIR})
+set(CMAKE_RUNTIME_OUTPUT_DIRECTORY ${PROJECT_BINARY_DIR}/bin)
 set(CMAKE_LIBRARY_OUTPUT_DIRECTORY ${TONEWRIGHT_LIBRARY_DIR})
+set(CMAKE_BUILD_WITH_INSTALL_RPATH ON)
+set(CMAKE_INSTALL_RPATH "$ORIGIN/../${CMAKE_INSTALL_LIBDIR}")
+set(CMAKE_INSTALL_RPATH_USE_LINK_PATH ON) # libraries outside of the system's folders
 
 # tw_sources(VARIABLE [FOLDER...]): sets VARIABLE to the sources of the given folders (by default the current one),
 # including the platform code in their posix/.
@@ -20,15 +26,22 @@ macro(tw_sources variable)
     endforeach()
 endmacro()
 
+# A library binds its own functions at link time: fewer relocations at start-up, and no other library can replace them.
+set(TONEWRIGHT_LINK_STRICTLY -Wl,-Bsymbolic-functions)
 # An undefined symbol fails the build instead of the first call. Sanitizer runtimes are only linked into the
 # executable, so their symbols are undefined here.
 if(NOT TONEWRIGHT_SANITIZERS)
-    set(TONEWRIGHT_LINK_STRICTLY -Wl,--no-undefined)
+    list(APPEND TONEWRIGHT_LINK_STRICTLY -Wl,--no-undefined)
 endif()
 
-# tw_library(NAME FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library with the alias tw::NAME.
+# Installed below lib and libexec.
+set(TONEWRIGHT_PLUGIN_FOLDER ${CMAKE_INSTALL_LIBDIR}/tonewright)
+set(TONEWRIGHT_COMPANION_FOLDER ${CMAKE_INSTALL_LIBEXECDIR}/tonewright)
+
+# tw_library(NAME [INTERNAL] FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library with the alias
+# tw::NAME. An INTERNAL one is installed to the plug-in folder, since only other libraries of the project link it.
 function(tw_library name)
-    cmake_parse_arguments(arg "" "" "FOLDERS;PUBLIC;PRIVATE" ${ARGN})
+    cmake_parse_arguments(arg "INTERNAL" "" "FOLDERS;PUBLIC;PRIVATE" ${ARGN})
     tw_sources(sources ${arg_FOLDERS})
     if(NOT sources)
         return()
@@ -36,7 +49,8 @@ function(tw_library name)
     add_library(${name} SHARED ${sources})
     set_target_properties(${name} PROPERTIES LINKER_LANGUAGE CXX)
     add_library(tw::${name} ALIAS ${name})
-    target_include_directories(${name} PUBLIC $<BUILD_INTERFACE:${CMAKE_SOURCE_DIR}/src>)
+    add_library(tonewright::${name} ALIAS ${name}) # the name that an installed package gives it
+    target_include_directories(${name} PUBLIC $<BUILD_INTERFACE:${PROJECT_SOURCE_DIR}/src>)
     target_link_libraries(${name} PUBLIC ${arg_PUBLIC} PRIVATE ${arg_PRIVATE} Threads::Threads)
     target_link_options(${name} PRIVATE ${TONEWRIGHT_LINK_STRICTLY})
     target_precompile_headers(${name} PRIVATE <algorithm> <cstdint> <cstring> <memory> <string> <vector>)
@@ -44,9 +58,14 @@ function(tw_library name)
         ${name}
         PROPERTIES VERSION ${PROJECT_VERSION}
                    SOVERSION ${PROJECT_VERSION_MAJOR}
-                   BUILD_RPATH_USE_ORIGIN ON
                    INSTALL_RPATH "$ORIGIN"
     )
+    if(arg_INTERNAL)
+        set_target_properties(${name} PROPERTIES INSTALL_RPATH "$ORIGIN/..;$ORIGIN")
+        set_property(GLOBAL APPEND PROPERTY TONEWRIGHT_INTERNAL_LIBRARIES ${name})
+    else()
+        set_property(GLOBAL APPEND PROPERTY TONEWRIGHT_LIBRARIES ${name})
+    endif()
 endfunction()
 
 # tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...]): a test binary built from the current folder.
@@ -58,8 +77,8 @@ function(tw_test name)
     endif()
     add_executable(${name} ${sources})
     target_link_libraries(${name} PRIVATE ${arg_PRIVATE} GTest::gmock GTest::gtest_main)
-    target_include_directories(${name} PRIVATE ${CMAKE_SOURCE_DIR}/tests)
-    target_compile_definitions(${name} PRIVATE TONEWRIGHT_TEST_DATA="${CMAKE_SOURCE_DIR}/tests/data")
+    target_include_directories(${name} PRIVATE ${PROJECT_SOURCE_DIR}/tests)
+    target_compile_definitions(${name} PRIVATE TONEWRIGHT_TEST_DATA="${PROJECT_SOURCE_DIR}/tests/data")
     # Tests spend more time compiling than running, and -O1 halves the compile time. The undefined behaviour
     # sanitizer covers the code under test only.
     target_compile_options(${name} PRIVATE -O1 -g1 -fno-sanitize=undefined)
@@ -85,10 +104,10 @@ function(tw_fuzzer name)
     target_link_libraries(${name} PRIVATE ${arg_LIBRARIES})
     target_compile_options(${name} PRIVATE -fsanitize=fuzzer)
     target_link_options(${name} PRIVATE -fsanitize=fuzzer)
-    set(found ${CMAKE_BINARY_DIR}/corpus/${name})
+    set(found ${PROJECT_BINARY_DIR}/corpus/${name})
     file(MAKE_DIRECTORY ${found})
     add_test(NAME ${name} COMMAND ${name} -runs=${arg_RUNS} -max_len=4096 -timeout=20 -rss_limit_mb=2048
-                                 ${found} ${CMAKE_SOURCE_DIR}/fuzz/corpus/${name})
+                                 ${found} ${PROJECT_SOURCE_DIR}/fuzz/corpus/${name})
     set_tests_properties(${name} PROPERTIES LABELS fuzz TIMEOUT 600)
 endfunction()
 
@@ -96,9 +115,10 @@ endfunction()
 # the plug-in handler looks for it.
 function(tw_plugin name)
     tw_sources(sources)
-    add_library(${name} MODULE ${sources})
-    set_target_properties(${name} PROPERTIES PREFIX "" INSTALL_RPATH "$ORIGIN/..")
-    target_link_libraries(${name} PRIVATE tw::sonora2 tw::plugin_support ${ARGN})
+    tonewright_add_plugin(${name} ${sources})
+    target_link_libraries(${name} PRIVATE ${ARGN})
     target_link_options(${name} PRIVATE ${TONEWRIGHT_LINK_STRICTLY})
+    # The libraries are in the parent folder of an installed plug-in and next to one in the build tree.
+    set_target_properties(${name} PROPERTIES INSTALL_RPATH "$ORIGIN/..;$ORIGIN")
     set_property(GLOBAL APPEND PROPERTY TONEWRIGHT_PLUGINS ${name})
 endfunction()

@@ -21,7 +21,7 @@ std::string toPath(const P<peru::IURI>& file) {
 P<peru::IURI> findCompanion() {
     const P<peru::ISystem> system = peru::getSystem();
     std::vector<P<peru::IURI>> folders =
-        system->getSearchFolders("TONEWRIGHT_COMPANION_PATH", "libexec/tonewright");
+        system->getSearchFolders("TONEWRIGHT_COMPANION_PATH", TONEWRIGHT_COMPANION_FOLDER);
     if (P<peru::IURI> program = system->getProgramFileFolder()) folders.push_back(program);
     for (const P<peru::IURI>& folder : folders) {
         P<peru::IURI> file = folder->appendPath(kCompanionName);

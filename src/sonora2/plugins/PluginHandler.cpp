@@ -95,7 +95,7 @@ P<IURI> CPluginHandler::findLibrary(const P<IString>& fileName) const {
     const P<IURI> program = peru::getSystem()->getProgramFileFolder();
     const bool isDefault = directory && program && directory->equals(program);
     std::vector<P<IURI>> folders =
-        peru::getSystem()->getSearchFolders("TONEWRIGHT_PLUGIN_PATH", "lib/tonewright");
+        peru::getSystem()->getSearchFolders("TONEWRIGHT_PLUGIN_PATH", TONEWRIGHT_PLUGIN_FOLDER);
     if (directory) folders.insert(isDefault ? folders.end() : folders.begin(), directory);
     for (const P<IURI>& folder : folders) {
         P<IURI> file = folder->appendPath(fileName);

@@ -1,0 +1,71 @@
+# C++ headers that are installed: what media plug-ins, hosts with a log, device or source of their own, and users of the
+# tag library include, directly or indirectly. Everything else below src/ is internal and may change at any time.
+set(TONEWRIGHT_PUBLIC_HEADERS
+    peru/Api.h
+    peru/Errors.h
+    peru/Exception.h
+    peru/IBase.h
+    peru/IInstanceWrapper.h
+    peru/IInterfaceQuery.h
+    peru/ISerializable.h
+    peru/MemoryManager.h
+    peru/Object.h
+    peru/P.h
+    peru/collections/IEnum.h
+    peru/log/ILog.h
+    peru/log/LogBase.h
+    peru/media/Api.h
+    peru/media/AudioFormat.h
+    peru/media/Errors.h
+    peru/media/IAudioDevice.h
+    peru/media/IAudioInDevice.h
+    peru/media/IAudioInDeviceListener.h
+    peru/media/IAudioOutDevice.h
+    peru/media/ISystem.h
+    peru/media/VolumeInfo.h
+    peru/streams/IStreams.h
+    peru/streams/MemoryIOStream.h
+    peru/streams/StreamTools.h
+    peru/strings/ICharEncoding.h
+    peru/strings/IString.h
+    peru/strings/String.h
+    peru/strings/StringFormat.h
+    peru/system/IPathes.h
+    peru/threads/IMutex.h
+    peru/threads/IThreadManager.h
+    peru/uri/IURI.h
+    peru/uri/URI.h
+
+    sonora2/Api.h
+    sonora2/context/ILogManager.h
+    sonora2/context/ISonoraContext.h
+    sonora2/context/SonoraError.h
+    sonora2/media/AudioChunk.h
+    sonora2/media/AudioStreamInfos.h
+    sonora2/media/IAudioChunk.h
+    sonora2/media/IAudioFormat.h
+    sonora2/media/IAudioSource.h
+    sonora2/media/IAudioStreamInfos.h
+    sonora2/media/IFormat.h
+    sonora2/media/IMediaDescription.h
+    sonora2/media/ISource.h
+    sonora2/plugins/ISonoraPlugin.h
+    sonora2/samplerateconverter/SampleRateConverter.h
+
+    filetag/Api.h
+    filetag/FileTagFactory.h
+    filetag/ICoverArt.h
+    filetag/ICoverArtFileTag.h
+    filetag/IFileTag.h
+)
+
+# Headers of the library that plug-ins are built on.
+set(TONEWRIGHT_PLUGIN_HEADERS
+    support/Decoder.h
+    support/Encoder.h
+    support/EncoderFormat.h
+    support/MediaFile.h
+    support/OutputFile.h
+    support/Pcm.h
+    support/PluginBase.h
+)
