@@ -3,10 +3,10 @@
 # of them. The results go to the given folder, by default build/demo.
 set -euo pipefail
 
+target=$(realpath -m -- "${1:-$(dirname "$0")/../build/demo}")
 cd "$(dirname "$0")/.."
 scripts/build.sh release tonewright_host companions/all plugins/all
 tonewright=build/release/bin/tonewright
-target=${1:-build/demo}
 mkdir -p "$target"
 
 recordings=(

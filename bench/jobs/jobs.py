@@ -41,9 +41,19 @@ def best(results):
     return tuple(min(column) for column in zip(*results))
 
 
+def show(*commands):
+    """Prints commands with file names only, so that a row says what both sides do."""
+    for command in commands:
+        words = [word.name if isinstance(word, pathlib.Path) else word for word in command]
+        words = ["SCRIPT" if "\n" in word else word for word in words]
+        print("    " + " ".join(words[:14]) + (f" ... ({len(words) - 14} more)" if len(words) > 14 else ""), flush=True)
+
+
 def make_material(work, minutes):
     """Concatenates real recordings, repeats them up to the wanted length, and encodes the result."""
     wav = work / "material.wav"
+    # What exists is complete: it is written to another name, with the same extension, and then renamed.
+    partial = lambda path: path.with_name(f"partial-{path.name}")
     if not wav.exists():
         parts = []
         for i, sound in enumerate(SOUNDS):
@@ -53,16 +63,17 @@ def make_material(work, minutes):
         once = work / "once.wav"
         subprocess.run(["sox", *parts, "-b", "16", once], check=True)
         seconds = float(subprocess.check_output(["soxi", "-D", once]))
-        subprocess.run(["sox", once, wav, "repeat", str(int(minutes * 60 / seconds) + 1), "trim", "0", str(minutes * 60)], check=True)
+        subprocess.run(["sox", once, partial(wav), "repeat", str(int(minutes * 60 / seconds) + 1), "trim", "0", str(minutes * 60)], check=True)
+        partial(wav).rename(wav)
         for part in parts + [once]:
             part.unlink()
     for name, command in {
         "material.flac": ["flac", "-s", "-f", wav, "-o"],
         "material.mp3": ["lame", "--silent", "-b", "192", wav],
-        "material.ogg": ["oggenc", "-Q", "-q", "5", wav, "-o"],
     }.items():
         if not (work / name).exists():
-            subprocess.run([*command, work / name], check=True)
+            subprocess.run([*command, partial(work / name)], check=True)
+            partial(work / name).rename(work / name)
     return wav
 
 
@@ -101,6 +112,7 @@ def compare(title, repeat, ours, peer, theirs, prepare=lambda: None):
     mine, other = best([a for a, _ in pairs]), best([b for _, b in pairs])
     ratio = lambda i: f"{mine[i] / other[i]:6.3f}" if other[i] > 0 else "     -"
     print(f"{title:40} {peer:8} {ratio(0)} {ratio(1)} {mine[1] * 1000:9.0f} {other[1] * 1000:9.0f}", flush=True)
+    show(*(command() if callable(command) else command for command in (ours, theirs)))
 
 
 def bench_tags(host, work, wav, repeat):
@@ -206,8 +218,8 @@ def main():
 
     jobs = [
         ("WAV to FLAC", ours(wav, "-o", out("o.flac")), "flac", ["flac", "-s", "-f", "-5", wav, "-o", out("p.flac")]),
-        ("WAV to MP3, CBR 192", ours(wav, "-o", out("o.mp3"), "--bitrate", "192000"), "lame", ["lame", "--silent", "-b", "192", wav, out("p.mp3")]),
-        ("WAV to MP3, VBR", ours(wav, "-o", out("v.mp3"), "--quality", "0.8"), "lame", ["lame", "--silent", "-V", "2", wav, out("pv.mp3")]),
+        ("WAV to MP3, CBR 192", ours(wav, "-o", out("o.mp3"), "--bitrate", "192000"), "lame", ["lame", "--silent", "--noreplaygain", "-b", "192", wav, out("p.mp3")]),
+        ("WAV to MP3, VBR", ours(wav, "-o", out("v.mp3"), "--quality", "0.8"), "lame", ["lame", "--silent", "--noreplaygain", "-V", "2", wav, out("pv.mp3")]),
         ("WAV to Ogg Vorbis", ours(wav, "-o", out("o.ogg"), "--quality", "0.5"), "oggenc", ["oggenc", "-Q", "-q", "5", wav, "-o", out("p.ogg")]),
         ("FLAC to WAV", ours(work / "material.flac", "-o", out("f.wav")), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", work / "material.flac", out("pf.wav")]),
         ("MP3 to WAV", ours(work / "material.mp3", "-o", out("m.wav")), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", work / "material.mp3", out("pm.wav")]),
@@ -224,6 +236,7 @@ def main():
             f"{arguments.minutes * 60 / mine[1]:12.0f} {mine[2] / 1024:9.1f} {theirs[2] / 1024:9.1f}",
             flush=True,
         )
+        show(our_command, peer_command)
 
     if arguments.only.lower() in "tags":
         bench_tags(host, work, wav, arguments.repeat)
