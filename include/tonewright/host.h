@@ -139,6 +139,39 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCapabilities(const char16_t* uri,
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_CanWrite(const char16_t* uri, int32_t sampleRate, int32_t channelCount,
                                                 int32_t bytesPerSample);
 
+/* --- Outputs that appear complete or not at all --------------------------------------------------- */
+
+/* An existing target is replaced by every encoder only once its new content is complete. An output is for
+ * results that take several steps, such as a sound and then its tag, or that must not be seen before they are
+ * complete: the steps write to a temporary file beside the target, and the last one gives it its name. The
+ * host sets the same suffix by TONEWRIGHT_SetTempExtension, so that the extension before it still selects
+ * formats and kinds of tag. */
+
+typedef enum TONEWRIGHT_OutputFlags {
+    TONEWRIGHT_OUTPUT_REPLACE =
+        1, /* the target may exist, and so may a temporary file that a dead process left */
+    TONEWRIGHT_OUTPUT_LIVE =
+        2 /* the temporary file appears with its first byte and grows, so that what a killed
+             process has written can still be used; otherwise it is empty until it is complete */
+} TONEWRIGHT_OutputFlags;
+
+/* Prepares a target; symbolic links are followed. Nobody else's file is touched. Null when the target exists
+ * and is not to be replaced, cannot be replaced, or is being written by another output, in this process or
+ * another. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateOutput(const char* path, const char* suffix,
+                                                              int32_t flags);
+/* The path of the temporary file, valid until the handle is destroyed. Null for a bad handle. */
+TONEWRIGHT_API const char* TONEWRIGHT_Host_GetOutputPath(TONEWRIGHT_Handle output);
+/* Writes the temporary file to the disk and gives it the target's name; a target that was there keeps its
+ * mode and, where permitted, its owner. 0 leaves the temporary file as it is. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_CommitOutput(TONEWRIGHT_Handle output);
+/* Leaves the temporary file where it is when the handle is destroyed; otherwise that removes it. */
+TONEWRIGHT_API void TONEWRIGHT_Host_KeepOutput(TONEWRIGHT_Handle output);
+
+/* Copies all fields and pictures of a tag that the target's format can hold. `lost` (may be null) receives
+ * the names of those that it cannot, separated by ", ", or null when nothing was lost. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_CopyTags(const char16_t* source, const char16_t* target, char** lost);
+
 /* --- Sources of the host's own, and reading ------------------------------------------------------ */
 
 /* Samples from a host. `read` fills up to `frames` frames and returns how many, 0 at the end, -1 on failure.

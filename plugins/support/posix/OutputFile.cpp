@@ -7,6 +7,7 @@
 #include <climits>
 #include <cstring>
 #include <fcntl.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 #include <utility>
@@ -40,6 +41,7 @@ COutputFile::COutputFile(const SMediaFile& file) : m_file(file) {
     struct stat status {};
     if (m_handle >= 0) {
         m_created = path;
+        ::flock(m_handle, LOCK_EX | LOCK_NB); // marks the file as being written, for other processes
         ::fstat(m_handle, &status);
         m_identity[0] = status.st_dev;
         m_identity[1] = status.st_ino;

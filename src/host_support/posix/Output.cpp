@@ -1,0 +1,229 @@
+#include "host_support/Output.h"
+
+#include "host_support/Guard.h"
+
+#include <cerrno>
+#include <chrono>
+#include <climits>
+#include <cstdio>
+#include <fcntl.h>
+#include <filesystem>
+#include <mutex>
+#include <set>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace tonewright::host_support {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+// Temporary files of this process that are in use, by name: a file lock does not exclude its own process.
+std::mutex g_mutex;
+std::set<std::string> g_claimed;
+std::set<std::string> g_swept; // folders
+
+constexpr auto kLeftoverAge = std::chrono::minutes(1);
+
+// Removes what killed processes have left in a folder: empty files of the suffix and any number that nobody
+// has locked.
+void sweep(const fs::path& folder, std::string suffix) {
+    const size_t digits = suffix.find_last_not_of("0123456789") + 1;
+    if (digits == suffix.size()) return; // not numbered by process
+    suffix.resize(digits);
+    std::error_code error;
+    for (const fs::directory_entry& entry : fs::directory_iterator(folder, error)) {
+        const std::string name = entry.path().filename();
+        const size_t end = name.find_last_not_of("0123456789") + 1;
+        if (end == name.size() || !name.substr(0, end).ends_with(suffix)) continue;
+        const int file = ::open(entry.path().c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
+        struct stat status;
+        if (file >= 0 && ::fstat(file, &status) == 0 && S_ISREG(status.st_mode) && status.st_size == 0 &&
+            std::chrono::system_clock::from_time_t(status.st_mtime) <
+                std::chrono::system_clock::now() - kLeftoverAge &&
+            ::flock(file, LOCK_EX | LOCK_NB) == 0)
+            ::unlink(entry.path().c_str());
+        if (file >= 0) ::close(file);
+    }
+}
+
+[[noreturn]] void fail(const std::string& message) {
+    throw peru::CError(peru::CString::fromUTF8(message));
+}
+
+[[noreturn]] void failSystem(const std::string& doing, int error) {
+    fail(doing + ": " + std::strerror(error));
+}
+
+} // namespace
+
+COutput::COutput(const std::string& path, const std::string& suffix, int32_t flags) : m_flags(flags) {
+    findTarget(path);
+    nameTemporary(suffix);
+    claim();
+    const std::string folder = fs::path(m_target).parent_path();
+    if (std::unique_lock lock(g_mutex); g_swept.insert(folder).second) {
+        lock.unlock();
+        sweep(folder, suffix);
+    }
+    try {
+        create();
+    } catch (...) {
+        m_isOver = true; // nothing of ours is there
+        std::lock_guard lock(g_mutex);
+        g_claimed.erase(m_temporary);
+        throw;
+    }
+}
+
+COutput::~COutput() {
+    if (!m_isOver) ::unlink(m_temporary.c_str());
+    if (m_lock >= 0) ::close(m_lock);
+    std::lock_guard lock(g_mutex);
+    g_claimed.erase(m_temporary);
+}
+
+void COutput::findTarget(const std::string& path) {
+    std::error_code error;
+    fs::path target = fs::absolute(path, error);
+    // A dangling link means the file that it names.
+    for (int links = 0; links < 40 && fs::is_symlink(target, error); ++links) {
+        const fs::path meant = fs::read_symlink(target, error);
+        if (error) failSystem(path + " cannot be written", error.value());
+        target = meant.is_absolute() ? meant : target.parent_path() / meant;
+    }
+    // Two names of one folder must give one name of the temporary file.
+    const fs::path folder = fs::canonical(target.parent_path(), error);
+    if (error == std::errc::no_such_file_or_directory)
+        fail("The folder " + target.parent_path().string() + " does not exist");
+    if (error) failSystem("The folder " + target.parent_path().string() + " cannot be used", error.value());
+    if (!fs::is_directory(folder, error)) fail(folder.string() + " is not a folder");
+    m_target = folder / target.filename();
+
+    struct stat status;
+    if (::stat(m_target.c_str(), &status) == 0) {
+        if (S_ISDIR(status.st_mode)) failSystem(path + " cannot be written", EISDIR);
+        if (!S_ISREG(status.st_mode)) fail(path + " cannot be written: It is not a regular file");
+        if (!(m_flags & TONEWRIGHT_OUTPUT_REPLACE)) fail(path + " exists");
+    } else if (errno != ENOENT) {
+        failSystem(path + " cannot be written", errno);
+    }
+    if (::access(folder.c_str(), W_OK | X_OK) != 0)
+        failSystem("The folder " + folder.string() + " cannot be written to", errno);
+}
+
+// A name at the limit of the file system is cut before its extension, which selects the format.
+void COutput::nameTemporary(const std::string& suffix) {
+    const fs::path target = m_target;
+    std::string name = target.filename();
+    if (name.size() + suffix.size() > NAME_MAX) {
+        const std::string extension = target.extension();
+        size_t hash = std::hash<std::string>()(name);
+        const std::string end = "~" + std::to_string(hash % 1000000) + extension;
+        if (end.size() + suffix.size() >= NAME_MAX)
+            fail(m_target + " cannot be written: The name is too long");
+        size_t length = NAME_MAX - end.size() - suffix.size();
+        while (length > 0 && (name[length] & 0xC0) == 0x80) --length;
+        name = name.substr(0, length) + end;
+    }
+    m_temporary = target.parent_path() / (name + suffix);
+}
+
+// Between processes the claim is a lock on the temporary file itself, which ends with the process. An encoder
+// locks a file that it creates.
+void COutput::claim() {
+    std::lock_guard lock(g_mutex);
+    if (!g_claimed.insert(m_temporary).second) fail("Another job writes to " + m_target + " already");
+}
+
+// What a process has left that is no longer there.
+void COutput::removeLeftover() const {
+    const int left = ::open(m_temporary.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
+    if (left < 0) failSystem(m_temporary + " cannot be replaced", errno);
+    struct stat status;
+    const bool isFile = ::fstat(left, &status) == 0 && S_ISREG(status.st_mode);
+    const bool isFree = isFile && ::flock(left, LOCK_EX | LOCK_NB) == 0;
+    if (isFree) ::unlink(m_temporary.c_str());
+    ::close(left);
+    if (!isFile) fail(m_temporary + " cannot be replaced: It is not a regular file");
+    if (!isFree) fail("Another program writes to " + m_target + " already");
+}
+
+void COutput::create() {
+    struct stat status;
+    const bool isLeft = ::lstat(m_temporary.c_str(), &status) == 0;
+    if (isLeft && !(m_flags & TONEWRIGHT_OUTPUT_REPLACE)) fail(m_temporary + " was left by an earlier run");
+    if (isLeft) removeLeftover();
+    if (m_flags & TONEWRIGHT_OUTPUT_LIVE) return; // the encoder creates it
+    // A file that replaces a private one must be private from the beginning; its mode is set by commit.
+    const bool replaces = ::stat(m_target.c_str(), &status) == 0;
+    m_lock = ::open(m_temporary.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC,
+                    replaces ? S_IRUSR | S_IWUSR : 0666);
+    if (m_lock < 0) failSystem(m_temporary + " cannot be created", errno);
+    ::flock(m_lock, LOCK_EX | LOCK_NB);
+}
+
+void COutput::commit() {
+    const int file = ::open(m_temporary.c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC);
+    if (file < 0) failSystem(m_temporary + " cannot be read", errno);
+    struct stat status;
+    if ((m_flags & TONEWRIGHT_OUTPUT_REPLACE) && ::stat(m_target.c_str(), &status) == 0) {
+        // Best effort: the file may have been another user's.
+        if (::fchown(file, status.st_uid, status.st_gid) != 0) errno = 0;
+        ::fchmod(file, status.st_mode & 07777);
+    }
+    const int synced = ::fsync(file) == 0 ? 0 : errno;
+    ::close(file);
+    if (synced != 0) failSystem(m_temporary + " cannot be written to the disk", synced);
+
+    if (m_flags & TONEWRIGHT_OUTPUT_REPLACE) {
+        if (::rename(m_temporary.c_str(), m_target.c_str()) != 0)
+            failSystem(m_target + " cannot be replaced", errno);
+    } else if (::renameat2(AT_FDCWD, m_temporary.c_str(), AT_FDCWD, m_target.c_str(), RENAME_NOREPLACE) !=
+               0) {
+        // A file that has appeared meanwhile is not replaced, on a file system without that flag either.
+        if (errno == EEXIST) fail(m_target + " has appeared meanwhile");
+        if (::link(m_temporary.c_str(), m_target.c_str()) == 0)
+            ::unlink(m_temporary.c_str());
+        else if (errno == EEXIST)
+            fail(m_target + " has appeared meanwhile");
+        else if (::access(m_target.c_str(), F_OK) == 0 ||
+                 ::rename(m_temporary.c_str(), m_target.c_str()) != 0)
+            failSystem(m_target + " cannot be created", errno);
+    }
+    m_isOver = true;
+    const int folder = ::open(fs::path(m_target).parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (folder >= 0) {
+        ::fsync(folder); // the name itself; some file systems have nothing to do for it
+        ::close(folder);
+    }
+}
+
+} // namespace tonewright::host_support
+
+using namespace tonewright::host_support;
+
+TONEWRIGHT_Handle TONEWRIGHT_Host_CreateOutput(const char* path, const char* suffix, int32_t flags) {
+    return guard<TONEWRIGHT_Handle>(nullptr, [&] {
+        if (!path || !*path || !suffix || !*suffix) throw peru::CError("An output needs a path and a suffix");
+        return wrap(peru::make<COutput>(path, suffix, flags));
+    });
+}
+
+const char* TONEWRIGHT_Host_GetOutputPath(TONEWRIGHT_Handle output) {
+    const P<COutput> object = unwrap<COutput>(output);
+    return object ? object->getTemporary().c_str() : nullptr;
+}
+
+int32_t TONEWRIGHT_Host_CommitOutput(TONEWRIGHT_Handle output) {
+    return guard(0, [&] {
+        require<COutput>(output, "an output")->commit();
+        return 1;
+    });
+}
+
+void TONEWRIGHT_Host_KeepOutput(TONEWRIGHT_Handle output) {
+    if (const P<COutput> object = unwrap<COutput>(output)) object->keep();
+}
