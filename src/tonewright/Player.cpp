@@ -5,6 +5,7 @@
 #include "peru/media/ISystem.h"
 #include "peru/threads/IThreadManager.h"
 #include "tonewright/Quietly.h"
+#include "tonewright/ReasonedError.h"
 
 #include <algorithm>
 #include <cmath>
@@ -73,10 +74,11 @@ void CPlayer::useDevice(const P<peru::media::IAudioOutDevice>& device, const P<I
     if (!format || (source && !hasFormat(*source, *format)))
         throw peru::CError("CPlayer::init could not find format for audio device");
     P<IAudioSource> used = source;
+    sonora2::common::clearLastFailure();
     if (!used && m_handler)
         used = m_handler->createAudioSource(m_uri, format->getSampleRate(), format->getChannelCount(),
                                             format->getBitsPerSample() / 8, false);
-    if (!used) throw peru::CError("CPlayer::init could not open source");
+    if (!used) throw CReasonedError("CPlayer::init could not open source", sonora2::common::getLastFailure());
     STitle title;
     title.source = used;
     title.duration = used->getDuration();

@@ -3,6 +3,7 @@
 #include "peru/Errors.h"
 #include "peru/uri/URI.h"
 #include "sonora2/tracks/TrackCommands.h"
+#include "tonewright/ReasonedError.h"
 #include "tonewright/TrackModifierFade.h"
 
 #include <algorithm>
@@ -44,9 +45,12 @@ P<peru::IString> CTracklistAudioTrack::getDebugText() {
 
 void CTracklistAudioTrack::open() {
     const P<peru::IURI> uri = m_track->getURI();
+    sonora2::common::clearLastFailure();
     const P<IAudioSource> source =
         m_pluginHandler->createAudioSource(uri, m_sampleRate, m_channelCount, m_bytesPerSample, true);
-    if (!source) throw peru::CError("could not open source in CTracklistAudioTrack: " + uri->getAsString());
+    if (!source)
+        throw CReasonedError("could not open source in CTracklistAudioTrack: " + uri->getAsString(),
+                             sonora2::common::getLastFailure());
     source->skipToTime(m_track->getSourceStartTime());
     m_source = source;
 }

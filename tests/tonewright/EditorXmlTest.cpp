@@ -9,6 +9,7 @@
 #include "sonora2/tracks/TrackCommands.h"
 #include "support/Files.h"
 #include "tonewright/TrackModifierFade.h"
+#include "sonora2/context/LastFailure.h"
 #include "tonewright/TracklistAudioSource.h"
 #include "tonewright/TracklistAudioTrack.h"
 
@@ -374,6 +375,7 @@ TEST_F(EditorExport, BadArrangement_GivesNothingAndALine) {
     std::filesystem::remove(folder / "gone.wav");
     EXPECT_NE(TONEWRIGHT_AudioSource_Open(removed.get()), TONEWRIGHT_OK);
     EXPECT_TRUE(hasLine("could not open source in CTracklistAudioTrack: " + uri));
+    EXPECT_THAT(sonora2::common::getLastFailure().message, testing::EndsWith("gone.wav: No such file or directory"));
     EXPECT_EQ(TONEWRIGHT_AudioSource_IsOpened(removed.get()), 0);
 }
 

@@ -1,5 +1,6 @@
 // What exports do to the files of a user, with the real plug-ins.
 #include "Library.h"
+#include "sonora2/context/LastFailure.h"
 #include "support/Files.h"
 #include "tonewright/ICallbackTargets.h"
 
@@ -10,7 +11,7 @@ namespace {
 using namespace tests;
 namespace fs = std::filesystem;
 
-class ExportFiles : public testing::TestWithParam<const char*> {
+class ExportReasons : public testing::Test {
 protected:
     void SetUp() override { ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK); }
     void TearDown() override { TONEWRIGHT_DeInitAll(); }
@@ -58,6 +59,10 @@ protected:
     }
 
     CTempFolder folder;
+};
+
+class ExportFiles : public ExportReasons, public testing::WithParamInterface<const char*> {
+protected:
     const std::string name = std::string("x.") + GetParam();
     const fs::path target = folder / name;
 };
@@ -138,6 +143,44 @@ TEST_P(ExportFiles, FormatThatDoesNotFit_LeavesNothing) {
         EXPECT_EQ(TONEWRIGHT_AudioFormat_Open(makeFormat(target, 44100, 1).get()), 5) << "one bit per second";
     }
     EXPECT_TRUE(list().empty());
+}
+
+// What a host shows its user.
+TEST_F(ExportReasons, FailedCalls_SayWhatIsWrong) {
+    const CHostLog log;
+    SFakeSource script{.rate = 44100, .channels = 8};
+    ASSERT_EQ(encode(wrap(peru::make<CFakeSource>(script)),
+                     CHandle(TONEWRIGHT_CreateAudioFormatFromURI(toUri(folder / "eight.wav").c_str(), 44100,
+                                                                 8, 2, 0.0, 0, 0, 0))),
+              0);
+    struct SCase {
+        std::string name;
+        bool isRead;
+        int32_t rate;
+        std::string reason; // its end
+    };
+    for (const SCase& c : std::initializer_list<SCase>{
+             {"a.xyz", true, 44100, "a.xyz: no plug-in reads .xyz files"},
+             {"a.xyz", false, 44100, "a.xyz: no plug-in writes .xyz files"},
+             {"name", true, 44100, "name: no plug-in reads files without an extension"},
+             {"eight.wav", true, 44100, "eight.wav has 8 channels, which cannot be converted to 2"},
+             {"missing.flac", true, 44100, "missing.flac: No such file or directory"},
+             {"a.mp3", false, 96000,
+              "a.mp3: .mp3 files cannot hold 96000 Hz, 2 channels, 2 bytes per sample"},
+         }) {
+        log.take();
+        const std::u16string uri = toUri(folder / c.name);
+        EXPECT_FALSE(c.isRead ? CHandle(TONEWRIGHT_CreateAudioSourceFromURI(uri.c_str(), c.rate, 2, 2, 0))
+                              : makeFormat(folder / c.name, c.rate));
+        EXPECT_THAT(log.take(), testing::Contains(testing::AllOf(
+                                    testing::Field(&SLine::level, 5),
+                                    testing::Field(&SLine::text, testing::EndsWith(c.reason)))))
+            << c.reason;
+        const sonora2::common::SFailure failure = sonora2::common::getLastFailure();
+        EXPECT_THAT(failure.message, testing::EndsWith(c.reason));
+        EXPECT_THAT(failure.uri, testing::EndsWith(c.name));
+        EXPECT_NE(failure.kind, "");
+    }
 }
 
 INSTANTIATE_TEST_SUITE_P(Formats, ExportFiles, testing::Values("wav", "flac", "ogg", "mp3"),

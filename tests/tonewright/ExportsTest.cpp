@@ -1,5 +1,6 @@
 #include "Library.h"
 
+#include "sonora2/context/LastFailure.h"
 #include "sonora2/context/SonoraError.h"
 #include "tonewright/ICallbackTargets.h"
 
@@ -54,7 +55,13 @@ TEST_F(Exports, Plugins_ThatFailAreSeenByTheHostsLog) {
     EXPECT_THAT(log->take(),
                 ElementsAre(SLine{3, "",
                                   "tried to open file:///refuse.tst with plugin testplugin_good.\n"
-                                  "Opening failed: Error - not today"}));
+                                  "Opening failed: Error - not today"},
+                            SLine{5, "", "refuse.tst: not today"}));
+    const sonora2::common::SFailure failure = sonora2::common::getLastFailure();
+    EXPECT_EQ(failure.kind, "sonora2::common::CSonoraError");
+    EXPECT_EQ(failure.title, "Error");
+    EXPECT_EQ(failure.message, "refuse.tst: not today");
+    EXPECT_EQ(failure.uri, "file:///refuse.tst");
     EXPECT_FALSE(TONEWRIGHT_CreateAudioSourceFromURI(u"file:///a.tst", 44100, 0, 2, 0));
     EXPECT_THAT(
         log->take(),

@@ -71,7 +71,7 @@ public:
         TONEWRIGHT_AddProxyLogManager(m_handle.get());
     }
     ~CHostLog() { TONEWRIGHT_RemoveProxyLogManager(m_handle.get()); }
-    std::vector<SLine> take() { return m_lines->take(); }
+    std::vector<SLine> take() const { return m_lines->take(); }
     TONEWRIGHT_Handle getHandle() const { return m_handle.get(); }
 
 private:

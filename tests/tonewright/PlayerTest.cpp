@@ -211,7 +211,8 @@ TEST_F(Player, Creation_NamesWhatIsMissing) {
                            {"CPlayer::init could not find format for audio device",
                             [&](auto& device) { device.takes = other; }, nullptr},
                            {"CPlayer::init could not open source", [](auto&) {}, u"file:///a.unknown"},
-                           {"CPlayer::init could not open source", [](auto&) {}, u"file:///refuse.tst"}};
+                           {"CPlayer::init could not open source", [](auto&) {}, u"file:///refuse.tst"},
+                           {"refuse.tst: not today", [](auto&) {}, u"file:///refuse.tst"}};
     for (const SCase& c : cases) {
         const auto device = c.change ? peru::make<CScriptedOutDevice>() : nullptr;
         if (c.change) c.change(*device);

@@ -10,6 +10,7 @@
 #include "sonora2/plugins/ParameterRecord.h"
 #include "sonora2/plugins/PluginExtensions.h"
 #include "sonora2/plugins/PluginModule.h"
+#include "sonora2/samplerateconverter/SampleRateConverter.h"
 
 #include <algorithm>
 #include <filesystem>
@@ -24,6 +25,12 @@ using peru::IURI;
 struct CPluginHandler::STexts {
     const char* failed; // URI, plug-in, title, description
     const char* failedUnknown;
+};
+
+struct CPluginHandler::SAttempts {
+    P<IString> key;            // the extension
+    SFailure failure;          // of the first candidate that threw
+    P<ISonoraPlugin> declined; // the first candidate that did not
 };
 
 namespace {
@@ -44,6 +51,31 @@ std::string toLowerAscii(std::string text) {
     for (char& c : text)
         if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
     return text;
+}
+
+// The failure names the file, whatever the plug-in's own text does.
+SFailure makeFailure(SFailure failure, const P<IURI>& uri) {
+    if (failure.kind.empty()) failure.kind = "peru::CFileFormatNotSupportedError";
+    failure.uri = CString::toStdString(uri->getAsString());
+    const std::string name = CString::toStdString(peru::CURI::unescape(uri->getFileName()));
+    if (failure.message.find(name) == std::string::npos) failure.message = name + ": " + failure.message;
+    return failure;
+}
+
+SFailure makeFailure(const P<IString>& message, const P<IURI>& uri) {
+    SFailure failure;
+    failure.message = CString::toStdString(message);
+    return makeFailure(std::move(failure), uri);
+}
+
+P<IString> describe(int rate, int channels, int bytesPerSample) {
+    return peru::format("%d Hz, %d channels, %d bytes per sample", rate, channels, bytesPerSample);
+}
+
+// Without a candidate there is nothing else to report.
+P<IString> explainExtension(const P<IString>& key, const char* doing) {
+    return key->isEmpty() ? peru::format("no plug-in %s files without an extension", doing)
+                          : peru::format("no plug-in %s .%s files", doing, key);
 }
 
 bool contains(IPluginExtensions& extensions, const P<IString>& key) {
@@ -190,8 +222,12 @@ void CPluginHandler::storePreferred(int mask, const P<IURI>& uri, ISonoraPlugin&
 
 // Common to all create calls: tries the remembered plug-in, then each plug-in that lists the extension, in
 // order. `tryCreate` returns an object that has passed every test, or an empty handle.
-template <class T, class TryCreate>
-P<T> CPluginHandler::findObject(const P<IURI>& uri, int mask, const STexts& texts, TryCreate tryCreate) {
+template <class T, class TryCreate> P<T> CPluginHandler::findObject(const P<IURI>& uri, int mask,
+                                                                    const STexts& texts, SAttempts& attempts,
+                                                                    TryCreate tryCreate) {
+    const auto keep = [&](const SFailure& failure) {
+        if (attempts.failure.isEmpty()) attempts.failure = failure;
+    };
     auto attempt = [&](ISonoraPlugin& plugin, const P<IString>& key, ISonoraPlugin* plain) -> P<T> {
         P<IString> name = CString::empty();
         try {
@@ -200,11 +236,18 @@ P<T> CPluginHandler::findObject(const P<IURI>& uri, int mask, const STexts& text
                 const P<IPluginExtensions> extensions = plain->getValidExtensions(mask);
                 if (!extensions || !contains(*extensions, key)) return nullptr;
             }
-            return tryCreate(plugin);
+            P<T> object = tryCreate(plugin);
+            if (!object && !attempts.declined) attempts.declined = P<ISonoraPlugin>::share(&plugin);
+            return object;
         } catch (const peru::CException& e) {
+            keep(describeFailure(e));
             log(kSeverityWarning,
                 peru::format(texts.failed, uri->getAsString(), name, e.getTitle(), e.getDescription()));
+        } catch (const std::exception& e) {
+            keep(describeFailure(e));
+            log(kSeverityWarning, peru::format(texts.failedUnknown, uri->getAsString(), name));
         } catch (...) {
+            keep({"unknown", "", "unknown exception", ""});
             log(kSeverityWarning, peru::format(texts.failedUnknown, uri->getAsString(), name));
         }
         return nullptr;
@@ -212,7 +255,7 @@ P<T> CPluginHandler::findObject(const P<IURI>& uri, int mask, const STexts& text
 
     if (P<ISonoraPlugin> preferred = findPreferred(mask, uri))
         if (P<T> object = attempt(*preferred, nullptr, nullptr)) return object;
-    const P<IString> key = getLookupKey(uri);
+    const P<IString> key = attempts.key = getLookupKey(uri);
     if (key->isEmpty()) return nullptr;
     for (size_t i = 0; i < m_plugins.size(); ++i) {
         P<T> object = attempt(*m_plugins[i], key, m_plainPlugins[i].get());
@@ -238,11 +281,49 @@ P<ISource> CPluginHandler::findSource(const P<IURI>& uri, int mask, const SSourc
     const SSourceParams record = receiveRecord(params);
     if ((mask & kAudioSource) && (!record.nSampleRate || !record.nChannelCount || !record.nBytesPerSample))
         throw CSonoraError("not all sourceparameter fields are valid for creating an audio source");
-    return findObject<ISource>(uri, mask, kTexts, [&](ISonoraPlugin& plugin) -> P<ISource> {
-        P<ISource> source = plugin.tryCreateSource(uri, mask, true, &record);
-        if (source && !passesOpening(source, record.bKeepOpened != 0)) source.reset();
-        return source;
-    });
+    SAttempts attempts;
+    P<ISource> found =
+        findObject<ISource>(uri, mask, kTexts, attempts, [&](ISonoraPlugin& plugin) -> P<ISource> {
+            P<ISource> source = plugin.tryCreateSource(uri, mask, true, &record);
+            if (source && !passesOpening(source, record.bKeepOpened != 0)) source.reset();
+            return source;
+        });
+    if (!found) setLastFailure(explainSource(uri, mask, attempts, record));
+    return found;
+}
+
+// A plug-in that declines gives no reason: the file's own format shows why it could not be delivered.
+SFailure CPluginHandler::explainSource(const P<IURI>& uri, int mask, const SAttempts& attempts,
+                                       const SSourceParams& wanted) const {
+    if (!attempts.failure.isEmpty()) return makeFailure(attempts.failure, uri);
+    if (!attempts.declined) return makeFailure(explainExtension(attempts.key, "reads"), uri);
+    const P<IString> name = peru::CURI::unescape(uri->getFileName());
+    try {
+        const SSourceParams own{}; // zero: the file's own format
+        const P<ISource> opened = attempts.declined->tryCreateSource(uri, mask, true, &own);
+        if (const P<IAudioSource> source = peru::interfaceCast<IAudioSource>(opened)) {
+            const CCloseGuard guard(*source);
+            source->open();
+            const int channels = source->getChannelCount();
+            if (!samplerateconverter::CSampleRateConverter::canConvert(channels, wanted.nChannelCount))
+                return makeFailure(peru::format("%s has %d channels, which cannot be converted to %d", name,
+                                                channels, wanted.nChannelCount),
+                                   uri);
+            return makeFailure(
+                peru::format("%s (%s) cannot be converted to %s", name,
+                             describe(source->getSampleRate(), channels, source->getBytesPerSample()),
+                             describe(wanted.nSampleRate, wanted.nChannelCount, wanted.nBytesPerSample)),
+                uri);
+        }
+    } catch (const std::exception& e) {
+        return makeFailure(describeFailure(e), uri);
+    } catch (...) {
+        // The refusal itself is all that is known.
+    }
+    return makeFailure(
+        peru::format("%s cannot be read as %s", name,
+                     describe(wanted.nSampleRate, wanted.nChannelCount, wanted.nBytesPerSample)),
+        uri);
 }
 
 P<IFormat> CPluginHandler::findFormat(const P<IURI>& uri, int mask, const SFormatParams* params) {
@@ -250,9 +331,21 @@ P<IFormat> CPluginHandler::findFormat(const P<IURI>& uri, int mask, const SForma
                                    "tried to create %s with plugin %s.\nOpening failed: unknown exception"};
     peru::CMutexLock lock(m_lock);
     const SFormatParams record = receiveRecord(params);
-    return findObject<IFormat>(uri, mask, kTexts, [&](ISonoraPlugin& plugin) {
+    SAttempts attempts;
+    P<IFormat> found = findObject<IFormat>(uri, mask, kTexts, attempts, [&](ISonoraPlugin& plugin) {
         return plugin.tryCreateFormat(uri, mask, true, &record);
     });
+    if (found) return found;
+    if (!attempts.failure.isEmpty())
+        setLastFailure(makeFailure(attempts.failure, uri));
+    else if (!attempts.declined)
+        setLastFailure(makeFailure(explainExtension(attempts.key, "writes"), uri));
+    else
+        setLastFailure(makeFailure(
+            peru::format(".%s files cannot hold %s", attempts.key,
+                         describe(record.nSampleRate, record.nChannelCount, record.nBytesPerSample)),
+            uri));
+    return found;
 }
 
 P<ISource> CPluginHandler::createSource(const P<IURI>& uri, const SSourceParams* params) {
@@ -303,7 +396,8 @@ P<peru::IBase> CPluginHandler::createObject(const P<IURI>& uri, const SObjectPar
                                    "tried to create %s with plugin %s.\nOpening failed: unknown exception"};
     peru::CMutexLock lock(m_lock);
     const SObjectParams record; // it has no field but its size, whatever the caller passed
-    return findObject<peru::IBase>(uri, kPluginObject, kTexts, [&](ISonoraPlugin& plugin) {
+    SAttempts attempts;
+    return findObject<peru::IBase>(uri, kPluginObject, kTexts, attempts, [&](ISonoraPlugin& plugin) {
         return plugin.tryCreateObject(uri, &record);
     });
 }

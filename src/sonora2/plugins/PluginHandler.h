@@ -3,6 +3,7 @@
 
 #include "peru/threads/IMutex.h"
 #include "sonora2/context/ISonoraContext.h"
+#include "sonora2/context/LastFailure.h"
 #include "sonora2/media/ISonoraPicture.h"
 #include "sonora2/plugins/IPluginHandler.h"
 #include "sonora2/plugins/IPluginPreference.h"
@@ -12,7 +13,8 @@
 namespace sonora2::common {
 
 // Plug-ins that list the URI's extension are tried in the order of the context's list; a source is accepted
-// once it has actually been opened. Exceptions of a plug-in are logged and never reach the caller.
+// once it has actually been opened. Exceptions of a plug-in are logged and never reach the caller. A create
+// call for a source or a format that returns empty records the reason as this thread's last failure.
 //
 // The plug-ins stay loaded for the handler's lifetime; every object created by them must be destroyed first.
 class SONORA2_API CPluginHandler : public peru::CObject, public IPluginHandler {
@@ -52,12 +54,16 @@ public:
     void addPlugin(const P<ISonoraPlugin>& plugin, const P<ISonoraPlugin>& plainPlugin);
 
 private:
-    struct STexts; // log messages for a failing plug-in
+    struct STexts;    // log messages for a failing plug-in
+    struct SAttempts; // what the candidates for a URI did
 
     P<ISource> findSource(const P<peru::IURI>& uri, int mask, const SSourceParams* params);
     P<IFormat> findFormat(const P<peru::IURI>& uri, int mask, const SFormatParams* params);
-    template <class T, class TryCreate>
-    P<T> findObject(const P<peru::IURI>& uri, int mask, const STexts& texts, TryCreate tryCreate);
+    template <class T, class TryCreate> P<T> findObject(const P<peru::IURI>& uri, int mask,
+                                                        const STexts& texts, SAttempts& attempts,
+                                                        TryCreate tryCreate);
+    SFailure explainSource(const P<peru::IURI>& uri, int mask, const SAttempts& attempts,
+                           const SSourceParams& wanted) const;
     bool passesOpening(const P<ISource>& source, bool keepOpened) const;
     template <class Call> void askPreference(const P<peru::IURI>& uri, Call call);
     P<ISonoraPlugin> findPreferred(int mask, const P<peru::IURI>& uri);

@@ -1,3 +1,4 @@
+#include "sonora2/context/LastFailure.h"
 #include "sonora2/media/IAudioFormat.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
@@ -12,9 +13,14 @@ TONEWRIGHT_Handle TONEWRIGHT_CreateAudioFormatFromURI(const char16_t* uri, int32
                                                       double quality, int32_t nominalBitRate,
                                                       int32_t minBitRate, int32_t maxBitRate) {
     return barrier<TONEWRIGHT_Handle>(nullptr, [&]() -> TONEWRIGHT_Handle {
-        const P<IAudioFormat> format = requireApp()->getWritePluginHandler()->createAudioFormat(
+        const P<CApp> app = requireApp();
+        sonora2::common::clearLastFailure();
+        const P<IAudioFormat> format = app->getWritePluginHandler()->createAudioFormat(
             toURI(uri), sampleRate, channelCount, bytesPerSample);
-        if (!format) return nullptr;
+        if (!format) {
+            reportLastFailure();
+            return nullptr;
+        }
         if (quality > 0.0) format->setAudioQuality(quality);
         if (nominalBitRate > 0 || minBitRate > 0 || maxBitRate > 0)
             format->setAudioBitRate(nominalBitRate, minBitRate, maxBitRate);

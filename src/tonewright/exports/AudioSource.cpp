@@ -1,5 +1,6 @@
 #include "peru/Errors.h"
 #include "peru/strings/StringFormat.h"
+#include "sonora2/context/LastFailure.h"
 #include "sonora2/encoding/SampleReader.h"
 #include "tonewright/EditorXml.h"
 #include "tonewright/RecordingAudioSource.h"
@@ -70,8 +71,12 @@ TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromURI(const char16_t* uri, int32
                                                       int32_t channelCount, int32_t bytesPerSample,
                                                       int32_t keepOpened) {
     return barrier<TONEWRIGHT_Handle>(nullptr, [&] {
-        return wrap(requireApp()->getReadPluginHandler()->createAudioSource(
-            toURI(uri), sampleRate, channelCount, bytesPerSample, keepOpened != 0));
+        const P<CApp> app = requireApp();
+        sonora2::common::clearLastFailure();
+        const P<IAudioSource> source = app->getReadPluginHandler()->createAudioSource(
+            toURI(uri), sampleRate, channelCount, bytesPerSample, keepOpened != 0);
+        if (!source) reportLastFailure();
+        return wrap(source);
     });
 }
 

@@ -1,8 +1,11 @@
 #include "tonewright/exports/Barrier.h"
 
 #include "peru/log/ILog.h"
+#include "tonewright/ReasonedError.h"
 
 namespace tonewright::exports {
+
+using sonora2::common::SFailure;
 
 namespace {
 
@@ -14,26 +17,37 @@ void writeToLog(const peru::SLogMessage& message) noexcept {
     }
 }
 
+// Callers of the library ask for the reason of a failure on the thread that saw it.
+void report(SFailure failure, const char* fallback) {
+    if (failure.message.empty()) failure.message = fallback;
+    sonora2::common::setLastFailure(failure);
+    peru::SLogMessage message;
+    message.level = peru::kLogError;
+    message.source = peru::CString::empty();
+    message.text = peru::CString::fromUTF8(failure.message);
+    writeToLog(message);
+    peru::outputDebugString(message.text);
+}
+
 } // namespace
 
-void reportException(const peru::P<peru::IString>& text, const char* fallback) noexcept {
+void reportException(const std::exception* error) noexcept {
     try {
-        peru::SLogMessage message;
-        message.level = peru::kLogError;
-        message.source = peru::CString::empty();
-        message.text = text && text->getLength() > 0 ? text : peru::CString::fromUTF8(fallback);
-        writeToLog(message);
-        peru::outputDebugString(message.text);
+        if (!error) return report({"unknown", "", kUnknown, ""}, kUnknown);
+        report(sonora2::common::describeFailure(*error), kUnknownStdException);
+        const auto* reasoned = dynamic_cast<const CReasonedError*>(error);
+        if (reasoned && !reasoned->getCause().isEmpty()) report(reasoned->getCause(), kUnknown);
     } catch (...) {
-        // There is nowhere left to report to.
+        peru::outputDebugString(kUnknown);
     }
 }
 
-void reportException(const char* text, const char* fallback) noexcept {
+void reportLastFailure() noexcept {
     try {
-        reportException(peru::CString::fromUTF8(text ? text : ""), fallback);
+        const SFailure failure = sonora2::common::getLastFailure();
+        if (!failure.isEmpty()) report(failure, kUnknown);
     } catch (...) {
-        peru::outputDebugString(fallback);
+        // There is nowhere left to report to.
     }
 }
 

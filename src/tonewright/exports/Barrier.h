@@ -12,22 +12,21 @@ namespace tonewright::exports {
 inline constexpr const char* kUnknownStdException = "unknown std::exception";
 inline constexpr const char* kUnknown = "unknown";
 
-// Writes the text, or `fallback` if it is empty, to the log at its most severe level and to the debugger
-// output.
-void reportException(const peru::P<peru::IString>& text, const char* fallback) noexcept;
-void reportException(const char* text, const char* fallback) noexcept;
+// Writes an error's text to the log at its most severe level and to the debugger output, and records it as
+// this thread's last failure. Null for an exception of an unknown type.
+void reportException(const std::exception* error) noexcept;
+// The same for the failure that is already recorded, if any.
+void reportLastFailure() noexcept;
 
 // Runs the body of an export. Returns `failure` after an exception; it is read only then, so the body may
 // change it as it proceeds.
 template <class R, class Body> R barrier(const R& failure, Body&& body) {
     try {
         return static_cast<R>(body());
-    } catch (const peru::CException& e) {
-        reportException(e.getDescription(), kUnknownStdException);
     } catch (const std::exception& e) {
-        reportException(e.what(), kUnknownStdException);
+        reportException(&e);
     } catch (...) {
-        reportException(kUnknown, kUnknown);
+        reportException(nullptr);
     }
     return failure;
 }
