@@ -33,6 +33,10 @@ template <class E> void resetAll(const std::vector<P<E>>& enums) {
 
 } // namespace
 
+void throwEndOfEnum() {
+    throw CEndOfEnumError();
+}
+
 CEmptyEnum::CEmptyEnum() = default;
 
 CEmptyEnum::~CEmptyEnum() = default;

@@ -21,7 +21,10 @@ public:
     virtual P<IBase> getNext() = 0;
 };
 
-// A typed view of an enumerator.
+// Throws CEndOfEnumError; out of line, so that this header does not depend on the error tree.
+[[noreturn]] PERU_API void throwEndOfEnum();
+
+// A typed view of an enumerator. Without one it has no elements.
 template <class T> class WEnum {
 public:
     WEnum() = default;
@@ -29,8 +32,13 @@ public:
 
     bool hasMore() const { return m_elements && m_elements->hasMore(); }
     int32_t getCount() const { return m_elements ? m_elements->getCount() : 0; }
-    P<T> getNext() { return P<T>(m_elements->getNext()); }
-    void reset() { m_elements->reset(); }
+    P<T> getNext() {
+        if (!m_elements) throwEndOfEnum();
+        return P<T>(m_elements->getNext());
+    }
+    void reset() {
+        if (m_elements) m_elements->reset();
+    }
     const P<IEnum>& getEnum() const { return m_elements; }
 
 private:

@@ -78,6 +78,13 @@ TEST(Enum, WalksToTheEndAndThrowsThere) {
     }
 }
 
+TEST(Enum, TypedViewOfNothingIsEmpty) {
+    WEnum<IString> none;
+    EXPECT_FALSE(none.hasMore());
+    EXPECT_THROW(none.getNext(), CEndOfEnumError);
+    none.reset();
+}
+
 TEST(Enum, SeesTheChangesOfItsArray) {
     P<CArray> array = makeArray("abcd");
     P<IEnum> elements = array->createEnum();
