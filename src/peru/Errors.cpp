@@ -8,9 +8,14 @@ namespace peru {
 
 namespace {
 
+// Text that cannot be decoded is not missing.
+bool isMissing(const CStringArg& text) {
+    return text.getByteSize() == 0;
+}
+
 // Copies the text into a new string of the same encoding.
 P<IString> ownText(const CStringArg& text, const char* whenEmpty = "") {
-    if (text.isEmpty()) return newString(whenEmpty);
+    if (isMissing(text)) return newString(whenEmpty);
     auto* encoding = const_cast<ICharEncoding*>(&text.getEncoding());
     return make<CString>(P<ICharEncoding>::share(encoding), text.getData(), text.getByteSize());
 }
@@ -25,7 +30,7 @@ P<IString> uriText(const P<IURI>& uri) {
 }
 
 P<IString> withObject(const CStringArg& description, const P<IBase>& object) {
-    if (description.isEmpty()) return describe(object);
+    if (isMissing(description)) return describe(object);
     return ownText(description)->replace("%OBJECTDESC%", describe(object));
 }
 
@@ -49,7 +54,7 @@ CError::CError(const CStringArg& description, const CStringArg& title)
 PERU_EXCEPTION_IMPL(CObjectError)
 CObjectError::CObjectError(const CStringArg& description, const P<IBase>& object, const std::type_info* type,
                            const CStringArg& title)
-    : CError(withObject(description, object), title.isEmpty() ? CStringArg("Object error") : title),
+    : CError(withObject(description, object), isMissing(title) ? CStringArg("Object error") : title),
       m_object(object), m_type(type) {
     if (!m_type && object) {
         const IBase& known = *object;
@@ -63,11 +68,15 @@ CCastError::CCastError(const P<IBase>& object, const std::type_info& source, con
                        getClassName(target).c_str() + "'",
                    object, &source, "Cast error") {}
 
+// From here on, constructors with values in their text set the description themselves: a value that happens
+// to contain a placeholder of a base class must not be expanded there.
+
 PERU_EXCEPTION_IMPL(CInvalidObjectStateError)
 CInvalidObjectStateError::CInvalidObjectStateError(const CStringArg& detail, const P<IBase>& object)
-    : CObjectError(
-          (newString("The object is in an invalid state (") + describe(object) + "): ")->concat(detail),
-          object) {}
+    : CObjectError("", object) {
+    m_description =
+        (newString("The object is in an invalid state (") + describe(object) + "): ")->concat(detail);
+}
 
 PERU_EXCEPTION_IMPL(CEndOfEnumError)
 CEndOfEnumError::CEndOfEnumError(const P<IBase>& object)
@@ -77,16 +86,18 @@ CEndOfEnumError::CEndOfEnumError(const P<IBase>& object)
 PERU_EXCEPTION_IMPL(CInvalidArgError)
 CInvalidArgError::CInvalidArgError(const CStringArg& argument, const CStringArg& method,
                                    const P<IBase>& object)
-    : CObjectError(newString("An invalid argument was passed to method '") +
-                       ownText(method, "unspecified method") + "' of '" + describe(object) +
-                       "': " + ownText(argument, "unspecified argument"),
-                   object) {}
+    : CObjectError("", object) {
+    m_description = newString("An invalid argument was passed to method '") +
+                    ownText(method, "unspecified method") + "' of '" + describe(object) +
+                    "': " + ownText(argument, "unspecified argument");
+}
 
 PERU_EXCEPTION_IMPL(CMethodNotImplementedError)
 CMethodNotImplementedError::CMethodNotImplementedError(const CStringArg& method, const P<IBase>& object)
-    : CObjectError(newString("Method not implemented (") + describe(object) +
-                       "): " + ownText(method, "unspecified method."),
-                   object) {}
+    : CObjectError("", object) {
+    m_description = newString("Method not implemented (") + describe(object) +
+                    "): " + ownText(method, "unspecified method.");
+}
 
 PERU_EXCEPTION_IMPL(CParseError)
 CParseError::CParseError(const CStringArg& description) : CError(description, "Parse error") {}
@@ -120,10 +131,10 @@ CURIFormatError::CURIFormatError(const P<IURI>& uri)
     : CURIError(byURI(uri, "peru.CURIFormatError.Desc", "The URI ('%URI%') has an invalid format.",
                       "peru.CURIFormatError.GeneralDesc", "The URI has an invalid format."),
                 uri) {}
-CURIFormatError::CURIFormatError(const CStringArg& uriText)
-    : CURIError(localize("peru.CURIFormatError.Desc", "The URI ('%URI%') has an invalid format.",
-                         {{"%URI%", uriText}}),
-                nullptr) {}
+CURIFormatError::CURIFormatError(const CStringArg& uriText) : CURIError("", nullptr) {
+    m_description = localize("peru.CURIFormatError.Desc", "The URI ('%URI%') has an invalid format.",
+                             {{"%URI%", uriText}});
+}
 
 PERU_EXCEPTION_IMPL(CURITypeNotSupportedError)
 CURITypeNotSupportedError::CURITypeNotSupportedError(const P<IURI>& uri)
@@ -134,7 +145,11 @@ CURITypeNotSupportedError::CURITypeNotSupportedError(const P<IURI>& uri)
 
 PERU_EXCEPTION_IMPL(CFileError)
 CFileError::CFileError(const CStringArg& description, const P<IURI>& file, const CStringArg& title)
-    : CURIError(ownText(description)->replace("%FILE%", uriText(file)), file, title) {}
+    : CURIError(description, file, title) {
+    if (!isMissing(description))
+        m_description =
+            fillPlaceholders(ownText(description), {{"%FILE%", uriText(file)}, {"%URI%", uriText(file)}});
+}
 
 PERU_EXCEPTION_IMPL(CFileNotFoundError)
 CFileNotFoundError::CFileNotFoundError(const P<IURI>& file)
@@ -160,11 +175,13 @@ CStreamError::CStreamError(const CStringArg& description, const P<IURI>& uri, co
     : CURIError(description, uri, title) {}
 
 PERU_EXCEPTION_IMPL(CStreamClosedError)
-CStreamClosedError::CStreamClosedError(const P<IURI>& uri)
-    : CStreamError(streamText("The stream has been closed.", "The stream has been closed", uri), uri) {}
+CStreamClosedError::CStreamClosedError(const P<IURI>& uri) : CStreamError("", uri) {
+    m_description = streamText("The stream has been closed.", "The stream has been closed", uri);
+}
 
 PERU_EXCEPTION_IMPL(CEndOfStreamError)
-CEndOfStreamError::CEndOfStreamError(const P<IURI>& uri)
-    : CStreamError(streamText("Unexpected end of data stream.", "Unexpected end of data stream", uri), uri) {}
+CEndOfStreamError::CEndOfStreamError(const P<IURI>& uri) : CStreamError("", uri) {
+    m_description = streamText("Unexpected end of data stream.", "Unexpected end of data stream", uri);
+}
 
 } // namespace peru

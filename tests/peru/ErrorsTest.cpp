@@ -1,12 +1,12 @@
 #include "peru/Errors.h"
+#include "peru/Rival.h"
 #include "peru/collections/Array.h"
 #include "peru/strings/StringLocalizer.h"
 #include "peru/uri/URI.h"
 #include "support/Files.h"
 
-#include <functional>
+#include <list>
 #include <memory>
-#include <thread>
 
 namespace peru {
 
@@ -75,6 +75,12 @@ TEST(Errors, FillPlaceholdersAfterLocalising) {
     EXPECT_EQ(text(CFileNotFoundError(make<CURI>("file:///a")).getDescription()),
               "file:///a fehlt; file:///a");
     EXPECT_EQ(text(CURIFormatError("::").getDescription()), "[::]");
+    // In one pass: values are not expanded, whatever they contain.
+    EXPECT_EQ(text(CURIFormatError("%URI%").getDescription()), "[%URI%]");
+    EXPECT_EQ(text(CFileError("%FILE% %URI%", make<CURI>("x:%URI%")).getDescription()), "x:%URI% x:%URI%");
+    EXPECT_EQ(text(CInvalidArgError("%OBJECTDESC%", "m").getDescription()),
+              "An invalid argument was passed to method 'm' of 'unknown object': %OBJECTDESC%");
+    EXPECT_EQ(text(localize("", "%B%|%A%|%B%x", {{"%A%", "%B%"}, {"%B%", "%A%"}})), "%A%|%B%|%A%x");
 }
 
 TEST(Exception, CrossesThreadsWithItsOwnType) {
@@ -121,6 +127,32 @@ TEST(Exception, AnswersWhatFromTheCodePageOrTheThread) {
     // A slice has no terminator of its own.
     CException slice(codePage->substring(kStringBegin, codePage->getPosition(3)), nullptr);
     EXPECT_STREQ(slice.what(), "dir");
+}
+
+// A parent that another localizer asks with its lock held.
+class CParent : public CStringLocalizer {
+public:
+    P<IString> getText(const CStringArg& key, const P<IString>& defaultText) override {
+        if (m_onCall) m_onCall();
+        return CStringLocalizer::getText(key, defaultText);
+    }
+    std::function<void()> m_onCall;
+};
+
+TEST(StringLocalizer, EveryOperation_WaitsForARunningLookUp) {
+    const P<CParent> parent = make<CParent>();
+    const P<IStringLocalizer> own = make<CStringLocalizer>();
+    own->setParent(parent);
+    std::list<tests::CRival> rivals;
+    parent->m_onCall = [&] {
+        parent->m_onCall = nullptr;
+        rivals.emplace_back([&] { own->setText("a", newString("b")); });
+        rivals.emplace_back([&] { own->setParent(nullptr); });
+        rivals.emplace_back([&] { own->getText("a", newString("c")); });
+        rivals.emplace_back([&] { own->clear(); });
+        for (const tests::CRival& rival : rivals) EXPECT_TRUE(rival.isBlocked());
+    };
+    EXPECT_EQ(text(own->getText("a", newString("default"))), "default");
 }
 
 TEST(StringLocalizer, PrefersOwnTextThenParentThenDefault) {

@@ -26,6 +26,10 @@ struct SPlaceholder {
     CStringArg value;
 };
 
+// Replaces every placeholder by its value in a single pass: what a value contains is not replaced again.
+PERU_API P<IString> fillPlaceholders(const P<IString>& text,
+                                     std::initializer_list<SPlaceholder> placeholders);
+
 // The localised text of a key, or its default, with the placeholders filled in after localising, so that a
 // translation may move them.
 PERU_API P<IString> localize(const char* key, const char* defaultText,

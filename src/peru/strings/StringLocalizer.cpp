@@ -49,12 +49,29 @@ P<IStringLocalizer> getStringLocalizer() {
         key, []() -> P<IStringLocalizer> { return make<CStringLocalizer>(); });
 }
 
+P<IString> fillPlaceholders(const P<IString>& text, std::initializer_list<SPlaceholder> placeholders) {
+    P<IString> filled;
+    for (SStringPos done = kStringBegin;;) {
+        const SPlaceholder* next = nullptr;
+        SStringPos found;
+        for (const SPlaceholder& each : placeholders) {
+            const SStringPos at = text->find(each.name, done);
+            if (!at.isFound() || (next && at.index >= found.index)) continue;
+            next = &each;
+            found = at;
+        }
+        const P<IString> part = !filled && !next ? text : text->substring(done, found);
+        filled = filled ? filled + part : part;
+        if (!next) return filled;
+        filled = filled->concat(next->value);
+        for (const char* c = next->name; *c; ++c) text->getCharAndAdvance(found);
+        done = found;
+    }
+}
+
 P<IString> localize(const char* key, const char* defaultText,
                     std::initializer_list<SPlaceholder> placeholders) {
-    P<IString> text = getStringLocalizer()->getText(key, newString(defaultText));
-    for (const SPlaceholder& placeholder : placeholders)
-        text = text->replace(placeholder.name, placeholder.value);
-    return text;
+    return fillPlaceholders(getStringLocalizer()->getText(key, newString(defaultText)), placeholders);
 }
 
 } // namespace peru
