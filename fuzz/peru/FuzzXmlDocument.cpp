@@ -38,7 +38,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const bool wide = size > 0 && data[size - 1] % 2 == 0;
     const auto document = make<CXmlDocument>("1.0", wide ? "UTF-16" : "UTF-8");
     try {
-        document->parse(make<CStringInStream>(CString::fromUTF8(bytes)));
+        const auto text = make<CUTF8String>(bytes.data(), static_cast<int32_t>(bytes.size()));
+        document->parse(make<CStringInStream>(text));
     } catch (const CParseError&) {
         return 0;
     }

@@ -3,9 +3,9 @@
 
 #include "peru/strings/ICharEncoding.h"
 
+#include <concepts>
 #include <string>
 #include <string_view>
-#include <type_traits>
 
 namespace peru {
 
@@ -41,48 +41,33 @@ class PERU_API CStringArg {
 public:
     CStringArg(const IString& string);
     CStringArg(const P<IString>& string) : CStringArg(static_cast<const IString*>(string.get())) {}
-    // clang-format off
-    template <class S>
-        requires std::is_base_of_v<IString, S>
-    CStringArg(const P<S>& string) : CStringArg(static_cast<const IString*>(string.get())) {}
-        // clang-format on
-        CStringArg(const char* latin1);
-        CStringArg(const wchar_t* wide);
-        CStringArg(const char16_t* wide);
-        CStringArg(std::nullptr_t) : CStringArg(static_cast<const char*>(nullptr)) {}
-        CStringArg(const ICharEncoding& encoding, const void* data, int32_t byteSize);
-        explicit CStringArg(const SStringView& view) : m_view(view) {}
+    template <std::derived_from<IString> S> CStringArg(const P<S>& string)
+        : CStringArg(static_cast<const IString*>(string.get())) {}
+    CStringArg(const char* latin1);
+    CStringArg(const wchar_t* wide);
+    CStringArg(const char16_t* wide);
+    CStringArg(std::nullptr_t) : CStringArg(static_cast<const char*>(nullptr)) {}
+    CStringArg(const ICharEncoding& encoding, const void* data, int32_t byteSize);
+    explicit CStringArg(const SStringView& view) : m_view(view) {}
 
-        const ICharEncoding& getEncoding() const {
-            return *m_view.encoding;
-        }
-        uint32_t getEncodingId() const {
-            return m_view.encodingId;
-        }
-        const uint8_t* getData() const {
-            return m_view.data;
-        }
-        int32_t getByteSize() const {
-            return m_view.byteSize;
-        }
-        // In characters; counted on first use if not known.
-        int32_t getLength() const {
-            return getView().length;
-        }
-        bool isEmpty() const {
-            return m_view.byteSize == 0 || getLength() == 0;
-        }
-        // The view with its length counted.
-        const SStringView& getView() const {
-            if (m_view.length < 0) count();
-            return m_view;
-        }
+    const ICharEncoding& getEncoding() const { return *m_view.encoding; }
+    uint32_t getEncodingId() const { return m_view.encodingId; }
+    const uint8_t* getData() const { return m_view.data; }
+    int32_t getByteSize() const { return m_view.byteSize; }
+    // In characters; counted on first use if not known.
+    int32_t getLength() const { return getView().length; }
+    bool isEmpty() const { return m_view.byteSize == 0 || getLength() == 0; }
+    // The view with its length counted.
+    const SStringView& getView() const {
+        if (m_view.length < 0) count();
+        return m_view;
+    }
 
-    private:
-        CStringArg(const IString* string); // null is an empty text
-        void count() const;
+private:
+    CStringArg(const IString* string); // null is an empty text
+    void count() const;
 
-        mutable SStringView m_view;
+    mutable SStringView m_view;
 };
 
 // Ordering, implemented by strings.

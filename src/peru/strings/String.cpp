@@ -171,11 +171,6 @@ P<IString> CString::fromView(const SStringView& view) {
     return string;
 }
 
-P<IString> CString::fromUTF8(std::string_view bytes) {
-    if (bytes.size() > INT32_MAX) throw std::bad_alloc();
-    return make<CUTF8String>(bytes.data(), static_cast<int32_t>(bytes.size()));
-}
-
 P<IString> CString::fromUTF16(const char16_t* text, int32_t length) {
     return make<CUTF16String>(text, length);
 }
@@ -203,6 +198,17 @@ P<const IString> CString::getSliceRoot() const {
 
 int32_t CString::getOffset(int32_t index) const {
     return text::getOffset(view(), index);
+}
+
+SStringPos CString::getEndOf(SStringPos start, int32_t count) const {
+    if (count < 0) return getEnd();
+    count = std::min(count, m_length - start.index);
+    if (count == 0) return start;
+    if (int32_t width = text::getFixedWidth(view()))
+        return {start.index + count, start.offset + count * width};
+    SStringPos end = movePosition(start, count - 1);
+    getCharAndAdvance(end);
+    return end;
 }
 
 SStringPos CString::getPosition(int32_t index) const {
@@ -273,27 +279,33 @@ P<IString> CString::nextTokenByString(SStringPos& pos, const CStringArg& separat
     return getSlice(start, resolve(match));
 }
 
+// Malformed bytes are not trimmed: other programs may be able to read them.
 template <class F> P<IString> CString::trimBy(F&& isTrimmed) const {
     char32_t ch;
+    auto getCharSizeAt = [&](SStringPos pos) {
+        return m_encoding->getCharSizeAt(m_data, m_byteSize, pos.offset);
+    };
     SStringPos start = kStringBegin;
+    SStringPos next = start;
+    while (getCharSizeAt(start) > 0 && isTrimmed(getCharAndAdvance(next))) start = next;
     SStringPos end = getEnd();
-    // The code page cannot be read backwards, so a single forward pass finds both ends.
-    bool forwardOnly = m_encodingId == ICharEncoding::kCodePage;
-    bool started = false;
-    int32_t index = 0;
-    CStringWindow window(*m_encoding.get(), m_data, m_byteSize, 0);
-    for (; window.next(ch); ++index) {
-        if (started && forwardOnly && end.index < 0) end = {index, window.getOffset()};
-        if (isTrimmed(ch)) continue;
-        if (!started) start = {index, window.getOffset()};
-        started = true;
-        if (!forwardOnly) break;
-        end = kStringEnd;
+    if (m_encodingId == ICharEncoding::kCodePage) {
+        // The code page cannot be read backwards: this goes forward past the last character to be kept.
+        end = start;
+        for (next = start; next.offset < m_byteSize;) {
+            const bool malformed = getCharSizeAt(next) <= 0;
+            ch = getCharAndAdvance(next);
+            if (!next.isFound()) return getSlice(start, getEnd());
+            if (malformed || !isTrimmed(ch)) end = next;
+        }
+        return getSlice(start, end);
     }
-    if (!started) return getSlice(getEnd(), getEnd());
-    if (forwardOnly) return getSlice(start, resolve(end));
     CStringWindow back(*m_encoding.get(), m_data, m_byteSize, m_byteSize, CStringWindow::backward);
-    while (back.next(ch) && isTrimmed(ch)) end = {end.index - 1, back.getOffset()};
+    while (end.index > start.index && back.next(ch) && isTrimmed(ch)) {
+        const SStringPos last{end.index - 1, back.getOffset()};
+        if (last.offset + getCharSizeAt(last) != end.offset) break;
+        end = last;
+    }
     return getSlice(start, end);
 }
 

@@ -29,6 +29,9 @@ public:
     // The shared empty string.
     static P<IString> empty();
     static P<IString> fromView(const SStringView& view); // a copy
+    // Text from outside. The string is in UTF-8, or in UTF-16 if the bytes are valid UTF-8 with characters
+    // that UTF-8 strings reject, so that such texts are not empty and differ from each other. toStdString()
+    // restores the bytes, invalid ones included.
     static P<IString> fromUTF8(std::string_view bytes);
     static P<IString> fromUTF16(const char16_t* text, int32_t length = -1);
     // The text as UTF-8 bytes. The bytes of a UTF-8 string are returned unchanged, malformed or not.
@@ -130,14 +133,17 @@ private:
     SStringPos getEnd() const { return {m_length, m_byteSize}; }
     // Returns a position with an index from 0 to the length and the matching offset.
     SStringPos resolve(SStringPos pos) const {
-        if (pos.index < 0 || pos.index >= m_length) return getEnd();
+        if (pos.index < 0 || pos.index > m_length) return getEnd();
         if (pos.offset < 0 || pos.offset > m_byteSize) pos.offset = getOffset(pos.index);
         return pos;
     }
     int32_t getOffset(int32_t index) const;
+    // The position right after `count` characters, before any malformed bytes that follow them; the end for
+    // -1. `start` must be resolved.
+    SStringPos getEndOf(SStringPos start, int32_t count) const;
     // Both positions must be resolved.
     SStringView getRange(SStringPos start, SStringPos end) const {
-        if (start.index >= end.index || start.offset > end.offset) end = start;
+        if (start.index > end.index || start.offset > end.offset) end = start;
         return {m_encoding.get(),        m_encodingId, end.offset - start.offset, m_data + start.offset,
                 end.index - start.index, m_wellFormed};
     }
@@ -198,7 +204,7 @@ public:
                           EStringStorage storage = EStringStorage::copy);
 };
 
-// Text in the code page of the C runtime's locale.
+// Text in the code page of the environment's locale.
 class PERU_API CCPString : public CString {
 public:
     using Unit = char;

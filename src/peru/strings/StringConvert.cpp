@@ -4,6 +4,7 @@
 #include "peru/strings/String.h"
 #include "peru/strings/StringText.h"
 #include "peru/strings/StringWindow.h"
+#include "peru/strings/UTF8.h"
 
 #include <charconv>
 #include <climits>
@@ -32,7 +33,31 @@ std::string getNumberText(const CStringArg& text) {
     return digits;
 }
 
+// The text in UTF-16 if it is valid UTF-8 that a UTF-8 string would not read completely, otherwise empty.
+std::u16string decodeRejected(std::string_view bytes) {
+    if (bytes.find('\xE0') == std::string_view::npos && bytes.find('\xF0') == std::string_view::npos)
+        return {};
+    std::u16string units;
+    units.reserve(bytes.size());
+    for (size_t at = 0; at < bytes.size();) {
+        const size_t size = measureUTF8Character(bytes.substr(at, SUTF8Rules::kMaxCharSize));
+        if (size == 0) return {};
+        uint8_t unit[SUTF16Rules::kMaxCharSize];
+        const int32_t written = SUTF16Rules::write(decodeUTF8Character(bytes.data() + at, size), unit);
+        for (int32_t i = 0; i < written; i += 2) units.push_back(SUTF16Rules::load(unit + i));
+        at += size;
+    }
+    return units;
+}
+
 } // namespace
+
+P<IString> CString::fromUTF8(std::string_view bytes) {
+    if (bytes.size() > INT32_MAX) throw std::bad_alloc();
+    const std::u16string units = decodeRejected(bytes);
+    if (!units.empty()) return fromUTF16(units.data(), static_cast<int32_t>(units.size()));
+    return make<CUTF8String>(bytes.data(), static_cast<int32_t>(bytes.size()));
+}
 
 std::string CString::toStdString(const CStringArg& arg) {
     if (arg.getEncodingId() == ICharEncoding::kUTF8)

@@ -65,8 +65,7 @@ P<IString> CString::remove(SStringPos pos, int32_t count) const {
 
 P<IString> CString::replaceRange(SStringPos pos, int32_t count, const CStringArg& text) const {
     pos = resolve(pos);
-    SStringPos end = count < 0 ? getEnd() : resolve(movePosition(pos, count));
-    return edit(pos, end, text.getView());
+    return edit(pos, getEndOf(pos, count), text.getView());
 }
 
 P<IString> CString::replace(const CStringArg& search, const CStringArg& replacement, SStringPos start,
@@ -79,7 +78,7 @@ P<IString> CString::replace(const CStringArg& search, const CStringArg& replacem
     for (SStringPos from = start; wanted.length > 0;) {
         SStringPos match = findView(wanted, from, end);
         if (!match.isFound()) break;
-        from = resolve(movePosition(match, wanted.length));
+        from = getEndOf(match, wanted.length);
         matches.emplace_back(match.offset, from.offset);
         if (from.index >= end.index) break;
     }

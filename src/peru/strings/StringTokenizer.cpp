@@ -34,9 +34,10 @@ CStringTokenizerEnum::CStringTokenizerEnum(const P<IString>& text, const CString
 }
 
 P<IString> CStringTokenizerEnum::findPart(SStringPos& pos) const {
-    if (m_text->isEmpty()) return nullptr;
+    if (m_text->getDataSize() == 0) return nullptr;
     P<IString> token = m_text->nextToken(pos, m_separators);
-    while (m_skipEmptyTokens && token && token->isEmpty()) token = m_text->nextToken(pos, m_separators);
+    while (m_skipEmptyTokens && token && token->getDataSize() == 0)
+        token = m_text->nextToken(pos, m_separators);
     return token;
 }
 
@@ -45,12 +46,16 @@ CStringLineTokenizerEnum::CStringLineTokenizerEnum(const P<IString>& text) : CSt
 }
 
 P<IString> CStringLineTokenizerEnum::findPart(SStringPos& pos) const {
-    if (!pos.isFound() || pos.index >= m_text->getLength()) return nullptr;
+    if (!pos.isFound() || pos.offset >= m_text->getDataSize()) return nullptr;
     SStringPos start = pos;
     SStringPos end = m_text->findAnyOf("\r\n", start);
     pos = end;
-    if (end.isFound() && m_text->getCharAndAdvance(pos) == '\r' && m_text->getCharAt(pos) == '\n')
-        m_text->getCharAndAdvance(pos);
+    if (end.isFound() && m_text->getCharAndAdvance(pos) == '\r') {
+        // Only an adjacent line feed belongs to the carriage return: malformed bytes may stand in between.
+        SStringPos next = pos;
+        const int32_t unit = pos.offset - end.offset;
+        if (m_text->getCharAndAdvance(next) == '\n' && next.offset - pos.offset == unit) pos = next;
+    }
     return m_text->substring(start, end);
 }
 

@@ -23,7 +23,7 @@ public:
     virtual int32_t getPort() const = 0; // -1 when absent
     virtual bool hasPath() const = 0;
     virtual P<IString> getPath() const = 0;
-    virtual P<IString> getUnescapedPath() const = 0; // a UTF-8 string of the unescaped bytes
+    virtual P<IString> getUnescapedPath() const = 0; // of the unescaped bytes, see CString::fromUTF8
     virtual bool hasQuery() const = 0;
     virtual P<IString> getQuery() const = 0;
     virtual P<IString> getUnescapedQuery() const = 0;

@@ -2,6 +2,7 @@
 
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
+#include "peru/strings/IStringLocalizer.h"
 #include "peru/strings/StringSupport.h"
 
 #include <gtest/gtest.h>
@@ -50,7 +51,6 @@ struct SPair {
 };
 
 template <class F> void forRandomPairs(unsigned seed, F&& f) {
-    tests::CUnicodeCodePage codePage;
     std::mt19937 random(seed);
     auto encodings = tests::getAllEncodings();
     for (int round = 0; round < 4000; ++round) {
@@ -233,24 +233,69 @@ TEST(String, TextThatNoEncodingHolds_GetsSubstitutes) {
     EXPECT_EQ(decode(text + surrogate), U"\u0905-\u0906abcdefghijklm?");
 }
 
-// Bytes that the decoder rejects are kept by edits in the same encoding and never become characters.
-TEST(String, MalformedBytes_StayInvisible) {
-    P<IString> smile = CString::fromUTF8("a\xF0\x9F\x98\x80");
-    EXPECT_EQ(smile->getLength(), 1);
-    EXPECT_EQ(CString::toStdString("x: " + smile), "x: a\xF0\x9F\x98\x80");
-    EXPECT_EQ(CString::toStdString(smile->concat(smile)), "a\xF0\x9F\x98\x80"
-                                                          "a\xF0\x9F\x98\x80");
-    P<IString> joined = CString::fromUTF8("a\xC3")->concat(CString::fromUTF8("\xA9"
-                                                                             "b"));
-    EXPECT_EQ(decode(joined), U"ab");
+// Bytes that the decoder rejects are kept by edits and never become characters.
+TEST(String, MalformedBytes_AreInvisibleButKept) {
+    const auto raw = [](const char* bytes) { return P<IString>(make<CUTF8String>(bytes)); };
+    const P<IString> smile = raw("a\xF0\x9F\x98\x80"
+                                 "b");
+    EXPECT_EQ(smile->getLength(), 2);
+    EXPECT_TRUE(smile->equals("ab"));
+    const P<IString> tail = smile->remove(smile->getPosition(1));
+    const P<IString> padded = raw(" \xF0\x9F\x98\x80 x\xFF ");
+    SStringPos pos = kStringBegin;
+    const struct {
+        P<IString> result;
+        const char* expected;
+    } cases[] = {
+        {"x: " + smile, "x: a<>b"},
+        {smile->concat(smile), "a<>ba<>b"},
+        {smile->replaceRange(smile->getPosition(1), 0, "-"), "a<>-b"},
+        {smile->replaceRange(kStringBegin, 0, "-"), "-a<>b"},
+        {smile->replaceRange(kStringBegin, 1, "-"), "-<>b"},
+        {smile->replace("a", "-"), "-<>b"},
+        {smile->replace("b", ""), "a<>"},
+        {tail, "a<>"},
+        {tail->remove(kStringBegin, 1), "<>"},
+        {tail->nextToken(pos, "a"), ""},
+        {tail->nextToken(pos, "a"), "<>"},
+        {padded->trim(), "<> x\xFF"},
+        {padded->trim(" x"), "<> x\xFF"},
+        {fillPlaceholders(raw("%A%\xF0\x9F\x98\x80"), {{"%A%", tail}}), "a<><>"},
+        {raw("a\xC3")->concat(raw("\xA9"
+                                  "b")),
+         "ab"},
+    };
+    for (const auto& each : cases) {
+        std::string bytes = CString::toStdString(each.result);
+        for (size_t at; (at = bytes.find("\xF0\x9F\x98\x80")) != std::string::npos;)
+            bytes.replace(at, 4, "<>");
+        EXPECT_EQ(bytes, each.expected);
+    }
     EXPECT_EQ(newString(u"\x0800")->toUTF8String()->getLength(), 0);
     EXPECT_EQ(CString::toStdString(newString(u"\x0800")), "\xE0\xA0\x80");
-    EXPECT_TRUE(CString::fromUTF8("\xC1\x81")->equals("A")) << "an over-long spelling that passes";
-    EXPECT_TRUE(CString::fromUTF8("\xC1\x81"
-                                  "b")
+    EXPECT_TRUE(raw("\xC1\x81")->equals("A")) << "an over-long spelling that passes";
+    EXPECT_TRUE(raw("\xC1\x81"
+                    "b")
                     ->find("Ab")
                     .isFound());
-    EXPECT_EQ(CString::toStdU16String(CString::fromUTF8("\xED\xA0\x80")), u"\uFFFD");
+    EXPECT_EQ(CString::toStdU16String(raw("\xED\xA0\x80")), u"\uFFFD");
+}
+
+// Valid UTF-8 that UTF-8 strings cannot read arrives in UTF-16; invalid bytes come back as they are.
+TEST(String, TextFromOutside_KeepsItsCharacters) {
+    std::mt19937 random(5);
+    for (char32_t ch = 1; ch < 0x110000; ch += 1 + random() % 40) {
+        if (ch >= 0xD800 && ch < 0xE000) continue;
+        const std::u32string model = {U'a', ch};
+        const std::string bytes = bytesOf(tests::encode(getUTF8CharEncoding(), model));
+        ASSERT_EQ(decode(CString::fromUTF8(bytes)), model);
+        ASSERT_EQ(CString::toStdString(CString::fromUTF8(bytes)), bytes);
+    }
+    for (const char* bytes : {"\xF0\x9F\x98", "\xE0\x9F\x80", "\xF0\x8F\x80\x80", "\xE0\xA0\x80\xFF",
+                              "\xF0\x9F\x98\x80\xED\xA0\x80"}) {
+        EXPECT_TRUE(CString::fromUTF8(bytes)->isEncoding(ICharEncoding::kUTF8));
+        EXPECT_EQ(CString::toStdString(CString::fromUTF8(bytes)), bytes);
+    }
 }
 
 TEST(String, UnitCutOffAtTheEnd_IsLeftOut) {
@@ -289,7 +334,6 @@ TEST(String, Tokens_EndWithAnEmptyHandle) {
 }
 
 TEST(String, Trim_CutsBothEnds) {
-    tests::CUnicodeCodePage codePage;
     struct {
         const char32_t* text;
         const char32_t* trimmed;

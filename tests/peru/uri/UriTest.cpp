@@ -95,6 +95,8 @@ TEST(URI, ComposesWhatItParsed) {
          }) {
         EXPECT_EQ(str(uri(c.text)), c.composed) << c.text;
         EXPECT_EQ(str(uri(c.composed)), c.composed) << c.text;
+        EXPECT_TRUE(uri(c.text)->equals(uri(c.composed))) << c.text;
+        EXPECT_FALSE(uri(c.text)->equals(uri("x:y"))) << c.text;
     }
 }
 
@@ -129,6 +131,9 @@ TEST(URI, EveryByteOfANameSurvives) {
     const P<IURI> u = uri("file:///folder/")->appendPath(CString::fromUTF8(name));
     EXPECT_EQ(str(u->getUnescapedPath()), "/folder/" + name);
     for (char c : str(u)) EXPECT_TRUE(c > 0x20 && c < 0x7F);
+    const P<IURI> notes = uri("file:///%F0%9F%8E%B5");
+    EXPECT_EQ(notes->getUnescapedPath()->getLength(), 2) << "not empty for strings";
+    EXPECT_FALSE(notes->getUnescapedPath()->equals(uri("file:///%F0%9F%8E%B6")->getUnescapedPath()));
     EXPECT_EQ(str(uri(str(u))->getUnescapedPath()), "/folder/" + name);
     EXPECT_EQ(str(CURI::unescape(CURI::escape(CString::fromUTF8(name), ""))), name);
 }

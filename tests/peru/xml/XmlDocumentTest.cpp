@@ -15,9 +15,13 @@ using namespace peru::literals;
 
 namespace {
 
+P<CStringInStream> streamOf(std::string_view bytes) {
+    return make<CStringInStream>(make<CUTF8String>(bytes.data(), static_cast<int32_t>(bytes.size())));
+}
+
 P<CXmlDocument> parse(std::string_view bytes) {
     auto document = make<CXmlDocument>();
-    document->parse(make<CStringInStream>(CString::fromUTF8(bytes)));
+    document->parse(streamOf(bytes));
     return document;
 }
 
@@ -96,8 +100,7 @@ TEST(XmlDocument, parse_NamesLineAndFaultOfBadDocuments) {
     };
     for (const auto& c : cases) {
         const auto document = parse("<kept/>");
-        const auto stream = make<CStringInStream>(CString::fromUTF8(c.bytes));
-        EXPECT_THROW(document->parse(stream), CParseError) << c.bytes.substr(0, 80);
+        EXPECT_THROW(document->parse(streamOf(c.bytes)), CParseError) << c.bytes.substr(0, 80);
         const std::string message = errorOf([&] { parse(c.bytes); });
         EXPECT_TRUE(message.ends_with(c.message)) << message << "\n" << c.bytes.substr(0, 80);
         EXPECT_EQ(text(document->getRootNode()->getName()), "kept");
