@@ -1,6 +1,7 @@
 #include "peru/strings/CharEncodings.h"
 
 #include "peru/Errors.h"
+#include "peru/strings/RuntimeLocale.h"
 
 #include <algorithm>
 #include <climits>
@@ -10,6 +11,12 @@
 namespace peru {
 
 namespace {
+
+// The runtime's conversions use the current locale of the thread.
+class CCodePageScope : public CLocaleScope {
+public:
+    CCodePageScope() : CLocaleScope(getCodePageLocale()) {}
+};
 
 // Byte length of the character at `p`, 0 if it is malformed or truncated.
 int32_t decodeMultiByte(const uint8_t* p, int32_t left, char32_t& out) {
@@ -32,10 +39,12 @@ int32_t encodeMultiByte(char32_t ch, char (&bytes)[MB_LEN_MAX]) {
 } // namespace
 
 int32_t CCPCharEncoding::getMaxCharSize() const {
+    const CCodePageScope scope;
     return static_cast<int32_t>(MB_CUR_MAX);
 }
 
 int32_t CCPCharEncoding::encodeChar(char32_t ch, uint8_t* buffer, int32_t size, int32_t pos) const {
+    const CCodePageScope scope;
     char bytes[MB_LEN_MAX];
     int32_t length = encodeMultiByte(ch, bytes);
     if (length == 0 || pos < 0 || length > size - pos) return pos;
@@ -44,17 +53,20 @@ int32_t CCPCharEncoding::encodeChar(char32_t ch, uint8_t* buffer, int32_t size, 
 }
 
 int32_t CCPCharEncoding::getEncodedSize(char32_t ch) const {
+    const CCodePageScope scope;
     char bytes[MB_LEN_MAX];
     return encodeMultiByte(ch, bytes);
 }
 
 int32_t CCPCharEncoding::getCharSizeAt(const uint8_t* buffer, int32_t size, int32_t pos) const {
+    const CCodePageScope scope;
     char32_t ignored;
     int32_t length = pos < 0 ? 0 : decodeMultiByte(buffer + pos, size - pos, ignored);
     return length > 0 ? length : -1;
 }
 
 int32_t CCPCharEncoding::countChars(const uint8_t* buffer, int32_t size, int32_t pos) const {
+    const CCodePageScope scope;
     int32_t count = 0;
     char32_t ignored;
     for (pos = std::max(pos, 0); pos < size;) {
@@ -70,6 +82,7 @@ int32_t CCPCharEncoding::getTerminatedLength(const uint8_t* buffer) const {
 }
 
 int32_t CCPCharEncoding::advance(const uint8_t* buffer, int32_t size, int32_t count) const {
+    const CCodePageScope scope;
     if (count < 0) return -1;
     char32_t ignored;
     for (int32_t pos = 0; pos < size;) {
@@ -81,6 +94,7 @@ int32_t CCPCharEncoding::advance(const uint8_t* buffer, int32_t size, int32_t co
 }
 
 int32_t CCPCharEncoding::findValidChar(const uint8_t* buffer, int32_t size, int32_t pos) const {
+    const CCodePageScope scope;
     char32_t ignored;
     for (pos = std::max(pos, 0); pos < size; ++pos)
         if (decodeMultiByte(buffer + pos, size - pos, ignored) > 0) return pos;
@@ -88,12 +102,14 @@ int32_t CCPCharEncoding::findValidChar(const uint8_t* buffer, int32_t size, int3
 }
 
 int32_t CCPCharEncoding::decodeChar(char32_t& out, const uint8_t* buffer, int32_t size, int32_t pos) const {
+    const CCodePageScope scope;
     int32_t length = pos < 0 ? 0 : decodeMultiByte(buffer + pos, size - pos, out);
     return length > 0 ? pos + length : -1;
 }
 
 int32_t CCPCharEncoding::decodeNextChar(char32_t& out, const uint8_t* buffer, int32_t size,
                                         int32_t pos) const {
+    const CCodePageScope scope;
     for (pos = std::max(pos, 0); pos < size; ++pos)
         if (int32_t length = decodeMultiByte(buffer + pos, size - pos, out)) return pos + length;
     return -1;
@@ -102,6 +118,7 @@ int32_t CCPCharEncoding::decodeNextChar(char32_t& out, const uint8_t* buffer, in
 int32_t CCPCharEncoding::decodeChars(char32_t* out, int32_t maxCount, int32_t& outCount,
                                      const uint8_t* buffer, int32_t size, int32_t pos,
                                      int32_t* positions) const {
+    const CCodePageScope scope;
     int32_t end = -1;
     outCount = 0;
     for (pos = std::max(pos, 0); pos < size && outCount < maxCount;) {

@@ -37,8 +37,8 @@ class PERU_API CUTF16CharEncoding : public TCharEncoding<SUTF16Rules> {};
 class PERU_API CUTF32CharEncoding : public TCharEncoding<SUTF32Rules> {};
 class PERU_API CLatin1CharEncoding : public TCharEncoding<SLatin1Rules> {};
 
-// The multi-byte text of the C runtime's current locale. Shift states are not kept between characters. It can
-// only be read forwards.
+// The multi-byte text of the environment's locale (getCodePageLocale), whatever locale the process has set.
+// Shift states are not kept between characters. It can only be read forwards.
 class PERU_API CCPCharEncoding : public CObject, public ICharEncoding {
 public:
     uint32_t getId() const override { return kCodePage; }

@@ -1,5 +1,8 @@
 #include "peru/strings/RuntimeLocale.h"
 
+#include <cstring>
+#include <langinfo.h>
+
 namespace peru {
 
 locale_t getPlainLocale() {
@@ -13,6 +16,16 @@ locale_t getUnicodeLocale() {
         return found ? found : getPlainLocale();
     }();
     return unicode;
+}
+
+locale_t getCodePageLocale() {
+    static const locale_t codePage = [] {
+        const locale_t found = newlocale(LC_CTYPE_MASK, "", nullptr);
+        if (found && std::strcmp(nl_langinfo_l(CODESET, found), "ANSI_X3.4-1968") != 0) return found;
+        if (found) freelocale(found);
+        return getUnicodeLocale();
+    }();
+    return codePage;
 }
 
 } // namespace peru

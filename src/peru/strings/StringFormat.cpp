@@ -174,7 +174,7 @@ CStringFormat& CStringFormat::pushDouble(double value) {
     if (m_field.precision >= 0) field.append(".").append(std::to_string(m_field.precision));
     field.push_back(m_field.conversion);
 
-    CPlainLocaleScope plain;
+    CLocaleScope plain(getPlainLocale());
     char shortText[64];
     int length = std::snprintf(shortText, sizeof(shortText), field.c_str(), value);
     if (length < static_cast<int>(sizeof(shortText))) {

@@ -3,9 +3,10 @@
 #include "peru/Errors.h"
 #include "peru/strings/StringSupport.h"
 
+#include "support/Environment.h"
+
 #include <gtest/gtest.h>
 
-#include <climits>
 #include <string>
 
 using namespace peru;
@@ -115,21 +116,30 @@ TEST(CharEncoding, Directions_Agree) {
     }
 }
 
-TEST(CharEncoding, CodePage_FollowsTheLocaleForwardsOnly) {
-    tests::CUnicodeCodePage scope;
-    P<ICharEncoding> cp = getCPCharEncoding();
-    std::string text = "a\xFF\xE2\x82\xAC"; // malformed in the middle
-    char32_t chars[4];
-    int32_t offsets[4];
-    int32_t count = 0;
-    EXPECT_EQ(cp->decodeChars(chars, 4, count, raw(text), sizeOf(text), 0, offsets), 5);
-    ASSERT_EQ(count, 2);
-    EXPECT_EQ(chars[1], U'\u20AC');
-    EXPECT_EQ(offsets[1], 2);
-    EXPECT_EQ(cp->getEncodedSize(0xE9), 2);
-    EXPECT_THROW(cp->findPrevChar(raw(text), 5, 5), CMethodNotImplementedError);
-    EXPECT_THROW(cp->decodePrevChar(chars[0], raw(text), 5, 5), CMethodNotImplementedError);
-    EXPECT_THROW(cp->decodePrevValidChar(chars[0], raw(text), 5, 5), CMethodNotImplementedError);
-    EXPECT_THROW(cp->decodeCharsBackward(chars, 4, count, raw(text), 5, 5, nullptr),
-                 CMethodNotImplementedError);
+// Each in a process of its own, since the locale is chosen once. The process itself has not set any.
+TEST(CharEncoding, CodePage_FollowsTheEnvironmentForwardsOnly) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    const auto check = [] {
+        P<ICharEncoding> cp = getCPCharEncoding();
+        std::string text = "a\xFF\xE2\x82\xAC"; // malformed in the middle
+        char32_t chars[4];
+        int32_t offsets[4];
+        int32_t count = 0;
+        EXPECT_EQ(cp->decodeChars(chars, 4, count, raw(text), sizeOf(text), 0, offsets), 5);
+        EXPECT_EQ(count, 2);
+        EXPECT_EQ(chars[1], U'\u20AC');
+        EXPECT_EQ(offsets[1], 2);
+        EXPECT_EQ(cp->getEncodedSize(0xE9), 2);
+        EXPECT_STREQ(CException(newString(u"\u20AC"), nullptr).what(), "\xE2\x82\xAC");
+        EXPECT_THROW(cp->findPrevChar(raw(text), 5, 5), CMethodNotImplementedError);
+        EXPECT_THROW(cp->decodePrevChar(chars[0], raw(text), 5, 5), CMethodNotImplementedError);
+        EXPECT_THROW(cp->decodePrevValidChar(chars[0], raw(text), 5, 5), CMethodNotImplementedError);
+        EXPECT_THROW(cp->decodeCharsBackward(chars, 4, count, raw(text), 5, 5, nullptr),
+                     CMethodNotImplementedError);
+        std::exit(testing::Test::HasFailure());
+    };
+    for (const char* locale : {"C.UTF-8", "C", "xx_XX.UTF-8"}) {
+        const tests::CEnvironment environment("LC_ALL", locale);
+        EXPECT_EXIT(check(), testing::ExitedWithCode(0), "") << locale;
+    }
 }

@@ -1,7 +1,10 @@
 #include "peru/strings/StringFormat.h"
 
 #include "peru/Errors.h"
+#include "support/Environment.h"
 #include "support/Files.h"
+#include "support/Process.h"
+#include "support/TempFolder.h"
 
 #include <clocale>
 #include <cmath>
@@ -48,7 +51,13 @@ TEST(StringFormat, Integers_PrintAsInC) {
 
 TEST(StringFormat, Doubles_PrintAsInCWithAPoint) {
     std::mt19937 random(3);
-    std::setlocale(LC_NUMERIC, "de_DE.UTF-8"); // where it is installed
+    // A locale of our own, since no other is sure to be installed.
+    const tests::CTempFolder folder;
+    const auto source = folder.write("source", "LC_NUMERIC\ndecimal_point \",\"\nthousands_sep \".\"\n"
+                                               "grouping 3;3\nEND LC_NUMERIC\n");
+    tests::run({"localedef", "-c", "-i", source, "-f", "/dev/null", folder / "comma"});
+    const tests::CEnvironment locales("LOCPATH", folder.path().string());
+    ASSERT_TRUE(std::setlocale(LC_NUMERIC, "comma"));
     for (int round = 0; round < 20000; ++round) {
         std::string field = randomField(random, "-+0 #") + "eEfgG"[random() % 5] + ">";
         double value =

@@ -4,7 +4,6 @@
 #include "peru/strings/CharEncodingRules.h"
 #include "peru/strings/String.h"
 
-#include <clocale>
 #include <random>
 #include <string>
 #include <vector>
@@ -16,18 +15,6 @@ using peru::ICharEncoding;
 using peru::IString;
 using peru::P;
 using peru::SStringPos;
-
-// Makes the code page UTF-8 for a test and restores it afterwards.
-class CUnicodeCodePage {
-public:
-    CUnicodeCodePage() : m_previous(std::setlocale(LC_CTYPE, nullptr)) {
-        std::setlocale(LC_CTYPE, "C.UTF-8");
-    }
-    ~CUnicodeCodePage() { std::setlocale(LC_CTYPE, m_previous.c_str()); }
-
-private:
-    std::string m_previous;
-};
 
 inline std::vector<P<ICharEncoding>> getAllEncodings() {
     return {peru::getLatin1CharEncoding(), peru::getUTF8CharEncoding(), peru::getUTF16CharEncoding(),
