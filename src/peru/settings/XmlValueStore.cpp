@@ -37,7 +37,7 @@ P<IString> encodeName(const CStringArg& name) {
 P<IString> decodeName(const P<IString>& name) {
     std::string bytes = CString::toStdString(name);
     if (bytes.starts_with(kLeadMark)) bytes.erase(0, kLeadMark.size());
-    return xml::toString(replaceAll(bytes, kBlankMark, " "));
+    return CString::fromUTF8(replaceAll(bytes, kBlankMark, " "));
 }
 
 // Calls `visit` with each encoded name of the path until it returns false.
@@ -128,7 +128,7 @@ void CXmlValueStore::noteChange() {
 void CXmlValueStore::setString(const CStringArg& section, const CStringArg& name, const CStringArg& value) {
     checkWritable();
     // Everything is validated before any section is created.
-    const P<IString> encoded = xml::toString(xml::fromName(encodeName(name), "IValueStore::setString"));
+    const P<IString> encoded = CString::fromUTF8(xml::fromName(encodeName(name), "IValueStore::setString"));
     xml::fromText(value, "IValueStore::setString");
     walkPath(section, [](const P<IString>& each) {
         xml::fromName(each, "IValueStore::setString");

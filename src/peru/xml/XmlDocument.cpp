@@ -73,15 +73,15 @@ std::string decode(std::string bytes, const P<IURI>& uri) {
             fail(xml::EFault::encoding, uri, xml::getLine(text, text.size()));
         return text;
     }
-    if (startsWith(bytes, "\xEF\xBB\xBF")) return bytes.erase(0, 3);
+    if (startsWith(bytes, xml::kMark)) return bytes.erase(0, xml::kMark.size());
     return declaresLatin1(bytes) ? xml::decodeLatin1(bytes) : bytes;
 }
 
 } // namespace
 
 CXmlDocument::CXmlDocument(const CStringArg& version, const CStringArg& encoding)
-    : m_version(xml::toString(xml::fromText(version, "CXmlDocument::CXmlDocument"))),
-      m_encoding(xml::toString(xml::fromText(encoding, "CXmlDocument::CXmlDocument"))),
+    : m_version(CString::fromUTF8(xml::fromText(version, "CXmlDocument::CXmlDocument"))),
+      m_encoding(CString::fromUTF8(xml::fromText(encoding, "CXmlDocument::CXmlDocument"))),
       m_tree(std::make_unique<TiXmlDocument>()) {
     if (!m_version->equals("1.0") && !m_version->equals("1.1"))
         throw CInvalidArgError(newString("version '") + m_version + "'", "CXmlDocument::CXmlDocument");
@@ -98,11 +98,14 @@ void CXmlDocument::parse(const P<IInStream>& stream) {
 }
 
 void CXmlDocument::parseString(const P<IString>& text) {
-    const P<IString> own = text && text->isEncoding(ICharEncoding::kUTF8) ? text->getTerminated() : nullptr;
-    if (!own) return parseBytes(text ? CString::toStdString(text) : std::string(), nullptr);
-    std::string_view bytes(reinterpret_cast<const char*>(own->getData()),
-                           static_cast<size_t>(own->getDataSize()));
-    if (startsWith(bytes, "\xEF\xBB\xBF")) bytes.remove_prefix(3);
+    if (!text) return parseBytes("", nullptr);
+    const bool utf8 = text->isEncoding(ICharEncoding::kUTF8);
+    const P<IString> own = utf8 ? text->getTerminated() : nullptr;
+    const std::string converted = utf8 ? std::string() : CString::toStdString(text);
+    std::string_view bytes = converted;
+    if (utf8)
+        bytes = {reinterpret_cast<const char*>(own->getData()), static_cast<size_t>(own->getDataSize())};
+    if (startsWith(bytes, xml::kMark)) bytes.remove_prefix(xml::kMark.size());
     parseBytes(bytes, nullptr);
 }
 
@@ -135,7 +138,7 @@ void CXmlDocument::print(const P<IOutStream>& stream) const {
 }
 
 P<IString> CXmlDocument::printToString() const {
-    const P<IString> text = xml::toString(printBytes());
+    const P<IString> text = CString::fromUTF8(printBytes());
     return isWide() ? text->toUTF16String() : text;
 }
 

@@ -33,7 +33,7 @@ TiXmlElement& CXmlNode::getElement() const {
 }
 
 P<IString> CXmlNode::getName() const {
-    return xml::toString(getElement().ValueStr());
+    return CString::fromUTF8(getElement().ValueStr());
 }
 
 P<IString> CXmlNode::getText() const {
@@ -48,7 +48,7 @@ P<IString> CXmlNode::getText() const {
             joined += part->ValueStr();
     }
     if (!first) return CString::empty();
-    return xml::toString(joined.empty() ? first->ValueStr() : first->ValueStr() + joined);
+    return CString::fromUTF8(joined.empty() ? first->ValueStr() : first->ValueStr() + joined);
 }
 
 void CXmlNode::setText(const CStringArg& text) {

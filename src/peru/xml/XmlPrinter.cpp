@@ -124,7 +124,7 @@ void CXmlDocument::CXmlPrinter::write(std::string_view text, bool keepBlanks) {
             break;
         case '\xEF':
             // The parser treats the byte order mark as white space.
-            if (text.substr(i, 3) == "\xEF\xBB\xBF") {
+            if (text.substr(i).starts_with(xml::kMark)) {
                 m_text += "&#xFEFF;";
                 i += 2;
             } else {

@@ -13,11 +13,11 @@ CXmlProperty::CXmlProperty(const P<CXmlNode>& node, std::string name)
 CXmlProperty::~CXmlProperty() = default;
 
 P<IString> CXmlProperty::getName() const {
-    return xml::toString(m_name);
+    return CString::fromUTF8(m_name);
 }
 
 P<IString> CXmlProperty::getValue() const {
-    return xml::toString(getAttribute().ValueStr());
+    return CString::fromUTF8(getAttribute().ValueStr());
 }
 
 void CXmlProperty::setValue(const CStringArg& value) {

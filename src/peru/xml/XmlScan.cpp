@@ -42,13 +42,19 @@ public:
 
 private:
     bool startsWith(std::string_view start) const { return m_text.substr(m_at, start.size()) == start; }
+    // In any letter case; `word` is in lower case.
+    bool startsWithWord(std::string_view word) const {
+        const std::string_view start = m_text.substr(m_at, word.size());
+        return std::equal(start.begin(), start.end(), word.begin(), word.end(),
+                          [](char a, char b) { return a == b || (a >= 'A' && a <= 'Z' && a + 32 == b); });
+    }
     char peek() const { return m_at < m_text.size() ? m_text[m_at] : '\0'; }
     void fail(size_t offset, EFault kind = EFault::syntax) { m_fault = {kind, offset}; }
     void skipBlanks() {
         while (m_at < m_text.size() && isBlank(m_text[m_at])) ++m_at;
     }
     bool skipName() {
-        if (!isNameStart(peek())) return false;
+        if (!startsName(m_text.substr(m_at))) return false;
         while (isNamePart(peek())) ++m_at;
         return true;
     }
@@ -94,7 +100,41 @@ private:
     void scanInstruction() {
         const size_t start = m_at;
         skipUntil(2, "?>");
-        if (m_fault.kind == EFault::none && m_text.find('>', start) + 1 != m_at) fail(start);
+        if (m_fault.kind != EFault::none) return;
+        const size_t end = m_at;
+        m_at = start + 2;
+        if (m_text.find('>', start) + 1 != end || (startsWithWord("xml") && !scanDeclaration(end - 2)))
+            return fail(start);
+        m_at = end;
+    }
+
+    // The parser takes every instruction that starts with "xml" for a declaration. From a malformed one it
+    // reads on into the document, or it stops without an error and drops the rest.
+    bool scanDeclaration(size_t end) {
+        m_at += 3;
+        if (peek() == '-')
+            while (isNamePart(peek())) ++m_at;
+        for (;;) {
+            const size_t before = m_at;
+            skipBlanks();
+            if (m_at == end) return true;
+            if (m_at == before || !scanDeclared(end)) return false;
+        }
+    }
+
+    bool scanDeclared(size_t end) {
+        if (!scanEquals()) return false;
+        const size_t close = m_text.find(peek(), m_at + 1);
+        if (close >= end) return false;
+        const std::string_view value = m_text.substr(m_at + 1, close - m_at - 1);
+        if (value.find_first_of("\"'<") != std::string_view::npos) return false;
+        // The parser looks for these words after every blank, even within a value.
+        for (; m_at < close; ++m_at)
+            if (isBlank(m_text[m_at - 1]) &&
+                (startsWithWord("version") || startsWithWord("encoding") || startsWithWord("standalone")))
+                return false;
+        ++m_at;
+        return true;
     }
 
     void scanEndTag() {
@@ -125,15 +165,19 @@ private:
         m_depth += empty ? 0 : 1;
     }
 
-    bool scanProperty() {
+    // A name and "=", up to the quotation mark of the value.
+    bool scanEquals() {
         if (!skipName()) return false;
         skipBlanks();
         if (peek() != '=') return false;
         ++m_at;
         skipBlanks();
-        const char quote = peek();
-        if (quote != '"' && quote != '\'') return false;
-        const size_t end = m_text.find(quote, m_at + 1);
+        return peek() == '"' || peek() == '\'';
+    }
+
+    bool scanProperty() {
+        if (!scanEquals()) return false;
+        const size_t end = m_text.find(peek(), m_at + 1);
         if (end == std::string_view::npos) return false;
         if (std::memchr(m_text.data() + m_at, '<', end - m_at)) return false;
         checkReferences(m_at + 1, end);

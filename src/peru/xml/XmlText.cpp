@@ -2,6 +2,7 @@
 
 #include "peru/Errors.h"
 #include "peru/strings/CharEncodingRules.h"
+#include "peru/strings/UTF8.h"
 
 #include <algorithm>
 
@@ -9,26 +10,8 @@ namespace peru {
 
 namespace {
 
-// The code point of a well-formed sequence of `size` bytes.
-char32_t decode(const char* text, size_t size) {
-    const auto byte = [&](size_t index) { return static_cast<uint8_t>(text[index]); };
-    if (size == 1) return byte(0);
-    char32_t ch = byte(0) & (0xFF >> (size + 1));
-    for (size_t i = 1; i < size; ++i) ch = ch << 6 | (byte(i) & 0x3F);
-    return ch;
-}
-
-std::u16string toUTF16(std::string_view utf8) {
-    std::u16string units;
-    units.reserve(utf8.size());
-    for (size_t at = 0; at < utf8.size();) {
-        const size_t size = std::max<size_t>(measureXmlCharacter(utf8.substr(at, 4)), 1);
-        uint8_t bytes[4];
-        const int32_t written = SUTF16Rules::write(decode(utf8.data() + at, size), bytes);
-        for (int32_t i = 0; i < written; i += 2) units.push_back(SUTF16Rules::load(bytes + i));
-        at += size;
-    }
-    return units;
+bool isSpace(char byte) {
+    return byte == '\n' || byte == '\r' || byte == '\t';
 }
 
 void appendUTF8(std::string& out, char32_t ch) {
@@ -39,18 +22,9 @@ void appendUTF8(std::string& out, char32_t ch) {
 } // namespace
 
 size_t measureXmlCharacter(std::string_view text) {
-    if (text.empty()) return 0;
-    const auto byte = [&](size_t index) { return static_cast<uint8_t>(text[index]); };
-    const uint8_t lead = byte(0);
-    if (lead < 0x80) return lead >= 0x20 || lead == '\t' || lead == '\n' || lead == '\r' ? 1 : 0;
-    const size_t size = lead >= 0xF0 ? 4 : lead >= 0xE0 ? 3 : 2;
-    if (lead < 0xC2 || lead > 0xF4 || text.size() < size) return 0;
-    for (size_t i = 1; i < size; ++i)
-        if ((byte(i) & 0xC0) != 0x80) return 0;
-    const char32_t ch = decode(text.data(), size);
-    const char32_t smallest = size == 2 ? 0x80 : size == 3 ? 0x800 : 0x10000;
-    const bool surrogate = ch >= 0xD800 && ch <= 0xDFFF;
-    return ch < smallest || ch > kMaxCodePoint || surrogate || ch == 0xFFFE || ch == 0xFFFF ? 0 : size;
+    const size_t size = measureUTF8Character(text);
+    if (size == 1) return text[0] >= 0x20 || isSpace(text[0]) ? 1 : 0;
+    return text.starts_with("\xEF\xBF\xBE") || text.starts_with("\xEF\xBF\xBF") ? 0 : size;
 }
 
 namespace xml {
@@ -64,17 +38,12 @@ bool isNamePart(char byte) {
     return isNameStart(byte) || (byte >= '0' && byte <= '9') || byte == '-' || byte == '.' || byte == ':';
 }
 
-bool isBlank(char byte) {
-    return byte == ' ' || byte == '\n' || byte == '\r' || byte == '\t';
+bool startsName(std::string_view text) {
+    return !text.empty() && isNameStart(text[0]) && !text.starts_with(kMark);
 }
 
-P<IString> toString(std::string_view utf8) {
-    const bool refused = std::any_of(utf8.begin(), utf8.end(), [](char byte) {
-        return static_cast<uint8_t>(byte) == 0xE0 || static_cast<uint8_t>(byte) == 0xF0;
-    });
-    if (!refused) return CString::fromUTF8(utf8);
-    const std::u16string units = toUTF16(utf8);
-    return CString::fromUTF16(units.data(), static_cast<int32_t>(units.size()));
+bool isBlank(char byte) {
+    return byte == ' ' || isSpace(byte);
 }
 
 std::string fromText(const CStringArg& text, const char* method) {
@@ -90,8 +59,8 @@ std::string fromText(const CStringArg& text, const char* method) {
 
 std::string fromName(const CStringArg& name, const char* method) {
     std::string bytes = fromText(name, method);
-    if (bytes.empty() || !isNameStart(bytes[0]) || !std::all_of(bytes.begin(), bytes.end(), isNamePart))
-        throw CInvalidArgError(newString("'") + toString(bytes) + "' is no name of XML", method);
+    if (!startsName(bytes) || !std::all_of(bytes.begin(), bytes.end(), isNamePart))
+        throw CInvalidArgError(newString("'") + CString::fromUTF8(bytes) + "' is no name of XML", method);
     return bytes;
 }
 
@@ -126,7 +95,7 @@ std::string decodeLatin1(std::string_view bytes) {
 }
 
 std::string encodeUTF16(std::string_view utf8) {
-    const std::u16string units = toUTF16(utf8);
+    const std::u16string units = CString::toStdU16String(CString::fromUTF8(utf8));
     std::string out;
     out.reserve(units.size() * 2);
     for (char16_t unit : units) {

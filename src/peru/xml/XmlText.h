@@ -5,19 +5,21 @@
 
 namespace peru {
 
-// Size in bytes of the UTF-8 character at the start of the text; 0 if it is malformed or not allowed in XML.
-// Unlike the decoder of UTF-8 strings this follows the standard: it rejects all over-long forms and accepts
-// every code point of XML.
+// Size in bytes of the UTF-8 character at the start of the text; 0 if it is malformed (see UTF8.h) or not
+// allowed in XML.
 PERU_API size_t measureXmlCharacter(std::string_view text);
 
 namespace xml {
 
+inline constexpr std::string_view kMark = "\xEF\xBB\xBF"; // the byte order mark, U+FEFF
+
+// The first byte of a name, and the bytes after it.
 bool isNameStart(char byte);
 bool isNamePart(char byte);
+// Whether a name can start here. It cannot start with U+FEFF, which the parser skips as white space.
+bool startsName(std::string_view text);
 bool isBlank(char byte); // XML white space
 
-// Creates a string from well-formed UTF-8; in UTF-16 if it has characters that UTF-8 strings reject.
-P<IString> toString(std::string_view utf8);
 // Both return UTF-8 and throw CInvalidArgError for text that XML cannot hold, fromName also for an invalid
 // name. `method` appears in the message.
 std::string fromText(const CStringArg& text, const char* method);

@@ -29,6 +29,16 @@ P<IValueStore> openRegistry(const char* key, EStoreAccess access = EStoreAccess:
     return getValueStoreManager()->openStore(make<CURI>(key), access);
 }
 
+// Answers for every URI with one store.
+class CMemoryFactory : public CObject, public IValueStoreFactory {
+public:
+    P<IValueStore> openStore(const P<IURI>& uri, EStoreAccess) override {
+        return m_store = make<CXmlValueStore>(make<CXmlDocument>(), uri, EStoreAccess::read, EMode::elements,
+                                              false);
+    }
+    P<IValueStore> m_store;
+};
+
 } // namespace
 
 TEST(ValueStore, values_ComeBackFromTheFileInBothModes) {
@@ -64,7 +74,9 @@ TEST(ValueStore, values_ComeBackFromTheFileInBothModes) {
         EXPECT_TRUE(store->hasSection("Tone/-4 dB"));
         EXPECT_FALSE(store->hasSection("Tone/gain"));
         EXPECT_EQ(join(store->getValueNames("Tone")), "big;on;gain;empty;word;");
+        EXPECT_EQ(join(store->getValueNames("")), "1st Try;");
         EXPECT_EQ(join(store->getSectionNames("")), "Tone;");
+        EXPECT_EQ(join(store->getSectionNames("Tone")), "-4 dB;");
         EXPECT_EQ(join(store->getValueNames("none")), "");
         EXPECT_THROW(store->setInt("", "a", 1), CReadOnlyError);
         EXPECT_THROW(store->removeSection("Tone"), CReadOnlyError);
@@ -125,8 +137,9 @@ TEST(ValueStore, files_AreReplacedAndNeverSpoiled) {
     EXPECT_EQ(CXmlValueStore::open(uri, EStoreAccess::read)->getInt("", "a", 0), 3);
 
     // Names and texts that the file could not hold.
-    for (const char* name : {"", "a<b", "a/b", "&"})
-        EXPECT_THROW(store->setInt("new", name, 1), CInvalidArgError) << name;
+    for (const char16_t* name : {u"", u"a<b", u"a/b", u"&", u"\uFEFFa"})
+        EXPECT_THROW(store->setInt("new", name, 1), CInvalidArgError) << text(newString(name));
+    EXPECT_THROW(store->setInt(u"\uFEFFnew", "b", 1), CInvalidArgError);
     EXPECT_THROW(store->setInt("new/a>", "b", 1), CInvalidArgError);
     EXPECT_THROW(store->setString("new", "b", "\x01"), CInvalidArgError);
     EXPECT_FALSE(store->hasSection("new"));
@@ -138,8 +151,17 @@ TEST(ValueStore, manager_OpensWhatItKnows) {
     EXPECT_FALSE(manager->openStore(tests::toURI(folder / "a.txt"), EStoreAccess::readWrite));
     EXPECT_FALSE(manager->openStore(make<CURI>("http://a/b.xml"), EStoreAccess::readWrite));
     EXPECT_TRUE(manager->openStore(tests::toURI(folder / "a.XML"), EStoreAccess::readWrite));
-    const auto factory = make<CXmlValueStoreFactory>(EMode::attributes, true);
-    EXPECT_FALSE(factory->openStore(make<CURI>("registry:HKEY_USERS/a.xml"), EStoreAccess::read));
+    // The factory that was added first answers, until it is removed.
+    const P<IURI> uri = make<CURI>("memory:a");
+    std::vector<P<CMemoryFactory>> factories = {make<CMemoryFactory>(), make<CMemoryFactory>()};
+    for (const auto& factory : factories) manager->addFactory(factory);
+    for (const auto& factory : factories) {
+        const P<IValueStore> store = manager->openStore(uri, EStoreAccess::read);
+        manager->removeFactory(factory);
+        ASSERT_TRUE(store);
+        EXPECT_EQ(store, factory->m_store);
+    }
+    EXPECT_FALSE(manager->openStore(uri, EStoreAccess::read));
 }
 
 TEST(ValueStore, registry_KeysShareOneFile) {

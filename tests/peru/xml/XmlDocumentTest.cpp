@@ -59,6 +59,7 @@ TEST(XmlDocument, parse_ReadsWhatOtherProgramsWrite) {
         {"<a>&#x20;&lt;b&gt; &amp;amp; &#65;&#x1F600;</a>", " <b> &amp; A\xF0\x9F\x98\x80"},
         {"<a>x<![CDATA[ <b> ]]>y<!-- c --><b>z</b></a>", "x <b> y"},
         {"<?go on?><a b='>' c='/>'/>", ""},
+        {"<?xml version = \"1.0\"\nstandalone='yes' ?><?xml-stylesheet href='b c.xsl?d=e'?><a>x</a>", "x"},
         {"<?xml version='1.0' encoding='ISO-8859-1'?><a>gr\xFC\xDF</a>", "gr\xC3\xBC\xC3\x9F"},
         {"\xEF\xBB\xBF<?xml version='1.0' encoding='ISO-8859-1'?><a>\xC3\x9F</a>", "\xC3\x9F"},
         {asUTF16(u"<?xml version='1.0' encoding='UTF-16'?><a>\u00DF\U0001F600</a>", false),
@@ -67,6 +68,9 @@ TEST(XmlDocument, parse_ReadsWhatOtherProgramsWrite) {
     };
     for (const auto& c : cases)
         EXPECT_EQ(text(parse(c.bytes)->getRootNode()->getText()), c.rootText) << c.bytes;
+    const auto marked = make<CXmlDocument>();
+    marked->parseString(newString(u"\uFEFF<a>\u0915</a>"));
+    EXPECT_EQ(text(marked->getRootNode()->getText()), "\xE0\xA4\x95");
     EXPECT_FALSE(parse("<?xml version=\"1.0\" encoding=\"utf-8\"?>")->getRootNode());
 }
 
@@ -91,6 +95,14 @@ TEST(XmlDocument, parse_NamesLineAndFaultOfBadDocuments) {
         {"<a b='&#x110000;'/>", syntax(1)},
         {"<a>&#" + repeat("1", 100) + ";</a>", syntax(1)},
         {"<a>\nrock & roll</a>", syntax(2)},
+        {"\n<\xEF\xBB\xBF"
+         "a/>",
+         syntax(2)},
+        // The parser would read on into the document, or drop the rest of it.
+        {"<?xmlencoding=\"?><a b=\"\"/>", syntax(1)},
+        {"<?xml version='1.0?><a b=''/>", syntax(1)},
+        {"<?XML version='1.0' encoding?><a/>", syntax(1)},
+        {"<?xml-a title='an encoding'?><a/>", syntax(1)},
         {"<a b='\n&nbsp;'/>", syntax(2)},
         {std::string("<a>\n\0</a>", 9), syntax(2)},
         {"<a>\n\xFF</a>", "is not in a known encoding, such as valid UTF-8, line 2."},
@@ -199,9 +211,9 @@ TEST(XmlDocument, changes_ThatCouldNotBeReadAgainAreRefused) {
     auto document = make<CXmlDocument>();
     P<IXmlNode> node = document->addChildNode("a");
     EXPECT_THROW(document->addChildNode("b"), CInvalidArgError);
-    for (const char* name : {"", "1", "-a", "a b", "a<", "a=", ":a"}) {
-        EXPECT_THROW(node->addChildNode(name), CInvalidArgError) << name;
-        EXPECT_THROW(node->setProperty(name, ""), CInvalidArgError) << name;
+    for (const char16_t* name : {u"", u"1", u"-a", u"a b", u"a<", u"a=", u":a", u"\uFEFFa"}) {
+        EXPECT_THROW(node->addChildNode(name), CInvalidArgError) << text(newString(name));
+        EXPECT_THROW(node->setProperty(name, ""), CInvalidArgError) << text(newString(name));
     }
     for (const char* bad : {"\x01", "\xED\xA0\x80", "\xFF", "\xEF\xBF\xBF"})
         EXPECT_THROW(node->setText(CString::fromUTF8(bad)), CInvalidArgError);
