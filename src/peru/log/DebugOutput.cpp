@@ -1,4 +1,5 @@
 #include "peru/log/ILog.h"
+#include "peru/log/PrintableText.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -20,6 +21,16 @@ size_t cut(const char* utf8, size_t size, size_t characters) {
     for (size_t i = 0; i < size; ++i)
         if ((utf8[i] & 0xc0) != 0x80 && count++ == characters) return i;
     return size;
+}
+
+// Like makePrintable, but in place.
+void hideControls(char* utf8, size_t size) {
+    for (size_t i = 0; i < size; ++i) {
+        const auto byte = static_cast<unsigned char>(utf8[i]);
+        const bool high = byte >= 0x80 && byte < 0xA0 && i > 0 && utf8[i - 1] == '\xC2';
+        if ((byte < 0x20 && byte != '\t' && byte != '\n') || byte == 0x7F || high) utf8[i] = '?';
+        if (high) utf8[i - 1] = '?';
+    }
 }
 
 // Unlike a debugger's window, standard error is visible to users, so a program with its own output may switch
@@ -48,11 +59,12 @@ void zvrTrace(const char* file, int line, const char* comment) {
                      : std::snprintf(text, sizeof text, "zvr_trace: %s (%d)\n", name, line);
     if (length < 0) return;
     size_t size = std::min(static_cast<size_t>(length), sizeof text - 1);
+    hideControls(text, size);
     writeDebugOutput(text, cut(text, size, kTraceSize - 1));
 }
 
 void outputDebugString(const CStringArg& text) {
-    std::string utf8 = CString::toStdString(text);
+    std::string utf8 = makePrintable(CString::toStdString(text));
     if (!utf8.ends_with('\n')) utf8 += '\n';
     writeDebugOutput(utf8.data(), utf8.size());
 }

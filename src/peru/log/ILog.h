@@ -29,13 +29,17 @@ struct SLogMessage {
     P<CException> exception = nullptr; // a copy of the exception that the text describes; usually empty
 };
 
-// A sink, or the manager that fans out to sinks. Any thread may log.
+// A sink, or the manager that distributes to sinks. Any thread may log, so a sink may be called on any
+// thread, but the manager makes one call at a time. It holds its re-entrant mutex during the call. A sink may
+// therefore log through the manager and add or remove sinks, itself included, but it must not wait for
+// another thread that does any of this: that is a deadlock.
 class PERU_API ILog : public virtual IBase {
 public:
     using Lines = std::vector<P<IString>>;
 
     virtual void setMinimumLevel(int32_t level) = 0;
     virtual int32_t getMinimumLevel() const = 0;
+    // A sink whose enterArea throws has not entered the area and gets no leaveArea for it.
     virtual void enterArea(const P<IString>& name) = 0;
     virtual void leaveArea(const P<IString>& name) = 0;
     virtual void setEnabled(bool enabled) = 0;
@@ -54,8 +58,10 @@ public:
 
 class PERU_API ILogManager : public virtual ILog {
 public:
-    // With an empty source the log receives every message.
+    // With an empty source the log receives every message. A log that is added during a call does not take
+    // part in that call; one that is removed receives nothing after removeLog has returned, on any thread.
     virtual void addLog(const P<ILog>& log, const P<IString>& source) = 0;
+    // Returns whether the log was registered for that source.
     virtual bool removeLog(const P<ILog>& log, const P<IString>& source) = 0;
 };
 

@@ -4,30 +4,52 @@
 #include "peru/GlobalObjFactory.h"
 
 #include <algorithm>
+#include <exception>
 
 namespace peru {
 
-// Reference-counted, so that a sink may change the lists while it is called.
+// Reference-counted, so that a sink may remove the list of its source while it is called. A sink that leaves
+// during a walk leaves an empty handle in its place, so that no other one moves and is skipped.
 class CLogManager::CLogList : public CObject {
 public:
     void add(const P<ILog>& log) { m_logs.push_back(log); }
     bool remove(const P<ILog>& log) {
         auto found = std::find(m_logs.begin(), m_logs.end(), log);
         if (found == m_logs.end()) return false;
-        m_logs.erase(found);
+        found->reset();
+        if (m_walks == 0) compact();
         return true;
     }
-    bool isEmpty() const { return m_logs.empty(); }
+    bool isEmpty() const {
+        return std::all_of(m_logs.begin(), m_logs.end(), [](const P<ILog>& log) { return !log; });
+    }
 
-    template <class F> void forEach(F function) const {
-        for (size_t i = 0; i < m_logs.size(); ++i) {
-            P<ILog> log = m_logs[i];
-            function(*log);
-        }
+    // Calls the sinks that are registered now, until one throws.
+    template <class F> void forEach(F function) {
+        const CWalk walk(*this);
+        const size_t count = m_logs.size();
+        for (size_t i = 0; i < count; ++i)
+            if (const P<ILog> log = m_logs[i]) function(*log);
     }
 
 private:
+    class CWalk {
+    public:
+        explicit CWalk(CLogList& list) : m_list(list) { ++m_list.m_walks; }
+        ~CWalk() {
+            if (--m_list.m_walks == 0) m_list.compact();
+        }
+        CWalk(const CWalk&) = delete;
+        CWalk& operator=(const CWalk&) = delete;
+
+    private:
+        CLogList& m_list;
+    };
+
+    void compact() { std::erase(m_logs, nullptr); }
+
     std::vector<P<ILog>> m_logs;
+    int32_t m_walks = 0; // nested when a sink logs
 };
 
 CLogManager::CLogManager() : m_mutex(getMutexFactory()->createMutex()), m_logs(make<CLogList>()) {}
@@ -38,16 +60,47 @@ void CLogManager::enterArea(const P<IString>& name) {
     if (!isWanted(kLogTrace)) return;
     CMutexLock lock(m_mutex);
     m_areas.push_back(name ? name : CString::empty());
-    m_logs->forEach([&](ILog& log) { log.enterArea(name); });
+    std::vector<P<ILog>> entered;
+    try {
+        m_logs->forEach([&](ILog& log) {
+            log.enterArea(name);
+            entered.push_back(P<ILog>::share(&log));
+        });
+    } catch (...) {
+        // The caller does not leave an area whose entry threw, so the sinks that have entered it leave now.
+        takeArea(name);
+        for (const P<ILog>& log : entered) {
+            try {
+                log->leaveArea(name);
+            } catch (...) {
+                zvrTrace(__FILE__, __LINE__, "a log failed to leave an area");
+            }
+        }
+        throw;
+    }
 }
 
 void CLogManager::leaveArea(const P<IString>& name) {
     CMutexLock lock(m_mutex);
+    if (!takeArea(name)) return;
+    // All sinks have entered, so all of them leave before an error ends the call.
+    std::exception_ptr failure;
+    m_logs->forEach([&](ILog& log) {
+        try {
+            log.leaveArea(name);
+        } catch (...) {
+            if (!failure) failure = std::current_exception();
+        }
+    });
+    if (failure) std::rethrow_exception(failure);
+}
+
+bool CLogManager::takeArea(const P<IString>& name) {
     auto found = std::find_if(m_areas.rbegin(), m_areas.rend(),
                               [&](const P<IString>& area) { return area->equals(name); });
-    if (found == m_areas.rend()) return;
+    if (found == m_areas.rend()) return false;
     m_areas.erase(std::next(found).base());
-    m_logs->forEach([&](ILog& log) { log.leaveArea(name); });
+    return true;
 }
 
 void CLogManager::write(const SLogMessage& message) {

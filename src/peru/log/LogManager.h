@@ -9,8 +9,9 @@
 
 namespace peru {
 
-// Holds its mutex while it calls a sink: the lock order is manager, then sink. An exception from a sink ends
-// the call. A sink may itself be a manager; sinks are compared by identity.
+// Holds its mutex while it calls a sink (see ILog): the lock order is manager, then sink. An exception from a
+// sink ends the call, but areas stay balanced: if entering one fails, the sinks that have entered it leave it
+// again, and leaving one reaches every sink. A sink may itself be a manager; sinks are compared by identity.
 class PERU_API CLogManager : public CLogBase, public ILogManager {
 public:
     CLogManager();
@@ -31,6 +32,9 @@ public:
 
 private:
     class CLogList;
+
+    // Removes the innermost area of that name; returns whether there was one.
+    bool takeArea(const P<IString>& name);
 
     P<IMutex> m_mutex; // guards all below
     P<CLogList> m_logs;

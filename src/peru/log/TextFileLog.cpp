@@ -1,5 +1,6 @@
 #include "peru/log/TextFileLog.h"
 
+#include "peru/log/PrintableText.h"
 #include "peru/streams/IStreamManager.h"
 #include "peru/system/ITimeManager.h"
 
@@ -29,11 +30,18 @@ std::string getTimeText(int64_t milliseconds) {
     return text;
 }
 
+std::string getText(const P<IString>& text) {
+    return text ? makePrintable(CString::toStdString(text)) : std::string();
+}
+
 std::string getPrefix(const SLogMessage& message, int32_t depth) {
     std::string prefix = getTimeText(message.time);
-    std::string source = message.source ? CString::toStdString(message.source) : "";
+    std::string source = getText(message.source);
     if (!source.empty()) {
-        std::replace(source.begin(), source.end(), ']', '_');
+        for (char& ch : source) {
+            if (ch == ']') ch = '_';
+            if (ch == '\n' || ch == '\r') ch = ' ';
+        }
         prefix += " [" + source + "]";
     }
     prefix += getLevelWord(message.level);
@@ -85,9 +93,8 @@ void CTextFileLog::write(const SLogMessage& message) {
     CMutexLock lock(m_mutex);
     std::string lines = getPrefix(message, m_depth);
     const std::string indentation(countCharacters(lines), ' ');
-    appendLines(lines, message.text ? CString::toStdString(message.text) : "", indentation);
-    for (const P<IString>& line : message.extraLines)
-        appendLines(lines, CString::toStdString(line), indentation);
+    appendLines(lines, getText(message.text), indentation);
+    for (const P<IString>& line : message.extraLines) appendLines(lines, getText(line), indentation);
     m_stream->write(lines.data(), static_cast<int64_t>(lines.size()));
     if (m_flush) m_stream->flush();
 }

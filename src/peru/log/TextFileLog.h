@@ -10,7 +10,8 @@ namespace peru {
 // Appends lines such as
 //   14:03:59 [source] info - text
 // in UTF-8. Further lines of a message are aligned with its text. The depth of areas is per log, not per
-// thread, so the indentation of several threads interleaves. Stream errors propagate to the caller.
+// thread, so the indentation of several threads interleaves. Control characters and invalid bytes are written
+// as "\xNN". Stream errors propagate to the caller.
 class PERU_API CTextFileLog : public CLogBase {
 public:
     // Opens the file for appending and creates it if necessary. Throws CFileError.

@@ -1,20 +1,18 @@
 #include "peru/Errors.h"
+#include "peru/Rival.h"
 #include "peru/log/LogArea.h"
 #include "peru/log/LogManager.h"
 #include "peru/log/TextFileLog.h"
-#include "peru/uri/URI.h"
+#include "support/Environment.h"
+#include "support/Files.h"
 #include "support/TempFolder.h"
 
-#include <gtest/gtest.h>
-
-#include <atomic>
-#include <cstdlib>
 #include <ctime>
-#include <functional>
-#include <thread>
+#include <list>
 
 using namespace peru;
 using namespace peru::literals;
+using tests::text;
 
 namespace {
 
@@ -40,32 +38,35 @@ class CMemoryLog : public CLogBase {
 public:
     explicit CMemoryLog(std::vector<std::string>& journal, std::string name = "")
         : m_journal(journal), m_name(std::move(name)) {}
-    void enterArea(const P<IString>& name) override { m_journal.push_back(m_name + "enter " + text(name)); }
-    void leaveArea(const P<IString>& name) override { m_journal.push_back(m_name + "leave " + text(name)); }
+    void enterArea(const P<IString>& name) override { record("enter " + text(name)); }
+    void leaveArea(const P<IString>& name) override { record("leave " + text(name)); }
     void write(const SLogMessage& message) override {
         if (!isWanted(message.level)) return;
-        if (onWrite) onWrite();
         std::string line =
-            m_name + std::to_string(message.level) + " " + text(message.source) + " " + text(message.text);
+            std::to_string(message.level) + " " + text(message.source) + " " + text(message.text);
         for (const P<IString>& extra : message.extraLines) line += "|" + text(extra);
-        m_journal.push_back(line + "@" + std::to_string(message.time));
+        record(line + "@" + std::to_string(message.time));
     }
-    std::function<void()> onWrite;
+    std::function<void()> onCall;
 
 private:
-    static std::string text(const P<IString>& string) { return CString::toStdString(string); }
+    void record(const std::string& line) {
+        if (onCall) onCall();
+        m_journal.push_back(m_name + line);
+    }
     std::vector<std::string>& m_journal;
     std::string m_name;
 };
 
 using Journal = std::vector<std::string>;
 
-constexpr int64_t kTime = 1000000000000; // 01:46:40 UTC
+constexpr int64_t kTime = 1000000000000; // 01:46:40 UTC, 07:16:40 here
 
 class TextFileLog : public testing::Test {
 protected:
-    void SetUp() override {
-        setenv("TZ", "UTC", 1);
+    void SetUp() override { tzset(); }
+    void TearDown() override {
+        zone.reset();
         tzset();
     }
     std::string written(const SLogMessage& message) {
@@ -79,6 +80,7 @@ protected:
             text.replace(start, 8, "T");
         return text;
     }
+    std::optional<tests::CEnvironment> zone{std::in_place, "TZ", "TST-5:30"};
     P<CTextStream> stream = make<CTextStream>();
     P<CTextFileLog> log = make<CTextFileLog>(P<IOutStream>(stream), false);
 };
@@ -88,24 +90,29 @@ TEST_F(TextFileLog, Line_HasItsExactForm) {
         SLogMessage message;
         const char* expected;
     } cases[] = {
-        {{kLogTrace, nullptr, "a"_s, {}, kTime}, "01:46:40 trace - a\n"},
-        {{kLogInfo, "x"_s, "a"_s, {}, kTime}, "01:46:40 [x] info - a\n"},
-        {{kLogWarning, "[x]y]"_s, "a"_s, {}, kTime}, "01:46:40 [[x_y_] Warning - a\n"},
-        {{kLogException, nullptr, "a"_s, {}, kTime}, "01:46:40 EXCEPTION - a\n"},
-        {{kLogError, nullptr, nullptr, {}, kTime}, "01:46:40 ERROR - \n"},
-        {{6, nullptr, "a"_s, {}, kTime}, "01:46:40 UnknownLogLevel - a\n"},
+        {{kLogTrace, nullptr, "a"_s, {}, kTime}, "07:16:40 trace - a\n"},
+        {{kLogInfo, "x"_s, "a"_s, {}, kTime}, "07:16:40 [x] info - a\n"},
+        {{kLogWarning, "[x]y]"_s, "a"_s, {}, kTime}, "07:16:40 [[x_y_] Warning - a\n"},
+        {{kLogException, nullptr, "a"_s, {}, kTime}, "07:16:40 EXCEPTION - a\n"},
+        {{kLogError, nullptr, nullptr, {}, kTime}, "07:16:40 ERROR - \n"},
+        {{6, nullptr, "a"_s, {}, kTime}, "07:16:40 UnknownLogLevel - a\n"},
         {{kLogInfo, nullptr, "a\nb\r\nc\rd"_s, {}, kTime},
-         "01:46:40 info - a\n                b\n                c\n                d\n"},
+         "07:16:40 info - a\n                b\n                c\n                d\n"},
         {{kLogInfo, nullptr, "a\n\nb"_s, {}, kTime},
-         "01:46:40 info - a\n                \n                b\n"},
+         "07:16:40 info - a\n                \n                b\n"},
         {{kLogInfo, nullptr, "a"_s, {"b"_s, "c\nd"_s}, kTime},
-         "01:46:40 info - a\n                b\n                c\n                d\n"},
-        {{kLogInfo, nullptr, "a"_s, {}, -1001}, "23:59:58 info - a\n"},
+         "07:16:40 info - a\n                b\n                c\n                d\n"},
+        {{kLogInfo, nullptr, "a"_s, {}, -1001}, "05:29:58 info - a\n"},
         {{kLogInfo, nullptr, P<IString>(make<CUTF16String>(u"\u00e4\u20ac")), {}, kTime},
-         "01:46:40 info - \xc3\xa4\xe2\x82\xac\n"},
+         "07:16:40 info - \xc3\xa4\xe2\x82\xac\n"},
+        // Names must not control a terminal; what strings cannot decode is still text.
+        {{kLogInfo, "a\nb\x1B"_s, "\x1B[2J\ta\x7F\x9B\0"_s, {}, kTime},
+         "07:16:40 [a b\\x1B] info - \\x1B[2J\ta\\x7F\\x9B\\x00\n"},
+        {{kLogInfo, nullptr, P<IString>(make<CUTF8String>("\xF0\x9F\x98\x80\xFF")), {}, kTime},
+         "07:16:40 info - \xF0\x9F\x98\x80\\xFF\n"},
         // Indented by characters, not bytes.
         {{kLogInfo, CString::fromUTF8("\xc3\xa4"), "a\nb"_s, {}, kTime},
-         "01:46:40 [\xc3\xa4] info - a\n                    b\n"},
+         "07:16:40 [\xc3\xa4] info - a\n                    b\n"},
     };
     for (const SCase& one : cases) EXPECT_EQ(written(one.message), one.expected);
 }
@@ -146,23 +153,14 @@ TEST_F(TextFileLog, HiddenAreas_StillCountTheDepth) {
     log->setMinimumLevel(kLogInfo);
     log->enterArea("a"_s);
     EXPECT_EQ(stream->bytes, "");
-    EXPECT_EQ(written({kLogInfo, nullptr, "x"_s, {}, kTime}), "01:46:40 info   - x\n");
+    EXPECT_EQ(written({kLogInfo, nullptr, "x"_s, {}, kTime}), "07:16:40 info   - x\n");
     log->setEnabled(false);
     log->leaveArea("a"_s);
     EXPECT_EQ(written({kLogError, nullptr, "x"_s, {}, kTime}), "");
     log->setMinimumLevel(kLogTrace);
     EXPECT_EQ(written({kLogError, nullptr, "x"_s, {}, kTime}), "") << "a level does not enable it";
     log->setEnabled(true);
-    EXPECT_EQ(written({kLogInfo, nullptr, "x"_s, {}, kTime}), "01:46:40 info - x\n");
-}
-
-TEST_F(TextFileLog, FlushFlag_FlushesEachLine) {
-    log->info(nullptr, "x");
-    EXPECT_EQ(stream->flushes, 0);
-    auto careful = make<CTextFileLog>(P<IOutStream>(stream), true);
-    careful->info(nullptr, "x\ny");
-    careful->info(nullptr, "z");
-    EXPECT_EQ(stream->flushes, 2);
+    EXPECT_EQ(written({kLogInfo, nullptr, "x"_s, {}, kTime}), "07:16:40 info - x\n");
 }
 
 TEST_F(TextFileLog, FailingStream_EndsTheCallAndLeavesTheLogUsable) {
@@ -178,13 +176,16 @@ TEST_F(TextFileLog, FailingStream_EndsTheCallAndLeavesTheLogUsable) {
     } // must not throw
 }
 
-TEST_F(TextFileLog, File_IsAppendedToAndItsErrorsAreFileErrors) {
+TEST_F(TextFileLog, File_IsAppendedToAndFlushed) {
     tests::CTempFolder folder;
-    auto file = P<IURI>(make<CURI>(CURI::getFileURI(CString::fromUTF8((folder / "a.log").string()))));
-    for (const char* text : {"first", "second"}) make<CTextFileLog>(file, true)->info(nullptr, text);
+    const P<IURI> file = tests::toURI(folder / "a.log");
+    for (const char* line : {"first", "second"}) make<CTextFileLog>(file, true)->info(nullptr, line);
     EXPECT_EQ(withoutTimes(tests::readFile(folder / "a.log")), "T info - first\nT info - second\n");
-    auto nowhere = P<IURI>(make<CURI>(CURI::getFileURI(CString::fromUTF8((folder / "no/a.log").string()))));
-    EXPECT_THROW(make<CTextFileLog>(nowhere, true), CFileError);
+    EXPECT_THROW(make<CTextFileLog>(tests::toURI(folder / "no/a.log"), true), CFileError);
+    auto careful = make<CTextFileLog>(P<IOutStream>(stream), true);
+    careful->info(nullptr, "x\ny");
+    log->info(nullptr, "z");
+    EXPECT_EQ(stream->flushes, 1);
 }
 
 TEST_F(TextFileLog, ManyThreads_WriteWholeLines) {
@@ -276,41 +277,59 @@ TEST_F(LogManager, AnotherManager_ServesAsSinkAndLeavesByIdentity) {
     EXPECT_THROW(manager->addLog(nullptr, nullptr), CInvalidArgError);
 }
 
-TEST_F(LogManager, ThrowingSink_EndsTheCallAndReleasesTheMutex) {
+TEST_F(LogManager, ThrowingSink_EndsTheCallAndKeepsAreasBalanced) {
+    addLog("1", nullptr);
     auto bad = addLog("bad", nullptr);
-    addLog("good", nullptr);
-    bad->onWrite = [] { throw CError("full"); };
+    addLog("3", nullptr);
+    bad->onCall = [] { throw CError("full"); };
     EXPECT_THROW(manager->info(nullptr, "x"), CError);
-    EXPECT_EQ(journal, Journal{});
-    bad->onWrite = nullptr;
-    std::thread([&] { manager->info(nullptr, "y"); }).join();
-    EXPECT_EQ(journal.size(), 2u);
+    EXPECT_THROW(CLogArea(manager, "a"_s), CError);
+    EXPECT_EQ(journal, (Journal{"1:2  x@-1", "1:enter a", "1:leave a"}));
+    journal.clear();
+    bad->onCall = nullptr;
+    std::thread([&] { manager->enterArea("b"_s); }).join(); // hangs if the mutex is still held
+    manager->leaveArea("a"_s);
+    bad->onCall = [] { throw CError("full"); };
+    EXPECT_THROW(manager->leaveArea("b"_s), CError);
+    EXPECT_EQ(journal, (Journal{"1:enter b", "bad:enter b", "3:enter b", "1:leave b", "3:leave b"}));
 }
 
-TEST_F(LogManager, SinkThatLeavesDuringItsCall_DoesNoHarm) {
-    P<CMemoryLog> one = addLog("1", "s"_s);
-    one->onWrite = [&] { manager->removeLog(one, "s"_s); };
-    addLog("all", nullptr);
-    manager->info("s"_s, "x");
-    manager->info("s"_s, "y");
-    EXPECT_EQ(journal, (Journal{"1:2 s x@-1", "all:2 s x@-1", "all:2 s y@-1"}));
-    one->onWrite = nullptr;
-}
-
-TEST_F(LogManager, SinksThatComeAndGo_WhileOthersLog) {
-    std::atomic<bool> stop{false};
-    Journal ignored; // written under the manager's mutex only
-    std::thread writer([&] {
-        while (!stop) manager->info("s"_s, "x");
-    });
-    for (int i = 0; i < 300; ++i) {
-        auto log = make<CMemoryLog>(ignored);
-        P<IString> source = i % 2 ? "s"_s : nullptr;
-        manager->addLog(log, source);
-        EXPECT_TRUE(manager->removeLog(log, source));
+TEST_F(LogManager, SinksThatComeAndGoDuringACall_LeaveTheOthersAlone) {
+    for (const char* source : {"s", ""}) {
+        journal.clear();
+        P<CMemoryLog> first = addLog("1", newString(source));
+        P<CMemoryLog> second = addLog("2", newString(source));
+        addLog("3", newString(source));
+        P<CMemoryLog> late;
+        first->onCall = [&] {
+            EXPECT_TRUE(manager->removeLog(first, newString(source)));
+            EXPECT_TRUE(manager->removeLog(second, newString(source)));
+            late = addLog("late", newString(source));
+        };
+        for (const char* line : {"x", "y"}) manager->info("s"_s, line);
+        EXPECT_EQ(journal, (Journal{"1:2 s x@-1", "3:2 s x@-1", "3:2 s y@-1", "late:2 s y@-1"}));
+        first->onCall = nullptr;
+        manager = make<CLogManager>();
     }
-    stop = true;
-    writer.join();
+    P<CMemoryLog> last = addLog("last", "s"_s);
+    last->onCall = [&] { manager->removeLog(last, "s"_s); };
+    manager->info("s"_s, "x");
+    EXPECT_EQ(manager->getSourceCount(), 0u);
+    last->onCall = nullptr;
+}
+
+TEST_F(LogManager, EveryOperation_WaitsForARunningCall) {
+    P<CMemoryLog> log = addLog("", nullptr);
+    std::list<tests::CRival> rivals;
+    log->onCall = [&] {
+        log->onCall = nullptr;
+        rivals.emplace_back([&] { manager->addLog(log, "s"_s); });
+        rivals.emplace_back([&] { manager->removeLog(log, "none"_s); });
+        rivals.emplace_back([&] { manager->error(nullptr, "x"); });
+        rivals.emplace_back([&] { manager->enterArea("a"_s); });
+        for (const tests::CRival& rival : rivals) EXPECT_TRUE(rival.isBlocked());
+    };
+    manager->info(nullptr, "x");
 }
 
 std::string trace(const char* file, int line, const char* comment) {
@@ -319,7 +338,7 @@ std::string trace(const char* file, int line, const char* comment) {
     return testing::internal::GetCapturedStderr();
 }
 
-TEST(DebugTrace, IsCutToItsBuffer) {
+TEST(DebugTrace, IsCutToItsBufferAndHasNoControls) {
     std::string wide;
     for (int i = 0; i < 3000; ++i) wide += "\xe2\x82\xac";
     const std::string head = "zvr_trace: f (1) c=";
@@ -327,6 +346,7 @@ TEST(DebugTrace, IsCutToItsBuffer) {
     EXPECT_EQ(line, head + wide.substr(0, 3 * (1023 - head.size()))) << "1023 whole characters";
     EXPECT_EQ(trace("f", 1, std::string(5000, '\x80').c_str()).substr(0, head.size()), head);
     EXPECT_EQ(trace("a.cpp", 12, nullptr), "zvr_trace: a.cpp (12)\n");
+    EXPECT_EQ(trace("a.cpp", 1, "\x1B[2J \xC2\x9B \xC3\x9B"), "zvr_trace: a.cpp (1) c=?[2J ?? \xC3\x9B\n");
 }
 
 } // namespace
