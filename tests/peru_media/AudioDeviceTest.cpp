@@ -12,6 +12,7 @@
 #include <algorithm>
 #include <atomic>
 #include <chrono>
+#include <cstdlib>
 #include <filesystem>
 #include <functional>
 #include <iterator>
@@ -97,6 +98,7 @@ TEST_F(AudioDevice, IsListedAndFindsFormats) {
     EXPECT_EQ(outs.getCount(), 1);
     EXPECT_EQ(getSystem()->getInDevices().getCount(), 1);
     EXPECT_TRUE(out->getListName()->equals("ID: 0 - default (UNKNOWN) [DEFAULT]"));
+    EXPECT_TRUE(out->getHostApiDisplayName()->equals("ALSA"));
     EXPECT_TRUE(out->getId()->equals("0"));
     const struct {
         int32_t rate, bytes, channels;
@@ -114,6 +116,31 @@ TEST_F(AudioDevice, IsListedAndFindsFormats) {
             EXPECT_EQ(found->getBitsPerSample(), each.foundBits);
             EXPECT_EQ(found->getChannelCount(), each.foundChannels);
         }
+}
+
+TEST_F(AudioDevice, ComesAndGoesWithoutARestart) {
+    const std::string path = std::getenv("ALSA_CONFIG_PATH"), before = tests::readFile(path);
+    const std::string other =
+        "pcm.aaa { type pulse server \"" + std::string(std::getenv("PULSE_SERVER")) + "\" }\n";
+    const auto count = [] { return getSystem()->getOutDevices().getCount(); };
+    out->open(makeFormat());
+    std::ofstream(path) << other << before;
+    std::this_thread::sleep_for(
+        std::chrono::milliseconds(150)); // longer than an enumeration counts as current
+    EXPECT_EQ(count(), 1) << "the sound system cannot be restarted while a device is open";
+    out->close();
+    P<IAudioOutDevice> added;
+    for (WEnum<IAudioOutDevice> devices = getSystem()->getOutDevices(); devices.hasMore();)
+        if (const P<IAudioOutDevice> device = devices.getNext(); device->getName()->equals("aaa"))
+            added = device;
+    ASSERT_TRUE(added);
+    EXPECT_TRUE(getSystem()->getDefaultOutDevice()->getId()->equals("1"));
+    std::ofstream(path) << before;
+    EXPECT_TRUE(waitFor([&] { return count() == 1; }));
+    EXPECT_EQ(getMessage([&] { added->open(makeFormat()); }),
+              "The sound device 'aaa' is not available any more");
+    EXPECT_FALSE(added->isOpened());
+    EXPECT_NO_THROW(out->open(makeFormat()));
 }
 
 TEST_F(AudioDevice, RefusesWhatItsStateForbids) {

@@ -35,7 +35,9 @@ protected:
 TEST_F(NoSound, GivesEmptyAnswersAndNoNoise) {
     const std::string configurations[] = {
         folder.write("dead.conf", "pcm.default { type pulse server \"" + nobody + "\" }").string(),
-        folder.write("empty.conf", "").string(), (folder / "missing.conf").string()};
+        folder.write("empty.conf", "").string(),
+        folder.write("no-default.conf", "pcm.other { type null }").string(),
+        (folder / "missing.conf").string()};
     for (const std::string& configuration : configurations) {
         SCOPED_TRACE(configuration);
         const CEnvironment alsa("ALSA_CONFIG_PATH", configuration);

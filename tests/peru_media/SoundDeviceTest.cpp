@@ -58,7 +58,10 @@ public:
         return m_heard.size() < limit;
     }
     void onVolume(const P<CVolumeInfo>& volume) override {
-        if (volume->getLeft() > loudest) loudest = volume->getLeft();
+        if (volume->getLeft() > loudest) {
+            loudest = volume->getLeft();
+            loudestRight = volume->getRight();
+        }
     }
     std::string getHeard() const {
         std::lock_guard lock(m_mutex);
@@ -67,7 +70,7 @@ public:
 
     std::atomic<size_t> limit{SIZE_MAX};
     std::atomic<int> blocks{0};
-    std::atomic<double> loudest{0};
+    std::atomic<double> loudest{0}, loudestRight{0};
 
 private:
     mutable std::mutex m_mutex;
@@ -129,6 +132,27 @@ TEST_F(SoundDevice, RecordsEverySampleUntilItsListenerHasEnough) {
     device->close();
     EXPECT_EQ(ears->blocks, blocks);
     EXPECT_FALSE(device->isOpened());
+    device->removeListener(ears.get());
+}
+
+TEST_F(SoundDevice, RecordsEightBitsWithGainAndLevels) {
+    const CSoundServer server(EMicrophone::isolated);
+    const P<IAudioInDevice> device = getSystem()->getDefaultInDevice();
+    const P<CEars> ears = peru::make<CEars>();
+    device->addListener(ears.get());
+    device->setGain(2.0);
+    device->open(peru::make<CAudioFormat>(CSoundServer::kRate, 2, 8));
+    device->start();
+    std::string sound;
+    for (int i = 0; i < CSoundServer::kRate; ++i)
+        sound += std::string("\0\x10\0\xD0", 4); // 16 and -48 of 128
+    const auto player = server.play(sound);
+    const std::string expected{"\xA0\x20\xA0\x20\xA0\x20"}; // unsigned, twice as loud
+    EXPECT_TRUE(waitFor(
+        [&] { return ears->getHeard().find(expected) != std::string::npos && ears->loudestRight > 0; }));
+    EXPECT_NEAR(ears->loudest, 32 / 127.0, 1e-9);
+    EXPECT_NEAR(ears->loudestRight, 96 / 127.0, 1e-9);
+    device->close();
     device->removeListener(ears.get());
 }
 

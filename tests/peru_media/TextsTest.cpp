@@ -1,8 +1,11 @@
 #include "peru/media/AudioFormat.h"
 #include "peru/media/DeviceNames.h"
 #include "peru/media/Errors.h"
+#include "support/Process.h"
 
 #include <gtest/gtest.h>
+
+#include <filesystem>
 
 using namespace peru;
 using namespace peru::media;
@@ -14,11 +17,21 @@ TEST(DeviceNames, TellHostApiAndDefault) {
     } cases[] = {{2, "MMSystem"}, {1, "DirectShow"}, {13, "WASAPI"},
                  {8, "UNKNOWN"},  {0, "UNKNOWN"},    {-1, "UNKNOWN"}};
     for (const auto& each : cases) EXPECT_TRUE(getHostApiName(each.type)->equals(each.name)) << each.type;
+    EXPECT_TRUE(getHostApiDisplayName(12, "JACK Audio Connection Kit")->equals("JACK"));
+    EXPECT_TRUE(getHostApiDisplayName(2, "MME")->equals("MME"));
 
     EXPECT_TRUE(getDeviceListName(3, CString::fromUTF8("100 % K\xC3\xB6nig"), "UNKNOWN", false)
                     ->equals(CString::fromUTF8("ID: 3 - 100 % K\xC3\xB6nig (UNKNOWN)")));
     EXPECT_TRUE(
         getDeviceListName(0, "default", "WASAPI", true)->equals("ID: 0 - default (WASAPI) [DEFAULT]"));
+}
+
+// Programs without sound must not load it.
+TEST(SoundEngine, IsNotLoadedAtStartUp) {
+    const std::string program = std::filesystem::read_symlink("/proc/self/exe");
+    const std::string libraries = tests::run({program}, {}, {{"LD_TRACE_LOADED_OBJECTS", "1"}}).out;
+    EXPECT_NE(libraries.find("libperu_media"), std::string::npos) << libraries;
+    EXPECT_EQ(libraries.find("libportaudio"), std::string::npos);
 }
 
 TEST(AudioFormat, DescribesItself) {

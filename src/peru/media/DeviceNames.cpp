@@ -19,6 +19,22 @@ P<IString> getHostApiName(int32_t type) {
     }
 }
 
+P<IString> getHostApiDisplayName(int32_t type, const char* engineName) {
+    constexpr int32_t kPulseAudio = 16; // newer than the engine's header
+    switch (type) {
+    case paALSA:
+        return newString("ALSA");
+    case paJACK:
+        return newString("JACK");
+    case paOSS:
+        return newString("OSS");
+    case kPulseAudio:
+        return newString("PulseAudio");
+    default:
+        return CString::fromUTF8(engineName ? engineName : "");
+    }
+}
+
 P<IString> getDeviceListName(int32_t index, const CStringArg& name, const CStringArg& hostApi,
                              bool isDefault) {
     return format(isDefault ? "ID: %d - %s (%s) [DEFAULT]" : "ID: %d - %s (%s)", index, name, hostApi);

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "peru/media/AudioFormat.h"
+#include "peru/strings/IString.h"
 
 namespace peru::media {
 
@@ -16,7 +17,9 @@ enum EDeviceStatus : int32_t {
 // moves the samples. All operations except the getters of names throw CMediaException.
 class PERU_MEDIA_API IAudioDevice : public virtual IBase {
 public:
-    virtual P<IString> getId() const = 0;   // the index in decimal digits, stable while the process runs
+    // The index in decimal digits. Valid for this object; after devices have been added or removed, a new
+    // enumeration may assign it to another device.
+    virtual P<IString> getId() const = 0;
     virtual P<IString> getName() const = 0; // the driver's name for it
     virtual P<IString>
     getListName() const = 0; // "ID: 3 - NAME (HOST API)", with " [DEFAULT]" for the default
@@ -36,6 +39,10 @@ public:
     // Factor applied to every sample, initially 1.0, which leaves the samples unchanged. Thread-safe.
     virtual double getGain() const = 0;
     virtual void setGain(double gain) = 0;
+
+    // The sound system as its users know it, such as "ALSA"; getHostApi() has no names for the systems of
+    // Linux.
+    virtual P<IString> getHostApiDisplayName() const { return getHostApi(); }
 };
 
 } // namespace peru::media

@@ -7,8 +7,11 @@
 
 namespace peru::media {
 
-// Every call returns new device objects; on a machine without devices the results are empty. Throws
-// CMediaException if the sound system cannot be reached at all. Thread-safe.
+// Every call returns new device objects for the devices that exist now; on a machine without devices the
+// results are empty. While any device is open, added devices and a new default are not seen, since the sound
+// system must be restarted for that. Existing objects remain valid: if their device has disappeared, opening
+// it throws. Calls take some tens of milliseconds. Throws CMediaException if the sound system cannot be
+// reached at all. Thread-safe.
 class PERU_MEDIA_API ISystem : public virtual IBase {
 public:
     virtual WEnum<IAudioOutDevice> getOutDevices() = 0;

@@ -17,12 +17,10 @@ namespace {
 
 constexpr int kStartAttempts = 3;
 
-P<IString> findHostApi(PaHostApiIndex index) {
-    const PaHostApiInfo* info = Pa_GetHostApiInfo(index);
-    if (!info)
-        throw CMediaException(
-            localize("peru.media.CAudioDevice.NoMediaApi", "Could not get media api from host hostapi"));
-    return getHostApiName(info->type);
+const PaHostApiInfo& getHostApiInfo(PaHostApiIndex index) {
+    if (const PaHostApiInfo* info = Pa_GetHostApiInfo(index)) return *info;
+    throw CMediaException(
+        localize("peru.media.CAudioDevice.NoMediaApi", "Could not get media api from host hostapi"));
 }
 
 // 0 for a width that the engine or this library does not support.
@@ -56,13 +54,15 @@ CCallbackScope::~CCallbackScope() {
 
 CAudioDevice::CAudioDevice(const P<IPosixSystem>& system, int32_t index, EDirection direction)
     : m_streamMutex(getMutexFactory()->createMutex()), m_system(system), m_index(index),
-      m_direction(direction) {
+      m_direction(direction), m_engineIndex(index), m_generation(system->getGeneration()) {
     const PaDeviceInfo* info = Pa_GetDeviceInfo(index);
     if (!info)
         throw CMediaException(localize("peru.media.CAudioDevice.NoHostInfo", "Could not retrieve host info"));
     const bool isOut = direction == EDirection::out;
     m_name = CString::fromUTF8(info->name);
-    m_hostApi = findHostApi(info->hostApi);
+    const PaHostApiInfo& hostApi = getHostApiInfo(info->hostApi);
+    m_hostApi = getHostApiName(hostApi.type);
+    m_hostApiDisplayName = media::getHostApiDisplayName(hostApi.type, hostApi.name);
     m_isDefault = index == (isOut ? Pa_GetDefaultOutputDevice() : Pa_GetDefaultInputDevice());
     m_maxChannelCount = isOut ? info->maxOutputChannels : info->maxInputChannels;
     m_defaultSampleRate = static_cast<int32_t>(info->defaultSampleRate);
@@ -86,9 +86,27 @@ void CAudioDevice::setGain(double gain) {
     m_gain = gain;
 }
 
+int32_t CAudioDevice::findIndex() const {
+    if (m_generation == m_system->getGeneration()) return m_engineIndex;
+    const int32_t count = Pa_GetDeviceCount();
+    for (int32_t index = 0; index < count; ++index) {
+        const PaDeviceInfo* info = Pa_GetDeviceInfo(index);
+        const PaHostApiInfo* hostApi = info ? Pa_GetHostApiInfo(info->hostApi) : nullptr;
+        if (!hostApi || !m_name->equals(CString::fromUTF8(info->name)) ||
+            !m_hostApiDisplayName->equals(media::getHostApiDisplayName(hostApi->type, hostApi->name)))
+            continue;
+        if ((m_direction == EDirection::out ? info->maxOutputChannels : info->maxInputChannels) == 0)
+            continue;
+        m_engineIndex = index;
+        m_generation = m_system->getGeneration();
+        return index;
+    }
+    throwGone();
+}
+
 PaStreamParameters CAudioDevice::getParameters(const CAudioFormat& format) const {
     PaStreamParameters parameters{};
-    parameters.device = m_index;
+    parameters.device = findIndex();
     parameters.channelCount = format.getChannelCount();
     parameters.sampleFormat = findSampleFormat(format.getBitsPerSample());
     parameters.suggestedLatency = m_latency;
@@ -96,9 +114,9 @@ PaStreamParameters CAudioDevice::getParameters(const CAudioFormat& format) const
 }
 
 bool CAudioDevice::isTaken(const CAudioFormat& format, int32_t& failure) const {
-    const PaStreamParameters parameters = getParameters(format);
     const bool isOut = m_direction == EDirection::out;
     CMutexLock lock(m_system->getEngineMutex());
+    const PaStreamParameters parameters = getParameters(format);
     const PaError result = Pa_IsFormatSupported(isOut ? nullptr : &parameters, isOut ? &parameters : nullptr,
                                                 format.getSampleRate());
     const bool isAboutFormat = result == paInvalidSampleRate || result == paInvalidChannelCount ||
@@ -137,8 +155,7 @@ void CAudioDevice::openStream(const P<CAudioFormat>& audioFormat, PaStreamCallba
     if (!audioFormat)
         throw CMediaException(
             localize("peru.media.CAudioDevice.NoFormat", "The sound device was given no format"));
-    const PaStreamParameters parameters = getParameters(*audioFormat);
-    if (parameters.sampleFormat == 0)
+    if (!findSampleFormat(audioFormat->getBitsPerSample()))
         throw CMediaException(
             format(localize("peru.media.CAudioDevice.BitsNotSupported", "%d Bits are not supported"),
                    audioFormat->getBitsPerSample()));
@@ -149,11 +166,13 @@ void CAudioDevice::openStream(const P<CAudioFormat>& audioFormat, PaStreamCallba
     m_started = false;
     const bool isOut = m_direction == EDirection::out;
     CMutexLock lock(m_system->getEngineMutex());
+    const PaStreamParameters parameters = getParameters(*audioFormat);
     PaStream* stream = nullptr;
     // Neither clipping nor dithering: the samples must pass through unchanged.
     check(Pa_OpenStream(&stream, isOut ? nullptr : &parameters, isOut ? &parameters : nullptr,
                         audioFormat->getSampleRate(), paFramesPerBufferUnspecified, paClipOff | paDitherOff,
                         callback, self));
+    m_system->countStream(1);
     m_stream = stream;
 }
 
@@ -172,11 +191,18 @@ void CAudioDevice::startStream() {
 
 void CAudioDevice::closeStream(PaStream* stream) {
     CMutexLock lock(m_system->getEngineMutex());
+    m_system->countStream(-1); // it is released even if closing fails
     check(Pa_CloseStream(stream));
 }
 
 bool CAudioDevice::hasGone() const {
     return m_started && Pa_IsStreamActive(m_stream) != 1;
+}
+
+void CAudioDevice::throwGone() const {
+    throw CMediaException(localize("peru.media.CAudioDevice.Gone",
+                                   "The sound device '%NAME%' is not available any more",
+                                   {{"%NAME%", m_name}}));
 }
 
 void CAudioDevice::requireOpened() const {

@@ -42,6 +42,7 @@ public:
     int32_t getStatus() const override;
     double getGain() const override { return m_gain; }
     void setGain(double gain) override;
+    P<IString> getHostApiDisplayName() const override { return m_hostApiDisplayName; }
     int32_t getDeviceIndex() const override { return m_index; }
 
 protected:
@@ -49,11 +50,12 @@ protected:
 
     CAudioDevice(const P<IPosixSystem>& system, int32_t index, EDirection direction);
 
-    // All four require the stream's mutex.
+    // The first four require the stream's mutex.
     void openStream(const P<CAudioFormat>& format, PaStreamCallback* callback, void* self);
     void startStream();         // also sets the state, unless starting fails
     bool hasGone() const;       // it was started and the system has ended it since
     void requireOpened() const; // throws
+    [[noreturn]] void throwGone() const;
 
     // Does not require the stream's mutex.
     void closeStream(PaStream* stream);
@@ -69,14 +71,19 @@ protected:
     int32_t m_bytesPerFrame = 0;
 
 private:
+    int32_t findIndex() const; // in the engine's current list; throws if the device has disappeared
     PaStreamParameters getParameters(const CAudioFormat& format) const;
     bool isTaken(const CAudioFormat& format, int32_t& failure) const;
 
     const P<IPosixSystem> m_system;
-    const int32_t m_index;
+    const int32_t m_index; // when the object was created
     const EDirection m_direction;
+    // Guarded by the engine's mutex.
+    mutable int32_t m_engineIndex;
+    mutable uint64_t m_generation; // of m_engineIndex
     P<IString> m_name;
     P<IString> m_hostApi;
+    P<IString> m_hostApiDisplayName;
     bool m_isDefault = false;
     int32_t m_maxChannelCount = 0;
     int32_t m_defaultSampleRate = 0;

@@ -125,10 +125,7 @@ void CAudioOutDevice::close() {
 }
 
 void CAudioOutDevice::requireAlive() const {
-    if (hasGone())
-        throw CMediaException(localize("peru.media.CAudioOutDevice.Gone",
-                                       "The sound device '%NAME%' is not available any more",
-                                       {{"%NAME%", getName()}}));
+    if (hasGone()) throwGone();
 }
 
 void CAudioOutDevice::write(const void* data, int64_t size) {

@@ -52,16 +52,14 @@ bool hasConfiguredDevices() {
     auto describe = getSymbol<const char* (*)(int)>(alsa, "snd_strerror");
     auto configuration = getSymbol<void**>(alsa, "snd_config");
     auto search = getSymbol<int (*)(void*, const char*, void**)>(alsa, "snd_config_search");
-    auto getFirst = getSymbol<void* (*)(void*)>(alsa, "snd_config_iterator_first");
-    auto getEnd = getSymbol<void* (*)(void*)>(alsa, "snd_config_iterator_end");
-    if (!update || !describe || !configuration || !search || !getFirst || !getEnd) return true;
+    if (!update || !describe || !configuration || !search) return true;
     if (const int error = update(); error < 0)
         throw CMediaException(localize("peru.media.CSystem.BadConfiguration",
                                        "The configuration of the sound system cannot be read (%MSG%).",
                                        {{"%MSG%", describe(error)}}));
-    void* devices = nullptr;
-    return *configuration && search(*configuration, "pcm", &devices) >= 0 &&
-           getFirst(devices) != getEnd(devices);
+    void* device = nullptr;
+    return *configuration && (search(*configuration, "pcm.default", &device) >= 0 ||
+                              search(*configuration, "pcm.dmix", &device) >= 0);
 }
 
 } // namespace peru::media::posix

@@ -7,8 +7,8 @@ namespace peru::media::posix {
 // Applies to all other uses in this process as well. Call before the engine starts.
 void silenceSoundLibraries();
 
-// Whether the ALSA configuration defines a device. The engine aborts the process if it defines none. Throws
-// CMediaException if the configuration cannot be read. True if ALSA is not loaded.
+// Whether the ALSA configuration defines one of the two devices without which the engine aborts the process.
+// Throws CMediaException if the configuration cannot be read. True if ALSA is not loaded.
 bool hasConfiguredDevices();
 
 } // namespace peru::media::posix

@@ -4,7 +4,9 @@
 #include "peru/media/Errors.h"
 #include "peru/media/posix/AudioInDevice.h"
 #include "peru/media/posix/AudioOutDevice.h"
+#include "peru/media/posix/Engine.h"
 #include "peru/media/posix/SoundLibraries.h"
+#include "peru/system/ITimeManager.h"
 
 #include <portaudio.h>
 
@@ -12,25 +14,45 @@ namespace peru::media::posix {
 
 namespace {
 
-bool startEngine() {
-    silenceSoundLibraries();
-    if (!hasConfiguredDevices()) return false;
-    check(Pa_Initialize());
-    return true;
-}
+// How long the engine's list of devices counts as current, in nanoseconds. Saves a second restart when a
+// caller asks for outputs and inputs in turn.
+constexpr int64_t kFresh = 100'000'000;
 
 } // namespace
 
-CSystem::CSystem() : m_engineMutex(getMutexFactory()->createMutex()), m_hasDevices(startEngine()) {}
+CSystem::CSystem() : m_engineMutex(getMutexFactory()->createMutex()) {
+    start();
+}
 
 CSystem::~CSystem() {
-    if (m_hasDevices) Pa_Terminate();
+    if (m_isRunning) Pa_Terminate();
+}
+
+void CSystem::start() {
+    ++m_generation;
+    loadEngine();
+    silenceSoundLibraries();
+    if (hasConfiguredDevices()) {
+        check(Pa_Initialize());
+        m_isRunning = true;
+    }
+    m_startTime = getTimeManager()->getMonotonicTime();
+}
+
+// The engine enumerates the devices only when it starts.
+void CSystem::refresh() {
+    if (m_streamCount > 0 || getTimeManager()->getMonotonicTime() - m_startTime < kFresh) return;
+    if (m_isRunning) Pa_Terminate();
+    m_isRunning = false;
+    start();
 }
 
 template <class Device> P<IEnum> CSystem::getDevices() {
+    CMutexLock lock(m_engineMutex);
+    refresh();
     const P<CArray> devices = make<CArray>();
     const P<IPosixSystem> self = P<IPosixSystem>::share(this);
-    const int32_t count = m_hasDevices ? check(Pa_GetDeviceCount()) : 0;
+    const int32_t count = m_isRunning ? check(Pa_GetDeviceCount()) : 0;
     for (int32_t index = 0; index < count; ++index) {
         const P<Device> device = make<Device>(self, index);
         if (device->getMaxChannelCount() > 0) devices->add(device);
@@ -47,13 +69,17 @@ WEnum<IAudioInDevice> CSystem::getInDevices() {
 }
 
 P<IAudioOutDevice> CSystem::getDefaultOutDevice() {
-    const int32_t index = m_hasDevices ? Pa_GetDefaultOutputDevice() : paNoDevice;
+    CMutexLock lock(m_engineMutex);
+    refresh();
+    const int32_t index = m_isRunning ? Pa_GetDefaultOutputDevice() : paNoDevice;
     if (index == paNoDevice) return nullptr;
     return make<CAudioOutDevice>(P<IPosixSystem>::share(this), check(index));
 }
 
 P<IAudioInDevice> CSystem::getDefaultInDevice() {
-    const int32_t index = m_hasDevices ? Pa_GetDefaultInputDevice() : paNoDevice;
+    CMutexLock lock(m_engineMutex);
+    refresh();
+    const int32_t index = m_isRunning ? Pa_GetDefaultInputDevice() : paNoDevice;
     if (index == paNoDevice) return nullptr;
     return make<CAudioInDevice>(P<IPosixSystem>::share(this), check(index));
 }
