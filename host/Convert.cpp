@@ -3,8 +3,7 @@
 #include "EncodeJob.h"
 #include "ExitCodes.h"
 #include "Failure.h"
-#include "FileTag.h"
-#include "OutputPlace.h"
+#include "Output.h"
 #include "SoundFile.h"
 #include "Text.h"
 
@@ -36,8 +35,7 @@ private:
     };
 
     void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
-    void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
-                  CProgress::Job job);
+    void carryTag(const fs::path& input, const fs::path& temporary, CProgress::Job job);
     SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
     std::vector<SSampleFormat> listCandidates(const SSampleFormat& own) const;
 
@@ -63,13 +61,9 @@ std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) 
     if (rates.size() == 1) rates.push_back(own.rate % 11025 == 0 ? 44100 : 48000);
     for (int rate : rates)
         for (int channels : {own.channels, 2, 1})
-            for (int bytes : {own.bytesPerSample, 2})
-                if (channels <= own.channels) add(rate, channels, bytes);
-    // Whatever is converted comes out with 16 bits (or 8).
-    const bool wide = m_options.bits && *m_options.bits > 16;
-    std::erase_if(candidates, [&](const SSampleFormat& candidate) {
-        return !wide && candidate != own && candidate.bytesPerSample > 2;
-    });
+            for (int bytes : {own.bytesPerSample, 3, 2})
+                if (channels <= own.channels && bytes <= std::max(own.bytesPerSample, 2))
+                    add(rate, channels, bytes);
     return candidates;
 }
 
@@ -103,39 +97,22 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
     return ends;
 }
 
-// A tag that cannot be read does not keep the sound from being converted; what the output's kind of tag does
-// not have is left out.
-void CConverter::carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
-                          CProgress::Job job) {
-    std::vector<std::pair<const STagField*, std::u16string>> texts;
-    try {
-        const CFileTag from(m_library, input);
-        if (!from) return;
-        for (const STagField& field : getTagFields())
-            if (std::u16string text = from.get(field); !text.empty())
-                texts.emplace_back(&field, std::move(text));
-    } catch (const std::exception& error) {
-        return m_progress.warn(job,
-                               std::string("The tag could not be read and is left out: ") + error.what());
-    }
-    if (texts.empty()) return;
-    try {
-        CFileTag to(m_library, temporary);
-        if (!to) return;
-        for (const auto& [field, text] : texts) to.set(*field, text);
-        to.store();
-    } catch (const std::exception& error) {
-        std::string reason = "The tag of " + output.native() + " could not be written: " + error.what();
-        replaceAll(reason, m_temporaryEnding, "");
-        throw std::runtime_error(reason);
-    }
+// What the output's format cannot hold is left out, and the user hears of it. A tag that cannot be read does
+// not keep the sound from being converted.
+void CConverter::carryTag(const fs::path& input, const fs::path& temporary, CProgress::Job job) {
+    clearFailure();
+    char* lost = nullptr;
+    if (TONEWRIGHT_Host_CopyTags(toURI(input).c_str(), toURI(temporary).c_str(), &lost) != 1)
+        return m_progress.warn(job, takeFailure("The tag could not be carried over", input));
+    if (lost) m_progress.warn(job, std::string("The new file cannot hold these fields of the tag: ") + lost);
+    TONEWRIGHT_Host_Free(lost);
 }
 
 void CConverter::convert(const fs::path& input, const fs::path& output, CProgress::Job job) {
     const auto started = std::chrono::steady_clock::now();
     checkInput(input);
     if (isSameFile(input, output)) throw std::runtime_error("Input and output are the same file");
-    COutputPlace place(output, m_temporaryEnding, m_options.force);
+    COutput place(output, m_temporaryEnding, m_options.force);
 
     SEnds ends = openEnds(input, place.getTemporary(), output);
     const double duration = m_library.AudioSource_GetDuration(ends.source.get());
@@ -143,7 +120,7 @@ void CConverter::convert(const fs::path& input, const fs::path& output, CProgres
                              {input, place.getTemporary(), output}, m_temporaryEnding);
     ends = {};
     if (!done) return m_progress.cancel(job);
-    if (m_options.carryTags) carryTag(input, place.getTemporary(), output, job);
+    if (m_options.carryTags) carryTag(input, place.getTemporary(), job);
     const uint64_t bytes = fs::file_size(place.getTemporary());
     place.commit();
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <stdexcept>
+#include <tonewright/host.h>
 #include <unistd.h>
 
 namespace host {
@@ -14,18 +15,17 @@ namespace fs = std::filesystem;
 
 namespace {
 
-// The callback has no word of its own for the caller, but it is called on the thread that encodes.
 struct SRunning {
-    CProgress* progress;
+    CProgress& progress;
     CProgress::Job job;
     bool stopped = false;
 };
-thread_local SRunning* t_running = nullptr;
 
-bool onProgress(double fraction, int32_t) {
-    t_running->progress->advance(t_running->job, std::clamp(fraction, 0.0, 1.0));
-    t_running->stopped = isCancelled();
-    return !t_running->stopped;
+int32_t onProgress(double fraction, void* user) {
+    auto& running = *static_cast<SRunning*>(user);
+    running.progress.advance(running.job, std::clamp(fraction, 0.0, 1.0));
+    running.stopped = isCancelled();
+    return running.stopped ? TONEWRIGHT_DISCARD : TONEWRIGHT_CONTINUE;
 }
 
 // Messages name the file that the user knows.
@@ -65,18 +65,16 @@ CHandle requireFormat(CLibrary& library, const fs::path& temporary, const SSampl
 bool encode(CLibrary& library, const CHandle& source, const CHandle& format, CProgress& progress,
             CProgress::Job job, const SEncodeFiles& files, const std::string& temporaryEnding) {
     clearFailure();
-    SRunning running{&progress, job};
-    t_running = &running;
+    SRunning running{progress, job};
     int32_t result = TONEWRIGHT_ENCODER_FAILED;
     {
         // Making it opens the source for a moment, which may fail already.
         const CHandle encoder(library.CreateAudioEncoder(source.get(), format.get()));
         if (encoder) {
-            library.AudioEncoder_SetCallback(encoder.get(), onProgress);
+            TONEWRIGHT_Host_SetEncoderProgress(encoder.get(), onProgress, &running);
             result = library.AudioEncoder_Encode(encoder.get());
         }
     }
-    t_running = nullptr;
     if (running.stopped) return false;
     if (result != TONEWRIGHT_OK) throw std::runtime_error(tellReason(files, temporaryEnding));
     return true;

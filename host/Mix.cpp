@@ -4,7 +4,7 @@
 #include "Commands.h"
 #include "EncodeJob.h"
 #include "ExitCodes.h"
-#include "OutputPlace.h"
+#include "Output.h"
 
 #include <chrono>
 #include <stdexcept>
@@ -22,7 +22,7 @@ void mix(CLibrary& library, const SMixOptions& options, CProgress& progress, CPr
     if (isSameFile(options.input, options.output))
         throw std::runtime_error("Input and output are the same file");
     const std::string ending = setTemporaryEnding(library);
-    COutputPlace place(options.output, ending, options.force);
+    COutput place(options.output, ending, options.force);
     const fs::path& temporary = place.getTemporary();
 
     CHandle source = openArrangement(library, options.input, samples);

@@ -16,6 +16,7 @@
 #include <memory>
 #include <stdexcept>
 #include <thread>
+#include <tonewright/host.h>
 
 namespace host {
 
@@ -25,18 +26,18 @@ namespace {
 
 constexpr int kPollMilliseconds = 50;
 
-// What the player last told. The callback has no word of its own for the caller; one player plays at a time.
-struct STold {
+// What the player last reported; one player plays at a time.
+struct SState {
     std::atomic<double> duration{0};
     std::atomic<double> position{0};
     std::atomic<int32_t> state{TONEWRIGHT_PLAYER_STOPPED};
 };
-STold g_told;
 
-void onPlayer(double duration, double position, int32_t state) {
-    g_told.duration = duration;
-    if (state != TONEWRIGHT_PLAYER_STOPPED) g_told.position = position; // else it is told as 0
-    g_told.state = state;
+void onPlayer(double duration, double position, int32_t state, void* user) {
+    auto& shared = *static_cast<SState*>(user);
+    shared.duration = duration;
+    if (state != TONEWRIGHT_PLAYER_STOPPED) shared.position = position; // a stopped player reports 0
+    shared.state = state;
 }
 
 // Every thread that has to do with a player shares this. A stop that meets a player whose playing fails takes
@@ -45,9 +46,7 @@ class CSession {
 public:
     CSession(CLibrary& library, CHandle player) : m_library(library), m_player(std::move(player)) {
         ++s_alive;
-        g_told.duration = g_told.position = 0;
-        g_told.state = TONEWRIGHT_PLAYER_STOPPED;
-        m_library.Player_SetCallback(m_player.get(), onPlayer);
+        TONEWRIGHT_Host_SetPlayerProgress(m_player.get(), onPlayer, &m_state);
     }
     ~CSession() {
         m_player.reset();
@@ -63,22 +62,25 @@ public:
         m_failed = m_library.Player_Play(m_player.get()) != TONEWRIGHT_OK;
         if (m_failed) {
             m_reason = takeFailure("It cannot be played");
-            m_library.Player_SetCallback(m_player.get(), nullptr);
+            TONEWRIGHT_Host_SetPlayerProgress(m_player.get(), nullptr, nullptr);
         }
         m_ended = true;
     }
+    const SState& getState() const { return m_state; }
+    bool hasBegun() const { return m_state.state != TONEWRIGHT_PLAYER_STOPPED; }
     bool hasEnded() const { return m_ended; }
     bool hasFailed() const { return m_failed; }
     const std::string& getReason() const { return m_reason; }
 
     // Before playing has begun there is nothing to pause.
     void togglePause() {
-        if (g_told.state != TONEWRIGHT_PLAYER_STOPPED && !m_ended) m_library.Player_Pause(m_player.get());
+        if (hasBegun() && !m_ended) m_library.Player_Pause(m_player.get());
     }
     void stop() { m_library.Player_Stop(m_player.get()); } // waits for play() to end
 
 private:
     CLibrary& m_library;
+    SState m_state; // outlives the player, which reports to it
     CHandle m_player;
     std::string m_reason;
     bool m_failed = false;
@@ -97,7 +99,7 @@ public:
 private:
     CHandle makePlayer(const fs::path& file);
     void watch(const std::shared_ptr<CSession>& session);
-    void show();
+    void show(const SState& state);
 
     CLibrary& m_library;
     CKeyboard m_keyboard;
@@ -105,9 +107,9 @@ private:
     bool m_stopped = false; // by its key
 };
 
-void CJukebox::show() {
-    const bool isPaused = g_told.state == TONEWRIGHT_PLAYER_PAUSED;
-    const double duration = g_told.duration, position = std::min<double>(g_told.position, duration);
+void CJukebox::show(const SState& state) {
+    const bool isPaused = state.state == TONEWRIGHT_PLAYER_PAUSED;
+    const double duration = state.duration, position = std::min<double>(state.position, duration);
     const std::string at = formatDuration(position), all = formatDuration(duration);
     m_line.update(
         at + " / " + all + (isPaused ? "  paused" : ""), at + " of " + all,
@@ -122,10 +124,10 @@ void CJukebox::watch(const std::shared_ptr<CSession>& session) {
         m_stopped = m_stopped || key == 'q' || key == 'Q';
         if (key == ' ') session->togglePause();
         // A player that has not begun yet would not hear it.
-        const bool hasBegun = g_told.state != TONEWRIGHT_PLAYER_STOPPED;
+        const bool hasBegun = session->hasBegun();
         if (isStopped() && hasBegun && !stopper.joinable())
             stopper = std::thread([session] { session->stop(); });
-        if (hasBegun && m_line.isDue()) show();
+        if (hasBegun && m_line.isDue()) show(session->getState());
     }
     if (!stopper.joinable()) return;
     if (session->hasFailed())
@@ -151,8 +153,9 @@ CHandle CJukebox::makePlayer(const fs::path& file) {
 bool CJukebox::play(const fs::path& file) {
     const auto started = std::chrono::steady_clock::now();
     m_line.start(file, nlohmann::json::object());
+    std::shared_ptr<CSession> session;
     try {
-        auto session = std::make_shared<CSession>(m_library, makePlayer(file));
+        session = std::make_shared<CSession>(m_library, makePlayer(file));
         std::thread thread([session] { session->play(); });
         watch(session);
         thread.join();
@@ -165,10 +168,10 @@ bool CJukebox::play(const fs::path& file) {
     }
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
     if (isStopped())
-        m_line.cancel({{"position", g_told.position.load()}});
+        m_line.cancel({{"position", session->getState().position.load()}});
     else
-        m_line.finish(formatDuration(g_told.duration) + " played",
-                      {{"duration", g_told.duration.load()}, {"seconds", elapsed.count()}});
+        m_line.finish(formatDuration(session->getState().duration) + " played",
+                      {{"duration", session->getState().duration.load()}, {"seconds", elapsed.count()}});
     return true;
 }
 

@@ -6,7 +6,7 @@
 #include "Failure.h"
 #include "Keyboard.h"
 #include "LiveLine.h"
-#include "OutputPlace.h"
+#include "Output.h"
 #include "SoundFile.h"
 #include "Text.h"
 
@@ -15,6 +15,7 @@
 #include <cmath>
 #include <stdexcept>
 #include <thread>
+#include <tonewright/host.h>
 
 namespace host {
 
@@ -25,30 +26,32 @@ namespace {
 constexpr int kPollMilliseconds = 50;
 constexpr const char* kTemporaryEnding = ".part";
 
-// Between the device's thread and the one that watches. The callbacks have no word of their own for the
-// caller; there is one recording at a time.
-struct STold {
-    std::atomic<double> start{-1}; // the device's time of the first block; below 0: there was none
+// What the device's thread and the one that watches share.
+struct SState {
+    std::atomic<double> start{-1}; // the device's time of the first block; below 0: none has come yet
     std::atomic<double> position{0};
-    std::atomic<double> left{0}; // greatest level since it was last taken
+    std::atomic<double> left{0}; // greatest level since it was last read
     std::atomic<double> right{0};
     std::atomic<bool> isStopped{false};
     double limit = 0; // seconds; 0: none
 };
-STold g_told;
 
-// The device's time runs from its start on, and the first block comes later: counted is what was recorded.
-bool onRecorded(double time) {
-    if (g_told.start < 0) g_told.start = time;
-    const double position = time - g_told.start;
-    g_told.position = position;
-    return !g_told.isStopped && (g_told.limit <= 0 || position < g_told.limit);
+// The device's time counts from its start, which the first block follows later: the length of the recording
+// counts from that block.
+int32_t onRecorded(double time, void* user) {
+    auto& state = *static_cast<SState*>(user);
+    if (state.start < 0) state.start = time;
+    const double position = time - state.start;
+    state.position = position;
+    const bool goesOn = !state.isStopped && (state.limit <= 0 || position < state.limit);
+    return goesOn ? TONEWRIGHT_CONTINUE : TONEWRIGHT_STOP;
 }
 
-void onVolume(double left, double right) {
-    // This thread alone raises them, so that a level taken in between is lost at worst.
-    g_told.left = std::max<double>(g_told.left, left);
-    g_told.right = std::max<double>(g_told.right, right);
+void onLevels(double left, double right, void* user) {
+    // Only this thread raises them, so that at worst a level read in between is lost.
+    auto& state = *static_cast<SState*>(user);
+    state.left = std::max<double>(state.left, left);
+    state.right = std::max<double>(state.right, right);
 }
 
 // From -60 to 0 decibels.
@@ -62,35 +65,36 @@ std::string drawMeter(double level) {
 
 class CRecorder {
 public:
-    // Throws std::runtime_error when the file must not be written.
     CRecorder(CLibrary& library, const SRecordOptions& options, CLiveLine& line)
         : m_library(library),
           m_options(options), m_samples{options.rate.value_or(44100), options.channels.value_or(2),
                                         options.bits.value_or(16) / 8},
-          m_place(options.output, kTemporaryEnding, options.force), m_line(line) {
+          m_line(line) {
         const std::string ending = kTemporaryEnding;
         m_library.SetTempExtension(std::u16string(ending.begin(), ending.end()).c_str());
+        m_state.limit = options.seconds;
     }
 
-    // Returns when it was stopped. Throws std::runtime_error for any other end; what was recorded until then
-    // stays.
+    // Returns when the user or the limit ended it. Throws std::runtime_error for any other end and when the
+    // file must not be written; what was recorded until then stays.
     void run(const CHandle& device);
 
 private:
     CHandle openSource(const CHandle& device);
-    void encode(const CHandle& device);
-    void watch(const std::atomic<bool>& hasEnded);
-    uint64_t countBytes() const {
+    void encode(const CHandle& source, const COutput& place);
+    void watch(const std::atomic<bool>& hasEnded, const COutput& place);
+    void finish(COutput& place);
+    static uint64_t countBytes(const COutput& place) {
         std::error_code none;
-        const uintmax_t bytes = fs::file_size(m_place.getTemporary(), none);
+        const uintmax_t bytes = fs::file_size(place.getTemporary(), none);
         return none ? 0 : bytes;
     }
 
     CLibrary& m_library;
     const SRecordOptions& m_options;
     const SSampleFormat m_samples;
-    COutputPlace m_place;
     CLiveLine& m_line;
+    SState m_state;
 };
 
 CHandle CRecorder::openSource(const CHandle& device) {
@@ -98,8 +102,8 @@ CHandle CRecorder::openSource(const CHandle& device) {
     CHandle source(m_library.CreateAudioSoureFromAudioInDevice(device.get(), m_samples.rate,
                                                                m_samples.channels, m_samples.bytesPerSample));
     if (source) {
-        m_library.AudioSource_SetRecordingCallback(source.get(), onRecorded);
-        m_library.AudioSource_SetRecordingVolumeCallback(source.get(), onVolume);
+        TONEWRIGHT_Host_SetRecordingProgress(source.get(), onRecorded, &m_state);
+        TONEWRIGHT_Host_SetRecordingLevels(source.get(), onLevels, &m_state);
         if (m_library.AudioSource_Open(source.get()) == TONEWRIGHT_OK) return source;
     }
     const std::string reason = takeFailure("");
@@ -107,27 +111,26 @@ CHandle CRecorder::openSource(const CHandle& device) {
                              (reason.empty() ? "" : ": " + reason));
 }
 
-// Shows and obeys until the recording has ended.
-void CRecorder::watch(const std::atomic<bool>& hasEnded) {
+// Shows the recording and obeys keys until it has ended.
+void CRecorder::watch(const std::atomic<bool>& hasEnded, const COutput& place) {
     CKeyboard keyboard;
     while (!hasEnded) {
         const char key = keyboard.wait(kPollMilliseconds);
-        if (key == 'q' || key == 'Q' || isCancelled()) g_told.isStopped = true;
+        if (key == 'q' || key == 'Q' || isCancelled()) m_state.isStopped = true;
         if (!m_line.isDue()) continue;
-        const double position = g_told.position, left = g_told.left.exchange(0),
-                     right = g_told.right.exchange(0);
-        const uint64_t bytes = countBytes();
+        const double position = m_state.position, left = m_state.left.exchange(0),
+                     right = m_state.right.exchange(0);
+        const uint64_t bytes = countBytes(place);
         const std::string at = formatDuration(position) + ", " + formatSize(bytes);
         m_line.update(drawMeter(left) + " " + drawMeter(right) + "  " + at, at,
                       {{"position", position}, {"left", left}, {"right", right}, {"bytes", bytes}});
     }
 }
 
-// Returns when the device delivers no more and all that it delivered is in the file.
-void CRecorder::encode(const CHandle& device) {
+// Returns when the device delivers no more and everything that it delivered is in the file.
+void CRecorder::encode(const CHandle& source, const COutput& place) {
     const CHandle format =
-        requireFormat(m_library, m_place.getTemporary(), m_samples, m_options, m_options.output, "It");
-    const CHandle source = openSource(device);
+        requireFormat(m_library, place.getTemporary(), m_samples, m_options, m_options.output, "It");
     const CHandle encoder(m_library.CreateAudioEncoder(source.get(), format.get()));
     int32_t result = TONEWRIGHT_ENCODER_FAILED;
     std::string reason;
@@ -138,34 +141,45 @@ void CRecorder::encode(const CHandle& device) {
         reason = takeFailure("The recording failed");
         hasEnded = true;
     });
-    watch(hasEnded);
+    watch(hasEnded, place);
     thread.join();
-    if (result == TONEWRIGHT_OK) return;
-    throw std::runtime_error(asReason(reason, m_place.getTemporary()));
+    if (result != TONEWRIGHT_OK) throw std::runtime_error(asReason(reason, place.getTemporary()));
 }
 
-void CRecorder::run(const CHandle& device) {
-    g_told.limit = m_options.seconds;
-    try {
-        encode(device);
-    } catch (const std::runtime_error& failure) {
-        // Nobody can make the same sound again.
-        if (g_told.start < 0 || countBytes() == 0) throw;
-        m_place.keep();
-        throw std::runtime_error(std::string(failure.what()) + "; what was recorded is in " +
-                                 m_place.getTemporary().string());
-    }
-    const double position = g_told.position;
-    const bool wasWanted = g_told.isStopped || (g_told.limit > 0 && position >= g_told.limit);
-    if (!wasWanted && g_told.start < 0) throw std::runtime_error("The sound device delivers nothing");
-    const uint64_t bytes = countBytes();
-    m_place.commit();
+void CRecorder::finish(COutput& place) {
+    const double position = m_state.position;
+    const bool wasWanted = m_state.isStopped || (m_state.limit > 0 && position >= m_state.limit);
+    if (!wasWanted && m_state.start < 0) throw std::runtime_error("The sound device delivers nothing");
+    const uint64_t bytes = countBytes(place);
+    place.commit();
     if (!wasWanted)
         throw std::runtime_error("The sound device stopped; what was recorded until then, " +
                                  formatDuration(position) + ", is there");
     const std::string codec = codecName(m_options.output);
     m_line.finish(codec + ", " + formatDuration(position) + ", " + formatSize(bytes),
                   {{"codec", codec}, {"duration", position}, {"bytes", bytes}});
+}
+
+// An earlier recording that was cut off is removed once it is certain that this one runs.
+void CRecorder::run(const CHandle& device) {
+    requireFormat(m_library, m_options.output, m_samples, m_options, m_options.output, "It");
+    if (!m_options.force) COutput(m_options.output, kTemporaryEnding, false, EGrowth::live).keep();
+    const CHandle source = openSource(device);
+    COutput place(m_options.output, kTemporaryEnding, m_options.force, EGrowth::live);
+    bool isOver = false;
+    try {
+        encode(source, place);
+        isOver = true;
+        finish(place);
+    } catch (const std::runtime_error& failure) {
+        // Nobody can make the same sound again.
+        std::error_code none;
+        if (m_state.start < 0 || !fs::exists(place.getTemporary(), none) || countBytes(place) == 0) throw;
+        place.keep();
+        throw std::runtime_error(std::string(failure.what()) +
+                                 (isOver ? "; the recording is in " : "; what was recorded is in ") +
+                                 place.getTemporary().string());
+    }
 }
 
 // The file is named before the reason already.

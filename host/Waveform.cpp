@@ -2,7 +2,7 @@
 #include "Commands.h"
 #include "ExitCodes.h"
 #include "Failure.h"
-#include "OutputPlace.h"
+#include "Output.h"
 #include "SoundFile.h"
 #include "Text.h"
 
@@ -127,7 +127,7 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     checkInput(options.input);
     if (isSameFile(options.input, options.output))
         throw std::runtime_error("Input and output are the same file");
-    COutputPlace place(options.output, ".part" + std::to_string(::getpid()), options.force);
+    COutput place(options.output, ".part" + std::to_string(::getpid()), options.force);
     SSoundFile sound = openSoundFile(options.input);
     const SSampleFormat samples = sound.samples;
     const double duration = sound.info.duration;

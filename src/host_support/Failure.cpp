@@ -1,49 +1,58 @@
 #include "host_support/Guard.h"
-#include "peru/ClassName.h"
+#include "peru/system/IPathes.h"
+#include "sonora2/context/LastFailure.h"
 
 using namespace tonewright::host_support;
+using sonora2::common::SFailure;
 
 namespace {
 
-struct SStored {
-    bool isSet = false;
-    std::string kind, title, message, file;
-};
-thread_local SStored t_stored;
+// What a host sees of a record: the path in place of the URI. Its text lives until the next call on the
+// thread.
+thread_local SFailure t_shown;
+
+std::string toPath(const std::string& uri) {
+    if (uri.empty()) return {};
+    const P<peru::IURI> parsed = peru::make<peru::CURI>(peru::CString::fromUTF8(uri));
+    const std::string path = peru::CString::toStdString(peru::getPathes()->toPlatformPath(parsed));
+    return path.empty() ? uri : path;
+}
 
 } // namespace
 
 namespace tonewright::host_support {
 
-void storeFailure(const peru::CException& exception) noexcept {
+void storeFailure(const std::exception& exception) noexcept {
     try {
-        t_stored = {true,
-                    peru::getClassName(typeid(exception)),
-                    peru::CString::toStdString(exception.getTitle()),
-                    peru::CString::toStdString(exception.getDescription()),
-                    {}};
+        sonora2::common::setLastFailure(sonora2::common::describeFailure(exception));
     } catch (...) {
-        t_stored.isSet = true; // no memory for the text
+        storeUnknownFailure();
     }
 }
 
-void storeFailure(const char* message) noexcept {
+void storeUnknownFailure() noexcept {
     try {
-        t_stored = {true, "std::exception", "Error", message, {}};
+        sonora2::common::setLastFailure({"", "Error", "An unknown error occurred", ""});
     } catch (...) {
-        t_stored.isSet = true;
+        // No memory for the record; the one before it stays.
     }
 }
 
 } // namespace tonewright::host_support
 
 int32_t TONEWRIGHT_Host_GetLastFailure(TONEWRIGHT_Failure* failure) {
-    const SStored& stored = t_stored;
-    fillRecord(failure, {sizeof(*failure), stored.kind.c_str(), stored.title.c_str(), stored.message.c_str(),
-                         stored.file.c_str()});
-    return stored.isSet ? 1 : 0;
+    try {
+        t_shown = sonora2::common::getLastFailure();
+        t_shown.uri = toPath(t_shown.uri);
+    } catch (...) {
+        // What was copied so far is valid.
+    }
+    fillRecord(failure, {sizeof(*failure), t_shown.kind.c_str(), t_shown.title.c_str(),
+                         t_shown.message.c_str(), t_shown.uri.c_str()});
+    return t_shown.isEmpty() ? 0 : 1;
 }
 
 void TONEWRIGHT_Host_ClearLastFailure() {
-    t_stored = {};
+    sonora2::common::clearLastFailure();
+    t_shown = {};
 }

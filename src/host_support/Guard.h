@@ -15,20 +15,18 @@ using exports::unwrap;
 using exports::wrap;
 using peru::P;
 
-void storeFailure(const peru::CException& exception) noexcept;
-void storeFailure(const char* message) noexcept;
+void storeFailure(const std::exception& exception) noexcept;
+void storeUnknownFailure() noexcept;
 
 // Runs the body of a function. After an exception the result is `failure` and the reason is stored for the
 // calling thread.
 template <class R, class Body> R guard(const R& failure, Body&& body) noexcept {
     try {
         return static_cast<R>(body());
-    } catch (const peru::CException& exception) {
-        storeFailure(exception);
     } catch (const std::exception& exception) {
-        storeFailure(exception.what());
+        storeFailure(exception);
     } catch (...) {
-        storeFailure("An unknown exception was thrown");
+        storeUnknownFailure();
     }
     return failure;
 }

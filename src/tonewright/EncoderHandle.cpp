@@ -35,14 +35,19 @@ CEncoderHandle::~CEncoderHandle() {
 
 void CEncoderHandle::run() {
     m_isDiscarding = false;
+    m_reports = 0;
     try {
         requireOtherFile();
         requireSameFormat();
         m_encoder->encode();
     } catch (...) {
-        discard();
+        if (!isWorthKeeping()) discard();
         throw;
     }
+}
+
+bool CEncoderHandle::isWorthKeeping() const {
+    return m_reports > 1 && peru::interfaceCast<IRecordingTarget>(m_source);
 }
 
 // Links included: the job would read what it replaces.
@@ -79,6 +84,7 @@ peru::SInterfaceQueryResult CEncoderHandle::queryInterface(const std::type_info&
 
 bool CEncoderHandle::onProgress(double fraction, int32_t reserved) {
     const TONEWRIGHT_EncoderCallback callback = m_callback;
+    ++m_reports;
     bool goesOn = !callback || callback(fraction, reserved);
     if (const auto function = m_progress.get(); function && !(*function)(fraction)) goesOn = false;
     if (!m_isDiscarding) return goesOn;

@@ -26,7 +26,8 @@ public:
                    const P<sonora2::common::IAudioFormat>& format);
     ~CEncoderHandle() override;
 
-    // Runs the whole job on this thread. If it throws, the format has dropped what was written.
+    // Runs the whole job on this thread. If it throws, the format has dropped what was written, unless the
+    // source is a recording: nobody can make the same sound again.
     void run();
     void setCallback(TONEWRIGHT_EncoderCallback callback) { m_callback = callback; }
 
@@ -40,6 +41,7 @@ private:
     void requireOtherFile() const;
     void requireSameFormat() const;
     void discard() noexcept;
+    bool isWorthKeeping() const;
 
     P<sonora2::common::IAudioSource> m_source;
     P<sonora2::common::IAudioFormat> m_format;
@@ -47,6 +49,7 @@ private:
     std::atomic<TONEWRIGHT_EncoderCallback> m_callback{nullptr};
     TCallbackSlot<bool(double)> m_progress;
     std::atomic<bool> m_isDiscarding{false};
+    int64_t m_reports = 0; // of the running job: one before the first block, then one for each
 };
 
 } // namespace tonewright

@@ -57,4 +57,24 @@ TEST(Examples, Tag_ShowsTheTitleAndChangesIt) {
     EXPECT_EQ(run({TAG, (folder / "missing.ogg").string(), "x"}).exitCode, 1);
 }
 
+#ifndef TONEWRIGHT_SANITIZED // Python itself is not built for that
+TEST(Examples, Python_ConvertsAndGivesTheReasonOfAFailure) {
+    CTempFolder folder;
+    run({"sox", "-n", "-r", "48000", "-b", "24", "-c", "1", folder / "a.wav", "synth", "1", "sine", "300"});
+    const auto convert = [&](const std::string& from, const std::string& to) {
+        return run({"/usr/bin/python3", CONVERT, folder / from, folder / to}, {},
+                   {{"TONEWRIGHT_LIBDIR", LIBRARIES}});
+    };
+    const SProcessResult good = convert("a.wav", "a.flac");
+    EXPECT_EQ(good.exitCode, 0) << good.err;
+    EXPECT_NE(good.out.find("48000 Hz, 1 channels, 1.00 s"), std::string::npos) << good.out;
+    EXPECT_NE(good.err.find("100%"), std::string::npos) << good.err;
+    EXPECT_EQ(run({"flac", "-t", "-s", folder / "a.flac"}).exitCode, 0);
+    EXPECT_EQ(run({"soxi", "-b", folder / "a.flac"}).out, "24\n");
+    const SProcessResult bad = convert("missing.wav", "b.flac");
+    EXPECT_EQ(bad.exitCode, 1);
+    EXPECT_NE(bad.err.find("No such file"), std::string::npos) << bad.err;
+}
+#endif
+
 } // namespace

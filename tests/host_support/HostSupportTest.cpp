@@ -8,6 +8,7 @@
 #include <tonewright/host.h>
 
 #include <atomic>
+#include <fstream>
 #include <random>
 #include <thread>
 
@@ -326,4 +327,122 @@ TEST_F(Host, ArrangementNamesMediaBesideIt) {
         EXPECT_NE(std::string(lastFailure().message).find(each.reason), std::string::npos)
             << lastFailure().message;
     }
+}
+
+TEST_F(Host, EncoderAnswersDecideAboutTheFile) {
+    const std::string pcm(44100 * 4 * 3, '\1');
+    struct SAnswer {
+        int32_t answer;
+        double last = -1;
+    };
+    const auto answer = [](double fraction, void* user) -> int32_t {
+        auto& wanted = *static_cast<SAnswer*>(user);
+        wanted.last = fraction;
+        return fraction < 0.5 ? TONEWRIGHT_CONTINUE : wanted.answer;
+    };
+    for (const int32_t wanted : {TONEWRIGHT_CONTINUE, TONEWRIGHT_STOP, TONEWRIGHT_DISCARD})
+        for (const bool exists : {false, true}) {
+            const std::filesystem::path file = folder / "out.wav";
+            std::filesystem::remove(file);
+            if (exists) folder.write("out.wav", "old");
+            const CHandle source(TONEWRIGHT_Host_CreateSourceFromMemory(44100, 2, 2, pcm.data(), 44100 * 3));
+            const CHandle format(
+                TONEWRIGHT_CreateAudioFormatFromURI(uriOf(file).c_str(), 44100, 2, 2, 0.0, 0, 0, 0));
+            const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source, format));
+            SAnswer state{wanted};
+            ASSERT_EQ(TONEWRIGHT_Host_SetEncoderProgress(encoder, answer, &state), 1);
+            EXPECT_EQ(TONEWRIGHT_AudioEncoder_Encode(encoder), TONEWRIGHT_OK);
+            const size_t size = readFile(file).size();
+            if (wanted == TONEWRIGHT_CONTINUE) {
+                EXPECT_EQ(size, pcm.size() + 44);
+                EXPECT_EQ(state.last, 1.0);
+            } else if (wanted == TONEWRIGHT_STOP) {
+                EXPECT_NEAR(static_cast<double>(size), static_cast<double>(pcm.size()) / 2, 50000);
+            } else {
+                EXPECT_EQ(std::filesystem::exists(file), exists);
+                EXPECT_EQ(readFile(file), exists ? "old" : "");
+            }
+        }
+    EXPECT_EQ(TONEWRIGHT_Host_SetEncoderProgress(nullptr, answer, nullptr), 0);
+}
+
+TEST_F(Host, OutputAppearsCompleteOrNotAtAll) {
+    const auto create = [&](const std::string& path, int32_t flags = 0) {
+        return TONEWRIGHT_Host_CreateOutput(path.c_str(), ".part7", flags);
+    };
+    const auto write = [](TONEWRIGHT_Handle output, const std::string& text) {
+        std::ofstream(TONEWRIGHT_Host_GetOutputPath(output), std::ios::binary) << text;
+    };
+    const std::string file = folder / "x.wav";
+    std::filesystem::create_directory(folder / "real");
+    std::filesystem::create_directory_symlink("real", folder / "linked");
+    {
+        const CHandle output(create(file));
+        write(output, "new");
+        EXPECT_FALSE(std::filesystem::exists(file));
+    }
+    EXPECT_EQ(countEntries(folder.path()), 2u); // nothing left
+    {
+        const CHandle output(create(folder / "real/a.wav"));
+        EXPECT_EQ(create(folder / "linked/a.wav", TONEWRIGHT_OUTPUT_REPLACE), nullptr); // the same file
+        write(output, "first");
+        EXPECT_EQ(TONEWRIGHT_Host_CommitOutput(output), 1);
+    }
+    EXPECT_EQ(readFile(folder / "real/a.wav"), "first");
+
+    // A private file stays private, also while its successor is written, and a link stays a link.
+    std::filesystem::permissions(folder / "real/a.wav", std::filesystem::perms(0600));
+    std::filesystem::create_symlink("real/a.wav", folder / "link.wav");
+    {
+        const CHandle output(create(folder / "link.wav", TONEWRIGHT_OUTPUT_REPLACE));
+        write(output, "second");
+        EXPECT_EQ(std::filesystem::status(TONEWRIGHT_Host_GetOutputPath(output)).permissions(),
+                  std::filesystem::perms(0600));
+        EXPECT_EQ(TONEWRIGHT_Host_CommitOutput(output), 1);
+    }
+    EXPECT_TRUE(std::filesystem::is_symlink(folder / "link.wav"));
+    EXPECT_EQ(readFile(folder / "real/a.wav"), "second");
+    EXPECT_EQ(std::filesystem::status(folder / "real/a.wav").permissions(), std::filesystem::perms(0600));
+
+    // A target that has appeared meanwhile, a dangling link, and the files of others.
+    {
+        const CHandle output(create(file));
+        write(output, "late");
+        folder.write("x.wav", "other");
+        EXPECT_EQ(TONEWRIGHT_Host_CommitOutput(output), 0);
+        EXPECT_EQ(readFile(file), "other");
+    }
+    std::filesystem::create_symlink("not-there.wav", folder / "dangling.wav");
+    {
+        const CHandle output(create(folder / "dangling.wav"));
+        write(output, "there");
+        EXPECT_EQ(TONEWRIGHT_Host_CommitOutput(output), 1);
+    }
+    EXPECT_EQ(readFile(folder / "not-there.wav"), "there");
+    folder.write("y.wav.part7", "somebody's");
+    EXPECT_EQ(create(folder / "y.wav"), nullptr);
+    EXPECT_EQ(readFile(folder / "y.wav.part7"), "somebody's");
+    for (const char* bad : {"x.wav", "real", "no/such/folder.wav", "x.wav/y.wav"})
+        EXPECT_EQ(create(folder / bad), nullptr) << bad;
+}
+
+// mutagen reads what was copied.
+TEST_F(Host, TagsAreCopiedWhole) {
+    const std::string from = folder / "a.flac";
+    for (const char* name : {"a.flac", "b.flac", "c.wav"})
+        ASSERT_EQ(run({"sox", "-n", "-r", "44100", "-c", "2", folder / name, "synth", "0.1", "sine", "300"})
+                      .exitCode,
+                  0);
+    ASSERT_EQ(
+        run({"metaflac", "--set-tag=COMPOSER=C. Omposer", "--set-tag=REPLAYGAIN_TRACK_GAIN=-3.2 dB", from})
+            .exitCode,
+        0);
+    char* lost = nullptr;
+    EXPECT_EQ(TONEWRIGHT_Host_CopyTags(uriOf(from).c_str(), uriOf(folder / "b.flac").c_str(), &lost), 1);
+    EXPECT_EQ(lost, nullptr);
+    const std::string tags = run({"metaflac", "--export-tags-to=-", folder / "b.flac"}).out;
+    EXPECT_NE(tags.find("COMPOSER=C. Omposer"), std::string::npos) << tags;
+    EXPECT_NE(tags.find("REPLAYGAIN_TRACK_GAIN=-3.2 dB"), std::string::npos) << tags;
+    EXPECT_EQ(TONEWRIGHT_Host_CopyTags(uriOf(folder / "none.flac").c_str(), uriOf(from).c_str(), &lost), 0);
+    EXPECT_NE(std::string(lastFailure().file).find("none.flac"), std::string::npos) << lastFailure().file;
 }
