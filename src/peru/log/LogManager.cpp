@@ -52,6 +52,15 @@ private:
     int32_t m_walks = 0; // nested when a sink logs
 };
 
+namespace {
+
+// By bytes: a name that cannot be decoded is a name.
+bool isEverySource(const P<IString>& source) {
+    return !source || source->getDataSize() == 0;
+}
+
+} // namespace
+
 CLogManager::CLogManager() : m_mutex(getMutexFactory()->createMutex()), m_logs(make<CLogList>()) {}
 
 CLogManager::~CLogManager() = default;
@@ -107,7 +116,7 @@ void CLogManager::write(const SLogMessage& message) {
     if (!isWanted(message.level)) return;
     CMutexLock lock(m_mutex);
     auto call = [&](ILog& log) { log.write(message); };
-    if (message.source && !message.source->isEmpty()) {
+    if (!isEverySource(message.source)) {
         if (const P<CLogList>* found = m_logsBySource.find(*message.source)) {
             const P<CLogList> logs = *found;
             logs->forEach(call);
@@ -119,7 +128,7 @@ void CLogManager::write(const SLogMessage& message) {
 void CLogManager::addLog(const P<ILog>& log, const P<IString>& source) {
     if (!log || log == P<ILog>::share(this)) throw CInvalidArgError("log", "addLog", P<IBase>::share(this));
     CMutexLock lock(m_mutex);
-    if (!source || source->isEmpty()) {
+    if (isEverySource(source)) {
         m_logs->add(log);
         return;
     }
@@ -130,7 +139,7 @@ void CLogManager::addLog(const P<ILog>& log, const P<IString>& source) {
 
 bool CLogManager::removeLog(const P<ILog>& log, const P<IString>& source) {
     CMutexLock lock(m_mutex);
-    if (!source || source->isEmpty()) return m_logs->remove(log);
+    if (isEverySource(source)) return m_logs->remove(log);
     const P<CLogList>* found = m_logsBySource.find(*source);
     if (!found || !(*found)->remove(log)) return false;
     if ((*found)->isEmpty()) m_logsBySource.remove(*source);

@@ -39,7 +39,7 @@ P<IString> CStringLocalizer::getText(const CStringArg& key, const P<IString>& de
     const CString wanted(getEncoding(key), key.getData(), key.getByteSize(), EStringStorage::refer);
     CMutexLock lock(m_mutex);
     const P<IString>* own = m_texts.find(wanted);
-    if (own && *own && !(*own)->isEmpty()) return *own;
+    if (own && *own && (*own)->getDataSize() > 0) return *own;
     return m_parent ? m_parent->getText(key, defaultText) : defaultText;
 }
 
