@@ -48,7 +48,7 @@ constinit SGlobalObjFactoryCell g_cell{};
 CGlobalObjFactory& SGlobalObjFactoryCell::access() {
     while (!isConstructed()) {
         if (isDestroyed()) {
-            std::fputs("peru: a global object was asked for after the end of the process\n", stderr);
+            std::fputs("peru: a global object was requested after the end of the process\n", stderr);
             std::abort();
         }
         if (!claimed.exchange(true, std::memory_order_acq_rel)) {

@@ -173,7 +173,7 @@ WEnum<IXmlNode> CXmlDocument::getChildNodesByName(const CStringArg& name) const 
 
 P<IXmlNode> CXmlDocument::addChildNode(const CStringArg& name) {
     if (m_tree->RootElement())
-        throw CInvalidArgError("the document has a root already", "CXmlDocument::addChildNode");
+        throw CInvalidArgError("the document already has a root", "CXmlDocument::addChildNode");
     auto root = std::make_unique<TiXmlElement>(xml::fromName(name, "CXmlDocument::addChildNode"));
     return CXmlNode::get(share(), m_tree->LinkEndChild(root.release())->ToElement());
 }

@@ -83,7 +83,7 @@ P<IXmlNode> CXmlNode::addChildNode(const CStringArg& name) {
     int32_t depth = 0;
     for (const TiXmlNode* i = &getElement(); i->ToElement(); i = i->Parent()) ++depth;
     if (depth >= IXmlDocument::kMaxDepth)
-        throw CInvalidArgError("the document has no deeper level", "IXmlNode::addChildNode");
+        throw CInvalidArgError("the document cannot be nested deeper", "IXmlNode::addChildNode");
     auto child = std::make_unique<TiXmlElement>(xml::fromName(name, "IXmlNode::addChildNode"));
     return get(m_document, getElement().LinkEndChild(child.release())->ToElement());
 }
@@ -119,7 +119,7 @@ void CXmlNode::setProperty(const CStringArg& name, const CStringArg& value) {
         ++count;
     }
     if (!known && count >= IXmlDocument::kMaxProperties)
-        throw CInvalidArgError("the node has no room for more properties", "IXmlNode::setProperty");
+        throw CInvalidArgError("the node cannot hold more properties", "IXmlNode::setProperty");
     element.SetAttribute(ownName, ownValue);
 }
 

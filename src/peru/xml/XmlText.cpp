@@ -60,7 +60,8 @@ std::string fromText(const CStringArg& text, const char* method) {
 std::string fromName(const CStringArg& name, const char* method) {
     std::string bytes = fromText(name, method);
     if (!startsName(bytes) || !std::all_of(bytes.begin(), bytes.end(), isNamePart))
-        throw CInvalidArgError(newString("'") + CString::fromUTF8(bytes) + "' is no name of XML", method);
+        throw CInvalidArgError(newString("'") + CString::fromUTF8(bytes) + "' is not a valid XML name",
+                               method);
     return bytes;
 }
 
