@@ -6,7 +6,6 @@
 #include "support/Files.h"
 
 #include <list>
-#include <memory>
 
 namespace peru {
 
@@ -14,8 +13,8 @@ namespace {
 
 using tests::text;
 
-template <class E> std::shared_ptr<CException> error(E&& e) {
-    return std::make_shared<std::decay_t<E>>(std::forward<E>(e));
+template <class E> P<CException> error(const E& e) {
+    return e.clone();
 }
 
 // Clears the process's localizer at the end of a test.
@@ -30,7 +29,7 @@ TEST(Errors, ReadAsTheUserSeesThem) {
     P<IURI> noURI;
     P<IBase> array = make<CArray>();
     const struct {
-        std::shared_ptr<CException> error;
+        P<CException> error;
         const char* title;
         const char* description;
     } cases[] = {
@@ -159,19 +158,17 @@ TEST(StringLocalizer, PrefersOwnTextThenParentThenDefault) {
     P<IStringLocalizer> parent = make<CStringLocalizer>();
     P<IStringLocalizer> own = make<CStringLocalizer>();
     own->setParent(parent);
-    auto look = [&](const char* key) { return text(own->getText(key, newString("default"))); };
-    EXPECT_EQ(look("a.b.c"), "default");
+    auto look = [&] { return text(own->getText("a.b.c", newString("default"))); };
+    EXPECT_EQ(look(), "default");
     parent->setText("a.b.c", newString("parent"));
-    EXPECT_EQ(look("a.b.c"), "parent");
-    own->setText(u"a.b.c", newString("own"));
-    EXPECT_EQ(look("a.b.c"), "own");
-    own->setText("a.b.c", newString(""));
-    EXPECT_EQ(look("a.b.c"), "parent");
-    own->setText("a.b.c", newString("own"));
+    for (const char* entry : {"own", "", "again"}) {
+        own->setText(u"a.b.c", newString(entry));
+        EXPECT_EQ(look(), *entry ? entry : "parent");
+    }
     own->clear();
-    EXPECT_EQ(look("a.b.c"), "parent");
+    EXPECT_EQ(look(), "parent");
     own->setParent(nullptr);
-    EXPECT_EQ(look("a.b.c"), "default");
+    EXPECT_EQ(look(), "default");
     EXPECT_THROW(own->setParent(own), CInvalidArgError);
 }
 

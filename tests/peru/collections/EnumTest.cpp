@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 
+#include <functional>
 #include <string>
 
 namespace peru {
@@ -31,9 +32,9 @@ std::string drainConst(const P<IConstEnum>& elements) {
     return all;
 }
 
-P<IEnum> chain(const std::string& a, const std::string& b, const std::string& c) {
+P<IEnum> chain(const std::vector<std::string>& parts) {
     P<CMultiEnum> multi = make<CMultiEnum>();
-    for (const std::string& letters : {a, b, c}) multi->addEnum(makeArray(letters)->createEnum());
+    for (const std::string& letters : parts) multi->addEnum(makeArray(letters)->createEnum());
     return multi;
 }
 
@@ -59,8 +60,8 @@ TEST(Enum, WalksToTheEndAndThrowsThere) {
         {makeArray("abc")->createConstEnum(true), "cba"},
         {constant->createConstEnum(), "xy"},
         {constant->createConstEnum(true), "yx"},
-        {chain("", "", ""), ""},
-        {chain("ab", "", "c"), "abc"},
+        {chain({"", "", ""}), ""},
+        {chain({"ab", "", "c"}), "abc"},
         {chainConst("ab", "cd"), "abdc"},
     };
     for (const auto& each : cases) {
@@ -107,13 +108,12 @@ TEST(Array, EditsByIndexAndRefusesOthers) {
     EXPECT_TRUE(array->remove(b));
     EXPECT_FALSE(array->remove(b));
     EXPECT_EQ(drain(array->createEnum()), "Acd");
-    for (int32_t index : {-1, 3}) {
-        EXPECT_THROW(array->getAt(index), CInvalidArgError);
-        EXPECT_THROW(array->getConstAt(index), CInvalidArgError);
-        EXPECT_THROW(array->setAt(index, b), CInvalidArgError);
-        EXPECT_THROW(array->removeAt(index), CInvalidArgError);
-    }
-    EXPECT_THROW(array->insertAt(4, b), CInvalidArgError);
+    const std::function<void(int32_t)> operations[] = {
+        [&](int32_t index) { array->getAt(index); }, [&](int32_t index) { array->getConstAt(index); },
+        [&](int32_t index) { array->setAt(index, b); }, [&](int32_t index) { array->removeAt(index); },
+        [&](int32_t index) { array->insertAt(index < 0 ? index : index + 1, b); }};
+    for (const auto& operation : operations)
+        for (int32_t index : {-1, 3}) EXPECT_THROW(operation(index), CInvalidArgError);
 }
 
 } // namespace peru

@@ -74,18 +74,19 @@ TEST(StringFormat, Doubles_PrintAsInCWithAPoint) {
 }
 
 TEST(StringFormat, Fields_TakeEveryKindOfValue) {
-    auto text = [](const P<IString>& formatted) { return CString::toStdString(formatted); };
-    EXPECT_EQ(text(format("100%% of %s, %d%%", "it", 5)), "100% of it, 5%");
-    EXPECT_EQ(text(format("no field %%")), "no field %");
-    EXPECT_EQ(text(format("[%5s|%-5s|%.2s|%05s]", "abc", u"\u00E9", "abc", "x")),
-              "[  abc|\xC3\xA9    |ab|    x]");
-    EXPECT_EQ(text(format("%c%C%3c", 'a', U'\u20AC', L'z')), "a\xE2\x82\xAC  z");
-    EXPECT_EQ(text(format("%*d|%-*d|%*d|%.*f", 4, 7, 4, 7, -4, 7, 2, 1.239)), "   7|7   |7   |1.24");
-    EXPECT_EQ(text(format("%.*s|%.*s", 2, "abc", -1, "abc")), "ab|abc") << "a negative precision is none";
-    EXPECT_EQ(text(format("%.d|%.0x|%#.o", 0, 0, 0)), "||0");
-    EXPECT_EQ(text(format("%x %u %x", -1, -1, int64_t(-1))), "ffffffff 4294967295 ffffffffffffffff");
-    EXPECT_EQ(text(format("%d %u", uint32_t(4000000000), uint64_t(-1))), "4000000000 18446744073709551615");
-    EXPECT_EQ(text(format("%d", INT64_MIN)), "-9223372036854775808");
+    const std::pair<P<IString>, const char*> cases[] = {
+        {format("100%% of %s, %d%%", "it", 5), "100% of it, 5%"},
+        {format("no field %%"), "no field %"},
+        {format("[%5s|%-5s|%.2s|%05s]", "abc", u"\u00E9", "abc", "x"), "[  abc|\xC3\xA9    |ab|    x]"},
+        {format("%c%C%3c", 'a', U'\u20AC', L'z'), "a\xE2\x82\xAC  z"},
+        {format("%*d|%-*d|%*d|%.*f", 4, 7, 4, 7, -4, 7, 2, 1.239), "   7|7   |7   |1.24"},
+        {format("%.*s|%.*s", 2, "abc", -1, "abc"), "ab|abc"}, // a negative precision counts as not given
+        {format("%.d|%.0x|%#.o", 0, 0, 0), "||0"},
+        {format("%x %u %x", -1, -1, int64_t(-1)), "ffffffff 4294967295 ffffffffffffffff"},
+        {format("%d %u", uint32_t(4000000000), uint64_t(-1)), "4000000000 18446744073709551615"},
+        {format("%d", INT64_MIN), "-9223372036854775808"},
+    };
+    for (const auto& [formatted, expected] : cases) EXPECT_EQ(tests::text(formatted), expected);
 }
 
 TEST(StringFormat, Result_IsInTheFormatsEncodingWhereThatHoldsIt) {
@@ -98,35 +99,26 @@ TEST(StringFormat, Result_IsInTheFormatsEncodingWhereThatHoldsIt) {
 }
 
 TEST(StringFormat, Errors_NameTheFormat) {
-    struct {
-        const char* format;
-        const char* error;
-    } bad[] = {
-        {"%-+0 #-d", "too many field flags specified in '%-+0 #-d'"},
-        {"a %y", "invalid format string in 'a %y'"},
-        {"%", "invalid format string in '%'"},
-        {"%5", "invalid format string in '%5'"},
-        {"%lld%lF", "invalid format string in '%lld%lF'"},
-        {"%99999999999d", "invalid format string in '%99999999999d'"},
+    const std::string invalid = "invalid format string in '";
+    const std::string mismatch = "argument does not match the field's format specification for '";
+    const std::pair<std::string, std::string> cases[] = {
+        {failure("%-+0 #-d", 1), "too many field flags specified in '%-+0 #-d'"},
+        {failure("a %y", 1), invalid + "a %y'"},
+        {failure("%", 1), invalid + "%'"},
+        {failure("%5", 1), invalid + "%5'"},
+        {failure("%lld%lF", 1), invalid + "%lld%lF'"},
+        {failure("%99999999999d", 1), invalid + "%99999999999d'"},
+        {failure("%d", "text"), mismatch + "%d'"},
+        {failure("text", 1), mismatch + "text'"},
+        {failure("%s", 1), "CStringFormat::doInt"},
+        {failure("%s", 1.0), "CStringFormat::doDouble"},
+        {failure("%d", "text"), "CStringFormat::doString"},
+        {failure("%d", 'c'), "CStringFormat::doChar"},
+        {failure("%*d", "text"), "expected integer value (field width) in '%*d'"},
+        {failure("%.*f", 1.0), "expected integer value (field precision) in '%.*f'"},
+        {tests::errorOf<CError>([] { format("%d %d", 1); }),
+         "CStringFormat: not all parameters have been pushed in yet."},
     };
-    for (auto& c : bad) EXPECT_NE(failure(c.format, 1).find(c.error), std::string::npos) << c.format;
+    for (const auto& [error, part] : cases) EXPECT_NE(error.find(part), std::string::npos) << error;
     EXPECT_NO_THROW(format("%-+0 #d", 1)) << "five flags pass";
-
-    std::string mismatch = "argument does not match the field's format spec";
-    mismatch += "ification for '";
-    EXPECT_NE(failure("%d", "text").find(mismatch + "%d'"), std::string::npos);
-    EXPECT_NE(failure("%s", 1).find("CStringFormat::doInt"), std::string::npos);
-    EXPECT_NE(failure("%s", 1.0).find("CStringFormat::doDouble"), std::string::npos);
-    EXPECT_NE(failure("%d", "text").find("CStringFormat::doString"), std::string::npos);
-    EXPECT_NE(failure("%d", 'c').find("CStringFormat::doChar"), std::string::npos);
-    EXPECT_NE(failure("text", 1).find(mismatch + "text'"), std::string::npos);
-    EXPECT_NE(failure("%*d", "text").find("expected integer value (field width) in '%*d'"),
-              std::string::npos);
-    EXPECT_NE(failure("%.*f", 1.0).find("expected integer value (field precision) in '%.*f'"),
-              std::string::npos);
-}
-
-TEST(StringFormat, TextTakenTooEarly_Throws) {
-    EXPECT_EQ(tests::errorOf<CError>([] { format("%d %d", 1); }),
-              "CStringFormat: not all parameters have been pushed in yet.");
 }

@@ -29,19 +29,12 @@ inline bool canEncode(const P<ICharEncoding>& encoding, const std::u32string& te
 
 // Bytes that the encoding's decoder skips anywhere between characters.
 inline std::string getNoise(const P<ICharEncoding>& encoding, std::mt19937& random) {
-    switch (encoding->getId()) {
-    case ICharEncoding::kUTF8: {
-        static const std::string kNoise[] = {"\xFF", "\xA9", "\xC0", "\xE0\xA0\x80", "\xF8\x88"};
-        return kNoise[random() % std::size(kNoise)];
-    }
-    case ICharEncoding::kUTF16:
-        return std::string("\x00\xDC", 2);
-    case ICharEncoding::kUTF32:
-        return std::string("\x00\x00\x11\x00", 4);
-    case ICharEncoding::kCodePage:
-        return "\xFF";
-    }
-    return {};
+    static const char* const kNoise[] = {"\xFF", "\xA9", "\xC0", "\xE0\xA0\x80", "\xF8\x88"};
+    const uint32_t id = encoding->getId();
+    if (id == ICharEncoding::kUTF8) return kNoise[random() % std::size(kNoise)];
+    if (id == ICharEncoding::kUTF16) return std::string("\x00\xDC", 2);
+    if (id == ICharEncoding::kUTF32) return std::string("\x00\x00\x11\x00", 4);
+    return id == ICharEncoding::kCodePage ? "\xFF" : "";
 }
 
 inline P<IString> encode(const P<ICharEncoding>& encoding, const std::u32string& text,

@@ -36,6 +36,7 @@ TEST(StringTokenizer, Tokens_MayBeEmptyOrSkipped) {
         {" a,,b ", {"", "a", "", "b", ""}, {"a", "b"}},
         {",", {"", ""}, {}},
     };
+    EXPECT_EQ(list(make<CStringTokenizerEnum>(nullptr, ",")).size(), 0u);
     for (auto& c : cases) {
         EXPECT_EQ(list(make<CStringTokenizerEnum>(newString(c.text), ", ")), c.all) << c.text;
         EXPECT_EQ(list(make<CStringTokenizerEnum>(newString(c.text), u", ", true)), c.filled) << c.text;
@@ -56,13 +57,11 @@ TEST(StringTokenizer, Lines_EndInThreeWays) {
         {u"a\n\rb", {"a", "", "b"}},
         {u"\u00E9\n\u20AC", {"\xC3\xA9", "\xE2\x82\xAC"}},
     };
+    // Lines of bytes that strings cannot decode are lines.
+    EXPECT_EQ(list(make<CStringLineTokenizerEnum>(make<CUTF8String>("\xFF\r\xFE\n\xFD"))),
+              (std::vector<std::string>{"\xFF", "\xFE", "\xFD"}));
     for (auto& c : cases) {
         EXPECT_EQ(list(make<CStringLineTokenizerEnum>(newString(c.text))), c.lines);
         EXPECT_EQ(list(make<CStringLineTokenizerEnum>(newString(c.text)->toUTF8String())), c.lines);
     }
-}
-
-TEST(StringTokenizer, MissingText_HasNoParts) {
-    EXPECT_FALSE(make<CStringLineTokenizerEnum>(nullptr)->hasMore());
-    EXPECT_FALSE(make<CStringTokenizerEnum>(nullptr, ",")->hasMore());
 }

@@ -21,82 +21,59 @@ P<IURI> uri(const std::string& bytes) {
 
 TEST(URI, TakesAFullURIApart) {
     const P<IURI> u = uri("http://user@host:8080/a/b?x=1#f");
-    EXPECT_EQ(str(u->getScheme()), "http");
-    EXPECT_EQ(str(u->getAuthority()), "user@host:8080");
-    EXPECT_EQ(str(u->getUserInfo()), "user");
-    EXPECT_EQ(str(u->getHost()), "host");
+    const std::pair<P<IString>, const char*> parts[] = {
+        {u->getScheme(), "http"},   {u->getAuthority(), "user@host:8080"},
+        {u->getUserInfo(), "user"}, {u->getHost(), "host"},
+        {u->getPath(), "/a/b"},     {u->getQuery(), "x=1"},
+        {u->getFragment(), "f"},    {u->getSchemeSpecificPart(), "//user@host:8080/a/b?x=1#f"}};
+    for (const auto& [part, expected] : parts) EXPECT_EQ(str(part), expected);
     EXPECT_EQ(u->getPort(), 8080);
-    EXPECT_EQ(str(u->getPath()), "/a/b");
-    EXPECT_EQ(str(u->getQuery()), "x=1");
-    EXPECT_EQ(str(u->getFragment()), "f");
-    EXPECT_EQ(str(u->getSchemeSpecificPart()), "//user@host:8080/a/b?x=1#f");
     EXPECT_TRUE(u->isHierarchical());
     EXPECT_FALSE(u->isRelative());
 }
 
 TEST(URI, OpaqueOnesKeepTheirRest) {
-    struct SCase {
-        const char *text, *scheme, *rest;
-    };
-    for (const SCase& c :
-         {SCase{"winresicon:shell32.dll,-1", "winresicon", "shell32.dll,-1"}, SCase{"C:\\x", "C", "\\x"},
-          SCase{"mailto:a?b#c d", "mailto", "a?b#c d"}, SCase{"file:", "file", ""}}) {
-        const P<IURI> u = uri(c.text);
-        EXPECT_FALSE(u->isHierarchical()) << c.text;
-        EXPECT_FALSE(u->isRelative()) << c.text;
-        EXPECT_EQ(str(u->getScheme()), c.scheme);
-        EXPECT_EQ(str(u->getSchemeSpecificPart()), c.rest);
-        EXPECT_FALSE(u->hasPath()) << c.text;
-        EXPECT_EQ(str(u), c.text);
+    const std::pair<std::string, std::string> cases[] = {
+        {"winresicon", "shell32.dll,-1"}, {"C", "\\x"}, {"mailto", "a?b#c d"}, {"file", ""}};
+    for (const auto& [scheme, rest] : cases) {
+        const P<IURI> u = uri(scheme + ":" + rest);
+        EXPECT_FALSE(u->isHierarchical() || u->isRelative() || u->hasPath() || u->getParent()) << scheme;
+        EXPECT_EQ(str(u->getScheme()), scheme);
+        EXPECT_EQ(str(u->getSchemeSpecificPart()), rest);
+        EXPECT_EQ(str(u), scheme + ":" + rest);
         EXPECT_THROW(u->appendPath("x"), CURIError);
         EXPECT_THROW(uri("x")->resolveAgainst(u), CURIError);
-        EXPECT_FALSE(u->getParent());
     }
 }
 
 // The composed form of each parsed text; parsing it again changes nothing.
 TEST(URI, ComposesWhatItParsed) {
-    struct SCase {
-        const char *text, *composed;
+    std::vector<std::pair<std::string, std::string>> cases = {
+        {"http://host:/x", "http://host/x"},
+        {"http://a@b@c/", "http://a%40b@c/"},
+        {"#a#b", "#a%23b"},
+        {"a b/c", "a%20b/c"},
+        {"x?a b?c", "x?a%20b?c"},
+        {"a%2fb%20%zz%", "a%2fb%20%25zz%25"},
+        {"/a/./b/../c", "/a/c"},
+        {"/../../a", "/a"},
+        {"/a/..", "/"},
+        {"/a/.", "/a/"},
+        {"a/../../b", "../b"},
+        {"..", "../"},
+        {".", ""},
+        {"http://h\xC3\xB6st/\xC3\xA4?\xC3\xA4#\xC3\xA4", "http://h%C3%B6st/%C3%A4?%C3%A4#%C3%A4"},
+        {"s\xC3\xA4:x\xC3\xA4", "s%C3%A4:x%C3%A4"},
     };
-    for (const SCase& c : {
-             SCase{"", ""},
-             {"file:///a/b.txt", "file:///a/b.txt"},
-             {"file://server/share/x", "file://server/share/x"},
-             {"file:/a", "file:/a"},
-             {"http://host", "http://host"},
-             {"http://host:/x", "http://host/x"},
-             {"http://[::1]:80/", "http://[::1]:80/"},
-             {"http://a@b@c/", "http://a%40b@c/"},
-             {"http://h?q", "http://h?q"},
-             {"http://h#f", "http://h#f"},
-             {"http://h/?", "http://h/?"},
-             {"http://h/#", "http://h/#"},
-             {"?a:b", "?a:b"},
-             {"#a#b", "#a%23b"},
-             {"//host/x", "//host/x"},
-             {":x", ":x"},
-             {"a b/c", "a%20b/c"},
-             {"x?a b?c", "x?a%20b?c"},
-             {"a%2fb%20%zz%", "a%2fb%20%25zz%25"},
-             {"/a/./b/../c", "/a/c"},
-             {"/../../a", "/a"},
-             {"/a/..", "/"},
-             {"/a/.", "/a/"},
-             {"a/../../b", "../b"},
-             {"..", "../"},
-             {".", ""},
-             {"./a:b", "./a:b"},
-             {".//a", ".//a"},
-             {"x:/.//a", "x:/.//a"},
-             {"file:////a//b//", "file:////a//b//"},
-             {"http://h\xC3\xB6st/\xC3\xA4?\xC3\xA4#\xC3\xA4", "http://h%C3%B6st/%C3%A4?%C3%A4#%C3%A4"},
-             {"s\xC3\xA4:x\xC3\xA4", "s%C3%A4:x%C3%A4"},
-         }) {
-        EXPECT_EQ(str(uri(c.text)), c.composed) << c.text;
-        EXPECT_EQ(str(uri(c.composed)), c.composed) << c.text;
-        EXPECT_TRUE(uri(c.text)->equals(uri(c.composed))) << c.text;
-        EXPECT_FALSE(uri(c.text)->equals(uri("x:y"))) << c.text;
+    for (const char* same : {"", "file:///a/b.txt", "file://server/share/x", "file:/a", "http://host",
+                             "http://[::1]:80/", "http://h?q", "http://h#f", "http://h/?", "http://h/#",
+                             "?a:b", "//host/x", ":x", "./a:b", ".//a", "x:/.//a", "file:////a//b//"})
+        cases.emplace_back(same, same);
+    for (const auto& [text, composed] : cases) {
+        EXPECT_EQ(str(uri(text)), composed) << text;
+        EXPECT_EQ(str(uri(composed)), composed) << text;
+        EXPECT_TRUE(uri(text)->equals(uri(composed))) << text;
+        EXPECT_FALSE(uri(text)->equals(uri("x:y"))) << text;
     }
 }
 
@@ -164,55 +141,45 @@ TEST(URI, NamesOfFiles) {
     }
 }
 
-struct SThree {
-    const char *first, *second, *result;
-};
-
-TEST(URI, AppendsBelowItself) {
-    for (const SThree& c : {
-             SThree{"file:///a", "b", "file:///a/b"},
-             {"file:///a/", "/b/", "file:///a/b/"},
-             {"file:///", "100% #1?.wav", "file:///100%25%20%231%3F.wav"},
-             {"http://h", "x", "http://h/x"},
-             {"http://h/a?q#f", "x", "http://h/a/x"},
-             {"", "x", "x"},
-             {"a", "../b", "b"},
-             {"file:///a", "", "file:///a"},
-         })
-        EXPECT_EQ(str(uri(c.first)->appendPath(c.second)), c.result) << c.first;
-}
-
-TEST(URI, MadeRelative) {
-    for (const SThree& c : {
-             SThree{"file:///a/b/c.txt", "file:///a/d/e.txt", "../b/c.txt"},
-             {"file:///a/b", "file:///a/b/c", "../b"},
-             {"file:///a/b/", "file:///a/b/c", ""},
-             {"file:///a/b/", "file:///a/c", "b/"},
-             {"file:///a/c:d", "file:///a/x", "./c:d"},
-             {"file:///x/y", "file:///a/b", "file:///x/y"}, // nothing in common
-             {"file:///a/b", "http://h/a/b", "file:///a/b"},
-             {"http://h/a/b", "http://g/a/c", "http://h/a/b"},
-             {"http://h/a/b?q#f", "http://h/a/c", "b?q#f"},
-             {"a/b", "file:///a/c", "a/b"},
-         })
-        EXPECT_EQ(str(uri(c.first)->makeRelativeTo(uri(c.second))), c.result)
-            << c.first << " to " << c.second;
-}
-
-TEST(URI, Resolved) {
-    for (const SThree& c : {
-             SThree{"../x", "file:///a/b/c", "file:///a/x"},
-             {"../../../x", "file:///a/b", "file:///x"},
-             {"", "file:///a/b", "file:///a/"},
-             {"x", "http://h", "http://h/x"},
-             {"/x", "http://h/a/b", "http://h/x"},
-             {"//g/x", "http://h/a", "http://g/x"},
-             {"http://g/x", "http://h/a", "http://g/x"},
-             {"x?q#f", "http://u@h:1/a/b?r", "http://u@h:1/a/x?q#f"},
-             {"../x", "a/b", "x"},
-         })
-        EXPECT_EQ(str(uri(c.first)->resolveAgainst(uri(c.second))), c.result)
-            << c.first << " at " << c.second;
+TEST(URI, AppendedMadeRelativeAndResolved) {
+    using Operation = P<IURI> (*)(const P<IURI>&, const char*);
+    const Operation append = [](const P<IURI>& u, const char* path) { return u->appendPath(path); };
+    const Operation shorten = [](const P<IURI>& u, const char* base) { return u->makeRelativeTo(uri(base)); };
+    const Operation resolve = [](const P<IURI>& u, const char* base) { return u->resolveAgainst(uri(base)); };
+    const struct {
+        Operation operation;
+        const char *first, *second, *result;
+    } cases[] = {
+        {append, "file:///a", "b", "file:///a/b"},
+        {append, "file:///a/", "/b/", "file:///a/b/"},
+        {append, "file:///", "100% #1?.wav", "file:///100%25%20%231%3F.wav"},
+        {append, "http://h", "x", "http://h/x"},
+        {append, "http://h/a?q#f", "x", "http://h/a/x"},
+        {append, "", "x", "x"},
+        {append, "a", "../b", "b"},
+        {append, "file:///a", "", "file:///a"},
+        {shorten, "file:///a/b/c.txt", "file:///a/d/e.txt", "../b/c.txt"},
+        {shorten, "file:///a/b", "file:///a/b/c", "../b"},
+        {shorten, "file:///a/b/", "file:///a/b/c", ""},
+        {shorten, "file:///a/b/", "file:///a/c", "b/"},
+        {shorten, "file:///a/c:d", "file:///a/x", "./c:d"},
+        {shorten, "file:///x/y", "file:///a/b", "file:///x/y"}, // nothing in common
+        {shorten, "file:///a/b", "http://h/a/b", "file:///a/b"},
+        {shorten, "http://h/a/b", "http://g/a/c", "http://h/a/b"},
+        {shorten, "http://h/a/b?q#f", "http://h/a/c", "b?q#f"},
+        {shorten, "a/b", "file:///a/c", "a/b"},
+        {resolve, "../x", "file:///a/b/c", "file:///a/x"},
+        {resolve, "../../../x", "file:///a/b", "file:///x"},
+        {resolve, "", "file:///a/b", "file:///a/"},
+        {resolve, "x", "http://h", "http://h/x"},
+        {resolve, "/x", "http://h/a/b", "http://h/x"},
+        {resolve, "//g/x", "http://h/a", "http://g/x"},
+        {resolve, "http://g/x", "http://h/a", "http://g/x"},
+        {resolve, "x?q#f", "http://u@h:1/a/b?r", "http://u@h:1/a/x?q#f"},
+        {resolve, "../x", "a/b", "x"},
+    };
+    for (const auto& c : cases)
+        EXPECT_EQ(str(c.operation(uri(c.first), c.second)), c.result) << c.first << " and " << c.second;
 }
 
 TEST(URI, RelativeFormResolvesBack) {
