@@ -113,19 +113,18 @@ const P<CSingle>& getPinned() {
     return pinned.get(key, createSingle<'p'>);
 }
 
-std::optional<tests::CRival> g_rival;
+std::optional<tests::CRivals> g_rivals;
 
 // Requests the pinned singleton while a second thread, which requested it first, waits for the factory.
 P<CSingle> createWithRival() {
-    g_rival.emplace([] { getPinned(); });
-    EXPECT_TRUE(g_rival->isBlocked());
+    g_rivals.emplace().expectBlocked({[] { getPinned(); }});
     getPinned();
     return createSingle<'r'>();
 }
 
 TEST_F(GlobalObjFactory, PinsForSeveralThreadsAtOnce) {
     getSingle<'r', createWithRival>();
-    g_rival.reset();
+    g_rivals.reset();
     EXPECT_EQ(g_made, 2);
     CGlobalObjFactory::shutdown();
     EXPECT_EQ(g_deaths, "r") << "what is pinned stays";

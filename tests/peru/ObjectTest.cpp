@@ -1,8 +1,7 @@
 #include "peru/Errors.h"
 #include "peru/IInterfaceQuery.h"
 #include "peru/collections/FrailArray.h"
-
-#include <gtest/gtest.h>
+#include "support/Files.h"
 
 #include <functional>
 #include <thread>
@@ -97,18 +96,10 @@ TEST(Handle, RefusesAnInterfaceThatTheObjectLacks) {
     {
         P<IBase> object = make<CProbe>(destroyed);
         EXPECT_EQ(P<INamed>(object)->getNumber(), 7);
-        EXPECT_FALSE(P<IOther>(P<INamed>()));
-        EXPECT_FALSE(tryCast<IOther>(object));
-        try {
-            P<IOther> other(object);
-            FAIL();
-        } catch (const CCastError& error) {
-            EXPECT_TRUE(
-                error.getDescription()->equals("Error casting a 'peru::(anonymous namespace)::CProbe' "
-                                               "object to 'peru::(anonymous namespace)::IOther'"));
-            EXPECT_TRUE(error.getTitle()->equals("Cast error"));
-            EXPECT_EQ(error.getObject(), object);
-        }
+        EXPECT_FALSE(P<IOther>(P<INamed>()) || tryCast<IOther>(object));
+        EXPECT_EQ(tests::errorOf<CCastError>([&] { P<IOther> other(object); }),
+                  "Error casting a 'peru::(anonymous namespace)::CProbe' object to "
+                  "'peru::(anonymous namespace)::IOther'");
         EXPECT_EQ(destroyed, 0);
     }
     EXPECT_EQ(destroyed, 1);

@@ -1,34 +1,42 @@
-// A second thread that competes for a lock.
+// Threads that compete for a lock.
 #pragma once
+
+#include <gtest/gtest.h>
 
 #include <atomic>
 #include <chrono>
 #include <functional>
+#include <list>
 #include <thread>
 
 namespace tests {
 
-// Runs the operation on a thread of its own, which ends with this object at the latest.
-class CRival {
+// The threads end with this object at the latest.
+class CRivals {
 public:
-    explicit CRival(std::function<void()> operation)
-        : m_thread([this, operation = std::move(operation)] {
-              operation();
-              m_done = true;
-          }) {}
-    ~CRival() { m_thread.join(); }
-    CRival(const CRival&) = delete;
-    CRival& operator=(const CRival&) = delete;
+    ~CRivals() {
+        for (SRival& rival : m_rivals) rival.thread.join();
+    }
 
-    // For a caller that holds the lock: true if the operation waits for it.
-    bool isBlocked() const {
-        std::this_thread::sleep_for(std::chrono::milliseconds(30));
-        return !m_done;
+    // For a caller that holds the lock: runs each operation on a thread of its own and expects it to wait.
+    void expectBlocked(std::initializer_list<std::function<void()>> operations) {
+        for (const auto& operation : operations) {
+            SRival& rival = m_rivals.emplace_back();
+            rival.thread = std::thread([operation, &rival] {
+                operation();
+                rival.done = true;
+            });
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        for (const SRival& rival : m_rivals) EXPECT_FALSE(rival.done);
     }
 
 private:
-    std::atomic<bool> m_done{false};
-    std::thread m_thread;
+    struct SRival {
+        std::thread thread;
+        std::atomic<bool> done{false};
+    };
+    std::list<SRival> m_rivals;
 };
 
 } // namespace tests

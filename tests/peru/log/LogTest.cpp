@@ -8,7 +8,6 @@
 #include "support/TempFolder.h"
 
 #include <ctime>
-#include <list>
 
 using namespace peru;
 using namespace peru::literals;
@@ -115,16 +114,13 @@ TEST_F(TextFileLog, Line_HasItsExactForm) {
 }
 
 TEST_F(TextFileLog, LevelBelowTheMinimum_IsNotWritten) {
-    for (const auto& [minimum, level, shown] : {std::tuple(3, 4, true),
-                                                {4, 4, true},
-                                                {5, 4, false},
-                                                {5, 6, true},
-                                                {7, 6, false},
-                                                {0, -1, false},
-                                                {-1, -1, true}}) {
-        log->setMinimumLevel(minimum);
-        EXPECT_EQ(!written({level, nullptr, "x"_s, {}, kTime}).empty(), shown) << minimum << " " << level;
-    }
+    const std::vector<std::vector<int32_t>> cases[] = {{{3, 4}, {4, 4}, {5, 6}, {-1, -1}},
+                                                       {{5, 4}, {7, 6}, {0, -1}}};
+    for (int hidden : {0, 1})
+        for (const auto& levels : cases[hidden]) {
+            log->setMinimumLevel(levels[0]);
+            EXPECT_EQ(written({levels[1], nullptr, "x"_s, {}, kTime}).empty(), hidden == 1) << levels[1];
+        }
 }
 
 TEST_F(TextFileLog, Areas_IndentAndComeBackToZero) {
@@ -183,13 +179,11 @@ TEST_F(TextFileLog, File_IsAppendedToAndFlushed) {
 }
 
 TEST_F(TextFileLog, EveryOperation_WaitsForARunningWrite) {
-    std::list<tests::CRival> rivals;
+    tests::CRivals rivals;
     stream->onWrite = [&] {
         stream->onWrite = nullptr;
-        rivals.emplace_back([&] { log->info(nullptr, "y"); });
-        rivals.emplace_back([&] { log->enterArea("a"_s); });
-        rivals.emplace_back([&] { log->leaveArea("a"_s); });
-        for (const tests::CRival& rival : rivals) EXPECT_TRUE(rival.isBlocked());
+        rivals.expectBlocked({[&] { log->info(nullptr, "y"); }, [&] { log->enterArea("a"_s); },
+                              [&] { log->leaveArea("a"_s); }});
     };
     log->info(nullptr, "x");
 }
@@ -300,14 +294,11 @@ TEST_F(LogManager, SinksThatComeAndGoDuringACall_LeaveTheOthersAlone) {
 
 TEST_F(LogManager, EveryOperation_WaitsForARunningCall) {
     P<CMemoryLog> log = addLog("", nullptr);
-    std::list<tests::CRival> rivals;
+    tests::CRivals rivals;
     log->onCall = [&] {
         log->onCall = nullptr;
-        rivals.emplace_back([&] { manager->addLog(log, "s"_s); });
-        rivals.emplace_back([&] { manager->removeLog(log, "none"_s); });
-        rivals.emplace_back([&] { manager->error(nullptr, "x"); });
-        rivals.emplace_back([&] { manager->enterArea("a"_s); });
-        for (const tests::CRival& rival : rivals) EXPECT_TRUE(rival.isBlocked());
+        rivals.expectBlocked({[&] { manager->addLog(log, "s"_s); }, [&] { manager->removeLog(log, "s"_s); },
+                              [&] { manager->error(nullptr, "x"); }, [&] { manager->enterArea("a"_s); }});
     };
     manager->info(nullptr, "x");
 }

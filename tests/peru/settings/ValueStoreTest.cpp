@@ -97,12 +97,10 @@ TEST(ValueStore, remove_LeavesTheRest) {
     store->setInt("a", "b", 1);
     store->setInt("a/b", "c", 2); // a section of the same name
     store->setInt("a", "d", 3);
-    store->removeValue("a", "b");
+    for (const char* name : {"b", "none"}) store->removeValue("a", name);
     EXPECT_FALSE(store->hasValue("a", "b"));
     EXPECT_EQ(store->getInt("a/b", "c", 0), 2);
-    store->removeValue("a", "none");
-    store->removeSection("none/none");
-    store->removeSection("a");
+    for (const char* section : {"none/none", "a"}) store->removeSection(section);
     EXPECT_FALSE(store->hasSection("a"));
     store->setInt("x", "y", 1);
     store->removeSection("");

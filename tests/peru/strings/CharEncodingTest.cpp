@@ -85,32 +85,34 @@ TEST(CharEncoding, Directions_Agree) {
             std::u32string forward, backward, bulk;
             std::vector<int32_t> starts, backStarts;
             char32_t ch;
-            for (int32_t pos = 0; (pos = encoding->findValidChar(raw(bytes), sizeOf(bytes), pos)) >= 0;) {
+            const uint8_t* data = raw(bytes);
+            const int32_t size = sizeOf(bytes);
+            for (int32_t pos = 0; (pos = encoding->findValidChar(data, size, pos)) >= 0;) {
                 starts.push_back(pos);
-                pos = encoding->decodeChar(ch, raw(bytes), sizeOf(bytes), pos);
+                pos = encoding->decodeChar(ch, data, size, pos);
                 ASSERT_GT(pos, starts.back());
                 forward.push_back(ch);
             }
             for (int32_t pos = sizeOf(bytes);
-                 (pos = encoding->decodePrevValidChar(ch, raw(bytes), sizeOf(bytes), pos)) >= 0;) {
+                 (pos = encoding->decodePrevValidChar(ch, data, size, pos)) >= 0;) {
                 backward.insert(backward.begin(), ch);
                 backStarts.insert(backStarts.begin(), pos);
             }
             ASSERT_EQ(forward, backward) << encoding->getName() << testing::PrintToString(bytes);
             ASSERT_EQ(starts, backStarts);
-            ASSERT_EQ(encoding->countChars(raw(bytes), sizeOf(bytes), 0), int32_t(forward.size()));
+            ASSERT_EQ(encoding->countChars(data, size, 0), int32_t(forward.size()));
             char32_t chars[3];
             int32_t offsets[3];
             int32_t count = 0;
             for (int32_t pos = 0; pos >= 0;) {
-                pos = encoding->decodeChars(chars, 3, count, raw(bytes), sizeOf(bytes), pos, offsets);
+                pos = encoding->decodeChars(chars, 3, count, data, size, pos, offsets);
                 for (int32_t i = 0; i < count; ++i) ASSERT_EQ(offsets[i], starts[bulk.size() + size_t(i)]);
                 bulk.append(chars, size_t(count));
             }
             ASSERT_EQ(forward, bulk);
             for (size_t i = 0; i < starts.size(); ++i)
-                ASSERT_EQ(encoding->advance(raw(bytes), sizeOf(bytes), int32_t(i)), starts[i]);
-            ASSERT_EQ(encoding->advance(raw(bytes), sizeOf(bytes), int32_t(starts.size())), -1);
+                ASSERT_EQ(encoding->advance(data, size, int32_t(i)), starts[i]);
+            ASSERT_EQ(encoding->advance(data, size, int32_t(starts.size())), -1);
         }
     }
 }
