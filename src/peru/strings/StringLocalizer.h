@@ -7,6 +7,7 @@
 
 namespace peru {
 
+// Asks its parent with its own mutex held: the lock order is child, then parent.
 class PERU_API CStringLocalizer : public CObject, public IStringLocalizer {
 public:
     CStringLocalizer();
