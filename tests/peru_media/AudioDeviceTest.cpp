@@ -1,35 +1,53 @@
-// The states of devices, tested with a private sound server.
+// The states of devices and real sound, tested with a private sound server.
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
 #include "peru/media/Errors.h"
 #include "peru/media/ISystem.h"
 #include "peru/streams/MemoryIOStream.h"
 #include "peru/uri/IURI.h"
+#include "support/Files.h"
 #include "support/SoundServer.h"
-
-#include <gtest/gtest.h>
 
 #include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <cstdlib>
-#include <filesystem>
 #include <functional>
-#include <iterator>
 #include <limits>
-#include <string>
+#include <mutex>
+#include <random>
 #include <thread>
 
 using namespace peru;
 using namespace peru::media;
+using tests::countEntries;
 using tests::CSoundServer;
+using tests::errorOf;
+using tests::text;
 
 namespace {
 
 using Clock = std::chrono::steady_clock;
+constexpr size_t kFrameBytes = CSoundServer::kFrameBytes;
+
+template <class Condition> bool waitFor(Condition condition) {
+    const auto end = Clock::now() + std::chrono::seconds(60);
+    while (!condition() && Clock::now() < end) std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    return condition();
+}
+
+// Without silent frames: a busy machine may leave gaps.
+std::string withoutSilence(const std::string& samples, size_t from = 0) {
+    static const std::string kSilence(kFrameBytes, '\0');
+    std::string sound;
+    for (size_t at = from; at + kFrameBytes <= samples.size(); at += kFrameBytes)
+        if (samples.compare(at, kFrameBytes, kSilence) != 0) sound.append(samples, at, kFrameBytes);
+    return sound;
+}
 
 class AudioDevice : public testing::Test {
 protected:
+    explicit AudioDevice(tests::EMicrophone microphone = tests::EMicrophone::none) : server(microphone) {}
     ~AudioDevice() override {
         out = nullptr;
         in = nullptr;
@@ -39,57 +57,54 @@ protected:
     static P<CAudioFormat> makeFormat(int32_t bits = 16, int32_t channels = 2) {
         return make<CAudioFormat>(CSoundServer::kRate, channels, bits);
     }
-    template <class Condition> static bool waitFor(Condition condition) {
-        const auto end = Clock::now() + std::chrono::seconds(60);
-        while (!condition() && Clock::now() < end) std::this_thread::sleep_for(std::chrono::milliseconds(1));
-        return condition();
+    static std::string makeNoise(double seconds) {
+        std::string noise(static_cast<size_t>(seconds * CSoundServer::kRate) * kFrameBytes, '\0');
+        std::mt19937 random(7);
+        for (char& byte : noise) byte = static_cast<char>(random() | 1); // never silent
+        return noise;
     }
-
-    // What was played from an offset on, without silence: a busy machine may leave gaps.
-    static std::string getSound(const tests::CProcess& ears, size_t from = 0) {
-        static const std::string kSilence(4, '\0');
-        const std::string all = ears.readOut();
-        std::string sound;
-        for (size_t i = from; i + 4 <= all.size(); i += 4)
-            if (all.compare(i, 4, kSilence) != 0) sound.append(all, i, 4);
-        return sound;
-    }
+    void write(const std::string& sound) { out->write(sound.data(), static_cast<int64_t>(sound.size())); }
 
     CSoundServer server;
     P<IAudioOutDevice> out = getSystem()->getDefaultOutDevice();
     P<IAudioInDevice> in = getSystem()->getDefaultInDevice();
 };
 
-// Counts calls. The limit is the number of blocks that it accepts.
-class CNote : public CObject, public IAudioInDeviceListener {
+class Microphone : public AudioDevice {
+protected:
+    Microphone() : AudioDevice(tests::EMicrophone::isolated) {}
+};
+
+// Records what it receives, up to a number of blocks.
+class CEars : public CObject, public IAudioInDeviceListener {
 public:
-    explicit CNote(int limit = std::numeric_limits<int>::max()) : m_limit(limit) {}
-    bool onAudioData(const void*, int64_t) override {
+    explicit CEars(int limit = std::numeric_limits<int>::max()) : m_limit(limit) {}
+    bool onAudioData(const void* data, int64_t size) override {
         if (onBlock) onBlock();
+        std::lock_guard lock(m_mutex);
+        m_heard.append(static_cast<const char*>(data), static_cast<size_t>(size));
         return ++blocks < m_limit;
     }
-    void onVolume(const P<CVolumeInfo>&) override { ++volumes; }
+    void onVolume(const P<CVolumeInfo>& volume) override {
+        ++volumes;
+        if (volume->getLeft() <= loudest) return;
+        loudest = volume->getLeft();
+        loudestRight = volume->getRight();
+    }
+    std::string getHeard() const {
+        std::lock_guard lock(m_mutex);
+        return m_heard;
+    }
+
     std::function<void()> onBlock;
-    std::atomic<int> blocks{0};
-    std::atomic<int> volumes{0};
+    std::atomic<int> blocks{0}, volumes{0};
+    std::atomic<double> loudest{0}, loudestRight{0};
 
 private:
     const int m_limit;
+    mutable std::mutex m_mutex;
+    std::string m_heard;
 };
-
-size_t count(const char* folder) {
-    const std::filesystem::directory_iterator entries(folder);
-    return static_cast<size_t>(std::distance(begin(entries), end(entries)));
-}
-
-std::string getMessage(const std::function<void()>& call) {
-    try {
-        call();
-    } catch (const CMediaException& e) {
-        return e.what();
-    }
-    return "";
-}
 
 } // namespace
 
@@ -102,20 +117,15 @@ TEST_F(AudioDevice, IsListedAndFindsFormats) {
     EXPECT_TRUE(out->getId()->equals("0"));
     const struct {
         int32_t rate, bytes, channels;
-        int32_t foundRate, foundBits, foundChannels;
-    } cases[] = {{44100, 2, 2, 44100, 16, 2},
-                 {48000, 3, 1, 48000, 24, 1},
-                 {44100, 1, 1, 44100, 8, 1},
-                 {44100, 4, 2, 44100, 32, 2},
-                 {100, 2, 2, 8000, 16, 2}};
+        const char* found;
+    } cases[] = {{44100, 2, 2, "Sample Rate: 44100 Channel: 2 Bits: 16"},
+                 {48000, 3, 1, "Sample Rate: 48000 Channel: 1 Bits: 24"},
+                 {44100, 4, 2, "Sample Rate: 44100 Channel: 2 Bits: 32"},
+                 {100, 1, 2, "Sample Rate: 8000 Channel: 2 Bits: 8"}};
     for (const auto& each : cases)
-        for (const P<IAudioDevice>& device : {P<IAudioDevice>(out), P<IAudioDevice>(in)}) {
-            const P<CAudioFormat> found = device->getFormat(each.rate, each.bytes, each.channels);
-            ASSERT_TRUE(found);
-            EXPECT_EQ(found->getSampleRate(), each.foundRate);
-            EXPECT_EQ(found->getBitsPerSample(), each.foundBits);
-            EXPECT_EQ(found->getChannelCount(), each.foundChannels);
-        }
+        for (const P<IAudioDevice>& device : {P<IAudioDevice>(out), P<IAudioDevice>(in)})
+            EXPECT_EQ(text(device->getFormat(each.rate, each.bytes, each.channels)->getDescription()),
+                      each.found);
 }
 
 TEST_F(AudioDevice, ComesAndGoesWithoutARestart) {
@@ -137,7 +147,7 @@ TEST_F(AudioDevice, ComesAndGoesWithoutARestart) {
     EXPECT_TRUE(getSystem()->getDefaultOutDevice()->getId()->equals("1"));
     std::ofstream(path) << before;
     EXPECT_TRUE(waitFor([&] { return count() == 1; }));
-    EXPECT_EQ(getMessage([&] { added->open(makeFormat()); }),
+    EXPECT_EQ(errorOf([&] { added->open(makeFormat()); }),
               "The sound device 'aaa' is not available any more");
     EXPECT_FALSE(added->isOpened());
     EXPECT_NO_THROW(out->open(makeFormat()));
@@ -154,11 +164,11 @@ TEST_F(AudioDevice, RefusesWhatItsStateForbids) {
     EXPECT_EQ(out->getPosition(), 0.0);
     for (int32_t bits : {32, 0, 12}) {
         const std::string expected = std::to_string(bits) + " Bits are not supported";
-        EXPECT_EQ(getMessage([&] { out->open(makeFormat(bits)); }), expected);
-        EXPECT_EQ(getMessage([&] { in->open(makeFormat(bits)); }), expected);
+        EXPECT_EQ(errorOf([&] { out->open(makeFormat(bits)); }), expected);
+        EXPECT_EQ(errorOf([&] { in->open(makeFormat(bits)); }), expected);
     }
-    EXPECT_EQ(getMessage([&] { out->open(makeFormat(16, 1000)); }), "Invalid number of channels");
-    EXPECT_EQ(getMessage([&] { in->open(make<CAudioFormat>(5, 2, 16)); }), "Invalid sample rate");
+    EXPECT_EQ(errorOf([&] { out->open(makeFormat(16, 1000)); }), "Invalid number of channels");
+    EXPECT_EQ(errorOf([&] { in->open(make<CAudioFormat>(5, 2, 16)); }), "Invalid sample rate");
     EXPECT_FALSE(out->isOpened() || in->isOpened());
 
     // The device still works, and can be opened again after close.
@@ -194,25 +204,40 @@ TEST_F(AudioDevice, IsStoppedAtOnceWhileItWaitsForData) {
     }
 }
 
-TEST_F(AudioDevice, PlaysAllOfWhatComesLate) {
-    std::string sound;
-    for (int i = 0; i < 22050; ++i) sound += {char(i | 1), char(i >> 8), char(i | 1), char(i >> 8)};
+TEST_F(AudioDevice, PlaysEverySampleOfWhatComesLateAcrossAPause) {
+    const std::string noise = makeNoise(1.5);
+    const auto ears = server.listen();
     out->open(makeFormat());
     out->start();
-    const auto ears = server.listen();
     // Until one wait of the callback has timed out.
-    ASSERT_TRUE(waitFor([&] { return ears->readOut().size() > size_t{4} * CSoundServer::kRate * 7 / 10; }));
+    ASSERT_TRUE(waitFor([&] { return ears->readOut().size() > kFrameBytes * CSoundServer::kRate * 7 / 10; }));
     EXPECT_EQ(out->getPosition(), 0.0);
-    out->write(sound.data(), static_cast<int64_t>(sound.size()));
-    EXPECT_TRUE(waitFor([&] { return getSound(*ears).size() >= sound.size(); }));
-    EXPECT_TRUE(getSound(*ears) == sound);
-    EXPECT_TRUE(waitFor([&] { return out->getPosition() >= 0.5 - 1e-6; }));
+    write(noise);
+    ASSERT_TRUE(waitFor([&] { return out->getPosition() > 0.5; }));
+    out->pause();
+    EXPECT_EQ(out->getStatus(), kDeviceIdle);
+    const int64_t queued = out->getQueuedSize();
+    EXPECT_GT(queued, 0);
+    // The position advances to the end of what the system has buffered, and no further.
+    double still = -1;
+    ASSERT_TRUE(waitFor([&] {
+        const double before = std::exchange(still, out->getPosition());
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        return before == still;
+    }));
+    EXPECT_LE(still,
+              static_cast<double>(noise.size() - static_cast<size_t>(queued)) / kFrameBytes / 44100 + 1e-6);
+    out->start();
+    ASSERT_TRUE(waitFor([&] { return out->getPosition() >= 1.5 - 1e-6; }));
+    ASSERT_TRUE(waitFor([&] { return withoutSilence(ears->readOut()).size() >= noise.size(); }));
+    out->close();
+    EXPECT_TRUE(withoutSilence(ears->readOut()) == noise);
 }
 
 TEST_F(AudioDevice, DropsTheQueueWhenStopped) {
-    const std::string noise(10 * CSoundServer::kRate * 4, '\x11');
+    const std::string noise = makeNoise(10);
     out->open(makeFormat());
-    out->write(noise.data(), static_cast<int64_t>(noise.size()));
+    write(noise);
     out->start();
     ASSERT_TRUE(waitFor([&] { return out->getPosition() > 0.1; }));
     out->stop();
@@ -259,9 +284,9 @@ TEST_F(AudioDevice, PlaysEveryWidthWithGain) {
         // Once from the queue and once from a stream.
         out->setGain(each.gain);
         out->open(makeFormat(each.bits));
-        out->write(sound.data(), static_cast<int64_t>(sound.size()));
+        write(sound);
         out->start();
-        EXPECT_TRUE(waitFor([&] { return isHeard(getSound(*ears)); }));
+        EXPECT_TRUE(waitFor([&] { return isHeard(withoutSilence(ears->readOut())); }));
         out->close();
 
         const size_t heard = ears->readOut().size() / 4 * 4;
@@ -271,7 +296,7 @@ TEST_F(AudioDevice, PlaysEveryWidthWithGain) {
         out->open(makeFormat(each.bits), source);
         EXPECT_THROW(out->write(sound.data(), 4), CMediaException);
         out->start();
-        EXPECT_TRUE(waitFor([&] { return isHeard(getSound(*ears, heard)); }));
+        EXPECT_TRUE(waitFor([&] { return isHeard(withoutSilence(ears->readOut(), heard)); }));
         EXPECT_TRUE(waitFor([&] { return out->getPosition() >= 0.1 - 1e-6; }));
         EXPECT_EQ(out->getStatus(), kDeviceRunning); // it never stops by itself
         out->close();
@@ -279,9 +304,9 @@ TEST_F(AudioDevice, PlaysEveryWidthWithGain) {
 }
 
 TEST_F(AudioDevice, TellsListenersInTurnUntilOneHasEnough) {
-    const P<CNote> first = make<CNote>(), second = make<CNote>(3), third = make<CNote>();
-    const P<CNote> gone = make<CNote>();
-    for (const P<CNote>& note : {first, gone, second, third}) in->addListener(note.get());
+    const P<CEars> first = make<CEars>(), second = make<CEars>(3), third = make<CEars>();
+    const P<CEars> gone = make<CEars>();
+    for (const P<CEars>& note : {first, gone, second, third}) in->addListener(note.get());
     in->removeListener(gone.get());
     in->open(makeFormat());
     in->start();
@@ -299,7 +324,7 @@ TEST_F(AudioDevice, TellsListenersInTurnUntilOneHasEnough) {
     in->start();
     EXPECT_TRUE(waitFor([&] { return in->getStatus() == kDeviceIdle; }));
     EXPECT_EQ(first->blocks, 3);
-    for (const P<CNote>& note : {second, third}) in->removeListener(note.get());
+    for (const P<CEars>& note : {second, third}) in->removeListener(note.get());
 
     // It can be started again.
     first->onBlock = nullptr;
@@ -310,7 +335,7 @@ TEST_F(AudioDevice, TellsListenersInTurnUntilOneHasEnough) {
 }
 
 TEST_F(AudioDevice, LetsListenersAskAndLeaveWhileItRecords) {
-    const P<CNote> keen = make<CNote>(), brief = make<CNote>();
+    const P<CEars> keen = make<CEars>(), brief = make<CEars>();
     keen->onBlock = [&] { static_cast<void>(in->getPosition() + in->getStatus()); };
     bool present = true;
     brief->onBlock = [&] { EXPECT_TRUE(present); };
@@ -343,9 +368,78 @@ TEST_F(AudioDevice, LeavesNothingBehind) {
         microphone->start();
     };
     use();
-    const size_t files = count("/proc/self/fd");
-    const size_t threads = count("/proc/self/task");
+    const size_t files = countEntries("/proc/self/fd");
+    const size_t threads = countEntries("/proc/self/task");
     for (int i = 0; i < 50; ++i) use();
-    EXPECT_EQ(count("/proc/self/fd"), files);
-    EXPECT_EQ(count("/proc/self/task"), threads);
+    EXPECT_EQ(countEntries("/proc/self/fd"), files);
+    EXPECT_EQ(countEntries("/proc/self/task"), threads);
+}
+
+TEST_F(Microphone, RecordsEverySample) {
+    const std::string noise = makeNoise(1.5);
+    const P<CEars> ears = make<CEars>();
+    in->addListener(ears.get());
+    in->open(makeFormat());
+    in->start();
+    ASSERT_TRUE(waitFor([&] { return ears->blocks > 0; }));
+    EXPECT_EQ(server.play(noise)->wait().exitCode, 0);
+    ASSERT_TRUE(waitFor([&] { return withoutSilence(ears->getHeard()).size() >= noise.size(); }));
+    EXPECT_NE(ears->getHeard().find(noise), std::string::npos);
+    EXPECT_GT(in->getPosition(), 1.4);
+    in->close();
+    in->removeListener(ears.get());
+}
+
+TEST_F(Microphone, RecordsEightBitsWithGainAndLevels) {
+    const P<CEars> ears = make<CEars>();
+    in->addListener(ears.get());
+    in->setGain(2.0);
+    in->open(makeFormat(8));
+    in->start();
+    std::string sound;
+    for (int i = 0; i < CSoundServer::kRate; ++i)
+        sound += std::string("\0\x10\0\xD0", 4); // 16 and -48 of 128
+    const auto player = server.play(sound);
+    const std::string expected{"\xA0\x20\xA0\x20\xA0\x20"}; // unsigned, twice as loud
+    EXPECT_TRUE(waitFor(
+        [&] { return ears->getHeard().find(expected) != std::string::npos && ears->loudestRight > 0; }));
+    EXPECT_NEAR(ears->loudest, 32 / 127.0, 1e-9);
+    EXPECT_NEAR(ears->loudestRight, 96 / 127.0, 1e-9);
+    in->close();
+    in->removeListener(ears.get());
+}
+
+TEST_F(AudioDevice, TellsThatItHasGone) {
+    const P<IAudioOutDevice> paused = getSystem()->getDefaultOutDevice();
+    const P<IAudioOutDevice> unopened = getSystem()->getDefaultOutDevice();
+    const P<CEars> ears = make<CEars>();
+    in->addListener(ears.get());
+    in->open(makeFormat());
+    in->start();
+    out->open(makeFormat());
+    write(makeNoise(10));
+    out->start();
+    paused->open(makeFormat());
+    paused->start();
+    paused->pause();
+    ASSERT_TRUE(waitFor([&] { return out->getPosition() > 0.1 && ears->blocks > 0; }));
+    server.kill();
+    EXPECT_TRUE(waitFor([&] { return out->getStatus() == kDeviceIdle && in->getStatus() == kDeviceIdle; }));
+    EXPECT_THROW(out->getPosition(), CMediaException);
+    EXPECT_TRUE(waitFor([&] {
+        try {
+            paused->getPosition();
+            return false;
+        } catch (const CMediaException&) {
+            return true;
+        }
+    }));
+    EXPECT_NO_THROW(paused->stop());
+    EXPECT_THROW(write("1234"), CMediaException);
+    out->close();
+    in->close();
+    in->removeListener(ears.get());
+    EXPECT_THROW(unopened->open(makeFormat()), CMediaException);
+    EXPECT_THROW(in->open(makeFormat()), CMediaException);
+    EXPECT_FALSE(out->isOpened() || in->isOpened() || unopened->isOpened());
 }

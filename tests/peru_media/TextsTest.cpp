@@ -34,11 +34,6 @@ TEST(SoundEngine, IsNotLoadedAtStartUp) {
     EXPECT_EQ(libraries.find("libportaudio"), std::string::npos);
 }
 
-TEST(AudioFormat, DescribesItself) {
-    EXPECT_TRUE(
-        make<CAudioFormat>(44100, 2, 16)->getDescription()->equals("Sample Rate: 44100 Channel: 2 Bits: 16"));
-}
-
 TEST(MediaErrors, CarryTheEnginesText) {
     const P<CException> copy = CPortaudioException(-9997).clone();
     EXPECT_STREQ(copy->what(), "Invalid sample rate");

@@ -13,6 +13,7 @@
 using namespace peru;
 using tests::countEntries;
 using tests::CTempFolder;
+using tests::readFile;
 using tests::toURI;
 namespace fs = std::filesystem;
 
@@ -47,10 +48,19 @@ std::string makeText(size_t size) {
     return text;
 }
 
+class FileReplacement : public testing::Test {
+protected:
+    P<IFileReplacement> start(const std::string& name) const {
+        return getSystem()->startReplacement(toURI(folder / name));
+    }
+    void replace(const std::string& name) const { getSystem()->replaceFile(toURI(folder / name), "new", 3); }
+
+    const CTempFolder folder;
+};
+
 } // namespace
 
-TEST(FileReplacement, LeavesHolesWhereTheyAre) {
-    const CTempFolder folder;
+TEST_F(FileReplacement, LeavesHolesWhereTheyAre) {
     const fs::path file = folder.write("file", "head");
     constexpr int64_t kSize = int64_t{3} << 30;
     fs::resize_file(file, kSize);
@@ -71,8 +81,7 @@ TEST(FileReplacement, LeavesHolesWhereTheyAre) {
     EXPECT_EQ(std::string(text, 7), std::string("middle\0", 7));
 }
 
-TEST(FileReplacement, MixesOldAndNewBytes) {
-    const CTempFolder folder;
+TEST_F(FileReplacement, MixesOldAndNewBytes) {
     const std::string old = makeText(300000);
     const fs::path file = folder.write("file", old);
     const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
@@ -95,17 +104,16 @@ TEST(FileReplacement, MixesOldAndNewBytes) {
     stream->setSize(200025);
     EXPECT_THROW(getSystem()->startReplacement(toURI(file))->copyFromOld(299999, 2), CFileError);
     // Not compared by EXPECT_EQ, which would print them.
-    EXPECT_TRUE(tests::readFile(file) == old) << "nothing happens before the commit";
+    EXPECT_TRUE(readFile(file) == old) << "nothing happens before the commit";
     EXPECT_EQ(countEntries(folder.path()), 1u);
     replacement->commit();
     const std::string wanted = "he" + old.substr(5, 3) + old.substr(11, 199999) + "middle" +
                                old.substr(299990) + old.substr(299990, 5);
-    EXPECT_TRUE(tests::readFile(file) == wanted);
+    EXPECT_TRUE(readFile(file) == wanted);
     EXPECT_EQ(countEntries(folder.path()), 1u);
 }
 
-TEST(FileReplacement, TakesOverWhatSurroundsTheBytes) {
-    const CTempFolder folder;
+TEST_F(FileReplacement, TakesOverWhatSurroundsTheBytes) {
     const fs::path file = folder.write("file", "old");
     fs::create_symlink("file", folder / "link");
     fs::create_hard_link(file, folder / "second name");
@@ -122,10 +130,10 @@ TEST(FileReplacement, TakesOverWhatSurroundsTheBytes) {
     fs::permissions(plain, fs::perms(0640));
     const std::string listBefore = getAttribute(file, "system.posix_acl_access");
 
-    getSystem()->replaceFile(toURI(folder / "link"), "new", 3);
-    getSystem()->replaceFile(toURI(plain), "new", 3);
-    EXPECT_EQ(tests::readFile(file), "new");
-    EXPECT_EQ(tests::readFile(folder / "second name"), "old") << "never written in place";
+    replace("link");
+    replace("plain");
+    EXPECT_EQ(readFile(file), "new");
+    EXPECT_EQ(readFile(folder / "second name"), "old") << "never written in place";
     EXPECT_TRUE(fs::is_symlink(folder / "link"));
     EXPECT_EQ(getAttribute(file, "user.note"), "kept");
     EXPECT_EQ(getAttribute(file, "system.posix_acl_access"), listBefore);
@@ -140,8 +148,7 @@ TEST(FileReplacement, TakesOverWhatSurroundsTheBytes) {
 }
 
 // Permissions are checked as an ordinary user, even if the tests run as root.
-TEST(FileReplacement, RefusesWhatTheUserMayNotWrite) {
-    const CTempFolder folder;
+TEST_F(FileReplacement, RefusesWhatTheUserMayNotWrite) {
     const fs::path locked = folder.write("locked", "precious");
     const fs::path inside = folder.write("group", "precious");
     fs::permissions(locked, fs::perms(0444));
@@ -152,23 +159,22 @@ TEST(FileReplacement, RefusesWhatTheUserMayNotWrite) {
         fs::permissions(inside, fs::perms(0666));
         ASSERT_EQ(::seteuid(65534), 0);
     }
-    EXPECT_THROW(getSystem()->startReplacement(toURI(locked)), CFileAccessDeniedError);
+    EXPECT_THROW(start("locked"), CFileAccessDeniedError);
     fs::permissions(folder.path(), fs::perms(0555));
-    EXPECT_THROW(getSystem()->startReplacement(toURI(inside)), CFileAccessDeniedError);
-    EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "fresh")), CFileAccessDeniedError);
+    EXPECT_THROW(start("group"), CFileAccessDeniedError);
+    EXPECT_THROW(start("fresh"), CFileAccessDeniedError);
     fs::permissions(folder.path(), fs::perms(0755));
     if (root) {
         EXPECT_EQ(::seteuid(0), 0);
     }
     EXPECT_THROW(getSystem()->startReplacement(toURI(folder.path())), CFileError);
     ASSERT_EQ(::mkfifo((folder / "pipe").c_str(), 0600), 0);
-    EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "pipe")), CFileError);
-    EXPECT_EQ(tests::readFile(locked), "precious");
+    EXPECT_THROW(start("pipe"), CFileError);
+    EXPECT_EQ(readFile(locked), "precious");
     EXPECT_EQ(countEntries(folder.path()), 3u);
 }
 
-TEST(FileReplacement, LeavesNothingWithoutCommit) {
-    const CTempFolder folder;
+TEST_F(FileReplacement, LeavesNothingWithoutCommit) {
     const fs::path file = folder.write("file", "old");
     // Once abandoned regularly, once by a process that is killed half way.
     getSystem()->startReplacement(toURI(file))->getStream()->write("new", 3);
@@ -182,31 +188,30 @@ TEST(FileReplacement, LeavesNothingWithoutCommit) {
     int status = 0;
     ASSERT_EQ(::waitpid(child, &status, 0), child);
     EXPECT_TRUE(WIFSIGNALED(status));
-    EXPECT_EQ(tests::readFile(file), "old");
+    EXPECT_EQ(readFile(file), "old");
     EXPECT_EQ(countEntries(folder.path()), 1u);
 }
 
-TEST(FileReplacement, CreatesWhatADanglingLinkOrARelativePathNames) {
-    const CTempFolder folder;
+TEST_F(FileReplacement, CreatesWhatADanglingLinkOrARelativePathNames) {
     fs::create_directory(folder / "sub");
     fs::create_symlink("sub/second", folder / "first");
     fs::create_symlink("new", folder / "sub/second");
     fs::create_symlink("circle", folder / "circle");
-    getSystem()->replaceFile(toURI(folder / "first"), "new", 3);
-    EXPECT_EQ(tests::readFile(folder / "sub/new"), "new");
+    replace("first");
+    EXPECT_EQ(readFile(folder / "sub/new"), "new");
     EXPECT_TRUE(fs::is_symlink(folder / "first") && fs::is_symlink(folder / "sub/second"));
-    EXPECT_THROW(getSystem()->startReplacement(toURI(folder / "circle")), CFileError);
+    EXPECT_THROW(start("circle"), CFileError);
 
     const fs::path before = fs::current_path();
     fs::current_path(folder.path());
     getSystem()->replaceFile(toURI("relative"), "new", 3);
     fs::current_path(before);
-    EXPECT_EQ(tests::readFile(folder / "relative"), "new");
+    EXPECT_EQ(readFile(folder / "relative"), "new");
     EXPECT_EQ(countEntries(folder.path()), 4u);
 }
 
 // The bytes reach the disk before the name does, also on a file system that has no hard links.
-TEST(FileReplacement, SyncsBeforeItRenamesAndIsPrivateUntilThen) {
+TEST_F(FileReplacement, SyncsBeforeItRenamesAndIsPrivateUntilThen) {
     const mode_t mask = ::umask(022);
     for (const bool hasLinks : {true, false})
         for (const mode_t mode : {0600u, 0644u, 0u}) { // 0: the file is new
@@ -228,7 +233,7 @@ TEST(FileReplacement, SyncsBeforeItRenamesAndIsPrivateUntilThen) {
                 });
                 replacement->commit();
             }
-            EXPECT_EQ(tests::readFile(file), "new");
+            EXPECT_EQ(readFile(file), "new");
             EXPECT_EQ(fs::status(file).permissions(), fs::perms(mode != 0 ? mode : 0644));
             EXPECT_EQ(countEntries(folder.path()), 1u);
             const auto renamed = std::find(calls.begin(), calls.end(), "rename");

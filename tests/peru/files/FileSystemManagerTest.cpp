@@ -14,6 +14,8 @@
 
 using namespace peru;
 using tests::CTempFolder;
+using tests::errorOf;
+using tests::readFile;
 using tests::text;
 using tests::toPath;
 using tests::toURI;
@@ -38,7 +40,7 @@ CTree readTree(const fs::path& folder) {
         else
             value = std::to_string(status.st_mode) + " " + std::to_string(status.st_mtim.tv_sec) + "." +
                     std::to_string(status.st_mtim.tv_nsec) + " " +
-                    (entry.is_regular_file() ? tests::readFile(entry.path()) : "");
+                    (entry.is_regular_file() ? readFile(entry.path()) : "");
     }
     return tree;
 }
@@ -77,17 +79,24 @@ public:
     fs::path path;
 };
 
+class FileSystemManager : public testing::Test {
+protected:
+    P<IURI> at(const std::string& name) const { return toURI(folder / name); }
+    P<IURI> write(const std::string& name, const std::string& bytes) const {
+        return toURI(folder.write(name, bytes));
+    }
+    std::string path(const std::string& name) const { return "'" + (folder / name).string() + "'"; }
+
+    const CTempFolder folder;
+};
+
 } // namespace
 
-TEST(FileSystemManager, TellsWhatIsThere) {
-    CTempFolder folder;
-    P<IURI> file = toURI(folder.write(".hidden", "12345"));
+TEST_F(FileSystemManager, TellsWhatIsThere) {
+    const P<IURI> file = write(".hidden", "12345"), dangling = at("dangling"), self = at("self"),
+                  missing = at("missing"), foreign = make<CURI>("http://host/a");
     fs::create_symlink(folder / "none", folder / "dangling");
     fs::create_directory_symlink(folder.path(), folder / "self");
-    P<IURI> dangling = toURI(folder / "dangling");
-    P<IURI> self = toURI(folder / "self");
-    P<IURI> missing = toURI(folder / "missing");
-
     EXPECT_TRUE(manager()->isFile(file));
     EXPECT_FALSE(manager()->isFolder(file));
     EXPECT_EQ(manager()->getFileSize(file), 5);
@@ -101,17 +110,16 @@ TEST(FileSystemManager, TellsWhatIsThere) {
     EXPECT_TRUE(manager()->isFolder(self));
     EXPECT_TRUE(manager()->getAttributes(self).link);
     EXPECT_FALSE(manager()->exists(missing));
-    EXPECT_FALSE(manager()->exists(make<CURI>("http://host/a")));
+    EXPECT_FALSE(manager()->exists(foreign));
     EXPECT_FALSE(manager()->getFileObject(missing));
     EXPECT_THROW(manager()->getFileSize(missing), CFileNotFoundError);
-    EXPECT_THROW(manager()->getFileSize(make<CURI>("http://host/a")), CURITypeNotSupportedError);
+    EXPECT_THROW(manager()->getFileSize(foreign), CURITypeNotSupportedError);
 }
 
-TEST(FileSystemManager, EnumeratesEveryNameOnce) {
-    CTempFolder folder;
+TEST_F(FileSystemManager, EnumeratesEveryNameOnce) {
     makeTree(folder.path());
     std::map<std::string, std::string> found;
-    P<IFileObjectCursor> cursor = manager()->enumerate(toURI(folder / "one"));
+    P<IFileObjectCursor> cursor = manager()->enumerate(at("one"));
     for (int round = 0; round < 2; ++round) {
         found.clear();
         EXPECT_THROW(cursor->getFileObject(), CInvalidObjectStateError);
@@ -127,14 +135,12 @@ TEST(FileSystemManager, EnumeratesEveryNameOnce) {
                                                          {"50% #?.wav", base + "/50% #?.wav"},
                                                          {"a:b", base + "/a:b"},
                                                          {"link", base + "/link"}}));
-    EXPECT_EQ(tests::errorOf([&] { manager()->enumerate(toURI(folder / "a.txt")); }),
-              "'" + (folder / "a.txt").string() + "' is not a folder.");
-    EXPECT_THROW(manager()->enumerate(toURI(folder / "none")), CFileNotFoundError);
+    EXPECT_EQ(errorOf([&] { manager()->enumerate(at("a.txt")); }), path("a.txt") + " is not a folder.");
+    EXPECT_THROW(manager()->enumerate(at("none")), CFileNotFoundError);
 }
 
-TEST(FileSystemManager, KeepsTimesToTheNanosecond) {
-    CTempFolder folder;
-    P<IURI> file = toURI(folder.write("a", ""));
+TEST_F(FileSystemManager, KeepsTimesToTheNanosecond) {
+    P<IURI> file = write("a", "");
     manager()->setTimes(file, make<CFileTimes>(CFileTimes::kUnknown, -1500000001, 1234567890123456789));
     P<CFileTimes> times = manager()->getTimes(file);
     EXPECT_EQ(times->getLastAccessTime(), -1500000001);
@@ -142,128 +148,110 @@ TEST(FileSystemManager, KeepsTimesToTheNanosecond) {
     manager()->setTimes(file, make<CFileTimes>(0, CFileTimes::kUnknown, 5));
     EXPECT_EQ(manager()->getTimes(file)->getLastAccessTime(), -1500000001);
     EXPECT_EQ(manager()->getTimes(file)->getLastWriteTime(), 5);
-    EXPECT_THROW(manager()->setTimes(toURI(folder / "none"), times), CFileError);
+    EXPECT_THROW(manager()->setTimes(at("none"), times), CFileError);
 }
 
-TEST(FileSystemManager, CreatesParentsOrNothing) {
-    CTempFolder folder;
-    manager()->createFolder(toURI(folder / "a/b/c/"));
-    manager()->createFolder(toURI(folder / "a/b/c"));
+TEST_F(FileSystemManager, CreatesParentsOrNothing) {
+    manager()->createFolder(at("a/b/c/"));
+    manager()->createFolder(at("a/b/c"));
     EXPECT_TRUE(fs::is_directory(folder / "a/b/c"));
     folder.write("a/file", "");
-    EXPECT_EQ(tests::errorOf([&] { manager()->createFolder(toURI(folder / "a/file")); }),
-              "Error creating the folder '" + (folder / "a/file").string() + "' (File exists).");
+    EXPECT_EQ(errorOf([&] { manager()->createFolder(at("a/file")); }),
+              "Error creating the folder " + path("a/file") + " (File exists).");
     std::string tooLong = (folder / "x/y").string() + "/" + std::string(300, 'n');
     EXPECT_THROW(manager()->createFolder(toURI(tooLong)), CFileError);
     EXPECT_FALSE(fs::exists(folder / "x"));
 }
 
-TEST(FileSystemManager, DeletesWithoutFollowingLinks) {
-    CTempFolder folder;
+TEST_F(FileSystemManager, DeletesWithoutFollowingLinks) {
     fs::create_directory(folder / "keep");
     folder.write("keep/a", "1");
     makeTree(folder / "gone");
     fs::create_directory_symlink(folder / "keep", folder / "gone/link");
     fs::create_directory_symlink(folder / "keep", folder / "direct");
-    EXPECT_EQ(tests::errorOf([&] { manager()->deleteFolder(toURI(folder / "direct/")); }),
-              "Error deleting the folder '" + (folder / "direct/").string() + "' (Not a directory).");
-    manager()->deleteFile(toURI(folder / "direct"));
-    manager()->deleteFolder(toURI(folder / "gone"));
+    EXPECT_EQ(errorOf([&] { manager()->deleteFolder(at("direct/")); }),
+              "Error deleting the folder " + path("direct/") + " (Not a directory).");
+    manager()->deleteFile(at("direct"));
+    manager()->deleteFolder(at("gone"));
     EXPECT_EQ(readTree(folder.path()).size(), 2u);
-    EXPECT_EQ(tests::readFile(folder / "keep/a"), "1");
+    EXPECT_EQ(readFile(folder / "keep/a"), "1");
 
-    EXPECT_EQ(tests::errorOf([&] { manager()->deleteFile(toURI(folder / "none")); }),
-              "Error deleting the file '" + (folder / "none").string() + "' (No such file or directory).");
-    EXPECT_THROW(manager()->deleteFile(toURI(folder / "keep")), CFileError);
-    EXPECT_EQ(tests::errorOf([&] { manager()->deleteFolder(toURI(folder / "none")); }),
-              "Error deleting the folder '" + (folder / "none").string() + "' (No such file or directory).");
+    EXPECT_EQ(errorOf([&] { manager()->deleteFile(at("none")); }),
+              "Error deleting the file " + path("none") + " (No such file or directory).");
+    EXPECT_THROW(manager()->deleteFile(at("keep")), CFileError);
+    EXPECT_EQ(errorOf([&] { manager()->deleteFolder(at("none")); }),
+              "Error deleting the folder " + path("none") + " (No such file or directory).");
 }
 
-TEST(FileSystemManager, CopiesTreesAsTheyAre) {
-    CTempFolder folder;
+TEST_F(FileSystemManager, CopiesTreesAsTheyAre) {
     makeTree(folder / "source");
     CTree before = readTree(folder / "source");
-    manager()->copy(toURI(folder / "source"), toURI(folder / "copy"));
+    manager()->copy(at("source"), at("copy"));
     EXPECT_EQ(readTree(folder / "copy"), before);
     EXPECT_EQ(readTree(folder / "source"), before);
 
-    std::string names = "'" + (folder / "source").string() + "' to '" + (folder / "copy").string() + "'";
-    EXPECT_EQ(tests::errorOf([&] { manager()->copy(toURI(folder / "source"), toURI(folder / "copy")); }),
-              "Error copying file " + names + ". The file already exists.");
+    EXPECT_EQ(errorOf([&] { manager()->copy(at("source"), at("copy")); }),
+              "Error copying file " + path("source") + " to " + path("copy") + ". The file already exists.");
     fs::create_directory_symlink(folder / "source/one", folder / "alias");
     for (const char* inside : {"source/one/x", "source/x", "alias/x"})
-        EXPECT_THROW(manager()->copy(toURI(folder / "source"), toURI(folder / inside)), CFileError) << inside;
+        EXPECT_THROW(manager()->copy(at("source"), toURI(folder / inside)), CFileError) << inside;
     EXPECT_EQ(readTree(folder / "source"), before);
-    EXPECT_THROW(manager()->copy(toURI(folder / "none"), toURI(folder / "x")), CFileNotFoundError);
+    EXPECT_THROW(manager()->copy(at("none"), at("x")), CFileNotFoundError);
 }
 
-TEST(FileSystemManager, TakesAFailedCopyBack) {
-    CTempFolder folder;
-    makeTree(folder / "source");
-    ASSERT_EQ(mkfifo((folder / "source/one/two/pipe").c_str(), 0600), 0);
-    CTree before = readTree(folder / "source");
-    EXPECT_THROW(manager()->copy(toURI(folder / "source"), toURI(folder / "copy")), CFileError);
-    EXPECT_FALSE(fs::exists(folder / "copy"));
-    EXPECT_EQ(readTree(folder / "source"), before);
-}
-
-TEST(FileSystemManager, MovesWithinAVolume) {
-    CTempFolder folder;
+TEST_F(FileSystemManager, MovesWithinAVolume) {
     makeTree(folder / "source");
     CTree before = readTree(folder / "source");
-    manager()->move(toURI(folder / "source/"), toURI(folder / "moved/"));
+    manager()->move(at("source/"), at("moved/"));
     EXPECT_EQ(readTree(folder / "moved"), before);
     EXPECT_FALSE(fs::exists(folder / "source"));
 
     folder.write("a", "1");
     folder.write("b", "2");
     auto failure = [&](const char* from, const char* to) {
-        return tests::errorOf([&] { manager()->move(toURI(folder / from), toURI(folder / to)); });
+        return errorOf([&] { manager()->move(toURI(folder / from), toURI(folder / to)); });
     };
-    auto names = [&](const char* from, const char* to) {
-        return "'" + (folder / from).string() + "' to '" + (folder / to).string() + "'.";
-    };
+    auto names = [&](const char* from, const char* to) { return path(from) + " to " + path(to) + "."; };
     EXPECT_EQ(failure("a", "b"), "Error moving file " + names("a", "b"));
     EXPECT_EQ(failure("moved", "b"),
               "Error moving folder " + names("moved", "b") + " The folder already exists.");
     EXPECT_EQ(failure("moved", "moved/one/x"), "Error moving folder " + names("moved", "moved/one/x"));
     EXPECT_EQ(failure("moved", "none/x"),
               "Error moving folder " + names("moved", "none/x") + " Could not create the folder.");
-    EXPECT_EQ(tests::readFile(folder / "b"), "2");
+    EXPECT_EQ(readFile(folder / "b"), "2");
     EXPECT_EQ(readTree(folder / "moved"), before);
 }
 
-TEST(FileSystemManager, MovesBetweenVolumes) {
-    CTempFolder folder;
+TEST_F(FileSystemManager, MovesBetweenVolumes) {
     COtherVolume other(folder.path());
     if (other.path.empty()) GTEST_SKIP() << "no second volume here";
     makeTree(folder / "source");
     CTree before = readTree(folder / "source");
-    manager()->move(toURI(folder / "source"), toURI(other.path / "moved"));
+    manager()->move(at("source"), toURI(other.path / "moved"));
     EXPECT_EQ(readTree(other.path / "moved"), before);
     EXPECT_FALSE(fs::exists(folder / "source"));
 
-    manager()->move(toURI(other.path / "moved/a.txt"), toURI(folder / "a.txt"));
-    manager()->move(toURI(other.path / "moved/one/two/dangling"), toURI(folder / "link"));
+    manager()->move(toURI(other.path / "moved/a.txt"), at("a.txt"));
+    manager()->move(toURI(other.path / "moved/one/two/dangling"), at("link"));
     EXPECT_EQ(fs::read_symlink(folder / "link"), "/nowhere/at/all");
     EXPECT_FALSE(fs::exists(fs::symlink_status(other.path / "moved/one/two/dangling")));
 
     std::ofstream(other.path / "taken") << "old";
-    EXPECT_THROW(manager()->move(toURI(folder / "a.txt"), toURI(other.path / "taken")), CFileError);
-    EXPECT_EQ(tests::readFile(other.path / "taken"), "old");
-    EXPECT_EQ(tests::readFile(folder / "a.txt"), "alpha");
+    EXPECT_THROW(manager()->move(at("a.txt"), toURI(other.path / "taken")), CFileError);
+    EXPECT_EQ(readFile(other.path / "taken"), "old");
+    EXPECT_EQ(readFile(folder / "a.txt"), "alpha");
 }
 
-TEST(FileSystemManager, LosesNothingWhenAMoveBetweenVolumesFails) {
-    CTempFolder folder;
+TEST_F(FileSystemManager, LosesNothingWhenACopyOrMoveBetweenVolumesFails) {
     COtherVolume other(folder.path());
     if (other.path.empty()) GTEST_SKIP() << "no second volume here";
     makeTree(folder / "source");
     // Nobody can copy a FIFO, not even root.
     ASSERT_EQ(mkfifo((folder / "source/one/two/pipe").c_str(), 0600), 0);
     CTree before = readTree(folder / "source");
+    EXPECT_THROW(manager()->copy(at("source"), toURI(other.path / "copy")), CFileError);
     try {
-        manager()->move(toURI(folder / "source"), toURI(other.path / "moved"));
+        manager()->move(at("source"), toURI(other.path / "moved"));
         FAIL();
     } catch (const CFileError& error) {
         EXPECT_EQ(text(error.getDescription()), "Error moving folder '" + (folder / "source").string() +
@@ -293,8 +281,7 @@ private:
 
 } // namespace
 
-TEST(FileSystemManager, ServesWhatIsMounted) {
-    CTempFolder folder;
+TEST_F(FileSystemManager, ServesWhatIsMounted) {
     makeTree(folder / "disc");
     fs::remove(folder / "disc/one/two/up");
     fs::remove(folder / "disc/one/two/dangling");
@@ -305,14 +292,14 @@ TEST(FileSystemManager, ServesWhatIsMounted) {
     EXPECT_TRUE(manager()->isFolder(disc));
     EXPECT_THROW(manager()->deleteFolder(disc), CReadOnlyError);
     // Between two file systems, through streams.
-    manager()->copy(disc, toURI(folder / "copy"));
-    EXPECT_EQ(tests::readFile(folder / "copy/50% #?.wav"), "beta");
-    EXPECT_EQ(tests::readFile(folder / "copy/two/\xff\xe4 x\ny").size(), 300000u);
-    EXPECT_EQ(tests::readFile(folder / "copy/link"), "alpha");
+    manager()->copy(disc, at("copy"));
+    EXPECT_EQ(readFile(folder / "copy/50% #?.wav"), "beta");
+    EXPECT_EQ(readFile(folder / "copy/two/\xff\xe4 x\ny").size(), 300000u);
+    EXPECT_EQ(readFile(folder / "copy/link"), "alpha");
     EXPECT_EQ(fs::last_write_time(folder / "copy/two"), fs::last_write_time(folder / "disc/one/two"));
-    EXPECT_THROW(manager()->copy(toURI(folder / "copy"), make<CURI>("mirror:///new")), CReadOnlyError);
+    EXPECT_THROW(manager()->copy(at("copy"), make<CURI>("mirror:///new")), CReadOnlyError);
     // A source that cannot be deleted is not moved: the copy is removed again.
-    EXPECT_THROW(manager()->move(make<CURI>("mirror:///a.txt"), toURI(folder / "moved")), CException);
+    EXPECT_THROW(manager()->move(make<CURI>("mirror:///a.txt"), at("moved")), CException);
     EXPECT_FALSE(fs::exists(folder / "moved"));
     manager()->unmount(mirror);
     EXPECT_FALSE(manager()->exists(disc));
@@ -331,8 +318,8 @@ TEST(FileSystemManagerDeathTest, UndoableDeleteFillsTheWasteBin) {
         fs::create_directory(folder / "data");
         fs::path file = folder.write("a b", "precious");
         manager()->deleteUndoable(toURI(file));
-        bool kept = tests::readFile(folder / "data/Trash/files/a b") == "precious";
-        std::string message = tests::errorOf([&] { manager()->deleteUndoable(toURI(file)); });
+        bool kept = readFile(folder / "data/Trash/files/a b") == "precious";
+        std::string message = errorOf([&] { manager()->deleteUndoable(toURI(file)); });
         return !fs::exists(file) && kept && message == "shell error 1";
     };
     EXPECT_EXIT(std::_Exit(deleteAndLook() ? 0 : 1), testing::ExitedWithCode(0), "");

@@ -10,6 +10,7 @@
 
 using namespace peru;
 using tests::CTempFolder;
+using tests::errorOf;
 using tests::text;
 using tests::toURI;
 
@@ -56,11 +57,11 @@ TEST(ShellFolder, RaisesItsFixedTexts) {
     CTempFolder folder;
     P<IURI> file = toURI(folder.write("a", ""));
     P<posix::CShellFolder> shell = posix::CShellFolder::bind(toURI(folder.path()));
-    EXPECT_EQ(tests::errorOf([&] { posix::CShellFolder::bind(file); }), "Error binding to shell folder.");
-    EXPECT_EQ(tests::errorOf([&] { posix::CShellFileObject::find(file)->enumerate(); }),
+    EXPECT_EQ(errorOf([&] { posix::CShellFolder::bind(file); }), "Error binding to shell folder.");
+    EXPECT_EQ(errorOf([&] { posix::CShellFileObject::find(file)->enumerate(); }),
               "Error enumerating shell folder contents.");
-    EXPECT_EQ(tests::errorOf([&] { shell->getItemAttributes("none"); }),
+    EXPECT_EQ(errorOf([&] { shell->getItemAttributes("none"); }),
               "Error obtaining shell folder item information.");
-    EXPECT_EQ(tests::errorOf([&] { posix::CShellFileObject::find(make<CURI>("//host/x")); }),
+    EXPECT_EQ(errorOf([&] { posix::CShellFileObject::find(make<CURI>("//host/x")); }),
               "Error obtaining ITEMIDLIST from path or name:");
 }

@@ -5,6 +5,7 @@
 #include "support/Files.h"
 
 using namespace peru;
+using tests::errorOf;
 using tests::text;
 
 namespace {
@@ -80,7 +81,7 @@ TEST(PackageManager, LetsAFailedPackageBeTriedAgain) {
     EXPECT_TRUE(manager->isActive(package));
 
     P<IPackage> orphan = make<CTestPackage>("orphan", log, std::vector{"nobody"});
-    EXPECT_EQ(tests::errorOf([&] { manager->activate(orphan); }),
+    EXPECT_EQ(errorOf([&] { manager->activate(orphan); }),
               "The package 'orphan' requires the unknown package 'nobody'.");
     EXPECT_FALSE(manager->isActive(orphan));
 }

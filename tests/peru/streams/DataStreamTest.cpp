@@ -12,6 +12,7 @@
 namespace {
 
 using namespace peru;
+using tests::errorOf;
 using tests::text;
 
 // The bytes that `write` produces, in hexadecimal.
@@ -110,7 +111,7 @@ TEST(DataStream, HostileSizesTakeNoMemory) {
 }
 
 TEST(DataStream, NoticesReadersThatDisagree) {
-    EXPECT_EQ(tests::errorOf([] { reader("00050040E20100FF")->readObject(make<CPoint>(int16_t{0}, true)); }),
+    EXPECT_EQ(errorOf([] { reader("00050040E20100FF")->readObject(make<CPoint>(int16_t{0}, true)); }),
               "Error in object serialization.. write/read differ?");
     EXPECT_FALSE(reader("01")->readObject(make<CPoint>()));
     EXPECT_FALSE(reader("01")->readURI());
@@ -119,7 +120,7 @@ TEST(DataStream, NoticesReadersThatDisagree) {
 TEST(HexData, RefusesWhatIsNoHexadecimalText) {
     EXPECT_EQ(parseHexData("00fFA5"), (std::vector<uint8_t>{0, 0xFF, 0xA5}));
     for (const char* bad : {"0", "0g", " 00", "0x00"})
-        EXPECT_EQ(tests::errorOf<CParseError>([&] { parseHexData(bad); }), "Error parsing hex data.");
+        EXPECT_EQ(errorOf<CParseError>([&] { parseHexData(bad); }), "Error parsing hex data.");
 }
 
 } // namespace

@@ -13,6 +13,7 @@
 #include <unistd.h>
 
 using namespace peru;
+using tests::errorOf;
 using namespace peru::literals;
 using tests::toURI;
 
@@ -96,7 +97,7 @@ TEST(Process, EndedChildOfADroppedHandle_IsCollected) {
 TEST(Process, WhatCannotBeStarted_IsTold) {
     tests::CTempFolder folder;
     const std::string missing = (folder / "no such program").string();
-    EXPECT_EQ(tests::errorOf<CError>([&] { getProcessManager()->start(toURI(missing), {}); }),
+    EXPECT_EQ(errorOf<CError>([&] { getProcessManager()->start(toURI(missing), {}); }),
               "Error starting '" + missing + "' (No such file or directory).");
     EXPECT_THROW(getProcessManager()->start(toURI(folder.write("text", "x")), {}), CError);
     EXPECT_THROW(getProcessManager()->start(make<CURI>("http://host/program"), {}), CError);
@@ -126,7 +127,7 @@ TEST(DynamicLibrary, FailureTellsFileAndReason) {
         {[] { getDynamicLibraryLoader()->load(toURI("libm.so.6")); }, "./libm.so.6", "No such file"},
     };
     for (const SCase& one : cases) {
-        const std::string description = tests::errorOf<CError>(one.load);
+        const std::string description = errorOf<CError>(one.load);
         EXPECT_NE(description.find(one.name), std::string::npos) << description;
         EXPECT_NE(description.find(one.reason), std::string::npos) << description;
     }

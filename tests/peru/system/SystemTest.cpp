@@ -17,6 +17,7 @@ using namespace peru;
 using tests::CEnvironment;
 using tests::countEntries;
 using tests::CTempFolder;
+using tests::errorOf;
 using tests::text;
 using tests::toPath;
 using tests::toURI;
@@ -80,9 +81,9 @@ TEST(System, MakesNamesThatNobodyElseHas) {
 TEST(System, RefusesUniqueNamesWithoutAPlace) {
     CTempFolder folder;
     P<IURI> missing = toURI(folder / "missing");
-    EXPECT_EQ(tests::errorOf([&] { getSystem()->createUniqueFile(missing, "a", ""); }),
+    EXPECT_EQ(errorOf([&] { getSystem()->createUniqueFile(missing, "a", ""); }),
               "Error creating unique file name.");
-    EXPECT_EQ(tests::errorOf([&] { getSystem()->createUniqueFolder(missing, "a"); }),
+    EXPECT_EQ(errorOf([&] { getSystem()->createUniqueFolder(missing, "a"); }),
               "Error creating unique folder name.");
     EXPECT_THROW(getSystem()->createUniqueFile(toURI(folder.path()), "../a", ""), CFileError);
     EXPECT_EQ(countEntries(folder.path()), 0u);
@@ -94,13 +95,11 @@ TEST(System, NeverReplacesAndLeavesNoHalfCopy) {
     P<IURI> taken = toURI(folder.write("b", "old"));
     P<IURI> missing = toURI(folder / "missing");
     std::string names = "'" + toPath(source) + "' to '" + toPath(taken) + "'";
-    EXPECT_EQ(tests::errorOf([&] { getSystem()->copyFile(source, taken); }),
+    EXPECT_EQ(errorOf([&] { getSystem()->copyFile(source, taken); }),
               "Error copying file " + names + ". The file already exists.");
-    EXPECT_EQ(tests::errorOf([&] { getSystem()->moveFile(source, taken); }),
-              "Error moving file " + names + ".");
-    EXPECT_EQ(tests::errorOf([&] { getSystem()->moveFolder(source, taken); }),
-              "Error moving folder " + names + ".");
-    EXPECT_EQ(tests::errorOf([&] { getSystem()->copyFile(missing, toURI(folder / "c")); }),
+    EXPECT_EQ(errorOf([&] { getSystem()->moveFile(source, taken); }), "Error moving file " + names + ".");
+    EXPECT_EQ(errorOf([&] { getSystem()->moveFolder(source, taken); }), "Error moving folder " + names + ".");
+    EXPECT_EQ(errorOf([&] { getSystem()->copyFile(missing, toURI(folder / "c")); }),
               "Error copying file '" + toPath(missing) + "' to '" + (folder / "c").string() +
                   "' (No such file or directory).");
     // Fails on the first read, after the destination was created.
@@ -130,8 +129,7 @@ TEST(System, KeepsTheOldFileWhereTheNewOneDoesNotFit) {
     const struct rlimit small { 4096, limit.rlim_max };
     const auto before = std::signal(SIGXFSZ, SIG_IGN);
     ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &small), 0);
-    const std::string error =
-        tests::errorOf([&] { getSystem()->replaceFile(toURI(old), large.data(), size); });
+    const std::string error = errorOf([&] { getSystem()->replaceFile(toURI(old), large.data(), size); });
     setrlimit(RLIMIT_FSIZE, &limit);
     std::signal(SIGXFSZ, before);
     EXPECT_NE(error.find("old' could not be written: File too large"), std::string::npos) << error;

@@ -15,6 +15,7 @@
 #include <unistd.h>
 
 using namespace peru;
+using tests::errorOf;
 
 namespace {
 
@@ -199,16 +200,16 @@ TEST_F(GlobalMutex, WhatIsNotTheUsersOwnFile_IsRefused) {
 
     std::ofstream(file) << "";
     chmod(file.c_str(), 0666);
-    EXPECT_EQ(tests::errorOf(make), message);
+    EXPECT_EQ(errorOf(make), message);
     std::filesystem::remove(file);
     std::filesystem::create_symlink(m_folder.write("elsewhere", ""), file);
-    EXPECT_EQ(tests::errorOf(make), message);
+    EXPECT_EQ(errorOf(make), message);
     std::filesystem::remove(file);
     std::filesystem::create_directory(file);
-    EXPECT_EQ(tests::errorOf(make), message);
+    EXPECT_EQ(errorOf(make), message);
     std::filesystem::remove(file);
     ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
-    EXPECT_EQ(tests::errorOf(make), message);
+    EXPECT_EQ(errorOf(make), message);
     std::filesystem::remove(file);
     EXPECT_NO_THROW(make());
 }
