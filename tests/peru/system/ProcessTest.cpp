@@ -1,5 +1,6 @@
 #include "peru/Errors.h"
 #include "peru/system/IDynamicLibrary.h"
+#include "peru/system/ISystem.h"
 #include "peru/system/ITimeManager.h"
 #include "peru/uri/URI.h"
 #include "support/Files.h"
@@ -101,6 +102,28 @@ TEST(Process, WhatCannotBeStarted_IsTold) {
               "Error starting '" + missing + "' (No such file or directory).");
     EXPECT_THROW(getProcessManager()->start(toURI(folder.write("text", "x")), {}), CError);
     EXPECT_THROW(getProcessManager()->start(make<CURI>("http://host/program"), {}), CError);
+}
+
+// The companion lives as long as the process that it is given.
+TEST(Process, CancelAutoplay_EndsWithItsParent) {
+    const P<IURI> folder = getSystem()->getSearchFolders(nullptr, nullptr)[0];
+    const auto startCompanion = [&](const std::vector<std::string>& arguments) {
+        std::vector<P<IString>> all;
+        for (const std::string& argument : arguments) all.push_back(CString::fromUTF8(argument));
+        return getProcessManager()->start(folder->appendPath("CancelAutoplay2"), all);
+    };
+    int exitCode = -2;
+    for (const std::vector<std::string>& bad :
+         {std::vector<std::string>{}, {"dummy"}, {"0"}, {"12x", "dummy"}}) {
+        EXPECT_TRUE(startCompanion(bad)->wait(kLong, exitCode));
+        EXPECT_EQ(exitCode, 2);
+    }
+    P<IProcess> parent = startShell("exec sleep 1000");
+    P<IProcess> companion = startCompanion({std::to_string(parent->getId()), "dummy"});
+    EXPECT_FALSE(companion->wait(100, exitCode));
+    parent->terminate();
+    EXPECT_TRUE(companion->wait(kLong, exitCode));
+    EXPECT_EQ(exitCode, 0);
 }
 
 TEST(DynamicLibrary, SymbolsAreFoundByNameAndByFile) {
