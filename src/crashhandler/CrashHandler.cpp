@@ -42,7 +42,7 @@ struct SInstalled {
 };
 
 SInstalled g_installed;
-bool g_isInstalled = false;
+std::atomic<bool> g_isInstalled{false};
 std::atomic<pid_t> g_crashed{0};     // the thread that writes the files
 std::atomic<bool> g_finished{false}; // the files are complete
 char g_exception[1024] = {};
@@ -228,7 +228,7 @@ uintptr_t findStackStart() {
 } // namespace
 
 void useAlternateStack() {
-    peru::CAlternateStack::useForCurrentThread();
+    if (g_isInstalled) peru::CAlternateStack::useForCurrentThread();
 }
 
 void install(const SNames& names) {

@@ -17,9 +17,10 @@ struct SNames {
 // be called by two threads at the same time.
 void install(const SNames& names);
 
-// Lets the handler run after a stack overflow of the calling thread. install() does this, and so do all
-// threads that the library creates. A host's thread whose stack overflows leaves no files unless it has
-// called this: the signal has no stack to run on. Cheap after the first call of a thread.
+// Lets the handler run after a stack overflow of the calling thread; does nothing before install(). install()
+// does this for its own thread, and all threads that the library creates have such a stack. A host's thread
+// whose stack overflows leaves no files unless it has called this: the signal has no stack to run on. Cheap
+// after the first call of a thread.
 void useAlternateStack();
 
 } // namespace crashhandler

@@ -210,22 +210,20 @@ TEST(Thread, Priority_LowersThisThreadOnly) {
 
 TEST(Thread, PriorityRightAfterStart_ReachesTheThread) {
     P<ISignal> go = getSignalFactory()->createSignal();
-    int policy = -1;
     P<IThread> inside;
     P<IThread> thread = runThread([&] {
         go->wait();
-        policy = sched_getscheduler(0);
+        EXPECT_EQ(sched_getscheduler(0), SCHED_BATCH);
         inside = getThreadManager()->getCurrentThread();
     });
     thread->setPriority(1);
     go->set();
     thread->wait();
-    EXPECT_EQ(policy, SCHED_BATCH);
     EXPECT_TRUE(inside == thread);
 }
 
 TEST(Thread, EscapedException_IsLoggedAndEndsTheThreadOnly) {
-    class CLastMessage : public CLogBase {
+    class CMessages : public CLogBase {
     public:
         void enterArea(const P<IString>&) override {}
         void leaveArea(const P<IString>&) override {}
@@ -234,7 +232,7 @@ TEST(Thread, EscapedException_IsLoggedAndEndsTheThreadOnly) {
         }
         std::vector<std::string> texts;
     };
-    auto log = make<CLastMessage>();
+    auto log = make<CMessages>();
     getLogManager()->addLog(log, nullptr);
     runThread([] { throw CError("no decoder", "Trouble"); })->wait();
     runThread([] { throw std::runtime_error("plain"); })->wait();
