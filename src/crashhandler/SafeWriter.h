@@ -19,7 +19,6 @@ public:
     CSafeWriter& operator=(const CSafeWriter&) = delete;
 
     bool isGood() const { return m_file >= 0; }
-    int getFile() const { return m_file; }
     uint32_t getPosition() const { return m_position; }
 
     void write(const void* data, size_t size);

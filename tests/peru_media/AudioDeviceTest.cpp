@@ -135,8 +135,8 @@ TEST_F(AudioDevice, ComesAndGoesWithoutARestart) {
     const auto count = [] { return getSystem()->getOutDevices().getCount(); };
     out->open(makeFormat());
     std::ofstream(path) << other << before;
-    std::this_thread::sleep_for(
-        std::chrono::milliseconds(150)); // longer than an enumeration counts as current
+    // Longer than an enumeration counts as current.
+    std::this_thread::sleep_for(std::chrono::milliseconds(150));
     EXPECT_EQ(count(), 1) << "the sound system cannot be restarted while a device is open";
     out->close();
     P<IAudioOutDevice> added;

@@ -9,6 +9,7 @@
 #include <csignal>
 #include <fcntl.h>
 #include <functional>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
@@ -137,6 +138,7 @@ TEST(DynamicLibrary, SymbolsAreFoundByNameAndByFile) {
 TEST(DynamicLibrary, FailureTellsFileAndReason) {
     tests::CTempFolder folder;
     std::filesystem::path text = folder.write("text \xc3\xa4.so", "not a library");
+    ASSERT_EQ(mkfifo((folder / "pipe").c_str(), 0600), 0);
     struct SCase {
         std::function<void()> load;
         std::string name, reason;
@@ -144,6 +146,8 @@ TEST(DynamicLibrary, FailureTellsFileAndReason) {
         {[&] { getDynamicLibraryLoader()->load(toURI(text)); }, text.string(), "file too short"},
         {[&] { getDynamicLibraryLoader()->load(toURI(folder / "no.so")); }, (folder / "no.so").string(),
          "No such file"},
+        {[&] { getDynamicLibraryLoader()->load(toURI(folder / "pipe")); }, (folder / "pipe").string(),
+         "not a regular file"},
         {[] { getDynamicLibraryLoader()->loadByName("libno-such.so"); }, "libno-such.so", "No such file"},
         {[] { getDynamicLibraryLoader()->loadByName(""); }, "''", "no name"},
         // A relative file is looked up in the current folder, never in the loader's search path.

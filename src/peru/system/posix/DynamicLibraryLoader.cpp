@@ -7,6 +7,7 @@
 
 #include <dlfcn.h>
 #include <string>
+#include <sys/stat.h>
 
 namespace peru::posix {
 
@@ -25,21 +26,27 @@ private:
     void* m_handle;
 };
 
-P<IDynamicLibrary> open(const std::string& name) {
-    // An empty name would return the program itself.
-    void* handle = name.empty() ? nullptr : dlopen(name.c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (handle) return make<CDynamicLibrary>(handle);
-    const char* reason = name.empty() ? "no name was given" : dlerror();
+[[noreturn]] void raise(const std::string& name, const char* reason) {
     throw CError(localize("peru.CDynamicLibraryLoader.loadError",
                           "Error loading library '%FILE%' (%ERRORDESC%).",
                           {{"%FILE%", CString::fromUTF8(name)},
                            {"%ERRORDESC%", CString::fromUTF8(reason ? reason : "unknown reason")}}));
 }
 
+P<IDynamicLibrary> open(const std::string& name) {
+    // An empty name would return the program itself.
+    if (name.empty()) raise(name, "no name was given");
+    if (void* handle = dlopen(name.c_str(), RTLD_NOW | RTLD_LOCAL)) return make<CDynamicLibrary>(handle);
+    raise(name, dlerror());
+}
+
 } // namespace
 
 P<IDynamicLibrary> CDynamicLibraryLoader::load(const P<IURI>& file) {
     std::string path = toPath(file);
+    // The loader would wait for the other end of a FIFO.
+    struct stat status;
+    if (::stat(path.c_str(), &status) == 0 && !S_ISREG(status.st_mode)) raise(path, "not a regular file");
     // Without a slash the loader would use its search path.
     return open(path.find('/') == std::string::npos ? "./" + path : path);
 }
