@@ -63,19 +63,3 @@ TEST_F(NoSound, TellsOfAConfigurationThatCannotBeRead) {
     folder.write("bad.conf", "");
     EXPECT_FALSE(getSystem()->getDefaultOutDevice());
 }
-
-TEST_F(NoSound, TakesTheSystemOfAHost) {
-    class CHostSystem : public CObject, public ISystem {
-    public:
-        WEnum<IAudioOutDevice> getOutDevices() override { return {}; }
-        WEnum<IAudioInDevice> getInDevices() override { return {}; }
-        P<IAudioOutDevice> getDefaultOutDevice() override { return nullptr; }
-        P<IAudioInDevice> getDefaultInDevice() override { return nullptr; }
-    };
-    const CEnvironment alsa("ALSA_CONFIG_PATH", folder.write("bad.conf", "pcm { x").string());
-    const P<ISystem> system = make<CHostSystem>();
-    setSystem(system);
-    EXPECT_EQ(getSystem(), system); // the machine's sound system is not used
-    setSystem(nullptr);
-    EXPECT_THROW(getSystem(), CMediaException);
-}

@@ -23,19 +23,6 @@ TEST(PlayClock, CountsWhatHasBeenHeard) {
     for (const auto& each : cases) EXPECT_NEAR(clock.getHeard(each.now), each.heard, 1e-6) << each.now;
 }
 
-TEST(PlayClock, ForgetsWhatTheSystemDropped) {
-    CPlayClock clock(100.0);
-    clock.add(10.0, 100);
-    clock.drop(10.5);
-    EXPECT_NEAR(clock.getHeard(20.0), 50.0, 1e-6);
-    // The stream's clock restarts.
-    clock = CPlayClock(100.0);
-    clock.add(10.0, 100);
-    clock.drop(11.0);
-    clock.add(1.0, 100);
-    EXPECT_NEAR(clock.getHeard(1.5), 150.0, 1e-6);
-}
-
 // Thousands of blocks, far ahead, with jittering times, queried rarely or often.
 TEST(PlayClock, NeverFallsAndReachesTheEnd) {
     for (const auto& [askEvery, frames, ahead] :
