@@ -181,11 +181,12 @@ void finish() {
 void writeFiles(int number, const siginfo_t& signal, const ucontext_t& context) {
     const CWatchdog watchdog(number);
     const size_t threads = captureThreads(context, g_threads, kMaxThreads);
+    // The report first: it is small, and says most if the dump cannot be finished.
+    writeReport(getIndex(number), signal, threads);
     {
         CSafeWriter dump(g_installed.dump);
         writeMiniDump(dump, signal, g_threads, threads, g_installed.stackLimit);
     }
-    writeReport(getIndex(number), signal, threads);
     finish();
 }
 
