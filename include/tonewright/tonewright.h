@@ -233,8 +233,8 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSourceFromEditorXml(const
  * is read, usually by an encoder. That job ends, with everything that was recorded, when the recording
  * callback returns false, when the device disappears, and when the device has delivered nothing for 15
  * seconds. Another thread may also close the source, which drops unread sound. Two channels are recorded and
- * converted to the requested format; if any conversion is needed, only 1 or 2 bytes per sample are possible.
- * Null for a bad handle or a device without a suitable format. */
+ * converted to the requested format, of 1 to 4 bytes per sample. Null for a bad handle or a device without a
+ * suitable format. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateAudioSoureFromAudioInDevice(TONEWRIGHT_Handle device,
                                                                               int32_t sampleRate,
                                                                               int32_t channelCount,

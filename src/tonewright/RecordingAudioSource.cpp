@@ -55,7 +55,7 @@ bool CRecordingAudioSource::findFormat() {
     if (m_sampleRate > 0 && m_channelCount > 0 && m_bytesPerSample > 0)
         m_deviceFormat = m_device->getFormat(m_sampleRate, m_bytesPerSample, kDeviceChannels);
     const bool isConvertible =
-        m_deviceFormat && m_bytesPerSample <= 2 &&
+        m_deviceFormat && m_bytesPerSample <= 4 &&
         CSampleRateConverter::canConvert(m_deviceFormat->getChannelCount(), m_channelCount);
     if (m_deviceFormat && (isDeviceFormatWanted() || isConvertible)) return true;
     peru::getLogManager()->warning(

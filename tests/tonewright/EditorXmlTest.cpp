@@ -3,15 +3,17 @@
 #include "Library.h"
 #include "host/Wav.h"
 #include "peru/Errors.h"
+#include "sonora2/context/LastFailure.h"
 #include "sonora2/context/LogManager.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/plugins/PluginHandler.h"
 #include "sonora2/tracks/TrackCommands.h"
 #include "support/Files.h"
 #include "tonewright/TrackModifierFade.h"
-#include "sonora2/context/LastFailure.h"
 #include "tonewright/TracklistAudioSource.h"
 #include "tonewright/TracklistAudioTrack.h"
+
+#include <gmock/gmock.h>
 
 #include <cmath>
 #include <fstream>
@@ -375,7 +377,8 @@ TEST_F(EditorExport, BadArrangement_GivesNothingAndALine) {
     std::filesystem::remove(folder / "gone.wav");
     EXPECT_NE(TONEWRIGHT_AudioSource_Open(removed.get()), TONEWRIGHT_OK);
     EXPECT_TRUE(hasLine("could not open source in CTracklistAudioTrack: " + uri));
-    EXPECT_THAT(sonora2::common::getLastFailure().message, testing::EndsWith("gone.wav: No such file or directory"));
+    EXPECT_THAT(sonora2::common::getLastFailure().message,
+                testing::EndsWith("gone.wav: No such file or directory"));
     EXPECT_EQ(TONEWRIGHT_AudioSource_IsOpened(removed.get()), 0);
 }
 

@@ -64,8 +64,9 @@ TEST_F(Recording, Source_FindsAFormatOfTheDevice) {
                                                        {44100, 1, 2, nullptr, true, false},
                                                        {48000, 2, 2, cd, true, false},
                                                        {48000, 1, 1, wide, true, false},
-                                                       {48000, 1, 3, nullptr, false, false},
-                                                       {96000, 2, 3, wide, false, false},
+                                                       {48000, 1, 3, nullptr, true, false},
+                                                       {96000, 2, 3, wide, true, false},
+                                                       {96000, 2, 5, wide, false, false},
                                                        {44100, 0, 2, nullptr, false, false},
                                                        {0, 2, 2, nullptr, false, false},
                                                        {44100, 2, -1, nullptr, false, false}}) {

@@ -14,11 +14,14 @@ public:
     static constexpr int kMaxChannels = 6;
     using SourcePointers = std::array<const int16_t*, kMaxChannels>; // the first sample of each channel
     using PlanePointers = std::array<int16_t*, kMaxChannels>;
+    using WidePlanePointers = std::array<int32_t*, kMaxChannels>;
 
     // Reads `frames` frames from source pointers that advance by the stride, and writes each plane densely.
     // Planes for which isPlaneWritten() is false are left unchanged.
     virtual void convert(int frames, SourcePointers source, int sourceStrideBytes,
                          PlanePointers planes) const = 0;
+    // The same for dense frames of 32-bit samples.
+    virtual void convertWide(int frames, const int32_t* source, WidePlanePointers planes) const = 0;
 
     int getSourceChannels() const { return m_sourceChannels; }
     int getDestinationChannels() const { return m_destinationChannels; }

@@ -7,6 +7,8 @@ extern "C" {
 }
 
 #include <algorithm>
+#include <cstdlib>
+#include <cstring>
 #include <memory>
 
 namespace sonora2::samplerateconverter {
@@ -29,21 +31,54 @@ struct SResampler {
     int64_t margin; // output samples that the history may add to what a call's own input gives
 };
 
-SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShift, int linear,
-                          double cutoff) {
-    if (outRate <= 0 || inRate <= 0 || outRate / inRate >= kMaxRatio || inRate / outRate >= kMaxRatio)
-        return nullptr;
+namespace {
+
+bool isBestWanted() {
+    const char* wanted = std::getenv("TONEWRIGHT_RESAMPLER");
+    return wanted && std::strcmp(wanted, "best") == 0;
+}
+
+using Context = std::unique_ptr<SwrContext, SContextDeleter>;
+
+Context allocate(int outRate, int inRate, AVSampleFormat format) {
     AVChannelLayout mono = AV_CHANNEL_LAYOUT_MONO;
     SwrContext* made = nullptr;
-    if (swr_alloc_set_opts2(&made, &mono, AV_SAMPLE_FMT_S16P, outRate, &mono, AV_SAMPLE_FMT_S16P, inRate, 0,
-                            nullptr) < 0)
+    if (swr_alloc_set_opts2(&made, &mono, format, outRate, &mono, format, inRate, 0, nullptr) < 0)
         return nullptr;
-    std::unique_ptr<SwrContext, SContextDeleter> context(made);
-    // Every option that affects the sound is set explicitly; the library's defaults differ. The flag makes it
-    // filter equal rates too.
-    const bool accepted = av_opt_set_sample_fmt(made, "internal_sample_fmt", AV_SAMPLE_FMT_S16P, 0) >= 0 &&
-                          av_opt_set(made, "flags", "+res", 0) >= 0 &&
-                          av_opt_set(made, "resampler", "swr", 0) >= 0 &&
+    Context context(made);
+    // The flag makes it filter equal rates too.
+    const bool accepted = av_opt_set_sample_fmt(made, "internal_sample_fmt", format, 0) >= 0 &&
+                          av_opt_set(made, "flags", "+res", 0) >= 0;
+    return accepted ? std::move(context) : nullptr;
+}
+
+Context createBest(int outRate, int inRate, AVSampleFormat format) {
+    constexpr double kPrecision = 28.0; // bits
+    Context context = allocate(outRate, inRate, format);
+    const bool accepted = context && av_opt_set(context.get(), "resampler", "soxr", 0) >= 0 &&
+                          av_opt_set_double(context.get(), "precision", kPrecision, 0) >= 0 &&
+                          swr_init(context.get()) >= 0;
+    return accepted ? std::move(context) : nullptr;
+}
+
+} // namespace
+
+SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShift, int linear, double cutoff,
+                          int bytesPerSample) {
+    if (outRate <= 0 || inRate <= 0 || outRate / inRate >= kMaxRatio || inRate / outRate >= kMaxRatio)
+        return nullptr;
+    const AVSampleFormat format = bytesPerSample == 2 ? AV_SAMPLE_FMT_S16P : AV_SAMPLE_FMT_S32P;
+    if (isBestWanted()) {
+        if (Context best = createBest(outRate, inRate, format))
+            return std::make_unique<SResampler>(
+                       SResampler{std::move(best), inRate, outRate, int64_t{1} << 20})
+                .release();
+    }
+    Context context = allocate(outRate, inRate, format);
+    if (!context) return nullptr;
+    // Every option that affects the sound is set explicitly; the library's defaults differ.
+    SwrContext* made = context.get();
+    const bool accepted = av_opt_set(made, "resampler", "swr", 0) >= 0 &&
                           av_opt_set_int(made, "filter_size", filterSize, 0) >= 0 &&
                           av_opt_set_int(made, "phase_shift", phaseShift, 0) >= 0 &&
                           av_opt_set_int(made, "linear_interp", linear, 0) >= 0 &&
@@ -59,16 +94,15 @@ SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShif
     return std::make_unique<SResampler>(SResampler{std::move(context), inRate, outRate, margin}).release();
 }
 
-int resamplerRun(SResampler* resampler, int16_t* dst, const int16_t* src, int* consumed, int srcSize,
-                 int dstSize) {
+int resamplerRun(SResampler* resampler, void* dst, const void* src, int* consumed, int srcSize, int dstSize) {
     // The library buffers whatever does not fit the output, without bound, so it gets no more input than fits
     // (apart from the initial fill). The output size passed to it stays close to what is expected, since it
     // becomes slow with a large one.
     const int64_t fitting = dstSize * resampler->inRate / resampler->outRate;
     const int taken = static_cast<int>(std::min<int64_t>(srcSize, fitting));
     const int64_t expected = taken * resampler->outRate / resampler->inRate + resampler->margin;
-    uint8_t* out = reinterpret_cast<uint8_t*>(dst);
-    const uint8_t* in = reinterpret_cast<const uint8_t*>(src);
+    uint8_t* out = static_cast<uint8_t*>(dst);
+    const uint8_t* in = static_cast<const uint8_t*>(src);
     const int made = swr_convert(resampler->context.get(), &out,
                                  static_cast<int>(std::min<int64_t>(dstSize, expected)), &in, taken);
     *consumed = made < 0 ? 0 : taken;

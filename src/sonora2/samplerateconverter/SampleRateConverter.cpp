@@ -18,8 +18,8 @@ using peru::IMemoryBlock;
 namespace {
 
 constexpr int kMaxChannels = CSampleRateConverter::CChannelConverter::kMaxChannels;
-constexpr int kSampleBytes = sizeof(int16_t);
-constexpr int kOutputBlockBytes = CSampleRateConverter::kMaxOutputFrames * kSampleBytes;
+constexpr int kNarrow = sizeof(int16_t); // bytes of a sample inside the converter
+constexpr int kWide = sizeof(int32_t);
 constexpr int kMaxRate = 1 << 24; // far above any real rate; bounds the memory of a flush
 
 constexpr int kFilterSize = 16;
@@ -31,8 +31,8 @@ struct SResamplerDeleter {
     void operator()(SResampler* resampler) const { resamplerClose(resampler); }
 };
 
-int16_t* shorts(const P<IMemoryBlock>& block) {
-    return reinterpret_cast<int16_t*>(block->getData());
+template <class Sample = int16_t> Sample* samplesOf(const P<IMemoryBlock>& block) {
+    return reinterpret_cast<Sample*>(block->getData());
 }
 
 } // namespace
@@ -53,14 +53,17 @@ struct CSampleRateConverter::SImpl {
     int srcRate, srcChannels, srcBytes;
     int dstRate, dstChannels, dstBytes;
     bool planarOutput;
+    int sampleBytes; // kNarrow, or kWide where the output is wider
     uint32_t outputPosition = 0;
     P<CChannelConverter> matrix; // set by the first conversion
     std::array<SChannel, kMaxChannels> channels;
 
     void prepare();
     P<IMemoryBlock> makeSilence();
-    void split(const int16_t* pcm, int frames);
+    P<IMemoryBlock> widen(const uint8_t* bytes, int frames);
+    void split(const void* pcm, int frames);
     void resample(SChannel& channel);
+    template <class Sample> P<IMemoryBlock> order(int frames);
     P<IMemoryBlock> assemble(int frames);
 };
 
@@ -74,14 +77,14 @@ void CSampleRateConverter::SImpl::prepare() {
         throw peru::CError(
             peru::format("CSampleRateConverter: no suitable ChannelConversion found for %d -> %d",
                          srcChannels, dstChannels));
-    if (dstBytes != 1 && dstBytes != 2)
+    if (dstBytes < 1 || dstBytes > 4)
         throw peru::CError(peru::format(
             "CSampleRateConverter: could not convert samples from short DstBytesPerSample %d", dstBytes));
     for (int i = 0; i < dstChannels; ++i) {
         SChannel& channel = channels[i];
         if (srcRate <= kMaxRate && dstRate <= kMaxRate)
             channel.resampler.reset(
-                resamplerInit(dstRate, srcRate, kFilterSize, kPhaseShift, kLinear, kCutoff));
+                resamplerInit(dstRate, srcRate, kFilterSize, kPhaseShift, kLinear, kCutoff, sampleBytes));
         if (!channel.resampler)
             throw peru::CError(
                 peru::format("CSampleRateConverter: no filter could be made for %d -> %d frames per second",
@@ -99,35 +102,50 @@ P<IMemoryBlock> CSampleRateConverter::SImpl::makeSilence() {
     return block;
 }
 
-void CSampleRateConverter::SImpl::split(const int16_t* pcm, int frames) {
-    CChannelConverter::SourcePointers source{};
-    for (int i = 0; i < srcChannels; ++i) source[i] = pcm + i;
+P<IMemoryBlock> CSampleRateConverter::SImpl::widen(const uint8_t* bytes, int frames) {
+    const int64_t samples = int64_t{frames} * srcChannels;
+    P<IMemoryBlock> block = memoryManager->getBlock(samples * sampleBytes);
+    if (sampleBytes == kWide)
+        widenToInt(bytes, srcBytes, samples, samplesOf<int32_t>(block));
+    else
+        widenToShort(bytes, srcBytes, samples, samplesOf(block));
+    return block;
+}
+
+void CSampleRateConverter::SImpl::split(const void* pcm, int frames) {
     CChannelConverter::PlanePointers planes{};
+    CChannelConverter::WidePlanePointers widePlanes{};
     for (int i = 0; i < dstChannels; ++i) {
         SChannel& channel = channels[i];
         const int64_t carry = channel.input->getSize() - channel.carryBytes;
-        const int64_t added = int64_t{frames} * kSampleBytes;
+        const int64_t added = int64_t{frames} * sampleBytes;
         P<IMemoryBlock> block = memoryManager->getBlock(carry + added);
         if (carry > 0)
             std::memcpy(block->getData(), channel.input->getData() + channel.carryBytes,
                         static_cast<size_t>(carry));
-        planes[i] = reinterpret_cast<int16_t*>(block->getData() + carry);
-        if (!matrix->isPlaneWritten(i) && added > 0) std::memset(planes[i], 0, static_cast<size_t>(added));
+        uint8_t* plane = block->getData() + carry;
+        planes[i] = reinterpret_cast<int16_t*>(plane);
+        widePlanes[i] = reinterpret_cast<int32_t*>(plane);
+        if (!matrix->isPlaneWritten(i) && added > 0) std::memset(plane, 0, static_cast<size_t>(added));
         channel.input = std::move(block);
         channel.carryBytes = 0;
     }
-    matrix->convert(frames, source, srcChannels * kSampleBytes, planes);
+    if (sampleBytes == kWide)
+        return matrix->convertWide(frames, static_cast<const int32_t*>(pcm), widePlanes);
+    CChannelConverter::SourcePointers source{};
+    for (int i = 0; i < srcChannels; ++i) source[i] = static_cast<const int16_t*>(pcm) + i;
+    matrix->convert(frames, source, srcChannels * kNarrow, planes);
 }
 
 void CSampleRateConverter::SImpl::resample(SChannel& channel) {
-    const int samples = static_cast<int>(channel.input->getSize() / kSampleBytes);
-    channel.output = memoryManager->getBlock(kOutputBlockBytes);
+    const int samples = static_cast<int>(channel.input->getSize() / sampleBytes);
+    channel.output = memoryManager->getBlock(int64_t{kMaxOutputFrames} * sampleBytes);
     int consumed = 0;
-    channel.produced = resamplerRun(channel.resampler.get(), shorts(channel.output), shorts(channel.input),
-                                    &consumed, samples, kMaxOutputFrames);
+    channel.produced = resamplerRun(channel.resampler.get(), channel.output->getData(),
+                                    channel.input->getData(), &consumed, samples, kMaxOutputFrames);
     if (channel.produced < 0) throw std::bad_alloc();
     channel.carrySamples = samples - consumed;
-    channel.carryBytes = consumed * kSampleBytes;
+    channel.carryBytes = consumed * sampleBytes;
     // Usually nothing is left over: return the block to the pool before the next chunk needs one.
     if (channel.carrySamples == 0) {
         channel.input = memoryManager->getBlock(0);
@@ -135,21 +153,30 @@ void CSampleRateConverter::SImpl::resample(SChannel& channel) {
     }
 }
 
-P<IMemoryBlock> CSampleRateConverter::SImpl::assemble(int frames) {
-    const P<IMemoryBlock> block = memoryManager->getBlock(int64_t{dstBytes} * dstChannels * frames);
-    // 16-bit samples are written in place; 8-bit samples are narrowed from the same order of samples.
-    P<IMemoryBlock> ordered = block;
-    if (dstBytes == 1) ordered = memoryManager->getBlock(int64_t{kSampleBytes} * dstChannels * frames);
+// The planes' samples in the order of the output.
+template <class Sample> P<IMemoryBlock> CSampleRateConverter::SImpl::order(int frames) {
+    const P<IMemoryBlock> ordered = memoryManager->getBlock(int64_t{sampleBytes} * dstChannels * frames);
     if (planarOutput) {
         for (int i = 0; i < dstChannels; ++i)
-            std::memcpy(shorts(ordered) + int64_t{i} * frames, channels[i].output->getData(),
-                        static_cast<size_t>(frames) * kSampleBytes);
+            std::memcpy(samplesOf<Sample>(ordered) + int64_t{i} * frames, channels[i].output->getData(),
+                        static_cast<size_t>(frames) * sizeof(Sample));
     } else {
-        std::array<const int16_t*, kMaxChannels> planes{};
-        for (int i = 0; i < dstChannels; ++i) planes[i] = shorts(channels[i].output);
-        interleave(planes, dstChannels, frames, shorts(ordered));
+        std::array<const Sample*, kMaxChannels> planes{};
+        for (int i = 0; i < dstChannels; ++i) planes[i] = samplesOf<Sample>(channels[i].output);
+        interleave(planes, dstChannels, frames, samplesOf<Sample>(ordered));
     }
-    if (dstBytes == 1) narrowToByte(shorts(ordered), int64_t{dstChannels} * frames, block->getData());
+    return ordered;
+}
+
+P<IMemoryBlock> CSampleRateConverter::SImpl::assemble(int frames) {
+    const P<IMemoryBlock> ordered = sampleBytes == kWide ? order<int32_t>(frames) : order<int16_t>(frames);
+    if (dstBytes == sampleBytes) return ordered;
+    const int64_t samples = int64_t{dstChannels} * frames;
+    const P<IMemoryBlock> block = memoryManager->getBlock(samples * dstBytes);
+    if (dstBytes == 1)
+        narrowToByte(samplesOf(ordered), samples, block->getData());
+    else
+        narrowTo24(samplesOf<int32_t>(ordered), samples, block->getData());
     return block;
 }
 
@@ -165,6 +192,7 @@ CSampleRateConverter::CSampleRateConverter(int srcRate, int srcChannels, int src
     m_impl->dstChannels = dstChannels;
     m_impl->dstBytes = dstBytes;
     m_impl->planarOutput = planarOutput;
+    m_impl->sampleBytes = dstBytes > kNarrow ? kWide : kNarrow;
 }
 
 CSampleRateConverter::~CSampleRateConverter() = default;
@@ -197,14 +225,12 @@ P<audio::IAudioChunk> CSampleRateConverter::convert(const void* data, int size) 
     }
     const int frames = static_cast<int>(byteCount / s.srcChannels / s.srcBytes);
 
-    // 16-bit samples are used in place.
-    P<IMemoryBlock> narrowed;
-    const int16_t* pcm = reinterpret_cast<const int16_t*>(bytes);
-    if (s.srcBytes != kSampleBytes || reinterpret_cast<uintptr_t>(bytes) % alignof(int16_t) != 0) {
-        const int64_t samples = int64_t{frames} * s.srcChannels;
-        narrowed = s.memoryManager->getBlock(samples * kSampleBytes);
-        widenToShort(bytes, s.srcBytes, samples, shorts(narrowed));
-        pcm = shorts(narrowed);
+    // Samples of the inner width are used in place.
+    P<IMemoryBlock> widened;
+    const void* pcm = bytes;
+    if (s.srcBytes != s.sampleBytes || reinterpret_cast<uintptr_t>(bytes) % s.sampleBytes != 0) {
+        widened = s.widen(bytes, frames);
+        pcm = widened->getData();
     }
 
     s.split(pcm, frames);

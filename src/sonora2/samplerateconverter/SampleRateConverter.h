@@ -20,8 +20,10 @@ public:
     // lost.
     static constexpr int kMaxOutputFrames = 96000;
 
-    // Bytes per sample: 1 to 4 in, 1 or 2 out. Without a memory manager the converter creates its own. With
-    // planarOutput the chunks hold plane after plane instead of interleaved frames.
+    // Bytes per sample: 1 to 4, in and out. Output of 1 and 2 bytes is computed with 16 bits, wider output
+    // with
+    // 32. Without a memory manager the converter creates its own. With planarOutput the chunks hold plane
+    // after plane instead of interleaved frames.
     CSampleRateConverter(int srcRate, int srcChannels, int srcBytes, int dstRate, int dstChannels,
                          int dstBytes, const P<peru::IMemoryManager>& memoryManager = nullptr,
                          bool planarOutput = false);

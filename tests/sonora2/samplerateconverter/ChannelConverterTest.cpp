@@ -62,6 +62,26 @@ std::vector<int16_t> makeFrames(int channels, int frames) {
     return samples;
 }
 
+// The same mixes with 32 bits: the lower half of a sample carries the inverted upper one.
+void expectWide(const CChannelConverter& converter, const SMatrix& matrix, const std::vector<int16_t>& narrow,
+                int frames) {
+    std::vector<int32_t> input(narrow.size());
+    for (size_t i = 0; i < input.size(); ++i) input[i] = narrow[i] * 65536 + (narrow[i] ^ 0xffff) % 65536;
+    std::vector<std::vector<int32_t>> planes(6, std::vector<int32_t>(static_cast<size_t>(frames), 77));
+    std::vector<std::vector<int32_t>> expected = planes;
+    for (const SMix& mix : matrix.mixes)
+        for (int i = 0; i < frames; ++i) {
+            int64_t sum = 0;
+            for (int c = 0; c < matrix.sourceChannels; ++c)
+                sum += int64_t{mix.weights[c]} * input[static_cast<size_t>(i) * matrix.sourceChannels + c];
+            expected[mix.plane][i] = static_cast<int32_t>(sum / mix.divisor);
+        }
+    CChannelConverter::WidePlanePointers targets{};
+    for (int p = 0; p < 6; ++p) targets[p] = planes[p].data();
+    converter.convertWide(frames, input.data(), targets);
+    EXPECT_EQ(planes, expected);
+}
+
 TEST(ChannelConverter, MixesAsTheMatricesSay) {
     constexpr int16_t kUntouched = 0x5a5a;
     for (const SMatrix& matrix : matrices())
@@ -96,6 +116,7 @@ TEST(ChannelConverter, MixesAsTheMatricesSay) {
                 for (int p = 0; p < matrix.destinationChannels; ++p) targets[p] = planes[p].data();
                 converter->convert(frames, source, step * 2, targets);
                 EXPECT_EQ(planes, expected);
+                if (padding == 0) expectWide(*converter, matrix, input, frames);
                 for (int p = 0; p < matrix.destinationChannels; ++p)
                     EXPECT_EQ(converter->isPlaneWritten(p), written[p]) << p;
             }

@@ -1,6 +1,7 @@
 #include "sonora2/samplerateconverter/SampleRateConverter.h"
 
 #include "sonora2/ScriptedMedia.h"
+#include "support/Environment.h"
 #include "support/TempFolder.h"
 
 #include <gtest/gtest.h>
@@ -59,18 +60,21 @@ std::string flush(CSampleRateConverter& converter) {
     return tests::bytesOf(converter.convert(nullptr, 0));
 }
 
-std::string convertInCuts(const SShape& shape, const Samples& input, unsigned seed, int largestCut) {
+std::string convertInCuts(const SShape& shape, const std::string& input, unsigned seed, int largestCut) {
     std::mt19937 random(seed);
     const P<CSampleRateConverter> converter = makeConverter(shape);
     std::string output;
-    const size_t frames = input.size() / shape.srcChannels;
-    for (size_t at = 0; at < frames;) {
-        const size_t cut = std::min<size_t>(1 + random() % largestCut, frames - at);
-        output += tests::bytesOf(converter->convert(input.data() + at * shape.srcChannels,
-                                                    static_cast<int>(cut * shape.srcChannels * 2)));
+    const size_t frameBytes = static_cast<size_t>(shape.srcChannels) * shape.srcBytes;
+    for (size_t at = 0; at < input.size();) {
+        const size_t cut = std::min((1 + random() % largestCut) * frameBytes, input.size() - at);
+        output += tests::bytesOf(converter->convert(input.data() + at, static_cast<int>(cut)));
         at += cut;
     }
     return output + flush(*converter);
+}
+std::string convertInCuts(const SShape& shape, const Samples& input, unsigned seed, int largestCut) {
+    const std::string bytes(reinterpret_cast<const char*>(input.data()), input.size() * sizeof(int16_t));
+    return convertInCuts(shape, bytes, seed, largestCut);
 }
 
 TEST(SampleRateConverter, OutputDoesNotDependOnHowTheInputIsCut) {
@@ -256,8 +260,8 @@ TEST(SampleRateConverter, SaysWhyItCannotConvert) {
          "CSampleRateConverter: could not convert samples to short SrcBytesPerSample 5"},
         {{44100, 2, 0, 44100, 2, 2},
          "CSampleRateConverter: could not convert samples to short SrcBytesPerSample 0"},
-        {{44100, 2, 2, 44100, 2, 3},
-         "CSampleRateConverter: could not convert samples from short DstBytesPerSample 3"},
+        {{44100, 2, 2, 44100, 2, 5},
+         "CSampleRateConverter: could not convert samples from short DstBytesPerSample 5"},
         {{0, 2, 2, 44100, 2, 2},
          "CSampleRateConverter: no filter could be made for 0 -> 44100 frames per second"},
         {{2000000000, 6, 4, 1, 1, 1},
@@ -284,40 +288,66 @@ TEST(SampleRateConverter, KeepsItsMemoryInThePool) {
     EXPECT_EQ(pool->getCachedBytes(), cached);
 }
 
+// Samples of any width, left-justified in 32 bits.
+std::vector<int64_t> widen(const std::string& bytes, size_t width) {
+    std::vector<int64_t> samples(bytes.size() / width);
+    for (size_t i = 0; i < samples.size(); ++i) {
+        int32_t sample = 0;
+        std::memcpy(reinterpret_cast<char*>(&sample) + 4 - width, &bytes[i * width], width);
+        samples[i] = sample;
+    }
+    return samples;
+}
+
 // The same filter in another program is the judge of the settings and of the seams between calls.
 TEST(SampleRateConverter, MatchesThePeerWithTheSameFilter) {
     const tests::CTempFolder folder;
-    for (const auto& [srcRate, dstRate] : {std::pair{44100, 48000}, {48000, 44100}, {96000, 44100}})
-        for (const bool sweep : {false, true}) {
-            SCOPED_TRACE(testing::Message() << srcRate << " -> " << dstRate << (sweep ? " sweep" : " noise"));
-            const Samples input = sweep ? makeSweep(srcRate, 2, 3.0) : makeNoise(srcRate * 2 * 3, 5);
-            const std::string bytes(reinterpret_cast<const char*>(input.data()), input.size() * 2);
-            const std::string in = folder.write("in.raw", bytes).string();
-            const std::string out = (folder / "out.raw").string();
-            const std::string command =
-                "ffmpeg -nostdin -v error -y -f s16le -ar " + std::to_string(srcRate) + " -ac 2 -i " + in +
-                " -af aresample=" + std::to_string(dstRate) +
-                ":filter_size=16:phase_shift=10:linear_interp=0:exact_rational=0:cutoff=1.0:filter_type="
-                "kaiser"
-                ":kaiser_beta=9:resampler=swr:internal_sample_fmt=s16p -f s16le -ar " +
-                std::to_string(dstRate) + " -ac 2 " + out;
-            ASSERT_EQ(std::system(command.c_str()), 0);
-            const std::string expected = tests::readFile(out);
-            const std::string actual = convertInCuts({srcRate, 2, 2, dstRate, 2, 2}, input, 4, 4000);
-
-            // The peer ends its filter in another way than with silence: its last samples are left out.
-            const size_t count = expected.size() / 2 - 2 * 64;
-            ASSERT_GT(count, static_cast<size_t>(dstRate) * 5);
-            ASSERT_GE(actual.size() / 2, count);
-            int worst = 0;
-            for (size_t i = 0; i < count; ++i) {
-                int16_t a, b;
-                std::memcpy(&a, &actual[i * 2], 2);
-                std::memcpy(&b, &expected[i * 2], 2);
-                worst = std::max(worst, std::abs(a - b));
-            }
-            EXPECT_LE(worst, 2);
+    const std::string filter = "filter_size=16:phase_shift=10:linear_interp=0:exact_rational=0:cutoff=1.0:"
+                               "filter_type=kaiser:kaiser_beta=9:resampler=swr";
+    struct SCase {
+        int srcRate, dstRate, bytes;
+        bool isSweep, isBest;
+    };
+    for (const SCase& c : std::initializer_list<SCase>{{44100, 48000, 2, false, false},
+                                                       {44100, 48000, 2, true, false},
+                                                       {48000, 44100, 2, true, false},
+                                                       {96000, 44100, 2, false, false},
+                                                       {96000, 44100, 2, true, false},
+                                                       {44100, 48000, 3, false, false},
+                                                       {96000, 44100, 4, false, false},
+                                                       {96000, 44100, 4, true, true}}) {
+        SCOPED_TRACE(testing::Message() << c.srcRate << " -> " << c.dstRate << ", " << c.bytes << " bytes");
+        const Samples input = c.isSweep ? makeSweep(c.srcRate, 2, 3.0) : makeNoise(c.srcRate * 2 * 3, 5);
+        std::string bytes;
+        for (const int16_t sample : input) {
+            // Noise fills all bits of a wider sample, and leaves it room for what the filter adds.
+            const int32_t wide = sample * 0x8000 + (c.isSweep ? 0 : (sample * 12347) & 0x7fff);
+            const auto* from = c.bytes == 2 ? reinterpret_cast<const char*>(&sample)
+                                            : reinterpret_cast<const char*>(&wide) + 4 - c.bytes;
+            bytes.append(from, c.bytes);
         }
+        const std::string in = folder.write("in.raw", bytes).string(), out = (folder / "out.raw").string();
+        const std::string width = std::to_string(c.bytes * 8), target = std::to_string(c.dstRate);
+        const std::string command = "ffmpeg -nostdin -v error -y -f s" + width + "le -ar " +
+                                    std::to_string(c.srcRate) + " -ac 2 -i " + in +
+                                    " -af aresample=" + target +
+                                    ":internal_sample_fmt=" + (c.bytes == 2 ? "s16p:" : "s32p:") +
+                                    (c.isBest ? "resampler=soxr:precision=28" : filter) + " -f s" + width +
+                                    "le -ar " + target + " -ac 2 " + out;
+        ASSERT_EQ(std::system(command.c_str()), 0);
+        const std::vector<int64_t> expected = widen(tests::readFile(out), c.bytes);
+        const tests::CEnvironment best("TONEWRIGHT_RESAMPLER", c.isBest ? "best" : "");
+        const SShape shape{c.srcRate, 2, c.bytes, c.dstRate, 2, c.bytes};
+        const std::vector<int64_t> actual = widen(convertInCuts(shape, bytes, 4, 4000), c.bytes);
+
+        // The peer ends its filter in another way than with silence: its last samples are left out.
+        const size_t count = expected.size() - (c.isBest ? 8000 : 128);
+        ASSERT_GT(count, static_cast<size_t>(c.dstRate) * 5);
+        ASSERT_GE(actual.size(), count);
+        int64_t worst = 0;
+        for (size_t i = 0; i < count; ++i) worst = std::max(worst, std::abs(actual[i] - expected[i]));
+        EXPECT_LE(worst, int64_t{2} << (8 * (4 - c.bytes))) << "two steps of the width";
+    }
 }
 
 } // namespace
