@@ -199,8 +199,8 @@ TONEWRIGHT_API void TONEWRIGHT_AddProxyLogManager(TONEWRIGHT_Handle log);
 /* Removes a log added with TONEWRIGHT_AddProxyLogManager. An unknown log or a bad handle is ignored. */
 TONEWRIGHT_API void TONEWRIGHT_RemoveProxyLogManager(TONEWRIGHT_Handle log);
 
-/* The readable file extensions for a mask of TONEWRIGHT_CodecType: a list handle, or null when not started.
- */
+/* The file extensions that can be read or written, for a mask of TONEWRIGHT_CodecType: a list handle, or null
+ * when not started. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_getValidCodecExtensions(int32_t types);
 
 /* The number of entries of that list. Bad handle: 0. */

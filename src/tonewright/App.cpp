@@ -7,6 +7,7 @@
 #include "peru/uri/URI.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/plugins/MediaEnvironment.h"
+#include "tonewright/Quietly.h"
 #include "tonewright/SonoraLogManagerProxy.h"
 
 #include <algorithm>
@@ -67,6 +68,13 @@ bool fail(const char* text) {
     return false;
 }
 
+// Empty after an exception, whose reason is in the log.
+template <class T, class Make> P<T> attempt(Make make) {
+    P<T> made;
+    quietly("CApp::init", [&] { made = make(); });
+    return made;
+}
+
 } // namespace
 
 CApp::CApp() : m_userDataPath(peru::CString::empty()) {}
@@ -93,14 +101,16 @@ bool CApp::init() {
                               ->resolveAgainst(system->getDataFolder());
 
     m_logProxy = peru::make<CSonoraLogManagerProxy>();
-    m_readContext = makeContext(kReadFlags, kReadPlugins);
+    m_readContext = attempt<ISonoraContext>([this] { return makeContext(kReadFlags, kReadPlugins); });
     if (!m_readContext) return fail("CApp::init could not create SonoraReadContext");
-    m_readPluginHandler = peru::make<CPluginHandler>(m_readContext, false);
+    m_readPluginHandler =
+        attempt<CPluginHandler>([this] { return peru::make<CPluginHandler>(m_readContext, false); });
     if (!m_readPluginHandler) return fail("CApp::init could not create SonoraReadPluginHandler");
 
-    m_writeContext = makeContext(kWriteFlags, kWritePlugins);
+    m_writeContext = attempt<ISonoraContext>([this] { return makeContext(kWriteFlags, kWritePlugins); });
     if (!m_writeContext) return fail("CApp::init could not create SonoraWriteContext");
-    m_writePluginHandler = peru::make<CPluginHandler>(m_writeContext, false);
+    m_writePluginHandler =
+        attempt<CPluginHandler>([this] { return peru::make<CPluginHandler>(m_writeContext, false); });
     if (!m_writePluginHandler) return fail("CApp::init could not create SonoraWritePluginHandler");
     sonora2::common::setMediaEnvironment(
         {m_readContext, m_readPluginHandler, m_writeContext, m_writePluginHandler});
@@ -114,6 +124,7 @@ bool CApp::init() {
 P<ISonoraContext> CApp::makeContext(uint64_t flags, std::span<const char* const> plugins) const {
     P<ISonoraContext> context = peru::make<sonora2::audio::CSonoraContextAudio>();
     context->setLogManager(m_logProxy);
+    context->getBaseDirectories()->setDataDirectory(m_productDataFolder);
     context->setFlags(flags);
     for (const char* name : plugins) context->addPluginName(name);
     for (const std::string& name : findAddedPlugins()) context->addPluginName(peru::CString::fromUTF8(name));

@@ -36,6 +36,15 @@ double readDouble(const P<IXmlNode>& parent, const char* name, double missing) {
     return value;
 }
 
+// The mixer counts milliseconds in 32 bits.
+double readTime(const P<IXmlNode>& parent, const char* name) {
+    constexpr double kLimit = 4000000.0;
+    const double time = readDouble(parent, name, 0.0);
+    if (std::fabs(time) <= kLimit) return time;
+    throw peru::CParseError(
+        peru::format("An arrangement is limited to %.0f seconds. (%s: \"%g\")", kLimit, name, time));
+}
+
 void readModifiers(const P<IXmlNode>& node, CTrack& track) {
     for (auto modifiers = node->getChildNodesByName("Modifier"); modifiers.hasMore();) {
         const P<IXmlNode> fade = modifiers.getNext()->getChildNode("TrackModifierFade");
@@ -50,9 +59,9 @@ void readModifiers(const P<IXmlNode>& node, CTrack& track) {
 
 P<CTrack> readTrack(const P<IXmlNode>& node) {
     const P<CTrack> track = peru::make<CTrack>();
-    track->setTrackStart(readDouble(node, "TrackStart", 0.0));
-    track->setSourceStartTime(readDouble(node, "SourceStartTime", 0.0));
-    track->setSourceEndTime(readDouble(node, "SourceEndTime", 0.0));
+    track->setTrackStart(readTime(node, "TrackStart"));
+    track->setSourceStartTime(readTime(node, "SourceStartTime"));
+    track->setSourceEndTime(readTime(node, "SourceEndTime"));
     track->setURI(peru::make<peru::CURI>(readText(node, "Uri")));
     if (const P<IXmlNode> modifiers = node->getChildNode("Modifiers")) readModifiers(modifiers, *track);
     return track;

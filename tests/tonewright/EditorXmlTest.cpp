@@ -90,6 +90,8 @@ TEST(EditorXml, BadText_IsRefused) {
                             "<x><Tracks><Track><TrackStart>soon</TrackStart></Track></Tracks></x>",
                             "<x><Tracks><Track><SourceEndTime>1,5</SourceEndTime></Track></Tracks></x>",
                             "<x><Tracks><Track><SourceEndTime>inf</SourceEndTime></Track></Tracks></x>",
+                            "<x><Tracks><Track><SourceEndTime>1e300</SourceEndTime></Track></Tracks></x>",
+                            "<x><Tracks><Track><TrackStart>-4000001</TrackStart></Track></Tracks></x>",
                             "<x><Tracks><Track><TrackStart>nan</TrackStart></Track></Tracks></x>"})
         EXPECT_THROW(readEditorXml(xml), peru::CParseError) << xml;
     EXPECT_THROW(readEditorXml("<x><Tracks><Track><Uri>http://[</Uri></Track></Tracks></x>"),

@@ -1,10 +1,13 @@
 // What exports do to the files of a user, with the real plug-ins.
 #include "Library.h"
 #include "sonora2/context/LastFailure.h"
+#include "sonora2/plugins/MediaEnvironment.h"
 #include "support/Files.h"
 #include "tonewright/ICallbackTargets.h"
 
 #include <gmock/gmock.h>
+
+#include <set>
 
 namespace {
 
@@ -143,6 +146,27 @@ TEST_P(ExportFiles, FormatThatDoesNotFit_LeavesNothing) {
         EXPECT_EQ(TONEWRIGHT_AudioFormat_Open(makeFormat(target, 44100, 1).get()), 5) << "one bit per second";
     }
     EXPECT_TRUE(list().empty());
+}
+
+TEST_F(ExportReasons, StartUp_PreparesBothSides) {
+    const auto list = [](int32_t types) {
+        const CHandle extensions(TONEWRIGHT_getValidCodecExtensions(types));
+        std::set<std::u16string> names;
+        for (int32_t i = 0; i < TONEWRIGHT_getExtensionCount(extensions.get()); ++i)
+            names.insert(TONEWRIGHT_GetText(CHandle(TONEWRIGHT_getExtension(extensions.get(), i)).get()));
+        return names;
+    };
+    EXPECT_EQ(list(TONEWRIGHT_AUDIO_FORMAT).count(u"mp3"), 1u);
+    EXPECT_EQ(list(TONEWRIGHT_AUDIO_FORMAT).count(u"mp2"), 0u) << "read, but not written";
+    EXPECT_EQ(list(TONEWRIGHT_AUDIO_SOURCE).count(u"mp2"), 1u);
+    EXPECT_EQ(list(TONEWRIGHT_IMAGE | TONEWRIGHT_AUDIO_FORMAT).size(), 4u);
+    // Plug-ins decide by the flag words, which a host cannot see.
+    const auto environment = sonora2::common::getMediaEnvironment();
+    EXPECT_EQ(environment.readContext->getFlags(), 0x23E8u);
+    EXPECT_EQ(environment.writeContext->getFlags(), 0x3C8u);
+    for (const auto& context : {environment.readContext, environment.writeContext})
+        EXPECT_THAT(text(context->getBaseDirectories()->getDataDirectory()->getAsString()),
+                    testing::EndsWith("/Zelvanor%20Tonewright%204/"));
 }
 
 // What a host shows its user.

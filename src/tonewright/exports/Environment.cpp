@@ -1,5 +1,6 @@
 #include "filetag/FileTagFactory.h"
 #include "peru/log/ILog.h"
+#include "sonora2/plugins/PluginExtensions.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"
@@ -39,8 +40,19 @@ void TONEWRIGHT_RemoveProxyLogManager(TONEWRIGHT_Handle log) {
 }
 
 TONEWRIGHT_Handle TONEWRIGHT_getValidCodecExtensions(int32_t types) {
-    return barrier<TONEWRIGHT_Handle>(
-        nullptr, [&] { return wrap(requireApp()->getReadPluginHandler()->getValidExtensions(types)); });
+    return barrier<TONEWRIGHT_Handle>(nullptr, [&] {
+        const P<CApp> app = requireApp();
+        const P<IPluginExtensions> read = app->getReadPluginHandler()->getValidExtensions(types);
+        // Some plug-ins only write, and belong to the other handler.
+        constexpr int kFormats = sonora2::common::kVideoFormat | sonora2::common::kAudioFormat;
+        if (!(types & kFormats) || (types & sonora2::common::kImage)) return wrap(read);
+        const P<IPluginExtensions> written =
+            app->getWritePluginHandler()->getValidExtensions(types & kFormats);
+        const auto all = peru::make<sonora2::common::CPluginExtensions>();
+        for (const P<IPluginExtensions>& list : {read, written})
+            for (int i = 0; i < list->getCount(); ++i) all->addExtension(list->getExtension(i));
+        return wrap(all);
+    });
 }
 
 int32_t TONEWRIGHT_getExtensionCount(TONEWRIGHT_Handle extensions) {
