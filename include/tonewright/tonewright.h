@@ -193,10 +193,15 @@ TONEWRIGHT_API void TONEWRIGHT_SetTempExtension(const char16_t* extension);
 TONEWRIGHT_API void TONEWRIGHT_SetDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback);
 
 /* Adds the host's own log, a handle of a peru::ILogManager, which receives every message from now on. The
- * library holds a reference until it is removed. A bad handle is ignored. */
+ * library holds a reference until it is removed. A bad handle is ignored.
+ *
+ * The log is called on whichever thread logs, the library's own threads included, by one thread at a time and
+ * with locks of the library held. It must therefore return soon, must not throw, must not call the library
+ * except for handles' texts, and must not wait for a thread that may be inside the library. */
 TONEWRIGHT_API void TONEWRIGHT_AddProxyLogManager(TONEWRIGHT_Handle log);
 
-/* Removes a log added with TONEWRIGHT_AddProxyLogManager. An unknown log or a bad handle is ignored. */
+/* Removes a log added with TONEWRIGHT_AddProxyLogManager; it is not called any more once this has returned.
+ * An unknown log or a bad handle is ignored. */
 TONEWRIGHT_API void TONEWRIGHT_RemoveProxyLogManager(TONEWRIGHT_Handle log);
 
 /* The file extensions that can be read or written, for a mask of TONEWRIGHT_CodecType: a list handle, or null

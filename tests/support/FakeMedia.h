@@ -103,11 +103,9 @@ public:
         m_opened = false;
     }
     void close() override { m_opened = false; }
-    // Carries the settings too, for a test that sees no more of the format than a host does.
     int64_t getEstimatedSizeBytes(double duration) override {
         return static_cast<int64_t>(duration * params.nSampleRate * params.nChannelCount *
-                                        params.nBytesPerSample +
-                                    std::max(quality, 0.0) * 10 + std::max(bitRates[1], 0));
+                                    params.nBytesPerSample);
     }
     int getSampleRate() override { return params.nSampleRate; }
     int getChannelCount() override { return params.nChannelCount; }

@@ -2,7 +2,10 @@
 #include "support/Environment.h"
 
 #include <algorithm>
+#include <csignal>
 #include <functional>
+#include <sstream>
+#include <unistd.h>
 
 namespace {
 
@@ -137,6 +140,27 @@ TEST(Start, Startup_ThatFailsLateLeavesWhatItHadUntilTheEnd) {
     EXPECT_FALSE(TONEWRIGHT_CreateAudioSourceFromURI(u"file:///a.tst", 44100, 2, 2, 0));
     EXPECT_EQ(TONEWRIGHT_InitStartup(), 0);
     TONEWRIGHT_DeInitAll();
+}
+
+TEST(Start, Canceller_GetsTheProcessAndEndsWithTheLibrary) {
+    CPluginFolder plugins;
+    CTempFolder folder;
+    const auto script = folder.write("CancelAutoplay2", "#!/bin/sh\n"
+                                                        "echo $$ \"$@\" > \"${0%/*}/new\"\n"
+                                                        "mv \"${0%/*}/new\" \"${0%/*}/told\"\n"
+                                                        "exec sleep 100\n");
+    std::filesystem::permissions(script, std::filesystem::perms(0700));
+    const CEnvironment path("TONEWRIGHT_COMPANION_PATH", folder.path().string());
+    ASSERT_EQ(TONEWRIGHT_InitStartup(), 0);
+    while (!std::filesystem::exists(folder / "told")) usleep(1000);
+    int child = 0;
+    std::istringstream told(readFile(folder / "told"));
+    std::string arguments;
+    std::getline(told >> child >> std::ws, arguments);
+    EXPECT_EQ(arguments, std::to_string(getpid()) + " dummy");
+    EXPECT_EQ(kill(child, 0), 0);
+    TONEWRIGHT_DeInitAll();
+    EXPECT_NE(kill(child, 0), 0);
 }
 
 TEST(Start, End_ReleasesALogThatCameBeforeTheStart) {

@@ -8,6 +8,7 @@
 #include <gmock/gmock.h>
 
 #include <set>
+#include <thread>
 
 namespace {
 
@@ -167,6 +168,35 @@ TEST_F(ExportReasons, StartUp_PreparesBothSides) {
     for (const auto& context : {environment.readContext, environment.writeContext})
         EXPECT_THAT(text(context->getBaseDirectories()->getDataDirectory()->getAsString()),
                     testing::EndsWith("/Zelvanor%20Tonewright%204/"));
+}
+
+// The framework counts severities down, the program's log up.
+TEST_F(ExportReasons, FrameworkMessages_ReachTheHostsLog) {
+    const CHostLog log;
+    const auto framework = sonora2::common::getMediaEnvironment().writeContext->getLogManager();
+    const int32_t levels[] = {5, 3, 2, 1, 0, 2};
+    for (int32_t severity = 0; severity < 6; ++severity) {
+        framework->log(severity, peru::CString::fromUTF8("x"));
+        EXPECT_THAT(log.take(), testing::ElementsAre(SLine{levels[severity], "", "x"})) << severity;
+    }
+    framework->logException(peru::CError("broken"));
+    EXPECT_THAT(log.take(), testing::ElementsAre(SLine{5, "", "Exception: Error Type: broken"}));
+}
+
+// The decoder meets the damage on its own thread, long before the encoder has taken what lies in front of it.
+TEST_F(ExportReasons, DamagedSource_FailsTheJob) {
+    ASSERT_EQ(encode(makeSource(), makeFormat(folder / "x.flac")), 0);
+    std::string bytes = readFile(folder / "x.flac");
+    for (size_t i = 0; i < 4000; ++i) bytes[bytes.size() - 8000 + i] ^= 0x55;
+    folder.write("x.flac", bytes);
+    const CHandle source(
+        TONEWRIGHT_CreateAudioSourceFromURI(toUri(folder / "x.flac").c_str(), 44100, 2, 2, 0));
+    const auto wait = [](auto&) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(200));
+        return true;
+    };
+    EXPECT_EQ(encode(source, makeFormat(folder / "x.wav"), wait), 11);
+    EXPECT_FALSE(fs::exists(folder / "x.wav"));
 }
 
 // What a host shows its user.

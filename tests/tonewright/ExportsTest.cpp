@@ -39,13 +39,16 @@ TEST_F(Exports, Barrier_TurnsEveryExceptionIntoAValueAndALine) {
         script.onOpen = c.thrower;
         CHandle source = makeSource(script);
         log->take();
+        testing::internal::CaptureStderr();
         EXPECT_EQ(TONEWRIGHT_AudioSource_Open(source.get()), 3);
+        const std::string debugOutput = testing::internal::GetCapturedStderr();
         const std::vector<SLine> lines = log->take();
         ASSERT_EQ(lines.size(), 1u);
         EXPECT_EQ(lines[0].level, 5);
         EXPECT_EQ(lines[0].source, "");
         EXPECT_EQ(lines[0].text, c.text ? c.text : lines[0].text);
         EXPECT_NE(lines[0].text, "");
+        EXPECT_THAT(debugOutput, testing::HasSubstr(lines[0].text));
         EXPECT_EQ(TONEWRIGHT_AudioSource_IsOpened(source.get()), 0) << "the lock is free again";
     }
 }
@@ -89,17 +92,22 @@ TEST_F(Exports, Format_GetsItsSettingsOnlyWhenTheyAreGiven) {
     struct SCase {
         double quality;
         int32_t nominal, min, max;
-        int64_t extra;
+        bool setsQuality, setsRates;
     };
-    for (const SCase& c : std::initializer_list<SCase>{{0.0, 0, 0, 0, 0},
-                                                       {0.5, 0, 0, 0, 5},
-                                                       {-1.0, 0, -7, 0, 0},
-                                                       {0.0, 0, 0, 64, 0},
-                                                       {0.2, 1, 32, 64, 34}}) {
+    for (const SCase& c : std::initializer_list<SCase>{{0.0, 0, 0, 0, false, false},
+                                                       {0.5, 0, 0, 0, true, false},
+                                                       {-2.0, 0, -7, 0, false, false},
+                                                       {0.0, 0, 0, 64, false, true},
+                                                       {0.0, 3, 0, 0, false, true},
+                                                       {0.2, 1, 32, 64, true, true}}) {
         CHandle format(TONEWRIGHT_CreateAudioFormatFromURI(u"file:///a.tst", 1000, 2, 2, c.quality, c.nominal,
                                                            c.min, c.max));
         ASSERT_TRUE(format);
-        EXPECT_EQ(TONEWRIGHT_AudioFormat_GetEstiamtedFileSize(format.get(), 2.0), 8000 + c.extra);
+        EXPECT_EQ(TONEWRIGHT_AudioFormat_GetEstiamtedFileSize(format.get(), 2.0), 8000);
+        const auto made = behind<CFakeFormat>(format);
+        EXPECT_EQ(made->quality, c.setsQuality ? c.quality : -1.0);
+        EXPECT_THAT(made->bitRates, ElementsAre(c.setsRates ? c.nominal : -1, c.setsRates ? c.min : -1,
+                                                c.setsRates ? c.max : -1));
     }
     TONEWRIGHT_SetTempExtension(u".part");
     EXPECT_TRUE(
@@ -114,6 +122,7 @@ int g_blocksWanted = 1000;
 
 bool collect(TONEWRIGHT_Handle handle, double fraction, const float* samples, int32_t count, void* user) {
     EXPECT_EQ(handle, *static_cast<TONEWRIGHT_Handle*>(user));
+    EXPECT_EQ(count, 200) << "a hundred steps of two channels";
     g_fractions.push_back(fraction);
     g_samples.insert(g_samples.end(), samples, samples + count);
     return --g_blocksWanted > 0;

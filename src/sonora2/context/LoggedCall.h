@@ -1,4 +1,4 @@
-// Runs a call whose failure is only logged.
+// Runs calls whose failure must not propagate.
 #pragma once
 
 #include "peru/Errors.h"
@@ -8,19 +8,30 @@
 
 namespace sonora2::common {
 
-// The log may be empty.
-template <class Call> void callLogged(const P<ILogManager>& log, Call&& call) noexcept {
+// True if the call completed. Otherwise its exception is passed to `report`, as a peru::CException.
+template <class Call, class Report> bool callReported(Call&& call, Report&& report) noexcept {
     try {
         try {
             call();
+            return true;
         } catch (const peru::CException& exception) {
-            if (log) log->logException(exception);
+            report(exception);
         } catch (const std::exception& exception) {
-            if (log) log->logException(peru::CError(exception.what()));
+            report(peru::CError(exception.what()));
+        } catch (...) {
+            report(peru::CError("unknown"));
         }
     } catch (...) {
-        // The exception carries no text, or logging failed as well.
+        // Reporting failed as well, for instance for lack of memory.
     }
+    return false;
+}
+
+// The same with a log, which may be empty.
+template <class Call> bool callLogged(const P<ILogManager>& log, Call&& call) noexcept {
+    return callReported(call, [&](const peru::CException& exception) {
+        if (log) log->logException(exception);
+    });
 }
 
 } // namespace sonora2::common

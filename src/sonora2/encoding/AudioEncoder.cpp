@@ -1,5 +1,6 @@
 #include "sonora2/encoding/AudioEncoder.h"
 
+#include "sonora2/context/LoggedCall.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/encoding/SampleReader.h"
 #include "sonora2/media/CloseGuard.h"
@@ -15,15 +16,9 @@ constexpr int kBlockFrames = 4608;
 
 // Errors are only logged.
 template <class Media> void closeQuietly(const P<Media>& media, const P<ISonoraContext>& context) noexcept {
-    try {
+    callLogged(context->getLogManager(), [&] {
         if (media && media->isOpened()) media->close();
-    } catch (const peru::CException& exception) {
-        try {
-            if (const P<ILogManager> log = context->getLogManager()) log->logException(exception);
-        } catch (...) {
-        }
-    } catch (...) {
-    }
+    });
 }
 
 } // namespace

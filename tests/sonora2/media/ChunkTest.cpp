@@ -81,9 +81,8 @@ TEST(ParameterRecord, NeverReadsBehindWhatArrived) {
         const auto got = sonora2::common::receiveRecord<SFormatParams>(bytes.data(), available);
         EXPECT_EQ(got.nSize, 116);
         EXPECT_EQ(got.video[91], available >= 96 ? 9 : 0);
-        EXPECT_EQ(got.nSampleRate, available >= 100  ? 48000
-                                   : available >= 98 ? 48000 & 0xffff
-                                                     : got.nSampleRate);
+        const size_t rateBytes = std::clamp<size_t>(available, 96, 100) - 96;
+        EXPECT_EQ(got.nSampleRate, 48000 & ((int64_t{1} << (8 * rateBytes)) - 1));
         EXPECT_EQ(got.nBytesPerSample, 0);
     }
     const SSourceParams none = sonora2::common::receiveRecord<SSourceParams>(nullptr);
