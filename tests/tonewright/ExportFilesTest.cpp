@@ -1,4 +1,4 @@
-// What exports do to the files of a user, with the real plug-ins.
+// Exports with the real plug-ins: effects on the user's files, and reasons of failures.
 #include "Library.h"
 #include "sonora2/context/LastFailure.h"
 #include "sonora2/plugins/MediaEnvironment.h"
@@ -27,7 +27,7 @@ protected:
         return CHandle(TONEWRIGHT_CreateAudioFormatFromURI(toUri(path).c_str(), rate, 2, 2, 0.0, bitRate,
                                                            bitRate, bitRate));
     }
-    // Ten seconds; fails, if it does, after half of them.
+    // Ten seconds long; optionally fails half-way.
     static CHandle makeSource(bool fails = false) {
         auto position = std::make_shared<int>(0);
         SFakeSource script{.rate = 44100, .frames = 441000, .chunkFrames = 4410};
@@ -36,7 +36,7 @@ protected:
         };
         return wrap(peru::make<CFakeSource>(script));
     }
-    // Calls `during` half-way, which may ask the encoder to stop.
+    // Calls `during` once in the middle; it may stop the encoder.
     using During = std::function<bool(tonewright::IEncoderProgressTarget&)>;
     static int32_t encode(const CHandle& source, const CHandle& format, const During& during = {}) {
         const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), format.get()));
@@ -129,7 +129,7 @@ TEST_P(ExportFiles, JobsOfOneTarget_EachFinishAsAWhole) {
         EXPECT_NEAR(getDuration(target), round == 0 ? 4.0 : 10.0, 0.2);
         EXPECT_EQ(list().size(), 2u);
     }
-    // What has taken the place of a new file is not removed with it.
+    // A file that has taken the place of the new one is not removed with it.
     fs::remove(target);
     const auto during = [&](tonewright::IEncoderProgressTarget& job) {
         fs::rename(target, folder / "elsewhere");
@@ -191,11 +191,12 @@ TEST_F(ExportReasons, DamagedSource_FailsTheJob) {
     folder.write("x.flac", bytes);
     const CHandle source(
         TONEWRIGHT_CreateAudioSourceFromURI(toUri(folder / "x.flac").c_str(), 44100, 2, 2, 0));
-    const auto wait = [](auto&) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(200));
+    const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), makeFormat(folder / "x.wav").get()));
+    behind<tonewright::IEncoderProgressTarget>(encoder)->setProgressFunction([](double fraction) {
+        if (fraction > 0.7) std::this_thread::sleep_for(std::chrono::milliseconds(20));
         return true;
-    };
-    EXPECT_EQ(encode(source, makeFormat(folder / "x.wav"), wait), 11);
+    });
+    EXPECT_EQ(TONEWRIGHT_AudioEncoder_Encode(encoder.get()), 11);
     EXPECT_FALSE(fs::exists(folder / "x.wav"));
 }
 
