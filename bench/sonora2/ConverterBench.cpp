@@ -1,4 +1,4 @@
-// Cost of the sample rate converter for each block that a decoder gives.
+// Cost of the sample rate converter per decoder block.
 #include "sonora2/samplerateconverter/ChannelConverters.h"
 
 #include <benchmark/benchmark.h>
@@ -42,7 +42,7 @@ BENCHMARK(convertBlock)
     ->Args({48000, 44100, 6, 2, 2, 2})
     ->Args({48000, 48000, 6, 6, 4, 2});
 
-// A matrix alone; all of them are vectorised where the source is dense.
+// One channel matrix by itself; all are vectorised if the source is dense.
 void mixBlock(benchmark::State& state) {
     const int source = static_cast<int>(state.range(0)), target = static_cast<int>(state.range(1));
     const P<CChannelConverter> matrix = CChannelConverter::create(source, target);

@@ -1,4 +1,4 @@
-// Cost of mixing: the loop alone, and a list of tracks that play at once.
+// Cost of mixing: the loop by itself, and a list of tracks that play at the same time.
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/media/SilentAudioSource.h"
 #include "sonora2/tracks/AudioTrack.h"
@@ -24,7 +24,7 @@ std::vector<int16_t> makeNoise(size_t count, unsigned seed) {
     return noise;
 }
 
-// One step of a stereo list; the bytes are those of the samples that are mixed in.
+// One step of a stereo list; the bytes counted are those of the samples mixed in.
 void mixStep(benchmark::State& state) {
     const std::vector<int16_t> samples = makeNoise(kStepFrames * 2, 1);
     std::vector<int16_t> sum = makeNoise(kStepFrames * 2, 2);
@@ -36,7 +36,7 @@ void mixStep(benchmark::State& state) {
 }
 BENCHMARK(mixStep);
 
-// Tracks that cost nothing themselves, each in a lane of its own, with the worker or without.
+// Tracks without cost of their own, each in its own lane, with or without the worker.
 void playList(benchmark::State& state) {
     const P<common::ISonoraContext> context = peru::make<audio::CSonoraContextAudio>();
     auto list =
@@ -57,8 +57,8 @@ void playList(benchmark::State& state) {
 }
 BENCHMARK(playList)->ArgNames({"tracks", "thread"})->ArgsProduct({{1, 2, 8, 40}, {0, 1}});
 
-// Thousands of tracks one after another, each in a lane of its own: what a step and a skip cost to find the
-// few that play.
+// Thousands of consecutive tracks, each in its own lane: the cost of a step and of a skip to find the few
+// that play.
 void skipInLongList(benchmark::State& state) {
     const P<common::ISonoraContext> context = peru::make<audio::CSonoraContextAudio>();
     auto list = peru::make<audio::CAudioTracklist>(false, context, 44100, 2, 2, kStepFrames, 0.0, 0);

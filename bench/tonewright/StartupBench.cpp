@@ -1,7 +1,7 @@
 // Where the time goes from the start of a process to the end of TONEWRIGHT_InitStartup.
 //
-// Each run is two fresh processes. The first is timed as a whole; the second takes the same steps one by one
-// and marks their ends. Both tell their marks through a pipe, on the clock of the process that started them.
+// Each run starts two new processes. The first is timed as a whole; the second performs the same steps one by
+// one and marks the end of each. Both send their marks through a pipe, on the starting process's clock.
 #include "peru/log/ILog.h"
 #include "peru/system/IDynamicLibrary.h"
 #include "peru/system/ISystem.h"
@@ -62,7 +62,7 @@ int runWhole() {
     return 0;
 }
 
-// The first name makes the handler, which then loads the others.
+// The first name creates the handler, which then loads the others.
 P<CPluginHandler> loadPlugins(const P<ISonoraContext>& context, const std::string& direction,
                               std::initializer_list<const char*> names) {
     P<CPluginHandler> handler;
@@ -80,7 +80,7 @@ P<CPluginHandler> loadPlugins(const P<ISonoraContext>& context, const std::strin
     return handler;
 }
 
-// The plug-ins are those that the application names.
+// The plug-ins are those named by the application.
 int runParts() {
     peru::getLogManager()->info(CString::fromUTF8("tonewright_bench"), "started");
     peru::getSystem()->getMainExecutableFile()->getParent();
@@ -127,7 +127,7 @@ double median(std::vector<double> times) {
     return times[times.size() / 2];
 }
 
-// Starts this program in the given role and adds what each of its steps took.
+// Starts this program in the given role and records the duration of each of its steps.
 bool measure(const char* role, std::vector<SStep>& steps) {
     int ends[2];
     if (pipe(ends) != 0) return false;
@@ -193,7 +193,7 @@ int runAll() {
 
 } // namespace
 
-// Other arguments are those of the benchmarks beside this one, and mean nothing here.
+// Other arguments belong to the neighbouring benchmarks and are ignored.
 int main(int argc, char** argv) {
     mark("process and loader, until main");
     const std::string role = argc > 1 ? argv[1] : "";

@@ -1,5 +1,5 @@
-// Arbitrary bytes as the serial forms that cross the pipe: each ends with an object or an error of its own,
-// and a context that could not be read is as it was.
+// Feeds arbitrary bytes to the serial forms that cross the pipe: each must yield an object or throw, and a
+// context that could not be read must be unchanged.
 #include "peru/Errors.h"
 #include "peru/streams/DataStreams.h"
 #include "peru/streams/MemoryIOStream.h"

@@ -1,4 +1,4 @@
-// Arbitrary bytes as an editor's arrangement: what is read must be usable numbers and URIs.
+// Feeds arbitrary bytes to the arrangement reader: whatever is accepted must be valid numbers and URIs.
 #include "peru/Errors.h"
 #include "tonewright/EditorXml.h"
 #include "tonewright/TrackModifierFade.h"

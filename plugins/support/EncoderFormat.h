@@ -1,4 +1,4 @@
-// The audio format over an encoder.
+// An audio format that writes through an encoder.
 #pragma once
 
 #include "sonora2/context/ISonoraContext.h"

@@ -1,4 +1,4 @@
-// A source and a format that do what a test wrote down for them, and tell what was done to them.
+// A source and a format that follow a test's script and record what is done to them.
 #pragma once
 
 #include "peru/Errors.h"
@@ -20,17 +20,17 @@ inline P<sonora2::audio::CAudioChunk> makeChunk(double timestamp, const std::str
     return peru::make<sonora2::audio::CAudioChunk>(timestamp, block);
 }
 
-// Delivers its media in the given cuts (bytes), over and over; a cut of 0 gives an empty chunk.
+// Delivers its media in chunks of the given sizes (bytes), repeatedly; a size of 0 is an empty chunk.
 class CScriptedSource : public CSourceBase {
 public:
     int rate = 44100;
     int channels = 2;
     int bytesPerSample = 2;
-    double chunkTimestamp = 77.0; // told by every chunk
+    double chunkTimestamp = 77.0; // of every chunk
     std::string media;
     std::vector<size_t> cuts{1000};
-    bool emptyBeforeEnd = false;        // answers empty handles although it is not at its end
-    std::deque<bool> eofAnswers;        // taken first where there are any
+    bool emptyBeforeEnd = false;        // returns empty handles before its end
+    std::deque<bool> eofAnswers;        // used first, if any
     std::function<void()> beforeChunk;  // may throw
     std::function<void()> beforeFormat; // may throw
     std::function<void()> beforeClose;
@@ -64,7 +64,7 @@ public:
         m_position += size;
         return makeChunk(chunkTimestamp, media.substr(m_position - size, size));
     }
-    // A decoder knows its format only while it is opened.
+    // Like a decoder, it knows its format only while open.
     int getSampleRate() override { return m_opened ? rate : 0; }
     int getChannelCount() override {
         if (beforeFormat) beforeFormat();
@@ -111,7 +111,7 @@ public:
     }
 };
 
-// Keeps what it hears; answers false from a fraction on.
+// Records the calls; returns false from a fraction on.
 class CScriptedListener : public peru::CObject, public sonora2::common::IEncodeListener {
 public:
     double stopFrom = 2.0;
@@ -127,7 +127,7 @@ public:
     }
 };
 
-// The description of the exception that the call throws; nothing when it throws none.
+// Returns the description of the exception that the call throws, or nothing.
 template <class Error = peru::CException>
 std::optional<std::string> errorOf(const std::function<void()>& call) {
     try {

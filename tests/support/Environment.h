@@ -1,4 +1,4 @@
-// A variable of the environment that has its old value again at the end of the block.
+// Sets an environment variable for the current scope.
 #pragma once
 
 #include <cstdlib>

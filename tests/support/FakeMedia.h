@@ -1,4 +1,4 @@
-// Sources, formats and a plug-in whose behaviour a test writes down.
+// Sources, formats and a plug-in with scripted behaviour.
 #pragma once
 
 #include "peru/uri/URI.h"
@@ -76,7 +76,7 @@ private:
     int64_t m_position = 0;
 };
 
-// Counts what it is given. Takes what a CFakeSource delivers by default.
+// Counts the bytes written to it. By default it expects the format of a default CFakeSource.
 class CFakeFormat : public CFormatBase, public sonora2::common::IDiscardable {
 public:
     static sonora2::common::ISonoraPlugin::SFormatParams takes(int rate, int channels, int bytesPerSample) {
@@ -125,7 +125,7 @@ private:
     std::function<void()> m_onWrite;
 };
 
-// Makes what its functions make, by default nothing.
+// Creates objects through its functions; by default none.
 class CFakePlugin : public peru::CObject, public sonora2::common::ISonoraPlugin {
 public:
     using SourceFactory =

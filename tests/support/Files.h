@@ -1,4 +1,4 @@
-// Between the paths of tests and the URIs of the system.
+// Converts between the tests' paths and the system's URIs.
 #pragma once
 
 #include "peru/Errors.h"
@@ -23,8 +23,8 @@ inline std::string text(const peru::P<peru::IString>& string) {
     return peru::CString::toStdString(string);
 }
 
-// The description of the error that the operation throws; a failure of the test when it throws none.
-// Errors of other kinds than the wanted one pass through, and fail it too.
+// Returns the description of the error that the operation throws; the test fails if it throws none. Errors of
+// other types propagate and fail the test as well.
 template <class Error = peru::CException, class Operation> std::string errorOf(Operation operation) {
     try {
         operation();

@@ -1,4 +1,4 @@
-// What the sources and formats of all tests have in common, and the bytes they work on.
+// Common parts of the tests' sources and formats, and their data.
 #pragma once
 
 #include "peru/streams/DataStreams.h"
@@ -13,7 +13,7 @@ namespace tests {
 
 using peru::P;
 
-// A source is what it delivers; the rest of the interface matters to none of these tests.
+// Implements the parts of the interface that do not matter to the tests.
 class CSourceBase : public peru::CObject, public sonora2::common::IAudioSource {
 public:
     int opens = 0;
@@ -45,21 +45,21 @@ inline std::string bytesOf(const P<sonora2::audio::IAudioChunk>& chunk) {
     return std::string(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
 }
 
-// All that is left in a source.
+// Reads the rest of a source.
 inline std::string readAll(const P<sonora2::common::IAudioSource>& source) {
     std::string bytes;
     while (const P<sonora2::audio::IAudioChunk> chunk = source->getNextAudioChunk()) bytes += bytesOf(chunk);
     return bytes;
 }
 
-// Bytes that differ along the whole length, so that a lost or doubled one shows.
+// Bytes without a period, so that a lost or repeated one is detected.
 inline std::string patternBytes(size_t count) {
     std::string bytes(count, '\0');
     for (size_t i = 0; i < count; ++i) bytes[i] = static_cast<char>((i * 2654435761u) >> 13);
     return bytes;
 }
 
-// The bytes that an object travels as, and back.
+// Converts objects to their serial form and back.
 inline std::string serialise(const P<peru::ISerializable>& object) {
     const P<peru::CMemoryIOStream> memory = peru::make<peru::CMemoryIOStream>();
     object->writeTo(peru::make<peru::CDataOutStream>(memory));

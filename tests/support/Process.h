@@ -1,4 +1,4 @@
-// Runs programs and says what they did.
+// Runs programs and reports the outcome.
 #pragma once
 
 #include <csignal>
@@ -14,14 +14,14 @@
 namespace tests {
 
 struct SProcessResult {
-    int exitCode = -1; // 128 and the signal for one that was killed
+    int exitCode = -1; // 128 plus the signal number if it was killed
     std::string out;
     std::string err;
-    long peakMemory = 0; // kB resident, of the program and of what it waited for
+    long peakMemory = 0; // kB resident, of the program and its children
     double cpuSeconds = 0;
 };
 
-// A child whose output goes to two files that are gone from the disk at once. Killed at the end of the block.
+// A child process whose output goes to two unlinked files. Killed at the end of the scope.
 class CProcess {
 public:
     explicit CProcess(const std::vector<std::string>& command, const std::string& folder = {},
@@ -52,7 +52,7 @@ public:
     CProcess& operator=(const CProcess&) = delete;
 
     pid_t getId() const { return m_id; }
-    // Not for one that was waited for: its id would mean every process there is.
+    // Must not be called after waiting: the id would then address every process.
     void signal(int number) const {
         if (m_id > 0) ::kill(m_id, number);
     }

@@ -1,4 +1,4 @@
-// Sound devices that do what a test wrote down for them, and tell what was done to them.
+// Sound devices that follow a test's script and record what is done to them.
 #pragma once
 
 #include "peru/collections/Enums.h"
@@ -20,16 +20,16 @@ namespace tests {
 using peru::P;
 using peru::media::CAudioFormat;
 
-// What both directions share. A device takes every format as wanted, unless told otherwise.
+// Common to both directions. By default a device supports every format.
 template <class Interface> class TScriptedDevice : public peru::CObject, public Interface {
 public:
     std::function<P<CAudioFormat>(int32_t rate, int32_t bytes, int32_t channels)> takes =
         [](int32_t rate, int32_t bytes, int32_t channels) {
             return peru::make<CAudioFormat>(rate, channels, bytes * 8);
         };
-    P<CAudioFormat> format; // it was last opened with
+    P<CAudioFormat> format; // of the last open
     std::atomic<int> opens{0};
-    std::atomic<int> overlaps{0}; // calls of two threads at once where one at a time is allowed
+    std::atomic<int> overlaps{0}; // concurrent calls where only one at a time is allowed
 
     P<peru::IString> getId() const override { return peru::CString::fromUTF8("7"); }
     P<peru::IString> getName() const override { return peru::CString::fromUTF8("scripted"); }
@@ -46,7 +46,7 @@ public:
     void setGain(double gain) override { m_gain = gain; }
 
 protected:
-    // For the length of an operation that tolerates no other beside it.
+    // Held during operations that must not run concurrently.
     class CAlone {
     public:
         explicit CAlone(TScriptedDevice& device) : m_device(device) {
@@ -76,7 +76,7 @@ protected:
     std::atomic<double> m_gain{1.0};
 };
 
-// Plays into nowhere, `speed` times as fast as sound.
+// Discards the sound, `speed` times faster than real time.
 class CScriptedOutDevice : public TScriptedDevice<peru::media::IAudioOutDevice> {
 public:
     explicit CScriptedOutDevice(double speed = 200.0) : m_speed(speed) {}
@@ -84,12 +84,12 @@ public:
     std::atomic<int> starts{0};
     std::atomic<int> stops{0};
 
-    // Everything that was written since it was last opened.
+    // Everything written since the last open.
     std::string written() const {
         std::scoped_lock lock(m_mutex);
         return m_written;
     }
-    // From now on it is no longer there.
+    // The device disappears.
     void remove() {
         m_isGone = true;
         m_running = false;
@@ -168,15 +168,15 @@ private:
 
     const double m_speed;
     std::atomic<bool> m_isGone{false};
-    mutable std::mutex m_mutex; // guards what follows
+    mutable std::mutex m_mutex; // guards the members below
     std::string m_written;
     double m_end = 0.0; // bytes, as is the next
     mutable double m_heard = 0.0;
     mutable Clock::time_point m_then = Clock::now();
 };
 
-// Delivers what a test hands to deliver(), which is then the device's thread, or what `next` gives, on a
-// thread of its own. Like a real one it waits in close and removeListener for calls that are under way.
+// Delivers data passed to deliver(), on the calling thread, or returned by `next`, on its own thread. Like a
+// real device it waits in close() and removeListener() for calls under way.
 class CScriptedInDevice : public TScriptedDevice<peru::media::IAudioInDevice> {
 public:
     ~CScriptedInDevice() override { join(); }
@@ -187,7 +187,7 @@ public:
         std::scoped_lock lock(m_calls);
         return m_listeners.size();
     }
-    // What the listeners answered. A device that does not run delivers nothing.
+    // Returns the listeners' result. A device that is not running delivers nothing.
     bool deliver(const std::string& bytes, double left = 0.25, double right = 0.5) {
         std::scoped_lock lock(m_calls);
         if (!m_running) return false;
@@ -241,14 +241,14 @@ private:
         if (m_thread.joinable()) m_thread.join();
     }
 
-    std::mutex m_calls; // held over the calls of listeners
+    std::mutex m_calls; // held while listeners are called
     std::vector<peru::media::IAudioInDeviceListener*> m_listeners;
     P<CAudioFormat> m_default;
     std::atomic<int64_t> m_frames{0};
     std::thread m_thread;
 };
 
-// Puts one device of each kind, either of which may be missing, in the place of the machine's.
+// Replaces the machine's devices by one of each kind, either of which may be missing.
 class CScriptedSystem {
 public:
     explicit CScriptedSystem(const P<CScriptedOutDevice>& out, const P<CScriptedInDevice>& in = nullptr) {

@@ -1,4 +1,4 @@
-// A sound card without hardware: a private PulseAudio daemon that the sound system finds through ALSA.
+// A virtual sound card: a private PulseAudio daemon that the sound system finds through ALSA.
 #pragma once
 
 #include "support/Environment.h"
@@ -23,15 +23,15 @@ enum class EMicrophone {
     isolated // it hears what play() plays, and a second input device, "microphone", does so too
 };
 
-// All sounds are 44100 Hz, 2 channels, 16 bits and pass unchanged. While this lives, this process and those
-// that it starts see one device for output and input, "default", and no other. A process that has reached
-// for the sound system stays with the server it found, so that each test wants a process of its own.
+// All sound is 44100 Hz, 2 channels, 16 bits and passes unchanged. During its lifetime this process and its
+// children see a single device for output and input, "default". A process that has opened the sound system
+// stays connected to that server, so each test needs its own process.
 class CSoundServer {
 public:
     static constexpr int kRate = 44100;
     static constexpr int kFrameBytes = 4;
 
-    // Throws std::runtime_error with the daemon's own words when it does not get ready.
+    // Throws std::runtime_error with the daemon's output if it does not start.
     explicit CSoundServer(EMicrophone microphone = EMicrophone::none) {
         writeConfiguration(microphone == EMicrophone::isolated);
         const std::string home = m_folder.path(), runtime = m_folder / "run";
@@ -66,11 +66,11 @@ public:
     CSoundServer(const CSoundServer&) = delete;
     CSoundServer& operator=(const CSoundServer&) = delete;
 
-    // The daemon dies as in a crash; from then on there is no device.
+    // Kills the daemon as in a crash; from then on there is no device.
     void kill() { m_daemon.reset(); }
 
-    // Hears what the output device plays, silence included, from before this returns until it is destroyed.
-    // Its readOut() is what was heard so far.
+    // Records the output device, silence included, from before this returns until it is destroyed. Its
+    // readOut() returns the sound so far.
     std::unique_ptr<CProcess> listen() const {
         auto recorder = std::make_unique<CProcess>(
             std::vector<std::string>{"parec", "-d", "fx_out.monitor", "--raw", "--rate=44100", "--channels=2",
@@ -83,7 +83,7 @@ public:
         return recorder;
     }
 
-    // Plays raw samples into the isolated microphone; its wait() returns when all has been heard.
+    // Plays raw samples into the isolated microphone; its wait() returns when everything has been played.
     std::unique_ptr<CProcess> play(const std::string& samples) const {
         return std::make_unique<CProcess>(std::vector<std::string>{
             "pacat", "--playback", "-d", "fx_mic", "--raw", "--rate=44100", "--channels=2", "--format=s16le",

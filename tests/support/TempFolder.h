@@ -1,4 +1,4 @@
-// A folder of a test's own, removed with everything in it at the end.
+// A temporary folder, removed with its contents at the end of the scope.
 #pragma once
 
 #include <gtest/gtest.h>

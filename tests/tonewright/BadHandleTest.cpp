@@ -13,7 +13,7 @@ using namespace tests;
 
 struct SCase {
     const char* name;
-    std::function<double(TONEWRIGHT_Handle)> call; // every result as a number, null handles as 0
+    std::function<double(TONEWRIGHT_Handle)> call; // results as numbers, null handles as 0
     double expected;
 };
 
@@ -84,7 +84,7 @@ TEST_F(BadHandle, NullAndOtherKinds_GiveTheFamilysValue) {
     expectAllRefuse(text.get(), "a text");
 }
 
-// Everything that needs the started library, given what would be right.
+// Calls everything that needs the started library with otherwise valid arguments.
 void expectNotStarted() {
     CHandle source = wrap(peru::make<CFakeSource>(SFakeSource()));
     CHandle format = wrap(peru::make<CFakeFormat>());

@@ -105,7 +105,7 @@ TEST(EditorXml, BadText_IsRefused) {
 constexpr int kRate = 1024; // times in powers of two are exact
 constexpr int kStep = 4000;
 
-// Arrangements of media that a plug-in of the tests makes: "<seconds>.tst".
+// Arrangements of media created by a test plug-in: "<seconds>.tst".
 class Arrangement : public testing::Test {
 protected:
     Arrangement() {
@@ -324,7 +324,7 @@ protected:
         return "<Track><TrackStart>" + std::to_string(start) + "</TrackStart><SourceEndTime>" +
                std::to_string(end) + "</SourceEndTime><Uri>" + uri + "</Uri></Track>";
     }
-    // The sound of the whole source; empty when the encoding fails.
+    // The sound of the whole source; empty if the encoding fails.
     SSound encode(const CHandle& source) {
         const std::string uri = text(toURI(folder / "out.wav")->getAsString());
         SSound sound;
@@ -359,7 +359,7 @@ TEST_F(EditorExport, Tracks_AreMixedIntoOneFile) {
     ASSERT_GE(mixed.frames(), 110250u);
     EXPECT_LT(mixed.frames(), 110250u + 4000);
     EXPECT_EQ(mixed.samples.substr(0, tone.samples.size()), tone.samples);
-    // The second begins with the first step behind its start, and is silent where its file ends early.
+    // The second begins with the first step after its start and is silent after the end of its file.
     const size_t begin = (66150 + 3999) / 4000 * 4000, silence = begin + 10000;
     EXPECT_EQ(mixed.samples.substr(begin * 4, 40000), tone.samples.substr(0, 40000));
     EXPECT_EQ(mixed.samples.substr(silence * 4), std::string(mixed.samples.size() - silence * 4, '\0'));

@@ -7,7 +7,7 @@ namespace {
 using namespace tests;
 
 std::u16string uriOf(const std::filesystem::path& path) {
-    const std::string text = "file://" + path.string(); // of plain letters
+    const std::string text = "file://" + path.string(); // without characters to escape
     return {text.begin(), text.end()};
 }
 
@@ -21,7 +21,7 @@ struct SField {
     const char* name;
     TONEWRIGHT_Handle (*get)(TONEWRIGHT_Handle);
     void (*set)(TONEWRIGHT_Handle, const char16_t*);
-    const char* judged; // what another program calls it
+    const char* judged; // its name in another program
 };
 #define FIELD(name, judged)                                                                                  \
     { #name, TONEWRIGHT_FileTag_Get##name, TONEWRIGHT_FileTag_Set##name, judged }
@@ -51,7 +51,7 @@ protected:
 
 TEST_F(FileTag, Fields_CrossTheBoundaryAndTheFile) {
     makeSound("a.flac", "flac");
-    // Each text differs, holds a character outside the first plane, and is longer than a handle keeps inside.
+    // Each text differs, contains a character outside the BMP, and exceeds a handle's inline storage.
     const auto textOf = [](const SField& field) {
         const std::string name = field.name;
         return std::u16string(name.begin(), name.end()) + u" \U0001F3B5 3/12 \u00e4\u97f3 and more";
@@ -79,7 +79,7 @@ TEST_F(FileTag, Fields_CrossTheBoundaryAndTheFile) {
         EXPECT_EQ(judge.out,
                   std::string(field.judged) + "=" + field.name + " \U0001F3B5 3/12 \u00e4\u97f3 and more\n");
     }
-    // Neither text leaves anything.
+    // Both remove the field.
     TONEWRIGHT_FileTag_SetTitle(tag.get(), nullptr);
     TONEWRIGHT_FileTag_SetArtist(tag.get(), u"");
     EXPECT_EQ(TONEWRIGHT_StoreFileTag(tag.get()), 0);

@@ -37,7 +37,7 @@ class CHost : public CLibraryTest {};
 TEST_F(CHost, TextHandle_IsReadThroughTheHeader) {
     char16_t text[32];
     ASSERT_GT(tests_readFirstExtension(text, 32), 0);
-    // Beyond what a string holds inside itself.
+    // Longer than a string's inline storage.
     CHandle handle(reinterpret_cast<TONEWRIGHT_Handle>(static_cast<peru::IInstanceWrapper*>(
         new peru::CStringInstanceWrapper(u"a text of more than a few units \U0001F3B5"))));
     EXPECT_EQ(TONEWRIGHT_GetTextLength(handle.get()), 34u);

@@ -1,4 +1,4 @@
-// The library started for a test, with a plug-in of the tests in the place of the real ones.
+// Starts the library for a test, with a test plug-in instead of the real ones.
 #pragma once
 
 #include "peru/IInstanceWrapper.h"
@@ -29,7 +29,7 @@ inline CHandle wrap(P<peru::IBase> object) {
     return CHandle(reinterpret_cast<TONEWRIGHT_Handle>(wrapper));
 }
 
-// What a C++ library beside the front finds behind a handle.
+// The interface that a C++ library beside the front finds behind a handle.
 template <class T> P<T> behind(const CHandle& handle) {
     const auto* wrapper =
         dynamic_cast<peru::CInstanceWrapper*>(reinterpret_cast<peru::IInstanceWrapper*>(handle.get()));
@@ -43,7 +43,7 @@ struct SLine {
     bool operator==(const SLine&) const = default;
 };
 
-// Keeps what is logged.
+// Collects log messages.
 class CLines : public peru::CLogBase {
 public:
     void enterArea(const P<peru::IString>&) override {}
@@ -63,7 +63,7 @@ private:
     std::vector<SLine> m_lines;
 };
 
-// The host's own log, added through the exports as a host does it.
+// A host's own log, added through the exports.
 class CHostLog {
 public:
     CHostLog() {
@@ -80,7 +80,7 @@ private:
     CHandle m_handle = wrap(m_manager);
 };
 
-// Where "sonora2_wav" is the tests' plug-in, and no other is to be found at first.
+// A plug-in folder in which "sonora2_wav" is the test plug-in.
 class CPluginFolder {
 public:
     CPluginFolder() {

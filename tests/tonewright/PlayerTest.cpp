@@ -26,7 +26,7 @@ template <class Condition> bool becomes(Condition condition) {
     return condition();
 }
 
-// What a source of that script delivers, and the closing silence.
+// The bytes of a source with that script, followed by the closing silence.
 std::string playedBytes(const SFakeSource& script) {
     const auto source = peru::make<CFakeSource>(script);
     source->open();
@@ -35,7 +35,7 @@ std::string playedBytes(const SFakeSource& script) {
     return bytes.append(silence, script.bytesPerSample == 1 ? '\x80' : '\0');
 }
 
-// A player and what stands around it.
+// A player with its device and source.
 struct SPlayer {
     explicit SPlayer(P<CFakeSource> from, double speed = 200.0)
         : device(peru::make<CScriptedOutDevice>(speed)), source(std::move(from)) {
@@ -92,7 +92,7 @@ public:
     using CFakeSource::CFakeSource;
     P<sonora2::audio::IAudioChunk> getNextAudioChunk() override { return nullptr; }
 };
-// Tells more than it has.
+// States more than it delivers.
 class CShortSource : public CFakeSource {
 public:
     using CFakeSource::CFakeSource;
@@ -118,7 +118,7 @@ TEST_F(Player, Play_DeliversTheSourceUnchangedAndThenSilence) {
     empty.frames = 0;
     SFakeSource big;
     big.rate = 48000;
-    big.frames = 48000 * 60; // more than the queue takes at once
+    big.frames = 48000 * 60; // more than the queue holds
     big.chunkFrames = 48000;
 
     std::vector<std::pair<SFakeSource, P<CFakeSource>>> cases;
@@ -154,7 +154,7 @@ TEST_F(Player, Play_TellsEveryFailureAndCanBeTriedAgain) {
         P<CFakeSource> source;
         TONEWRIGHT_PlayerCallback callback;
         bool isGone;
-        bool hasPlayed; // then a stop waits in vain
+        bool hasPlayed; // then a stop times out
     };
     for (const SCase& c : std::initializer_list<SCase>{
              {"scratched", peru::make<CFakeSource>(unreadable), nullptr, false, true},
@@ -200,7 +200,7 @@ TEST_F(Player, Creation_NamesWhatIsMissing) {
     struct SCase {
         const char* reason;
         std::function<void(CScriptedOutDevice&)> change;
-        const char16_t* uri; // null: over a source
+        const char16_t* uri; // null: a player of a source
     };
     const auto none = [](int32_t, int32_t, int32_t) -> P<CAudioFormat> { return nullptr; };
     const auto other = [](int32_t, int32_t, int32_t) { return peru::make<CAudioFormat>(48000, 2, 16); };
@@ -223,7 +223,7 @@ TEST_F(Player, Creation_NamesWhatIsMissing) {
                                    : TONEWRIGHT_CreatePlayerFromAudioSource(source.get())));
         EXPECT_THAT(log->take(), Contains(SLine{5, "", c.reason}));
     }
-    // A file is decoded to what the device gives in the place of 44100 Hz in two channels of two bytes.
+    // A file is decoded to the format that the device offers instead of 44100 Hz, two channels, two bytes.
     const auto device = peru::make<CScriptedOutDevice>();
     device->takes = [](int32_t rate, int32_t bytes, int32_t channels) {
         EXPECT_EQ(std::vector({rate, bytes, channels}), std::vector({44100, 2, 2}));
@@ -353,9 +353,9 @@ TEST_F(Player, Threads_MayCallEverythingAtOnce) {
                     std::this_thread::sleep_for(std::chrono::microseconds(random() % 20000));
                 }
             }
-            EXPECT_EQ(p.stop(), 0); // a play may have been paused by the last of the others
+            EXPECT_EQ(p.stop(), 0); // another thread may have paused the last play
         });
-    // Who plays when the others are through needs somebody to stop him.
+    // Stops the thread that is still playing when the others are done.
     std::atomic<bool> isDone{false};
     std::thread last([&] {
         while (!isDone) {
@@ -386,7 +386,7 @@ TEST_F(Player, Queue_IsPlayedWithoutAGap) {
         [&](double duration, double position, int32_t state) {
             if (heard.empty() || heard.back().first != duration) heard.emplace_back(duration, 0.0);
             heard.back().second = std::max(heard.back().second, position);
-            // Late, with the second source read to its end.
+            // Late: the second source has been read to its end.
             if (duration == 0.777 && control->getSourceIndex() == 1 && third.frames != 0) {
                 EXPECT_TRUE(control->enqueue(peru::make<CFakeSource>(third)));
                 third.frames = 0;

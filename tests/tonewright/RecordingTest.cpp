@@ -54,7 +54,7 @@ protected:
 TEST_F(Recording, Source_FindsAFormatOfTheDevice) {
     struct SCase {
         int32_t rate, channels, bytes;
-        P<CAudioFormat> given; // empty: what is asked
+        P<CAudioFormat> given; // empty: as requested
         bool isMade, isUnchanged;
     };
     const auto cd = peru::make<CAudioFormat>(44100, 2, 16);
@@ -84,7 +84,7 @@ TEST_F(Recording, Source_FindsAFormatOfTheDevice) {
         if (!handle) continue;
         EXPECT_EQ(TONEWRIGHT_AudioSource_GetDuration(handle.get()), 1.7976931348623157e+308);
         auto source = peru::make<CRecordingAudioSource>(device, c.rate, c.channels, c.bytes);
-        for (int round = 0; round < 2; ++round) { // a second recording begins at 0 again
+        for (int round = 0; round < 2; ++round) { // a second recording restarts at 0
             source->open();
             const int64_t frames = 4000;
             const std::string sent = pattern(frames * device->format->getBytesPerFrame());
@@ -150,7 +150,7 @@ TEST_F(Recording, Callbacks_HearOfEveryBlockAndMayEndIt) {
     struct SCase {
         TONEWRIGHT_RecordingCallback callback;
         TONEWRIGHT_RecordingVolumeCallback volume;
-        int wanted;    // calls until the callback says no
+        int wanted;    // calls until the callback returns false
         int delivered; // blocks that reach the source, of 10
         int wantedByFunction = 99;
     };
@@ -195,7 +195,7 @@ TEST_F(Recording, Callbacks_HearOfEveryBlockAndMayEndIt) {
         }
         EXPECT_EQ(TONEWRIGHT_AudioSource_Close(source.get()), 0);
     }
-    // A handle of another kind is left alone.
+    // A handle of another kind is ignored.
     const CHandle other = wrap(peru::make<CFakeSource>(SFakeSource{}));
     log->take();
     TONEWRIGHT_AudioSource_SetRecordingCallback(other.get(), countCalls);
@@ -218,7 +218,7 @@ TEST_F(Recording, Encoder_GetsEveryBlockUntilTheCallbackEndsIt) {
         const auto format = peru::make<CFakeFormat>(CFakeFormat::takes(8000, 2, 2));
         const CHandle formatHandle = wrap(format);
         const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), formatHandle.get()));
-        g_calls = 0; // making the encoder looked at the source, which is a short recording
+        g_calls = 0; // creating the encoder opened the source briefly
         EXPECT_EQ(TONEWRIGHT_AudioEncoder_Encode(encoder.get()), 0);
         EXPECT_EQ(g_calls, wanted);
         EXPECT_EQ(format->bytes, 512 * wanted) << "the last block is there too";

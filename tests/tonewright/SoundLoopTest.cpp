@@ -7,8 +7,8 @@ namespace {
 
 using namespace tests;
 
-// Without the frames of silence before, behind, and where a busy machine is late for the next buffer: nothing
-// that is played here is silent.
+// Removes silent frames before, after, and where a busy machine misses a buffer: the material itself is never
+// silent.
 std::string withoutSilence(const std::string& sound) {
     std::string left;
     for (size_t at = 0; at + 4 <= sound.size(); at += 4)
@@ -16,7 +16,7 @@ std::string withoutSilence(const std::string& sound) {
     return left;
 }
 
-// A server whose input hears what its output plays.
+// The server's input records its output.
 TEST(SoundLoop, Player_IsHeardWholeByARecording) {
     CSoundServer server;
     ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK);

@@ -63,7 +63,7 @@ TEST(SonoraContext, HasOneSerialFormByteForByte) {
     const P<CSonoraContextAudio> copy = make<CSonoraContextAudio>();
     deserialise(copy, form);
     EXPECT_EQ(serialise(copy), form);
-    // Reading adds to what is there.
+    // Reading adds to the existing content.
     copy->setParameter(0xfffffffe, "b", "old"_s);
     copy->setParameter(0xfffffffe, "c", "kept"_s);
     deserialise(copy, form);
@@ -87,7 +87,7 @@ TEST(SonoraContext, LookingUpChangesNothing) {
 TEST(SonoraContext, SurvivesHostileBytes) {
     const std::string form = serialise(makeFilledContext());
     const std::string untouched = serialise(make<CSonoraContextAudio>());
-    // A text may be missing at the very end of a stream; anything else that is cut off must not count.
+    // A text may be missing at the very end of a stream; any other truncation must have no effect.
     for (size_t length = 0; length < 12; ++length) {
         const P<CSonoraContextAudio> context = make<CSonoraContextAudio>();
         EXPECT_THROW(deserialise(context, form.substr(0, length)), peru::CException) << length;
@@ -162,7 +162,7 @@ TEST(EmbeddedMutex, LocksForAllFacetsAndKeepsItsObject) {
     EXPECT_TRUE(tryElsewhere());
 }
 
-// The text of messages comes from files and devices: whatever it holds, the document stays readable.
+// Messages contain text from files and devices: whatever it is, the document must stay well-formed.
 TEST(SonoraLog, WritesADocumentThatAnotherReaderUnderstands) {
     const tests::CTempFolder folder;
     const auto log = make<sonora2::common::CLogManager>();

@@ -67,10 +67,11 @@ TEST_F(AudioEncoder, StopsNormallyAtAListenersWish) {
     EXPECT_FALSE(source->isOpened());
     EXPECT_FALSE(format->isOpened());
     EXPECT_EQ(listener->fractions.back(), 0.5);
-    EXPECT_EQ(later->fractions.size(), listener->fractions.size() - 1); // the stop is not told further
+    EXPECT_EQ(later->fractions.size(),
+              listener->fractions.size() - 1); // listeners after the one that stops are not called
     encoder->removeListener(later.get());
 
-    // Whoever wants to stop hears of it at the first block: the first call only tells that it begins.
+    // A stop takes effect at the first block: the result of the first call is ignored.
     source->media.resize(2 * kBlock * kFrameBytes);
     format->written.clear();
     listener->fractions.clear();

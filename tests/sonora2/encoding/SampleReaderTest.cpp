@@ -32,7 +32,7 @@ TEST_F(SampleReader, DeliversTheSameBytesHoweverTheSourceCutsThem) {
         const size_t frameBytes = static_cast<size_t>(source->channels * source->bytesPerSample);
         source->media = tests::patternBytes(frameBytes * (random() % 5000));
         source->cuts.clear();
-        // Cuts need not lie between frames; empty chunks are legal.
+        // Chunks may end inside a frame; empty chunks are valid.
         for (int i = 0; i < 7; ++i) source->cuts.push_back(random() % 3000);
         source->cuts.push_back(1);
         if (round % 5 == 0) source->cuts = {frameBytes * 64};
@@ -106,7 +106,7 @@ TEST_F(SampleReader, RefusesAFaultySource) {
     EXPECT_THROW(makeReader(), sonora2::common::CSonoraError);
 }
 
-// The empty chunk and the end may come together.
+// The source may reach its end with the empty chunk.
 TEST_F(SampleReader, TakesAnEmptyChunkAtTheEndForTheEnd) {
     source->media = tests::patternBytes(400);
     source->open();

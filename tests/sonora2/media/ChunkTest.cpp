@@ -22,7 +22,7 @@ TEST(AudioChunk, TravelsWithItsTimestampAndItsValidBytes) {
     for (const size_t size : {0u, 1u, 70000u}) {
         const P<CAudioChunk> chunk = tests::makeChunk(1.25, tests::patternBytes(size));
         const std::string form = serialise(chunk);
-        EXPECT_EQ(form.size(), 8 + 4 + size); // the block's capacity stays behind
+        EXPECT_EQ(form.size(), 8 + 4 + size); // without the block's unused capacity
         const P<CAudioChunk> copy = make<CAudioChunk>(0.0, nullptr);
         deserialise(copy, form);
         EXPECT_EQ(copy->getTimestamp(), 1.25);
@@ -45,7 +45,7 @@ TEST(AudioStreamInfos, TravelInTheirOrderAndReplaceWhatWasThere) {
 
 TEST(AudioStreamInfos, TakeNoMoreMemoryThanTheBytesThatCome) {
     const P<CAudioStreamInfos> infos = make<CAudioStreamInfos>();
-    std::string form("\xff\xff\xff\x7f", 4); // two thousand million streams, one of them there
+    std::string form("\xff\xff\xff\x7f", 4); // two billion streams, of which one is present
     form += std::string(12, '\0');
     EXPECT_THROW(deserialise(infos, form), peru::CException);
     EXPECT_LE(infos->getStreamCount(), 1);
@@ -60,7 +60,7 @@ TEST(ParameterRecord, TakesAsMuchAsTheSenderFilled) {
     for (int32_t stated : {20, 1000000, 16, 12, 10, 4, 3, 0, -5, INT32_MIN}) {
         SCOPED_TRACE(stated);
         const SSourceParams sent{stated, 1, {}, 44100, 2, 3};
-        // On the heap with nothing behind what is stated, so that a sanitizer sees a byte too many.
+        // On the heap, exactly as large as stated, so that a sanitizer detects any byte read beyond.
         const size_t real = static_cast<size_t>(std::clamp<int32_t>(stated, 4, sizeof(sent)));
         const std::unique_ptr<uint8_t[]> bytes(new uint8_t[real]);
         std::memcpy(bytes.get(), &sent, real);

@@ -45,7 +45,7 @@ P<IURI> uri(const std::string& text) {
     return make<peru::CURI>(CString::fromUTF8(text));
 }
 
-// A handler whose context names one library that is nowhere, so that it starts without plug-ins.
+// Its handlers start without plug-ins: the context names one library that does not exist.
 class PluginHandler : public testing::Test {
 protected:
     PluginHandler() {
@@ -247,7 +247,7 @@ TEST_F(PluginHandler, Formats_AreAcceptedUnopened) {
     EXPECT_TRUE(handler->createObject(uri("file:///a.tst"), nullptr));
 }
 
-// Tells its name by its size; what is no RGB picture is asked for the one that it becomes.
+// A picture of a recognisable size that converts to the given RGB picture.
 class CPicture : public peru::CObject, public ISonoraPicture {
 public:
     explicit CPicture(P<ISonoraPicture> rgb = nullptr) : m_rgb(std::move(rgb)) {}

@@ -52,7 +52,7 @@ const std::vector<SMatrix>& matrices() {
     return all;
 }
 
-// Random frames, and the ends of the range, where 32 bits and the direction of a division show.
+// Random frames and the ends of the range, which reveal overflow and the rounding of divisions.
 std::vector<int16_t> makeFrames(int channels, int frames) {
     std::mt19937 random(static_cast<unsigned>(channels * 31 + frames));
     const int16_t edges[] = {-32768, 32767, -1, 1, 0, -32767, 9, -9};
@@ -95,7 +95,7 @@ TEST(ChannelConverter, MixesAsTheMatricesSay) {
                     CChannelConverter::create(matrix.sourceChannels, matrix.destinationChannels);
                 ASSERT_TRUE(converter);
 
-                // One sample more than asked for must stay as it is.
+                // The sample after the last requested one must stay unchanged.
                 std::vector<std::vector<int16_t>> planes(
                     6, std::vector<int16_t>(static_cast<size_t>(frames) + 1, kUntouched));
                 std::vector<std::vector<int16_t>> expected = planes;

@@ -89,14 +89,14 @@ TEST(SampleRateConverter, OutputDoesNotDependOnHowTheInputIsCut) {
         const std::string large = convertInCuts(shape, input, 2, 3000);
         const P<CSampleRateConverter> converter = makeConverter(shape);
         std::string whole = convertAll(*converter, input);
-        // A call gives a bounded number of frames: flushes until the wanted length is there.
+        // A call returns a bounded number of frames: flush until the expected length is reached.
         for (int round = 0; whole.size() < small.size() && round < 200; ++round) whole += flush(*converter);
         EXPECT_EQ(small, large);
         EXPECT_EQ(small, whole.substr(0, small.size()));
     }
 }
 
-// One call gives 96000 frames at most. What more its input holds comes with the next calls.
+// One call returns at most 96000 frames. The rest of its input follows with the next calls.
 TEST(SampleRateConverter, LosesNothingOfAnInputThatIsTooLargeForOneCall) {
     const SShape shape{44100, 2, 2, 48000, 2, 2};
     const Samples input = makeNoise(44100 * 2 * 7);
@@ -209,8 +209,8 @@ TEST(SampleRateConverter, NarrowsAndOrdersItsOutput) {
     }
 }
 
-// Through the whole pipeline: planes that a row leaves out carry nothing at all, whatever the pool's blocks
-// held before.
+// Planes that a row leaves out must be silent at the end of the pipeline, whatever the pool's blocks held
+// before.
 TEST(SampleRateConverter, LeavesTheGapsOfTheMatricesSilent) {
     const struct {
         int srcChannels, dstChannels;
@@ -320,7 +320,7 @@ TEST(SampleRateConverter, MatchesThePeerWithTheSameFilter) {
         const Samples input = c.isSweep ? makeSweep(c.srcRate, 2, 3.0) : makeNoise(c.srcRate * 2 * 3, 5);
         std::string bytes;
         for (const int16_t sample : input) {
-            // Noise fills all bits of a wider sample, and leaves it room for what the filter adds.
+            // Noise uses all bits of a wider sample, at half scale to leave room for overshoot.
             const int32_t wide = sample * 0x8000 + (c.isSweep ? 0 : (sample * 12347) & 0x7fff);
             const auto* from = c.bytes == 2 ? reinterpret_cast<const char*>(&sample)
                                             : reinterpret_cast<const char*>(&wide) + 4 - c.bytes;
@@ -340,7 +340,7 @@ TEST(SampleRateConverter, MatchesThePeerWithTheSameFilter) {
         const SShape shape{c.srcRate, 2, c.bytes, c.dstRate, 2, c.bytes};
         const std::vector<int64_t> actual = widen(convertInCuts(shape, bytes, 4, 4000), c.bytes);
 
-        // The peer ends its filter in another way than with silence: its last samples are left out.
+        // The peer does not flush its filter with silence: its last samples are ignored.
         const size_t count = expected.size() - (c.isBest ? 8000 : 128);
         ASSERT_GT(count, static_cast<size_t>(c.dstRate) * 5);
         ASSERT_GE(actual.size(), count);

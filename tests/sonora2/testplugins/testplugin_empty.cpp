@@ -1,4 +1,4 @@
-// Its entry point makes nothing.
+// Its entry point creates no plug-in.
 #include "sonora2/context/ISonoraContext.h"
 #include "sonora2/plugins/ISonoraPlugin.h"
 

@@ -1,5 +1,5 @@
-// Reads and writes the extension "tst" from and to nowhere: every source has 1 second of the wanted format. A
-// file name that begins with "refuse" throws from open.
+// Reads and writes the extension "tst" without files: every source has 1 second of the requested format.
+// Sources whose file name begins with "refuse" throw from open.
 #include "sonora2/context/SonoraError.h"
 #include "support/FakeMedia.h"
 

@@ -1,4 +1,4 @@
-// Its entry point throws an exception whose code and text lie in the library, which is unloaded at once.
+// Its entry point throws an exception whose code and text are in the library, which is then unloaded.
 #include "peru/Errors.h"
 #include "sonora2/context/ISonoraContext.h"
 #include "sonora2/plugins/ISonoraPlugin.h"

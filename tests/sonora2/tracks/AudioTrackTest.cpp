@@ -1,10 +1,10 @@
 #include "sonora2/tracks/AudioTrack.h"
 
 #include "peru/uri/URI.h"
-#include "sonora2/tracks/TrackSupport.h"
 #include "sonora2/context/LogManager.h"
 #include "sonora2/media/SilentAudioSource.h"
 #include "sonora2/tracks/TrackCommands.h"
+#include "sonora2/tracks/TrackSupport.h"
 
 #include <gtest/gtest.h>
 
@@ -14,7 +14,7 @@ using namespace tests;
 using namespace sonora2;
 using audio::CAudioTrack;
 
-// Negates every sample, and tells what it was told.
+// Negates every sample and records its configuration.
 class CNegator : public peru::CObject, public audio::IAudioEqualizer, public audio::IAudioToolsHandler {
 public:
     static inline std::string s_calls;
@@ -60,7 +60,7 @@ TEST_F(AudioTrack, Skip_CountsFromTheTracksStartAndOnlyWithinIt) {
     track->open();
     struct SCase {
         double time;
-        int64_t frame; // of the next sample; -1: the skip does not count
+        int64_t frame; // of the next sample; -1: the skip is ignored
     };
     int64_t next = 0;
     for (const SCase& c : std::initializer_list<SCase>{{10.5, 4000},

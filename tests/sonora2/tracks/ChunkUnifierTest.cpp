@@ -1,8 +1,8 @@
 #include "sonora2/tracks/AudioChunkUnifier.h"
 
-#include "sonora2/tracks/TrackSupport.h"
 #include "sonora2/tracks/AudioChunkUnifierTrack.h"
 #include "sonora2/tracks/TrackCommands.h"
+#include "sonora2/tracks/TrackSupport.h"
 
 #include <gtest/gtest.h>
 
@@ -75,7 +75,7 @@ TEST_F(ChunkUnifier, ForeignFormat_IsConverted) {
     EXPECT_NEAR(static_cast<double>(played.size()), 32000.0, 1000.0) << "twice the rate, two channels";
 }
 
-// A track whose medium begins elsewhere than its place on the time line.
+// A track whose medium time differs from its time line.
 class CShiftedTrack : public sonora2::audio::CAudioTrack, public sonora2::audio::IMediumTimeTrack {
 public:
     using CAudioTrack::CAudioTrack;

@@ -17,7 +17,7 @@ TEST(Mix, Samples_FollowTheRuleForEveryValue) {
     std::mt19937 random(7);
     for (int i = 0; i < 300; ++i) others.push_back(static_cast<int16_t>(random()));
     for (int b : others) {
-        // An odd start and length, so that what does not fill a vector is tried as well.
+        // An odd start and length, to cover the samples that do not fill a vector.
         for (size_t first : {size_t{0}, size_t{3}}) {
             Samples sum(all.size(), static_cast<int16_t>(b));
             const size_t count = all.size() - first * 2;

@@ -1,4 +1,4 @@
-// Sources of known noise, and a mixer in plain words to compare with.
+// Sources of known noise, and a straightforward mixer to compare with.
 #pragma once
 
 #include "sonora2/ScriptedMedia.h"
@@ -31,7 +31,7 @@ struct SNoise {
     int64_t frames = 8000;
     int rate = 8000;
     int channels = 1;
-    std::vector<int> cuts{700, 1, 1300};  // frames of the chunks, over and over
+    std::vector<int> cuts{700, 1, 1300};  // frames per chunk, repeatedly
     std::function<void()> onOpen = [] {}; // may throw
 };
 
@@ -92,7 +92,7 @@ private:
     size_t m_cut = 0;
 };
 
-// The mixing rule as one would say it.
+// The mixing rule, written literally.
 inline int16_t mixPlain(int a, int b) {
     if (a < 0 && b < 0) return static_cast<int16_t>(b + a + a * b / 32768);
     if (a > 0 && b > 0) return static_cast<int16_t>(b + a - a * b / 32767);
@@ -120,7 +120,7 @@ inline P<sonora2::audio::CAudioTrack> makeTrack(const P<sonora2::common::ISonora
     return track;
 }
 
-// All that a track gives until its source ends: gains chunk by chunk, then the speed.
+// The output of a track until its source ends: gains per chunk, then the speed.
 inline Samples renderTrack(const STrackPlan& plan) {
     auto source = peru::make<CNoiseSource>(plan.noise);
     source->open();
@@ -152,7 +152,7 @@ inline Samples renderTrack(const STrackPlan& plan) {
     return all;
 }
 
-// What a list of these tracks plays from its start to its end.
+// The output of a list of these tracks from start to end.
 inline Samples renderList(const std::vector<STrackPlan>& plans, int rate, int channels, int stepFrames) {
     const auto frameOf = [](double time) { return std::llround(time * 1000.0); };
     std::vector<const STrackPlan*> order; // by lane, then by start

@@ -1,7 +1,7 @@
 #include "peru/threads/IMutex.h"
-#include "sonora2/tracks/TrackSupport.h"
 #include "sonora2/context/LogManager.h"
 #include "sonora2/tracks/TrackCommands.h"
+#include "sonora2/tracks/TrackSupport.h"
 
 #include <gtest/gtest.h>
 
@@ -25,7 +25,7 @@ double secondsSince(Clock::time_point start) {
     return std::chrono::duration<double>(Clock::now() - start).count();
 }
 
-// Waits for what another thread is about to do.
+// Waits for another thread.
 template <class Condition> bool becomesTrue(Condition condition) {
     for (const auto start = Clock::now(); secondsSince(start) < 20.0; std::this_thread::yield())
         if (condition()) return true;
@@ -56,13 +56,13 @@ protected:
     P<audio::CSonoraContextAudio> context = peru::make<audio::CSonoraContextAudio>();
 };
 
-// Tracks that begin and end on the list's steps, so that what a time sounds like does not depend on the way
-// to it; a bed below leaves no gaps.
+// Tracks begin and end on the list's steps, so that the sound at a time does not depend on how it was
+// reached; a bed below them leaves no gaps.
 std::vector<STrackPlan> makeGridPlans() {
     std::vector<STrackPlan> plans = {{{99, 20 * kRate}, -1, 0.0, 20.0}};
     for (int i = 0; i < 24; ++i) {
         const double start = i * 0.75, end = start + 0.5 + 0.25 * (i % 5);
-        // Media are longer than their tracks, which are ended by the list.
+        // Media are longer than their tracks: the list ends them.
         plans.push_back({{i + 1, static_cast<int64_t>((end - start) * kRate) + 1500}, i % 4, start, end});
     }
     return plans;
@@ -230,7 +230,7 @@ TEST_F(Tracklist, LongList_KeepsOnlyOpenWhatPlaysOrIsDue) {
     }
 }
 
-// Blocks whoever comes until it is opened.
+// Blocks every caller until it is released.
 class CGate {
 public:
     void pass() {
@@ -259,7 +259,7 @@ TEST_F(Tracklist, SlowMedium_HoldsUpNobodyBeforeItIsDue) {
     auto command = std::async(std::launch::async, [&] {
         list->processCommand(peru::make<common::CSetAudioEqualizerCommand>("", 0));
     });
-    // All of this happens while the medium is being opened; else it would never end.
+    // All of this happens while the medium is being opened; otherwise it would never return.
     for (const Samples& more : {pull(list, 5), pull(list, 14)})
         played.insert(played.end(), more.begin(), more.end());
     EXPECT_EQ(played.size(), 20u * kStep);
