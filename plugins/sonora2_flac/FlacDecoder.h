@@ -10,8 +10,7 @@
 namespace sonora2::plugins::flac {
 
 // Widths that are not whole bytes are left-justified in the next larger one: 20 bits are delivered as 24.
-// A damaged frame is reported after the sound before it. Data after the last frame, such as a tag, is
-// ignored.
+// Tags and other data before the stream and after the last frame are ignored.
 class CFlacDecoder : public IDecoder {
 public:
     explicit CFlacDecoder(const SMediaFile& file);
@@ -27,6 +26,15 @@ private:
         void operator()(FLAC__StreamDecoder* decoder) const { FLAC__stream_decoder_delete(decoder); }
     };
 
+    static FLAC__StreamDecoderReadStatus onRead(const FLAC__StreamDecoder* decoder, FLAC__byte buffer[],
+                                                size_t* bytes, void* self);
+    static FLAC__StreamDecoderSeekStatus onSeek(const FLAC__StreamDecoder* decoder, FLAC__uint64 offset,
+                                                void* self);
+    static FLAC__StreamDecoderTellStatus onTell(const FLAC__StreamDecoder* decoder, FLAC__uint64* offset,
+                                                void* self);
+    static FLAC__StreamDecoderLengthStatus onLength(const FLAC__StreamDecoder* decoder, FLAC__uint64* length,
+                                                    void* self);
+    static FLAC__bool onEof(const FLAC__StreamDecoder* decoder, void* self);
     static FLAC__StreamDecoderWriteStatus onFrame(const FLAC__StreamDecoder* decoder,
                                                   const FLAC__Frame* frame, const FLAC__int32* const planes[],
                                                   void* self);
@@ -34,27 +42,48 @@ private:
     static void onError(const FLAC__StreamDecoder* decoder, FLAC__StreamDecoderErrorStatus status,
                         void* self);
 
+    int64_t findStream();
+    void readMetadata();
     bool take(const FLAC__Frame& frame, const FLAC__int32* const planes[]);
+    int64_t getPending() const; // position behind what has been decoded
+    uint8_t getSilence() const { return m_format.bytesPerSample == 1 ? 0x80 : 0; }
+    void fillGap(int64_t frames);
+    void addDamage(int64_t from, int64_t frames);
+    void reportDamage();
+    int deliverSilence(uint8_t* pcm, int frames);
+    int deliverRest(uint8_t* pcm, int frames);
+    void forget(); // everything about the current position
     void rewind();
     int64_t countFrames();
     void discard(int64_t frames); // decodes and drops
-    [[noreturn]] void failDamaged() const;
+    double toSeconds(int64_t frame) const { return static_cast<double>(frame) / m_format.rate; }
 
     SMediaFile m_file;
+    SDecoderOptions m_options;
+    InputFile m_input;   // read by the decoder
+    int64_t m_start = 0; // offset of the stream in the file
     std::unique_ptr<FLAC__StreamDecoder, SDeleter> m_decoder;
     SPcmFormat m_format;
     int m_bits = 0;
-    int64_t m_total = 0;    // frames
-    int64_t m_scanned = -1; // frames counted by scanning; -1 if not scanned
-    int64_t m_position = 0; // first frame of the next read
+    int64_t m_total = 0;     // frames
+    int64_t m_scanned = -1;  // frames counted by scanning; -1 if not scanned
+    int64_t m_position = 0;  // first frame of the next read
+    bool m_counting = false; // frames are not delivered, only their numbers are used
 
     // A decoded frame is written directly to the caller's memory; what does not fit goes to `m_rest`.
     uint8_t* m_target = nullptr;
     int m_targetFrames = 0;
     int m_taken = 0;
+    int64_t m_silence = 0; // frames to deliver before the rest, for sound that is missing
     std::vector<uint8_t> m_rest;
     size_t m_restStart = 0;
-    const char* m_damage = nullptr; // first error reported
+    int64_t m_next = -1; // number of the frame after the last one that was decoded; -1 if unknown
+
+    const char* m_damage = nullptr; // first error since the last good frame
+    bool m_badChecksum = false;     // the next frame is damaged
+    int64_t m_damagedFrom = -1;     // frames replaced by silence that have not been reported; -1 if none
+    int64_t m_damagedTo = -1;
+    P<peru::IString> m_change; // of the format, within the stream; empty if there is none
 };
 
 } // namespace sonora2::plugins::flac

@@ -29,10 +29,12 @@ int64_t scale(int64_t value, int64_t numerator, int64_t denominator) {
 
 } // namespace
 
-CChunkProducer::CChunkProducer(const P<common::ISonoraContext>& context, IDecoder& decoder,
-                               const SDecodedMedia& media, const SPcmFormat& wanted)
-    : m_memory(context->getMemoryManager()), m_decoder(decoder), m_media(media), m_wanted(wanted),
-      m_total(countDelivered(media, wanted)), m_converting(!(media.format == wanted)) {
+CChunkProducer::CChunkProducer(const P<common::ISonoraContext>& context, const SMediaFile& file,
+                               IDecoder& decoder, const SDecodedMedia& media, const SPcmFormat& wanted,
+                               const SDecoderOptions& options)
+    : m_memory(context->getMemoryManager()), m_file(file), m_decoder(decoder), m_options(options),
+      m_media(media), m_wanted(wanted), m_total(countDelivered(media, wanted)), m_end(m_total),
+      m_converting(!(media.format == wanted)) {
     m_chunkFrames = std::clamp(kChunkBytes / wanted.frameBytes(), 1, kChunkFrames);
     if (m_converting) {
         // Frames of the file that convert to about one delivered chunk.
@@ -63,7 +65,9 @@ int64_t CChunkProducer::countDelivered(const SDecodedMedia& media, const SPcmFor
 
 void CChunkProducer::seek(int64_t frame) {
     m_position = std::clamp<int64_t>(frame, 0, m_total);
-    m_ended = false;
+    m_end = m_total;
+    const bool wasEnded = std::exchange(m_ended, false);
+    m_failure = nullptr;
     int64_t own = m_position;
     if (m_converting) {
         // The filter's phase repeats every `ownPeriod` frames. A new converter that starts at a multiple of
@@ -77,14 +81,21 @@ void CChunkProducer::seek(int64_t frame) {
         m_converter.reset();
         m_flushed = false;
     }
-    if (own == m_read) return;
+    if (own == m_read && !wasEnded) return;
+    m_ended = true; // in case the seek fails
     m_decoder.seek(own);
+    m_ended = false;
     m_read = own;
 }
 
 P<audio::IAudioChunk> CChunkProducer::next() {
+    P<audio::IAudioChunk> chunk = m_converting ? nextConverted() : nextPlain();
+    if (!chunk && m_failure) std::rethrow_exception(std::exchange(m_failure, nullptr));
+    return chunk;
+}
+
+P<audio::IAudioChunk> CChunkProducer::nextPlain() {
     if (m_ended || m_position >= m_total) return nullptr;
-    if (m_converting) return nextConverted();
     const int wanted = static_cast<int>(std::min<int64_t>(m_chunkFrames, m_total - m_position));
     const int64_t frameBytes = m_wanted.frameBytes();
     P<peru::IMemoryBlock> block = m_memory->getBlock(wanted * frameBytes);
@@ -102,20 +113,19 @@ P<audio::IAudioChunk> CChunkProducer::nextConverted() {
             m_wanted.channels, m_wanted.bytesPerSample, m_memory);
     }
     const int ownFrameBytes = m_media.format.frameBytes();
-    while (m_position < m_total) {
+    while (m_position < m_end) {
         P<audio::IAudioChunk> converted;
         if (m_flushed) return nullptr; // the silence after the end is used up
         P<peru::IMemoryBlock> own = m_memory->getBlock(int64_t{m_ownChunkFrames} * ownFrameBytes);
         const int64_t left = m_media.frames - m_read;
         const int frames =
-            left > 0 ? readOwn(own->getData(), static_cast<int>(std::min<int64_t>(m_ownChunkFrames, left)))
-                     : 0;
+            left > 0 && !m_ended
+                ? readOwn(own->getData(), static_cast<int>(std::min<int64_t>(m_ownChunkFrames, left)))
+                : 0;
         if (frames == 0) {
-            m_flushed = true;
-            m_ended = false; // the filter still holds the last frames
-            if (m_read < m_media.frames)
-                m_total = std::min(m_total, scale(m_read, m_wanted.rate, m_media.format.rate));
-            if (m_position >= m_total) return nullptr;
+            m_flushed = true; // the filter still holds the last frames
+            m_end = std::min(m_end, scale(m_read, m_wanted.rate, m_media.format.rate));
+            if (m_position >= m_end) return nullptr;
             converted = m_converter->convert(nullptr, 0);
         } else {
             converted = m_converter->convert(own->getData(), frames * ownFrameBytes);
@@ -124,7 +134,7 @@ P<audio::IAudioChunk> CChunkProducer::nextConverted() {
         int64_t count = block->getSize() / frameBytes;
         const int64_t dropped = std::min(count, m_drop);
         m_drop -= dropped;
-        count = std::min(count - dropped, m_total - m_position);
+        count = std::min(count - dropped, m_end - m_position);
         if (count == 0) continue;
         if (dropped > 0)
             std::memmove(block->getData(), block->getData() + dropped * frameBytes,
@@ -139,16 +149,32 @@ int CChunkProducer::readOwn(uint8_t* pcm, int frames) {
     // A decoder may return fewer frames than requested; chunks are still filled unless the file ends.
     int filled = 0;
     const int frameBytes = m_media.format.frameBytes();
-    while (filled < frames) {
-        const int count = m_decoder.read(pcm + int64_t{filled} * frameBytes, frames - filled);
-        if (count <= 0) {
-            m_ended = true;
-            break;
+    try {
+        while (filled < frames) {
+            const int count = m_decoder.read(pcm + int64_t{filled} * frameBytes, frames - filled);
+            if (count <= 0) {
+                m_ended = true;
+                reportEarlyEnd();
+                break;
+            }
+            filled += count;
+            m_read += count;
         }
-        filled += count;
-        m_read += count;
+    } catch (...) {
+        m_ended = true;
+        m_failure = std::current_exception();
     }
     return filled;
+}
+
+// Only called when there are frames left.
+void CChunkProducer::reportEarlyEnd() const {
+    constexpr const char* kText = "%s ends after %.3f of %.3f seconds";
+    const double rate = m_media.format.rate;
+    const double at = static_cast<double>(m_read) / rate;
+    const double total = static_cast<double>(m_media.frames) / rate;
+    if (!m_options.salvage) fail(kText, m_file.getDisplayName(), at, total);
+    m_options.warn(kText, m_file.getDisplayName(), at, total);
 }
 
 P<audio::IAudioChunk> CChunkProducer::makeChunk(P<peru::IMemoryBlock> block, int64_t frames) {

@@ -5,6 +5,8 @@
 #include "sonora2/samplerateconverter/SampleRateConverter.h"
 #include "support/Decoder.h"
 
+#include <exception>
+
 namespace sonora2::plugins {
 
 // Positions count delivered frames. The conversion adds no delay and no tail: the total is
@@ -13,36 +15,44 @@ namespace sonora2::plugins {
 class CChunkProducer {
 public:
     // The decoder must be open and outlive this object.
-    CChunkProducer(const P<common::ISonoraContext>& context, IDecoder& decoder, const SDecodedMedia& media,
-                   const SPcmFormat& wanted);
+    CChunkProducer(const P<common::ISonoraContext>& context, const SMediaFile& file, IDecoder& decoder,
+                   const SDecodedMedia& media, const SPcmFormat& wanted, const SDecoderOptions& options);
 
     // Throws if the sample rate converter does not support this pair of formats. Equal formats need none.
     static void requireDeliverable(const SMediaFile& file, const SPcmFormat& own, const SPcmFormat& wanted);
     static int64_t countDelivered(const SDecodedMedia& media, const SPcmFormat& wanted);
 
     void seek(int64_t frame);
-    // Empty at the end. Timestamps count from `origin`.
+    // Empty at the end. A failure of the decoder, or an end before the stated length, is thrown after
+    // everything that could be decoded before it; then the chunks end.
+    // Timestamps count from `origin`.
     P<audio::IAudioChunk> next();
     void setOrigin(int64_t frame) { m_origin = frame; }
     int64_t getPosition() const { return m_position; }
     int getChunkFrames() const { return m_chunkFrames; }
 
 private:
+    P<audio::IAudioChunk> nextPlain();
     P<audio::IAudioChunk> nextConverted();
     int readOwn(uint8_t* pcm, int frames);
+    void reportEarlyEnd() const;
     P<audio::IAudioChunk> makeChunk(P<peru::IMemoryBlock> block, int64_t frames);
 
     P<peru::IMemoryManager> m_memory;
+    SMediaFile m_file;
     IDecoder& m_decoder;
+    SDecoderOptions m_options;
     SDecodedMedia m_media;
     SPcmFormat m_wanted;
     int m_chunkFrames;      // delivered frames per chunk
-    int64_t m_total;        // delivered frames; lowered when the file ends early
+    const int64_t m_total;  // delivered frames
+    int64_t m_end;          // where delivery ends; before m_total if the decoder stopped early
     int64_t m_position = 0; // next frame to deliver
     int64_t m_origin = 0;
 
-    bool m_ended = false; // the decoder has reached its end
-    int64_t m_read = 0;   // frame that the decoder reads next
+    bool m_ended = false;         // the decoder has reached its end or has failed
+    std::exception_ptr m_failure; // to be thrown after the frames before it
+    int64_t m_read = 0;           // frame that the decoder reads next
 
     // Only while converting.
     bool m_converting;

@@ -13,7 +13,9 @@ struct SDecodedMedia {
 };
 
 struct SDecoderOptions {
-    P<common::ILogManager> log; // may be empty
+    // Continue after damage: missing sound is replaced by silence of the same length and reported to the log.
+    bool salvage = false;
+    P<common::ILogManager> log = {}; // may be empty
 
     // Reports something that does not stop the decoding.
     template <class... Args> void warn(const char* text, const Args&... args) const {
@@ -33,7 +35,8 @@ public:
     virtual SDecodedMedia open(const SDecoderOptions& options) = 0;
     virtual void close() = 0; // also called after open() has thrown; no effect when closed
     // Reads up to `frames` frames and returns the number read, which may be smaller; 0 means the end.
-    // Everything that can be decoded before a damaged place is returned before the failure is thrown.
+    // Everything that can be decoded before a damaged place is returned before the failure is thrown. An end
+    // before the stated number of frames is reported by the caller.
     virtual int read(uint8_t* pcm, int frames) = 0;
     // The next read starts at exactly this frame, from 0 to the number of frames inclusive.
     virtual void seek(int64_t frame) = 0;

@@ -28,7 +28,11 @@ CDecoderSource::CDecoderSource(const P<common::ISonoraContext>& context, const P
                                const SMediaFile& file, std::unique_ptr<IDecoder> decoder,
                                const SPcmFormat& wanted)
     : m_context(context), m_pluginName(pluginName), m_file(file), m_wanted(wanted),
-      m_decoder(std::move(decoder)) {}
+      m_decoder(std::move(decoder)) {
+    const P<peru::IString> salvage =
+        m_context->getParameter(common::kSalvageParameterKey, common::kSalvageParameter);
+    m_salvage = salvage->equals("1");
+}
 
 CDecoderSource::~CDecoderSource() {
     m_readAhead.reset();
@@ -39,7 +43,8 @@ void CDecoderSource::open() {
     if (isOpened()) return;
     try {
         openDecoder();
-        m_producer = std::make_unique<CChunkProducer>(m_context, *m_decoder, m_media, m_delivered);
+        m_producer = std::make_unique<CChunkProducer>(m_context, m_file, *m_decoder, m_media, m_delivered,
+                                                      getOptions());
         restartAt(toFrame(m_startTime));
     } catch (...) {
         m_producer.reset();
@@ -94,6 +99,18 @@ void CDecoderSource::setAudioStream(int nAudioIndex) {
     if (nAudioIndex != 0) fail("%s has no audio stream %d", m_file.getDisplayName(), nAudioIndex);
 }
 
+void CDecoderSource::setSalvage(bool salvage) {
+    if (salvage == m_salvage) return;
+    const bool reopen = isOpened();
+    close();
+    m_salvage = salvage;
+    if (reopen) open();
+}
+
+SDecoderOptions CDecoderSource::getOptions() const {
+    return {m_salvage, m_context->getLogManager()};
+}
+
 P<peru::IString> CDecoderSource::getCodecName() {
     return peru::CString::fromUTF8(m_media.codec);
 }
@@ -119,7 +136,7 @@ P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {
 }
 
 void CDecoderSource::openDecoder() {
-    m_media = m_decoder->open({m_context->getLogManager()});
+    m_media = m_decoder->open(getOptions());
     const SPcmFormat& own = m_media.format;
     const bool sound = own.rate > 0 && own.channels > 0 && own.bytesPerSample >= 1 &&
                        own.bytesPerSample <= 4 && m_media.frames >= 0;

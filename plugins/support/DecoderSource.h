@@ -3,6 +3,7 @@
 
 #include "sonora2/media/IAudioSource.h"
 #include "sonora2/media/IMediaDescription.h"
+#include "sonora2/media/ISalvage.h"
 #include "support/ReadAhead.h"
 
 #include <memory>
@@ -11,7 +12,10 @@ namespace sonora2::plugins {
 
 // Rate, channels and width are known once the file has been opened for the first time.
 // Time 0, the duration and the timestamps are relative to the start time.
-class CDecoderSource : public peru::CObject, public common::IAudioSource, public common::IMediaDescription {
+class CDecoderSource : public peru::CObject,
+                       public common::IAudioSource,
+                       public common::IMediaDescription,
+                       public common::ISalvage {
 public:
     // Created closed. A zero in `wanted` selects the file's own value.
     CDecoderSource(const P<common::ISonoraContext>& context, const P<peru::IString>& pluginName,
@@ -39,6 +43,9 @@ public:
     int getChannelCount() override { return m_delivered.channels; }
     int getBytesPerSample() override { return m_delivered.bytesPerSample; }
 
+    void setSalvage(bool salvage) override;
+    bool getSalvage() override { return m_salvage; }
+
     P<peru::IString> getCodecName() override;
     int64_t getBitRate() override; // of the whole file, including tags and covers
     int getOwnSampleRate() override { return m_media.format.rate; }
@@ -47,6 +54,7 @@ public:
 
 private:
     void openDecoder();
+    SDecoderOptions getOptions() const;
     void requireOpened() const;
     int64_t toFrame(double seconds) const;
     void restartAt(int64_t frame); // in delivered frames from the beginning of the file
@@ -56,6 +64,7 @@ private:
     SMediaFile m_file;
     SPcmFormat m_wanted;
     double m_startTime = 0.0;
+    bool m_salvage = false;
     std::unique_ptr<IDecoder> m_decoder;
     SDecodedMedia m_media;                      // known once opened
     SPcmFormat m_delivered;                     // known once opened

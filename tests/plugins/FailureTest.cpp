@@ -1,9 +1,11 @@
 // Damaged files and full disks.
 #include "plugins/PluginFixture.h"
 
+#include "peru/strings/StringFormat.h"
 #include "sonora2/context/SonoraError.h"
+#include "sonora2/media/ISalvage.h"
 
-#include <unistd.h>
+#include <thread>
 
 namespace tests {
 
@@ -144,27 +146,140 @@ TEST_P(Failure, UseOutsideItsState_IsRefused) {
 
 INSTANTIATE_TEST_SUITE_P(Formats, Failure, ::testing::ValuesIn(kFormatCases), printName);
 
-// The read-ahead thread meets the damage; it is reported after the sound that precedes it.
-TEST_F(CPluginTest, DamagedFlacFrame_IsAnErrorBehindTheValidPart) {
+struct SDamage {
+    const char* name;
+    void (*apply)(std::string& file);
+};
+
+const SDamage kDamages[] = {
+    {"overwritten.flac", [](std::string& file) { file.replace(file.size() * 3 / 4, 40, 40, 'U'); }},
+    {"zeros.flac", [](std::string& file) { file.replace(file.size() / 2, 50000, 50000, '\0'); }},
+    {"cut.flac", [](std::string& file) { file.erase(file.size() / 2, 50000); }},
+    {"tail.flac", [](std::string& file) { file[file.size() - 20] ^= 0x55; }},
+    {"zeros.ogg", [](std::string& file) { file.replace(file.size() / 2, 9000, 9000, '\0'); }},
+};
+
+// The read-ahead thread meets the damage, which is reported after the sound before it. With salvage, silence
+// takes the place of what is damaged.
+TEST_F(CPluginTest, DamagedSound_IsLocatedAndCanBeSalvaged) {
+    for (const SDamage& damage : kDamages) {
+        SCOPED_TRACE(damage.name);
+        const SShape shape;
+        const auto path = folder / damage.name;
+        writeFile(path, makeMusic(shape, 200000), shape);
+        const std::string whole = readAll(openSource(path, shape));
+        std::string bytes = readFile(path);
+        damage.apply(bytes);
+        folder.write(damage.name, bytes);
+
+        P<IAudioSource> source = openSource(path, shape);
+        std::string error;
+        const std::string good = readUntilError(source, error);
+        const double at = static_cast<double>(good.size()) / 4 / 44100;
+        EXPECT_EQ(0u, error.find(text(peru::format("%s is damaged at %.3f seconds", path.c_str(), at))))
+            << error;
+        EXPECT_TRUE(whole.starts_with(good) && good.size() > whole.size() / 3 && good.size() < whole.size());
+        EXPECT_TRUE(source->isEOF());
+        EXPECT_FALSE(source->getNextAudioChunk());
+        const size_t before = good.size() / 4 - 2000; // a search for it may meet the damage
+        source->skipToTime(static_cast<double>(before) / 44100);
+        EXPECT_TRUE(good.substr(before * 4) == readUntilError(source, error));
+        P<IAudioSource> converted = openSource(path, {48000, 1, 2});
+        EXPECT_NEAR(at * 48000, static_cast<double>(readUntilError(converted, error).size() / 2), 0.6);
+
+        log->lines.clear();
+        peru::interfaceCast<sonora2::common::ISalvage>(source)->setSalvage(true);
+        const std::string salvaged = readAll(source);
+        ASSERT_EQ(whole.size(), salvaged.size());
+        ASSERT_EQ(1u, log->lines.size());
+        double from = 0.0, to = 0.0;
+        std::sscanf(log->lines[0].c_str() + path.string().size(), " is damaged: %lf to %lf seconds", &from,
+                    &to);
+        EXPECT_NEAR(at, from, 0.0006) << log->lines[0];
+        const auto end = static_cast<size_t>((to - 0.0006) * 44100) * 4; // the time is rounded
+        EXPECT_TRUE(salvaged.starts_with(good));
+        EXPECT_EQ(std::string::npos, salvaged.substr(good.size(), end - good.size()).find_first_not_of('\0'));
+        const size_t settled = std::min(end + 2048 * 4, whole.size()); // blocks overlap
+        EXPECT_TRUE(whole.substr(settled) == salvaged.substr(settled));
+        const size_t inside = good.size() / 4 + 700;
+        source->skipToTime(static_cast<double>(inside) / 44100);
+        const std::string rest = readAll(source);
+        EXPECT_TRUE(salvaged.substr(settled) == rest.substr(settled - inside * 4));
+        EXPECT_EQ(salvaged.size() - inside * 4, rest.size());
+    }
+}
+
+// A consumer that only asks for the end of the file learns about an error that is still queued.
+TEST_F(CPluginTest, QueuedError_ComesBeforeTheEnd) {
+    const SShape shape;
+    writeFile(folder / "x.flac", makeMusic(shape, 40000), shape);
+    std::string bytes = readFile(folder / "x.flac");
+    folder.write("x.flac", bytes.replace(bytes.size() / 2, 40, 40, 'U'));
+    P<IAudioSource> source = openSource(folder / "x.flac", shape);
+    source->getNextAudioChunk();
+    while (source->getBufferStatus() < 100) std::this_thread::yield();
+    EXPECT_THROW(readAll(source), CSonoraError);
+}
+
+TEST_F(CPluginTest, FileThatShrinks_IsAnError) {
+    for (const char* name : {"x.wav", "x.mp3"}) {
+        const SShape shape;
+        writeFile(folder / name, makeMusic(shape, 800000), shape);
+        P<IAudioSource> source = openSource(folder / name, shape);
+        source->getNextAudioChunk();
+        std::filesystem::resize_file(folder / name, std::filesystem::file_size(folder / name) / 2);
+        std::string error;
+        EXPECT_GT(readUntilError(source, error).size(), 300000u * 4);
+        EXPECT_NE(std::string::npos, error.find(" of 18.141 seconds")) << error;
+    }
+}
+
+TEST_F(CPluginTest, UnusualFlac_IsReadInFull) {
     const SShape shape;
     const std::string pcm = makeMusic(shape, 200000);
     writeFile(folder / "x.flac", pcm, shape);
-    std::string bytes = readFile(folder / "x.flac");
-    for (int i = 0; i < 40; ++i) bytes[bytes.size() * 3 / 4 + i] ^= 0x55;
-    folder.write("x.flac", bytes);
-    P<IAudioSource> source = openSource(folder / "x.flac", shape);
+    const std::string plain = readFile(folder / "x.flac");
+    const std::string tag = std::string("ID3\4\0\0\0\0\1\0", 10) + std::string(128, '\0');
+    constexpr size_t kBlocks = 42; // behind the stream information, where the seek table lies
+    const std::string blocks = std::string("\1\0\0\2xx\2\0\0\4riff\1\0\0\0", 18);
+    const std::string files[] = {
+        tag + tag + plain,
+        std::string(1000, '\0') + plain + std::string(128, 'T'),
+        std::string(plain).insert(kBlocks, blocks),
+        // A seek table that leads nowhere.
+        std::string(plain).replace(kBlocks + 4, 36, 36, '\1'),
+    };
+    for (const std::string& file : files) {
+        folder.write("x.flac", file);
+        P<IAudioSource> source = openSource(folder / "x.flac", shape);
+        ASSERT_TRUE(source);
+        source->skipToTime(2.0);
+        EXPECT_TRUE(readAll(source) == pcm.substr(88200 * 4));
+        source->skipToTime(0.0);
+        EXPECT_TRUE(readAll(source) == pcm);
+    }
+}
+
+TEST_F(CPluginTest, FlacThatChangesItsRate_EndsThere) {
+    const SShape shape;
+    const std::string pcm = makeMusic(shape, 8192);
+    for (int rate : {44100, 48000}) {
+        folder.write("x.raw", pcm);
+        run("flac -sf --no-padding --no-seektable --force-raw-format --endian=little --sign=signed "
+            "--channels=2 "
+            "--bps=16 --sample-rate=" +
+            std::to_string(rate) + " - < '" + (folder / "x.raw").string() + "' > '" +
+            (folder / (std::to_string(rate) + ".flac")).string() + "'");
+    }
+    const std::string second = readFile(folder / "48000.flac");
+    const auto path =
+        folder.write("x.flac", readFile(folder / "44100.flac") + second.substr(second.find("\xFF\xF8")));
+    P<IAudioSource> source = openSource(path, shape);
     std::string error;
-    const std::string got = readUntilError(source, error);
-    EXPECT_NE(std::string::npos, error.find("x.flac is damaged behind")) << error;
-    EXPECT_GT(got.size(), pcm.size() / 2);
-    EXPECT_LT(got.size(), pcm.size());
-    EXPECT_TRUE(pcm.compare(0, got.size(), got) == 0);
-    EXPECT_TRUE(source->isEOF());
-    EXPECT_FALSE(source->getNextAudioChunk());
-    source->skipToTime(1.0); // the intact part can still be read
-    const std::string good = readAll(source, 1);
-    EXPECT_FALSE(good.empty());
-    EXPECT_TRUE(pcm.compare(44100 * 4, good.size(), good) == 0);
+    EXPECT_TRUE(readUntilError(source, error) == pcm);
+    EXPECT_EQ(path.string() + " changes at 0.186 seconds from 44100 Hz, 2 channels, 16 bits to 48000 Hz, "
+                              "2 channels, 16 bits, which is not supported",
+              error);
 }
 
 TEST_F(CPluginTest, RefusedShape_KeepsTheOldFile) {
