@@ -1,7 +1,10 @@
 #include "sonora2_decmpa/MpegDecoder.h"
 
+#include "sonora2_decmpa/SoundEnd.h"
+
 #include <algorithm>
 #include <cstdio>
+#include <cstring>
 #include <sys/stat.h>
 #include <utility>
 
@@ -23,27 +26,37 @@ constexpr long kDecoderDelay = 529;
 // The codec issues a separate read for each header and each frame.
 constexpr size_t kInputBufferBytes = 64 * 1024;
 
-ssize_t readInput(void* input, void* data, size_t size) {
-    auto* file = static_cast<std::FILE*>(input);
-    const size_t got = fread_unlocked(data, 1, size, file);
+} // namespace
+
+ssize_t CMpegDecoder::readInput(void* self, void* data, size_t size) {
+    auto& decoder = *static_cast<CMpegDecoder*>(self);
+    std::FILE* file = decoder.m_input.get();
+    const int64_t left = std::max<int64_t>(decoder.m_inputEnd - decoder.m_inputPosition, 0);
+    const size_t got =
+        fread_unlocked(data, 1, static_cast<size_t>(std::min(left, static_cast<int64_t>(size))), file);
+    decoder.m_inputPosition += static_cast<int64_t>(got);
     return got == 0 && ferror_unlocked(file) ? -1 : static_cast<ssize_t>(got);
 }
 
-off_t seekInput(void* input, off_t offset, int whence) {
-    auto* file = static_cast<std::FILE*>(input);
-    return ::fseeko(file, offset, whence) == 0 ? ::ftello(file) : -1;
+off_t CMpegDecoder::seekInput(void* self, off_t offset, int whence) {
+    auto& decoder = *static_cast<CMpegDecoder*>(self);
+    if (whence == SEEK_END) offset += decoder.m_inputEnd;
+    if (whence == SEEK_CUR) offset += decoder.m_inputPosition;
+    if (offset < 0 || ::fseeko(decoder.m_input.get(), offset, SEEK_SET) != 0) return -1;
+    return decoder.m_inputPosition = offset;
 }
 
-} // namespace
-
-SDecodedMedia CMpegDecoder::open(const SDecoderOptions&) {
+SDecodedMedia CMpegDecoder::open(const SDecoderOptions& options) {
     close();
+    m_options = options;
     m_input = openForReading(m_file);
     m_buffer.resize(kInputBufferBytes); // the C library's default buffer is small
     std::setvbuf(m_input.get(), m_buffer.data(), _IOFBF, m_buffer.size());
+    m_inputEnd = findSoundEnd(m_input.get());
+    m_inputPosition = 0;
     int error = MPG123_OK;
     m_handle.reset(mpg123_new(nullptr, &error));
-    if (!m_handle) fail("could not open %s: %s", m_file.getDisplayName(), mpg123_plain_strerror(error));
+    if (!m_handle) fail("could not open %s: %s", m_file.getDisplayName(), describe(error));
     mpg123_handle* handle = m_handle.get();
     mpg123_param(handle, MPG123_ADD_FLAGS, MPG123_QUIET | MPG123_SKIP_ID3V2, 0);
     // Gapless mode would trust the length stated in the file.
@@ -52,15 +65,15 @@ SDecodedMedia CMpegDecoder::open(const SDecoderOptions&) {
     mpg123_param(handle, MPG123_PREFRAMES, kRunUpFrames, 0);
     mpg123_param(handle, MPG123_INDEX_SIZE, kPlaces, 0);
     if (mpg123_replace_reader_handle(handle, readInput, seekInput, nullptr) != MPG123_OK ||
-        mpg123_open_handle(handle, m_input.get()) != MPG123_OK)
-        failWith("could not open");
+        mpg123_open_handle(handle, this) != MPG123_OK)
+        failToOpen();
     m_format = readFormat();
     mpg123_param(handle, MPG123_RESYNC_LIMIT, kNextFrameBytes, 0);
     if (m_scan.identity != identify())
         scan();
     else if (mpg123_set_index(handle, m_scan.places.data(), m_scan.framesPerPlace, m_scan.places.size()) !=
              MPG123_OK)
-        failWith("could not open");
+        failToOpen();
     seek(0);
     return {m_format, m_scan.frames, getCodecName()};
 }
@@ -75,10 +88,10 @@ SPcmFormat CMpegDecoder::readFormat() {
     mpg123_handle* handle = m_handle.get();
     long rate = 0;
     int channels = 0, encoding = 0;
-    if (mpg123_getformat(handle, &rate, &channels, &encoding) != MPG123_OK) failWith("could not open");
+    if (mpg123_getformat(handle, &rate, &channels, &encoding) != MPG123_OK) failToOpen();
     // Allow only this format from here on, so that a change within the file is reported as an error.
     mpg123_format_none(handle);
-    if (mpg123_format(handle, rate, channels, MPG123_ENC_SIGNED_16) != MPG123_OK) failWith("could not open");
+    if (mpg123_format(handle, rate, channels, MPG123_ENC_SIGNED_16) != MPG123_OK) failToOpen();
     return {static_cast<int>(rate), channels, kBytesPerSample};
 }
 
@@ -99,9 +112,9 @@ void CMpegDecoder::scan() {
     mpg123_handle* handle = m_handle.get();
     m_scan = {};
     const off_t told = mpg123_length(handle);
-    if (mpg123_scan(handle) != MPG123_OK) failWith("could not open");
+    if (mpg123_scan(handle) != MPG123_OK) failToOpen();
     const off_t decoded = mpg123_length(handle);
-    if (decoded < 0) failWith("could not open");
+    if (decoded < 0) failToOpen();
     SScan scan;
     scan.frames = decoded;
     long delay = -1, padding = -1;
@@ -112,6 +125,9 @@ void CMpegDecoder::scan() {
         // A truncated file has lost its padding first, and in a file longer than stated the padding is
         // somewhere in the middle.
         const int64_t behind = told == decoded && padding > kDecoderDelay ? padding - kDecoderDelay : 0;
+        if (const int64_t stated = told - delay - padding; stated > decoded - before)
+            m_options.warn("%s is incomplete: %.3f of %.3f seconds were found", m_file.getDisplayName(),
+                           toSeconds(std::max<int64_t>(decoded - before, 0)), toSeconds(stated));
         if (before + behind <= decoded) {
             scan.start = before;
             scan.frames = decoded - before - behind;
@@ -119,7 +135,7 @@ void CMpegDecoder::scan() {
     }
     off_t* places = nullptr;
     size_t count = 0;
-    if (mpg123_index(handle, &places, &scan.framesPerPlace, &count) != MPG123_OK) failWith("could not open");
+    if (mpg123_index(handle, &places, &scan.framesPerPlace, &count) != MPG123_OK) failToOpen();
     scan.places.assign(places, places + count);
     scan.identity = identify();
     m_scan = std::move(scan);
@@ -133,18 +149,49 @@ int CMpegDecoder::read(uint8_t* pcm, int frames) {
     for (int i = 0; i < 2 && result == MPG123_NEW_FORMAT && done == 0; ++i)
         result = mpg123_read(m_handle.get(), pcm, wanted, &done);
     if (result == MPG123_NEW_FORMAT && done == 0)
-        fail("could not decode %s: its format changes within the file", m_file.getDisplayName());
-    if (done == 0 && result != MPG123_OK && result != MPG123_DONE) failWith("could not decode");
-    return static_cast<int>(done / static_cast<size_t>(m_format.frameBytes()));
+        fail("%s changes its format at %.3f seconds, which is not supported", m_file.getDisplayName(),
+             toSeconds(m_position));
+    if (done == 0 && result != MPG123_OK && result != MPG123_DONE)
+        fail("could not decode %s at %.3f seconds: %s", m_file.getDisplayName(), toSeconds(m_position),
+             describe(mpg123_errcode(m_handle.get())));
+    int count = static_cast<int>(done / static_cast<size_t>(m_format.frameBytes()));
+    if (count == 0 && m_position < m_scan.frames && m_scan.identity == identify()) {
+        // Frames with an intact header may still be impossible to decode.
+        if (!std::exchange(m_padding, true))
+            m_options.warn("%s is damaged: %.3f seconds could not be decoded, silence follows the sound",
+                           m_file.getDisplayName(), toSeconds(m_scan.frames - m_position));
+        count = static_cast<int>(std::min<int64_t>(frames, m_scan.frames - m_position));
+        std::memset(pcm, 0, wanted);
+    }
+    m_position += count;
+    return count;
 }
 
 void CMpegDecoder::seek(int64_t frame) {
-    if (mpg123_seek(m_handle.get(), m_scan.start + frame, SEEK_SET) < 0)
-        failWith("could not find a place in");
+    if (mpg123_seek(m_handle.get(), m_scan.start + frame, SEEK_SET) < 0) {
+        const char* reason = describe(mpg123_errcode(m_handle.get()));
+        fail("could not find %.3f seconds in %s: %s", toSeconds(frame), m_file.getDisplayName(), reason);
+    }
+    m_position = frame;
+    m_padding = false;
 }
 
-void CMpegDecoder::failWith(const char* doing) {
-    fail("%s %s: %s", doing, m_file.getDisplayName(), mpg123_strerror(m_handle.get()));
+const char* CMpegDecoder::describe(int error) const {
+    switch (error) {
+    case MPG123_ERR_READER:
+        return m_input && std::ferror(m_input.get()) ? "the file cannot be read"
+                                                     : "it ends before a whole frame";
+    case MPG123_RESYNC_FAIL:
+        return "no MPEG audio frame was found";
+    case MPG123_OUT_OF_MEM:
+        return "there is not enough memory";
+    default:
+        return "the decoder failed";
+    }
+}
+
+void CMpegDecoder::failToOpen() const {
+    fail("could not open %s: %s", m_file.getDisplayName(), describe(mpg123_errcode(m_handle.get())));
 }
 
 } // namespace sonora2::plugins

@@ -46,14 +46,23 @@ private:
     std::string getCodecName();
     SIdentity identify() const;
     void scan();
-    [[noreturn]] void failWith(const char* doing);
+    const char* describe(int error) const;
+    [[noreturn]] void failToOpen() const;
+    double toSeconds(int64_t frame) const { return static_cast<double>(frame) / m_format.rate; }
+    static ssize_t readInput(void* self, void* data, size_t size);
+    static off_t seekInput(void* self, off_t offset, int whence);
 
     SMediaFile m_file;
+    SDecoderOptions m_options;
     SPcmFormat m_format;
     SScan m_scan;
-    std::vector<char> m_buffer;                       // of the input
-    InputFile m_input;                                // read by the handle
+    std::vector<char> m_buffer; // of the input
+    InputFile m_input;          // read by the handle
+    int64_t m_inputEnd = 0;     // of the sound; tags follow
+    int64_t m_inputPosition = 0;
     std::unique_ptr<mpg123_handle, SDelete> m_handle; // while open
+    int64_t m_position = 0;                           // next frame to read
+    bool m_padding = false;                           // silence is delivered for frames that are missing
 };
 
 } // namespace sonora2::plugins

@@ -6,25 +6,36 @@
 #include <cmath>
 #include <cstring>
 #include <string>
+#include <string_view>
 #include <sys/stat.h>
 
 namespace sonora2::plugins::wav {
 
 namespace {
 
-bool isOwnContainer(int format) {
-    switch (format & SF_FORMAT_TYPEMASK) {
-    case SF_FORMAT_WAV:
-    case SF_FORMAT_WAVEX:
-    case SF_FORMAT_RF64:
-    case SF_FORMAT_W64:
-    case SF_FORMAT_AIFF:
-    case SF_FORMAT_AU:
-    case SF_FORMAT_CAF:
-        return true;
-    default:
-        return false; // compressed formats that the library also reads have plug-ins of their own
+// Other formats that the library reads have plug-ins of their own, and its MPEG decoder writes to standard
+// error.
+bool isOwnContainer(std::FILE* file) {
+    std::array<char, 12> start{};
+    size_t got = std::fread(start.data(), 1, start.size(), file);
+    if (got == start.size() && std::string_view(start.data(), 3) == "ID3") {
+        long tag = 0;
+        for (size_t i = 6; i < 10; ++i) tag = tag << 7 | (start[i] & 0x7F);
+        std::fseek(file, 10 + tag, SEEK_SET);
+        got = std::fread(start.data(), 1, start.size(), file);
     }
+    std::rewind(file);
+    const std::string_view text(start.data(), got);
+    const std::string_view type = text.substr(std::min<size_t>(got, 8));
+    if (text.starts_with("FORM")) return type == "AIFF" || type == "AIFC";
+    constexpr std::string_view kWave64("riff\x2E\x91\xCF\x11", 8);
+    return text.starts_with("RIFF") || text.starts_with("RIFX") || text.starts_with("RF64") ||
+           text.starts_with(kWave64) || text.starts_with(".snd") || text.starts_with("dns.") ||
+           text.starts_with("caff");
+}
+
+bool isMpeg(int sampleFormat) {
+    return sampleFormat >= SF_FORMAT_MPEG_LAYER_I && sampleFormat <= SF_FORMAT_MPEG_LAYER_III;
 }
 
 const char* getCodecName(int sampleFormat) {
@@ -67,6 +78,12 @@ const char* getCodecName(int sampleFormat) {
     case SF_FORMAT_ALAC_24:
     case SF_FORMAT_ALAC_32:
         return "ALAC";
+    case SF_FORMAT_MPEG_LAYER_I:
+        return "MPEG audio layer I";
+    case SF_FORMAT_MPEG_LAYER_II:
+        return "MPEG audio layer II";
+    case SF_FORMAT_MPEG_LAYER_III:
+        return "MPEG audio layer III";
     default:
         return "";
     }
@@ -131,15 +148,13 @@ SDecodedMedia CSndfileDecoder::open(const SDecoderOptions& options) {
     close();
     m_options = options;
     m_input = openForReading(m_file);
+    if (!isOwnContainer(m_input.get()))
+        fail("could not read %s: it is another kind of file than its name suggests", m_file.getDisplayName());
     m_patch = findMissingSize(m_input.get());
     SF_INFO info{};
     m_handle.reset(openHandle(info));
     if (!m_handle)
         fail("could not read %s: %s", m_file.getDisplayName(), peru::CString::fromUTF8(sf_strerror(nullptr)));
-    if (!isOwnContainer(info.format)) {
-        close();
-        fail("%s holds another kind of file than its name tells", m_file.getDisplayName());
-    }
     m_format = {info.samplerate, info.channels, 0};
     chooseTransfer(info.format & SF_FORMAT_SUBMASK);
 
@@ -148,7 +163,17 @@ SDecodedMedia CSndfileDecoder::open(const SDecoderOptions& options) {
     const int64_t frameBytes = getLinearBytes(sampleFormat) * std::max<int64_t>(info.channels, 1);
     m_frames = std::max<int64_t>(info.frames, 0);
     if (frameBytes > 0) m_frames = std::min(m_frames, getLength(this) / frameBytes);
+    if (isMpeg(sampleFormat)) countFrames();
     return {m_format, m_frames, getCodecName(sampleFormat)};
+}
+
+// The library only estimates the length of MPEG audio.
+void CSndfileDecoder::countFrames() {
+    std::vector<short> samples(static_cast<size_t>(m_format.channels) * 8192);
+    m_frames = 0;
+    for (sf_count_t got = 1; got > 0; m_frames += got)
+        got = std::max<sf_count_t>(sf_readf_short(m_handle.get(), samples.data(), 8192), 0);
+    seek(0);
 }
 
 void CSndfileDecoder::chooseTransfer(int sampleFormat) {

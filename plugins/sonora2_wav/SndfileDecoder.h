@@ -47,6 +47,7 @@ private:
     static sf_count_t tellInput(void* self);
 
     SNDFILE* openHandle(SF_INFO& info);
+    void countFrames();
     void chooseTransfer(int sampleFormat);
     template <class Sample> void checkClipping(const Sample* samples, sf_count_t frames);
     void reportClipping();

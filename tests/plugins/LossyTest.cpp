@@ -26,6 +26,10 @@ int getDistance(const std::string& a, const std::string& b) {
     return distance;
 }
 
+std::string little(uint32_t value) {
+    return {reinterpret_cast<const char*>(&value), 4};
+}
+
 struct SSetting {
     const char* name;
     std::function<void(IAudioFormat&)> apply;
@@ -110,6 +114,11 @@ TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
     writeFile(folder / "in.wav", pcm, shape);
     const std::string cd = "cd '" + folder.path().string() + "' && ";
     run(cd + "lame --silent in.wav plain.mp3");
+    // Tags full of frames.
+    const std::string frames = readFile(folder / "plain.mp3").substr(4000, 20000);
+    folder.write("tags", std::string("APETAGEX\0\0\0\0", 12) + frames + "APETAGEX" + little(2000) +
+                             little(20032) + little(1) + little(0) + little(0) + little(0) + "LYRICSBEGIN" +
+                             frames + "020011LYRICS200TAG" + frames.substr(0, 125));
     const SMp3File files[] = {
         {"without a tag", "lame --silent -t in.wav x.mp3", false},
         {"another writer", "ffmpeg -v error -y -i in.wav -b:a 160k x.mp3", true},
@@ -120,6 +129,9 @@ TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
          "cat plain.mp3; } > x.mp3",
          true},
         {"a tag behind", "{ cat plain.mp3; printf TAG; head -c 125 /dev/zero; } > x.mp3", true},
+        {"several tags behind", "cat plain.mp3 tags > x.mp3", true},
+        {"other data behind", "{ cat plain.mp3; printf %5000d 0; tail -c 20000 plain.mp3; } > x.mp3", true},
+        {"two in one", "cat plain.mp3 plain.mp3 > x.mp3", false},
         {"zeros behind", "{ cat plain.mp3; head -c 300000 /dev/zero; } > x.mp3", true},
         {"zeros between",
          "{ lame --silent -t in.wav -; head -c 300000 /dev/zero; lame --silent -t in.wav -; } "
@@ -146,6 +158,32 @@ TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
         const size_t first = file.name == std::string("zeros between") ? 90000 * 4 : SIZE_MAX;
         EXPECT_LE(getDistance(ours.substr(0, first), theirs), 2);
     }
+}
+
+// Frames of silence in shapes that no encoder at hand writes.
+TEST_F(Lossy, RareMpegFrames_AreCounted) {
+    const struct {
+        const char *name, *header;
+        size_t bytes, frames;
+    } files[] = {{"layer I.mp1", "\xFF\xFF\xC0", 416, 384}, {"free format.mp2", "\xFF\xFD\0", 600, 1152}};
+    for (const auto& file : files) {
+        std::string bytes;
+        for (int i = 0; i < 100; ++i)
+            bytes += std::string(file.header, 3) + std::string(file.bytes - 3, '\0');
+        folder.write(file.name, bytes);
+        EXPECT_EQ(std::string(100 * file.frames * 4, '\0'), read(folder / file.name)) << file.name;
+    }
+}
+
+TEST_F(Lossy, Mp3UnderAnotherName_IsRefusedSilently) {
+    writeFile(folder / "x.mp3", makeMusic({}, 5000), {});
+    const std::string bytes = readFile(folder / "x.mp3");
+    testing::internal::CaptureStderr();
+    for (const char* name : {"x.wav", "x.flac", "x.ogg"}) {
+        folder.write(name, bytes.substr(0, 1500));
+        EXPECT_FALSE(openSource(folder / name, {}));
+    }
+    EXPECT_EQ("", testing::internal::GetCapturedStderr());
 }
 
 TEST_F(Lossy, ReopenedMp3_IsTheSameUntilTheFileChanges) {
