@@ -40,8 +40,11 @@ CFlacEncoder::~CFlacEncoder() {
 }
 
 bool CFlacEncoder::accepts(const SPcmFormat& format) const {
-    return format.channels <= static_cast<int>(FLAC__MAX_CHANNELS) &&
-           FLAC__format_sample_rate_is_valid(static_cast<uint32_t>(format.rate));
+    if (format.channels <= static_cast<int>(FLAC__MAX_CHANNELS) &&
+        FLAC__format_sample_rate_is_valid(static_cast<uint32_t>(format.rate)))
+        return true;
+    fail("FLAC files hold 1 to %d channels at up to %d Hz, not %d channels at %d Hz", FLAC__MAX_CHANNELS,
+         FLAC__MAX_SAMPLE_RATE, format.channels, format.rate);
 }
 
 void CFlacEncoder::open(COutputFile& file, const SEncoderSettings& settings) {

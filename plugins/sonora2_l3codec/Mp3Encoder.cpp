@@ -19,6 +19,11 @@ int toKilobits(int bitRate) {
     return std::max(bitRate / 1000, 1);
 }
 
+// MPEG-1 has other bit rates than the versions for lower sample rates.
+int getLowestBitRate(int rate) {
+    return rate >= 32000 ? 32000 : 8000;
+}
+
 float toVbrQuality(double quality) {
     return static_cast<float>(std::clamp((1.0 - quality) * 10, 0.0, 9.999));
 }
@@ -33,13 +38,23 @@ bool isAverage(const SEncoderSettings& settings) {
 
 // The codec would silently resample other rates and drop channels after the second.
 bool CMp3Encoder::accepts(const SPcmFormat& format) const {
-    return format.channels <= 2 &&
-           std::find(std::begin(kRates), std::end(kRates), format.rate) != std::end(kRates);
+    if (format.channels <= 2 &&
+        std::find(std::begin(kRates), std::end(kRates), format.rate) != std::end(kRates))
+        return true;
+    fail("MP3 files hold 1 or 2 channels at 8, 11.025, 12, 16, 22.05, 24, 32, 44.1 or 48 kHz, not %d "
+         "channels at "
+         "%d Hz",
+         format.channels, format.rate);
 }
 
 void CMp3Encoder::open(COutputFile& file, const SEncoderSettings& settings) {
     m_file = &file;
     m_format = settings.format;
+    const int lowest = getLowestBitRate(m_format.rate);
+    for (const int bitRate : {settings.nominalBitRate, settings.maxBitRate})
+        if (bitRate > 0 && bitRate < lowest)
+            fail("could not write %s: %d bits per second are too few, MP3 at %d Hz needs at least %d",
+                 file.getFile().getDisplayName(), bitRate, m_format.rate, lowest);
     m_encoder.reset(lame_init());
     lame_t encoder = m_encoder.get();
     if (!encoder) throw std::bad_alloc();

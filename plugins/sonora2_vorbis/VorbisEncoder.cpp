@@ -39,7 +39,9 @@ CVorbisEncoder::~CVorbisEncoder() {
 }
 
 bool CVorbisEncoder::accepts(const SPcmFormat& format) const {
-    return format.channels <= kMaxChannels && format.rate <= kMaxRate;
+    if (format.channels <= kMaxChannels && format.rate <= kMaxRate) return true;
+    fail("Ogg Vorbis files hold 1 to %d channels at up to %d Hz, not %d channels at %d Hz", kMaxChannels,
+         kMaxRate, format.channels, format.rate);
 }
 
 void CVorbisEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
@@ -52,8 +54,11 @@ void CVorbisEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
                   : vorbis_encode_init_vbr(&m_info, m_format.channels, m_format.rate,
                                            static_cast<float>(settings.quality.value_or(kDefaultQuality)));
     if (error != 0)
-        fail("could not write %s: Vorbis has no mode for %d Hz, %d channels and these bit rates",
-             file.getFile().getDisplayName(), m_format.rate, m_format.channels);
+        fail("could not write %s: Vorbis has no mode for %d channels at %d Hz with a bit rate of %d (at "
+             "least %d, at "
+             "most %d)",
+             file.getFile().getDisplayName(), m_format.channels, m_format.rate, settings.nominalBitRate,
+             settings.minBitRate, settings.maxBitRate);
     vorbis_analysis_init(&m_state, &m_info);
     vorbis_block_init(&m_state, &m_block);
     // The serial number distinguishes streams that are chained later.

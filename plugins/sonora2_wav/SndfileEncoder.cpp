@@ -81,7 +81,9 @@ SF_INFO CSndfileEncoder::describe(const SPcmFormat& format) const {
 
 bool CSndfileEncoder::accepts(const SPcmFormat& format) const {
     const SF_INFO info = describe(format);
-    return sf_format_check(&info) != 0;
+    if (sf_format_check(&info)) return true;
+    fail(".%s files hold up to 1024 channels, not %d channels at %d Hz in %d bits", m_container.extension,
+         format.channels, format.rate, format.bytesPerSample * 8);
 }
 
 void CSndfileEncoder::open(COutputFile& file, const SEncoderSettings& settings) {

@@ -52,8 +52,12 @@ private:
 } // namespace
 
 bool CWavEncoder::accepts(const SPcmFormat& format) const {
-    return format.channels <= UINT16_MAX / format.bytesPerSample &&
-           int64_t{format.rate} * format.frameBytes() <= UINT32_MAX;
+    if (format.channels <= UINT16_MAX / format.bytesPerSample &&
+        int64_t{format.rate} * format.frameBytes() <= UINT32_MAX)
+        return true;
+    fail("WAV files hold frames of up to 65535 bytes and up to 4 GiB per second, not %d channels at %d Hz in "
+         "%d bits",
+         format.channels, format.rate, format.bytesPerSample * 8);
 }
 
 void CWavEncoder::open(COutputFile& file, const SEncoderSettings& settings) {

@@ -55,9 +55,17 @@ P<common::IFormat> CPluginBase::tryCreateFormat(const P<peru::IURI>& uri, int nT
     if (!serves(file)) return nullptr;
     const SFormatParams params = common::receiveRecord(pParams);
     const SPcmFormat format{params.nSampleRate, params.nChannelCount, params.nBytesPerSample};
-    const bool sound =
+    bool accepted =
         format.rate > 0 && format.channels > 0 && format.bytesPerSample >= 1 && format.bytesPerSample <= 4;
-    if (!sound || !factory(file)->accepts(format)) return nullptr;
+    P<peru::IString> reason = peru::format("%d channels at %d Hz in %d bits are not supported",
+                                           format.channels, format.rate, format.bytesPerSample * 8);
+    try {
+        accepted = accepted && factory(file)->accepts(format);
+    } catch (const common::CSonoraError& error) {
+        accepted = false;
+        reason = error.getDescription();
+    }
+    if (!accepted) fail("could not write %s: %s", file.getDisplayName(), reason);
     return peru::make<CEncoderFormat>(m_name, file, factory, format);
 }
 

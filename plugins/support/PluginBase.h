@@ -26,7 +26,7 @@ using Extensions = std::vector<std::string>; // lower case, without the dot
 //   };
 //   SONORA2_PLUGIN(CMyPlugin)
 //
-// Declines requests that are not for audio, not for a local file, or for a format that it does not support.
+// Declines requests that are not for audio or not for a local file.
 class CPluginBase : public peru::CObject, public common::ISonoraPlugin {
 public:
     P<peru::IString> getPluginName() override { return m_name; }
@@ -36,6 +36,7 @@ public:
     // bDontCloseAfterTesting is set. Throws the reason if the file cannot be read in the requested format.
     P<common::ISource> tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
                                        const SSourceParams* pParams) override;
+    // Throws the reason if the format cannot be written.
     P<common::IFormat> tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
                                        const SFormatParams* pParams) override;
     P<peru::IBase> tryCreateObject(const P<peru::IURI>& uri, const SObjectParams* pParams) override;

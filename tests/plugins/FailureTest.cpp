@@ -282,12 +282,43 @@ TEST_F(CPluginTest, FlacThatChangesItsRate_EndsThere) {
               error);
 }
 
-TEST_F(CPluginTest, RefusedShape_KeepsTheOldFile) {
-    folder.write("x.flac", "dear to somebody");
-    EXPECT_FALSE(makeFormat(folder / "x.flac", {44100, 9, 2}));
-    EXPECT_FALSE(makeFormat(folder / "x.flac", {2000000, 2, 2}));
-    P<IAudioFormat> format = makeFormat(folder / "x.flac", {});
-    EXPECT_EQ("dear to somebody", readFile(folder / "x.flac"));
+TEST_F(CPluginTest, RefusedShape_StatesWhyAndKeepsTheOldFile) {
+    const struct {
+        const char* name;
+        SShape shape;
+        const char* reason;
+    } refused[] = {
+        {"x.flac",
+         {44100, 9, 2},
+         "FLAC files hold 1 to 8 channels at up to 1048575 Hz, not 9 channels at 44100 Hz"},
+        {"x.flac", {2000000, 2, 2}, "not 2 channels at 2000000 Hz"},
+        {"x.mp3", {96000, 2, 2}, "44.1 or 48 kHz, not 2 channels at 96000 Hz"},
+        {"x.mp3", {44100, 3, 2}, "MP3 files hold 1 or 2 channels"},
+        {"x.ogg", {250000, 2, 2}, "up to 200000 Hz, not 2 channels at 250000 Hz"},
+        {"x.wav", {2000000000, 2, 2}, "WAV files hold"},
+        {"x.aiff", {44100, 2000, 2}, ".aiff files hold up to 1024 channels"},
+    };
+    for (const auto& row : refused) {
+        folder.write(row.name, "dear to somebody");
+        log->lines.clear();
+        EXPECT_FALSE(makeFormat(folder / row.name, row.shape));
+        ASSERT_EQ(1u, log->lines.size());
+        EXPECT_NE(std::string::npos, log->lines[0].find(row.reason)) << log->lines[0];
+        P<IAudioFormat> format = makeFormat(folder / row.name, {});
+        EXPECT_EQ("dear to somebody", readFile(folder / row.name));
+    }
+}
+
+TEST_F(CPluginTest, BitRateThatIsTooLow_IsRefusedWithoutAFile) {
+    for (const auto& [name, reason] :
+         {std::pair{"x.mp3", "192 bits per second are too few, MP3 at 44100 Hz needs at least 32000"},
+          std::pair{"x.ogg", "2 channels at 44100 Hz with a bit rate of 192 "}}) {
+        P<IAudioFormat> format = makeFormat(folder / name, {});
+        format->setAudioBitRate(192, 0, 0);
+        const std::string error = errorOf([&] { format->open(); });
+        EXPECT_NE(std::string::npos, error.find(reason)) << error;
+        EXPECT_FALSE(std::filesystem::exists(folder / name));
+    }
 }
 
 } // namespace
