@@ -144,10 +144,8 @@ void useCommonNames(PropertyMap& fields) {
     };
     for (const auto& names : kNames)
         if (fields.contains(names.rare) && !fields.contains(names.common)) rename(names.rare, names.common);
-    // Comments with a description are notes of programs, except where there is no other comment.
-    if (fields.contains("COMMENT")) return;
-    for (const auto& [key, values] : PropertyMap(fields))
-        if (key.startsWith("COMMENT:") && !key.startsWith("COMMENT:ITUN")) return rename(key, "COMMENT");
+    for (const char* key : {"COMMENT:ID3V1 COMMENT", "COMMENT:COMMENT"})
+        if (fields.contains(key) && !fields.contains("COMMENT")) rename(key, "COMMENT");
 }
 
 } // namespace

@@ -79,6 +79,40 @@ TEST(Mp3Tag, KeepsTextsThatAreNoNumbers) {
     EXPECT_EQ(readWithExiftool(file, "ID3v1:Year"), "1999");
 }
 
+TEST(Mp3Tag, ClearsOnlyTheCommentThatIsShown) {
+    const CTempFolder folder;
+    const auto file = tests::makeSound(folder, "mp3");
+    ASSERT_EQ(
+        tests::run({"eyeD3", "-Q", "--comment", "shown", "--add-comment", "data:program", file}).exitCode, 0);
+    const P<IFileTag> tag = open(file);
+    EXPECT_EQ(tests::text(tag->getComment()), "shown");
+    tag->setComment("");
+    tag->store();
+    EXPECT_EQ(tests::text(open(file)->getComment()), "");
+    EXPECT_NE(tests::run({"eyeD3", "--no-color", file}).out.find("data"), std::string::npos);
+}
+
+TEST(Mp3Tag, ReadsAnAPETagAndKeepsItInStep) {
+    const CTempFolder folder;
+    const auto file = tests::makeSound(folder, "mp3");
+    tests::judge({"ape", file});
+    P<IFileTag> tag = open(file);
+    EXPECT_EQ(tests::text(tag->getTagType()), "APE");
+    EXPECT_EQ(tests::text(tag->getTitle()), "APE title");
+    EXPECT_EQ(tests::text(tag->getTrackNumber()), "7/9");
+    tag->setTitle("New title");
+    tag->setAlbum("Only in ID3");
+    tag->store();
+    const nlohmann::json items = tests::judge({"readape", file});
+    EXPECT_EQ(items, (nlohmann::json{{"Artist", "APE artist"},
+                                     {"TITLE", "New title"},
+                                     {"Track", "7/9"},
+                                     {"replaygain_track_gain", "-3 dB"}}));
+    const CTexts texts = tests::judge({"fields", file})[0].get<CTexts>();
+    EXPECT_EQ(texts.at("artist"), "APE artist");
+    EXPECT_EQ(texts.at("title"), "New title");
+}
+
 TEST(Mp3Tag, ReadsTheVersionsOfOtherPrograms) {
     const CTempFolder folder;
     const auto plain = tests::makeSound(folder, "mp3");

@@ -3,6 +3,7 @@
 #include "filetag/id3tag/CoverArt.h"
 #include "filetag/id3tag/OldTag.h"
 
+#include <apetag.h>
 #include <id3v1genres.h>
 #include <id3v1tag.h>
 #include <id3v2framefactory.h>
@@ -61,6 +62,42 @@ UserTextIdentificationFrame* findOtherComment(TagLib::ID3v2::Tag* tag) {
     return UserTextIdentificationFrame::find(tag, "comment");
 }
 
+// Other descriptions mark comments in which programs store data of their own.
+bool isPlainComment(const TagLib::String& description) {
+    const TagLib::String upper = description.upper();
+    return upper.isEmpty() || upper == "COMMENT" || upper == "ID3V1 COMMENT";
+}
+
+const char* getApeKey(EField field) {
+    switch (field) {
+    case EField::title:
+        return "TITLE";
+    case EField::artist:
+        return "ARTIST";
+    case EField::album:
+        return "ALBUM";
+    case EField::albumArtist:
+        return "ALBUM ARTIST";
+    case EField::trackNumber:
+        return "TRACK";
+    case EField::year:
+        return "YEAR";
+    case EField::genre:
+        return "GENRE";
+    case EField::comment:
+        return "COMMENT";
+    }
+    return "";
+}
+
+TagLib::String readApeField(const TagLib::APE::Tag& tag, EField field) {
+    const auto& items = tag.itemListMap();
+    const auto found = items.find(getApeKey(field));
+    if (found == items.end() || found->second.type() != TagLib::APE::Item::Text) return {};
+    const TagLib::StringList values = found->second.values();
+    return values.isEmpty() ? TagLib::String() : values.front();
+}
+
 } // namespace
 
 CID3Tag::CID3Tag(const P<IURI>& file) : CTagLibTag(file) {}
@@ -79,6 +116,7 @@ std::unique_ptr<TagLib::File> CID3Tag::openFile(TagLib::IOStream& stream) {
     m_mpeg = file.get();
     m_tag = file->ID3v2Tag(false);
     m_oldTag = file->ID3v1Tag(false);
+    m_apeTag = file->hasAPETag() ? file->APETag(false) : nullptr;
     return file;
 }
 
@@ -86,6 +124,7 @@ void CID3Tag::dropTags() {
     m_mpeg = nullptr;
     m_tag = nullptr;
     m_oldTag = nullptr;
+    m_apeTag = nullptr;
     m_removedPictures.clear();
 }
 
@@ -97,17 +136,17 @@ P<IString> CID3Tag::getTagType() const {
     if (!m_mpeg) return CString::empty();
     if (m_mpeg->hasID3v2Tag())
         return CString::fromUTF8("ID3v2." + std::to_string(m_tag->header()->majorVersion()));
-    return m_mpeg->hasID3v1Tag() ? newString("ID3v1") : CString::empty();
+    if (m_mpeg->hasID3v1Tag()) return newString("ID3v1");
+    return m_apeTag ? newString("APE") : CString::empty();
 }
 
-// Programs store their own data in comments with a description.
 CommentsFrame* CID3Tag::findComment() const {
     CommentsFrame* found = nullptr;
     for (TagLib::ID3v2::Frame* frame : m_tag->frameList("COMM")) {
         auto* comment = dynamic_cast<CommentsFrame*>(frame);
         if (!comment) continue;
         if (comment->description().isEmpty()) return comment;
-        if (!found && !comment->description().startsWith("iTun")) found = comment;
+        if (!found && isPlainComment(comment->description())) found = comment;
     }
     return found;
 }
@@ -129,9 +168,13 @@ TagLib::String CID3Tag::readFrame(EField field) const {
     return field == EField::genre ? toGenre(text) : text;
 }
 
+// ID3v1 truncates texts, so the APE tag takes precedence if it has the same text in full.
 TagLib::String CID3Tag::readField(EField field) const {
     const TagLib::String text = readFrame(field);
-    return text.isEmpty() && m_oldTag ? readOldField(*m_oldTag, field) : text;
+    if (!text.isEmpty()) return text;
+    const TagLib::String old = m_oldTag ? readOldField(*m_oldTag, field) : TagLib::String();
+    const TagLib::String ape = m_apeTag ? readApeField(*m_apeTag, field) : TagLib::String();
+    return old.isEmpty() || ape.startsWith(old) ? ape : old;
 }
 
 void CID3Tag::writeComment(const TagLib::String& text) {
@@ -166,6 +209,9 @@ void CID3Tag::writeField(EField field, const TagLib::String& text) {
     writeFrame(field, text);
     // Otherwise a removed text would still be read from there.
     if (m_oldTag) writeOldField(*m_oldTag, field, text);
+    if (!m_apeTag || readApeField(*m_apeTag, field).isEmpty()) return;
+    m_apeTag->removeItem(getApeKey(field));
+    if (!text.isEmpty()) m_apeTag->addValue(getApeKey(field), text);
 }
 
 // Copies fields that only one of the two tags has to the other. TagLib would do so with integers and lose

@@ -11,7 +11,9 @@
 
 namespace filetag::id3tag {
 
-// Reads the ID3v2 tag, and the ID3v1 tag for fields missing there. Writes both, ID3v2 as version 2.4.
+// Reads the ID3v2 tag, and the ID3v1 and APE tags for fields missing there. Writes the first two, ID3v2 as
+// version 2.4, and updates the texts that an APE tag has. Comments with a description are data of other
+// programs.
 class FILETAG_API CID3Tag : public taglib::CTagLibTag {
 public:
     explicit CID3Tag(const P<peru::IURI>& file);
@@ -47,6 +49,7 @@ private:
     TagLib::MPEG::File* m_mpeg = nullptr; // the open file
     TagLib::ID3v2::Tag* m_tag = nullptr;  // null if the file has none, until something is written
     TagLib::ID3v1::Tag* m_oldTag = nullptr;
+    TagLib::APE::Tag* m_apeTag = nullptr; // null if the file has none
     // Kept until close(), so that no new picture gets the address that identifies a removed one.
     std::vector<std::unique_ptr<TagLib::ID3v2::AttachedPictureFrame>> m_removedPictures;
 };

@@ -42,16 +42,20 @@ public:
     // constructor and next() throw CStreamError.
     explicit CChunkReader(const P<peru::ISeekableInStream>& stream);
     bool isWave() const { return m_wave; }
-    // Returns false at the end of the file. Up to seven trailing bytes may remain there.
+    // Returns false at the end of the chunks. Up to seven trailing bytes may remain there.
     bool next(SChunk& chunk);
+    // Where an ID3v1 or APE tag follows the chunks, which must stay at the end of the file; otherwise the end
+    // of the file.
+    int64_t getEnd() const { return m_end; }
 
 private:
+    bool isTagAt(int64_t offset);
     bool isIdAt(int64_t offset);
     bool isPadAt(int64_t offset);
     bool readAt(int64_t offset, void* bytes, int64_t size); // false if the file is too short
 
     P<peru::ISeekableInStream> m_stream;
-    int64_t m_fileSize;
+    int64_t m_end; // of the chunks
     int64_t m_offset = kHeaderSize;
     bool m_wave = false;
     bool m_sizeTold = false; // the size in the RIFF header is correct

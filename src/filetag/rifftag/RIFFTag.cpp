@@ -108,7 +108,8 @@ private:
     int64_t m_end = 0;
 };
 
-void copyChunks(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri, CCopier& copier) {
+void copyFile(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri,
+              const std::vector<uint8_t>& list, CCopier& copier) {
     CChunkReader chunks = readChunks(file, uri);
     for (SChunk chunk; chunks.next(chunk);) {
         if (chunk.info) continue;
@@ -121,6 +122,8 @@ void copyChunks(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri
         copier.copy(mended ? body : chunk.offset, body + chunk.size);
         if (needsPad(chunk)) copier.write("", 1);
     }
+    copier.write(list.data(), static_cast<int64_t>(list.size()));
+    copier.copy(chunks.getEnd(), file->getSize());
     copier.finish();
 }
 
@@ -172,8 +175,7 @@ void CRIFFTag::store() {
         copier.write("RIFF", 4);
         copier.write(&riffSize, sizeof riffSize);
         copier.write("WAVE", 4);
-        copyChunks(old, m_uri, copier);
-        copier.write(list.data(), listSize);
+        copyFile(old, m_uri, list, copier);
         replacement->commit();
         m_stored = list;
     });

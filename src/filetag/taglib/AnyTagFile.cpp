@@ -223,6 +223,10 @@ PropertyMap CAnyTagFile::readFields() const {
     TagLib::File* file = m_file.file();
     if (const auto* wave = dynamic_cast<TagLib::RIFF::WAV::File*>(file)) return readWave(*wave);
     PropertyMap fields = file->properties();
+    // Programs that only measure the loudness write an APE tag next to the ID3v2 tag.
+    if (auto* mpeg = dynamic_cast<TagLib::MPEG::File*>(file); mpeg && mpeg->hasAPETag())
+        for (const auto& [key, values] : mpeg->APETag()->properties())
+            if (!fields.contains(key)) fields.insert(key, values);
     if (fields.contains(kPictureField)) { // one that TagLib cannot decode
         fields.erase(kPictureField);
         fields.unsupportedData().append(kPictureField);

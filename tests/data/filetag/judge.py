@@ -4,6 +4,8 @@ judge.py fields FILE...        prints the texts of each file as a list of JSON o
 judge.py set FILE JSON         sets such texts; a value may be a list
 judge.py extras FILE           adds fields, frames and blocks that our tags do not support
 judge.py broken FILE           adds pictures that cannot be decoded, to FLAC and Ogg
+judge.py ape FILE              adds an APE tag
+judge.py readape FILE          prints the items of an APE tag
 judge.py others FILE           prints everything in the tag except the texts, as JSON
 """
 import base64
@@ -12,7 +14,7 @@ import json
 import sys
 
 import mutagen
-from mutagen import asf, flac, id3
+from mutagen import apev2, asf, flac, id3
 from mutagen.oggvorbis import OggVorbis
 
 FIELDS = ["title", "artist", "album", "albumArtist", "trackNumber", "year", "genre", "comment"]
@@ -138,6 +140,12 @@ elif command == "set":
     set_fields(name, json.loads(sys.argv[3]))
 elif command == "extras":
     add_extras(name)
+elif command == "ape":
+    tag = apev2.APEv2()
+    tag.update({"Title": "APE title", "Artist": "APE artist", "Track": "7/9", "replaygain_track_gain": "-3 dB"})
+    tag.save(name)
+elif command == "readape":
+    print(json.dumps({key: str(value) for key, value in apev2.APEv2(name).items()}))
 elif command == "broken":
     add_broken(name)
 elif command == "others":
