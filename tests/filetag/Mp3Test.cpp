@@ -1,6 +1,7 @@
 // Special cases of MP3: two tags in one file, and three versions of ID3v2.
 #include "Support.h"
 #include "filetag/FileTagFactory.h"
+#include "filetag/TagTransfer.h"
 
 using namespace peru;
 using filetag::CFileTagFactory;
@@ -111,6 +112,60 @@ TEST(Mp3Tag, ReadsAnAPETagAndKeepsItInStep) {
     const CTexts texts = tests::judge({"fields", file})[0].get<CTexts>();
     EXPECT_EQ(texts.at("artist"), "APE artist");
     EXPECT_EQ(texts.at("title"), "New title");
+}
+
+// Whatever another program reads from a file before a store, it reads afterwards.
+TEST(Mp3Tag, KeepsTheFramesOfOddTags) {
+    const CTempFolder sounds;
+    const CTempFolder folder;
+    tests::judge({"make", tests::makeSound(sounds, "mp3"), folder.path()}, "odd_id3.py");
+    std::vector<std::string> command{"frames"};
+    for (const auto& entry : std::filesystem::directory_iterator(folder.path()))
+        command.push_back(entry.path());
+    const auto before =
+        tests::judge(command, "odd_id3.py").get<std::vector<std::map<std::string, nlohmann::json>>>();
+    ASSERT_GT(before.size(), 20u);
+    for (size_t i = 0; i < before.size(); ++i) {
+        SCOPED_TRACE(command[i + 1]);
+        const std::string copy = command[i + 1] + ".all.mp3";
+        std::filesystem::copy_file(command[i + 1], copy);
+        const P<IFileTag> tag = open(command[i + 1]);
+        const auto has = [&](const char* frame) { return before[i].contains(frame); };
+        EXPECT_EQ(tests::text(tag->getArtist()), has("TPE1") ? "Artist" : "");
+        if (has("TDRC")) {
+            EXPECT_EQ(tests::text(tag->getYear()), "1999-04-01T13:05");
+        }
+        tag->setTitle("New");
+        tag->store();
+        filetag::setTagField(toURI(copy), "TITLE", {newString("New")});
+        for (const std::string& file : {command[i + 1], copy}) {
+            auto after =
+                tests::judge({"frames", file}, "odd_id3.py")[0].get<std::map<std::string, nlohmann::json>>();
+            EXPECT_EQ(after["TIT2"][0], "New");
+            for (const auto& [key, value] : before[i]) EXPECT_EQ(after[key], value) << key;
+        }
+    }
+}
+
+TEST(Mp3Tag, RefusesToLoseAFrame) {
+    const CTempFolder folder;
+    const std::string sound = tests::readFile(tests::makeSound(folder, "mp3"));
+    const std::string encrypted("\3\0\0\0\0\0\x18"
+                                "ENCR\0\0\0\6\0\x40xhello",
+                                23);
+    const std::string old("\2\0\0\0\0\0\x14"
+                          "CRM\0\0\6hello!",
+                          19);
+    for (const std::string& frame : {encrypted, old}) {
+        const std::string content = "ID3" + frame + std::string(8, '\0') + sound;
+        const auto file = folder.write("a.mp3", content);
+        const P<IFileTag> tag = open(file);
+        tag->setTitle("New");
+        const std::string error = tests::errorOf([&] { tag->store(); });
+        EXPECT_NE(error.find(frame.substr(7, 3)), std::string::npos) << error;
+        EXPECT_THROW(filetag::setTagField(toURI(file), "TITLE", {newString("New")}), CFileError);
+        EXPECT_TRUE(tests::readFile(file) == content);
+    }
 }
 
 TEST(Mp3Tag, ReadsTheVersionsOfOtherPrograms) {

@@ -89,10 +89,10 @@ inline std::filesystem::path makeSound(const CTempFolder& folder, const std::str
     return file;
 }
 
-// Runs judge.py, which reads and writes tags with mutagen, and returns its JSON output.
-inline nlohmann::json judge(std::vector<std::string> arguments) {
+// Runs a script that reads or writes tags with mutagen, and returns its JSON output.
+inline nlohmann::json judge(std::vector<std::string> arguments, const std::string& script = "judge.py") {
     arguments.insert(arguments.begin(),
-                     {"/usr/bin/python3", std::string(TONEWRIGHT_TEST_DATA) + "/filetag/judge.py"});
+                     {"/usr/bin/python3", std::string(TONEWRIGHT_TEST_DATA) + "/filetag/" + script});
     const SProcessResult result = run(arguments);
     EXPECT_EQ(result.exitCode, 0) << result.err;
     return result.out.empty() ? nlohmann::json() : nlohmann::json::parse(result.out);

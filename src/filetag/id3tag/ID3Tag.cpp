@@ -2,6 +2,10 @@
 
 #include "filetag/id3tag/CoverArt.h"
 #include "filetag/id3tag/OldTag.h"
+#include "filetag/taglib/Texts.h"
+#include "peru/Errors.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/system/IPathes.h"
 
 #include <apetag.h>
 #include <id3v1genres.h>
@@ -107,6 +111,7 @@ CID3Tag::~CID3Tag() {
 }
 
 std::unique_ptr<TagLib::File> CID3Tag::openFile(TagLib::IOStream& stream) {
+    m_source = taglib::prepareId3Tag(stream);
     auto file = std::make_unique<TagLib::MPEG::File>(&stream, TagLib::ID3v2::FrameFactory::instance());
     // TagLib accepts any bytes as an MP3 file; reject a file with neither a tag nor an audio frame.
     const TagLib::MPEG::Properties* properties = file->audioProperties();
@@ -115,6 +120,7 @@ std::unique_ptr<TagLib::File> CID3Tag::openFile(TagLib::IOStream& stream) {
         return nullptr;
     m_mpeg = file.get();
     m_tag = file->ID3v2Tag(false);
+    if (m_tag && file->hasID3v2Tag()) taglib::keepForeignFrames(*m_tag, m_source);
     m_oldTag = file->ID3v1Tag(false);
     m_apeTag = file->hasAPETag() ? file->APETag(false) : nullptr;
     return file;
@@ -123,6 +129,7 @@ std::unique_ptr<TagLib::File> CID3Tag::openFile(TagLib::IOStream& stream) {
 void CID3Tag::dropTags() {
     m_mpeg = nullptr;
     m_tag = nullptr;
+    m_editedIds.clear();
     m_oldTag = nullptr;
     m_apeTag = nullptr;
     m_removedPictures.clear();
@@ -135,7 +142,8 @@ void CID3Tag::createTag() {
 P<IString> CID3Tag::getTagType() const {
     if (!m_mpeg) return CString::empty();
     if (m_mpeg->hasID3v2Tag())
-        return CString::fromUTF8("ID3v2." + std::to_string(m_tag->header()->majorVersion()));
+        return CString::fromUTF8(
+            "ID3v2." + std::to_string(m_source.version ? m_source.version : m_tag->header()->majorVersion()));
     if (m_mpeg->hasID3v1Tag()) return newString("ID3v1");
     return m_apeTag ? newString("APE") : CString::empty();
 }
@@ -178,6 +186,7 @@ TagLib::String CID3Tag::readField(EField field) const {
 }
 
 void CID3Tag::writeComment(const TagLib::String& text) {
+    m_editedIds.insert(m_editedIds.end(), {"COMM", "TXXX"});
     while (UserTextIdentificationFrame* other = findOtherComment(m_tag)) m_tag->removeFrame(other);
     if (text.isEmpty()) {
         while (CommentsFrame* comment = findComment()) m_tag->removeFrame(comment);
@@ -198,6 +207,7 @@ void CID3Tag::writeFrame(EField field, const TagLib::String& text) {
     if (!m_tag) return;
     if (field == EField::comment) return writeComment(text);
     const char* id = getFrameId(field);
+    m_editedIds.emplace_back(id);
     m_tag->removeFrames(id);
     if (text.isEmpty()) return;
     auto frame = std::make_unique<TextIdentificationFrame>(id, TagLib::String::UTF8);
@@ -216,7 +226,10 @@ void CID3Tag::writeField(EField field, const TagLib::String& text) {
 
 // Copies fields that only one of the two tags has to the other. TagLib would do so with integers and lose
 // years and track numbers that are not numeric.
-bool CID3Tag::save(TagLib::File&, TagLib::IOStream&) {
+//
+// Nothing of the old tag may be lost without an error.
+bool CID3Tag::save(TagLib::File&, TagLib::IOStream& stream) {
+    if (!m_source.unsupported.empty()) failLostFrame(m_source.unsupported.front());
     for (const EField field : kFields) {
         const TagLib::String text = readField(field);
         if (text.isEmpty()) continue;
@@ -225,8 +238,19 @@ bool CID3Tag::save(TagLib::File&, TagLib::IOStream&) {
         if (readOldField(*oldTag, field).isEmpty()) writeOldField(*oldTag, field, text);
         m_oldTag = oldTag;
     }
-    return m_mpeg->save(TagLib::MPEG::File::AllTags, TagLib::MPEG::File::StripOthers, TagLib::ID3v2::v4,
-                        TagLib::MPEG::File::DoNotDuplicate);
+    if (!m_mpeg->save(TagLib::MPEG::File::AllTags, TagLib::MPEG::File::StripOthers, TagLib::ID3v2::v4,
+                      TagLib::MPEG::File::DoNotDuplicate))
+        return false;
+    const TagLib::String lost = taglib::findLostFrame(m_source, taglib::readId3Tag(stream), m_editedIds);
+    if (!lost.isEmpty()) failLostFrame(lost);
+    return true;
+}
+
+void CID3Tag::failLostFrame(const TagLib::String& id) const {
+    throw CFileError(localize("filetag.CID3Tag.LostFrame",
+                              "The frame '%FRAME%' of the file '%FILE%' cannot be kept.",
+                              {{"%FRAME%", taglib::fromTagText(id)}, {"%FILE%", getShownName(getURI())}}),
+                     getURI());
 }
 
 std::vector<AttachedPictureFrame*> CID3Tag::getPictures() const {
@@ -254,6 +278,7 @@ int32_t CID3Tag::getCoverArtCount() const {
 
 P<ICoverArt> CID3Tag::getCoverArt(int32_t index) const {
     AttachedPictureFrame* picture = getPicture(index);
+    m_editedIds.emplace_back("APIC"); // it can be changed through the handle
     return picture ? P<ICoverArt>(make<CCoverArt>(P<const CID3Tag>::share(this), picture)) : nullptr;
 }
 
@@ -264,6 +289,7 @@ void CID3Tag::addCoverArt(const P<CMemoryBlock>& data, const CStringArg& mimeTyp
     taglib::fillPicture(*picture, data, mimeType,
                         type == kFrontCover || type == kBackCover ? type : kOtherPicture);
     m_tag->addFrame(picture.release());
+    m_editedIds.emplace_back("APIC");
     markChanged();
 }
 
@@ -272,6 +298,7 @@ void CID3Tag::removeCoverArt(int32_t index) {
     if (!picture) return;
     m_tag->removeFrame(picture, false);
     m_removedPictures.emplace_back(picture);
+    m_editedIds.emplace_back("APIC");
     markChanged();
 }
 

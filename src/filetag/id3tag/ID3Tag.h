@@ -1,6 +1,7 @@
 // The tag of an MP3 file: ID3v2, plus ID3v1 for old players.
 #pragma once
 
+#include "filetag/taglib/Id3Frames.h"
 #include "filetag/taglib/TagLibTag.h"
 
 #include <attachedpictureframe.h>
@@ -45,7 +46,10 @@ private:
     TagLib::String readFrame(taglib::EField field) const;
     void writeFrame(taglib::EField field, const TagLib::String& text);
     void writeComment(const TagLib::String& text);
+    [[noreturn]] void failLostFrame(const TagLib::String& id) const;
 
+    taglib::SId3Tag m_source; // the ID3v2 tag in the file
+    mutable std::vector<TagLib::ByteVector> m_editedIds;
     TagLib::MPEG::File* m_mpeg = nullptr; // the open file
     TagLib::ID3v2::Tag* m_tag = nullptr;  // null if the file has none, until something is written
     TagLib::ID3v1::Tag* m_oldTag = nullptr;

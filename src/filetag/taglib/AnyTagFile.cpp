@@ -3,6 +3,7 @@
 #include "filetag/taglib/AsfObjects.h"
 #include "filetag/taglib/CommentFields.h"
 #include "filetag/taglib/FlacBlocks.h"
+#include "filetag/taglib/Id3Frames.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/system/IPathes.h"
@@ -18,6 +19,8 @@
 #include <mp4tag.h>
 #include <mpegfile.h>
 #include <oggflacfile.h>
+#include <tbytevectorlist.h>
+#include <unknownframe.h>
 #include <wavfile.h>
 #include <xiphcomment.h>
 
@@ -26,6 +29,7 @@ namespace {
 
 using namespace peru;
 using TagLib::ByteVector;
+using TagLib::ByteVectorList;
 using TagLib::String;
 using TagLib::StringList;
 
@@ -154,6 +158,28 @@ void writeWave(TagLib::RIFF::WAV::File& file, const PropertyMap& fields, bool pi
     if (file.hasID3v2Tag() || pictures || !others.isEmpty()) file.ID3v2Tag()->setProperties(fields);
 }
 
+// Lists of people, which TagLib drops if it has no keys for their roles.
+constexpr const char* kPeopleFrames[] = {"TIPL", "TMCL"};
+
+ByteVectorList readPeople(TagLib::MPEG::File& file) {
+    ByteVectorList people;
+    for (const char* id : kPeopleFrames) {
+        const TagLib::ID3v2::FrameList& frames = file.ID3v2Tag(true)->frameList(id);
+        const bool dropped = !frames.isEmpty() && file.properties().unsupportedData().contains(id);
+        people.append(dropped ? frames.front()->render() : ByteVector());
+    }
+    return people;
+}
+
+void restorePeople(TagLib::MPEG::File& file, const ByteVectorList& people) {
+    auto bytes = people.begin();
+    for (const char* id : kPeopleFrames) {
+        if (!bytes->isEmpty() && file.ID3v2Tag()->frameList(id).isEmpty())
+            file.ID3v2Tag()->addFrame(new TagLib::ID3v2::UnknownFrame(*bytes));
+        ++bytes;
+    }
+}
+
 TagLib::Ogg::XiphComment* getComment(TagLib::File& file) {
     if (auto* flac = dynamic_cast<TagLib::FLAC::File*>(&file)) return flac->xiphComment(false);
     return dynamic_cast<TagLib::Ogg::XiphComment*>(file.tag());
@@ -206,8 +232,12 @@ CAnyTagFile::CAnyTagFile(const P<IURI>& uri) : m_uri(uri), m_stream(uri) {
 void CAnyTagFile::open() {
     orderAsfObjects(m_stream);
     hideUnreadablePictures(m_stream);
+    const SId3Tag id3 = prepareId3Tag(m_stream);
+    m_lostFrames = id3.unsupported;
     m_file = TagLib::FileRef(&m_stream);
     if (m_file.isNull() || !isPlausible(*m_file.file(), m_stream)) throw CFileFormatNotSupportedError(m_uri);
+    if (auto* mpeg = dynamic_cast<TagLib::MPEG::File*>(m_file.file()); mpeg && mpeg->hasID3v2Tag())
+        keepForeignFrames(*mpeg->ID3v2Tag(), id3);
     if (auto* comment = getComment(*m_file.file())) {
         auto* ogg = dynamic_cast<TagLib::Ogg::File*>(m_file.file());
         addDroppedFields(*comment, ogg ? readOggComment(*ogg) : readFlacComment(m_stream));
@@ -248,17 +278,19 @@ void CAnyTagFile::write(const PropertyMap& fields, const std::vector<SPicture>* 
         const PropertyMap before = readFields();
         auto* comment = getComment(*file);
         const StringList unreadable = comment ? comment->fieldListMap()[kPictureField] : StringList();
+        auto* mpeg = dynamic_cast<TagLib::MPEG::File*>(file);
+        const ByteVectorList people = mpeg ? readPeople(*mpeg) : ByteVectorList();
         const PropertyMap unsupported = file->setProperties(fields);
+        if (mpeg) restorePeople(*mpeg, people);
         for (const String& picture : unreadable) comment->addField(kPictureField, picture, false);
         if (auto* mp4 = dynamic_cast<TagLib::MP4::File*>(file))
             writeFreeFields(*mp4->tag(), fields, unsupported);
         if (auto* asf = dynamic_cast<TagLib::ASF::File*>(file))
             writeFreeFields(*asf->tag(), before, fields, unsupported);
-        if (auto* mpeg = dynamic_cast<TagLib::MPEG::File*>(file); mpeg && mpeg->hasAPETag())
-            mpeg->APETag()->setProperties(fields);
+        if (mpeg && mpeg->hasAPETag()) mpeg->APETag()->setProperties(fields);
     }
     if (pictures) writePictures(*file, *pictures);
-    if (!save(*file))
+    if (!m_lostFrames.empty() || !save(*file))
         throw CFileError(localize("filetag.CTagLibTag.StoreError", "The tag of '%FILE%' could not be stored.",
                                   {{"%FILE%", getShownName(m_uri)}}),
                          m_uri);

@@ -31,7 +31,8 @@ private:
 
     P<peru::IURI> m_uri;
     CTagLibIOStream m_stream;
-    TagLib::FileRef m_file; // before the stream in the order of destruction
+    std::vector<TagLib::String> m_lostFrames; // that TagLib cannot keep
+    TagLib::FileRef m_file;                   // before the stream in the order of destruction
 };
 
 } // namespace filetag::taglib

@@ -192,7 +192,8 @@ std::vector<SPicture> readPictures(TagLib::File& file) {
 void writePictures(TagLib::File& file, const std::vector<SPicture>& pictures) {
     const SHolder holder = findHolder(file, !pictures.empty());
     if (holder.id3) {
-        for (TagLib::ID3v2::Frame* frame : TagLib::ID3v2::FrameList(holder.id3->frameList("APIC")))
+        const TagLib::ID3v2::FrameList& frames = holder.id3->frameList("APIC");
+        for (TagLib::ID3v2::Frame* frame : std::vector<TagLib::ID3v2::Frame*>(frames.begin(), frames.end()))
             if (dynamic_cast<TagLib::ID3v2::AttachedPictureFrame*>(frame)) holder.id3->removeFrame(frame);
         for (const SPicture& source : pictures) {
             auto frame = std::make_unique<TagLib::ID3v2::AttachedPictureFrame>();
