@@ -1,3 +1,4 @@
+#include "filetag/TagTransfer.h"
 #include "filetag/rifftag/RIFFTag.h"
 #include "support/Files.h"
 #include "support/Process.h"
@@ -259,6 +260,32 @@ TEST(RiffTag, LargeFilesAreReadUpToTheLimitOfTheFormat) {
         file.seekp(12) << "LIST" << word(100'000'000) << "INFO";
     }
     EXPECT_THAT(tests::errorOf([&] { openTag(list); }), testing::HasSubstr("list.wav"));
+}
+
+// Readers stop at the first odd entry without a pad byte.
+TEST(RiffTag, OddEntriesAreLastOrPadded) {
+    const tests::CTempFolder folder;
+    const auto file = folder.write("a.wav", wave(kFormat + kData));
+    const auto storeAndRead = [&](const char* padding) {
+        ::setenv("TONEWRIGHT_PAD_INFO", padding, 1);
+        const P<CRIFFTag> tag = openTag(file);
+        tag->setArtist("ab");
+        tag->setComment("abcd");
+        tag->setTitle("even");
+        tag->setGenre("xyz"); // even with its terminating zero, the others are odd
+        tag->store();
+        ::unsetenv("TONEWRIGHT_PAD_INFO");
+        EXPECT_EQ(text(openTag(file)->getComment()), "abcd");
+        std::string seen =
+            tests::run({"exiftool", "-s3", "-Genre", "-Artist", "-Comment", "-Title", file}).out;
+        for (const filetag::STagField& field : filetag::readAllTags(toURI(file)).fields)
+            seen += text(field.key) + " ";
+        return seen;
+    };
+    EXPECT_THAT(storeAndRead(""), testing::HasSubstr("GENRE"));
+    const std::string all = "xyz\nab\nabcd\neven\nARTIST COMMENT GENRE TITLE ";
+    EXPECT_EQ(storeAndRead("1"), all);
+    EXPECT_EQ(storeAndRead(""), all) << "pad bytes that are there stay";
 }
 
 TEST(RiffTag, OtherProgramsReadTextsAndSound) {

@@ -53,7 +53,9 @@ void CInfoList::set(const FourCC& id, std::string_view value) {
     }
     const size_t begin = entry.offset + kEntryHeader;
     const size_t oldRoom = entry.end - begin;
-    const size_t newRoom = value.size() + 1;
+    const size_t size = value.size() + 1;
+    const bool hasPad = oldRoom > entry.size;
+    const size_t newRoom = size + (hasPad ? size % 2 : 0);
     const auto at = [this](size_t offset) { return m_chunk.begin() + static_cast<ptrdiff_t>(offset); };
     if (newRoom > oldRoom) {
         m_chunk.reserve(m_chunk.size() - oldRoom + newRoom);
@@ -62,13 +64,36 @@ void CInfoList::set(const FourCC& id, std::string_view value) {
         m_chunk.erase(at(begin + newRoom), at(entry.end));
     }
     std::copy(value.begin(), value.end(), at(begin));
-    m_chunk[begin + value.size()] = 0;
-    setSize(entry.offset, newRoom);
+    std::fill(at(begin + value.size()), at(begin + newRoom), 0);
+    setSize(entry.offset, size);
 }
 
-const std::vector<uint8_t>& CInfoList::getChunk() {
-    setSize(0, m_chunk.size() - kEntryHeader);
-    return m_chunk;
+std::vector<uint8_t> CInfoList::render(bool padded) const {
+    std::vector<uint8_t> chunk(m_chunk.begin(), m_chunk.begin() + kListHeader);
+    std::vector<uint8_t> unpadded;
+    SEntry entry{0, 0, kListHeader};
+    while (getEntry(entry.end, entry)) {
+        const size_t value = entry.offset + kEntryHeader;
+        const bool odd = entry.size % 2 != 0;
+        const bool hasPad = entry.end > value + entry.size;
+        std::vector<uint8_t>& target = odd && !padded && !hasPad ? unpadded : chunk;
+        const SChunkHeader header{readId(entry.offset), static_cast<uint32_t>(entry.size)};
+        const auto* bytes = reinterpret_cast<const uint8_t*>(&header);
+        target.insert(target.end(), bytes, bytes + sizeof header);
+        const auto begin = m_chunk.begin() + static_cast<ptrdiff_t>(value);
+        target.insert(target.end(), begin, begin + static_cast<ptrdiff_t>(entry.size));
+        if (odd && (padded || hasPad)) target.push_back(0);
+    }
+    chunk.insert(chunk.end(), unpadded.begin(), unpadded.end());
+    const auto size = static_cast<uint32_t>(chunk.size() - kEntryHeader);
+    std::memcpy(&chunk[sizeof(FourCC)], &size, sizeof size);
+    return chunk;
+}
+
+FourCC CInfoList::readId(size_t offset) const {
+    FourCC id;
+    std::memcpy(id.data(), &m_chunk[offset], id.size());
+    return id;
 }
 
 void CInfoList::closeEnd() {

@@ -23,8 +23,11 @@ public:
     std::string_view get(const FourCC& id) const;
     // Replaces the first entry with this id or appends a new one. Adds a terminating zero to the value.
     void set(const FourCC& id, std::string_view value);
-    // The chunk to be written, with a correct size.
-    const std::vector<uint8_t>& getChunk();
+    int64_t getSize() const { return static_cast<int64_t>(m_chunk.size()); } // in memory, with the header
+    // The chunk to be written. Most programs stop reading at an entry of odd size without a pad byte, so
+    // these come last, unless all of them are to be padded. An entry that was read with a pad byte is written
+    // with one.
+    std::vector<uint8_t> render(bool padded) const;
 
 private:
     struct SEntry {
@@ -36,6 +39,7 @@ private:
     // Reads the entry at the offset. Returns false if there is no room for a header.
     bool getEntry(size_t offset, SEntry& entry) const;
     bool find(const FourCC& id, SEntry& entry) const;
+    FourCC readId(size_t offset) const;
     // Corrects the size of a cut last entry and drops trailing garbage, so that an entry can be appended.
     void closeEnd();
     void setSize(size_t offset, size_t size); // in the chunk or entry header at the offset

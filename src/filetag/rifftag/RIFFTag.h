@@ -10,8 +10,9 @@
 namespace filetag::rifftag {
 
 // Reads the first LIST chunk of type INFO. store() writes it as the last chunk of the file and removes all
-// others of that type. Texts are written as UTF-8. Album and album artist are not supported. Setting an empty
-// text writes an entry without characters.
+// others of that type. Entries of odd size get a pad byte only if the environment variable
+// TONEWRIGHT_PAD_INFO is "1". Texts are written as UTF-8. Album and album artist are not supported. Setting
+// an empty text writes an entry without characters.
 //
 // RF64, the variant for files over 4 GB, is not supported.
 class FILETAG_API CRIFFTag : public peru::CObject, public IFileTag {

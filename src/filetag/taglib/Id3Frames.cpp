@@ -350,7 +350,8 @@ SId3Tag prepareId3Tag(TagLib::IOStream& stream) {
         ByteVector frames;
         for (const SId3Frame& frame : tag.frames) frames.append(frame.render());
         // The sound stays where it is if there is room.
-        if (frames.size() + kTagHeader < tag.size) frames.resize(tag.size - kTagHeader, '\0');
+        const auto room = static_cast<unsigned int>(std::min<long>(tag.size, stream.length()));
+        if (frames.size() + kTagHeader < room) frames.resize(room - kTagHeader, '\0');
         TagLib::ID3v2::Header header;
         header.setTagSize(frames.size());
         stream.insert(header.render() + frames, 0, tag.size);
