@@ -4,6 +4,7 @@
 #include "filetag/TagTransfer.h"
 
 #include <cctype>
+#include <functional>
 #include <mutex>
 #include <set>
 #include <thread>
@@ -273,6 +274,42 @@ TEST_P(FileTag, HoldsPictures) {
     EXPECT_EQ(tests::hashSound(m_file), sound);
     // The numbers in the file, according to another reader.
     EXPECT_EQ(tests::run({"exiftool", "-a", "-n", "-PictureType", "-s3", m_file}).out, "9\n1\n");
+}
+
+TEST_P(FileTag, MapsAllPictureTypesAndReadsOtherNames) {
+    // By the number in the file.
+    const std::vector<int> types{2, 3, 4, 0, 1, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 16, 2, 2, 2, 2};
+    tests::judge({"pictures", m_file});
+    const P<ICoverArtFileTag> tag(open(m_file));
+    EXPECT_EQ(tests::text(tag->getYear()), "1999");
+    EXPECT_EQ(tests::text(tag->getTrackNumber()), GetParam() == std::string("mp3") ? "" : "7");
+    ASSERT_EQ(tag->getCoverArtCount(), static_cast<int32_t>(types.size()));
+    for (int i = 0; i < tag->getCoverArtCount(); ++i) {
+        const P<ICoverArt> picture = tag->getCoverArt(i);
+        const int number = std::stoi(tests::text(picture->getDescription()));
+        EXPECT_EQ(picture->getPictureType(), types[static_cast<size_t>(number)]) << number;
+        picture->setPictureType(static_cast<filetag::EPictureType>(i));
+    }
+    tag->store();
+    EXPECT_EQ(tests::judge({"types", m_file}).get<std::vector<int>>(),
+              (std::vector<int>{3, 4, 0, 1, 2, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 16, 0, 0, 0, 0}));
+}
+
+TEST_P(FileTag, RefusesWhatTheFormatCannotHold) {
+    const std::string kind = GetParam();
+    if (kind != "flac" && kind != "wma") return; // the others have no such limit within reason
+    const std::string before = tests::readFile(m_file);
+    const std::string large(kind == "flac" ? 0x1000000 : 33000, 'x');
+    const auto fail = [&](const std::function<void(ICoverArtFileTag&)>& change) {
+        const P<ICoverArtFileTag> tag(open(m_file));
+        change(*tag);
+        EXPECT_NE(tests::errorOf([&] { tag->store(); }).find("too long"), std::string::npos);
+        EXPECT_TRUE(tests::readFile(m_file) == before);
+    };
+    for (const auto set : {&IFileTag::setTitle, &IFileTag::setArtist, &IFileTag::setComment})
+        fail([&](ICoverArtFileTag& tag) { (tag.*set)(tests::fromStandard(large)); });
+    if (kind == "flac")
+        fail([&](ICoverArtFileTag& tag) { tag.addCoverArt(makeBlock(large), "image/png", filetag::kMedia); });
 }
 
 TEST_P(FileTag, StoresOnceAndOnlyChanges) {

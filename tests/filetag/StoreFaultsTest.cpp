@@ -142,6 +142,33 @@ TEST_P(StoreFaults, EveryFailingCallLeavesTheOldFileOrTheNewOne) {
         }
 }
 
+// A write in place that stops halfway is undone.
+TEST_P(StoreFaults, HalfAWriteInPlaceIsUndone) {
+    if (GetParam() == std::string("wav")) return; // always replaced
+    m_folder.write(getFile().filename(), m_new);
+    const auto change = [this] {
+        const P<filetag::IFileTag> tag = make<filetag::CFileTagFactory>()->create(tests::toURI(getFile()));
+        tag->setTitle("Changed title");
+        return tag;
+    };
+    change()->store();
+    const std::string changed = tests::readFile(getFile());
+    ASSERT_EQ(changed.size(), m_new.size());
+    size_t end = changed.size();
+    while (changed[end - 1] == m_new[end - 1]) --end;
+    m_folder.write(getFile().filename(), m_new);
+    const tests::SFaultyRun run = tests::runWithFault({}, [&]() -> std::function<std::string()> {
+        const P<filetag::IFileTag> tag = change();
+        ::signal(SIGXFSZ, SIG_IGN);
+        const rlimit limit{end - 2, end - 2};
+        ::setrlimit(RLIMIT_FSIZE, &limit);
+        return [tag] { return report([&tag] { tag->store(); }); };
+    });
+    if (!run.supported) GTEST_SKIP();
+    EXPECT_NE(run.report, "stored");
+    EXPECT_TRUE(tests::readFile(getFile()) == m_new) << run.report;
+}
+
 TEST_P(StoreFaults, ErrorsOfThePlaceNameTheFile) {
     const auto expectError = [this](const std::function<std::function<std::string()>()>& prepare) {
         const tests::SFaultyRun run = tests::runWithFault({}, prepare);

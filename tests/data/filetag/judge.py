@@ -6,11 +6,14 @@ judge.py extras FILE           adds fields, frames and blocks that our tags do n
 judge.py broken FILE           adds pictures that cannot be decoded, to FLAC and Ogg
 judge.py ape FILE              adds an APE tag
 judge.py readape FILE          prints the items of an APE tag
+judge.py pictures FILE         adds a picture of each type
+judge.py types FILE            prints the types of all pictures
 judge.py others FILE           prints everything in the tag except the texts, as JSON
 """
 import base64
 import hashlib
 import json
+import struct
 import sys
 
 import mutagen
@@ -102,6 +105,44 @@ def add_extras(name):
     file.save()
 
 
+def set_pictures(name):
+    file, kind = open_file(name)
+    values = []
+    for number in range(21):
+        picture = flac.Picture()
+        picture.type, picture.mime, picture.desc, picture.data = number, "image/png", str(number), b"\x89PNG"
+        if kind == "id3":
+            file.tags.add(id3.APIC(encoding=3, mime=picture.mime, type=number, desc=picture.desc, data=picture.data))
+        elif isinstance(file, flac.FLAC):
+            file.add_picture(picture)
+        elif kind == "asf":
+            text = picture.mime.encode("utf-16-le") + b"\0\0" + picture.desc.encode("utf-16-le") + b"\0\0"
+            data = struct.pack("<bi", number, len(picture.data)) + text + picture.data
+            values.append(asf.ASFByteArrayAttribute(data))
+        else:
+            values.append(base64.b64encode(picture.write()).decode())
+    if values:
+        file.tags["WM/Picture" if kind == "asf" else "metadata_block_picture"] = values
+    if kind == "id3":
+        file.tags.add(id3.TDRC(encoding=3, text=["1999"]))
+    elif kind == "asf":
+        file.tags["WM/Year"], file.tags["WM/Track"] = [asf.ASFWordAttribute(1999)], [asf.ASFDWordAttribute(7)]
+    else:
+        file.tags["year"], file.tags["tracknum"] = ["1999"], ["7"]
+    file.save()
+
+
+def get_picture_types(name):
+    file, kind = open_file(name)
+    if kind == "id3":
+        return [frame.type for frame in file.tags.getall("APIC")]
+    if isinstance(file, flac.FLAC):
+        return [picture.type for picture in file.pictures]
+    if kind == "asf":
+        return [value.value[0] for value in file.tags["WM/Picture"]]
+    return [flac.Picture(base64.b64decode(value)).type for value in file.tags["metadata_block_picture"]]
+
+
 def add_broken(name):
     file, _ = open_file(name)
     picture = b"\0\0\0\3\0\0\xff\xffbroken"
@@ -146,6 +187,10 @@ elif command == "ape":
     tag.save(name)
 elif command == "readape":
     print(json.dumps({key: str(value) for key, value in apev2.APEv2(name).items()}))
+elif command == "pictures":
+    set_pictures(name)
+elif command == "types":
+    print(json.dumps(get_picture_types(name)))
 elif command == "broken":
     add_broken(name)
 elif command == "others":
