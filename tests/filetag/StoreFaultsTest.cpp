@@ -1,15 +1,12 @@
 // After a failed store the disk holds the complete old or the complete new file and nothing else, in every
 // format.
 #include "FaultyCalls.h"
+#include "Support.h"
 #include "filetag/FileTagFactory.h"
-#include "support/Files.h"
-#include "support/Process.h"
-#include "support/TempFolder.h"
 
 #include <gmock/gmock.h>
 
 #include <csignal>
-#include <filesystem>
 #include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -18,32 +15,12 @@ using namespace peru;
 
 namespace {
 
-// Half a second of sound with a title, made by common encoders.
-std::string makeSound(const std::filesystem::path& folder, const std::string& extension) {
-    const auto wave = folder / "source.wav";
-    const auto file = folder / ("made." + extension);
-    tests::run({"sox", "-n", "-r", "22050", "-c", "1", "-b", "16", wave, "synth", "0.5", "sine", "440"});
-    const std::string title = "A title of the file's own";
-    if (extension == "wav")
-        tests::run({"ffmpeg", "-v", "error", "-i", wave, "-metadata", "title=" + title, file});
-    else if (extension == "mp3")
-        tests::run({"lame", "--quiet", "--tt", title, wave, file});
-    else if (extension == "flac")
-        tests::run({"flac", "-s", "-T", "TITLE=" + title, wave, "-o", file});
-    else if (extension == "ogg")
-        tests::run({"oggenc", "-Q", "-t", title, wave, "-o", file});
-    else
-        tests::run(
-            {"ffmpeg", "-v", "error", "-i", wave, "-c:a", "wmav2", "-metadata", "title=" + title, file});
-    return tests::readFile(file);
-}
-
 class StoreFaults : public testing::TestWithParam<const char*> {
 protected:
     static constexpr const char* kName = "a file";
 
     void SetUp() override {
-        m_old = makeSound(m_making.path(), GetParam());
+        m_old = tests::readFile(tests::makeSound(m_making, GetParam()));
         ASSERT_FALSE(m_old.empty());
         reset();
         ASSERT_EQ(prepare()(), "stored");
@@ -189,36 +166,24 @@ TEST_P(StoreFaults, ErrorsOfThePlaceNameTheFile) {
         std::filesystem::permissions(getFile(), std::filesystem::perms(file));
         std::filesystem::permissions(m_folder.path(), std::filesystem::perms(folder));
     };
-    {
-        SCOPED_TRACE("a full disk");
-        expectError([this] {
-            const std::function<std::string()> store = prepare();
-            ::signal(SIGXFSZ, SIG_IGN);
-            const rlimit limit{m_old.size() / 2, m_old.size() / 2};
-            ::setrlimit(RLIMIT_FSIZE, &limit);
-            return store;
-        });
-    }
-    {
-        SCOPED_TRACE("a folder that cannot be written");
-        setModes(0555, 0666);
-        expectError(prepareAsUser);
-    }
-    {
-        SCOPED_TRACE("a file that cannot be written");
-        setModes(0777, 0444);
-        expectError(prepareAsUser);
-    }
-    {
-        SCOPED_TRACE("a file that cannot be read");
-        setModes(0777, 0000);
-        expectError([this]() -> std::function<std::string()> {
-            if (::getuid() == 0 && ::setuid(65534) != 0) ::_exit(1);
-            return [this] {
-                return report([this] { make<filetag::CFileTagFactory>()->create(tests::toURI(getFile())); });
-            };
-        });
-    }
+    expectError([this] {
+        const std::function<std::string()> store = prepare();
+        ::signal(SIGXFSZ, SIG_IGN);
+        const rlimit limit{m_old.size() / 2, m_old.size() / 2};
+        ::setrlimit(RLIMIT_FSIZE, &limit);
+        return store;
+    });
+    setModes(0555, 0666);
+    expectError(prepareAsUser);
+    setModes(0777, 0444);
+    expectError(prepareAsUser);
+    setModes(0777, 0000);
+    expectError([this]() -> std::function<std::string()> {
+        if (::getuid() == 0 && ::setuid(65534) != 0) ::_exit(1);
+        return [this] {
+            return report([this] { make<filetag::CFileTagFactory>()->create(tests::toURI(getFile())); });
+        };
+    });
 }
 
 INSTANTIATE_TEST_SUITE_P(Formats, StoreFaults, testing::Values("wav", "mp3", "flac", "ogg", "wma"),

@@ -9,7 +9,8 @@
 
 #include <nlohmann/json.hpp>
 
-#include <array>
+#include <codecvt>
+#include <locale>
 #include <map>
 #include <string>
 
@@ -36,32 +37,16 @@ inline constexpr SField kFields[] = {
 
 using CTexts = std::map<std::string, std::string>; // by the field's name, in UTF-8
 
-// Converts standard UTF-8 to a string that can hold every character.
+// The UTF-8 of peru does not hold every character.
 inline P<peru::IString> fromStandard(const std::string& utf8) {
-    std::u16string units;
-    for (size_t i = 0; i < utf8.size();) {
-        const auto lead = static_cast<unsigned char>(utf8[i]);
-        const int more = lead < 0x80 ? 0 : lead < 0xe0 ? 1 : lead < 0xf0 ? 2 : 3;
-        char32_t code = more == 0 ? lead : lead & (0x3f >> more);
-        for (++i; i < utf8.size() && (utf8[i] & 0xc0) == 0x80; ++i) code = code << 6 | (utf8[i] & 0x3f);
-        if (code >= 0x10000) {
-            units += static_cast<char16_t>(0xd7c0 + (code >> 10));
-            code = 0xdc00 + (code & 0x3ff);
-        }
-        units += static_cast<char16_t>(code);
-    }
+    const std::u16string units =
+        std::wstring_convert<std::codecvt_utf8_utf16<char16_t>, char16_t>().from_bytes(utf8);
     return peru::CString::fromUTF16(units.data(), static_cast<int32_t>(units.size()));
 }
 
 inline std::string toStandard(const P<peru::IString>& text) {
-    // The JSON parser converts escaped surrogate pairs to UTF-8.
-    std::string escaped = "\"";
-    for (const char16_t unit : peru::CString::toStdU16String(text)) {
-        char code[8];
-        std::snprintf(code, sizeof code, "\\u%04x", static_cast<unsigned>(unit));
-        escaped += code;
-    }
-    return nlohmann::json::parse(escaped + "\"").get<std::string>();
+    return std::wstring_convert<std::codecvt_utf8_utf16<char16_t>, char16_t>().to_bytes(
+        peru::CString::toStdU16String(text));
 }
 
 inline CTexts readFields(const filetag::IFileTag& tag) {
@@ -78,6 +63,7 @@ inline std::filesystem::path makeSound(const CTempFolder& folder, const std::str
         const std::string wave = made / "source.wav";
         run({"sox", "-R", "-n", "-r", "44100", "-b", "16", "-c", "2", wave, "synth", "1", "pinknoise", "vol",
              "0.5"});
+        if (extension == "wav") std::filesystem::copy_file(wave, source);
         if (extension == "mp3") run({"lame", "--quiet", "-t", wave, source});
         if (extension == "flac") run({"flac", "-s", wave, "-o", source});
         if (extension == "ogg") run({"oggenc", "-Q", wave, "-o", source});
