@@ -163,7 +163,9 @@ TEST(Mp3Tag, RefusesToLoseAFrame) {
         tag->setTitle("New");
         const std::string error = tests::errorOf([&] { tag->store(); });
         EXPECT_NE(error.find(frame.substr(7, 3)), std::string::npos) << error;
-        EXPECT_THROW(filetag::setTagField(toURI(file), "TITLE", {newString("New")}), CFileError);
+        const std::string other =
+            tests::errorOf([&] { filetag::setTagField(toURI(file), "TITLE", {newString("New")}); });
+        EXPECT_EQ(other, error);
         EXPECT_TRUE(tests::readFile(file) == content);
     }
 }

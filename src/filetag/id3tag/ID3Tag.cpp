@@ -2,10 +2,6 @@
 
 #include "filetag/id3tag/CoverArt.h"
 #include "filetag/id3tag/OldTag.h"
-#include "filetag/taglib/Texts.h"
-#include "peru/Errors.h"
-#include "peru/strings/IStringLocalizer.h"
-#include "peru/system/IPathes.h"
 
 #include <apetag.h>
 #include <id3v1genres.h>
@@ -229,7 +225,7 @@ void CID3Tag::writeField(EField field, const TagLib::String& text) {
 //
 // Nothing of the old tag may be lost without an error.
 bool CID3Tag::save(TagLib::File&, TagLib::IOStream& stream) {
-    if (!m_source.unsupported.empty()) failLostFrame(m_source.unsupported.front());
+    if (!m_source.unsupported.empty()) taglib::failLostFrame(m_source.unsupported.front(), getURI());
     for (const EField field : kFields) {
         const TagLib::String text = readField(field);
         if (text.isEmpty()) continue;
@@ -242,15 +238,8 @@ bool CID3Tag::save(TagLib::File&, TagLib::IOStream& stream) {
                       TagLib::MPEG::File::DoNotDuplicate))
         return false;
     const TagLib::String lost = taglib::findLostFrame(m_source, taglib::readId3Tag(stream), m_editedIds);
-    if (!lost.isEmpty()) failLostFrame(lost);
+    if (!lost.isEmpty()) taglib::failLostFrame(lost, getURI());
     return true;
-}
-
-void CID3Tag::failLostFrame(const TagLib::String& id) const {
-    throw CFileError(localize("filetag.CID3Tag.LostFrame",
-                              "The frame '%FRAME%' of the file '%FILE%' cannot be kept.",
-                              {{"%FRAME%", taglib::fromTagText(id)}, {"%FILE%", getShownName(getURI())}}),
-                     getURI());
 }
 
 std::vector<AttachedPictureFrame*> CID3Tag::getPictures() const {

@@ -46,7 +46,6 @@ private:
     TagLib::String readFrame(taglib::EField field) const;
     void writeFrame(taglib::EField field, const TagLib::String& text);
     void writeComment(const TagLib::String& text);
-    [[noreturn]] void failLostFrame(const TagLib::String& id) const;
 
     taglib::SId3Tag m_source; // the ID3v2 tag in the file
     mutable std::vector<TagLib::ByteVector> m_editedIds;

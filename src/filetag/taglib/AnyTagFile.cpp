@@ -1,5 +1,6 @@
 #include "filetag/taglib/AnyTagFile.h"
 
+#include "filetag/id3tag/OldTag.h"
 #include "filetag/taglib/AsfObjects.h"
 #include "filetag/taglib/CommentFields.h"
 #include "filetag/taglib/FlacBlocks.h"
@@ -180,6 +181,22 @@ void restorePeople(TagLib::MPEG::File& file, const ByteVectorList& people) {
     }
 }
 
+// Old players read the ID3v1 tag only.
+void writeOtherTags(TagLib::MPEG::File& file, const PropertyMap& fields) {
+    constexpr struct {
+        EField field;
+        const char* key;
+    } kOldFields[] = {
+        {EField::title, "TITLE"},    {EField::artist, "ARTIST"},           {EField::album, "ALBUM"},
+        {EField::year, "DATE"},      {EField::trackNumber, "TRACKNUMBER"}, {EField::genre, "GENRE"},
+        {EField::comment, "COMMENT"}};
+    for (const auto& [field, key] : kOldFields) {
+        const StringList values = fields.contains(key) ? fields[key] : StringList();
+        id3tag::writeOldField(*file.ID3v1Tag(true), field, values.isEmpty() ? String() : values.front());
+    }
+    if (file.hasAPETag()) file.APETag()->setProperties(fields);
+}
+
 TagLib::Ogg::XiphComment* getComment(TagLib::File& file) {
     if (auto* flac = dynamic_cast<TagLib::FLAC::File*>(&file)) return flac->xiphComment(false);
     return dynamic_cast<TagLib::Ogg::XiphComment*>(file.tag());
@@ -287,10 +304,11 @@ void CAnyTagFile::write(const PropertyMap& fields, const std::vector<SPicture>* 
             writeFreeFields(*mp4->tag(), fields, unsupported);
         if (auto* asf = dynamic_cast<TagLib::ASF::File*>(file))
             writeFreeFields(*asf->tag(), before, fields, unsupported);
-        if (mpeg && mpeg->hasAPETag()) mpeg->APETag()->setProperties(fields);
+        if (mpeg) writeOtherTags(*mpeg, fields);
     }
     if (pictures) writePictures(*file, *pictures);
-    if (!m_lostFrames.empty() || !save(*file))
+    if (!m_lostFrames.empty()) failLostFrame(m_lostFrames.front(), m_uri);
+    if (!save(*file))
         throw CFileError(localize("filetag.CTagLibTag.StoreError", "The tag of '%FILE%' could not be stored.",
                                   {{"%FILE%", getShownName(m_uri)}}),
                          m_uri);

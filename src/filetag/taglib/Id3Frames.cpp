@@ -1,5 +1,10 @@
 #include "filetag/taglib/Id3Frames.h"
 
+#include "filetag/taglib/Texts.h"
+#include "peru/Errors.h"
+#include "peru/strings/IStringLocalizer.h"
+#include "peru/system/IPathes.h"
+
 #include <attachedpictureframe.h>
 #include <commentsframe.h>
 #include <id3v1genres.h>
@@ -388,6 +393,14 @@ String findLostFrame(const SId3Tag& before, const SId3Tag& after, const std::vec
         left.erase(found);
     }
     return {};
+}
+
+void failLostFrame(const String& id, const peru::P<peru::IURI>& file) {
+    throw peru::CFileError(
+        peru::localize("filetag.CID3Tag.LostFrame",
+                       "The frame '%FRAME%' of the file '%FILE%' cannot be kept.",
+                       {{"%FRAME%", fromTagText(id)}, {"%FILE%", peru::getShownName(file)}}),
+        file);
 }
 
 } // namespace filetag::taglib

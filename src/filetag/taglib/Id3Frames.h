@@ -1,6 +1,8 @@
 // The frames of an ID3v2 tag as they are in the file, including those that TagLib does not parse.
 #pragma once
 
+#include "peru/uri/IURI.h"
+
 #include <id3v2tag.h>
 #include <tbytevector.h>
 #include <tiostream.h>
@@ -41,5 +43,8 @@ void keepForeignFrames(TagLib::ID3v2::Tag& tag, const SId3Tag& source);
 // Frames whose ids are in `edited` are not compared.
 TagLib::String findLostFrame(const SId3Tag& before, const SId3Tag& after,
                              const std::vector<TagLib::ByteVector>& edited);
+
+// Throws CFileError.
+[[noreturn]] void failLostFrame(const TagLib::String& id, const peru::P<peru::IURI>& file);
 
 } // namespace filetag::taglib
