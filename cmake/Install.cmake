@@ -15,12 +15,10 @@ get_property(internal_libraries GLOBAL PROPERTY TONEWRIGHT_INTERNAL_LIBRARIES)
 get_property(plugins GLOBAL PROPERTY TONEWRIGHT_PLUGINS)
 get_property(companions GLOBAL PROPERTY TONEWRIGHT_COMPANIONS)
 
-# These two serve C hosts, which have no C++ compiler: no C++ requirements on them.
 set(c_libraries tonewright tonewright_host_support)
 list(REMOVE_ITEM libraries ${c_libraries})
 foreach(library ${libraries})
     target_include_directories(${library} INTERFACE $<INSTALL_INTERFACE:${include_dir}>)
-    target_compile_features(${library} INTERFACE cxx_std_20)
 endforeach()
 foreach(library ${c_libraries})
     target_include_directories(${library} INTERFACE $<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}>)

@@ -38,10 +38,11 @@ endif()
 set(TONEWRIGHT_PLUGIN_FOLDER ${CMAKE_INSTALL_LIBDIR}/tonewright)
 set(TONEWRIGHT_COMPANION_FOLDER ${CMAKE_INSTALL_LIBEXECDIR}/tonewright)
 
-# tw_library(NAME [INTERNAL] FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library with the alias
-# tw::NAME. An INTERNAL one is installed to the plug-in folder, since only other libraries of the project link it.
+# tw_library(NAME [INTERNAL] [C_INTERFACE] FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library with the
+# alias tw::NAME. An INTERNAL one is installed to the plug-in folder, since only other libraries of the project link it.
+# With C_INTERFACE its users need no C++ compiler.
 function(tw_library name)
-    cmake_parse_arguments(arg "INTERNAL" "" "FOLDERS;PUBLIC;PRIVATE" ${ARGN})
+    cmake_parse_arguments(arg "INTERNAL;C_INTERFACE" "" "FOLDERS;PUBLIC;PRIVATE" ${ARGN})
     tw_sources(sources ${arg_FOLDERS})
     if(NOT sources)
         return()
@@ -51,6 +52,9 @@ function(tw_library name)
     add_library(tw::${name} ALIAS ${name})
     add_library(tonewright::${name} ALIAS ${name}) # the name that an installed package gives it
     target_include_directories(${name} PUBLIC $<BUILD_INTERFACE:${PROJECT_SOURCE_DIR}/src>)
+    if(NOT arg_C_INTERFACE)
+        target_compile_features(${name} INTERFACE cxx_std_20)
+    endif()
     target_link_libraries(${name} PUBLIC ${arg_PUBLIC} PRIVATE ${arg_PRIVATE} Threads::Threads)
     target_link_options(${name} PRIVATE ${TONEWRIGHT_LINK_STRICTLY})
     target_precompile_headers(${name} PRIVATE <algorithm> <cstdint> <cstring> <memory> <string> <vector>)

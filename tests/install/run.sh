@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
-# Installs a build to a temporary root, builds hosts and a plug-in against that copy, and converts with all of them:
-# run.sh BUILD_DIR SOURCE_DIR CMAKE. Works for every layout, with libraries in lib or in lib/<architecture>.
+# Installs a build to a temporary root, builds hosts and a plug-in against that copy, and converts with all of them. Also
+# builds users of the source tree as a subproject. Works for every layout, with libraries in lib or in
+# lib/<architecture>: run.sh BUILD_DIR SOURCE_DIR CMAKE
 set -euo pipefail
 
 build=$1 source=$2 cmake=$3
@@ -33,6 +34,9 @@ for project in "$source/host" "$source/cpp" "$examples/plugin"; do
     quietly "$cmake" -S "$project" -B "$work/$(basename "$project")" -G Ninja "-DCMAKE_PREFIX_PATH=$prefix" "-DEXAMPLES=$examples"
     quietly "$cmake" --build "$work/$(basename "$project")"
 done
+
+quietly "$cmake" -S "$source/subproject" -B "$work/enclosing" -G Ninja "-DEXAMPLES=$examples"
+quietly "$cmake" --build "$work/enclosing" --target users
 
 cd "$work"
 sox -n -r 44100 -c 2 -b 16 tone.wav synth 1 sine 440
