@@ -11,6 +11,7 @@
 #include <atomic>
 #include <set>
 #include <stdexcept>
+#include <system_error>
 #include <thread>
 
 namespace host {
@@ -148,6 +149,7 @@ fs::path chooseOutput(const SConvertOptions& options, const fs::path& input) {
 } // namespace
 
 int convert(CLibrary& library, const SConvertOptions& options) {
+    if (!options.directory.empty()) fs::create_directories(options.directory);
     CProgress progress(options.show);
     CConverter converter(library, options, progress);
 
@@ -174,7 +176,11 @@ int convert(CLibrary& library, const SConvertOptions& options) {
     };
     std::vector<std::thread> others;
     const size_t threads = std::min<size_t>(static_cast<size_t>(options.jobs), options.inputs.size());
-    for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
+    try {
+        for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
+    } catch (const std::system_error&) {
+        // The system has no more threads: those that are there do all the work.
+    }
     work();
     for (std::thread& thread : others) thread.join();
     return isCancelled() ? kExitCancelled : failed ? kExitFailure : kExitSuccess;

@@ -83,6 +83,11 @@ void print(const TONEWRIGHT_DeviceInfo& device, const char* direction, bool json
 
 } // namespace
 
+void printNoDevice(const CNoDevice& failure) {
+    std::printf("%s\n", toLine({{"event", "error"}, {"message", failure.what()}}).c_str());
+    flushEvents();
+}
+
 void requireOutDevice() {
     // A file player needs no answer within milliseconds, and with the small latency that the device asks for,
     // a busy machine causes gaps. A latency above one chunk of sound causes a gap at the beginning, and from

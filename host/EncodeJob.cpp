@@ -59,7 +59,10 @@ CHandle requireFormat(CLibrary& library, const fs::path& temporary, const SSampl
                       const SFormatOptions& options, const fs::path& output, const std::string& subject) {
     CHandle format = createFormat(library, temporary, samples, options);
     if (format) return format;
-    throw std::runtime_error(takeFailure(subject + " cannot hold " + describe(samples), temporary));
+    std::string reason = takeFailure(subject + " cannot hold " + describe(samples));
+    replaceAll(reason, temporary.native(), output.native());
+    replaceAll(reason, temporary.filename().native(), output.filename().native());
+    throw std::runtime_error(reason);
 }
 
 bool encode(CLibrary& library, const CHandle& source, const CHandle& format, CProgress& progress,

@@ -12,8 +12,10 @@ namespace {
 void print(const TONEWRIGHT_LogMessage* message, void*) {
     static constexpr const char* kWords[] = {"trace", "debug", "info", "warning", "exception", "error"};
     const bool isKnown = message->level >= TONEWRIGHT_LOG_TRACE && message->level <= TONEWRIGHT_LOG_ERROR;
+    std::string text = toPrintable(message->text);
+    replaceAll(text, "\\x0a", "\n  "); // texts of several lines
     std::fprintf(stderr, "%s%s%s: %s\n", isKnown ? kWords[message->level] : "unknown",
-                 *message->component ? " " : "", message->component, toPrintable(message->text).c_str());
+                 *message->component ? " " : "", message->component, text.c_str());
 }
 
 } // namespace

@@ -75,13 +75,13 @@ void CLiveLine::emit(const char* event, nlohmann::json details) {
     details["event"] = event;
     details[m_key] = m_file.native();
     std::printf("%s\n", toLine(details).c_str());
-    std::fflush(stdout);
+    flushEvents();
 }
 
 void CLiveLine::say(const std::string& plain) {
     if (m_output != EOutput::normal) return;
     std::printf("%s: %s\n", toPrintable(m_file.native()).c_str(), plain.c_str());
-    std::fflush(stdout);
+    flushEvents();
 }
 
 void CLiveLine::erase() {

@@ -107,10 +107,11 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
                                 "Extension of the files to write, such as flac, beside the inputs")
                    ->option_text("EXT");
     output->excludes(to);
-    command->add_option("--directory", options.directory, "Folder for the files of --to")
+    command
+        ->add_option("--directory", options.directory,
+                     "Folder for the files of --to; it is created if needed")
         ->option_text("FOLDER")
-        ->needs(to)
-        ->check(CLI::ExistingDirectory);
+        ->needs(to);
     addFormat(*command, options, {8, 16, 24, 32});
     options.jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
     command
@@ -166,7 +167,8 @@ void addWaveform(CLI::App& app, SWaveformOptions& options, Run& run) {
 void addDevices(CLI::App& app, bool& json, Run& run) {
     CLI::App* command = app.add_subcommand("devices", "List the sound devices that play and record.");
     command->add_flag("--json", json, "One JSON object a line");
-    command->callback([&] { run = [&](CLibrary&) { return listDevices(json); }; });
+    command->callback(
+        [&] { run = [&](CLibrary&) { return needingDevice(json, [&] { return listDevices(json); }); }; });
 }
 
 void addPlay(CLI::App& app, SPlayOptions& options, Run& run) {
@@ -176,7 +178,11 @@ void addPlay(CLI::App& app, SPlayOptions& options, Run& run) {
         "Ctrl-C stops; a file that fails is told and the next one goes on.");
     command->add_option("FILE", options.files, "Files to play")->required()->option_text("...");
     addOutput(*command, options.show);
-    command->callback([&] { run = [&](CLibrary& library) { return play(library, options); }; });
+    command->callback([&] {
+        run = [&](CLibrary& library) {
+            return needingDevice(options.show == EOutput::json, [&] { return play(library, options); });
+        };
+    });
 }
 
 void addMix(CLI::App& app, SMixOptions& options, Run& run) {
@@ -217,7 +223,9 @@ void addRecord(CLI::App& app, SRecordOptions& options, Run& run) {
     addOutput(*command, options.show);
     command->callback([&] {
         checkBitRates(options);
-        run = [&](CLibrary& library) { return record(library, options); };
+        run = [&](CLibrary& library) {
+            return needingDevice(options.show == EOutput::json, [&] { return record(library, options); });
+        };
     });
 }
 
@@ -285,7 +293,9 @@ std::vector<std::string> splitArguments(int argc, char** argv) {
 // What the commands themselves do not catch is no fault of the library.
 int runCommand(const Run& run, CLibrary& library) {
     try {
-        return run(library);
+        const int code = run(library);
+        requireOutput();
+        return code;
     } catch (const CNoDevice& failure) {
         std::fprintf(stderr, "tonewright: %s\n", failure.what());
         return kExitNoDevice;

@@ -15,6 +15,7 @@
 #include <cstdlib>
 #include <memory>
 #include <stdexcept>
+#include <system_error>
 #include <thread>
 #include <tonewright/host.h>
 
@@ -116,6 +117,17 @@ void CJukebox::show(const SState& state) {
         {{"position", position}, {"duration", duration}, {"state", isPaused ? "paused" : "playing"}});
 }
 
+// Stopping waits for the playing thread, which may take a while: it has a thread of its own where there is
+// one.
+std::thread startStopper(const std::shared_ptr<CSession>& session) {
+    try {
+        return std::thread([session] { session->stop(); });
+    } catch (const std::system_error&) {
+        session->stop();
+        return {};
+    }
+}
+
 // Shows and obeys until playing has ended.
 void CJukebox::watch(const std::shared_ptr<CSession>& session) {
     std::thread stopper;
@@ -125,8 +137,7 @@ void CJukebox::watch(const std::shared_ptr<CSession>& session) {
         if (key == ' ') session->togglePause();
         // A player that has not begun yet would not hear it.
         const bool hasBegun = session->hasBegun();
-        if (isStopped() && hasBegun && !stopper.joinable())
-            stopper = std::thread([session] { session->stop(); });
+        if (isStopped() && hasBegun && !stopper.joinable()) stopper = startStopper(session);
         if (hasBegun && m_line.isDue()) show(session->getState());
     }
     if (!stopper.joinable()) return;

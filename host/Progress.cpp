@@ -62,7 +62,7 @@ void CProgress::advance(Job job, double fraction) {
     } else if (m_output == EOutput::normal && now - entry.told >= kPlainLine) {
         entry.told = now;
         std::printf("%s: %.0f %%\n", name(entry.input).c_str(), fraction * 100);
-        std::fflush(stdout);
+        flushEvents();
     }
 }
 
@@ -79,7 +79,7 @@ void CProgress::finish(Job job, const SJobResult& result) {
         std::printf("%s: %s, %s, %s, %.0f times real time\n", name(m_jobs[job].output).c_str(),
                     result.codec.c_str(), formatDuration(result.duration).c_str(),
                     formatSize(result.bytes).c_str(), result.duration / std::max(result.elapsed, 1e-6));
-        std::fflush(stdout);
+        flushEvents();
     }
     drawBars();
 }
@@ -118,7 +118,7 @@ void CProgress::emit(Job job, const char* event, nlohmann::json details) {
     details["input"] = m_jobs[job].input.native();
     details["output"] = m_jobs[job].output.native();
     std::printf("%s\n", toLine(details).c_str());
-    std::fflush(stdout);
+    flushEvents();
 }
 
 void CProgress::eraseBars() {

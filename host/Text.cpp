@@ -3,6 +3,7 @@
 #include <tonewright/host.h>
 
 #include <array>
+#include <atomic>
 #include <cctype>
 #include <cerrno>
 #include <cmath>
@@ -29,6 +30,8 @@ int hexDigit(char c) {
 struct SFree {
     void operator()(void* memory) const { TONEWRIGHT_Host_Free(memory); }
 };
+std::atomic<int> g_outputError{0}; // errno of the first event that could not be written
+
 template <class Char> using Owned = std::unique_ptr<Char, SFree>;
 
 } // namespace
@@ -52,14 +55,23 @@ std::optional<std::u16string> toUTF16(const std::string& utf8) {
 
 std::string toPrintable(std::string_view text) {
     std::string result;
-    for (unsigned char c : text) {
-        if (c >= 0x20 && c != 0x7F) {
-            result += static_cast<char>(c);
-            continue;
-        }
+    const auto escape = [&](unsigned char c) {
         std::array<char, 8> escaped;
         std::snprintf(escaped.data(), escaped.size(), "\\x%02x", c);
         result += escaped.data();
+    };
+    for (size_t i = 0; i < text.size(); ++i) {
+        const auto c = static_cast<unsigned char>(text[i]);
+        const auto next = static_cast<unsigned char>(i + 1 < text.size() ? text[i + 1] : 0);
+        if (c < 0x20 || c == 0x7F) {
+            escape(c);
+        } else if (c == 0xC2 && next >= 0x80 && next < 0xA0) {
+            escape(c);
+            escape(next);
+            ++i;
+        } else {
+            result += text[i];
+        }
     }
     return result;
 }
@@ -123,6 +135,16 @@ bool flushOutput() {
     if (std::fflush(stdout) == 0) return true;
     if (errno == EPIPE) return false;
     throw std::runtime_error(std::string("Standard output cannot be written: ") + std::strerror(errno));
+}
+
+void flushEvents() {
+    int none = 0;
+    if (std::fflush(stdout) != 0) g_outputError.compare_exchange_strong(none, errno);
+}
+
+void requireOutput() {
+    if (const int error = g_outputError; error != 0 && error != EPIPE)
+        throw std::runtime_error(std::string("Standard output cannot be written: ") + std::strerror(error));
 }
 
 std::string formatDuration(double seconds) {

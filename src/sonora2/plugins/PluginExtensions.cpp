@@ -1,12 +1,24 @@
 #include "sonora2/plugins/PluginExtensions.h"
 
+#include "peru/uri/URI.h"
 #include "sonora2/context/SonoraError.h"
 
 #include <algorithm>
 
 namespace sonora2::common {
 
+using peru::CString;
 using peru::IString;
+
+namespace {
+
+std::string toLowerAscii(std::string text) {
+    for (char& c : text)
+        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
+    return text;
+}
+
+} // namespace
 
 CPluginExtensions::CPluginExtensions() = default;
 CPluginExtensions::~CPluginExtensions() = default;
@@ -39,6 +51,15 @@ void CPluginExtensions::readFrom(const P<peru::IDataInStream>& stream) {
         if (!extension || extension->isEmpty()) throw CSonoraError("the list of file extensions ends early");
         addExtension(extension);
     }
+}
+
+P<IString> getLookupKey(const P<peru::IURI>& uri, const P<IString>& uriSuffix) {
+    std::string name = toLowerAscii(CString::toStdString(peru::CURI::unescape(uri->getFileName())));
+    const std::string suffix = toLowerAscii(CString::toStdString(uriSuffix));
+    if (!suffix.empty() && name.ends_with(suffix)) name.resize(name.size() - suffix.size());
+    name.erase(0, std::min(name.find_first_not_of('.'), name.size())); // the dot of a hidden file
+    const size_t point = name.rfind('.');
+    return point == std::string::npos ? CString::empty() : CString::fromUTF8(name.substr(point + 1));
 }
 
 } // namespace sonora2::common

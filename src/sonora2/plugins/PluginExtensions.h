@@ -31,4 +31,8 @@ private:
     std::vector<P<peru::IString>> m_extensions;
 };
 
+// The extension that plug-ins are chosen by: lower case, without the dot, and without `suffix`, the ending of
+// names of files still being written. Empty if the name has none.
+SONORA2_API P<peru::IString> getLookupKey(const P<peru::IURI>& uri, const P<peru::IString>& suffix);
+
 } // namespace sonora2::common

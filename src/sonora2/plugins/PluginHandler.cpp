@@ -47,12 +47,6 @@ bool fileExists(const P<IURI>& file) {
                                             ignored);
 }
 
-std::string toLowerAscii(std::string text) {
-    for (char& c : text)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return text;
-}
-
 // The failure names the file, whatever the plug-in's own text does.
 SFailure makeFailure(SFailure failure, const P<IURI>& uri) {
     if (failure.kind.empty()) failure.kind = "peru::CFileFormatNotSupportedError";
@@ -177,15 +171,6 @@ P<IPluginExtensions> CPluginHandler::getValidExtensions(int mask) {
 }
 
 // Lower case, without the dot. The suffix is removed first, so that "a.flac.part" yields "flac".
-P<IString> CPluginHandler::getLookupKey(const P<IURI>& uri) const {
-    std::string name = toLowerAscii(CString::toStdString(peru::CURI::unescape(uri->getFileName())));
-    const std::string suffix = toLowerAscii(CString::toStdString(m_uriSuffix));
-    if (!suffix.empty() && name.ends_with(suffix)) name.resize(name.size() - suffix.size());
-    name.erase(0, std::min(name.find_first_not_of('.'), name.size())); // the dot of a hidden file
-    const size_t point = name.rfind('.');
-    return point == std::string::npos ? CString::empty() : CString::fromUTF8(name.substr(point + 1));
-}
-
 void CPluginHandler::log(int32_t severity, const P<IString>& text) const {
     if (P<ILogManager> manager = m_context->getLogManager()) manager->log(severity, text);
 }
@@ -255,7 +240,7 @@ template <class T, class TryCreate> P<T> CPluginHandler::findObject(const P<IURI
 
     if (P<ISonoraPlugin> preferred = findPreferred(mask, uri))
         if (P<T> object = attempt(*preferred, nullptr, nullptr)) return object;
-    const P<IString> key = attempts.key = getLookupKey(uri);
+    const P<IString> key = attempts.key = getLookupKey(uri, m_uriSuffix);
     if (key->isEmpty()) return nullptr;
     for (size_t i = 0; i < m_plugins.size(); ++i) {
         P<T> object = attempt(*m_plugins[i], key, m_plainPlugins[i].get());
