@@ -141,24 +141,20 @@ TEST(Thread, DroppedHandle_DoesNotStopItAndActionLives) {
     go->set();
     EXPECT_TRUE(done->wait(20000));
     while (living != 0) getThreadManager()->yield(true); // the last reference is released after `done` is set
-    P<IThread> thread = runThread([witness = make<CWitness>(living)] {});
-    thread->wait();
+    runThread([witness = make<CWitness>(living)] {})->wait();
     EXPECT_EQ(living, 0) << "an ended thread holds nothing";
 }
 
 // The owner is released last by its own thread, and its destructor waits for that thread.
 TEST(Thread, WaitingForItself_ReturnsAfterTheBodyAndThrowsWithin) {
-    class COwner : public CObject {
-    public:
-        explicit COwner(P<ISignal> gone) : m_gone(std::move(gone)) {}
+    struct COwner : CObject {
+        explicit COwner(P<ISignal> signal) : gone(std::move(signal)) {}
         ~COwner() override {
             thread->wait();
-            m_gone->set();
+            gone->set();
         }
         P<IThread> thread;
-
-    private:
-        P<ISignal> m_gone;
+        const P<ISignal> gone;
     };
     P<ISignal> go = getSignalFactory()->createSignal(), gone = getSignalFactory()->createSignal();
     auto owner = make<COwner>(gone);
@@ -297,19 +293,14 @@ TEST(ThreadLocalStorage, DyingSlot_ReleasesTheValuesOfAllThreads) {
 
 // A value whose destructor sets a slot while its thread ends.
 TEST(ThreadLocalStorage, ValueThatSetsSlotsWhileDying_LeavesNothing) {
-    class CLastWord : public CObject {
-    public:
-        CLastWord(P<CThreadLocalStorage> slot, std::atomic<int>& living)
-            : m_slot(std::move(slot)), m_living(living) {}
-        ~CLastWord() override { m_slot->set(make<CWitness>(m_living)); }
-
-    private:
-        P<CThreadLocalStorage> m_slot;
-        std::atomic<int>& m_living;
+    static std::atomic<int> living{0};
+    struct CLastWord : CObject {
+        explicit CLastWord(P<CThreadLocalStorage> storage) : slot(std::move(storage)) {}
+        ~CLastWord() override { slot->set(make<CWitness>(living)); }
+        const P<CThreadLocalStorage> slot;
     };
-    std::atomic<int> living{0};
     auto first = make<CThreadLocalStorage>(), second = make<CThreadLocalStorage>();
-    auto use = [&] { first->set(make<CLastWord>(second, living)); };
+    auto use = [&] { first->set(make<CLastWord>(second)); };
     runThread(use)->wait();
     EXPECT_EQ(living, 0);
     std::thread(use).join();

@@ -12,38 +12,32 @@ namespace {
 
 using Journal = std::string;
 
-class CWorker : public CObject, public IWorker {
-public:
-    CWorker(char name, Journal& journal) : m_name(name), m_journal(journal) {}
+struct CWorker : CObject, IWorker {
+    CWorker(char n, Journal& j) : name(n), journal(j) {}
     void work() override {
-        m_journal += m_name;
+        journal += name;
         if (onWork) onWork();
     }
-    void attached(IWorkerManager*) override { m_journal += std::string("+") + m_name; }
+    void attached(IWorkerManager*) override { journal += std::string("+") + name; }
     void detached(IWorkerManager* manager) override {
-        m_journal += std::string("-") + m_name;
+        journal += std::string("-") + name;
         if (onDetached) onDetached(manager);
     }
+    const char name;
+    Journal& journal;
     std::function<void()> onWork;
     std::function<void(IWorkerManager*)> onDetached;
-
-private:
-    char m_name;
-    Journal& m_journal;
 };
 
-class CListener : public CObject, public IWorkLoopListener {
-public:
-    CListener(char name, Journal& journal) : m_name(name), m_journal(journal) {}
+struct CListener : CObject, IWorkLoopListener {
+    CListener(char n, Journal& j) : name(n), journal(j) {}
     void workersChanged(IWorkerManager* manager) override {
-        m_journal += m_name;
+        journal += name;
         if (leaves) manager->removeListener(this);
     }
+    const char name;
+    Journal& journal;
     bool leaves = false;
-
-private:
-    char m_name;
-    Journal& m_journal;
 };
 
 class WorkerManager : public testing::Test {
