@@ -335,18 +335,18 @@ TEST_F(AudioDevice, TellsListenersInTurnUntilOneHasEnough) {
 }
 
 TEST_F(AudioDevice, LetsListenersAskAndLeaveWhileItRecords) {
-    const P<CEars> keen = make<CEars>(), brief = make<CEars>();
+    const P<CEars> keen = make<CEars>(), passing = make<CEars>();
     keen->onBlock = [&] { static_cast<void>(in->getPosition() + in->getStatus()); };
     bool present = true;
-    brief->onBlock = [&] { EXPECT_TRUE(present); };
+    passing->onBlock = [&] { EXPECT_TRUE(present); };
     in->addListener(keen.get());
     in->open(makeFormat(16, 3));
     in->start();
     for (int i = 1; i <= 20; ++i) {
         present = true;
-        in->addListener(brief.get());
-        ASSERT_TRUE(waitFor([&] { return brief->blocks >= i; }));
-        in->removeListener(brief.get());
+        in->addListener(passing.get());
+        ASSERT_TRUE(waitFor([&] { return passing->blocks >= i; }));
+        in->removeListener(passing.get());
         present = false;
         EXPECT_EQ(in->getStatus(), kDeviceRunning);
     }

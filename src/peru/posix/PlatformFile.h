@@ -1,4 +1,4 @@
-// Helpers for this platform's file classes: descriptors, paths of URIs, error texts.
+// Shared by this platform's file classes: descriptors, paths of URIs, error texts.
 #pragma once
 
 #include "peru/uri/IURI.h"

@@ -1,4 +1,4 @@
-// Helpers for implementing and using streams.
+// Functions for implementing and using streams.
 #pragma once
 
 #include "peru/Object.h"

@@ -47,10 +47,10 @@ public:
 TEST(PackageManager, BringsUpWhatIsRequiredFirstAndOnce) {
     CLog log;
     P<CPackageManager> manager = make<CPackageManager>();
-    P<CTestListener> brief = make<CTestListener>();
+    P<CTestListener> leaving = make<CTestListener>();
     P<CTestListener> listener = make<CTestListener>();
-    brief->leave = manager.get();
-    manager->addListener(brief.get());
+    leaving->leave = manager.get();
+    manager->addListener(leaving.get());
     manager->addListener(listener.get());
     manager->registerPackage(make<CTestPackage>("top", log, std::vector{"left", "right"}));
     manager->registerPackage(make<CTestPackage>("left", log, std::vector{"base"}));
@@ -63,7 +63,7 @@ TEST(PackageManager, BringsUpWhatIsRequiredFirstAndOnce) {
     for (const P<IPackage>& package : manager->getPackages())
         EXPECT_TRUE(manager->isActive(package)) << text(package->getName());
     EXPECT_EQ(listener->log, (CLog{"+top", "+left", "+right", "+base", "!base", "!left", "!right", "!top"}));
-    EXPECT_EQ(brief->log.back(), "!base");
+    EXPECT_EQ(leaving->log.back(), "!base");
     EXPECT_FALSE(manager->activateByName("unknown"));
     manager->removeListener(listener.get());
 }

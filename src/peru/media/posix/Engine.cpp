@@ -17,9 +17,13 @@ void* openLibrary() {
                                    "The sound engine cannot be loaded (%MSG%).", {{"%MSG%", ::dlerror()}}));
 }
 
-template <class Function> Function* find(Function*, const char* name) {
+void* getLibrary() {
     static void* const library = openLibrary();
-    if (void* symbol = ::dlsym(library, name)) return reinterpret_cast<Function*>(symbol);
+    return library;
+}
+
+template <class Function> Function* find(Function*, const char* name) {
+    if (void* symbol = ::dlsym(getLibrary(), name)) return reinterpret_cast<Function*>(symbol);
     throw CMediaException(localize("peru.media.CSystem.NoEngine",
                                    "The sound engine cannot be loaded (%MSG%).", {{"%MSG%", name}}));
 }
