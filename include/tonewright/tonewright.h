@@ -290,10 +290,13 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateAudioFormatFromURI(const char1
 /* 1 if the format is open. Bad handle or failure: 0. */
 TONEWRIGHT_API uint8_t TONEWRIGHT_AudioFormat_IsOpened(TONEWRIGHT_Handle format);
 
-/* Creates the file. Result: 0 or 5. */
+/* Starts writing. A new file is created and grows in place, so that it can be played even if the process is
+ * killed; an existing file keeps its content until the format is closed. Result: 0 or 5. */
 TONEWRIGHT_API int32_t TONEWRIGHT_AudioFormat_Open(TONEWRIGHT_Handle format);
 
-/* Completes the file. Result: 0 or 3. */
+/* Completes the file; an existing one is replaced as a whole, keeping its mode and links to it. Result: 0
+ * or 3.
+ */
 TONEWRIGHT_API int32_t TONEWRIGHT_AudioFormat_Close(TONEWRIGHT_Handle format);
 
 /* The estimated size in bytes of a file with `duration` seconds of audio. Bad handle or failure: -1. */
@@ -304,7 +307,10 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_CreateAudioEncoder(TONEWRIGHT_Handle
                                                                TONEWRIGHT_Handle format);
 
 /* Runs the whole job on the calling thread and closes source and format. Result: 0, also if the callback
- * stopped it (the file then holds what was written); 11 if the job failed, 10 for a bad handle. */
+ * stopped it (the file then holds what was written); 11 if the job failed, 10 for a bad handle. A failed job
+ * leaves an existing target as it was and removes a new one. Jobs whose source is their own target, under any
+ * name, or whose source and format differ in sample rate, channels or bytes per sample, fail before anything
+ * is written. */
 TONEWRIGHT_API int32_t TONEWRIGHT_AudioEncoder_Encode(TONEWRIGHT_Handle encoder);
 
 /* Sets or (null) removes the progress callback. Any thread may do so while the job runs; a call already under

@@ -3,12 +3,12 @@
 
 #include "peru/Errors.h"
 #include "sonora2/encoding/IEncodeListener.h"
+#include "support/Files.h"
 #include "support/MediaBase.h"
 
 #include <cstring>
 #include <deque>
 #include <functional>
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -126,16 +126,5 @@ public:
         return fraction < stopFrom;
     }
 };
-
-// Returns the description of the exception that the call throws, or nothing.
-template <class Error = peru::CException>
-std::optional<std::string> errorOf(const std::function<void()>& call) {
-    try {
-        call();
-    } catch (const Error& exception) {
-        return peru::CString::toStdString(exception.getDescription());
-    }
-    return std::nullopt;
-}
 
 } // namespace tests

@@ -14,7 +14,7 @@ namespace tests {
 using peru::P;
 
 // Implements the parts of the interface that do not matter to the tests.
-class CSourceBase : public peru::CObject, public sonora2::common::IAudioSource {
+template <class Interface> class TSourceBase : public peru::CObject, public Interface {
 public:
     int opens = 0;
 
@@ -24,11 +24,15 @@ public:
     double getStartTime() override { return 0.0; }
     P<peru::IURI> getURI() override { return nullptr; }
     P<peru::IString> getPluginName() override { return peru::CString::fromUTF8("fake"); }
-    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override { return nullptr; }
-    void setAudioStream(int) override {}
 
 protected:
     bool m_opened = false;
+};
+
+class CSourceBase : public TSourceBase<sonora2::common::IAudioSource> {
+public:
+    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override { return nullptr; }
+    void setAudioStream(int) override {}
 };
 
 class CFormatBase : public peru::CObject, public sonora2::common::IAudioFormat {

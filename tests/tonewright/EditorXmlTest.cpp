@@ -205,21 +205,6 @@ TEST_F(Arrangement, Fade_WorksOnChunksThatLieWhollyInIt) {
     }
 }
 
-TEST_F(Arrangement, Track_SkipsInItsMedium) {
-    const auto track =
-        peru::make<CTracklistAudioTrack>(handler, makeTrack("4.tst", 10.0, 1.0, 3.0), kRate, 1, 2, 7);
-    EXPECT_EQ(track->getSortIndex(), 7);
-    EXPECT_EQ(track->getMediumTime(10.5), 1.5);
-    track->processCommand(peru::make<sonora2::common::CSkipToTimeCommand>(2.0));
-    track->open();
-    const auto first = [&] { return *reinterpret_cast<int16_t*>(track->getNextAudioChunk()->getData()); };
-    EXPECT_EQ(first(), 1024 * 4) << "the source's start";
-    track->processCommand(peru::make<sonora2::common::CSkipToTimeCommand>(2.0));
-    EXPECT_EQ(first(), 2048 * 4);
-    track->processCommand(peru::make<sonora2::common::CEnableTrackCommand>("", false));
-    EXPECT_EQ(first(), 2304 * 4) << "knows no other command";
-}
-
 TEST_F(Arrangement, Source_PlaysTracksOverASilentBed) {
     const double step = static_cast<double>(kStep) / kRate;
     const P<CTracklistAudioSource> source = makeSource(

@@ -89,21 +89,6 @@ TEST_F(FileTag, Fields_CrossTheBoundaryAndTheFile) {
     EXPECT_EQ(take(TONEWRIGHT_FileTag_GetAlbum(tag.get())), textOf(kFields[2]));
 }
 
-TEST_F(FileTag, BadHandle_GivesNothing) {
-    CHandle text(reinterpret_cast<TONEWRIGHT_Handle>(
-        static_cast<peru::IInstanceWrapper*>(new peru::CStringInstanceWrapper(u"x"))));
-    CHandle other = wrap(peru::CString::fromUTF8("x"));
-    log->take();
-    for (TONEWRIGHT_Handle handle : {TONEWRIGHT_Handle(), text.get(), other.get()}) {
-        for (const SField& field : kFields) {
-            EXPECT_EQ(take(field.get(handle)), u"<null>") << field.name;
-            field.set(handle, u"x");
-        }
-        EXPECT_EQ(TONEWRIGHT_StoreFileTag(handle), 8);
-    }
-    EXPECT_TRUE(log->take().empty());
-}
-
 TEST_F(FileTag, Kind_IsToldByTheExtensionAndItsAbsenceIsNoFailure) {
     makeSound("UPPER.FLAC", "flac");
     makeSound("a.flac.part", "flac");

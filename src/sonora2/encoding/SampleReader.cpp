@@ -35,7 +35,6 @@ bool CSampleReader::hasSamples() {
 P<audio::IAudioChunk> CSampleReader::getSamples(int frames) {
     if (frames < 0) throw peru::CInvalidArgError("frames", "CSampleReader::getSamples");
     const int64_t wanted = static_cast<int64_t>(m_frameBytes) * frames;
-    const double timestamp = static_cast<double>(m_position) / m_source->getSampleRate();
     while (m_buffer->getAvailable() < wanted && !m_source->isEOF()) {
         const P<audio::IAudioChunk> chunk = m_source->getNextAudioChunk();
         if (!chunk) {
@@ -43,16 +42,12 @@ P<audio::IAudioChunk> CSampleReader::getSamples(int frames) {
                 throw CSonoraError("CSampleReader: AudioChunk=NULL but Source is not EOF!");
             continue;
         }
-        // A chunk of the wanted size is passed on as it is: a source with such chunks costs no copy.
-        if (chunk->getSize() == wanted && wanted > 0 && m_buffer->getAvailable() == 0) {
-            m_position += frames;
-            return peru::make<audio::CAudioChunk>(timestamp, chunk->getMemoryBlock());
-        }
         if (chunk->getSize() > 0) m_buffer->append(chunk->getMemoryBlock());
     }
     const int64_t size = std::min(wanted, m_buffer->getAvailable());
     if (m_buffer->getAvailable() == 0) return nullptr;
 
+    const double timestamp = static_cast<double>(m_position) / m_source->getSampleRate();
     const P<peru::IMemoryBlock> block = m_context->getMemoryManager()->getBlock(size);
     const int64_t read = m_buffer->readSome(block->getData(), size);
     block->setSize(read);

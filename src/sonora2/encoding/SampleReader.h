@@ -18,8 +18,7 @@ public:
     bool hasSamples(); // false for a closed source
     // Returns `frames` frames; fewer only at the end of the source, and an empty handle when none are left.
     // The timestamp counts the frames delivered, independently of the source's own timestamps. Throws
-    // CSonoraError if the source returns no chunk before its end. The chunk may share its block with the
-    // source's.
+    // CSonoraError if the source returns no chunk before its end.
     P<audio::IAudioChunk> getSamples(int frames);
     void reset(); // closes the source and restarts the time line
     int64_t getPosition() const { return m_position; }

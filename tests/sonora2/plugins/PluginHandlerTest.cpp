@@ -271,15 +271,13 @@ private:
     P<ISonoraPicture> m_rgb;
 };
 
-class CVideo : public peru::CObject, public IVideoSource {
+class CVideo : public TSourceBase<IVideoSource> {
 public:
     double duration = 10.0;
     std::vector<double> skips;
     P<ISonoraPicture> picture;
     std::function<void()> onPicture = [] {}; // may throw
-    int opens = 0;
 
-    bool isOpened() override { return m_opened; }
     void open() override {
         ++opens;
         m_opened = true;
@@ -287,12 +285,7 @@ public:
     void close() override { m_opened = false; }
     void skipToTime(double time) override { skips.push_back(time); }
     double getDuration() override { return m_opened ? duration : 0.0; }
-    int getBufferStatus() override { return 100; }
     bool isEOF() override { return false; }
-    void setStartTime(double) override {}
-    double getStartTime() override { return 0.0; }
-    P<IURI> getURI() override { return nullptr; }
-    P<IString> getPluginName() override { return CString::empty(); }
     void setMaxSize(int, int) override {}
     int getWidth() override { return 0; }
     int getHeight() override { return 0; }
@@ -306,9 +299,6 @@ public:
     double getFrameDuration() override { return 0.04; }
     int getFrameRateNum() override { return 25; }
     int getFrameRateDen() override { return 1; }
-
-private:
-    bool m_opened = false;
 };
 
 TEST_F(PluginHandler, PreviewImage_IsTakenAtTheTimeAndNeverBehindTheEnd) {

@@ -125,7 +125,7 @@ TEST_F(AudioTrack, Speed_ThatIsNoneIsRefused) {
     for (double speed : {-1.0, 1e9, 1e-9, std::nan("")}) {
         track->setSpeed(speed);
         track->open();
-        EXPECT_TRUE(errorOf([&] { track->getNextAudioChunk(); })) << speed;
+        EXPECT_NE(errorOf([&] { track->getNextAudioChunk(); }), "") << speed;
     }
 }
 

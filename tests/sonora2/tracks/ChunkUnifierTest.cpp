@@ -54,10 +54,10 @@ TEST_F(ChunkUnifier, BadInput_EndsInsteadOfHanging) {
     source->open();
     const auto unifier = peru::make<CAudioChunkUnifier>(context, P<sonora2::common::IAudioSource>(source));
     EXPECT_FALSE(unifier->getChunk(100)) << "empty chunks without end";
-    EXPECT_TRUE(errorOf([&] { unifier->getChunk(-1); }));
+    EXPECT_NE(errorOf([&] { unifier->getChunk(-1); }), "");
     source->channels = 0;
     const auto shapeless = peru::make<CAudioChunkUnifier>(context, P<sonora2::common::IAudioSource>(source));
-    EXPECT_EQ(errorOf([&] { shapeless->getChunk(100); }).value_or(""),
+    EXPECT_EQ(errorOf([&] { shapeless->getChunk(100); }),
               "CAudioChunkUnifier: 44100 frames per second of 0 channels of 2 bytes are no sound");
 }
 

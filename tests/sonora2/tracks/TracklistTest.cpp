@@ -162,10 +162,10 @@ TEST_F(Tracklist, BadTracksAndFormats_AreRefused) {
                                                        {8000, 1 << 20, 1 << 12, 1},
                                                        {1 << 30, 2, 2, 100},
                                                        {8000, 2, 2, 1 << 30}})
-        EXPECT_TRUE(errorOf([&] {
-            peru::make<CAudioTracklist>(false, context, c.rate, c.channels, c.bytes, c.frames, 0.0, 0);
-        })) << c.rate
-            << " " << c.channels << " " << c.bytes << " " << c.frames;
+        EXPECT_THROW(
+            peru::make<CAudioTracklist>(false, context, c.rate, c.channels, c.bytes, c.frames, 0.0, 0),
+            peru::CError)
+            << c.rate << " " << c.channels << " " << c.bytes << " " << c.frames;
 }
 
 TEST_F(Tracklist, BufferStatus_IsTheLowestOfWhatPlays) {
