@@ -109,31 +109,6 @@ int getLinearBytes(int sampleFormat) {
     }
 }
 
-struct SChunk {
-    std::string id;
-    int64_t size = -1; // -1 when there are no 8 bytes left
-};
-
-SChunk readChunk(std::FILE* file, int64_t at, bool bigEndian) {
-    std::array<uint8_t, 8> bytes{};
-    if (::fseeko(file, at, SEEK_SET) != 0 || std::fread(bytes.data(), 1, bytes.size(), file) != bytes.size())
-        return {};
-    uint32_t size = 0;
-    for (size_t i = 0; i < 4; ++i) size |= uint32_t{bytes[4 + i]} << (bigEndian ? 24 - 8 * i : 8 * i);
-    return {std::string(bytes.begin(), bytes.begin() + 4), size};
-}
-
-// Whether the rest of the file consists of whole chunks.
-bool isChunkList(std::FILE* file, int64_t at, int64_t end, bool bigEndian) {
-    while (at < end) {
-        const SChunk chunk = readChunk(file, at, bigEndian);
-        const auto isPrintable = [](char c) { return c >= ' ' && c <= '~'; };
-        if (chunk.size < 0 || !std::ranges::all_of(chunk.id, isPrintable)) return false;
-        at += 8 + chunk.size + chunk.size % 2;
-    }
-    return at <= end + 1; // the last padding byte may be missing
-}
-
 int32_t quantise(double sample) {
     const double value = sample * 2147483648.0;
     if (!(value > -2147483648.0)) return value == value ? INT32_MIN : 0;
@@ -301,41 +276,6 @@ SNDFILE* CSndfileDecoder::openHandle(SF_INFO& info) {
         m_options.warn("%s was not completed by its writer and is read to its end", m_file.getDisplayName());
     SF_VIRTUAL_IO io{getLength, seekInput, readInput, writeNothing, tellInput};
     return sf_open_virtual(&io, SFM_READ, &info, this);
-}
-
-// A size of 0 is correct if the data chunk is followed by nothing or by other chunks.
-CSndfileDecoder::SPatch CSndfileDecoder::findMissingSize(std::FILE* file) {
-    std::array<char, 12> start{};
-    const size_t got = std::fread(start.data(), 1, start.size(), file);
-    const std::string form(start.data(), 4);
-    SPatch patch;
-    if (got == start.size() && (form == "RIFF" || form == "RIFX" || form == "RF64") &&
-        std::string(&start[8], 4) == "WAVE") {
-        const bool bigEndian = form == "RIFX";
-        const int64_t end = ::fseeko(file, 0, SEEK_END) == 0 ? ::ftello(file) : 0;
-        int64_t largeSize = 0; // offset of the size that is used in place of the data chunk's own
-        int64_t at = start.size();
-        SChunk chunk = readChunk(file, at, bigEndian);
-        for (; chunk.size >= 0 && chunk.id != "data"; chunk = readChunk(file, at, bigEndian)) {
-            if (chunk.id == "ds64") largeSize = at + 16;
-            at += 8 + chunk.size + chunk.size % 2;
-        }
-        at += 8;
-        std::array<uint8_t, 8> large{};
-        const bool isMissing = form != "RF64" ? chunk.size == 0
-                                              : largeSize > 0 && ::fseeko(file, largeSize, SEEK_SET) == 0 &&
-                                                    std::fread(large.data(), 1, 8, file) == 8 &&
-                                                    large == decltype(large){};
-        if (isMissing && at < end && !isChunkList(file, at, end, bigEndian)) {
-            patch = {form == "RF64" ? largeSize : at - 4, form == "RF64" ? size_t{8} : size_t{4}, {}};
-            // The library reduces a size of all ones to the rest of the file.
-            patch.bytes.fill(0xFF);
-            const int64_t rest = end - at;
-            if (form == "RF64") std::memcpy(patch.bytes.data(), &rest, sizeof(rest));
-        }
-    }
-    std::rewind(file);
-    return patch;
 }
 
 sf_count_t CSndfileDecoder::getLength(void* self) {

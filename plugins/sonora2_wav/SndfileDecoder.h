@@ -1,11 +1,11 @@
 // Decodes WAV and similar containers with libsndfile.
 #pragma once
 
+#include "sonora2_wav/MissingSize.h"
 #include "support/Decoder.h"
 
 #include <sndfile.h>
 
-#include <array>
 #include <vector>
 
 namespace sonora2::plugins::wav {
@@ -22,7 +22,7 @@ public:
     explicit CSndfileDecoder(const SMediaFile& file);
     ~CSndfileDecoder() override { close(); }
 
-    // A WAV file whose writer was killed before it stored the sizes is read to the end of the file.
+    // A file whose writer was killed before it stored the sizes is read to its end.
     SDecodedMedia open(const SDecoderOptions& options) override;
     void close() override;
     int read(uint8_t* pcm, int frames) override;
@@ -32,14 +32,6 @@ private:
     // How samples are read from the library.
     enum class ETransfer { raw, rawSigned8, shorts, integers24, integers32, floats, doubles };
 
-    // Bytes that the library sees in place of those in the file.
-    struct SPatch {
-        int64_t offset = 0;
-        size_t size = 0;
-        std::array<uint8_t, 8> bytes{};
-    };
-
-    static SPatch findMissingSize(std::FILE* file);
     static sf_count_t getLength(void* self);
     static sf_count_t seekInput(sf_count_t offset, int whence, void* self);
     static sf_count_t readInput(void* data, sf_count_t size, void* self);
@@ -55,7 +47,7 @@ private:
     SMediaFile m_file;
     SDecoderOptions m_options;
     InputFile m_input; // read by the handle
-    SPatch m_patch;
+    SPatch m_patch;    // applied to what the handle reads
     SndfileHandle m_handle;
     SPcmFormat m_format;
     int64_t m_frames = 0;

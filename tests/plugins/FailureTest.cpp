@@ -1,10 +1,11 @@
-// Damaged files and full disks.
+// Damaged files, full disks, and jobs that are cut off.
 #include "plugins/PluginFixture.h"
 
 #include "peru/strings/StringFormat.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/ISalvage.h"
 
+#include <chrono>
 #include <thread>
 
 namespace tests {
@@ -17,7 +18,7 @@ using sonora2::common::CSonoraError;
 std::string readUntilError(const P<IAudioSource>& source, std::string& error) {
     std::string got;
     try {
-        while (P<sonora2::audio::IAudioChunk> chunk = source->getNextAudioChunk())
+        while (P<IAudioChunk> chunk = source->getNextAudioChunk())
             got.append(reinterpret_cast<const char*>(chunk->getData()), chunk->getSize());
     } catch (const CSonoraError& failure) {
         error = text(failure.getDescription());
@@ -25,19 +26,26 @@ std::string readUntilError(const P<IAudioSource>& source, std::string& error) {
     return got;
 }
 
-class Failure : public CPluginTest, public ::testing::WithParamInterface<SFormatCase> {
-protected:
-    static constexpr int kFrames = 40009;
+class Failure : public CFormatTest {};
 
-    std::filesystem::path named(const std::string& name) {
-        return folder / (name + "." + GetParam().extension);
-    }
-    // Reads a damaged file, which must end before delivering more than it could possibly hold.
-    void survive(const std::filesystem::path& path, const std::string& what) {
-        SCOPED_TRACE(what);
-        P<IAudioSource> source = openSource(path, {});
+// Truncated and changed bytes must neither crash nor deliver more than the file could possibly hold.
+TEST_P(Failure, DamagedFile_NeverCrashesOrHangs) {
+    writeFile(named("whole"), makeMusic({}, 10000));
+    const std::string whole = readFile(named("whole"));
+    std::mt19937 random(11);
+    for (int i = 0; i < 120; ++i) {
+        std::string bad = whole;
+        // Damage to headers has the worst effects.
+        const size_t at = random() % (i % 2 ? whole.size() : std::min<size_t>(whole.size(), 128));
+        if (i < 100)
+            bad[at] = static_cast<char>(bad[at] ^ (1 + random() % 255));
+        else
+            bad.resize(at);
+        SCOPED_TRACE(std::to_string(at) + " of " + std::to_string(bad.size()));
+        const auto path = folder.write(named().filename().string(), bad);
+        P<IAudioSource> source = openSource(path);
         if (!source) source = openSource(path, {48000, 1, 2}); // the damage may have changed the shape
-        if (!source) return;
+        if (!source) continue;
         try {
             const size_t limit = 64 << 20;
             EXPECT_LT(readAll(source, limit).size(), limit) << "no end";
@@ -48,88 +56,52 @@ protected:
             EXPECT_TRUE(source->isEOF());
         }
     }
-};
+}
 
 TEST_P(Failure, TruncatedFile_EndsWithWhatIsThere) {
-    const SShape shape;
-    const std::string pcm = makeMusic(shape, kFrames);
-    writeFile(named("whole"), pcm, shape);
-    const std::string whole = readFile(named("whole"));
-    for (int i = 0; i < 20; ++i) {
-        const size_t size = i < 10 ? static_cast<size_t>(i) * 13 : whole.size() * (i - 9) / 11;
-        const auto path = folder.write(named("cut").filename().string(), whole.substr(0, size));
-        survive(path, "cut at " + std::to_string(size));
-    }
     if (!GetParam().lossless) return;
-    // The sound before the cut is delivered.
-    const auto path = folder.write(named("cut").filename().string(), whole.substr(0, whole.size() / 2));
-    P<IAudioSource> source = openSource(path, shape);
-    if (!source) return; // refusing the whole file is also acceptable
+    const std::string pcm = makeMusic({}, 40009);
+    writeFile(named(), pcm);
+    std::filesystem::resize_file(named(), std::filesystem::file_size(named()) / 2);
+    P<IAudioSource> source = openSource(named());
+    ASSERT_TRUE(source);
     std::string error;
     const std::string got = readUntilError(source, error);
     EXPECT_GT(got.size(), pcm.size() / 4);
-    EXPECT_TRUE(pcm.compare(0, got.size(), got) == 0);
-    if (GetParam().exactEstimate) {
-        EXPECT_DOUBLE_EQ(got.size() / 4 / 44100.0, source->getDuration());
-    }
-}
-
-TEST_P(Failure, FlippedBytes_NeverCrashOrHang) {
-    const SShape shape;
-    writeFile(named("whole"), makeMusic(shape, kFrames / 4), shape);
-    const std::string whole = readFile(named("whole"));
-    std::mt19937 random(11);
-    for (int i = 0; i < 100; ++i) {
-        std::string bad = whole;
-        // Damage to headers has the worst effects.
-        const size_t range = i % 2 ? whole.size() : std::min<size_t>(whole.size(), 128);
-        const size_t at = random() % range;
-        bad[at] = static_cast<char>(bad[at] ^ (1 + random() % 255));
-        survive(folder.write(named("bad").filename().string(), bad), "byte " + std::to_string(at));
-    }
+    EXPECT_TRUE(pcm.starts_with(got));
+    EXPECT_EQ(GetParam().exactEstimate, error.empty()) << error;
+    EXPECT_EQ(GetParam().exactEstimate, got.size() / 4 / 44100.0 == source->getDuration());
 }
 
 TEST_P(Failure, FullDisk_IsToldByName) {
-    const SShape shape;
-    std::filesystem::create_symlink("/dev/full", named("full"));
-    P<IAudioFormat> format = makeFormat(named("full"), shape);
-    ASSERT_TRUE(format);
-    // With few frames close() reports the error at the latest; with many, a write does, and later calls are
-    // safe.
-    for (int frames : {100, 3000000}) {
-        bool told = false;
-        try {
+    std::filesystem::create_symlink("/dev/full", named());
+    P<IAudioFormat> format = makeFormat(named());
+    const std::string pcm = makeMusic({}, 50000);
+    // With few frames close() reports the error at the latest; with many, a write does.
+    for (const auto& [size, count] : {std::pair{size_t{400}, 1}, std::pair{pcm.size(), 60}}) {
+        const std::string reason = errorOf<CSonoraError>([&, size = size, count = count] {
             format->open();
-            const std::string pcm = makeMusic(shape, 50000);
-            for (int done = 0; done < frames; done += 50000)
-                format->writeAudioChunk(makeChunk(pcm.substr(0, std::min(frames, 50000) * 4)));
+            for (int i = 0; i < count; ++i) format->writeAudioChunk(makeChunk(pcm.substr(0, size)));
             format->close();
-        } catch (const CSonoraError& error) {
-            told = true;
-            const std::string reason = text(error.getDescription());
-            EXPECT_NE(std::string::npos, reason.find(named("full").string())) << reason;
-            EXPECT_NE(std::string::npos, reason.find("No space left on device")) << reason;
-        }
-        EXPECT_TRUE(told);
+        });
+        EXPECT_NE(std::string::npos, reason.find(named().string())) << reason;
+        EXPECT_NE(std::string::npos, reason.find("No space left on device")) << reason;
         EXPECT_NO_THROW(format->close());
     }
 }
 
 TEST_P(Failure, TargetThatCannotBeMade_LeavesNothing) {
-    const auto inside = folder / "missing" / named("x").filename();
-    P<IAudioFormat> format = makeFormat(inside, {});
-    ASSERT_TRUE(format);
+    P<IAudioFormat> format = makeFormat(folder / "missing" / named().filename());
     EXPECT_THROW(format->open(), CSonoraError);
     EXPECT_FALSE(format->isOpened());
     EXPECT_FALSE(std::filesystem::exists(folder / "missing"));
-    std::filesystem::create_directory(named("folder"));
-    EXPECT_THROW(makeFormat(named("folder"), {})->open(), CSonoraError);
-    EXPECT_TRUE(std::filesystem::is_directory(named("folder")));
+    std::filesystem::create_directory(named());
+    EXPECT_THROW(makeFormat(named())->open(), CSonoraError);
+    EXPECT_TRUE(std::filesystem::is_directory(named()));
 }
 
 TEST_P(Failure, UseOutsideItsState_IsRefused) {
-    const SShape shape;
-    P<IAudioFormat> format = makeFormat(named("x"), shape);
+    P<IAudioFormat> format = makeFormat(named());
     EXPECT_THROW(format->writeAudioChunk(makeChunk("abcd")), CSonoraError);
     EXPECT_THROW(format->setAudioQuality(std::nan("")), CSonoraError);
     EXPECT_THROW(format->setAudioBitRate(128000, 192000, 256000), CSonoraError);
@@ -137,7 +109,7 @@ TEST_P(Failure, UseOutsideItsState_IsRefused) {
     EXPECT_THROW(format->writeAudioChunk(makeChunk("abc")), CSonoraError) << "no whole frame";
     EXPECT_THROW(format->setAudioQuality(0.5), CSonoraError);
     format->close();
-    P<IAudioSource> source = openSource(named("x"), shape);
+    P<IAudioSource> source = openSource(named());
     source->close();
     EXPECT_THROW(source->getNextAudioChunk(), CSonoraError);
     EXPECT_THROW(source->skipToTime(0.0), CSonoraError);
@@ -164,15 +136,14 @@ const SDamage kDamages[] = {
 TEST_F(CPluginTest, DamagedSound_IsLocatedAndCanBeSalvaged) {
     for (const SDamage& damage : kDamages) {
         SCOPED_TRACE(damage.name);
-        const SShape shape;
         const auto path = folder / damage.name;
-        writeFile(path, makeMusic(shape, 200000), shape);
-        const std::string whole = readAll(openSource(path, shape));
+        writeFile(path, makeMusic({}, 200000));
+        const std::string whole = read(path);
         std::string bytes = readFile(path);
         damage.apply(bytes);
         folder.write(damage.name, bytes);
 
-        P<IAudioSource> source = openSource(path, shape);
+        P<IAudioSource> source = openSource(path);
         std::string error;
         const std::string good = readUntilError(source, error);
         const double at = static_cast<double>(good.size()) / 4 / 44100;
@@ -211,47 +182,40 @@ TEST_F(CPluginTest, DamagedSound_IsLocatedAndCanBeSalvaged) {
 
 // A consumer that only asks for the end of the file learns about an error that is still queued.
 TEST_F(CPluginTest, QueuedError_ComesBeforeTheEnd) {
-    const SShape shape;
-    writeFile(folder / "x.flac", makeMusic(shape, 40000), shape);
+    writeFile(folder / "x.flac", makeMusic({}, 40000));
     std::string bytes = readFile(folder / "x.flac");
     folder.write("x.flac", bytes.replace(bytes.size() / 2, 40, 40, 'U'));
-    P<IAudioSource> source = openSource(folder / "x.flac", shape);
+    P<IAudioSource> source = openSource(folder / "x.flac");
     source->getNextAudioChunk();
     while (source->getBufferStatus() < 100) std::this_thread::yield();
     EXPECT_THROW(readAll(source), CSonoraError);
 }
 
 TEST_F(CPluginTest, FileThatShrinks_IsAnError) {
-    for (const char* name : {"x.wav", "x.mp3"}) {
-        const SShape shape;
-        writeFile(folder / name, makeMusic(shape, 800000), shape);
-        P<IAudioSource> source = openSource(folder / name, shape);
+    for (const auto& path : {folder / "x.wav", folder / "x.mp3"}) {
+        writeFile(path, makeMusic({}, 800000));
+        P<IAudioSource> source = openSource(path);
         source->getNextAudioChunk();
-        std::filesystem::resize_file(folder / name, std::filesystem::file_size(folder / name) / 2);
+        std::filesystem::resize_file(path, std::filesystem::file_size(path) / 2);
         std::string error;
         EXPECT_GT(readUntilError(source, error).size(), 300000u * 4);
         EXPECT_NE(std::string::npos, error.find(" of 18.141 seconds")) << error;
     }
 }
 
+constexpr size_t kFlacBlocks = 42; // behind the stream information, where the seek table lies
+
 TEST_F(CPluginTest, UnusualFlac_IsReadInFull) {
-    const SShape shape;
-    const std::string pcm = makeMusic(shape, 200000);
-    writeFile(folder / "x.flac", pcm, shape);
+    const std::string pcm = makeMusic({}, 200000);
+    writeFile(folder / "x.flac", pcm);
     const std::string plain = readFile(folder / "x.flac");
     const std::string tag = std::string("ID3\4\0\0\0\0\1\0", 10) + std::string(128, '\0');
-    constexpr size_t kBlocks = 42; // behind the stream information, where the seek table lies
-    const std::string blocks = std::string("\1\0\0\2xx\2\0\0\4riff\1\0\0\0", 18);
-    const std::string files[] = {
-        tag + tag + plain,
-        std::string(1000, '\0') + plain + std::string(128, 'T'),
-        std::string(plain).insert(kBlocks, blocks),
-        // A seek table that leads nowhere.
-        std::string(plain).replace(kBlocks + 4, 36, 36, '\1'),
-    };
-    for (const std::string& file : files) {
-        folder.write("x.flac", file);
-        P<IAudioSource> source = openSource(folder / "x.flac", shape);
+    const std::string blocks("\1\0\0\2xx\2\0\0\4riff\1\0\0\0", 18);
+    for (const std::string& file :
+         {tag + tag + plain, std::string(1000, '\0') + plain + std::string(128, 'T'),
+          std::string(plain).insert(kFlacBlocks, blocks),
+          std::string(plain).replace(kFlacBlocks + 4, 36, 36, '\1')}) { // seek points that lead nowhere
+        P<IAudioSource> source = openSource(folder.write("x.flac", file));
         ASSERT_TRUE(source);
         source->skipToTime(2.0);
         EXPECT_TRUE(readAll(source) == pcm.substr(88200 * 4));
@@ -261,25 +225,46 @@ TEST_F(CPluginTest, UnusualFlac_IsReadInFull) {
 }
 
 TEST_F(CPluginTest, FlacThatChangesItsRate_EndsThere) {
-    const SShape shape;
-    const std::string pcm = makeMusic(shape, 8192);
-    for (int rate : {44100, 48000}) {
-        folder.write("x.raw", pcm);
-        run("flac -sf --no-padding --no-seektable --force-raw-format --endian=little --sign=signed "
-            "--channels=2 "
-            "--bps=16 --sample-rate=" +
-            std::to_string(rate) + " - < '" + (folder / "x.raw").string() + "' > '" +
-            (folder / (std::to_string(rate) + ".flac")).string() + "'");
-    }
-    const std::string second = readFile(folder / "48000.flac");
-    const auto path =
-        folder.write("x.flac", readFile(folder / "44100.flac") + second.substr(second.find("\xFF\xF8")));
-    P<IAudioSource> source = openSource(path, shape);
+    const std::string pcm = makeMusic({}, 8192);
+    writeFile(folder / "x.flac", pcm);
+    writeFile(folder / "y.flac", pcm, {48000, 2, 2});
+    const std::string second = readFile(folder / "y.flac");
+    // Without a length in the header.
+    const auto path = folder.write("x.flac", readFile(folder / "x.flac").replace(22, 4, 4, '\0') +
+                                                 second.substr(second.find("\xFF\xF8")));
     std::string error;
-    EXPECT_TRUE(readUntilError(source, error) == pcm);
+    EXPECT_TRUE(readUntilError(openSource(path), error) == pcm);
     EXPECT_EQ(path.string() + " changes at 0.186 seconds from 44100 Hz, 2 channels, 16 bits to 48000 Hz, "
                               "2 channels, 16 bits, which is not supported",
               error);
+}
+
+TEST_F(CPluginTest, CutOffWriting_LeavesAFileThatPlaysUpToItsLastHalfSecond) {
+    const std::string pcm = makeMusic({}, 3 * 44100);
+    std::vector<P<IAudioFormat>> formats;
+    for (const SFormatCase& row : kFormatCases) {
+        formats.push_back(makeFormat(folder / ("x." + std::string(row.extension))));
+        formats.back()->open();
+    }
+    // Sound arrives as slowly as in a recording. Codecs may still hold back some of it.
+    std::this_thread::sleep_for(std::chrono::milliseconds(550));
+    for (const P<IAudioFormat>& format : formats) format->writeAudioChunk(makeChunk(pcm));
+    for (size_t i = 0; i < formats.size(); ++i) {
+        const SFormatCase& row = kFormatCases[i];
+        SCOPED_TRACE(row.extension);
+        // sox relies on the sizes in the header, unlike other programs.
+        const std::string name = "x." + std::string(row.extension);
+        const bool isContainer = std::string(row.plugin) == "sonora2_wav";
+        const std::string played =
+            isContainer ? run("sox -t sndfile " + name + " -t raw -") : decodeByPeer(name);
+        EXPECT_GT(played.size(), pcm.size() - pcm.size() / 6);
+        EXPECT_TRUE(!row.lossless || pcm.starts_with(played));
+        formats[i]->writeAudioChunk(makeChunk(pcm)); // continues normally
+        formats[i]->close();
+        const std::string whole = read(folder / name);
+        EXPECT_GE(whole.size(), 2 * pcm.size());
+        EXPECT_TRUE(!row.lossless || whole == pcm + pcm);
+    }
 }
 
 TEST_F(CPluginTest, RefusedShape_StatesWhyAndKeepsTheOldFile) {
@@ -304,7 +289,7 @@ TEST_F(CPluginTest, RefusedShape_StatesWhyAndKeepsTheOldFile) {
         EXPECT_FALSE(makeFormat(folder / row.name, row.shape));
         ASSERT_EQ(1u, log->lines.size());
         EXPECT_NE(std::string::npos, log->lines[0].find(row.reason)) << log->lines[0];
-        P<IAudioFormat> format = makeFormat(folder / row.name, {});
+        P<IAudioFormat> format = makeFormat(folder / row.name);
         EXPECT_EQ("dear to somebody", readFile(folder / row.name));
     }
 }
@@ -313,7 +298,7 @@ TEST_F(CPluginTest, BitRateThatIsTooLow_IsRefusedWithoutAFile) {
     for (const auto& [name, reason] :
          {std::pair{"x.mp3", "192 bits per second are too few, MP3 at 44100 Hz needs at least 32000"},
           std::pair{"x.ogg", "2 channels at 44100 Hz with a bit rate of 192 "}}) {
-        P<IAudioFormat> format = makeFormat(folder / name, {});
+        P<IAudioFormat> format = makeFormat(folder / name);
         format->setAudioBitRate(192, 0, 0);
         const std::string error = errorOf([&] { format->open(); });
         EXPECT_NE(std::string::npos, error.find(reason)) << error;

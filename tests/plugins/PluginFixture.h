@@ -25,6 +25,7 @@
 namespace tests {
 
 using peru::P;
+using sonora2::audio::IAudioChunk;
 using sonora2::common::IAudioFormat;
 using sonora2::common::IAudioSource;
 
@@ -34,16 +35,6 @@ struct SShape {
     int bytes = 2;
     int frameBytes() const { return channels * bytes; }
 };
-
-// Standard output of a command; throws when it fails.
-inline std::string run(const std::string& command) {
-    std::FILE* pipe = popen((command + " 2>/dev/null").c_str(), "r");
-    std::string out;
-    char buffer[65536];
-    for (size_t got; (got = std::fread(buffer, 1, sizeof(buffer), pipe)) > 0;) out.append(buffer, got);
-    if (pclose(pipe) != 0) throw std::runtime_error("failed: " + command);
-    return out;
-}
 
 // Counts how often a file is opened.
 class COpenCounter {
@@ -89,10 +80,10 @@ protected:
         handler = peru::make<sonora2::common::CPluginHandler>(context);
     }
 
-    P<IAudioSource> openSource(const std::filesystem::path& path, const SShape& shape) {
+    P<IAudioSource> openSource(const std::filesystem::path& path, const SShape& shape = {}) {
         return handler->createAudioSource(toURI(path), shape.rate, shape.channels, shape.bytes, true);
     }
-    P<IAudioFormat> makeFormat(const std::filesystem::path& path, const SShape& shape) {
+    P<IAudioFormat> makeFormat(const std::filesystem::path& path, const SShape& shape = {}) {
         return handler->createAudioFormat(toURI(path), shape.rate, shape.channels, shape.bytes);
     }
     static std::string codecOf(const P<IAudioSource>& source) {
@@ -105,7 +96,7 @@ protected:
     }
 
     // Writes PCM in chunks of varying length.
-    void writeAll(const P<IAudioFormat>& format, const std::string& pcm, const SShape& shape) {
+    void writeAll(const P<IAudioFormat>& format, const std::string& pcm, const SShape& shape = {}) {
         format->open();
         size_t frames = 1;
         for (size_t at = 0; at < pcm.size(); frames = frames * 7 % 6007) {
@@ -115,12 +106,41 @@ protected:
         }
         format->close();
     }
-    void writeFile(const std::filesystem::path& path, const std::string& pcm, const SShape& shape) {
+    void writeFile(const std::filesystem::path& path, const std::string& pcm, const SShape& shape = {}) {
         P<IAudioFormat> format = makeFormat(path, shape);
         if (!format) throw std::runtime_error("no plug-in writes " + path.string());
         writeAll(format, pcm, shape);
     }
 
+    // Standard output of a command in the test's folder; throws when it fails.
+    std::string run(const std::string& command) const {
+        std::FILE* pipe =
+            popen(("cd '" + folder.path().string() + "' && { " + command + "; } 2>/dev/null").c_str(), "r");
+        std::string out;
+        char buffer[65536];
+        for (size_t got; (got = std::fread(buffer, 1, sizeof(buffer), pipe)) > 0;) out.append(buffer, got);
+        if (pclose(pipe) != 0) throw std::runtime_error("failed: " + command);
+        return out;
+    }
+    // The samples as decoded by another program.
+    std::string decodeByPeer(const std::string& name, int bytes = 2) const {
+        if (name.ends_with(".flac")) // also handles 32 bits, unlike ffmpeg
+            return run("flac -sdc --force-raw-format --endian=little --sign=" +
+                       std::string(bytes == 1 ? "unsigned " : "signed ") + name);
+        if (name == "rifx.wav") return run("sox rifx.wav -t raw -L -");
+        static const char* const kCoders[] = {"", "u8", "s16le", "s24le", "s32le"};
+        const std::string coder = kCoders[bytes];
+        return run("ffmpeg -v error -i " + name + " -f " + coder + " -c:a pcm_" + coder + " -");
+    }
+
+    std::string read(const std::filesystem::path& path, const SShape& shape = {}) {
+        P<IAudioSource> source = openSource(path, shape);
+        if (!source) throw std::runtime_error("cannot read " + path.string());
+        std::string pcm = readAll(source);
+        EXPECT_DOUBLE_EQ(static_cast<double>(pcm.size()) / shape.frameBytes() / shape.rate,
+                         source->getDuration());
+        return pcm;
+    }
     // Reads the rest of a source and checks its timestamps.
     static std::string readAll(const P<IAudioSource>& source, size_t limit = SIZE_MAX) {
         std::string pcm;
@@ -146,6 +166,17 @@ protected:
     P<CLogLines> log = peru::make<CLogLines>();
     P<sonora2::audio::CSonoraContextAudio> context;
     P<sonora2::common::CPluginHandler> handler; // must outlive every source and format of a test
+};
+
+// Runs over all formats.
+class CFormatTest : public CPluginTest, public ::testing::WithParamInterface<SFormatCase> {
+protected:
+    std::filesystem::path named(const std::string& name = "x") const {
+        return folder / (name + "." + GetParam().extension);
+    }
+    void check(const std::string& name) const { // throws when another program finds the file invalid
+        if (*GetParam().check) run(std::string(GetParam().check) + " " + name);
+    }
 };
 
 // A sum of sines with some noise at full range; every channel is different.
