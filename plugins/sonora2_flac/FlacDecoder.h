@@ -45,7 +45,7 @@ private:
     int64_t findStream();
     void readMetadata();
     bool take(const FLAC__Frame& frame, const FLAC__int32* const planes[]);
-    int64_t getPending() const; // position behind what has been decoded
+    int64_t getPending() const; // first frame that has not been decoded
     uint8_t getSilence() const { return m_format.bytesPerSample == 1 ? 0x80 : 0; }
     void fillGap(int64_t frames);
     void addDamage(int64_t from, int64_t frames);

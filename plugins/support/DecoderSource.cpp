@@ -31,7 +31,7 @@ CDecoderSource::CDecoderSource(const P<common::ISonoraContext>& context, const P
       m_decoder(std::move(decoder)) {
     const P<peru::IString> salvage =
         m_context->getParameter(common::kSalvageParameterKey, common::kSalvageParameter);
-    m_salvage = salvage->equals("1");
+    m_salvage = salvage && salvage->equals("1");
 }
 
 CDecoderSource::~CDecoderSource() {
