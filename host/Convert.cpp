@@ -36,7 +36,8 @@ private:
     };
 
     void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
-    void carryTag(const fs::path& input, const fs::path& temporary, CProgress::Job job);
+    void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
+                  CProgress::Job job);
     SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
     std::vector<SSampleFormat> listCandidates(const SSampleFormat& own) const;
 
@@ -100,11 +101,19 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
 
 // What the output's format cannot hold is left out, and the user hears of it. A tag that cannot be read does
 // not keep the sound from being converted.
-void CConverter::carryTag(const fs::path& input, const fs::path& temporary, CProgress::Job job) {
+void CConverter::carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
+                          CProgress::Job job) {
     clearFailure();
     char* lost = nullptr;
-    if (TONEWRIGHT_Host_CopyTags(toURI(input).c_str(), toURI(temporary).c_str(), &lost) != 1)
-        return m_progress.warn(job, takeFailure("The tag could not be carried over", input));
+    const int32_t copied = TONEWRIGHT_Host_CopyTags(toURI(input).c_str(), toURI(temporary).c_str(), &lost);
+    if (copied == 0)
+        return m_progress.warn(job,
+                               "The tag could not be read and is left out: " + takeFailure("unknown", input));
+    if (copied < 0) {
+        std::string reason = takeFailure("unknown", temporary);
+        replaceAll(reason, m_temporaryEnding, "");
+        throw std::runtime_error("The tag of " + output.native() + " could not be written: " + reason);
+    }
     if (lost) m_progress.warn(job, std::string("The new file cannot hold these fields of the tag: ") + lost);
     TONEWRIGHT_Host_Free(lost);
 }
@@ -121,7 +130,7 @@ void CConverter::convert(const fs::path& input, const fs::path& output, CProgres
                              {input, place.getTemporary(), output}, m_temporaryEnding);
     ends = {};
     if (!done) return m_progress.cancel(job);
-    if (m_options.carryTags) carryTag(input, place.getTemporary(), job);
+    if (m_options.carryTags) carryTag(input, place.getTemporary(), output, job);
     const uint64_t bytes = fs::file_size(place.getTemporary());
     place.commit();
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;

@@ -34,7 +34,8 @@ std::string tellReason(const SEncodeFiles& files, const std::string& temporaryEn
     const fs::path absolute = fs::absolute(files.temporary);
     for (const std::string& shown : {absolute.lexically_normal().native(), absolute.native()})
         replaceAll(reason, shown, files.output.native());
-    replaceAll(reason, temporaryEnding, ""); // wherever the name was told in another way
+    replaceAll(reason, temporaryEnding, ""); // wherever the name is written in another way
+    replaceAll(reason, "The file '" + files.output.native() + "' could not be written: ", "");
     return asReason(std::move(reason), files.input);
 }
 

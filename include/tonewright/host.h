@@ -169,7 +169,8 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_CommitOutput(TONEWRIGHT_Handle output);
 TONEWRIGHT_API void TONEWRIGHT_Host_KeepOutput(TONEWRIGHT_Handle output);
 
 /* Copies all fields and pictures of a tag that the target's format can hold. `lost` (may be null) receives
- * the names of those that it cannot, separated by ", ", or null when nothing was lost. */
+ * the names of those that it cannot, separated by ", ", or null when nothing was lost. 0 when the source's
+ * tag cannot be read, -1 when the target's cannot be written, which leaves the target as it was. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_CopyTags(const char16_t* source, const char16_t* target, char** lost);
 
 /* --- Sources of the host's own, and reading ------------------------------------------------------ */

@@ -53,12 +53,6 @@ void CChunkProducer::requireDeliverable(const SMediaFile& file, const SPcmFormat
     if (high / low >= kMaxRatio || high > kMaxRate)
         fail("%s has a sample rate of %d Hz and cannot be converted to %d Hz, %d channels",
              file.getDisplayName(), own.rate, wanted.rate, wanted.channels);
-    if (wanted.bytesPerSample > 2)
-        fail("%s has %d channels at %d Hz in %d bits and can only be converted to 8 or 16 bits, not to %d "
-             "Hz, %d "
-             "channels, %d bits",
-             file.getDisplayName(), own.channels, own.rate, own.bytesPerSample * 8, wanted.rate,
-             wanted.channels, wanted.bytesPerSample * 8);
 }
 
 int64_t CChunkProducer::countDelivered(const SDecodedMedia& media, const SPcmFormat& wanted) {

@@ -1,22 +1,104 @@
+#include "filetag/FileTagFactory.h"
 #include "filetag/TagTransfer.h"
-
 #include "host_support/Guard.h"
 
-#include <cstdlib>
+#include <algorithm>
+#include <vector>
 
 using namespace tonewright::host_support;
+using filetag::IFileTag;
 using peru::CString;
+using peru::IString;
+
+namespace {
+
+constexpr struct {
+    const char* key; // as TagTransfer names it
+    P<IString> (IFileTag::*get)() const;
+    void (IFileTag::*set)(const peru::CStringArg& text);
+} kFields[] = {{"TITLE", &IFileTag::getTitle, &IFileTag::setTitle},
+               {"ARTIST", &IFileTag::getArtist, &IFileTag::setArtist},
+               {"ALBUM", &IFileTag::getAlbum, &IFileTag::setAlbum},
+               {"ALBUMARTIST", &IFileTag::getAlbumArtist, &IFileTag::setAlbumArtist},
+               {"TRACKNUMBER", &IFileTag::getTrackNumber, &IFileTag::setTrackNumber},
+               {"DATE", &IFileTag::getYear, &IFileTag::setYear},
+               {"GENRE", &IFileTag::getGenre, &IFileTag::setGenre},
+               {"COMMENT", &IFileTag::getComment, &IFileTag::setComment}};
+
+struct SSource {
+    filetag::STags all;
+    P<IFileTag>
+        own; // by the tag classes of the exports, which know places of WAVE files that TagLib does not
+    std::vector<P<IString>> texts; // of the own one, parallel to kFields
+
+    bool isEmpty() const {
+        return all.fields.empty() && all.pictures.empty() &&
+               std::all_of(texts.begin(), texts.end(), [](const auto& text) { return text->isEmpty(); });
+    }
+};
+
+// A kind of file without tags has an empty one.
+SSource readSource(const P<peru::IURI>& file) {
+    SSource source;
+    try {
+        source.all = filetag::readAllTags(file);
+        source.own = filetag::CFileTagFactory::get()->create(file);
+        if (source.own)
+            for (const auto& field : kFields) source.texts.push_back(((*source.own).*field.get)());
+    } catch (const peru::CFileFormatNotSupportedError&) {
+        // What was read until then is what there is.
+    }
+    return source;
+}
+
+// Stores fields that only the own tag classes know. Returns their keys.
+std::vector<std::string> complement(const SSource& source, const P<peru::IURI>& file) {
+    std::vector<std::string> stored;
+    const P<IFileTag> target = source.texts.empty() ? nullptr : filetag::CFileTagFactory::get()->create(file);
+    if (!target) return stored;
+    for (size_t i = 0; i < source.texts.size(); ++i) {
+        if (source.texts[i]->isEmpty() || !((*target).*kFields[i].get)()->isEmpty()) continue;
+        ((*target).*kFields[i].set)(source.texts[i]);
+        if (!((*target).*kFields[i].get)()->isEmpty()) stored.push_back(kFields[i].key);
+    }
+    if (!stored.empty()) target->store();
+    return stored;
+}
+
+// Returns the names of what the target cannot hold.
+std::string writeTarget(const SSource& source, const P<peru::IURI>& from, const P<peru::IURI>& to) {
+    std::vector<std::string> lost;
+    try {
+        const filetag::STransferReport report = filetag::transferTags(from, to);
+        const std::vector<std::string> stored = complement(source, to);
+        for (const P<IString>& field : report.lostFields) {
+            const std::string name = CString::toStdString(field);
+            if (std::find(stored.begin(), stored.end(), name) == stored.end()) lost.push_back(name);
+        }
+        for (const filetag::STagPicture& picture : report.lostPictures)
+            lost.push_back("picture (" + CString::toStdString(picture.mimeType) + ")");
+    } catch (const peru::CFileFormatNotSupportedError&) {
+        for (const filetag::STagField& field : source.all.fields)
+            lost.push_back(CString::toStdString(field.key));
+        if (!source.all.pictures.empty()) lost.push_back("pictures");
+    }
+    std::string names;
+    for (const std::string& name : lost) names += (names.empty() ? "" : ", ") + name;
+    return names;
+}
+
+} // namespace
 
 int32_t TONEWRIGHT_Host_CopyTags(const char16_t* source, const char16_t* target, char** lost) {
     if (lost) *lost = nullptr;
-    return guard(0, [&] {
-        const filetag::STransferReport report =
-            filetag::transferTags(tonewright::exports::toURI(source), tonewright::exports::toURI(target));
-        std::string names;
-        const auto add = [&](const std::string& name) { names += (names.empty() ? "" : ", ") + name; };
-        for (const P<peru::IString>& field : report.lostFields) add(CString::toStdString(field));
-        for (const filetag::STagPicture& picture : report.lostPictures)
-            add("picture (" + CString::toStdString(picture.mimeType) + ")");
+    int32_t failure = 0;
+    return guard(failure, [&] {
+        const P<peru::IURI> from = tonewright::exports::toURI(source),
+                            to = tonewright::exports::toURI(target);
+        const SSource tag = readSource(from);
+        failure = -1;
+        if (tag.isEmpty()) return 1;
+        const std::string names = writeTarget(tag, from, to);
         if (lost && !names.empty()) *lost = ::strdup(names.c_str());
         return 1;
     });

@@ -108,11 +108,11 @@ TEST_F(BadOutput, IsToldByNameAndReason) {
         std::vector<std::string> parts;
     } kCases[] = {
         {"missing/out.flac", {"missing", "does not exist"}},
-        {"file/out.flac", {"Not a directory"}},
+        {"file/out.flac", {"is not a folder"}},
         {"folder.flac", {"folder.flac", "Is a directory"}},
-        {"pipe.flac", {"pipe.flac", "Is not a regular file"}},
-        {"out.xyz", {"No plug-in writes .xyz files"}},
-        {"out", {"No plug-in writes files without an extension"}},
+        {"pipe.flac", {"pipe.flac", "not a regular file"}},
+        {"out.xyz", {"no plug-in writes .xyz files"}},
+        {"out", {"no plug-in writes files without an extension"}},
         {"/proc/out.flac", {"/proc"}},
         {"in.wav", {"same file"}},
         {"./folder.flac/../in.wav", {"same file"}},
@@ -125,7 +125,6 @@ TEST_F(BadOutput, IsToldByNameAndReason) {
              {"missing/out.png", "does not exist"}, {"folder.flac", "Is a directory"}, {"in.wav", "same"}})
         expectMessage(fail({"waveform", "in.wav", "-f", "-o", output}), {part});
     EXPECT_EQ(list(), before);
-    EXPECT_EQ(tonewright({"convert", "in.wav", "--to", "flac", "--directory", "missing"}).exitCode, 2);
     write("five.wav", makeTone(44100, 5, 16, 0.1)); // nothing mixes five channels down to what an MP3 holds
     expectMessage(fail({"convert", "five.wav", "-o", "out.mp3"}),
                   {"5 channels and", "to 44100 Hz, 2 channels"});

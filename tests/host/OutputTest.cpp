@@ -129,7 +129,7 @@ TEST_F(Output, TellsWhatFilesHold) {
     ASSERT_EQ(lines.size(), 5u);
     EXPECT_EQ(lines[4]["file"], "missing.wav");
     EXPECT_EQ(lines[4]["error"], "No such file or directory");
-    static constexpr const char* kCodecs[] = {"WAV", "FLAC", "Ogg Vorbis", "MP3"};
+    static constexpr const char* kCodecs[] = {"PCM signed 24 bit", "FLAC", "Vorbis", "MPEG audio layer III"};
     size_t i = 0;
     for (const auto& [name, sound] : sounds) {
         const nlohmann::json& line = lines[i];
@@ -188,7 +188,6 @@ TEST_F(Output, RefusesWrongArguments) {
              {"convert", "a.wav", "-o", "b.mp3", "--bitrate", "64k", "--min-bitrate", "128k"},
              {"convert", "a.wav", "-o", "b.flac", "-j", "0"},
              {"convert", "a.wav", "--to", "fl/ac"},
-             {"convert", "a.wav", "--to", "flac", "--directory", "missing"},
              {"convert", "a.wav", "-o", "b.flac", "--directory", "."},
              {"convert", "a.wav", "-o", "b.flac", "-q", "--json"},
              {"convert", "a.wav", "-o", ""},

@@ -161,13 +161,13 @@ void COutput::create() {
     const bool replaces = ::stat(m_target.c_str(), &status) == 0;
     m_lock = ::open(m_temporary.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC,
                     replaces ? S_IRUSR | S_IWUSR : 0666);
-    if (m_lock < 0) failSystem(m_temporary + " cannot be created", errno);
+    if (m_lock < 0) failSystem(m_target + " cannot be created", errno);
     ::flock(m_lock, LOCK_EX | LOCK_NB);
 }
 
 void COutput::commit() {
     const int file = ::open(m_temporary.c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC);
-    if (file < 0) failSystem(m_temporary + " cannot be read", errno);
+    if (file < 0) failSystem(m_target + " cannot be completed", errno);
     struct stat status;
     if ((m_flags & TONEWRIGHT_OUTPUT_REPLACE) && ::stat(m_target.c_str(), &status) == 0) {
         // Best effort: the file may have been another user's.
@@ -176,7 +176,7 @@ void COutput::commit() {
     }
     const int synced = ::fsync(file) == 0 ? 0 : errno;
     ::close(file);
-    if (synced != 0) failSystem(m_temporary + " cannot be written to the disk", synced);
+    if (synced != 0) failSystem(m_target + " cannot be written to the disk", synced);
 
     if (m_flags & TONEWRIGHT_OUTPUT_REPLACE) {
         if (::rename(m_temporary.c_str(), m_target.c_str()) != 0)
