@@ -147,7 +147,7 @@ TEST_F(Convert, MeansWhatTheOptionsSay) {
         {makeTone(44100, 2, 16, 0.4), "a.wav", {"--bits", "8"}, 44100, 2, 8},
         {makeTone(44100, 2, 24, 0.4), "a.flac", {"--bits", "16"}, 44100, 2, 16},
         {makeTone(44100, 2, 24, 0.4), "a.wav", {"--bits", "24"}, 44100, 2, 24},
-        {makeTone(44100, 2, 24, 0.4), "a.wav", {"--rate", "48000"}, 48000, 2, 16},
+        {makeTone(44100, 2, 24, 0.4), "a.wav", {"--rate", "48000"}, 48000, 2, 24},
         {makeTone(96000, 6, 24, 0.4), "a.mp3", {"--rate", "32000", "--channels", "1"}, 32000, 1, 0},
     };
     for (const auto& expected : kCases) {

@@ -94,12 +94,13 @@ void COutput::findTarget(const std::string& path) {
         if (error) failSystem(path + " cannot be written", error.value());
         target = meant.is_absolute() ? meant : target.parent_path() / meant;
     }
+    const std::string shownFolder =
+        fs::path(path).has_parent_path() ? fs::path(path).parent_path() : target.parent_path();
     // Two names of one folder must give one name of the temporary file.
     const fs::path folder = fs::canonical(target.parent_path(), error);
-    if (error == std::errc::no_such_file_or_directory)
-        fail("The folder " + target.parent_path().string() + " does not exist");
-    if (error) failSystem("The folder " + target.parent_path().string() + " cannot be used", error.value());
-    if (!fs::is_directory(folder, error)) fail(folder.string() + " is not a folder");
+    if (error == std::errc::no_such_file_or_directory) fail("The folder " + shownFolder + " does not exist");
+    if (error) failSystem("The folder " + shownFolder + " cannot be used", error.value());
+    if (!fs::is_directory(folder, error)) fail(shownFolder + " is not a folder");
     m_target = folder / target.filename();
 
     struct stat status;
@@ -111,7 +112,7 @@ void COutput::findTarget(const std::string& path) {
         failSystem(path + " cannot be written", errno);
     }
     if (::access(folder.c_str(), W_OK | X_OK) != 0)
-        failSystem("The folder " + folder.string() + " cannot be written to", errno);
+        failSystem("The folder " + shownFolder + " cannot be written to", errno);
 }
 
 // A name at the limit of the file system is cut before its extension, which selects the format.
