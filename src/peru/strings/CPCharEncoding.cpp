@@ -25,6 +25,8 @@ int32_t decodeMultiByte(const uint8_t* p, int32_t left, char32_t& out) {
     std::mbstate_t state{};
     size_t length = std::mbrtowc(&wide, reinterpret_cast<const char*>(p), static_cast<size_t>(left), &state);
     if (length == static_cast<size_t>(-1) || length == static_cast<size_t>(-2)) return 0;
+    // The runtime's UTF-8 goes beyond Unicode.
+    if (static_cast<char32_t>(wide) > kMaxCodePoint) return 0;
     out = static_cast<char32_t>(wide);
     return length == 0 ? 1 : static_cast<int32_t>(length);
 }

@@ -141,6 +141,8 @@ private:
     // The position right after `count` characters, before any malformed bytes that follow them; the end for
     // -1. `start` must be resolved.
     SStringPos getEndOf(SStringPos start, int32_t count) const;
+    // Offset of the first character at or after an offset, the byte size if there is none.
+    int32_t skipMalformed(int32_t offset) const;
     // Both positions must be resolved.
     SStringView getRange(SStringPos start, SStringPos end) const {
         if (start.index > end.index || start.offset > end.offset) end = start;

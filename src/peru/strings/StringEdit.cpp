@@ -46,8 +46,18 @@ P<IString> CString::edit(SStringPos start, SStringPos end, const SStringView& in
         append(out + needed, m_data + end.offset, tail);
         bool known = m_wellFormed && inserted.wellFormed && inserted.encodingId == m_encodingId;
         result->settle(known ? length : -1, known);
-        if (!raw || result->getLength() == length) return result;
+        if (raw ? result->getLength() == length : result->getLength() <= length) return result;
+        if (raw) continue;
+        // The malformed bytes around the removed range make a character together.
+        const int32_t next = skipMalformed(end.offset);
+        if (next == end.offset) return result;
+        end.offset = next;
     }
+}
+
+int32_t CString::skipMalformed(int32_t offset) const {
+    const int32_t next = m_encoding->findValidChar(m_data, m_byteSize, offset);
+    return next < 0 ? m_byteSize : next;
 }
 
 P<IString> CString::concat(const CStringArg& text) const {
@@ -75,9 +85,11 @@ P<IString> CString::replace(const CStringArg& search, const CStringArg& replacem
     std::vector<std::pair<int32_t, int32_t>> matches; // byte ranges
     start = resolve(start);
     end = resolve(end);
+    int32_t length = m_length;
     for (SStringPos from = start; wanted.length > 0;) {
         SStringPos match = findView(wanted, from, end);
         if (!match.isFound()) break;
+        length += inserted.length - wanted.length;
         from = getEndOf(match, wanted.length);
         matches.emplace_back(match.offset, from.offset);
         if (from.index >= end.index) break;
@@ -93,20 +105,24 @@ P<IString> CString::replace(const CStringArg& search, const CStringArg& replacem
         // As in edit(): the inserted text gets substitutes.
         return replace(search, *text::convert(getEncoding(), inserted, '?'), start, end);
     }
-    int64_t size = m_byteSize;
-    for (auto [from, to] : matches) size += needed - (to - from);
-    P<CString> result = reserve(*m_encoding.get(), size);
-    uint8_t* out = result->getRoom();
-    int32_t done = 0;
-    for (auto [from, to] : matches) {
-        out = append(out, m_data + done, from - done);
-        text::encode(*m_encoding.get(), inserted, out);
-        out += needed;
-        done = to;
+    for (bool dropped = false;; dropped = true) {
+        int64_t size = m_byteSize;
+        for (auto [from, to] : matches) size += needed - (to - from);
+        P<CString> result = reserve(*m_encoding.get(), size);
+        uint8_t* out = result->getRoom();
+        int32_t done = 0;
+        for (auto [from, to] : matches) {
+            out = append(out, m_data + done, from - done);
+            text::encode(*m_encoding.get(), inserted, out);
+            out += needed;
+            done = to;
+        }
+        append(out, m_data + done, m_byteSize - done);
+        result->settle();
+        if (dropped || result->getLength() <= length) return result;
+        // As in edit(): malformed bytes make a character together.
+        for (auto& match : matches) match.second = skipMalformed(match.second);
     }
-    append(out, m_data + done, m_byteSize - done);
-    result->settle();
-    return result;
 }
 
 P<IString> CString::mapCase(char32_t (*map)(char32_t)) const {

@@ -131,6 +131,7 @@ TEST(CharEncoding, CodePage_FollowsTheEnvironmentForwardsOnly) {
         EXPECT_EQ(chars[1], U'\u20AC');
         EXPECT_EQ(offsets[1], 2);
         EXPECT_EQ(cp->getEncodedSize(0xE9), 2);
+        EXPECT_EQ(cp->countChars(raw("\xF4\x90\x80\x80"), 4, 0), 0) << "beyond Unicode";
         EXPECT_STREQ(CException(newString(u"\u20AC"), nullptr).what(), "\xE2\x82\xAC");
         EXPECT_THROW(cp->findPrevChar(raw(text), 5, 5), CMethodNotImplementedError);
         EXPECT_THROW(cp->decodePrevChar(chars[0], raw(text), 5, 5), CMethodNotImplementedError);

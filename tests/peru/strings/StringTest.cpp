@@ -275,6 +275,19 @@ TEST(String, MalformedBytes_AreInvisibleButKept) {
         {padded->trim(), "<> x\xFF"},
         {padded->trim(" x"), "<> x\xFF"},
         {fillPlaceholders(raw("%A%\xF0\x9F\x98\x80"), {{"%A%", tail}}), "a<><>"},
+        {raw("x\xC3"
+             "b\xA9y")
+             ->replace("b", ""),
+         "x\xC3y"},
+        {raw("x\xC3"
+             "b\xA9y")
+             ->remove(smile->getPosition(9), 0),
+         "x\xC3"
+         "b\xA9y"},
+        {raw("\xC3"
+             "b\xA9y")
+             ->remove({0, 1}, 1),
+         "\xC3y"},
         {raw("a\xC3")->concat(raw("\xA9"
                                   "b")),
          "ab"},
