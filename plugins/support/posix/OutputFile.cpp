@@ -36,9 +36,12 @@ std::string followLinks(std::string path) {
 COutputFile::COutputFile(const SMediaFile& file) : m_file(file) {
     constexpr mode_t kMode = 0666; // less the process's mask
     m_buffer.resize(kBufferSize);
-    const std::string path = followLinks(file.path);
-    m_handle = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, kMode);
     struct stat status {};
+    // A link that leads nowhere yet: the new file belongs to its end. Any other is left to the system, since
+    // those of open descriptors cannot be read.
+    std::string path = file.path;
+    if (::stat(path.c_str(), &status) != 0 && errno == ENOENT) path = followLinks(path);
+    m_handle = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, kMode);
     if (m_handle >= 0) {
         m_created = path;
         ::flock(m_handle, LOCK_EX | LOCK_NB); // marks the file as being written, for other processes

@@ -290,7 +290,8 @@ SFailure CPluginHandler::explainSource(const P<IURI>& uri, int mask, const SAtte
             const CCloseGuard guard(*source);
             source->open();
             const int channels = source->getChannelCount();
-            if (!samplerateconverter::CSampleRateConverter::canConvert(channels, wanted.nChannelCount))
+            if ((mask & kAudioSource) &&
+                !samplerateconverter::CSampleRateConverter::canConvert(channels, wanted.nChannelCount))
                 return makeFailure(peru::format("%s has %d channels, which cannot be converted to %d", name,
                                                 channels, wanted.nChannelCount),
                                    uri);
