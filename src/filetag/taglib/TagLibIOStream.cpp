@@ -1,5 +1,6 @@
 #include "filetag/taglib/TagLibIOStream.h"
 
+#include "filetag/posix/OpenedFile.h"
 #include "peru/Errors.h"
 #include "peru/streams/IStreamManager.h"
 #include "peru/strings/IStringLocalizer.h"
@@ -26,8 +27,9 @@ std::string_view toView(const TagLib::ByteVector& bytes) {
 } // namespace
 
 CTagLibIOStream::CTagLibIOStream(const P<IURI>& file)
-    : m_uri(file), m_opened(file), m_path(CString::toStdString(getPathes()->toPlatformPath(file))),
-      m_file(m_opened.duplicate(), true), m_oldSize(m_file.length()) {}
+    : m_uri(file), m_opened(std::make_unique<posix::COpenedFile>(file)),
+      m_path(CString::toStdString(getPathes()->toPlatformPath(file))), m_file(m_opened->duplicate(), true),
+      m_oldSize(m_file.length()) {}
 
 CTagLibIOStream::~CTagLibIOStream() = default;
 
@@ -188,8 +190,8 @@ void CTagLibIOStream::replaceFile() {
 void CTagLibIOStream::commit() {
     if (!m_pieces || !m_pieces->isChanged()) return;
     // The pieces refer to the file that was opened; combined with any other they would corrupt it.
-    const posix::COpenedFile::CLock lock(m_opened);
-    m_opened.checkUnchanged();
+    const posix::COpenedFile::CLock lock(*m_opened);
+    m_opened->checkUnchanged();
     if (m_pieces->getSize() == m_oldSize) {
         const SRange range = findDifference();
         if (range.end == 0) return;

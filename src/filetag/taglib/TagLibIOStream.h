@@ -2,14 +2,18 @@
 #pragma once
 
 #include "filetag/Api.h"
-#include "filetag/posix/OpenedFile.h"
 #include "filetag/taglib/PieceTable.h"
 #include "peru/uri/IURI.h"
 
 #include <tfilestream.h>
 
+#include <memory>
 #include <optional>
 #include <string>
+
+namespace filetag::posix {
+class COpenedFile;
+}
 
 namespace filetag::taglib {
 
@@ -57,7 +61,7 @@ private:
     void replaceFile();
 
     P<peru::IURI> m_uri;
-    posix::COpenedFile m_opened;
+    std::unique_ptr<posix::COpenedFile> m_opened;
     std::string m_path;
     TagLib::FileStream m_file;
     int64_t m_oldSize = 0;
