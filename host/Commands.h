@@ -28,6 +28,7 @@ struct SConvertOptions : SFormatOptions {
     int jobs = 1;
     bool force = false;
     bool carryTags = true;
+    bool salvage = false;
     EOutput show = EOutput::normal;
 };
 

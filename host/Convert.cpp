@@ -10,6 +10,7 @@
 #include <algorithm>
 #include <atomic>
 #include <set>
+#include <sstream>
 #include <stdexcept>
 #include <system_error>
 #include <thread>
@@ -38,6 +39,7 @@ private:
     void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
     void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
                   CProgress::Job job);
+    void warn(const CHandle& source, const fs::path& input, CProgress::Job job);
     SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
     std::vector<SSampleFormat> listCandidates(const SSampleFormat& own) const;
 
@@ -87,6 +89,7 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
     ends.format = requireFormat(m_library, temporary, samples, m_options, output, output.string());
     if (samples == sound.samples) {
         ends.source = std::move(sound.source);
+        if (m_options.salvage) TONEWRIGHT_Host_SetSalvage(ends.source.get(), 1);
         return ends;
     }
     sound.source.reset();
@@ -96,6 +99,7 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
     if (!ends.source)
         throw std::runtime_error(takeFailure(
             "Cannot be converted from " + describe(sound.samples) + " to " + describe(samples), input));
+    if (m_options.salvage) TONEWRIGHT_Host_SetSalvage(ends.source.get(), 1);
     return ends;
 }
 
@@ -118,6 +122,15 @@ void CConverter::carryTag(const fs::path& input, const fs::path& temporary, cons
     TONEWRIGHT_Host_Free(lost);
 }
 
+// What the decoder noticed.
+void CConverter::warn(const CHandle& source, const fs::path& input, CProgress::Job job) {
+    char* const lines = TONEWRIGHT_Host_TakeWarnings(source.get());
+    if (!lines) return;
+    std::istringstream text(lines);
+    TONEWRIGHT_Host_Free(lines);
+    for (std::string line; std::getline(text, line);) m_progress.warn(job, asReason(withPaths(line), input));
+}
+
 void CConverter::convert(const fs::path& input, const fs::path& output, CProgress::Job job) {
     const auto started = std::chrono::steady_clock::now();
     checkInput(input);
@@ -128,6 +141,7 @@ void CConverter::convert(const fs::path& input, const fs::path& output, CProgres
     const double duration = m_library.AudioSource_GetDuration(ends.source.get());
     const bool done = encode(m_library, ends.source, ends.format, m_progress, job,
                              {input, place.getTemporary(), output}, m_temporaryEnding);
+    warn(ends.source, input, job);
     ends = {};
     if (!done) return m_progress.cancel(job);
     if (m_options.carryTags) carryTag(input, place.getTemporary(), output, job);

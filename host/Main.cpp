@@ -120,6 +120,8 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
         ->option_text("N")
         ->check(CLI::Range(1, 256));
     command->add_flag("-f,--force", options.force, "Replace existing files");
+    command->add_flag("--salvage", options.salvage,
+                      "Replace damaged parts of the input by silence instead of failing");
     command->add_flag_callback(
         "--no-tags", [&] { options.carryTags = false; },
         "Leave title, artist and the other fields of tags behind");

@@ -122,6 +122,15 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_OpenMedia(const char16_t* uri, 
 /* The same facts about a source that exists, which is opened for that if needed and closed again. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetMediaInfo(TONEWRIGHT_Handle source, TONEWRIGHT_MediaInfo* info);
 
+/* Damaged parts of the file are replaced by silence of the same length instead of failing;
+ * TONEWRIGHT_Host_TakeWarnings then says where. 0 for a source that cannot do that. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetSalvage(TONEWRIGHT_Handle source, int32_t salvage);
+
+/* What was noticed while the source was read since the last call, such as clipping or repaired damage: one
+ * warning per line, or null when there is none. Some warnings are known only when the source has been closed.
+ */
+TONEWRIGHT_API char* TONEWRIGHT_Host_TakeWarnings(TONEWRIGHT_Handle source);
+
 /* What a file of a kind can hold. */
 typedef struct TONEWRIGHT_Capabilities {
     size_t size;

@@ -28,7 +28,7 @@ CDecoderSource::CDecoderSource(const P<common::ISonoraContext>& context, const P
                                const SMediaFile& file, std::unique_ptr<IDecoder> decoder,
                                const SPcmFormat& wanted)
     : m_context(context), m_pluginName(pluginName), m_file(file), m_wanted(wanted),
-      m_decoder(std::move(decoder)) {
+      m_decoder(std::move(decoder)), m_log(peru::make<CWarningLog>(context->getLogManager())) {
     const P<peru::IString> salvage =
         m_context->getParameter(common::kSalvageParameterKey, common::kSalvageParameter);
     m_salvage = salvage && salvage->equals("1");
@@ -108,11 +108,15 @@ void CDecoderSource::setSalvage(bool salvage) {
 }
 
 SDecoderOptions CDecoderSource::getOptions() const {
-    return {m_salvage, m_context->getLogManager()};
+    return {m_salvage, m_log};
 }
 
 P<peru::IString> CDecoderSource::getCodecName() {
     return peru::CString::fromUTF8(m_media.codec);
+}
+
+P<peru::IString> CDecoderSource::takeWarnings() {
+    return peru::CString::fromUTF8(m_log->takeWarnings());
 }
 
 int64_t CDecoderSource::getBitRate() {

@@ -5,6 +5,7 @@
 #include "sonora2/media/IMediaDescription.h"
 #include "sonora2/media/ISalvage.h"
 #include "support/ReadAhead.h"
+#include "support/WarningLog.h"
 
 #include <memory>
 
@@ -51,6 +52,7 @@ public:
     int getOwnSampleRate() override { return m_media.format.rate; }
     int getOwnChannelCount() override { return m_media.format.channels; }
     int getOwnBytesPerSample() override { return m_media.format.bytesPerSample; }
+    P<peru::IString> takeWarnings() override;
 
 private:
     void openDecoder();
@@ -66,6 +68,7 @@ private:
     double m_startTime = 0.0;
     bool m_salvage = false;
     std::unique_ptr<IDecoder> m_decoder;
+    P<CWarningLog> m_log;
     SDecodedMedia m_media;                      // known once opened
     SPcmFormat m_delivered;                     // known once opened
     int64_t m_total = 0;                        // delivered frames of the whole file

@@ -29,7 +29,7 @@ public:
         while (devices.hasMore()) {
             const auto device = devices.getNext();
             entries.push_back({toText(device->getId()), toText(device->getName()),
-                               toText(device->getHostApi()), device->getMaxChannelCount(),
+                               toText(device->getHostApiDisplayName()), device->getMaxChannelCount(),
                                device->isDefault()});
         }
     }

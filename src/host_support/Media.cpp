@@ -5,6 +5,7 @@
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
 #include "sonora2/media/IMediaDescription.h"
+#include "sonora2/media/ISalvage.h"
 #include "sonora2/plugins/MediaEnvironment.h"
 #include "sonora2/plugins/PluginExtensions.h"
 
@@ -112,6 +113,22 @@ int32_t TONEWRIGHT_Host_GetMediaInfo(TONEWRIGHT_Handle source, TONEWRIGHT_MediaI
         const CCloseGuard closing(*object, !wasOpened);
         fillInfo(object, info);
         return 1;
+    });
+}
+
+int32_t TONEWRIGHT_Host_SetSalvage(TONEWRIGHT_Handle source, int32_t salvage) {
+    return guard(0, [&] {
+        require<ISalvage>(source, "a source that can be salvaged")->setSalvage(salvage != 0);
+        return 1;
+    });
+}
+
+char* TONEWRIGHT_Host_TakeWarnings(TONEWRIGHT_Handle source) {
+    return guard<char*>(nullptr, [&]() -> char* {
+        const P<IMediaDescription> description = unwrap<IMediaDescription>(source);
+        const std::string lines =
+            description ? CString::toStdString(description->takeWarnings()) : std::string();
+        return lines.empty() ? nullptr : ::strdup(lines.c_str());
     });
 }
 

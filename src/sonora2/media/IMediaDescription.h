@@ -17,6 +17,9 @@ public:
     virtual int getOwnSampleRate() = 0;
     virtual int getOwnChannelCount() = 0;
     virtual int getOwnBytesPerSample() = 0;
+    // What was noticed while reading since the last call, one warning per line, such as clipping or damage
+    // that was replaced by silence. Some are known only when the source has been closed.
+    virtual P<peru::IString> takeWarnings() = 0;
 };
 
 } // namespace sonora2::common

@@ -252,7 +252,10 @@ template <class T, class TryCreate> P<T> CPluginHandler::findObject(const P<IURI
 }
 
 bool CPluginHandler::passesOpening(const P<ISource>& source, bool keepOpened) const {
-    if (!m_verifyByOpening) return true;
+    if (!m_verifyByOpening) {
+        if (source->isOpened()) source->close(); // by the plug-in's own test
+        return true;
+    }
     source->open();
     const bool opened = source->isOpened();
     if (opened && !keepOpened) source->close();

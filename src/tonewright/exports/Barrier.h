@@ -1,6 +1,7 @@
 // Stops exceptions at the boundary of the library.
 #pragma once
 
+#include "crashhandler/CrashHandler.h"
 #include "peru/Exception.h"
 #include "peru/strings/String.h"
 
@@ -21,6 +22,7 @@ void reportLastFailure() noexcept;
 // Runs the body of an export. Returns `failure` after an exception; it is read only then, so the body may
 // change it as it proceeds.
 template <class R, class Body> R barrier(const R& failure, Body&& body) {
+    crashhandler::useAlternateStack(); // for an overflow in a thread of the host's
     try {
         return static_cast<R>(body());
     } catch (const std::exception& e) {
