@@ -123,7 +123,7 @@ TEST(Exception, AnswersWhatFromTheCodePageOrTheThread) {
 class CParent : public CStringLocalizer {
 public:
     P<IString> getText(const CStringArg& key, const P<IString>& defaultText) override {
-        if (m_onCall) m_onCall();
+        if (const auto call = m_onCall) call(); // a copy, since the call may replace it
         return CStringLocalizer::getText(key, defaultText);
     }
     std::function<void()> m_onCall;

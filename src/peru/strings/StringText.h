@@ -1,4 +1,4 @@
-// Helpers of the string operations: properties of encoded text, typed access and re-encoding.
+// Shared by the string operations: properties of encoded text, typed access and re-encoding.
 #pragma once
 
 #include "peru/strings/CharEncodingRules.h"

@@ -22,7 +22,7 @@ public:
     P<IURI> getURI() const override { return {}; }
     bool isAtEnd() override { return true; }
     void write(const void* buffer, int64_t size) override {
-        if (onWrite) onWrite();
+        if (const auto call = onWrite) call(); // a copy, since the call may replace it
         bytes.append(static_cast<const char*>(buffer), static_cast<size_t>(size));
     }
     void flush() override { ++flushes; }
@@ -50,7 +50,7 @@ public:
 
 private:
     void record(const std::string& line) {
-        if (onCall) onCall();
+        if (const auto call = onCall) call(); // a copy, since the call may replace it
         m_journal.push_back(m_name + line);
     }
     std::vector<std::string>& m_journal;

@@ -100,7 +100,8 @@ TEST(StringFormat, Result_IsInTheFormatsEncodingWhereThatHoldsIt) {
 
 TEST(StringFormat, Errors_NameTheFormat) {
     const std::string invalid = "invalid format string in '";
-    const std::string mismatch = "argument does not match the field's format specification for '";
+    const std::string mismatch = "argument does not match the field's format spec"
+                                 "ification for '";
     const std::pair<std::string, std::string> cases[] = {
         {failure("%-+0 #-d", 1), "too many field flags specified in '%-+0 #-d'"},
         {failure("a %y", 1), invalid + "a %y'"},

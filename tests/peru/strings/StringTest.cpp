@@ -290,7 +290,8 @@ TEST(String, MalformedBytes_AreInvisibleButKept) {
          "\xC3y"},
         {raw("a\xC3")->concat(raw("\xA9"
                                   "b")),
-         "ab"},
+         "a\xC3"
+         "b"},
     };
     for (const auto& each : cases) {
         std::string bytes = CString::toStdString(each.result);
