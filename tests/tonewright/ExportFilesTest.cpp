@@ -208,6 +208,7 @@ TEST_F(ExportReasons, FailedCalls_SayWhatIsWrong) {
                      CHandle(TONEWRIGHT_CreateAudioFormatFromURI(toUri(folder / "eight.wav").c_str(), 44100,
                                                                  8, 2, 0.0, 0, 0, 0))),
               0);
+    TONEWRIGHT_SetTempExtension(u".part");
     struct SCase {
         std::string name;
         bool isRead;
@@ -215,13 +216,13 @@ TEST_F(ExportReasons, FailedCalls_SayWhatIsWrong) {
         std::string reason; // its end
     };
     for (const SCase& c : std::initializer_list<SCase>{
-             {"a.xyz", true, 44100, "a.xyz: no plug-in reads .xyz files"},
-             {"a.xyz", false, 44100, "a.xyz: no plug-in writes .xyz files"},
-             {"name", true, 44100, "name: no plug-in reads files without an extension"},
+             {"a.xyz", true, 44100, "No plug-in reads .xyz files"},
+             {"a.xyz", false, 44100, "No plug-in writes .xyz files"},
+             {"name", true, 44100, "No plug-in reads files without an extension"},
              {"eight.wav", true, 44100, "eight.wav has 8 channels, which cannot be converted to 2"},
              {"missing.flac", true, 44100, "missing.flac: No such file or directory"},
-             {"a.mp3", false, 96000,
-              "a.mp3: .mp3 files cannot hold 96000 Hz, 2 channels, 2 bytes per sample"},
+             {"a.mp3.part", false, 96000,
+              "No plug-in writes a.mp3 with 96000 Hz, 2 channels, 2 bytes per sample"},
          }) {
         log.take();
         const std::u16string uri = toUri(folder / c.name);

@@ -47,19 +47,20 @@ bool fileExists(const P<IURI>& file) {
                                             ignored);
 }
 
-// The failure names the file, whatever the plug-in's own text does.
-SFailure makeFailure(SFailure failure, const P<IURI>& uri) {
-    if (failure.kind.empty()) failure.kind = "peru::CFileFormatNotSupportedError";
+SFailure makeFailure(const P<IString>& message, const P<IURI>& uri) {
+    SFailure failure;
+    failure.kind = "peru::CFileFormatNotSupportedError";
+    failure.message = CString::toStdString(message);
     failure.uri = CString::toStdString(uri->getAsString());
-    const std::string name = CString::toStdString(peru::CURI::unescape(uri->getFileName()));
-    if (failure.message.find(name) == std::string::npos) failure.message = name + ": " + failure.message;
     return failure;
 }
 
-SFailure makeFailure(const P<IString>& message, const P<IURI>& uri) {
-    SFailure failure;
-    failure.message = CString::toStdString(message);
-    return makeFailure(std::move(failure), uri);
+// A failure that a plug-in reported: names the file, whatever the plug-in's own text does.
+SFailure makeFailure(SFailure failure, const P<IString>& fileName, const P<IURI>& uri) {
+    const std::string name = CString::toStdString(fileName);
+    if (failure.message.find(name) == std::string::npos) failure.message = name + ": " + failure.message;
+    failure.uri = CString::toStdString(uri->getAsString());
+    return failure;
 }
 
 P<IString> describe(int rate, int channels, int bytesPerSample) {
@@ -68,8 +69,8 @@ P<IString> describe(int rate, int channels, int bytesPerSample) {
 
 // Without a candidate there is nothing else to report.
 P<IString> explainExtension(const P<IString>& key, const char* doing) {
-    return key->isEmpty() ? peru::format("no plug-in %s files without an extension", doing)
-                          : peru::format("no plug-in %s .%s files", doing, key);
+    return key->isEmpty() ? peru::format("No plug-in %s files without an extension", doing)
+                          : peru::format("No plug-in %s .%s files", doing, key);
 }
 
 bool contains(IPluginExtensions& extensions, const P<IString>& key) {
@@ -170,7 +171,14 @@ P<IPluginExtensions> CPluginHandler::getValidExtensions(int mask) {
     return all;
 }
 
-// Lower case, without the dot. The suffix is removed first, so that "a.flac.part" yields "flac".
+// The file's name without the suffix of temporary names, for messages.
+P<IString> CPluginHandler::getShownName(const P<IURI>& uri) const {
+    std::string name = CString::toStdString(peru::CURI::unescape(uri->getFileName()));
+    const std::string suffix = CString::toStdString(m_uriSuffix);
+    if (!suffix.empty() && name.ends_with(suffix)) name.resize(name.size() - suffix.size());
+    return CString::fromUTF8(name);
+}
+
 void CPluginHandler::log(int32_t severity, const P<IString>& text) const {
     if (P<ILogManager> manager = m_context->getLogManager()) manager->log(severity, text);
 }
@@ -283,9 +291,9 @@ P<ISource> CPluginHandler::findSource(const P<IURI>& uri, int mask, const SSourc
 // A plug-in that declines gives no reason: the file's own format shows why it could not be delivered.
 SFailure CPluginHandler::explainSource(const P<IURI>& uri, int mask, const SAttempts& attempts,
                                        const SSourceParams& wanted) const {
-    if (!attempts.failure.isEmpty()) return makeFailure(attempts.failure, uri);
+    const P<IString> name = getShownName(uri);
+    if (!attempts.failure.isEmpty()) return makeFailure(attempts.failure, name, uri);
     if (!attempts.declined) return makeFailure(explainExtension(attempts.key, "reads"), uri);
-    const P<IString> name = peru::CURI::unescape(uri->getFileName());
     try {
         const SSourceParams own{}; // zero: the file's own format
         const P<ISource> opened = attempts.declined->tryCreateSource(uri, mask, true, &own);
@@ -305,7 +313,7 @@ SFailure CPluginHandler::explainSource(const P<IURI>& uri, int mask, const SAtte
                 uri);
         }
     } catch (const std::exception& e) {
-        return makeFailure(describeFailure(e), uri);
+        return makeFailure(describeFailure(e), name, uri);
     } catch (...) {
         // The refusal itself is all that is known.
     }
@@ -326,12 +334,12 @@ P<IFormat> CPluginHandler::findFormat(const P<IURI>& uri, int mask, const SForma
     });
     if (found) return found;
     if (!attempts.failure.isEmpty())
-        setLastFailure(makeFailure(attempts.failure, uri));
+        setLastFailure(makeFailure(attempts.failure, getShownName(uri), uri));
     else if (!attempts.declined)
         setLastFailure(makeFailure(explainExtension(attempts.key, "writes"), uri));
     else
         setLastFailure(makeFailure(
-            peru::format(".%s files cannot hold %s", attempts.key,
+            peru::format("No plug-in writes %s with %s", getShownName(uri),
                          describe(record.nSampleRate, record.nChannelCount, record.nBytesPerSample)),
             uri));
     return found;

@@ -68,6 +68,7 @@ private:
     template <class Call> void askPreference(const P<peru::IURI>& uri, Call call);
     P<ISonoraPlugin> findPreferred(int mask, const P<peru::IURI>& uri);
     void storePreferred(int mask, const P<peru::IURI>& uri, ISonoraPlugin& plugin);
+    P<peru::IString> getShownName(const P<peru::IURI>& uri) const;
     P<peru::IURI> findLibrary(const P<peru::IString>& fileName) const;
     void log(int32_t severity, const P<peru::IString>& text) const;
 
