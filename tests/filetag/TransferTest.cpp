@@ -89,6 +89,8 @@ TEST(TagTransfer, CarriesEverythingBetweenAllFormats) {
         EXPECT_EQ(writeAllTags(toURI(source), makeTags(kFields, pictures)).lostPictures.size(),
                   ape ? 1u : 0u);
         for (const std::string to : kFormats) {
+            // Formats that share their tag with another one are read the same way for every target.
+            if ((from == "oga" || from == "opus" || from == "aiff" || from == "wav") && to != "mp3") continue;
             SCOPED_TRACE(from + " to " + to);
             const auto target = makePlain(folder, "target", to);
             const STransferReport report = transferTags(toURI(source), toURI(target));

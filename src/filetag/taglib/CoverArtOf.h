@@ -39,7 +39,7 @@ template <class Picture> void fillPicture(Picture& picture, const P<peru::CMemor
 template <class Tag, class Picture> class TCoverArtOf : public peru::CObject, public ICoverArt {
 public:
     TCoverArtOf(const P<const Tag>& tag, Picture* picture)
-        : m_tag(tag), m_picture(picture), m_session(tag->getSession()) {}
+        : m_tag(tag), m_picture(picture), m_generation(tag->getGeneration()) {}
 
     P<peru::CMemoryBlock> getData() const override {
         return fromTagBytes(isThere() ? getPictureBytes(*m_picture) : TagLib::ByteVector());
@@ -74,12 +74,12 @@ protected:
     const P<const Tag>& getTag() const { return m_tag; }
     virtual bool isHeld() const = 0; // the picture has not been removed from the open tag
 
-    bool isThere() const { return m_session == m_tag->getSession() && isHeld(); }
+    bool isThere() const { return m_generation == m_tag->getGeneration() && isHeld(); }
 
 private:
     P<const Tag> m_tag;
     Picture* m_picture;
-    uint32_t m_session;
+    uint32_t m_generation;
 };
 
 } // namespace filetag::taglib

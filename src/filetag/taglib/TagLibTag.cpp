@@ -21,7 +21,7 @@ void CTagLibTag::open() {
 }
 
 void CTagLibTag::close() {
-    ++m_session;
+    ++m_generation;
     dropTags();
     m_file.reset();
     m_stream.reset();

@@ -46,7 +46,7 @@ public:
     // Called by pictures, which write through to the tag: there is something to store.
     void markChanged() const { m_changed = true; }
     // Changes with every open() and close(), which end the validity of pictures.
-    uint32_t getSession() const { return m_session; }
+    uint32_t getGeneration() const { return m_generation; }
 
 protected:
     explicit CTagLibTag(const P<peru::IURI>& file) : m_uri(file) {}
@@ -67,7 +67,7 @@ private:
     P<peru::IURI> m_uri;
     std::unique_ptr<CTagLibIOStream> m_stream; // null after store; otherwise outlives m_file
     std::unique_ptr<TagLib::File> m_file;
-    uint32_t m_session = 0;
+    uint32_t m_generation = 0;
     mutable bool m_changed = false;
 };
 
