@@ -119,28 +119,28 @@ TEST(Mp3Tag, KeepsTheFramesOfOddTags) {
     std::vector<std::string> command{"frames"};
     for (const auto& entry : std::filesystem::directory_iterator(folder.path()))
         command.push_back(entry.path());
-    const auto before =
-        tests::judge(command, "odd_id3.py").get<std::vector<std::map<std::string, nlohmann::json>>>();
+    const auto read = [&command] {
+        return tests::judge(command, "odd_id3.py").get<std::vector<std::map<std::string, nlohmann::json>>>();
+    };
+    const auto before = read();
     ASSERT_GT(before.size(), 20u);
     for (size_t i = 0; i < before.size(); ++i) {
         SCOPED_TRACE(command[i + 1]);
         const std::string copy = command[i + 1] + ".all.mp3";
         std::filesystem::copy_file(command[i + 1], copy);
+        command.push_back(copy);
         const P<IFileTag> tag = open(command[i + 1]);
-        const auto has = [&](const char* frame) { return before[i].contains(frame); };
-        EXPECT_EQ(tests::text(tag->getArtist()), has("TPE1") ? "Artist" : "");
-        if (has("TDRC")) {
-            EXPECT_EQ(tests::text(tag->getYear()), "1999-04-01T13:05");
-        }
+        EXPECT_EQ(tests::text(tag->getArtist()), before[i].contains("TPE1") ? "Artist" : "");
+        EXPECT_EQ(tests::text(tag->getYear()), before[i].contains("TDRC") ? "1999-04-01T13:05" : "");
         tag->setTitle("New");
         tag->store();
         filetag::setTagField(toURI(copy), "TITLE", {newString("New")});
-        for (const std::string& file : {command[i + 1], copy}) {
-            auto after =
-                tests::judge({"frames", file}, "odd_id3.py")[0].get<std::map<std::string, nlohmann::json>>();
-            EXPECT_EQ(after["TIT2"][0], "New");
-            for (const auto& [key, value] : before[i]) EXPECT_EQ(after[key], value) << key;
-        }
+    }
+    auto after = read();
+    for (size_t i = 0; i < after.size(); ++i) {
+        SCOPED_TRACE(command[i + 1]);
+        EXPECT_EQ(after[i]["TIT2"][0], "New");
+        for (const auto& [key, value] : before[i % before.size()]) EXPECT_EQ(after[i][key], value) << key;
     }
 }
 
