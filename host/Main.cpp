@@ -360,6 +360,8 @@ int main(int argc, char** argv) {
         return app.exit(error) == 0 ? kExitSuccess : kExitUsage;
     }
 
+    // Other programs stop reading the fields of a WAV file at one of odd length without padding.
+    ::setenv("TONEWRIGHT_PAD_INFO", "1", 0);
     try {
         watchForCancel();
         CLibrary library;

@@ -71,10 +71,7 @@ P<IString> readString(IInStream& stream) {
         stream.read(buffer.get() + done, step);
         done += step;
     }
-    buffer.get()[size] = '\0';
-    P<IString> text = make<CString>(getUTF8CharEncoding(), buffer.get(), size, EStringStorage::adopt, true);
-    (void)buffer.release();
-    return text;
+    return CString::fromUTF8({reinterpret_cast<const char*>(buffer.get()), static_cast<size_t>(size)});
 }
 
 P<ISerializable> readObject(IDataInStream& stream, const P<ISerializable>& object) {

@@ -74,7 +74,8 @@ CTextFileReader::CTextFileReader(const P<ISeekableInStream>& stream) {
         // An incomplete last character is ignored.
         if (m_mark == ETextMark::utf16) size -= size % 2;
         if (m_mark == ETextMark::utf32) size -= size % 4;
-        m_text = make<CString>(encoding, bytes.data(), size);
+        m_text = m_mark == ETextMark::utf8 ? CString::fromUTF8(bytes)
+                                           : P<IString>(make<CString>(encoding, bytes.data(), size));
     } else {
         m_text = make<CCPString>(bytes.data(), size);
     }

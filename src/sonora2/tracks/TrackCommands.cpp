@@ -11,7 +11,9 @@ CTrackCommand::~CTrackCommand() = default;
 
 bool isMeantFor(const ITrackCommand& command, const P<peru::IString>& trackId) {
     const P<peru::IString> target = command.getCommandTarget();
-    return target->isEmpty() || target->equals(trackId);
+    // By bytes: malformed ids are neither empty nor equal to each other.
+    return target->getDataSize() == 0 ||
+           (trackId && peru::CString::toStdString(target) == peru::CString::toStdString(trackId));
 }
 
 CSkipToTimeCommand::CSkipToTimeCommand(double time) : CTrackCommand(kName, ""), m_time(time) {}

@@ -75,9 +75,9 @@ P<IString> CPathes::toPlatformPath(const P<IURI>& uri, bool forDisplay) {
 }
 
 P<IURI> CPathes::fromPlatformPath(const CStringArg& path) {
-    P<IString> bytes = CString::fromUTF8(CString::toStdString(path));
-    const char* scheme = bytes->getDataSize() > 0 && bytes->getData()[0] == '/' ? "file" : "";
-    return make<CURI>(scheme, "", "", "", bytes, "", "");
+    const std::string bytes = CString::toStdString(path);
+    const char* scheme = bytes.starts_with('/') ? "file" : "";
+    return make<CURI>(scheme, "", "", "", CString::fromUTF8(bytes), "", "");
 }
 
 P<IString> CPathes::join(const CStringArg& folder, const CStringArg& fileName) {
