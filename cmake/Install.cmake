@@ -63,10 +63,16 @@ install(
 set(PROJECT_DESCRIPTION \"${PROJECT_DESCRIPTION}\")
 set(LIBDIR \"${CMAKE_INSTALL_LIBDIR}\")
 set(INCLUDEDIR \"${CMAKE_INSTALL_INCLUDEDIR}\")
-configure_file(\"${PROJECT_SOURCE_DIR}/cmake/tonewright.pc.in\" \"${PROJECT_BINARY_DIR}/tonewright.pc\" @ONLY)"
+foreach(NAME tonewright tonewright-host)
+    set(LIBS -ltonewright)
+    if(NAME STREQUAL tonewright-host)
+        set(LIBS \"-ltonewright_host -ltonewright\")
+    endif()
+    configure_file(\"${PROJECT_SOURCE_DIR}/cmake/tonewright.pc.in\" \"${PROJECT_BINARY_DIR}/\${NAME}.pc\" @ONLY)
+endforeach()"
     COMPONENT development
 )
-install(FILES ${PROJECT_BINARY_DIR}/tonewright.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
+install(FILES ${PROJECT_BINARY_DIR}/tonewright.pc ${PROJECT_BINARY_DIR}/tonewright-host.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
 
 foreach(set tonewright-targets tonewright-plugin-support-targets)
     install(EXPORT ${set} NAMESPACE tonewright:: DESTINATION ${package_dir} COMPONENT development)

@@ -12,6 +12,7 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     peru/Object.h
     peru/P.h
     peru/collections/IEnum.h
+    peru/files/IFileReplacement.h
     peru/log/ILog.h
     peru/log/LogBase.h
     peru/media/Api.h
@@ -46,8 +47,10 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     sonora2/media/IAudioFormat.h
     sonora2/media/IAudioSource.h
     sonora2/media/IAudioStreamInfos.h
+    sonora2/media/IDiscardable.h
     sonora2/media/IFormat.h
     sonora2/media/IMediaDescription.h
+    sonora2/media/ISalvage.h
     sonora2/media/ISource.h
     sonora2/plugins/ISonoraPlugin.h
     sonora2/samplerateconverter/SampleRateConverter.h
@@ -57,6 +60,7 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     filetag/ICoverArt.h
     filetag/ICoverArtFileTag.h
     filetag/IFileTag.h
+    filetag/TagTransfer.h
 )
 
 # Headers of the library that plug-ins are built on.

@@ -148,7 +148,7 @@ TEST_F(Mix, TellsWhatIsWrong) {
 
     folder.write("good.xml", makeArrangement(good));
     EXPECT_NE(fail({"mix", "missing.xml", "-o", "out.wav"}).find("No such file"), std::string::npos);
-    EXPECT_NE(fail({"mix", "good.xml", "-o", "out.xyz"}).find("no plug-in writes .xyz"), std::string::npos);
+    EXPECT_NE(fail({"mix", "good.xml", "-o", "out.xyz"}).find("No plug-in writes .xyz"), std::string::npos);
     EXPECT_NE(fail({"mix", "good.xml", "-o", "a.wav"}).find("a.wav exists"), std::string::npos);
     EXPECT_NE(fail({"mix", "good.xml", "-o", "good.xml", "-f"}).find("same file"), std::string::npos);
     EXPECT_EQ(tonewright({"mix", "good.xml", "-o", "out.wav", "--bits", "24"}).exitCode, 2);

@@ -125,7 +125,7 @@ TEST_F(Record, RefusesWhatItCannotWrite) {
     } kCases[] = {
         {{"record", "-o", "old.wav"}, "old.wav: Exists (--force replaces it)"},
         {{"record", "-o", "none/out.wav"}, "The folder none does not exist"},
-        {{"record", "-o", "out.xyz"}, "out.xyz: no plug-in writes .xyz files"},
+        {{"record", "-o", "out.xyz"}, "out.xyz: No plug-in writes .xyz files"},
         {{"record", "-o", "out.mp3", "--rate", "96000"}, "out.mp3: "},
         {{"record", "-o", "out.wav", "--channels", "7"}, "out.wav: "},
         {{"record", "-o", "/proc/out.wav"}, "Could not create: No such file or directory\n"},

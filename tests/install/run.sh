@@ -30,6 +30,10 @@ done
 read -ra flags < <(PKG_CONFIG_SYSROOT_DIR=$work/root PKG_CONFIG_PATH=$libdir/pkgconfig \
     PKG_CONFIG_ALLOW_SYSTEM_CFLAGS=1 PKG_CONFIG_ALLOW_SYSTEM_LIBS=1 pkg-config --cflags --libs tonewright)
 quietly cc -std=c11 -Wall -Wextra -Werror "$source/host.c" -o "$work/by-pkg-config" "${flags[@]}" "-Wl,-rpath,$libdir"
+read -ra flags < <(PKG_CONFIG_SYSROOT_DIR=$work/root PKG_CONFIG_PATH=$libdir/pkgconfig \
+    PKG_CONFIG_ALLOW_SYSTEM_CFLAGS=1 PKG_CONFIG_ALLOW_SYSTEM_LIBS=1 pkg-config --cflags --libs tonewright-host)
+quietly cc -std=c11 -Wall -Wextra -Werror "$source/support.c" -o "$work/support" "${flags[@]}" "-Wl,-rpath,$libdir"
+quietly "$work/support"
 for project in "$source/host" "$source/cpp" "$examples/plugin"; do
     quietly "$cmake" -S "$project" -B "$work/$(basename "$project")" -G Ninja "-DCMAKE_PREFIX_PATH=$prefix" "-DEXAMPLES=$examples"
     quietly "$cmake" --build "$work/$(basename "$project")"

@@ -219,10 +219,12 @@ TEST_F(ExportReasons, FailedCalls_SayWhatIsWrong) {
              {"a.xyz", true, 44100, "No plug-in reads .xyz files"},
              {"a.xyz", false, 44100, "No plug-in writes .xyz files"},
              {"name", true, 44100, "No plug-in reads files without an extension"},
-             {"eight.wav", true, 44100, "eight.wav has 8 channels, which cannot be converted to 2"},
+             {"eight.wav", true, 44100,
+              "eight.wav has 8 channels and cannot be converted to 44100 Hz, 2 channels"},
              {"missing.flac", true, 44100, "missing.flac: No such file or directory"},
              {"a.mp3.part", false, 96000,
-              "No plug-in writes a.mp3 with 96000 Hz, 2 channels, 2 bytes per sample"},
+              "MP3 files hold 1 or 2 channels at 8, 11.025, 12, 16, 22.05, 24, 32, 44.1 or 48 kHz, not 2 "
+              "channels at 96000 Hz"},
          }) {
         log.take();
         const std::u16string uri = toUri(folder / c.name);

@@ -14,7 +14,7 @@ class CS16Decoder : public IDecoder {
 public:
     explicit CS16Decoder(const SMediaFile& file) : m_file(file) {}
 
-    SDecodedMedia open() override {
+    SDecodedMedia open(const SDecoderOptions&) override {
         m_input = openForReading(m_file);
         struct stat status {};
         if (::fstat(::fileno(m_input.get()), &status) != 0) failSystem("could not open", m_file, errno);
@@ -39,10 +39,7 @@ private:
 class CS16Encoder : public IEncoder {
 public:
     bool accepts(const SPcmFormat& format) const override { return format == kFormat; }
-    void open(COutputFile& file, const SEncoderSettings&) override {
-        m_output = &file;
-        file.commit();
-    }
+    void open(COutputFile& file, const SEncoderSettings&) override { m_output = &file; }
     void write(const uint8_t* pcm, int frames) override {
         m_output->write(pcm, static_cast<size_t>(frames) * kFrameBytes);
     }
