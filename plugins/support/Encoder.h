@@ -22,8 +22,8 @@ class IEncoder {
 public:
     virtual ~IEncoder() = default;
 
-    // Whether the codec supports this format; called once before a format object is returned. May throw the reason
-    // instead of returning false.
+    // Whether the codec supports this format; called once before a format object is returned. May throw the
+    // reason instead of returning false.
     virtual bool accepts(const SPcmFormat& format) const = 0;
     // Throws if the settings are invalid; the target file has not been touched then.
     virtual void open(COutputFile& file, const SEncoderSettings& settings) = 0;

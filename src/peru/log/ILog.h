@@ -25,7 +25,7 @@ struct SLogMessage {
     P<IString> source; // the component; may be empty
     P<IString> text;
     std::vector<P<IString>> extraLines;
-    int64_t time = -1; // milliseconds since 1970 UTC; -1 means now
+    int64_t time = -1;                 // milliseconds since 1970 UTC; -1 means now
     P<CException> exception = nullptr; // a copy of the exception that the text describes; usually empty
 };
 
