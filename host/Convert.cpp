@@ -71,8 +71,7 @@ std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) 
     return candidates;
 }
 
-// The format that the target can hold and that the user wants, and a source of it. A file that is converted
-// to its own format is opened once.
+// The format that the target can hold and that the user wants, and a source of it. The input is opened once.
 CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& temporary,
                                        const fs::path& output) {
     SSoundFile sound = openSoundFile(input);
@@ -87,18 +86,13 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
 
     SEnds ends;
     ends.format = requireFormat(m_library, temporary, samples, m_options, output, output.string());
-    if (samples == sound.samples) {
-        ends.source = std::move(sound.source);
-        if (m_options.salvage) TONEWRIGHT_Host_SetSalvage(ends.source.get(), 1);
-        return ends;
-    }
-    sound.source.reset();
     clearFailure();
-    ends.source = CHandle(m_library.CreateAudioSourceFromURI(toURI(input).c_str(), samples.rate,
-                                                             samples.channels, samples.bytesPerSample, 1));
-    if (!ends.source)
+    if (samples != sound.samples &&
+        TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels,
+                                        samples.bytesPerSample) != 1)
         throw std::runtime_error(takeFailure(
             "Cannot be converted from " + describe(sound.samples) + " to " + describe(samples), input));
+    ends.source = std::move(sound.source);
     if (m_options.salvage) TONEWRIGHT_Host_SetSalvage(ends.source.get(), 1);
     return ends;
 }

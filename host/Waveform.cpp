@@ -132,12 +132,9 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     const SSampleFormat samples = sound.samples;
     const double duration = sound.info.duration;
     // The library draws sounds of 16 bits only.
-    if (samples.bytesPerSample != 2) {
-        sound.source.reset();
-        sound.source = CHandle(library.CreateAudioSourceFromURI(toURI(options.input).c_str(), samples.rate,
-                                                                samples.channels, 2, 1));
-        if (!sound.source) throw std::runtime_error(takeFailure("It cannot be read", options.input));
-    }
+    clearFailure();
+    if (TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels, 2) != 1)
+        throw std::runtime_error(takeFailure("It cannot be read", options.input));
     const CHandle& source = sound.source;
 
     const double frames = duration * samples.rate;

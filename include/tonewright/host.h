@@ -122,6 +122,11 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_OpenMedia(const char16_t* uri, 
 /* The same facts about a source that exists, which is opened for that if needed and closed again. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetMediaInfo(TONEWRIGHT_Handle source, TONEWRIGHT_MediaInfo* info);
 
+/* Has a source of a file deliver another format, from its beginning. An open source stays open: the file is
+ * not opened again. 0 when the file cannot be converted to it, and for other sources. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetSourceFormat(TONEWRIGHT_Handle source, int32_t sampleRate,
+                                                       int32_t channelCount, int32_t bytesPerSample);
+
 /* Damaged parts of the file are replaced by silence of the same length instead of failing;
  * TONEWRIGHT_Host_TakeWarnings then says where. 0 for a source that cannot do that. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetSalvage(TONEWRIGHT_Handle source, int32_t salvage);

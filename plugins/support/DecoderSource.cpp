@@ -43,9 +43,7 @@ void CDecoderSource::open() {
     if (isOpened()) return;
     try {
         openDecoder();
-        m_producer = std::make_unique<CChunkProducer>(m_context, m_file, *m_decoder, m_media, m_delivered,
-                                                      getOptions());
-        restartAt(toFrame(m_startTime));
+        startProducer();
     } catch (...) {
         m_producer.reset();
         m_decoder->close(); // also after an open() that threw
@@ -146,11 +144,35 @@ void CDecoderSource::openDecoder() {
                        own.bytesPerSample <= 4 && m_media.frames >= 0;
     if (!sound)
         fail("%s: %d channels at %d Hz are no sound", m_file.getDisplayName(), own.channels, own.rate);
-    const auto choose = [](int wanted, int ownValue) { return wanted > 0 ? wanted : ownValue; };
-    m_delivered = {choose(m_wanted.rate, own.rate), choose(m_wanted.channels, own.channels),
-                   choose(m_wanted.bytesPerSample, own.bytesPerSample)};
+    chooseFormat(m_wanted);
+}
+
+// Zeros stand for the file's own values.
+void CDecoderSource::chooseFormat(const SPcmFormat& wanted) {
+    const SPcmFormat& own = m_media.format;
+    const auto choose = [](int value, int ownValue) { return value > 0 ? value : ownValue; };
+    const SPcmFormat delivered{choose(wanted.rate, own.rate), choose(wanted.channels, own.channels),
+                               choose(wanted.bytesPerSample, own.bytesPerSample)};
+    CChunkProducer::requireDeliverable(m_file, own, delivered);
+    m_delivered = delivered;
     m_total = CChunkProducer::countDelivered(m_media, m_delivered);
-    CChunkProducer::requireDeliverable(m_file, own, m_delivered);
+}
+
+void CDecoderSource::startProducer() {
+    m_producer =
+        std::make_unique<CChunkProducer>(m_context, m_file, *m_decoder, m_media, m_delivered, getOptions());
+    restartAt(toFrame(m_startTime));
+}
+
+void CDecoderSource::setDeliveredFormat(int sampleRate, int channelCount, int bytesPerSample) {
+    const SPcmFormat wanted{sampleRate, channelCount, bytesPerSample};
+    if (isOpened()) {
+        chooseFormat(wanted);
+        m_readAhead.reset();
+        m_decoder->seek(0); // where a new producer begins
+        startProducer();
+    }
+    m_wanted = wanted;
 }
 
 void CDecoderSource::requireOpened() const {

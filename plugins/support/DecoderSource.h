@@ -52,12 +52,15 @@ public:
     int getOwnSampleRate() override { return m_media.format.rate; }
     int getOwnChannelCount() override { return m_media.format.channels; }
     int getOwnBytesPerSample() override { return m_media.format.bytesPerSample; }
+    void setDeliveredFormat(int sampleRate, int channelCount, int bytesPerSample) override;
     P<peru::IString> takeWarnings() override;
 
 private:
     void openDecoder();
     SDecoderOptions getOptions() const;
     void requireOpened() const;
+    void chooseFormat(const SPcmFormat& wanted);
+    void startProducer();
     int64_t toFrame(double seconds) const;
     void restartAt(int64_t frame); // in delivered frames from the beginning of the file
 

@@ -73,6 +73,13 @@ SPicture fromPublic(const STagPicture& picture) {
             picture.colorCount};
 }
 
+PropertyMap fromPublic(const std::vector<STagField>& fields) {
+    PropertyMap result;
+    for (const STagField& field : fields)
+        for (const P<IString>& value : field.values) result.insert(toTagText(field.key), toTagText(value));
+    return result;
+}
+
 std::vector<SPicture> fromPublic(const std::vector<STagPicture>& pictures) {
     std::vector<SPicture> result;
     for (const STagPicture& picture : pictures) result.push_back(fromPublic(picture));
@@ -165,9 +172,7 @@ STags readAllTags(const P<IURI>& file) {
 }
 
 STransferReport writeAllTags(const P<IURI>& file, const STags& tags) {
-    PropertyMap fields;
-    for (const STagField& field : tags.fields)
-        for (const P<IString>& value : field.values) fields.insert(toTagText(field.key), toTagText(value));
+    const PropertyMap fields = fromPublic(tags.fields);
     const std::vector<SPicture> pictures = fromPublic(tags.pictures);
     CAnyTagFile target(file);
     STransferReport report = write(target, fields, &pictures);
@@ -201,29 +206,29 @@ std::vector<STagPicture> setTagPictures(const P<IURI>& file, const std::vector<S
     return std::move(report.lostPictures);
 }
 
-STransferReport transferTags(const P<IURI>& source, const P<IURI>& target) {
-    const CAnyTagFile from(source);
-    CAnyTagFile to(target);
-    PropertyMap carried = from.readFields();
+STransferReport addTags(const P<IURI>& file, const STags& tags) {
+    CAnyTagFile target(file);
+    PropertyMap carried = fromPublic(tags.fields);
     for (const char* key : kTechnical) carried.erase(key);
-    const StringList others = carried.unsupportedData();
     useCommonNames(carried);
-
-    PropertyMap fields = to.readFields();
+    PropertyMap fields = target.readFields();
     for (const auto& [key, values] : carried) fields.replace(key, values);
-    const std::vector<SPicture> carriedPictures = from.readPictures();
-    std::vector<SPicture> pictures = carriedPictures;
-    for (const SPicture& picture : to.readPictures())
-        if (std::none_of(pictures.begin(), pictures.end(),
+    std::vector<SPicture> pictures = fromPublic(tags.pictures);
+    const size_t carriedPictures = pictures.size();
+    for (const SPicture& picture : target.readPictures())
+        if (std::none_of(pictures.begin(), pictures.begin() + static_cast<std::ptrdiff_t>(carriedPictures),
                          [&](const SPicture& other) { return other.data == picture.data; }))
             pictures.push_back(picture);
 
-    STransferReport report = write(to, fields, &pictures);
-    for (const String& name : others)
-        if (!contains(kPictures, name) && !contains(kTechnical, name))
-            report.lostFields.push_back(fromTagText(name));
-    to.commit();
+    STransferReport report = write(target, fields, &pictures);
+    for (const P<IString>& name : tags.others)
+        if (!contains(kTechnical, toTagText(name))) report.lostFields.push_back(name);
+    target.commit();
     return report;
+}
+
+STransferReport transferTags(const P<IURI>& source, const P<IURI>& target) {
+    return addTags(target, readAllTags(source));
 }
 
 } // namespace filetag

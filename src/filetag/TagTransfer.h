@@ -61,8 +61,11 @@ FILETAG_API void setTagField(const P<peru::IURI>& file, const peru::CStringArg& 
 FILETAG_API std::vector<STagPicture> setTagPictures(const P<peru::IURI>& file,
                                                     const std::vector<STagPicture>& pictures);
 
-// Copies all fields and pictures. Fields and pictures that only the target has stay there; fields that
-// describe the encoding of the source, such as its encoder, are not copied.
+// Adds fields and pictures to those of the file. Fields of the same key are replaced; fields that describe
+// the encoding of another file, such as its encoder, are left out.
+FILETAG_API STransferReport addTags(const P<peru::IURI>& file, const STags& tags);
+
+// Adds all fields and pictures of one file to another.
 FILETAG_API STransferReport transferTags(const P<peru::IURI>& source, const P<peru::IURI>& target);
 
 } // namespace filetag

@@ -116,6 +116,17 @@ int32_t TONEWRIGHT_Host_GetMediaInfo(TONEWRIGHT_Handle source, TONEWRIGHT_MediaI
     });
 }
 
+int32_t TONEWRIGHT_Host_SetSourceFormat(TONEWRIGHT_Handle source, int32_t sampleRate, int32_t channelCount,
+                                        int32_t bytesPerSample) {
+    return guard(0, [&] {
+        if (sampleRate <= 0 || channelCount <= 0 || bytesPerSample <= 0 || bytesPerSample > 4)
+            throw peru::CError("The numbers are not a sound format");
+        require<IMediaDescription>(source, "a source of a file")
+            ->setDeliveredFormat(sampleRate, channelCount, bytesPerSample);
+        return 1;
+    });
+}
+
 int32_t TONEWRIGHT_Host_SetSalvage(TONEWRIGHT_Handle source, int32_t salvage) {
     return guard(0, [&] {
         require<ISalvage>(source, "a source that can be salvaged")->setSalvage(salvage != 0);

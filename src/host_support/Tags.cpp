@@ -1,6 +1,7 @@
 #include "filetag/FileTagFactory.h"
 #include "filetag/TagTransfer.h"
 #include "host_support/Guard.h"
+#include "sonora2/plugins/PluginExtensions.h"
 
 #include <algorithm>
 #include <vector>
@@ -42,16 +43,16 @@ SSource readSource(const P<peru::IURI>& file) {
     SSource source;
     try {
         source.all = filetag::readAllTags(file);
-        source.own = filetag::CFileTagFactory::get()->create(file);
-        if (source.own)
-            for (const auto& field : kFields) source.texts.push_back(((*source.own).*field.get)());
+        if (sonora2::common::getLookupKey(file, nullptr)->equals("wav"))
+            if (const P<IFileTag> own = filetag::CFileTagFactory::get()->create(file))
+                for (const auto& field : kFields) source.texts.push_back(((*own).*field.get)());
     } catch (const peru::CFileFormatNotSupportedError&) {
         // What was read until then is what there is.
     }
     return source;
 }
 
-// Stores fields that only the own tag classes know. Returns their keys.
+// Stores the fields of a WAVE file that TagLib has missed. Returns their keys.
 std::vector<std::string> complement(const SSource& source, const P<peru::IURI>& file) {
     std::vector<std::string> stored;
     const P<IFileTag> target = source.texts.empty() ? nullptr : filetag::CFileTagFactory::get()->create(file);
@@ -66,10 +67,10 @@ std::vector<std::string> complement(const SSource& source, const P<peru::IURI>& 
 }
 
 // Returns the names of what the target cannot hold.
-std::string writeTarget(const SSource& source, const P<peru::IURI>& from, const P<peru::IURI>& to) {
+std::string writeTarget(const SSource& source, const P<peru::IURI>& to) {
     std::vector<std::string> lost;
     try {
-        const filetag::STransferReport report = filetag::transferTags(from, to);
+        const filetag::STransferReport report = filetag::addTags(to, source.all);
         const std::vector<std::string> stored = complement(source, to);
         for (const P<IString>& field : report.lostFields) {
             const std::string name = CString::toStdString(field);
@@ -98,7 +99,7 @@ int32_t TONEWRIGHT_Host_CopyTags(const char16_t* source, const char16_t* target,
         const SSource tag = readSource(from);
         failure = -1;
         if (tag.isEmpty()) return 1;
-        const std::string names = writeTarget(tag, from, to);
+        const std::string names = writeTarget(tag, to);
         if (lost && !names.empty()) *lost = ::strdup(names.c_str());
         return 1;
     });

@@ -17,6 +17,9 @@ public:
     virtual int getOwnSampleRate() = 0;
     virtual int getOwnChannelCount() = 0;
     virtual int getOwnBytesPerSample() = 0;
+    // Has the source deliver another format from its start time on; open or closed, without opening the file
+    // again. Throws if the file cannot be converted to it.
+    virtual void setDeliveredFormat(int sampleRate, int channelCount, int bytesPerSample) = 0;
     // What was noticed while reading since the last call, one warning per line, such as clipping or damage
     // that was replaced by silence. Some are known only when the source has been closed.
     virtual P<peru::IString> takeWarnings() = 0;
