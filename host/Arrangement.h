@@ -1,4 +1,4 @@
-// Arrangements of an editor: XML files that tell which parts of which sounds are heard when.
+// An editor's arrangements: XML files that place parts of sound files on a time line.
 #pragma once
 
 #include "Library.h"
@@ -9,14 +9,14 @@
 
 namespace host {
 
-// By its extension.
+// Judged by the extension.
 bool isArrangement(const std::filesystem::path& file);
 
-// The text as the library takes it: media whose URI is relative are those beside the arrangement's file.
-// Throws std::runtime_error when it is no XML, or a track names no medium.
+// The text in the form that the library takes: relative URIs are resolved against the arrangement's folder.
+// Throws std::runtime_error if the file is not XML or a track has no URI.
 std::u16string readArrangement(const std::filesystem::path& file);
 
-// The closed source of it. Throws std::runtime_error, also when nothing in it would be heard.
+// Returns a closed source. Throws std::runtime_error, also if the arrangement's duration is 0.
 CHandle openArrangement(CLibrary& library, const std::filesystem::path& file, const SSampleFormat& samples);
 
 } // namespace host

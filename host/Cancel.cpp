@@ -24,9 +24,9 @@ void watchForCancel() {
     for (int signal : {SIGINT, SIGTERM, SIGHUP}) {
         struct sigaction old = {};
         sigaction(signal, nullptr, &old);
-        if (old.sa_handler != SIG_IGN) sigaction(signal, &action, nullptr); // as nohup wants it
+        if (old.sa_handler != SIG_IGN) sigaction(signal, &action, nullptr); // still ignored under nohup
     }
-    // Failures of writing are told where they happen; the temporary files go.
+    // The failed write is reported where it happens, and temporary files are removed.
     for (int ignored : {SIGPIPE, SIGXFSZ}) std::signal(ignored, SIG_IGN);
 }
 

@@ -1,4 +1,4 @@
-// The commands of the program. Each answers an exit code.
+// The commands of the program. Each returns an exit code.
 #pragma once
 
 #include "Library.h"
@@ -22,8 +22,8 @@ struct SFormatOptions {
 
 struct SConvertOptions : SFormatOptions {
     std::vector<std::filesystem::path> inputs;
-    std::filesystem::path output;    // of a single input
-    std::string extension;           // or one beside each input
+    std::filesystem::path output;    // for a single input
+    std::string extension;           // or one output beside each input
     std::filesystem::path directory; // ... or in this folder
     int jobs = 1;
     bool force = false;
@@ -54,15 +54,15 @@ struct SMixOptions : SFormatOptions {
 
 struct SRecordOptions : SFormatOptions {
     std::filesystem::path output;
-    std::string device; // its id; the default device where empty
-    double seconds = 0; // 0: until it is stopped
+    std::string device; // its id; empty for the default device
+    double seconds = 0; // 0: until stopped
     bool force = false;
     EOutput show = EOutput::normal;
 };
 
 struct SSetTagOptions {
     std::vector<std::filesystem::path> files;
-    std::map<std::string, std::u16string> fields; // by name; an empty text removes one
+    std::map<std::string, std::u16string> fields; // by name; an empty text removes the field
     bool json = false;
 };
 
@@ -77,8 +77,8 @@ int record(CLibrary& library, const SRecordOptions& options);
 int showTags(CLibrary& library, const std::vector<std::filesystem::path>& files, bool json);
 int setTags(CLibrary& library, const SSetTagOptions& options);
 
-// Does the job, which throws on failure, with each file, whatever became of those before. Whether there is
-// still something to do when the reader of standard output has left, the caller knows.
+// Runs the job for each file; the job throws on failure, which is reported and does not stop the others. With
+// EReader::needed the loop ends when the reader of standard output has closed it.
 enum class EReader { needed, optional };
 int forEachFile(const std::vector<std::filesystem::path>& files, bool json, EReader reader,
                 const std::function<void(const std::filesystem::path&)>& job);

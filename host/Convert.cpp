@@ -27,7 +27,7 @@ public:
         : m_library(library), m_options(options), m_progress(progress),
           m_temporaryEnding(setTemporaryEnding(library)) {}
 
-    // True when the file was made. Any thread.
+    // True if the file was written. Thread-safe.
     bool run(const fs::path& input, const fs::path& output);
 
 private:
@@ -49,7 +49,7 @@ private:
     std::string m_temporaryEnding;
 };
 
-// The wanted format first, then what most targets can hold. What the user asked for is never given up.
+// The preferred format first, then those that most targets can hold. Values set by the user never change.
 std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) const {
     std::vector<SSampleFormat> candidates;
     const auto add = [&](int rate, int channels, int bytes) {
@@ -58,7 +58,7 @@ std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) 
         if (std::find(candidates.begin(), candidates.end(), candidate) == candidates.end())
             candidates.push_back(candidate);
     };
-    // The next rate that a limited codec may take: upwards before downwards.
+    // Rates that a limited codec may accept: the next higher ones first, a lower one only if there are none.
     std::vector<int> rates{own.rate};
     for (int rate : {8000, 11025, 16000, 22050, 32000, 44100, 48000})
         if (rate > own.rate) rates.push_back(rate);
@@ -71,7 +71,7 @@ std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) 
     return candidates;
 }
 
-// The format that the target can hold and that the user wants, and a source of it. The input is opened once.
+// Creates a format that the target can hold, and a source that delivers it. The input is opened only once.
 CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& temporary,
                                        const fs::path& output) {
     SSoundFile sound = openSoundFile(input);
@@ -97,16 +97,16 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
     return ends;
 }
 
-// What the output's format cannot hold is left out, and the user hears of it. A tag that cannot be read does
-// not keep the sound from being converted.
+// Fields that the output's format cannot hold are omitted with a warning. A tag that cannot be read does not
+// fail the conversion.
 void CConverter::carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
                           CProgress::Job job) {
     clearFailure();
     char* lost = nullptr;
     const int32_t copied = TONEWRIGHT_Host_CopyTags(toURI(input).c_str(), toURI(temporary).c_str(), &lost);
     if (copied == 0)
-        return m_progress.warn(job,
-                               "The tag could not be read and is left out: " + takeFailure("unknown", input));
+        return m_progress.warn(job, "The tag could not be read and is not copied: " +
+                                        takeFailure("unknown", input));
     if (copied < 0) {
         std::string reason = takeFailure("unknown", temporary);
         replaceAll(reason, m_temporaryEnding, "");
@@ -116,7 +116,7 @@ void CConverter::carryTag(const fs::path& input, const fs::path& temporary, cons
     TONEWRIGHT_Host_Free(lost);
 }
 
-// What the decoder noticed.
+// Reports the decoder's warnings.
 void CConverter::warn(const CHandle& source, const fs::path& input, CProgress::Job job) {
     char* const lines = TONEWRIGHT_Host_TakeWarnings(source.get());
     if (!lines) return;
@@ -172,7 +172,7 @@ int convert(CLibrary& library, const SConvertOptions& options) {
 
     std::atomic<size_t> next{0};
     std::atomic<bool> failed{false};
-    // Which of several inputs has a target is not left to the threads.
+    // If several inputs have the same target, the first one gets it, whatever the order of the threads.
     std::vector<fs::path> outputs;
     std::vector<bool> isFirst;
     std::set<fs::path> taken;
@@ -184,7 +184,7 @@ int convert(CLibrary& library, const SConvertOptions& options) {
         for (size_t i; !isCancelled() && (i = next++) < options.inputs.size();) {
             if (!isFirst[i]) {
                 progress.fail(progress.start(options.inputs[i], outputs[i], nlohmann::json::object()),
-                              "Another input is converted to " + outputs[i].string() + " already");
+                              "Another input is already converted to " + outputs[i].string());
                 failed = true;
             } else if (!converter.run(options.inputs[i], outputs[i])) {
                 failed = true;
@@ -196,7 +196,7 @@ int convert(CLibrary& library, const SConvertOptions& options) {
     try {
         for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
     } catch (const std::system_error&) {
-        // The system has no more threads: those that are there do all the work.
+        // No more threads available: the existing ones do all the work.
     }
     work();
     for (std::thread& thread : others) thread.join();

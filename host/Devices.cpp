@@ -16,7 +16,7 @@ namespace host {
 
 namespace {
 
-// Passes on everything but the sound engine's own lines.
+// Writes everything except the sound engine's own lines to standard error.
 ssize_t writeUnlessEngines(void*, const char* data, size_t size) {
     if (std::string_view(data, size).starts_with("Expression '")) return static_cast<ssize_t>(size);
     for (size_t done = 0; done < size;) {
@@ -27,8 +27,8 @@ ssize_t writeUnlessEngines(void*, const char* data, size_t size) {
     return static_cast<ssize_t>(size);
 }
 
-// The engine also prints the source line of each error that it returns, on threads of its own, and has no
-// switch for that. The file descriptor itself stays as it is.
+// The engine also prints the source line of each error that it returns, on its own threads, and has no option
+// to turn that off. Only the stream is replaced, not the file descriptor.
 void hushEngine() {
     static FILE* const s_filter = [] {
         cookie_io_functions_t functions = {};
@@ -40,7 +40,7 @@ void hushEngine() {
     stderr = s_filter;
 }
 
-// A sound system that cannot be reached has no devices.
+// An unreachable sound system counts as a missing device.
 [[noreturn]] void throwUnreachable() {
     TONEWRIGHT_Failure failure = {};
     failure.size = sizeof failure;
@@ -89,9 +89,9 @@ void printNoDevice(const CNoDevice& failure) {
 }
 
 void requireOutDevice() {
-    // A file player needs no answer within milliseconds, and with the small latency that the device asks for,
-    // a busy machine causes gaps. A latency above one chunk of sound causes a gap at the beginning, and from
-    // 150 ms on the server reports a delay that is too short, so that the last samples may be cut off.
+    // Playing files does not need low latency, and with the low latency that the device requests, a busy
+    // machine causes gaps. A latency above one chunk of sound causes a gap at the beginning, and from 150 ms
+    // on the server reports a delay that is too short, so that the last samples may be cut off.
     ::setenv("PULSE_LATENCY_MSEC", "100", 0);
     const CDeviceList devices(TONEWRIGHT_DEVICE_OUTPUT);
     for (int32_t i = 0; i < devices.getCount(); ++i)

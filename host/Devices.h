@@ -11,12 +11,12 @@ namespace host {
 struct CNoDevice;
 void printNoDevice(const CNoDevice& failure);
 
-// There is no such device.
+// The device does not exist.
 struct CNoDevice : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-// Runs a command that needs a device. With JSON, a missing one is an event, too.
+// Runs a command that needs a device. With `json`, a missing device is also reported as an event.
 template <class Command> int needingDevice(bool json, Command command) {
     try {
         return command();
@@ -26,10 +26,10 @@ template <class Command> int needingDevice(bool json, Command command) {
     }
 }
 
-// Throws CNoDevice when there is nothing to play on.
+// Throws CNoDevice if there is no output device.
 void requireOutDevice();
 
-// The input device with that id, the default one for an empty id. Throws CNoDevice.
+// Opens the input device with that id, or the default one if the id is empty. Throws CNoDevice.
 CHandle openInDevice(const std::string& id);
 
 } // namespace host

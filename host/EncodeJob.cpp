@@ -28,13 +28,13 @@ int32_t onProgress(double fraction, void* user) {
     return running.stopped ? TONEWRIGHT_DISCARD : TONEWRIGHT_CONTINUE;
 }
 
-// Messages name the file that the user knows.
+// Messages name the target instead of the temporary file.
 std::string tellReason(const SEncodeFiles& files, const std::string& temporaryEnding) {
     std::string reason = takeFailure("The conversion failed");
     const fs::path absolute = fs::absolute(files.temporary);
     for (const std::string& shown : {absolute.lexically_normal().native(), absolute.native()})
         replaceAll(reason, shown, files.output.native());
-    replaceAll(reason, temporaryEnding, ""); // wherever the name is written in another way
+    replaceAll(reason, temporaryEnding, ""); // in case the message spells the path differently
     replaceAll(reason, "The file '" + files.output.native() + "' could not be written: ", "");
     return asReason(std::move(reason), files.input);
 }
@@ -72,7 +72,7 @@ bool encode(CLibrary& library, const CHandle& source, const CHandle& format, CPr
     SRunning running{progress, job};
     int32_t result = TONEWRIGHT_ENCODER_FAILED;
     {
-        // Making it opens the source for a moment, which may fail already.
+        // Creating the encoder opens the source briefly, which may already fail.
         const CHandle encoder(library.CreateAudioEncoder(source.get(), format.get()));
         if (encoder) {
             TONEWRIGHT_Host_SetEncoderProgress(encoder.get(), onProgress, &running);

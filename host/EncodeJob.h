@@ -1,4 +1,4 @@
-// What every command that writes a sound file does alike.
+// Shared by all commands that write sound files.
 #pragma once
 
 #include "Commands.h"
@@ -9,14 +9,14 @@
 
 namespace host {
 
-// What files are called behind their names while they are written; from now on the library knows it. For the
-// whole process.
+// Sets the library's suffix of files still being written, for the whole process, and returns it.
 std::string setTemporaryEnding(CLibrary& library);
 
-// Empty when the target cannot be written like this; the log has the reason, if there is more to it.
+// Empty if the target cannot be written in this format; takeFailure() then returns the reason, if one is
+// known.
 CHandle createFormat(CLibrary& library, const std::filesystem::path& temporary, const SSampleFormat& samples,
                      const SFormatOptions& options);
-// Throws std::runtime_error instead. `subject` is what the message calls the output.
+// The same, but throws std::runtime_error. `subject` is the name of the output in the message.
 CHandle requireFormat(CLibrary& library, const std::filesystem::path& temporary, const SSampleFormat& samples,
                       const SFormatOptions& options, const std::filesystem::path& output,
                       const std::string& subject);
@@ -27,8 +27,8 @@ struct SEncodeFiles {
     const std::filesystem::path& output;
 };
 
-// Reads the source to its end into the file of the format, telling how far it is. False when Ctrl-C ended it;
-// throws std::runtime_error with the reason, in which files are called as the user knows them.
+// Encodes the whole source and reports progress. False if Ctrl-C ended it. Throws std::runtime_error with the
+// reason, in which files have the names that the user gave.
 bool encode(CLibrary& library, const CHandle& source, const CHandle& format, CProgress& progress,
             CProgress::Job job, const SEncodeFiles& files, const std::string& temporaryEnding);
 

@@ -1,4 +1,4 @@
-// What the program reports to its caller.
+// Exit codes of the program.
 #pragma once
 
 namespace host {
@@ -7,7 +7,7 @@ enum EExitCode {
     kExitSuccess = 0,
     kExitFailure = 1, // at least one file failed
     kExitUsage = 2,
-    kExitNoDevice = 3,  // no sound device, or not the wanted one
+    kExitNoDevice = 3,  // no sound device, or not the requested one
     kExitNoLibrary = 4, // the library is missing or cannot be started
     kExitCancelled = 130,
 };

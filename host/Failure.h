@@ -1,4 +1,4 @@
-// Why a function of the library failed on this thread.
+// The reason why a function of the library failed on this thread.
 #pragma once
 
 #include <filesystem>
@@ -8,10 +8,10 @@ namespace host {
 
 void clearFailure();
 
-// The reason of the last failure as a sentence, with paths in place of URIs, or `unknown` where the library
-// gave none.
+// Returns the reason of the last failure as a sentence, with paths in place of URIs, or `unknown` if the
+// library reported none; and clears it.
 std::string takeFailure(const std::string& unknown);
-// The same as it reads behind the name of the file that it is about.
+// The same, worded to follow the name of the file concerned; see asReason().
 std::string takeFailure(const std::string& unknown, const std::filesystem::path& about);
 
 } // namespace host

@@ -1,4 +1,4 @@
-// The tag of a file, through the exports.
+// The tag of a file, accessed through the exported functions.
 #pragma once
 
 #include "Library.h"
@@ -17,22 +17,22 @@ struct STagField {
     decltype(CLibrary::FileTag_SetTitle) CLibrary::*set;
 };
 
-// In the order in which they are shown.
+// In display order.
 const std::vector<STagField>& getTagFields();
 
-// What a sound of more than 4 GB becomes: it is called WAV too, but has no place for a tag.
+// Whether this is an RF64 file, the form of WAV for more than 4 GB, which cannot hold a tag.
 bool isWideWav(const std::filesystem::path& file);
 
 class CFileTag {
 public:
-    // Throws std::runtime_error for a file whose tag cannot be read. False afterwards for a kind of file that
-    // has no tags.
+    // Throws std::runtime_error if the tag cannot be read. For file types without tags the object converts to
+    // false.
     CFileTag(CLibrary& library, const std::filesystem::path& file);
     explicit operator bool() const { return static_cast<bool>(m_tag); }
 
     std::u16string get(const STagField& field) const;
     void set(const STagField& field, const std::u16string& text);
-    // Once. Throws std::runtime_error with the file as it was.
+    // At most once. Throws std::runtime_error and leaves the file unchanged on failure.
     void store();
 
 private:

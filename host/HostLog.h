@@ -9,8 +9,8 @@ namespace host {
 
 class CHostLog {
 public:
-    // Prints to standard error what the library logs at `printLevel` (a TONEWRIGHT_LogLevel) or above, for as
-    // long as it lives.
+    // Prints the library's log messages of `printLevel` (a TONEWRIGHT_LogLevel) and above to standard error
+    // until the object is destroyed.
     CHostLog(CLibrary& library, int32_t printLevel);
     ~CHostLog();
     CHostLog(const CHostLog&) = delete;

@@ -15,11 +15,11 @@ namespace {
 
 constexpr std::array kSignals{SIGTSTP, SIGQUIT, SIGABRT, SIGSEGV, SIGBUS, SIGFPE, SIGILL};
 
-termios g_mode = {};                      // as it was
+termios g_mode = {};                      // the terminal's original mode
 volatile std::sig_atomic_t g_isTaken = 0; // the terminal is in our mode
 struct sigaction g_reactions[kSignals.size()];
 
-// From the background a change would halt the program.
+// Changing the mode from the background would suspend the program.
 bool isForeground() {
     return ::tcgetpgrp(STDIN_FILENO) == ::getpgrp();
 }
@@ -45,14 +45,15 @@ void take() {
     ::pthread_sigmask(SIG_SETMASK, &old, nullptr);
 }
 
-// Safe in a signal's handler.
+// Async-signal-safe.
 void giveBack() {
     if (!g_isTaken) return;
     g_isTaken = 0;
     if (isForeground()) setMode(g_mode);
 }
 
-// Does what would have happened without us, and, should the program go on, is there for the next time.
+// Restores the terminal and lets the signal take its original effect. If the program continues after that,
+// the handler is installed again.
 void onSignal(int signal) {
     const int error = errno;
     giveBack();
@@ -91,12 +92,12 @@ CKeyboard::~CKeyboard() {
 }
 
 char CKeyboard::wait(int milliseconds) {
-    take(); // after the program was halted, or came to the foreground
+    take(); // again after the program was suspended or came to the foreground
     pollfd input{STDIN_FILENO, POLLIN, 0};
     if (::poll(&input, g_isTaken ? 1 : 0, milliseconds) <= 0) return 0;
     char key = 0;
     if ((input.revents & POLLIN) != 0 && ::read(STDIN_FILENO, &key, 1) == 1) return key;
-    ::poll(nullptr, 0, milliseconds); // a terminal that has gone is ready for ever
+    ::poll(nullptr, 0, milliseconds); // poll() returns at once for a terminal that is gone
     return 0;
 }
 

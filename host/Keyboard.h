@@ -1,11 +1,11 @@
-// Single keys of the terminal.
+// Reads single keys from the terminal.
 #pragma once
 
 namespace host {
 
-// One at a time. While it lives, keys come without Return and are not shown, if standard input is a terminal
-// and this program in its foreground. The terminal's mode is restored at the end and by everything that ends
-// or halts the program before: Ctrl-C, Ctrl-Z, Ctrl-\ and crashes.
+// Only one object at a time. During its lifetime keys are read without Return and not echoed, if standard
+// input is a terminal and this program is in its foreground. The terminal's mode is restored by the
+// destructor and before anything ends or suspends the program: Ctrl-C, Ctrl-Z, Ctrl-\ and crashes.
 class CKeyboard {
 public:
     CKeyboard();
@@ -13,7 +13,7 @@ public:
     CKeyboard(const CKeyboard&) = delete;
     CKeyboard& operator=(const CKeyboard&) = delete;
 
-    // Waits that long for a key; 0 when there was none.
+    // Waits up to that time for a key; 0 if none was pressed.
     char wait(int milliseconds);
 };
 

@@ -11,8 +11,9 @@ namespace host {
 
 namespace {
 
-// In a build tree and in an installed one alike the library lies in the neighbouring folder. It is named in
-// full: whoever stands between this program and the loader (a sanitizer does) has a search path of its own.
+// In the build tree and in an installed tree alike, the library is in the neighbouring folder. The full path
+// is used because whatever is interposed between this program and the loader, such as a sanitizer, has its
+// own search path.
 std::string findLibrary() {
     if (const char* chosen = std::getenv("TONEWRIGHT_LIBRARY")) return chosen;
     std::error_code none;
@@ -25,7 +26,7 @@ std::string findLibrary() {
 } // namespace
 
 CLibrary::CLibrary() {
-    // Messages reach the user through the log; the library need not print them as well.
+    // Messages reach the user through the log, so the library does not print them as well.
     ::setenv("TONEWRIGHT_DEBUG_OUTPUT", "0", 0);
     m_module = ::dlopen(findLibrary().c_str(), RTLD_NOW | RTLD_LOCAL);
     if (!m_module) throw std::runtime_error(std::string("cannot load the library: ") + ::dlerror());

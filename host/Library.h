@@ -5,7 +5,7 @@
 
 namespace host {
 
-// Named as they are exported, without the prefix.
+// Names of the exports without their prefix.
 #define HOST_FUNCTIONS(X)                                                                                    \
     X(InitStartup)                                                                                           \
     X(DeInitAll)                                                                                             \
@@ -52,14 +52,15 @@ namespace host {
     X(FileTag_SetGenre)                                                                                      \
     X(FileTag_SetComment)
 
-// One at a time.
+// Only one object at a time.
 class CLibrary {
 public:
-    // Loads $TONEWRIGHT_LIBRARY where that is set, else the library this program was built or installed
-    // with. Throws std::runtime_error with the loader's reason.
+    // Loads $TONEWRIGHT_LIBRARY if that is set, otherwise the library with which this program was built or
+    // installed. Throws std::runtime_error with the loader's reason.
     CLibrary();
-    ~CLibrary(); // ends what start() started
-    // Apart from loading, so that a log can be there to hear of it. Throws std::runtime_error.
+    ~CLibrary(); // shuts the library down
+    // Initialises the library; separate from loading, so that a log can be added before. Throws
+    // std::runtime_error.
     void start();
     CLibrary(const CLibrary&) = delete;
     CLibrary& operator=(const CLibrary&) = delete;
@@ -72,7 +73,7 @@ private:
     void* m_module = nullptr;
 };
 
-// Ends its handle.
+// Owns a handle.
 class CHandle {
 public:
     CHandle() = default;

@@ -33,14 +33,14 @@ bool CLiveLine::isDue() const {
 
 void CLiveLine::update(const std::string& live, const std::string& plain, const nlohmann::json& details) {
     if (!isDue()) return;
-    // Not from the last time on: what came late is not made up for.
+    // Updates that were missed are not made up for.
     m_due = std::max(m_due + m_interval, Clock::now() + m_interval / 2);
     emit("progress", details);
     if (m_live) {
         const size_t columns = getTerminalColumns();
         const std::string line =
             fitColumns(toPrintable(m_file.filename().native()), std::min(kName, columns / 2)) + "  " + live;
-        // The last column stays free: some terminals would begin the next line.
+        // The last column stays empty: some terminals would wrap to the next line.
         std::fprintf(stderr, "\r%s\x1b[K", fitColumns(line, columns - 1).c_str());
         std::fflush(stderr);
         m_drawn = true;

@@ -1,4 +1,4 @@
-// What a user sees of sound that is played or recorded.
+// Shows the state of playback or of a recording.
 #pragma once
 
 #include "Progress.h"
@@ -10,21 +10,21 @@
 
 namespace host {
 
-// One file at a time; one thread. On a terminal its state is a line of standard error that is drawn anew,
-// elsewhere a line of standard output now and then; results go to standard output, failures to standard
-// error. With JSON everything is events on standard output.
+// One file at a time; one thread. On a terminal the state is a line of standard error that is redrawn;
+// otherwise it is printed to standard output from time to time. Results go to standard output, failures to
+// standard error. With JSON everything is printed to standard output as events.
 class CLiveLine {
 public:
-    // The key is what events call the file.
+    // `key` is the name of the file's property in events.
     CLiveLine(EOutput output, const char* key);
     ~CLiveLine() { erase(); }
     CLiveLine(const CLiveLine&) = delete;
     CLiveLine& operator=(const CLiveLine&) = delete;
 
-    // The details are those of the event, here and below.
+    // Here and below, `details` are additional properties of the event.
     void start(const std::filesystem::path& file, const nlohmann::json& details);
-    bool isDue() const; // whether the next update would show
-    // `live` is what the terminal's line says behind the name, `plain` what the plain one does.
+    bool isDue() const; // whether the next update would be shown
+    // `live` is shown after the file's name on a terminal, `plain` otherwise.
     void update(const std::string& live, const std::string& plain, const nlohmann::json& details);
     void finish(const std::string& plain, const nlohmann::json& details);
     void fail(const std::string& reason, const nlohmann::json& details = nlohmann::json::object());

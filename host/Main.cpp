@@ -1,5 +1,5 @@
-// tonewright: converts, plays, mixes and records sound files, tells about them, draws them and changes their
-// tags.
+// tonewright: converts, plays, mixes and records sound files, shows their properties, draws their waveforms
+// and changes their tags.
 #include "Cancel.h"
 #include "Commands.h"
 #include "Devices.h"
@@ -36,7 +36,7 @@ std::string isNumber(const std::string& text) {
     return std::isnan(std::strtod(text.c_str(), nullptr)) ? "is not a number" : "";
 }
 
-// The options that say what to write.
+// The options of the output format.
 void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& widths) {
     command.add_option("--rate", options.rate, "Sample rate in Hz")
         ->option_text("HZ")
@@ -64,12 +64,12 @@ void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& 
                         ->option_text("N")
                         ->transform(units)
                         ->check(bitRates);
-    command.add_option("--min-bitrate", options.minBitRate, "Least bits per second")
+    command.add_option("--min-bitrate", options.minBitRate, "Minimum bits per second")
         ->option_text("N")
         ->transform(units)
         ->check(bitRates)
         ->needs(bitRate);
-    command.add_option("--max-bitrate", options.maxBitRate, "Most bits per second")
+    command.add_option("--max-bitrate", options.maxBitRate, "Maximum bits per second")
         ->option_text("N")
         ->transform(units)
         ->check(bitRates)
@@ -86,17 +86,18 @@ void checkBitRates(const SFormatOptions& options) {
 // "--json" and "--quiet".
 void addOutput(CLI::App& app, EOutput& show) {
     auto* json = app.add_flag_callback(
-        "--json", [&] { show = EOutput::json; }, "Events as JSON, one a line");
+        "--json", [&] { show = EOutput::json; }, "Print events as JSON, one per line");
     app.add_flag_callback(
-           "-q,--quiet", [&] { show = EOutput::quiet; }, "Tell failures only")
+           "-q,--quiet", [&] { show = EOutput::quiet; }, "Print failures only")
         ->excludes(json);
 }
 
 void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
-        "convert", "Convert sound files. Rate, channels and width stay those of the input unless told\n"
-                   "otherwise or the target cannot hold them. Nothing is replaced without --force;\n"
-                   "a file that fails is told and the next one goes on.");
+        "convert",
+        "Convert sound files. Sample rate, channels and bits per sample stay those of the input unless\n"
+        "options change them or the target cannot hold them. Existing files are replaced only with\n"
+        "--force. A file that fails is reported and the next one is converted.");
     command->add_option("IN", options.inputs, "Files to convert")->required()->option_text("...");
     auto* output = command
                        ->add_option("-o,--output", options.output,
@@ -116,15 +117,15 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
     options.jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
     command
         ->add_option("-j,--jobs", options.jobs,
-                     "Files at a time; as many as the machine has cores unless told")
+                     "Files converted at a time (default: number of processor cores)")
         ->option_text("N")
         ->check(CLI::Range(1, 256));
     command->add_flag("-f,--force", options.force, "Replace existing files");
     command->add_flag("--salvage", options.salvage,
-                      "Replace damaged parts of the input by silence instead of failing");
+                      "Replace damaged parts of the input with silence instead of failing");
     command->add_flag_callback(
         "--no-tags", [&] { options.carryTags = false; },
-        "Leave title, artist and the other fields of tags behind");
+        "Do not copy title, artist and the other fields of tags");
     addOutput(*command, options.show);
     command->callback([&] {
         if (options.output.empty() == options.extension.empty())
@@ -139,27 +140,28 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
 }
 
 void addInfo(CLI::App& app, std::vector<std::filesystem::path>& files, bool& json, Run& run) {
-    CLI::App* command = app.add_subcommand("info", "Tell duration, rate, channels and width of sound files.");
-    command->add_option("FILE", files, "Files to look at")->required()->option_text("...");
-    command->add_flag("--json", json, "One JSON object a line");
+    CLI::App* command = app.add_subcommand(
+        "info", "Show duration, sample rate, channels and bits per sample of sound files.");
+    command->add_option("FILE", files, "Files to examine")->required()->option_text("...");
+    command->add_flag("--json", json, "Print one JSON object per line");
     command->callback([&] { run = [&](CLibrary& library) { return showInfo(library, files, json); }; });
 }
 
 void addFormats(CLI::App& app, bool& json, Run& run) {
     CLI::App* command = app.add_subcommand("formats", "List the file extensions that can be read.");
-    command->add_flag("--json", json, "One JSON object");
+    command->add_flag("--json", json, "Print one JSON object");
     command->callback([&] { run = [&](CLibrary& library) { return listFormats(library, json); }; });
 }
 
 void addWaveform(CLI::App& app, SWaveformOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
-        "waveform", "Draw a sound file as a PNG picture: peaks and, darker, their root mean square.");
+        "waveform", "Draw a sound file as a PNG image: peaks and, in a darker colour, the root mean square.");
     command->add_option("IN", options.input, "File to draw")->required()->option_text(" ");
     command->add_option("-o,--output", options.output, "PNG file to write")->required()->option_text("FILE");
-    command->add_option("--width", options.width, "Width in pixels, 1200 unless told")
+    command->add_option("--width", options.width, "Width in pixels (default: 1200)")
         ->option_text("N")
         ->check(CLI::Range(16, 32767));
-    command->add_option("--height", options.height, "Height in pixels, 300 unless told")
+    command->add_option("--height", options.height, "Height in pixels (default: 300)")
         ->option_text("N")
         ->check(CLI::Range(16, 32767));
     command->add_flag("-f,--force", options.force, "Replace an existing file");
@@ -168,7 +170,7 @@ void addWaveform(CLI::App& app, SWaveformOptions& options, Run& run) {
 
 void addDevices(CLI::App& app, bool& json, Run& run) {
     CLI::App* command = app.add_subcommand("devices", "List the sound devices that play and record.");
-    command->add_flag("--json", json, "One JSON object a line");
+    command->add_flag("--json", json, "Print one JSON object per line");
     command->callback(
         [&] { run = [&](CLibrary&) { return needingDevice(json, [&] { return listDevices(json); }); }; });
 }
@@ -176,8 +178,8 @@ void addDevices(CLI::App& app, bool& json, Run& run) {
 void addPlay(CLI::App& app, SPlayOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
         "play",
-        "Play sound files and arrangements (.xml) on the default device. Space pauses and goes on, q or\n"
-        "Ctrl-C stops; a file that fails is told and the next one goes on.");
+        "Play sound files and arrangements (.xml) on the default device. Space pauses and resumes, q or\n"
+        "Ctrl-C stops. A file that fails is reported and the next one is played.");
     command->add_option("FILE", options.files, "Files to play")->required()->option_text("...");
     addOutput(*command, options.show);
     command->callback([&] {
@@ -189,9 +191,10 @@ void addPlay(CLI::App& app, SPlayOptions& options, Run& run) {
 
 void addMix(CLI::App& app, SMixOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
-        "mix", "Mix an editor's arrangement into one sound file, with 44100 Hz and 2 channels unless told\n"
-               "otherwise. Media that it names by relative URIs are looked for beside it.");
-    command->add_option("ARRANGEMENT", options.input, "XML file that tells the tracks")
+        "mix",
+        "Mix an editor's arrangement into one sound file (default: 44100 Hz, 2 channels). Relative URIs\n"
+        "in it are resolved against its folder.");
+    command->add_option("ARRANGEMENT", options.input, "XML file that describes the tracks")
         ->required()
         ->option_text(" ");
     command->add_option("-o,--output", options.output, "File to write; its extension selects the format")
@@ -208,15 +211,16 @@ void addMix(CLI::App& app, SMixOptions& options, Run& run) {
 
 void addRecord(CLI::App& app, SRecordOptions& options, Run& run) {
     CLI::App* command = app.add_subcommand(
-        "record", "Record a sound file until q or Ctrl-C, with 44100 Hz, 2 channels and 16 bits unless told\n"
-                  "otherwise. It is written as FILE.part and named FILE at its end; a recording that is cut\n"
-                  "off, by a power failure or a kill, stays as FILE.part and plays once it is renamed.");
+        "record",
+        "Record a sound file until q or Ctrl-C is pressed (default: 44100 Hz, 2 channels, 16 bits). It is\n"
+        "written as FILE.part and renamed to FILE at the end. A recording that is cut off, by a power\n"
+        "failure or a kill, remains as FILE.part and plays once it is renamed.");
     command->add_option("-o,--output", options.output, "File to write; its extension selects the format")
         ->required()
         ->option_text("FILE");
     command->add_option("--device", options.device, "Device to record from, by its id in tonewright devices")
         ->option_text("ID");
-    command->add_option("--seconds", options.seconds, "Stop after that time")
+    command->add_option("--seconds", options.seconds, "Stop after that many seconds")
         ->option_text("S")
         ->check(CLI::Range(0.001, 1e9))
         ->check(isNumber);
@@ -236,13 +240,14 @@ void addTag(CLI::App& app, SSetTagOptions& options, std::vector<std::string>& cl
         "tag",
         "Show or change title, artist and the other fields of mp3, flac, ogg, wav, wma and asf files.");
     command->require_subcommand(1);
-    CLI::App* show = command->add_subcommand("show", "Tell the fields of tags.");
+    CLI::App* show = command->add_subcommand("show", "Show the fields of tags.");
     CLI::App* set = command->add_subcommand(
-        "set", "Change fields of tags. A file is written only when something changes in it, and then as a\n"
-               "whole; a file that fails is told and the next one goes on.");
+        "set",
+        "Change fields of tags. A file is written only if a field changes, and then completely or not at\n"
+        "all. A file that fails is reported and the next one is changed.");
     for (CLI::App* each : {show, set}) {
         each->add_option("FILE", options.files, "Files with tags")->required()->option_text("...");
-        each->add_flag("--json", options.json, "One JSON object a line");
+        each->add_flag("--json", options.json, "Print one JSON object per line");
     }
     std::vector<std::string> names{"all"};
     for (const STagField& field : getTagFields()) {
@@ -268,7 +273,7 @@ void addTag(CLI::App& app, SSetTagOptions& options, std::vector<std::string>& cl
         for (const STagField& field : getTagFields()) {
             const bool clears = std::find(cleared.begin(), cleared.end(), field.name) != cleared.end();
             if (clears && options.fields.count(field.name))
-                throw CLI::ValidationError("--clear", std::string(field.name) + " is also to be set");
+                throw CLI::ValidationError("--clear", std::string(field.name) + " cannot be set and cleared");
             if (clears || clearsAll) options.fields.try_emplace(field.name);
         }
         if (options.fields.empty()) throw CLI::RequiredError("A field to set or to clear");
@@ -276,8 +281,8 @@ void addTag(CLI::App& app, SSetTagOptions& options, std::vector<std::string>& cl
     });
 }
 
-// In the parser's order, which is from the last. "--title=" is given an empty text of its own: the parser
-// would take the next word for it.
+// In the parser's order, last argument first. "--title=" is split into the option and an empty value, since
+// the parser would otherwise take the next argument as the value.
 std::vector<std::string> splitArguments(int argc, char** argv) {
     std::vector<std::string> arguments;
     bool hasOptions = true;
@@ -292,7 +297,7 @@ std::vector<std::string> splitArguments(int argc, char** argv) {
     return arguments;
 }
 
-// What the commands themselves do not catch is no fault of the library.
+// Exceptions that the commands do not catch are failures of the job, not of loading the library.
 int runCommand(const Run& run, CLibrary& library) {
     try {
         const int code = run(library);
@@ -313,9 +318,10 @@ int runCommand(const Run& run, CLibrary& library) {
 } // namespace
 
 int main(int argc, char** argv) {
-    CLI::App app("Converts, plays, mixes and records sound files, tells about them, draws them and changes "
-                 "their tags.",
-                 "tonewright");
+    CLI::App app(
+        "Converts, plays, mixes and records sound files, shows their properties, draws their waveforms "
+        "and changes their tags.",
+        "tonewright");
     app.set_version_flag("--version", "tonewright " TONEWRIGHT_VERSION);
     app.require_subcommand(1);
     app.get_formatter()->column_width(28);
@@ -324,9 +330,9 @@ int main(int argc, char** argv) {
                    "Print the library's log from this level on: trace, debug, info, warning, error or off")
         ->option_text("LEVEL")
         ->transform(CLI::CheckedTransformer(kLogLevels, CLI::ignore_case).description(""));
-    app.footer("Exit codes: 0 all well, 1 a file failed, 2 wrong arguments, 3 no sound device, 4 the library "
-               "is missing, 130 "
-               "stopped by Ctrl-C.");
+    app.footer(
+        "Exit codes: 0 success, 1 a file failed, 2 invalid arguments, 3 no sound device, 4 the library "
+        "cannot be loaded or started, 130 stopped by Ctrl-C.");
 
     SConvertOptions convertOptions;
     SWaveformOptions waveformOptions;
@@ -347,10 +353,10 @@ int main(int argc, char** argv) {
     addMix(app, mixOptions, run);
     addRecord(app, recordOptions, run);
     addTag(app, tagOptions, clearedFields, run);
-    // Which word was wrong, the parser would not say.
+    // The parser's own message would not name the unknown command.
     const auto isMeant = [&](const CLI::App* command) { return command->check_name(argv[1]); };
     if (argc > 1 && argv[1][0] != '-' && app.get_subcommands(isMeant).empty()) {
-        std::fprintf(stderr, "No command is called %s\nRun with --help for more information.\n",
+        std::fprintf(stderr, "Unknown command: %s\nRun with --help for more information.\n",
                      toPrintable(argv[1]).c_str());
         return kExitUsage;
     }

@@ -32,7 +32,7 @@ COutput::COutput(const std::filesystem::path& target, const std::string& suffix,
 void COutput::commit() {
     clearFailure();
     if (TONEWRIGHT_Host_CommitOutput(m_output.get()) != 1)
-        throw std::runtime_error(takeFailure("The result cannot be given its name"));
+        throw std::runtime_error(takeFailure("The result could not be saved"));
 }
 
 void COutput::keep() {

@@ -1,4 +1,4 @@
-// Where a result goes: a file that appears complete or not at all.
+// An output file that appears complete or not at all.
 #pragma once
 
 #include "Library.h"
@@ -9,21 +9,22 @@
 namespace host {
 
 enum class EGrowth {
-    hidden, // nothing is seen before the end
-    live,   // what a killed run has written stays under the temporary name
+    hidden, // the temporary file is empty until the result is complete
+    live,   // the temporary file grows, and remains if the process is killed
 };
 
 class COutput {
 public:
-    // Throws std::runtime_error when the target exists and is not to be replaced, or cannot be replaced, and
-    // for a temporary file that an earlier run has left, unless it may be replaced too.
+    // Throws std::runtime_error if the target exists and `replace` is false, if it cannot be replaced, and if
+    // an earlier run has left a temporary file, unless `replace` is true.
     COutput(const std::filesystem::path& target, const std::string& suffix, bool replace,
             EGrowth growth = EGrowth::hidden);
 
     const std::filesystem::path& getTemporary() const { return m_temporary; }
-    // Makes the file durable and gives it its name; a file that was there keeps its mode. Throws.
+    // Writes the file to the disk and renames it to the target; a replaced file's mode is preserved. Throws
+    // std::runtime_error.
     void commit();
-    // Leaves the temporary file, which the destructor otherwise removes.
+    // Keeps the temporary file, which the destructor would otherwise remove.
     void keep();
 
 private:

@@ -41,8 +41,8 @@ void onPlayer(double duration, double position, int32_t state, void* user) {
     shared.state = state;
 }
 
-// Every thread that has to do with a player shares this. A stop that meets a player whose playing fails takes
-// ten seconds: nobody waits for that thread.
+// Shared by all threads that use the player. Stopping a player that is failing at the same time takes ten
+// seconds; that thread is not waited for.
 class CSession {
 public:
     CSession(CLibrary& library, CHandle player) : m_library(library), m_player(std::move(player)) {
@@ -62,7 +62,7 @@ public:
         clearFailure();
         m_failed = m_library.Player_Play(m_player.get()) != TONEWRIGHT_OK;
         if (m_failed) {
-            m_reason = takeFailure("It cannot be played");
+            m_reason = takeFailure("The file cannot be played");
             TONEWRIGHT_Host_SetPlayerProgress(m_player.get(), nullptr, nullptr);
         }
         m_ended = true;
@@ -73,7 +73,7 @@ public:
     bool hasFailed() const { return m_failed; }
     const std::string& getReason() const { return m_reason; }
 
-    // Before playing has begun there is nothing to pause.
+    // Ignored before playback has begun.
     void togglePause() {
         if (hasBegun() && !m_ended) m_library.Player_Pause(m_player.get());
     }
@@ -105,7 +105,7 @@ private:
     CLibrary& m_library;
     CKeyboard m_keyboard;
     CLiveLine m_line;
-    bool m_stopped = false; // by its key
+    bool m_stopped = false; // by the q key
 };
 
 void CJukebox::show(const SState& state) {
@@ -117,8 +117,8 @@ void CJukebox::show(const SState& state) {
         {{"position", position}, {"duration", duration}, {"state", isPaused ? "paused" : "playing"}});
 }
 
-// Stopping waits for the playing thread, which may take a while: it has a thread of its own where there is
-// one.
+// Stopping waits for the playing thread, which may take a while, so it runs on its own thread unless none can
+// be created.
 std::thread startStopper(const std::shared_ptr<CSession>& session) {
     try {
         return std::thread([session] { session->stop(); });
@@ -128,14 +128,14 @@ std::thread startStopper(const std::shared_ptr<CSession>& session) {
     }
 }
 
-// Shows and obeys until playing has ended.
+// Shows the state and handles keys until playback has ended.
 void CJukebox::watch(const std::shared_ptr<CSession>& session) {
     std::thread stopper;
     while (!session->hasEnded()) {
         const char key = m_keyboard.wait(kPollMilliseconds);
         m_stopped = m_stopped || key == 'q' || key == 'Q';
         if (key == ' ') session->togglePause();
-        // A player that has not begun yet would not hear it.
+        // A stop before playback has begun would have no effect.
         const bool hasBegun = session->hasBegun();
         if (isStopped() && hasBegun && !stopper.joinable()) stopper = startStopper(session);
         if (hasBegun && m_line.isDue()) show(session->getState());
@@ -152,12 +152,12 @@ CHandle CJukebox::makePlayer(const fs::path& file) {
     if (!isArrangement(file)) {
         clearFailure();
         CHandle player(m_library.CreatePlayerFromURI(toURI(file).c_str()));
-        if (!player) throw std::runtime_error(takeFailure("It cannot be played", file));
+        if (!player) throw std::runtime_error(takeFailure("The file cannot be played", file));
         return player;
     }
     const CHandle source = openArrangement(m_library, file, SSampleFormat());
     CHandle player(m_library.CreatePlayerFromAudioSource(source.get()));
-    if (!player) throw std::runtime_error(takeFailure("It cannot be played", file));
+    if (!player) throw std::runtime_error(takeFailure("The file cannot be played", file));
     return player;
 }
 

@@ -1,4 +1,4 @@
-// What a user sees of running jobs.
+// Shows the progress of jobs.
 #pragma once
 
 #include <chrono>
@@ -11,20 +11,20 @@
 namespace host {
 
 enum class EOutput {
-    normal, // bars on a terminal, else plain lines
+    normal, // bars on a terminal, otherwise plain lines
     quiet,  // failures only
-    json,   // one event a line on standard output
+    json,   // one event per line on standard output
 };
 
 struct SJobResult {
     double duration = 0; // seconds of sound
-    double elapsed = 0;  // seconds it took
+    double elapsed = 0;  // seconds of processing
     uint64_t bytes = 0;
     std::string codec;
 };
 
-// Any thread. Bars go to standard error, results to standard output, failures and warnings to standard error;
-// with JSON everything goes to standard output.
+// Thread-safe. Results go to standard output; bars, failures and warnings go to standard error. With JSON
+// everything goes to standard output.
 class CProgress {
 public:
     explicit CProgress(EOutput output);
@@ -35,7 +35,7 @@ public:
               const nlohmann::json& details);
     void advance(Job job, double fraction);
     void finish(Job job, const SJobResult& result);
-    // Something was left out; the job goes on.
+    // Reports a problem that does not end the job.
     void warn(Job job, const std::string& reason);
     void fail(Job job, const std::string& reason);
     void cancel(Job job);
@@ -60,7 +60,7 @@ private:
 
     EOutput m_output;
     bool m_bars;
-    std::mutex m_mutex; // guards all below and both streams
+    std::mutex m_mutex; // guards the members below and both streams
     std::vector<SJob> m_jobs;
     size_t m_drawn = 0; // lines of bars on the screen
     Clock::time_point m_lastDrawn;
@@ -68,7 +68,7 @@ private:
 
 size_t getTerminalColumns(); // of standard error
 
-// Names need not be valid UTF-8: what is not becomes U+FFFD.
+// Serialises the value as one line. Bytes that are not valid UTF-8, as in file names, become U+FFFD.
 std::string toLine(const nlohmann::json& value);
 
 } // namespace host

@@ -26,18 +26,18 @@ namespace {
 constexpr int kPollMilliseconds = 50;
 constexpr const char* kTemporaryEnding = ".part";
 
-// What the device's thread and the one that watches share.
+// Shared by the device's thread and the thread that shows the state.
 struct SState {
-    std::atomic<double> start{-1}; // the device's time of the first block; below 0: none has come yet
+    std::atomic<double> start{-1}; // the device's time of the first block; negative before it
     std::atomic<double> position{0};
-    std::atomic<double> left{0}; // greatest level since it was last read
+    std::atomic<double> left{0}; // peak level since last read
     std::atomic<double> right{0};
     std::atomic<bool> isStopped{false};
     double limit = 0; // seconds; 0: none
 };
 
-// The device's time counts from its start, which the first block follows later: the length of the recording
-// counts from that block.
+// The device's time starts before the first block arrives; the length of the recording is measured from that
+// block.
 int32_t onRecorded(double time, void* user) {
     auto& state = *static_cast<SState*>(user);
     if (state.start < 0) state.start = time;
@@ -48,7 +48,7 @@ int32_t onRecorded(double time, void* user) {
 }
 
 void onLevels(double left, double right, void* user) {
-    // Only this thread raises them, so that at worst a level read in between is lost.
+    // Only this thread raises the levels, so at worst a reset between the two steps is lost.
     auto& state = *static_cast<SState*>(user);
     state.left = std::max<double>(state.left, left);
     state.right = std::max<double>(state.right, right);
@@ -75,8 +75,8 @@ public:
         m_state.limit = options.seconds;
     }
 
-    // Returns when the user or the limit ended it. Throws std::runtime_error for any other end and when the
-    // file must not be written; what was recorded until then stays.
+    // Returns when the user or the limit has ended the recording. Throws std::runtime_error if it ends in any
+    // other way, in which case the part recorded so far is kept, and if the file cannot be written.
     void run(const CHandle& device);
 
 private:
@@ -111,7 +111,7 @@ CHandle CRecorder::openSource(const CHandle& device) {
                              (reason.empty() ? "" : ": " + reason));
 }
 
-// Shows the recording and obeys keys until it has ended.
+// Shows the state and handles keys until the recording has ended.
 void CRecorder::watch(const std::atomic<bool>& hasEnded, const COutput& place) {
     CKeyboard keyboard;
     while (!hasEnded) {
@@ -127,10 +127,10 @@ void CRecorder::watch(const std::atomic<bool>& hasEnded, const COutput& place) {
     }
 }
 
-// Returns when the device delivers no more and everything that it delivered is in the file.
+// Returns when the recording has ended and everything that the device delivered is in the file.
 void CRecorder::encode(const CHandle& source, const COutput& place) {
     const CHandle format =
-        requireFormat(m_library, place.getTemporary(), m_samples, m_options, m_options.output, "It");
+        requireFormat(m_library, place.getTemporary(), m_samples, m_options, m_options.output, "The file");
     const CHandle encoder(m_library.CreateAudioEncoder(source.get(), format.get()));
     int32_t result = TONEWRIGHT_ENCODER_FAILED;
     std::string reason;
@@ -149,20 +149,20 @@ void CRecorder::encode(const CHandle& source, const COutput& place) {
 void CRecorder::finish(COutput& place) {
     const double position = m_state.position;
     const bool wasWanted = m_state.isStopped || (m_state.limit > 0 && position >= m_state.limit);
-    if (!wasWanted && m_state.start < 0) throw std::runtime_error("The sound device delivers nothing");
+    if (!wasWanted && m_state.start < 0) throw std::runtime_error("The sound device delivers no sound");
     const uint64_t bytes = countBytes(place);
     place.commit();
     if (!wasWanted)
-        throw std::runtime_error("The sound device stopped; what was recorded until then, " +
-                                 formatDuration(position) + ", is there");
+        throw std::runtime_error("The sound device stopped; the recording up to that point, " +
+                                 formatDuration(position) + ", was saved");
     const std::string codec = codecName(m_options.output);
     m_line.finish(codec + ", " + formatDuration(position) + ", " + formatSize(bytes),
                   {{"codec", codec}, {"duration", position}, {"bytes", bytes}});
 }
 
-// An earlier recording that was cut off is removed once it is certain that this one runs.
+// With --force, the remains of an earlier recording are removed only once this one can start.
 void CRecorder::run(const CHandle& device) {
-    requireFormat(m_library, m_options.output, m_samples, m_options, m_options.output, "It");
+    requireFormat(m_library, m_options.output, m_samples, m_options, m_options.output, "The file");
     if (!m_options.force) COutput(m_options.output, kTemporaryEnding, false, EGrowth::live).keep();
     const CHandle source = openSource(device);
     COutput place(m_options.output, kTemporaryEnding, m_options.force, EGrowth::live);
@@ -172,17 +172,17 @@ void CRecorder::run(const CHandle& device) {
         isOver = true;
         finish(place);
     } catch (const std::runtime_error& failure) {
-        // Nobody can make the same sound again.
+        // A recording cannot be repeated, so whatever exists of it is kept.
         std::error_code none;
         if (m_state.start < 0 || !fs::exists(place.getTemporary(), none) || countBytes(place) == 0) throw;
         place.keep();
         throw std::runtime_error(std::string(failure.what()) +
-                                 (isOver ? "; the recording is in " : "; what was recorded is in ") +
+                                 (isOver ? "; the recording is in " : "; the part recorded so far is in ") +
                                  place.getTemporary().string());
     }
 }
 
-// The file is named before the reason already.
+// The line already names the file before the reason.
 std::string toReason(const std::string& message, const fs::path& output) {
     const std::string name = output.string() + " ";
     return message.starts_with(name) ? asReason(message.substr(name.size()), output) : message;

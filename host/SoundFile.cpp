@@ -28,7 +28,7 @@ SSoundFile openSoundFile(const fs::path& file) {
     sound.info.size = sizeof sound.info;
     clearFailure();
     sound.source = CHandle(TONEWRIGHT_Host_OpenMedia(toURI(file).c_str(), &sound.info));
-    if (!sound.source) throw std::runtime_error(takeFailure("It cannot be read", file));
+    if (!sound.source) throw std::runtime_error(takeFailure("The file cannot be read", file));
     sound.samples = {sound.info.sampleRate, sound.info.channelCount, sound.info.bytesPerSample};
     return sound;
 }

@@ -1,4 +1,4 @@
-// The sound files that the program reads.
+// Input files.
 #pragma once
 
 #include "Library.h"
@@ -20,7 +20,7 @@ struct SSampleFormat {
 // "44100 Hz, 2 channels and 16 bits"
 std::string describe(const SSampleFormat& samples);
 
-// A file as its plug-in sees it: an open source that converts nothing.
+// A file opened in its own format: the source is open and converts nothing.
 struct SSoundFile {
     CHandle source;
     SSampleFormat samples;
@@ -30,15 +30,15 @@ struct SSoundFile {
 // Throws std::runtime_error with the reason.
 SSoundFile openSoundFile(const std::filesystem::path& file);
 
-// Throws std::runtime_error with the reason when this is not a regular file with something in it.
+// Throws std::runtime_error with the reason unless this is a readable regular file that is not empty.
 void checkInput(const std::filesystem::path& file);
 
 bool isSameFile(const std::filesystem::path& a, const std::filesystem::path& b);
 
-// ".xyz files", as a part of a message.
+// ".xyz files", for messages.
 std::string describeKind(const std::filesystem::path& file);
 
-// The name of the codec of an extension.
+// Names the codec by the file's extension.
 std::string codecName(const std::filesystem::path& file);
 
 } // namespace host

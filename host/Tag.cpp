@@ -42,7 +42,7 @@ void show(CLibrary& library, const fs::path& file, bool json) {
     std::printf("%s\n%s", toPrintable(file.native()).c_str(), lines.empty() ? "  (empty)\n" : lines.c_str());
 }
 
-// Whether the file was written: one that has all this already is left alone.
+// Returns whether the file was written; a file that already has these values is not.
 bool change(CLibrary& library, const fs::path& file, const SSetTagOptions& options) {
     CFileTag tag = openTag(library, file);
     bool changed = false;
@@ -50,9 +50,9 @@ bool change(CLibrary& library, const fs::path& file, const SSetTagOptions& optio
         const auto wanted = options.fields.find(field.name);
         if (wanted == options.fields.end() || tag.get(field) == wanted->second) continue;
         tag.set(field, wanted->second);
-        // Half of what was asked for is not written.
+        // If one field cannot be set, none is written.
         if (tag.get(field).empty() && !wanted->second.empty())
-            throw std::runtime_error("No " + std::string(field.title) + " can be kept in " +
+            throw std::runtime_error("No " + std::string(field.title) + " can be stored in " +
                                      describeKind(file));
         changed = true;
     }

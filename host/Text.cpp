@@ -89,7 +89,7 @@ std::string withPaths(std::string_view message) {
                 std::string_view("%:@&=+$,;!*'()").find(message[0]) != std::string_view::npos)) {
             const bool escaped = message[0] == '%' && message.size() > 2 && hexDigit(message[1]) >= 0 &&
                                  hexDigit(message[2]) >= 0;
-            // A quote, a colon or a bracket behind the name belongs to the sentence.
+            // A quote, a colon or a bracket after the name belongs to the sentence.
             if (!escaped && std::string_view("':,;)").find(message[0]) != std::string_view::npos &&
                 (message.size() == 1 || !isPlain(static_cast<unsigned char>(message[1]))))
                 break;
@@ -102,7 +102,7 @@ std::string withPaths(std::string_view message) {
 }
 
 std::string fitColumns(std::string text, size_t columns) {
-    // Cut at a character: continuation bytes take no column.
+    // Cut between characters: continuation bytes take no column.
     const auto continues = [&](size_t at) { return at < text.size() && (text[at] & 0xC0) == 0x80; };
     size_t taken = 0, cut = 0;
     for (; cut < text.size() && (taken < columns || continues(cut)); ++cut) taken += !continues(cut);

@@ -1,4 +1,4 @@
-// Texts across the boundary.
+// Conversion and formatting of text.
 #pragma once
 
 #include <filesystem>
@@ -8,28 +8,27 @@
 
 namespace host {
 
-// The "file:" URI of a path, which need not be valid UTF-8; a relative path counts from the current folder.
+// The "file:" URI of a path, which need not be valid UTF-8; relative paths start at the current folder.
 std::u16string toURI(const std::filesystem::path& path);
-// Empty for bytes that are not UTF-8.
+// Empty if the text is not valid UTF-8.
 std::optional<std::u16string> toUTF16(const std::string& utf8);
 // Unpaired surrogates become U+FFFD.
 std::string toUTF8(const char16_t* text);
-// For a line on a terminal: control characters, those from U+0080 to U+009F included, are shown as \xNN.
+// Escapes control characters, including U+0080 to U+009F, as \xNN, for output to a terminal.
 std::string toPrintable(std::string_view text);
-// "file:" URIs within a message as the paths they stand for.
+// Replaces "file:" URIs in a message by paths.
 std::string withPaths(std::string_view message);
-// A plug-in's reason as it reads behind the name of the file that it is about: that name is not told twice.
+// Rewords a reason that is shown after the name of the file concerned, so that it does not repeat the name.
 std::string asReason(std::string message, const std::filesystem::path& about);
-// Cut, or filled with blanks, to so many columns of a terminal.
+// Cuts the text, or pads it with spaces, to that number of terminal columns.
 std::string fitColumns(std::string text, size_t columns);
 void replaceAll(std::string& text, const std::string& what, const std::string& with);
 
-// Of what was printed to standard output. False when its reader has left; throws std::runtime_error when it
-// cannot be written.
+// Flushes standard output. False if its reader has closed it; throws std::runtime_error for other errors.
 bool flushOutput();
-// The same for events in the middle of a job: a failure is kept for requireOutput. Any thread.
+// The same for events during a job: the first error is stored for requireOutput. Thread-safe.
 void flushEvents();
-// Throws std::runtime_error when events could not be written, unless their reader has left.
+// Throws std::runtime_error if events could not be written, unless their reader has closed the output.
 void requireOutput();
 
 std::string formatDuration(double seconds); // 1:02:03.4

@@ -28,11 +28,11 @@ struct SColour {
 constexpr SColour kBackground{255, 255, 255}, kAxis{200, 205, 212}, kPeak{116, 160, 214},
     kLoudness{33, 84, 150};
 
-// Steps for each column of the picture; the library delivers them in blocks of a hundred, and drops what
-// does not fill the last one.
+// Steps per column of the picture; the library delivers them in blocks of 100 and drops an incomplete last
+// block.
 constexpr int kStepsPerColumn = 200;
 
-// What one column of one channel shows.
+// One column of one channel.
 struct SColumn {
     float low = 0;
     float high = 0;
@@ -52,7 +52,7 @@ struct SWave {
     int width;
     double stepsPerColumn;
     size_t steps = 0;
-    std::vector<SColumn> columns; // channel after channel
+    std::vector<SColumn> columns; // grouped by channel
 
     size_t indexOf(int channel, int column) const {
         return static_cast<size_t>(channel) * static_cast<size_t>(width) + static_cast<size_t>(column);
@@ -91,7 +91,7 @@ public:
         image.format = PNG_FORMAT_RGB;
         const std::unique_ptr<FILE, int (*)(FILE*)> stream(std::fopen(file.c_str(), "wbe"), std::fclose);
         errno = stream ? 0 : errno;
-        // The system's reason tells more than "Write Error".
+        // The system's reason is more specific than "Write Error".
         if (!stream || !png_image_write_to_stdio(&image, stream.get(), 0, m_pixels.data(), 0, nullptr) ||
             std::fflush(stream.get()) != 0)
             throw std::runtime_error(errno ? std::strerror(errno) : image.message);
@@ -103,7 +103,7 @@ private:
     std::vector<SColour> m_pixels;
 };
 
-// One strip for each channel: peaks in a light colour, the root mean square over them in a dark one.
+// One strip per channel: the peaks in a light colour, and over them the root mean square in a dark one.
 CPicture draw(const SWave& wave, int height) {
     CPicture picture(wave.width, height);
     for (int channel = 0; channel < wave.channels; ++channel) {
@@ -131,10 +131,10 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     SSoundFile sound = openSoundFile(options.input);
     const SSampleFormat samples = sound.samples;
     const double duration = sound.info.duration;
-    // The library draws sounds of 16 bits only.
+    // The library delivers waveforms of 16-bit sound only.
     clearFailure();
     if (TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels, 2) != 1)
-        throw std::runtime_error(takeFailure("It cannot be read", options.input));
+        throw std::runtime_error(takeFailure("The file cannot be read", options.input));
     const CHandle& source = sound.source;
 
     const double frames = duration * samples.rate;
@@ -142,7 +142,7 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
         std::max(std::floor(frames / (static_cast<double>(options.width) * kStepsPerColumn)), 1.0);
     SWave wave{samples.channels, options.width, std::max(frames / step / options.width, 1e-9), 0, {}};
     wave.columns.resize(static_cast<size_t>(wave.channels) * static_cast<size_t>(wave.width));
-    // Half a frame more, so that the library's truncation arrives at the whole number meant.
+    // Half a frame more, so that the library's truncation results in the intended whole number.
     const bool complete = library.AudioSource_FetchStreamSamples(source.get(), onSamples,
                                                                  (step + 0.5) / samples.rate, &wave) != 0;
     if (isCancelled()) return;

@@ -33,7 +33,7 @@ char16_t* TONEWRIGHT_Host_ReadArrangement(const char* path) {
         if (tracks)
             for (auto nodes = tracks->getChildNodesByName("Track"); nodes.hasMore();)
                 resolveMedium(nodes.getNext(), ++count, uri);
-        if (count == 0) throw peru::CError("This is no arrangement: it has no tracks");
+        if (count == 0) throw peru::CError("This is not an arrangement: it has no tracks");
         const std::u16string xml = CString::toStdU16String(document->printToString());
         auto* copy = static_cast<char16_t*>(std::malloc((xml.size() + 1) * sizeof(char16_t)));
         if (copy) std::memcpy(copy, xml.c_str(), (xml.size() + 1) * sizeof(char16_t));

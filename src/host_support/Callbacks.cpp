@@ -14,7 +14,7 @@ int32_t TONEWRIGHT_Host_SetEncoderProgress(TONEWRIGHT_Handle encoder, TONEWRIGHT
             target->setProgressFunction(nullptr);
             return 1;
         }
-        // The target owns the function, so that the function must not own the target.
+        // The target owns the function, so the function must not own the target.
         target->setProgressFunction([callback, user, raw = target.get()](double fraction) {
             const int32_t answer = callback(fraction, user);
             if (answer == TONEWRIGHT_DISCARD) raw->stopAndDiscard();
@@ -91,7 +91,7 @@ int32_t TONEWRIGHT_Host_EnqueueSource(TONEWRIGHT_Handle player, TONEWRIGHT_Handl
     return guard(0, [&] {
         const auto next = require<sonora2::common::IAudioSource>(source, "an audio source");
         if (!require<IPlayerControl>(player, "a player")->enqueue(next))
-            throw peru::CError("The next source has another format than the current one");
+            throw peru::CError("The next source has a different format from the current one");
         return 1;
     });
 }

@@ -7,8 +7,7 @@ using sonora2::common::SFailure;
 
 namespace {
 
-// What a host sees of a record: the path in place of the URI. Its text lives until the next call on the
-// thread.
+// The record returned to the host, with a path in place of the URI. Valid until the next call on the thread.
 thread_local SFailure t_shown;
 
 std::string toPath(const std::string& uri) {
@@ -34,7 +33,7 @@ void storeUnknownFailure() noexcept {
     try {
         sonora2::common::setLastFailure({"", "Error", "An unknown error occurred", ""});
     } catch (...) {
-        // No memory for the record; the one before it stays.
+        // Out of memory: the previous record remains.
     }
 }
 
@@ -45,7 +44,7 @@ int32_t TONEWRIGHT_Host_GetLastFailure(TONEWRIGHT_Failure* failure) {
         t_shown = sonora2::common::getLastFailure();
         t_shown.uri = toPath(t_shown.uri);
     } catch (...) {
-        // What was copied so far is valid.
+        // The part copied so far is valid.
     }
     fillRecord(failure, {sizeof(*failure), t_shown.kind.c_str(), t_shown.title.c_str(),
                          t_shown.message.c_str(), t_shown.uri.c_str()});

@@ -1,4 +1,4 @@
-// Where exceptions stop, and what a function leaves behind for TONEWRIGHT_Host_GetLastFailure.
+// Catches exceptions at the C boundary and stores their reasons for TONEWRIGHT_Host_GetLastFailure.
 #pragma once
 
 #include "peru/Errors.h"
@@ -31,14 +31,14 @@ template <class R, class Body> R guard(const R& failure, Body&& body) noexcept {
     return failure;
 }
 
-// The T behind a handle. Throws CError with what the caller calls the argument.
+// The T behind a handle. Throws CError; `what` describes the expected object in the message.
 template <class T> P<T> require(TONEWRIGHT_Handle handle, const char* what) {
     P<T> object = unwrap<T>(handle);
     if (!object) throw peru::CError(peru::CString::fromUTF8(std::string("The handle is not ") + what));
     return object;
 }
 
-// Fills a caller's record, which may be shorter or longer than ours. `size` stays the caller's.
+// Fills a caller's record, which may be shorter or longer than ours. Its `size` member is not changed.
 template <class Record> void fillRecord(Record* target, const Record& values) {
     if (!target) return;
     const size_t size = target->size;
@@ -46,7 +46,7 @@ template <class Record> void fillRecord(Record* target, const Record& values) {
     if (size >= sizeof(size)) target->size = size;
 }
 
-// Zero-terminated, and cut at a character where it does not fit.
+// Zero-terminates the text; if it does not fit, it is truncated between characters.
 template <size_t Size> void copyText(char (&target)[Size], const std::string& text) {
     size_t length = std::min(text.size(), Size - 1);
     while (length < text.size() && length > 0 && (text[length] & 0xC0) == 0x80) --length;

@@ -1,4 +1,4 @@
-// A source that reads from a host's functions.
+// A source that reads from functions of the host.
 #pragma once
 
 #include "peru/MemoryManager.h"
@@ -16,9 +16,9 @@ struct SHostSamples {
     int32_t rate = 0;
     int32_t channels = 0;
     int32_t bytesPerSample = 0;
-    int64_t frames = -1; // unknown
+    int64_t frames = -1; // -1: unknown
 
-    // Throws CError for numbers that are no sound format.
+    // Throws CError if the numbers are not a valid sound format.
     void check() const;
 };
 
@@ -40,7 +40,7 @@ public:
     bool isEOF() override { return !m_isOpened || m_hasEnded; }
     void setStartTime(double fStartTime) override;
     double getStartTime() override;
-    P<peru::IURI> getURI() override; // an empty one
+    P<peru::IURI> getURI() override; // an empty URI
     P<peru::IString> getPluginName() override;
 
     P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override;
@@ -52,7 +52,7 @@ public:
 
 private:
     int64_t toFrame(double seconds) const;
-    void moveTo(int64_t frame); // a frame of the host's, from its beginning
+    void moveTo(int64_t frame); // in the host's frames, counted from the beginning
 
     const SHostSamples m_format;
     const Read m_read;
@@ -60,8 +60,8 @@ private:
     P<peru::IMemoryManager> m_memory;
     bool m_isOpened = false;
     bool m_hasEnded = false;
-    int64_t m_start = 0;    // frame at which the source's time 0 lies
-    int64_t m_position = 0; // frame of the host's that is read next
+    int64_t m_start = 0;    // the host's frame at the source's time 0
+    int64_t m_position = 0; // the host's frame that is read next
 };
 
 } // namespace tonewright::host_support

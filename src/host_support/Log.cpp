@@ -9,7 +9,7 @@ namespace {
 
 thread_local bool t_isCalling = false;
 
-// A manager, since the front takes only those; it has no sinks of its own.
+// Implements the manager interface because the front library accepts only managers. It has no sinks.
 class CCallbackLog : public peru::CLogBase, public peru::ILogManager {
 public:
     CCallbackLog(int32_t minimumLevel, TONEWRIGHT_LogCallback callback, void* user)

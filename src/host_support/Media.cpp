@@ -1,4 +1,4 @@
-// A file's own properties and what a target can hold, by asking the plug-ins.
+// Queries the plug-ins for the properties of files and the capabilities of targets.
 #include "host_support/Guard.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/system/IPathes.h"
@@ -80,7 +80,7 @@ void fillInfo(const P<IAudioSource>& source, TONEWRIGHT_MediaInfo* info) {
     fillRecord(info, values);
 }
 
-// Whether one of the plug-ins that would write the file takes the format. Their reasons are not wanted here.
+// Whether one of the plug-ins for the file accepts the format. The reasons of those that do not are ignored.
 bool canWrite(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int rate, int channels, int bytes) {
     ISonoraPlugin::SFormatParams params;
     params.nSampleRate = rate;
@@ -150,8 +150,8 @@ int32_t TONEWRIGHT_Host_GetCapabilities(const char16_t* uri, TONEWRIGHT_Capabili
         if (!askPlugins(target, handler, kAudioFormat, [](ISonoraPlugin&) { return true; }))
             throw CSonoraError(CString::fromUTF8("No plug-in writes " + describeKind(target, *handler)));
 
-        // A codec's limits of rate, channels and width do not depend on each other, so that each is asked for
-        // beside a format that it takes.
+        // A codec's limits of rate, channels and width are taken as independent, so each is tested by varying
+        // one format that is accepted.
         static constexpr int kRates[] = {8000,  11025, 12000, 16000, 22050,  24000,  32000,  44100,
                                          48000, 64000, 88200, 96000, 176400, 192000, 352800, 384000};
         TONEWRIGHT_Capabilities values = {};

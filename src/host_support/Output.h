@@ -1,4 +1,4 @@
-// A file that appears complete or not at all.
+// An output file that appears complete or not at all.
 #pragma once
 
 #include "peru/Object.h"
@@ -16,7 +16,7 @@ public:
     ~COutput() override; // removes the temporary file, unless it was committed or kept
 
     const std::string& getTemporary() const { return m_temporary; }
-    void commit(); // throws CError; the temporary file then stays until the destructor
+    void commit(); // throws CError; the temporary file then remains until the destructor
     void keep() { m_isOver = true; }
 
 private:
@@ -27,9 +27,9 @@ private:
     void create();
 
     const int32_t m_flags;
-    std::string m_target; // links followed
+    std::string m_target; // symbolic links resolved
     std::string m_temporary;
-    int m_lock = -1; // the temporary file as it was created, locked
+    int m_lock = -1; // the temporary file that this object created, locked
     bool m_isOver = false;
 };
 

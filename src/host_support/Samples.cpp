@@ -1,4 +1,4 @@
-// Sources of the host's own, and reading the samples of any source.
+// Host-defined sources, and reading the samples of any source.
 #include "host_support/Guard.h"
 #include "host_support/HostSource.h"
 #include "sonora2/context/SonoraContextAudio.h"
@@ -14,7 +14,7 @@ using sonora2::common::IAudioSource;
 
 namespace {
 
-// Owned by both functions of one source.
+// Shared by the read and seek functions of one source.
 struct SUser {
     TONEWRIGHT_SourceCallbacks callbacks = {};
     void* user = nullptr;
@@ -49,7 +49,7 @@ public:
     }
 
 private:
-    // Whether the chunk has bytes left.
+    // Gets the next chunk if the current one is used up. False at the end of the source.
     bool fetch() {
         while (!m_chunk || m_taken >= m_chunk->getSize()) {
             m_chunk = m_source->getNextAudioChunk();
@@ -77,7 +77,7 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_CreateSourceFromCallbacks(int32_t sampleRate, 
         const SHostSamples format{sampleRate, channelCount, bytesPerSample, frameCount};
         format.check();
         if (!callbacks || callbacks->size < sizeof(*callbacks) || !callbacks->read)
-            throw peru::CError("A source needs a function that reads");
+            throw peru::CError("A source needs a read function");
         const auto owner = std::make_shared<SUser>();
         owner->user = user;
         CHostSource::Seek seek;
@@ -89,7 +89,7 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_CreateSourceFromCallbacks(int32_t sampleRate, 
                 return owner->callbacks.read(owner->user, samples, frames);
             },
             std::move(seek));
-        owner->callbacks = *callbacks; // from here on release is called
+        owner->callbacks = *callbacks; // from here on the destructor calls release
         return wrap(source);
     });
 }
@@ -134,7 +134,8 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_CreateReader(TONEWRIGHT_Handle source) {
 int64_t TONEWRIGHT_Host_ReadFrames(TONEWRIGHT_Handle reader, void* samples, int64_t frames) {
     return guard<int64_t>(-1, [&] {
         const P<CReader> object = require<CReader>(reader, "a reader");
-        if (frames < 0 || (!samples && frames > 0)) throw peru::CError("There is no room to read into");
+        if (frames < 0 || (!samples && frames > 0))
+            throw peru::CError("The buffer or the number of frames is invalid");
         return object->read(static_cast<uint8_t*>(samples), frames);
     });
 }
@@ -142,7 +143,7 @@ int64_t TONEWRIGHT_Host_ReadFrames(TONEWRIGHT_Handle reader, void* samples, int6
 int32_t TONEWRIGHT_Host_Seek(TONEWRIGHT_Handle reader, double seconds) {
     return guard(0, [&] {
         const P<CReader> object = require<CReader>(reader, "a reader");
-        if (!(seconds >= 0.0)) throw peru::CError("A time before the beginning cannot be sought");
+        if (!(seconds >= 0.0)) throw peru::CError("The time to seek to is invalid");
         object->seek(seconds);
         return 1;
     });

@@ -14,7 +14,7 @@ using peru::IString;
 namespace {
 
 constexpr struct {
-    const char* key; // as TagTransfer names it
+    const char* key; // as in tag transfer
     P<IString> (IFileTag::*get)() const;
     void (IFileTag::*set)(const peru::CStringArg& text);
 } kFields[] = {{"TITLE", &IFileTag::getTitle, &IFileTag::setTitle},
@@ -29,8 +29,8 @@ constexpr struct {
 struct SSource {
     filetag::STags all;
     P<IFileTag>
-        own; // by the tag classes of the exports, which know places of WAVE files that TagLib does not
-    std::vector<P<IString>> texts; // of the own one, parallel to kFields
+        own; // read by the tag classes of the exports, which find fields of WAVE files that TagLib does not
+    std::vector<P<IString>> texts; // of `own`, parallel to kFields
 
     bool isEmpty() const {
         return all.fields.empty() && all.pictures.empty() &&
@@ -38,7 +38,7 @@ struct SSource {
     }
 };
 
-// A kind of file without tags has an empty one.
+// The result is empty for file types without tags.
 SSource readSource(const P<peru::IURI>& file) {
     SSource source;
     try {
@@ -47,7 +47,7 @@ SSource readSource(const P<peru::IURI>& file) {
             if (const P<IFileTag> own = filetag::CFileTagFactory::get()->create(file))
                 for (const auto& field : kFields) source.texts.push_back(((*own).*field.get)());
     } catch (const peru::CFileFormatNotSupportedError&) {
-        // What was read until then is what there is.
+        // Keep what has been read so far.
     }
     return source;
 }
@@ -66,7 +66,7 @@ std::vector<std::string> complement(const SSource& source, const P<peru::IURI>& 
     return stored;
 }
 
-// Returns the names of what the target cannot hold.
+// Returns the names of the fields and pictures that the target cannot hold.
 std::string writeTarget(const SSource& source, const P<peru::IURI>& to) {
     std::vector<std::string> lost;
     try {

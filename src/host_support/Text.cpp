@@ -15,9 +15,8 @@ template <class Char> Char* duplicate(const std::basic_string<Char>& text) {
     return copy;
 }
 
-// The library's own decoder is stricter than the standard (it rejects the lead bytes E0 and F0, which
-// includes every emoji), so that text from outside is decoded here. Throws CError for anything but
-// well-formed UTF-8.
+// The library's own decoder is stricter than the standard: it rejects the lead bytes E0 and F0, and thus
+// every emoji. Text from hosts is therefore decoded here. Throws CError for anything but well-formed UTF-8.
 std::u16string decodeUTF8(const char* text) {
     std::u16string result;
     for (const auto* byte = reinterpret_cast<const unsigned char*>(text); *byte;) {

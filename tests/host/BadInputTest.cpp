@@ -52,7 +52,7 @@ TEST_F(BadInput, IsToldByNameAndReason) {
             const std::string message = fail(command);
             expectMessage(message, {start, bad.reason});
             EXPECT_GT(message.size(), start.size() + 5) << message;
-            // The name is not told twice.
+            // The name is not repeated.
             EXPECT_EQ(message.find(std::string(bad.input) + ":", start.size()), std::string::npos) << message;
             EXPECT_EQ(message.find(folder.path().string()), std::string::npos) << message;
         }
@@ -78,7 +78,7 @@ TEST_F(BadInput, MayBeNoise) {
     size_t errors = 0;
     for (const nlohmann::json& event : parseLines(result.out)) {
         errors += event["event"] == "error";
-        // MPEG audio has no header but a few bits that noise has as well.
+        // MPEG audio has only a few header bits, which also occur in noise.
         if (event["event"] == "done") {
             EXPECT_EQ(event["input"].get<std::string>().substr(0, 2), "mp");
         }
@@ -125,7 +125,7 @@ TEST_F(BadOutput, IsToldByNameAndReason) {
              {"missing/out.png", "does not exist"}, {"folder.flac", "Is a directory"}, {"in.wav", "same"}})
         expectMessage(fail({"waveform", "in.wav", "-f", "-o", output}), {part});
     EXPECT_EQ(list(), before);
-    write("five.wav", makeTone(44100, 5, 16, 0.1)); // nothing mixes five channels down to what an MP3 holds
+    write("five.wav", makeTone(44100, 5, 16, 0.1)); // cannot be mixed down to the channels of MP3
     expectMessage(fail({"convert", "five.wav", "-o", "out.mp3"}),
                   {"5 channels and", "to 44100 Hz, 2 channels"});
 }
@@ -157,7 +157,7 @@ TEST_F(BadOutput, IsReplacedThroughLinksAndKeepsItsMode) {
     EXPECT_EQ(list(), (std::set<std::string>{"in.wav", "link.flac", "elsewhere/", "elsewhere/out.flac"}));
 }
 
-// A limit of file sizes stands for every failure in the middle of writing.
+// A file size limit represents all failures in the middle of writing.
 TEST_F(BadOutput, MayFailInTheMiddle) {
     write("in.wav", makeNoise(44100, 2, 16, 200000));
     for (const char* output : {"out.flac", "out.wav", "out.aiff", "out.ogg", "out.mp3"})

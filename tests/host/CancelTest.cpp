@@ -10,7 +10,7 @@ namespace {
 class Cancel : public CProgramTest {
 protected:
     void SetUp() override {
-        // Six hours, of which the disk holds the header only.
+        // Six hours in a sparse file.
         const SSound silence{44100, 2, 16, {}};
         const uint32_t bytes = 6 * 3600 * 44100u * 4;
         folder.write("long.wav", makeWavHeader(silence, bytes));
@@ -85,7 +85,7 @@ TEST_F(Cancel, StopsEveryThread) {
 
 TEST_F(Cancel, DoesNotComeFromAReaderThatLeft) {
     write("in.wav", makeTone(44100, 2, 16, 1));
-    // The first reader ends at once, so that every later line meets a closed pipe.
+    // The reader ends at once, so that the program writes to a closed pipe.
     const SProcessResult result = run({"bash", "-c",
                                        "\"$0\" convert in.wav -o out.flac --json | true; "
                                        "echo ${PIPESTATUS[0]}",

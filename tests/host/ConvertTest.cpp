@@ -14,7 +14,7 @@ protected:
     SSound decodeByPeer(const std::string& file) {
         peer({"ffmpeg", "-v", "error", "-y", "-i", file, "-c:a", "pcm_s16le", "-f", "wav", "-bitexact",
               "judge.wav"});
-        // A pipe of the same program would leave the sizes of the header open.
+        // Written to a pipe, the header would have no sizes.
         return readWav("judge.wav");
     }
     static std::vector<std::string> command(const std::string& output,
@@ -68,7 +68,7 @@ TEST_F(Convert, ReadsWhatPeersWrite) {
         succeed({"convert", file, "-f", "-o", "out.wav"});
         EXPECT_TRUE(readWav("out.wav") == sound) << file;
     }
-    // What has no width of its own comes with 16 bits.
+    // Codecs without a sample width are decoded to 16 bits.
     write("in.wav", makeTone(8000, 1, 16, 0.5));
     peer({"sox", "in.wav", "-e", "mu-law", "peer.au"});
     peer({"lame", "--quiet", "-b", "64", "in.wav", "peer.mp3"});
@@ -129,19 +129,19 @@ TEST_F(Convert, MeansWhatTheOptionsSay) {
         SSound input;
         const char* output;
         std::vector<std::string> options;
-        int rate, channels, bits; // of what is written; bits 0 where the codec has none
+        int rate, channels, bits; // of the output; bits 0 if the codec has no sample width
     } kCases[] = {
-        // Kept as it is wherever the target can hold it
+        // Unchanged if the target can hold it
         {makeTone(48000, 2, 24, 0.4), "a.mp3", {}, 48000, 2, 0},
         {makeTone(8000, 1, 8, 0.4), "a.wav", {}, 8000, 1, 8},
         {makeTone(8000, 1, 8, 0.4), "a.mp3", {}, 8000, 1, 0},
         {makeTone(96000, 6, 24, 0.2), "a.wav", {}, 96000, 6, 24},
-        // What it cannot hold becomes something that it can
+        // Otherwise changed to a format that the target can hold
         {makeTone(96000, 6, 24, 0.4), "a.mp3", {}, 48000, 2, 0},
         {makeTone(88200, 2, 16, 0.4), "a.mp3", {}, 44100, 2, 0},
         {makeTone(11000, 1, 16, 0.4), "a.mp3", {}, 11025, 1, 0},
         {makeTone(4000, 1, 16, 0.4), "a.mp3", {}, 8000, 1, 0},
-        // As asked
+        // As requested
         {makeTone(44100, 2, 16, 0.4), "a.flac", {"--rate", "48000", "--channels", "1"}, 48000, 1, 16},
         {makeTone(44100, 1, 16, 0.4), "a.ogg", {"--channels", "2"}, 44100, 2, 0},
         {makeTone(44100, 2, 16, 0.4), "a.wav", {"--bits", "8"}, 44100, 2, 8},
@@ -195,7 +195,7 @@ TEST_F(Convert, ObeysQualityAndBitRate) {
     EXPECT_LT(size("mp3", "--quality", "0.0") * 5, size("mp3", "--quality", "1.0") * 4);
     EXPECT_NEAR(static_cast<double>(size("mp3", "--bitrate", "64000")), 8000, 800);
     EXPECT_NEAR(static_cast<double>(size("mp3", "--bitrate", "320K")), 40000, 3000);
-    // Of a sound that can be compressed
+    // The sound must be compressible
     write("in.wav", makeTone(44100, 2, 16, 2));
     EXPECT_LT(size("flac", "--quality", "1.0"), size("flac", "--quality", "0.01"));
 }
@@ -206,7 +206,7 @@ TEST_F(Convert, NeedsNoMoreMemoryForHoursThanForAMinute) {
     for (uint32_t seconds : {60u, 6 * 3600u}) {
         const uint32_t bytes = seconds * 16000;
         folder.write("in.wav", makeWavHeader(silence, bytes));
-        std::filesystem::resize_file(folder / "in.wav", 44 + bytes); // a hole takes no disk
+        std::filesystem::resize_file(folder / "in.wav", 44 + bytes); // sparse
         const SProcessResult result = tonewright({"convert", "in.wav", "-f", "-o", "out.flac"});
         EXPECT_EQ(result.exitCode, 0) << result.err;
         EXPECT_EQ(property("out.flac", "--show-total-samples"), static_cast<int>(bytes / 2));

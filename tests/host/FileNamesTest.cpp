@@ -4,7 +4,7 @@ using namespace tests;
 
 using FileNames = CProgramTest;
 
-// Each is read, written and told by every command.
+// Every command reads, writes and prints each name.
 TEST_F(FileNames, MayBeAnything) {
     const SSound sound = makeTone(8000, 1, 16, 0.2);
     const std::vector<std::string> names = {
@@ -24,7 +24,7 @@ TEST_F(FileNames, MayBeAnything) {
         "a.b.flac",
         "trailing. ",
         std::string(200, 'n'),
-        std::string(250, 'n'), // no ending fits behind the output's
+        std::string(250, 'n'), // the output's name has no room for a suffix
         std::string(249, 'n') + "m",
     };
     std::filesystem::create_directory(folder / "out \xff");
@@ -51,7 +51,7 @@ TEST_F(FileNames, AreShownOnOneLine) {
     const std::string message = fail({"info", "line\nbreak\x1b[2J.wav"});
     EXPECT_EQ(message.find("tonewright: line\\x0abreak\\x1b[2J.wav: "), 0u) << message;
     EXPECT_EQ(std::count(message.begin(), message.end(), '\n'), 1) << message;
-    // Also where the plug-in names the file, in whatever way
+    // Also if the plug-in names the file, in whatever form
     folder.write("b\xff 50%25.flac", "no sound at all, and no format of sound either");
     for (const char* output : {"out.wav", "missing/\xff.wav"}) {
         const std::string reason = fail({"convert", "b\xff 50%25.flac", "-o", output});

@@ -10,7 +10,7 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr size_t kStep = 4000;  // frames; half a second at the rate of these tests
-constexpr size_t kChunk = 8192; // of a decoder
+constexpr size_t kChunk = 8192; // frames of a decoder
 constexpr int kRate = 8000;
 const std::string kDocs = TONEWRIGHT_DOCS;
 
@@ -77,16 +77,16 @@ TEST_F(Mix, EqualsAModel) {
 
     const SSound mixed = readWav("out.wav");
     EXPECT_EQ(describe(mixed), "8000_1ch_16bit");
-    ASSERT_EQ(mixed.frames(), 7 * kStep); // what has begun at 3.2 seconds
+    ASSERT_EQ(mixed.frames(), 7 * kStep); // the steps begun by 3.2 seconds
     for (size_t i = 0; i < mixed.frames(); ++i) {
         int expected = sampleAt(first, i);
         if (i >= 3 * kStep) {
             const size_t at = i - 3 * kStep;
             int sample = sampleAt(second, at + kRate / 4);
-            if (at < kChunk) // the second chunk reaches over the end of the fade
+            if (at < kChunk) // the second chunk extends beyond the end of the fade
                 sample = static_cast<int>(static_cast<float>(sample) *
                                           static_cast<float>(static_cast<double>(at) / kRate / 1.1));
-            // The model's time is exact, the mixer's grows by steps in single precision.
+            // The model computes the time exactly, the mixer adds steps in single precision.
             expected = mixModel(sample, expected);
             ASSERT_NEAR(sampleAt(mixed, i), expected, at < kChunk ? 2 : 0) << i;
         } else {
@@ -100,7 +100,7 @@ TEST_F(Mix, FindsMediaBesideTheArrangement) {
     const std::string place = "R&B #1 100% \xff";
     fs::create_directories(folder / (place + "/in"));
     struct SCase {
-        const char* file; // from the folder of the arrangement
+        const char* file; // relative to the arrangement's folder
         const char* uri;
     };
     for (const SCase& c : std::initializer_list<SCase>{{"a.wav", "a.wav"},
@@ -120,7 +120,7 @@ TEST_F(Mix, FindsMediaBesideTheArrangement) {
         EXPECT_TRUE(noise.samples.starts_with(readWav("out.wav").samples));
         fs::remove(folder / (in + c.file));
     }
-    // Complete ones are left alone.
+    // Complete URIs are not changed.
     write("whole.wav", noise);
     folder.write("b.xml", makeArrangement(makeTrack("file://" + (folder / "whole.wav").string(), 0, 0, 0.9)));
     succeed({"mix", "b.xml", "-o", "out.flac"});
@@ -133,12 +133,13 @@ TEST_F(Mix, TellsWhatIsWrong) {
     const std::string good = makeTrack("a.wav", 0, 0, 0.9);
     expectRefused(makeArrangement(good + makeTrack("gone.wav", 0, 0, 1)),
                   "Could not open " + (folder / "gone.wav").string() + ": No such file or directory");
-    expectRefused(makeArrangement(good + makeTrack("gone.wav", 60, 0, 1)), "gone.wav"); // found out late
+    expectRefused(makeArrangement(good + makeTrack("gone.wav", 60, 0, 1)),
+                  "gone.wav"); // when due
     expectRefused(makeArrangement(makeTrack("text.wav", 0, 0, 1)), "text.wav");
     expectRefused(makeArrangement(makeTrack("", 0, 0, 1)), "Track 1 has no Uri");
     expectRefused(makeArrangement(good + "<Track/>"), "Track 2 has no Uri");
     expectRefused(makeArrangement(makeTrack("http://[", 0, 0, 1)), "http://[");
-    expectRefused(makeArrangement(makeTrack("a.wav", 0, 1, 1)), "Nothing in it would be heard");
+    expectRefused(makeArrangement(makeTrack("a.wav", 0, 1, 1)), "The arrangement is empty");
     expectRefused(makeArrangement(""), "it has no tracks");
     expectRefused("<svg/>", "it has no tracks");
     expectRefused("<Project>\n<Tracks>", "XML Parse Error in this file, line 2");
@@ -155,7 +156,7 @@ TEST_F(Mix, TellsWhatIsWrong) {
 }
 
 TEST_F(Mix, LeavesEverythingAsItWasWhenItIsCancelled) {
-    const uint32_t bytes = 6 * 3600 * 44100u * 4; // six hours, of which the disk holds the header only
+    const uint32_t bytes = 6 * 3600 * 44100u * 4; // six hours in a sparse file
     folder.write("long.wav", makeWavHeader(SSound(), bytes));
     fs::resize_file(folder / "long.wav", 44 + uint64_t{bytes});
     folder.write("a.xml", makeArrangement(makeTrack("long.wav", 0, 0, 21600)));

@@ -10,7 +10,7 @@ namespace {
 
 class Output : public CProgramTest {
 protected:
-    // On a terminal of its own, with both outputs in one text.
+    // Runs the program on a terminal and returns everything shown.
     std::string onTerminal(const std::string& arguments) {
         const SProcessResult result =
             run({"script", "-qec", std::string(kProgram) + " " + arguments, "/dev/null"}, folder.path(),
@@ -26,7 +26,7 @@ protected:
         png_image header = {};
         std::vector<uint8_t> pixels; // RGB
 
-        // Pixels of a rectangle that are neither white nor grey.
+        // The number of pixels of a rectangle that are neither white nor grey.
         size_t countBlue(int left, int top, int right, int bottom) const {
             size_t count = 0;
             for (int y = top; y < bottom; ++y)
@@ -102,7 +102,7 @@ TEST_F(Output, HasABarOnATerminalOnly) {
     const std::string shown = onTerminal("convert a.wav -o a.flac");
     EXPECT_NE(shown.find("[#"), std::string::npos) << shown;
     EXPECT_NE(shown.find(" %"), std::string::npos) << shown;
-    // Taken away again before the line that stays
+    // Erased before the final line
     EXPECT_LT(shown.rfind("\x1b[2K"), shown.find("a.flac: FLAC")) << shown;
     EXPECT_EQ(onTerminal("convert -q a.wav -o quiet.flac"), "");
     EXPECT_EQ(onTerminal("convert --json a.wav -o json.flac").find('\x1b'), std::string::npos);
@@ -216,7 +216,7 @@ TEST_F(Output, MissesTheLibrary) {
 }
 
 TEST_F(Waveform, ShowsWhereSoundIs) {
-    // The left channel sounds in its first half only, the right one not at all.
+    // The left channel has sound in its first half only, the right one none.
     SSound sound = makeTone(44100, 2, 16, 2);
     for (size_t frame = 0; frame < sound.frames(); ++frame) {
         char* samples = sound.samples.data() + frame * 4;
@@ -227,7 +227,7 @@ TEST_F(Waveform, ShowsWhereSoundIs) {
     const SPicture picture = readPicture("out.png");
     ASSERT_EQ(picture.header.width, 400u);
     ASSERT_EQ(picture.header.height, 200u);
-    // Half of full scale fills half of the strip, less a margin.
+    // Half of full scale fills half of the strip, minus a margin.
     EXPECT_NEAR(static_cast<double>(picture.countBlue(0, 0, 200, 100)), 200 * 47, 200 * 4);
     EXPECT_LE(picture.countBlue(202, 0, 400, 100), 198u); // a line of silence
     EXPECT_LE(picture.countBlue(0, 100, 400, 200), 400u);
@@ -242,7 +242,7 @@ TEST_F(Waveform, IsDrawnOfAnyLength) {
         EXPECT_EQ(picture.header.width, 1200u);
         EXPECT_EQ(picture.header.height, 300u);
         if (frames < 300000) continue;
-        // Noise of full scale reaches the end; what the library holds back is 100 steps at most.
+        // Full-scale noise reaches the end; the library drops at most the last 100 steps.
         EXPECT_GT(picture.countBlue(0, 0, 1170, 300), 1170u * 300 * 8 / 10);
         EXPECT_GT(picture.countBlue(1150, 0, 1175, 300), 100u);
     }

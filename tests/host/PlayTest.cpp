@@ -4,14 +4,14 @@ using namespace tests;
 
 namespace {
 
-// Nothing waits for a thread that fails: what takes ten seconds has waited for one.
+// The program must not wait for a failing thread, which would take ten seconds.
 constexpr double kQuick = 8;
 
 class Play : public CSoundTest {
 protected:
     Play() : CSoundTest(EMicrophone::none) {}
 
-    // Plays half a minute of noise; what was heard of it without the silence before and behind.
+    // Plays noise and returns the sound that was heard, without the silence before and after.
     std::string hear(const SSound& noise, SProcessResult& result) {
         write("noise.wav", noise);
         const std::unique_ptr<CProcess> ears = server.listen();
@@ -24,8 +24,8 @@ protected:
 
 } // namespace
 
-// How long the sound server itself has to wait for a processor is not ours to say: beside the other tests it
-// now and then plays a gap of its own, which is no failure unless it comes again and again.
+// While other tests run, the sound server may have to wait for a processor and then plays a gap of its own.
+// That is a failure only if it happens every time.
 TEST_F(Play, IsBitExactAndHardlyCostsAnything) {
     const SSound noise = makeLoudNoise(30);
     SProcessResult result;
@@ -38,11 +38,11 @@ TEST_F(Play, IsBitExactAndHardlyCostsAnything) {
     const double cost = result.cpuSeconds / 30;
     RecordProperty("cost", std::to_string(cost));
 #ifndef TONEWRIGHT_SANITIZED
-    EXPECT_LT(cost, 0.05); // of a core; a third of that where nothing else runs
+    EXPECT_LT(cost, 0.05); // of a core; about a third of that on an idle machine
 #endif
 }
 
-// Gaps are told and no failure here; nothing is lost, repeated or out of order.
+// Gaps are reported but allowed here; no sound is lost, repeated or out of order.
 TEST_F(Play, LosesNothingOnABusyMachine) {
     std::vector<std::unique_ptr<CProcess>> others;
     for (int i = 0; i < 4; ++i)
@@ -67,7 +67,7 @@ TEST_F(Play, PausesWithoutLosingAnything) {
     terminal->type(' ');
     const double paused = waitFor(program, isPaused)["position"];
     EXPECT_LT(paused, 4);
-    std::this_thread::sleep_for(std::chrono::seconds(1)); // the pause itself
+    std::this_thread::sleep_for(std::chrono::seconds(1)); // the pause lasts this long
     terminal->type(' ');
     const SProcessResult result = program.wait();
     EXPECT_EQ(result.exitCode, 0) << result.out << terminal->getScreen();
@@ -132,7 +132,7 @@ TEST_F(Play, StopsWhenItIsTold) {
     }
 }
 
-// Killing cannot be heard, but whatever else ends the program leaves the terminal as it was.
+// SIGKILL cannot be caught, but whatever else ends the program restores the terminal.
 TEST_F(Play, RestoresTheTerminalInEveryCase) {
     write("a.wav", makeTone(44100, 2, 16, 60));
     for (int signal : {SIGTERM, SIGQUIT, SIGHUP, SIGABRT}) {
@@ -163,7 +163,7 @@ TEST_F(Play, GoesOnWithTheNextFile) {
 }
 
 TEST_F(Play, EndsWithTheSoundServerInAPauseToo) {
-    // All of it lies in the device's queue: nothing that is written could fail.
+    // The whole sound is already in the device's queue, so no write can fail.
     write("a.wav", makeTone(44100, 2, 16, 5));
     const auto terminal = start({"play", "a.wav"});
     CProcess& program = terminal->getProcess();

@@ -1,4 +1,4 @@
-// Runs the program under test in a folder of the test's own.
+// Runs the program under test in a temporary folder.
 #pragma once
 
 #include "host/Wav.h"
@@ -16,7 +16,7 @@
 namespace tests {
 
 constexpr const char* kProgram = TONEWRIGHT_PROGRAM;
-// What a sanitizer ends the program with, which no exit code of its own is.
+// Exit code for errors found by a sanitizer, different from the program's own exit codes.
 constexpr int kSanitizerExit = 99;
 
 inline std::vector<std::pair<std::string, std::string>> programEnvironment() {
@@ -31,21 +31,21 @@ inline std::vector<std::pair<std::string, std::string>> programEnvironment() {
 
 class CProgramTest : public testing::Test {
 protected:
-    // Killed, with exit code 137, after a minute: nothing here takes that long.
+    // Killed after a minute, with exit code 137; no test takes that long.
     SProcessResult tonewright(std::vector<std::string> arguments) {
         arguments.insert(arguments.begin(), {"timeout", "-s", "KILL", "60", kProgram});
         SProcessResult result = run(arguments, folder.path(), programEnvironment());
         EXPECT_LE(result.exitCode, 4) << "killed or crashed: " << result.err;
         return result;
     }
-    // A run that must succeed and have nothing to complain of.
+    // A run that must succeed without messages; returns standard output.
     std::string succeed(const std::vector<std::string>& arguments) {
         const SProcessResult result = tonewright(arguments);
         EXPECT_EQ(result.exitCode, 0) << result.err;
         EXPECT_EQ(result.err, "");
         return result.out;
     }
-    // A run whose files fail, with the line that names each of them; returns standard error.
+    // A run that must fail with messages in the usual form; returns standard error.
     std::string fail(const std::vector<std::string>& arguments) {
         const SProcessResult result = tonewright(arguments);
         EXPECT_EQ(result.exitCode, 1) << result.out << result.err;
@@ -54,7 +54,7 @@ protected:
             EXPECT_EQ(result.err.find(hidden), std::string::npos) << result.err;
         return result.err;
     }
-    // A peer, which must succeed.
+    // Runs another program, which must succeed; returns its output.
     std::string peer(const std::vector<std::string>& command) {
         const SProcessResult result = run(command, folder.path());
         EXPECT_EQ(result.exitCode, 0) << command[0] << ": " << result.out << result.err;
@@ -63,7 +63,7 @@ protected:
 
     void write(const std::string& name, const SSound& sound) { folder.write(name, toWav(sound)); }
     SSound readWav(const std::string& name) { return parseWav(readFile(folder / name)); }
-    // Everything below the folder, by relative names; folders end in a slash.
+    // Relative names of everything below the folder; those of folders end in a slash.
     std::set<std::string> list() {
         std::set<std::string> names;
         for (const auto& entry : std::filesystem::recursive_directory_iterator(folder.path()))

@@ -25,7 +25,7 @@ TEST_F(Record, IsBitExactUntilItIsStopped) {
     EXPECT_EQ(server.play(noise.samples)->wait().exitCode, 0);
     const double position =
         program.isRunning() ? eventsOf(program.readOut()).back()["position"].get<double>() : 0;
-    waitForPosition(program, position + 0.5); // what the device still has
+    waitForPosition(program, position + 0.5); // sound still held by the device
     terminal->type('\x03');
     const SProcessResult result = program.wait();
     EXPECT_EQ(result.exitCode, 0) << result.out << terminal->getScreen();
@@ -55,7 +55,7 @@ TEST_F(Record, TakesTheWantedFormat) {
     const struct {
         std::string name;
         std::vector<std::string> options;
-        std::string format; // as ffprobe tells
+        std::string format; // as reported by ffprobe
     } kCases[] = {
         {"a.wav", {"--rate", "48000", "--channels", "1"}, "pcm_s16le,48000,1"},
         {"b.wav", {"--bits", "24"}, "pcm_s24le,44100,2"},
@@ -89,7 +89,7 @@ TEST_F(Record, LeavesAFileThatPlaysWhenItIsKilled) {
         program.wait();
         EXPECT_EQ(list().count(name + ".part"), 1u);
         EXPECT_GT(durationOf(name + ".part", kind), position - 1);
-        // It is not in the way of the next one, which does not take it away either.
+        // The next recording to the same name is refused and leaves the file alone.
         const std::string bytes = readFile(folder / (name + ".part"));
         const SProcessResult refused = tonewright({"record", "-o", name, "--seconds", "0.2"});
         EXPECT_EQ(refused.exitCode, 1);

@@ -12,8 +12,8 @@
 
 namespace tests {
 
-// Without frames of silence, of which noise has none: beside other tests the sound server may have to wait
-// for a processor and then plays a gap of its own.
+// Removes silent frames, which the noise does not contain: while other tests run, the sound server may have
+// to wait for a processor and then plays a gap of its own.
 inline std::string withoutGaps(const std::string& heard) {
     std::string sound;
     for (size_t at = 0; at + 4 <= heard.size(); at += 4)
@@ -27,7 +27,7 @@ protected:
 
     explicit CSoundTest(EMicrophone microphone) : server(microphone) {}
 
-    // With its events in a file and its keys on a terminal.
+    // Starts the program with its events in a file and its keys on a terminal.
     std::unique_ptr<CTerminal> start(std::vector<std::string> arguments) {
         arguments.insert(arguments.begin(), kProgram);
         arguments.push_back("--json");
@@ -35,9 +35,9 @@ protected:
                                            programEnvironment());
     }
     static std::vector<nlohmann::json> eventsOf(const std::string& text) {
-        return parseLines(text.substr(0, text.rfind('\n') + 1)); // the last may be under way
+        return parseLines(text.substr(0, text.rfind('\n') + 1)); // the last line may be incomplete
     }
-    // Waits for the first event that serves; null when the program ends before.
+    // Waits for the first event that meets the condition; null if the program ends before.
     template <class Condition> static nlohmann::json waitFor(CProcess& process, Condition serves) {
         for (bool running = true; running;) {
             running = process.isRunning();
@@ -56,14 +56,14 @@ protected:
     static double since(Clock::time_point start) {
         return std::chrono::duration<double>(Clock::now() - start).count();
     }
-    // Every value a sample can have but zero, which is what silence is made of.
+    // Noise without zero samples, so that it differs from silence.
     static SSound makeLoudNoise(double seconds) {
         SSound sound =
             makeNoise(CSoundServer::kRate, 2, 16, static_cast<size_t>(seconds * CSoundServer::kRate));
         for (size_t i = 0; i < sound.samples.size(); i += 2) sound.samples[i] |= 1;
         return sound;
     }
-    // Without the silence at both ends.
+    // Removes the silence at both ends.
     static std::string trim(const std::string& samples) {
         const size_t first = samples.find_first_not_of('\0');
         if (first == std::string::npos) return {};

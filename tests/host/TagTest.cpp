@@ -8,11 +8,11 @@ using namespace tests;
 
 namespace {
 
-using Fields = std::map<std::string, std::string>; // by their keys in JSON
+using Fields = std::map<std::string, std::string>; // by JSON key
 
 const std::vector<std::string> kWritable{"flac", "mp3", "ogg", "wav"};
 
-// Without what the kind of file does not have.
+// Without fields that the file type does not support.
 Fields makeFields(const std::string& extension, const std::string& mark = "") {
     Fields fields;
     for (const char* key : {"title", "artist", "album", "album_artist", "track", "year", "genre", "comment"})
@@ -42,7 +42,7 @@ protected:
         command.push_back(name);
         peer(command);
     }
-    // As the peer sees them, by the same keys.
+    // As read by the peer, by the same keys.
     Fields probe(const std::string& name) {
         const nlohmann::json told = nlohmann::json::parse(peer(
             {"ffprobe", "-v", "error", "-of", "json", "-show_entries", "format_tags:stream_tags", name}));
@@ -54,7 +54,7 @@ protected:
                     std::string lower = theirs;
                     std::transform(lower.begin(), lower.end(), lower.begin(), ::tolower);
                     if (lower == "date" || lower == "wm/year") lower = "year";
-                    if (lower == "trck") lower = "track"; // of WAV
+                    if (lower == "trck") lower = "track"; // in WAV files
                     if (lower == key) text = value;
                 }
         };
@@ -94,7 +94,7 @@ TEST_F(Tag, IsWrittenForPeersAndReadFromThem) {
         EXPECT_EQ(show(ours), fields);
         EXPECT_EQ(hearSound(ours), sound);
 
-        // Some fields the peer itself puts where nobody else looks for them.
+        // The peer stores some fields in places where no other program looks for them.
         Fields given = others, read;
         std::string strange = extension == std::string("wav")   ? "track"
                               : extension == std::string("mp3") ? "comment"
@@ -167,7 +167,7 @@ TEST_F(Tag, TellsEachFileThatFailsAndDoesTheOthers) {
                        "tonewright: empty.mp3: The file is empty\n"
                        "tonewright: missing.ogg: No such file or directory\n"
                        "tonewright: .: Is a directory\n"
-                       "tonewright: c.wav: No album can be kept in .wav files\n"
+                       "tonewright: c.wav: No album can be stored in .wav files\n"
                        "tonewright: no-extension: No such file or directory\n");
     EXPECT_EQ(readFile(folder / "c.wav"), wav) << "all that was asked for, or nothing";
     for (const char* done : {"a.flac", "b.mp3"}) {
@@ -220,7 +220,7 @@ TEST_F(Tag, FilesMayHaveAnyNameAndBeLinks) {
         makeSound("plain" + extension);
         std::filesystem::copy_file(folder / ("plain" + extension), folder / name);
         set(name, {"--title", "T"});
-        // Only the ASCII part of the name is told back where the rest is no UTF-8.
+        // The name itself is not compared, since bytes that are not UTF-8 are replaced in JSON.
         const nlohmann::json line = parseLines(succeed({"tag", "show", "--json", "--", name})).at(0);
         EXPECT_EQ(line["title"], "T");
     }
@@ -236,7 +236,7 @@ TEST_F(Tag, FilesMayHaveAnyNameAndBeLinks) {
     for (const std::string& name : list()) EXPECT_EQ(name.find("tmp"), std::string::npos) << name;
 }
 
-// Where nothing may be written, and where the second copy that a safe store needs has no room.
+// On a read-only file system, and on one without room for the second copy that a safe store needs.
 TEST_F(Tag, SurvivesADiskThatCannotBeWrittenTo) {
     write("in.wav", makeNoise(44100, 2, 16, 20000)); // 80 kB
     peer({"flac", "-s", "--no-padding", "-o", "in.flac", "in.wav"});
@@ -292,7 +292,7 @@ TEST_F(Tag, IsCarriedByConversionsBetweenAllKinds) {
     succeed({"convert", "from-flac.flac", "-o", "out.aiff"});
     succeed({"convert", "out.aiff", "-f", "-o", "back.flac"});
     EXPECT_EQ(probe("back.flac"), probe("from-flac.flac"));
-    // Kinds without tags on either side
+    // File types without tags, as target and as source
     for (const char* name : {"out.au", "out.caf", "out.w64", "out.rf64"}) {
         const SProcessResult result = tonewright({"convert", "from-flac.flac", "-o", name});
         EXPECT_EQ(result.exitCode, 0);
@@ -308,7 +308,7 @@ TEST_F(Tag, IsCarriedByConversionsBetweenAllKinds) {
     for (const std::string& name : list()) EXPECT_EQ(name.find(".part"), std::string::npos) << name;
 }
 
-// The sound has room below the limit of file sizes, the tag has not.
+// The sound fits within the file size limit, the tag does not.
 TEST_F(Tag, ThatCannotBeWrittenFailsTheConversion) {
     write("in.wav", makeTone(8000, 1, 16, 0.5));
     succeed({"convert", "in.wav", "-o", "in.flac"});

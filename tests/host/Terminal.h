@@ -1,4 +1,4 @@
-// A program on a terminal of its own.
+// Runs a program on its own terminal.
 #pragma once
 
 #include "support/Process.h"
@@ -16,8 +16,8 @@
 
 namespace tests {
 
-// The command runs in a session of its own whose terminal this is, so that Ctrl-C reaches it; standard input
-// and standard error are the terminal, standard output is too or goes to a file.
+// The command runs in a new session with this controlling terminal, so that Ctrl-C reaches it. Standard input
+// and standard error are the terminal; standard output is the terminal or a file.
 class CTerminal {
 public:
     enum class EOutput { terminal, file };
@@ -31,7 +31,7 @@ public:
         m_slave = ::open(name.c_str(), O_RDWR | O_NOCTTY | O_CLOEXEC); // keeps the mode when the program ends
         const winsize size{24, 80, 0, 0};
         ::ioctl(m_master, TIOCSWINSZ, &size);
-        // A shell opens the terminal, as the leader of a new session, and becomes the command.
+        // A shell, as leader of the new session, opens the terminal and then executes the command.
         const std::string redirect = output == EOutput::terminal ? " 1<>$T" : "";
         command.insert(command.begin(),
                        {"setsid", "sh", "-c", "T=$0; exec <>$T" + redirect + " 2<>$T \"$@\"", name});
@@ -49,14 +49,14 @@ public:
     void type(char key) { // 3 is Ctrl-C, 26 Ctrl-Z
         if (::write(m_master, &key, 1) != 1) throw std::runtime_error("the terminal takes no key");
     }
-    // All that was shown so far.
+    // Everything shown so far.
     const std::string& getScreen() {
         char part[4096];
         for (ssize_t size; (size = ::read(m_master, part, sizeof part)) > 0;)
             m_screen.append(part, static_cast<size_t>(size));
         return m_screen;
     }
-    // Whether keys are shown and come by lines, as a shell wants it.
+    // Whether input is echoed and line-buffered, as a shell expects.
     bool isInUsualMode() const {
         termios mode = {};
         ::tcgetattr(m_slave, &mode);

@@ -1,4 +1,4 @@
-// PCM WAV files, made and read by hand so that the judge shares no code with what it judges.
+// PCM WAV files, written and read here so that the tests share no code with the program under test.
 #pragma once
 
 #include <algorithm>
@@ -15,7 +15,7 @@ struct SSound {
     int rate = 44100;
     int channels = 2;
     int bits = 16;
-    std::string samples; // as they lie in a WAV file
+    std::string samples; // as stored in a WAV file
 
     size_t frameBytes() const { return static_cast<size_t>(channels * (bits / 8)); }
     size_t frames() const { return samples.size() / frameBytes(); }
@@ -41,7 +41,7 @@ inline std::string describe(const SSound& sound) {
            std::to_string(sound.bits) + "bit";
 }
 
-// Every value a sample can have.
+// Noise of all sample values.
 inline SSound makeNoise(int rate, int channels, int bits, size_t frames, uint32_t seed = 1) {
     SSound sound{rate, channels, bits, {}};
     std::mt19937 random(seed);
@@ -50,7 +50,7 @@ inline SSound makeNoise(int rate, int channels, int bits, size_t frames, uint32_
     return sound;
 }
 
-// Half of full scale; channel n has n + 1 times the frequency.
+// A tone of half of full scale; channel n has n + 1 times the frequency.
 inline SSound makeTone(int rate, int channels, int bits, double seconds, double frequency = 440) {
     SSound sound{rate, channels, bits, {}};
     const size_t width = static_cast<size_t>(bits / 8), frames = static_cast<size_t>(seconds * rate);
@@ -68,7 +68,7 @@ inline void appendNumber(std::string& bytes, uint32_t value, int width) {
     bytes.append(reinterpret_cast<const char*>(&value), static_cast<size_t>(width));
 }
 
-// Of a file with `dataBytes` of samples, which need not follow here.
+// The header of a file with `dataBytes` bytes of samples, which are not included.
 inline std::string makeWavHeader(const SSound& sound, uint32_t dataBytes) {
     std::string header = "RIFF";
     const uint32_t frameBytes = static_cast<uint32_t>(sound.frameBytes());
@@ -118,7 +118,7 @@ inline SSound parseWav(const std::string& bytes) {
     throw std::runtime_error("WAV file without samples");
 }
 
-// By zero crossings over the middle of the sound, away from what a lossy codec does to the ends.
+// Measured by zero crossings in the middle of the sound, since lossy codecs change its ends.
 inline double measureFrequency(const SSound& sound, int channel) {
     const size_t first = sound.frames() / 4, last = sound.frames() * 3 / 4;
     int crossings = 0;

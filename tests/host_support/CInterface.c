@@ -1,10 +1,10 @@
-/* The header as C11 reads it. */
+/* Compiles the header as C11. */
 #include <tonewright/host.h>
 
 _Static_assert(sizeof(TONEWRIGHT_MediaInfo) == 168, "the record is part of the binary interface");
 _Static_assert(sizeof(TONEWRIGHT_Capabilities) == 152, "the record is part of the binary interface");
 
-/* Fills a record of a host that knows only its first two fields. */
+/* Passes a record as a host that knows only its first two fields would. */
 int32_t cReadShortRecord(TONEWRIGHT_Handle source, int32_t* rate) {
     TONEWRIGHT_MediaInfo info;
     info.channelCount = -1;

@@ -34,7 +34,7 @@ TONEWRIGHT_Failure lastFailure() {
     return failure;
 }
 
-// Ends its handle.
+// Owns a handle.
 struct CHandle {
     explicit CHandle(TONEWRIGHT_Handle handle) : handle(handle) {}
     ~CHandle() { TONEWRIGHT_Host_DestroyHandle(handle); }
@@ -110,7 +110,7 @@ TEST_F(Host, LogCallbackHearsOfFailuresUntilItIsRemoved) {
         entry.text += std::string(message->component) + "|" + message->text + "\n";
         ++entry.count;
         entry.lowest = std::min<int>(entry.lowest, message->level);
-        TONEWRIGHT_CreateAudioSourceFromURI(u"nonsense://", 44100, 2, 2, 0); // would otherwise never end
+        TONEWRIGHT_CreateAudioSourceFromURI(u"nonsense://", 44100, 2, 2, 0); // must not call this again
     };
     EXPECT_EQ(TONEWRIGHT_Host_CreateLog(0, nullptr, nullptr), nullptr);
     {
@@ -151,7 +151,7 @@ TEST_F(Host, FailuresAreRememberedForEachThread) {
     EXPECT_STREQ(lastFailure().message, "The handle is not an audio source");
 }
 
-// soxi and the encoder's own programs are the judges.
+// Checked against soxi and the encoders' own programs.
 TEST_F(Host, MediaInfoIsTheFilesOwn) {
     const struct {
         const char* name;
@@ -184,7 +184,7 @@ TEST_F(Host, MediaInfoIsTheFilesOwn) {
         EXPECT_EQ(std::string(info.codec).substr(0, std::string(each.codec).size()), each.codec) << each.name;
         EXPECT_STREQ(info.plugin, each.plugin);
 
-        // The file's own format, whatever the source delivers; and a closed source is closed again.
+        // The file's own format, whatever the source delivers; a closed source is closed again afterwards.
         const CHandle other(
             TONEWRIGHT_CreateAudioSourceFromURI(uriOf(file).c_str(), 44100, each.channels, 2, 0));
         TONEWRIGHT_MediaInfo again = {};
@@ -228,7 +228,7 @@ TEST_F(Host, CapabilitiesAreWhatTheEncoderTakes) {
     EXPECT_TRUE(std::filesystem::is_empty(folder.path()));
 }
 
-// flac is the judge of what the encoder got from the host's functions.
+// flac checks the sound that the encoder got from the host's functions.
 TEST_F(Host, CallbackSourceDeliversEverySample) {
     const SSound sound = makeNoise(44100, 2, 16, 30011);
     struct SHostData {
@@ -244,7 +244,7 @@ TEST_F(Host, CallbackSourceDeliversEverySample) {
         if (host.failAt >= 0 && host.position / 4 >= static_cast<size_t>(host.failAt)) return -1;
         const size_t size =
             std::min<size_t>(static_cast<size_t>(frames) * 4, host.pcm.size() - host.position);
-        const size_t some = size > 400 ? size / 4 / 3 * 4 : size; // fewer than wanted is legal
+        const size_t some = size > 400 ? size / 4 / 3 * 4 : size; // fewer than requested is allowed
         std::memcpy(samples, host.pcm.data() + host.position, some);
         host.position += some;
         return static_cast<int64_t>(some / 4);
@@ -260,7 +260,7 @@ TEST_F(Host, CallbackSourceDeliversEverySample) {
                 TONEWRIGHT_Host_CreateSourceFromCallbacks(44100, 2, 2, length, &callbacks, &data));
             ASSERT_EQ(encode(source, folder / "out.flac", 44100, 2, 2), TONEWRIGHT_OK)
                 << lastFailure().message;
-            EXPECT_EQ(TONEWRIGHT_AudioSource_Open(source), TONEWRIGHT_AUDIO_FAILED); // it cannot start again
+            EXPECT_EQ(TONEWRIGHT_AudioSource_Open(source), TONEWRIGHT_AUDIO_FAILED); // it cannot restart
         }
         ASSERT_EQ(run({"flac", "-d", "-f", "-s", "--force-raw-format", "--endian=little", "--sign=signed",
                        "-o", folder / "out.raw", folder / "out.flac"})
@@ -381,7 +381,7 @@ TEST_F(Host, OutputAppearsCompleteOrNotAtAll) {
         write(output, "new");
         EXPECT_FALSE(std::filesystem::exists(file));
     }
-    EXPECT_EQ(countEntries(folder.path()), 2u); // nothing left
+    EXPECT_EQ(countEntries(folder.path()), 2u); // no temporary files left
     {
         const CHandle output(create(folder / "real/a.wav"));
         EXPECT_EQ(create(folder / "linked/a.wav", TONEWRIGHT_OUTPUT_REPLACE), nullptr); // the same file
@@ -390,7 +390,7 @@ TEST_F(Host, OutputAppearsCompleteOrNotAtAll) {
     }
     EXPECT_EQ(readFile(folder / "real/a.wav"), "first");
 
-    // A private file stays private, also while its successor is written, and a link stays a link.
+    // A private file stays private, even while its replacement is written, and a link stays a link.
     std::filesystem::permissions(folder / "real/a.wav", std::filesystem::perms(0600));
     std::filesystem::create_symlink("real/a.wav", folder / "link.wav");
     {
@@ -404,7 +404,7 @@ TEST_F(Host, OutputAppearsCompleteOrNotAtAll) {
     EXPECT_EQ(readFile(folder / "real/a.wav"), "second");
     EXPECT_EQ(std::filesystem::status(folder / "real/a.wav").permissions(), std::filesystem::perms(0600));
 
-    // A target that has appeared meanwhile, a dangling link, and the files of others.
+    // A target created in the meantime, a dangling link, and the files of other jobs.
     {
         const CHandle output(create(file));
         write(output, "late");
@@ -426,7 +426,7 @@ TEST_F(Host, OutputAppearsCompleteOrNotAtAll) {
         EXPECT_EQ(create(folder / bad), nullptr) << bad;
 }
 
-// mutagen reads what was copied.
+// Checked by reading the copy with mutagen.
 TEST_F(Host, TagsAreCopiedWhole) {
     const std::string from = folder / "a.flac";
     for (const char* name : {"a.flac", "b.flac", "c.wav"})

@@ -52,7 +52,7 @@ public:
     CProcess& operator=(const CProcess&) = delete;
 
     pid_t getId() const { return m_id; }
-    // Must not be called after waiting: the id would then address every process.
+    // Must not be called after waiting: the id would then address all processes.
     void signal(int number) const {
         if (m_id > 0) ::kill(m_id, number);
     }

@@ -20,7 +20,7 @@ namespace tests {
 using peru::P;
 using peru::media::CAudioFormat;
 
-// Common to both directions. By default a device supports every format.
+// Base of both directions. By default a device supports every format.
 template <class Interface> class TScriptedDevice : public peru::CObject, public Interface {
 public:
     std::function<P<CAudioFormat>(int32_t rate, int32_t bytes, int32_t channels)> takes =
@@ -176,7 +176,7 @@ private:
 };
 
 // Delivers data passed to deliver(), on the calling thread, or returned by `next`, on its own thread. Like a
-// real device it waits in close() and removeListener() for calls under way.
+// real device it waits in close() and removeListener() for calls in progress.
 class CScriptedInDevice : public TScriptedDevice<peru::media::IAudioInDevice> {
 public:
     ~CScriptedInDevice() override { join(); }

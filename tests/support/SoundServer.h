@@ -20,7 +20,7 @@ namespace tests {
 
 enum class EMicrophone {
     none,    // the input device hears what the output device plays
-    isolated // it hears what play() plays, and a second input device, "microphone", does so too
+    isolated // it hears what play() plays, as does a second input device, "microphone"
 };
 
 // All sound is 44100 Hz, 2 channels, 16 bits and passes unchanged. During its lifetime this process and its

@@ -20,18 +20,18 @@ namespace fs = std::filesystem;
 
 namespace {
 
-// Temporary files of this process that are in use, by name: a file lock does not exclude its own process.
+// Temporary files in use by this process, by path; excludes its other jobs whether the file is locked or not.
 std::mutex g_mutex;
 std::set<std::string> g_claimed;
 std::set<std::string> g_swept; // folders
 
 constexpr auto kLeftoverAge = std::chrono::minutes(1);
 
-// Removes what killed processes have left in a folder: empty files of the suffix and any number that nobody
-// has locked.
+// Removes the files that killed processes have left in a folder: empty, unlocked files with this suffix and
+// any number.
 void sweep(const fs::path& folder, std::string suffix) {
     const size_t digits = suffix.find_last_not_of("0123456789") + 1;
-    if (digits == suffix.size()) return; // not numbered by process
+    if (digits == suffix.size()) return; // the suffix has no process number
     suffix.resize(digits);
     std::error_code error;
     for (const fs::directory_entry& entry : fs::directory_iterator(folder, error)) {
@@ -71,7 +71,7 @@ COutput::COutput(const std::string& path, const std::string& suffix, int32_t fla
     try {
         create();
     } catch (...) {
-        m_isOver = true; // nothing of ours is there
+        m_isOver = true; // there is nothing to remove
         std::lock_guard lock(g_mutex);
         g_claimed.erase(m_temporary);
         throw;
@@ -88,7 +88,7 @@ COutput::~COutput() {
 void COutput::findTarget(const std::string& path) {
     std::error_code error;
     fs::path target = fs::absolute(path, error);
-    // A dangling link means the file that it names.
+    // A dangling link stands for the file to which it points.
     for (int links = 0; links < 40 && fs::is_symlink(target, error); ++links) {
         const fs::path meant = fs::read_symlink(target, error);
         if (error) failSystem(path + " cannot be written", error.value());
@@ -96,7 +96,7 @@ void COutput::findTarget(const std::string& path) {
     }
     const std::string shownFolder =
         fs::path(path).has_parent_path() ? fs::path(path).parent_path() : target.parent_path();
-    // Two names of one folder must give one name of the temporary file.
+    // Different names of one folder must result in the same temporary file.
     const fs::path folder = fs::canonical(target.parent_path(), error);
     if (error == std::errc::no_such_file_or_directory) fail("The folder " + shownFolder + " does not exist");
     if (error) failSystem("The folder " + shownFolder + " cannot be used", error.value());
@@ -115,7 +115,7 @@ void COutput::findTarget(const std::string& path) {
         failSystem("The folder " + shownFolder + " cannot be written to", errno);
 }
 
-// A name at the limit of the file system is cut before its extension, which selects the format.
+// A name too long for the suffix is shortened before its extension, which selects the format.
 void COutput::nameTemporary(const std::string& suffix) {
     const fs::path target = m_target;
     std::string name = target.filename();
@@ -132,14 +132,14 @@ void COutput::nameTemporary(const std::string& suffix) {
     m_temporary = target.parent_path() / (name + suffix);
 }
 
-// Between processes the claim is a lock on the temporary file itself, which ends with the process. An encoder
-// locks a file that it creates.
+// Excludes other jobs of this process. Other processes are excluded by a lock on the temporary file, which
+// ends with the process that holds it; an encoder locks the file that it creates.
 void COutput::claim() {
     std::lock_guard lock(g_mutex);
-    if (!g_claimed.insert(m_temporary).second) fail("Another job writes to " + m_target + " already");
+    if (!g_claimed.insert(m_temporary).second) fail("Another job is already writing to " + m_target);
 }
 
-// What a process has left that is no longer there.
+// Removes the temporary file of a process that has ended.
 void COutput::removeLeftover() const {
     const int left = ::open(m_temporary.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
     if (left < 0) failSystem(m_temporary + " cannot be replaced", errno);
@@ -149,7 +149,7 @@ void COutput::removeLeftover() const {
     if (isFree) ::unlink(m_temporary.c_str());
     ::close(left);
     if (!isFile) fail(m_temporary + " cannot be replaced: It is not a regular file");
-    if (!isFree) fail("Another program writes to " + m_target + " already");
+    if (!isFree) fail("Another program is already writing to " + m_target);
 }
 
 void COutput::create() {
@@ -158,7 +158,7 @@ void COutput::create() {
     if (isLeft && !(m_flags & TONEWRIGHT_OUTPUT_REPLACE)) fail(m_temporary + " was left by an earlier run");
     if (isLeft) removeLeftover();
     if (m_flags & TONEWRIGHT_OUTPUT_LIVE) return; // the encoder creates it
-    // A file that replaces a private one must be private from the beginning; its mode is set by commit.
+    // A file that replaces a private one must be private from the beginning; commit sets the final mode.
     const bool replaces = ::stat(m_target.c_str(), &status) == 0;
     m_lock = ::open(m_temporary.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC,
                     replaces ? S_IRUSR | S_IWUSR : 0666);
@@ -171,7 +171,7 @@ void COutput::commit() {
     if (file < 0) failSystem(m_target + " cannot be completed", errno);
     struct stat status;
     if ((m_flags & TONEWRIGHT_OUTPUT_REPLACE) && ::stat(m_target.c_str(), &status) == 0) {
-        // Best effort: the file may have been another user's.
+        // Best effort: the target may belong to another user.
         if (::fchown(file, status.st_uid, status.st_gid) != 0) errno = 0;
         ::fchmod(file, status.st_mode & 07777);
     }
@@ -184,12 +184,12 @@ void COutput::commit() {
             failSystem(m_target + " cannot be replaced", errno);
     } else if (::renameat2(AT_FDCWD, m_temporary.c_str(), AT_FDCWD, m_target.c_str(), RENAME_NOREPLACE) !=
                0) {
-        // A file that has appeared meanwhile is not replaced, on a file system without that flag either.
-        if (errno == EEXIST) fail(m_target + " has appeared meanwhile");
+        // A file created in the meantime is not replaced, even if the file system does not support the flag.
+        if (errno == EEXIST) fail(m_target + " was created in the meantime");
         if (::link(m_temporary.c_str(), m_target.c_str()) == 0)
             ::unlink(m_temporary.c_str());
         else if (errno == EEXIST)
-            fail(m_target + " has appeared meanwhile");
+            fail(m_target + " was created in the meantime");
         else if (::access(m_target.c_str(), F_OK) == 0 ||
                  ::rename(m_temporary.c_str(), m_target.c_str()) != 0)
             failSystem(m_target + " cannot be created", errno);
@@ -197,7 +197,7 @@ void COutput::commit() {
     m_isOver = true;
     const int folder = ::open(fs::path(m_target).parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     if (folder >= 0) {
-        ::fsync(folder); // the name itself; some file systems have nothing to do for it
+        ::fsync(folder); // makes the new name durable; not supported by all file systems
         ::close(folder);
     }
 }

@@ -1,4 +1,4 @@
-// What a host of many conversions in one process relies on, through the exports and with the real plug-ins.
+// Many conversions in one process, through the exports and with the real plug-ins.
 #include "host/Wav.h"
 #include "support/Environment.h"
 #include "support/TempFolder.h"
@@ -17,7 +17,7 @@ using namespace tests;
 
 namespace {
 
-std::u16string toURI(const std::filesystem::path& path) { // plain names only
+std::u16string toURI(const std::filesystem::path& path) { // names without special characters only
     const std::string text = "file://" + path.string();
     return {text.begin(), text.end()};
 }
@@ -47,7 +47,7 @@ protected:
         return result;
     }
 
-    CEnvironment quiet{"TONEWRIGHT_DEBUG_OUTPUT", "0"}; // failures are wanted here
+    CEnvironment quiet{"TONEWRIGHT_DEBUG_OUTPUT", "0"}; // failures are expected here
     CTempFolder folder;
 };
 
@@ -55,7 +55,7 @@ protected:
 
 TEST_F(Conversion, LeavesNothingBehindThousandsOfTimes) {
 #ifdef TONEWRIGHT_SANITIZED
-    constexpr int kRuns = 200; // slower, and leaks are told anyway
+    constexpr int kRuns = 200; // slower, and leaks are reported anyway
 #else
     constexpr int kRuns = 2000;
     constexpr long kMargin = 2048; // kB; less than 2 kB for each run
