@@ -72,9 +72,10 @@ function(tw_library name)
     endif()
 endfunction()
 
-# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...]): a test binary built from the current folder.
+# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...] [SERIAL test...]): a test binary built from the
+# current folder. The SERIAL tests run alone.
 function(tw_test name)
-    cmake_parse_arguments(arg "" "" "FOLDERS;PRIVATE;LABELS" ${ARGN})
+    cmake_parse_arguments(arg "" "" "FOLDERS;PRIVATE;LABELS;SERIAL" ${ARGN})
     tw_sources(sources ${arg_FOLDERS})
     if(NOT sources)
         return()
@@ -87,7 +88,14 @@ function(tw_test name)
     # sanitizer covers the code under test only.
     target_compile_options(${name} PRIVATE -O1 -g1 -fno-sanitize=undefined)
     target_precompile_headers(${name} PRIVATE <gtest/gtest.h> <string> <vector>)
-    gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 NO_PRETTY_VALUES PROPERTIES TIMEOUT 600 LABELS "${name};${arg_LABELS}")
+    set(settings DISCOVERY_TIMEOUT 60 NO_PRETTY_VALUES PROPERTIES TIMEOUT 600 LABELS "${name};${arg_LABELS}")
+    if(arg_SERIAL)
+        list(JOIN arg_SERIAL : serial)
+        gtest_discover_tests(${name} TEST_FILTER -${serial} ${settings})
+        gtest_discover_tests(${name} TEST_FILTER ${serial} TEST_LIST ${name}_serial ${settings} RUN_SERIAL ON)
+    else()
+        gtest_discover_tests(${name} ${settings})
+    endif()
 endfunction()
 
 # tw_benchmark(NAME lib...): a Google Benchmark binary built from the current folder.
