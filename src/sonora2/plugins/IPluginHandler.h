@@ -3,9 +3,9 @@
 
 #include "sonora2/media/IAudioFormat.h"
 #include "sonora2/media/IAudioSource.h"
-#include "sonora2/media/IVideoFormat.h"
 #include "sonora2/media/IVideoSource.h"
 #include "sonora2/plugins/ISonoraPlugin.h"
+#include "sonora2/plugins/IVideoFormat.h"
 
 namespace sonora2::common {
 
