@@ -1,5 +1,4 @@
-#include "filetag/FileTagFactory.h"
-#include "filetag/TagTransfer.h"
+#include "filetag/LazyLibrary.h"
 #include "host_support/Guard.h"
 #include "sonora2/plugins/PluginExtensions.h"
 
@@ -42,9 +41,9 @@ struct SSource {
 SSource readSource(const P<peru::IURI>& file) {
     SSource source;
     try {
-        source.all = filetag::readAllTags(file);
+        source.all = filetag::getLibrary()->readAllTags(file);
         if (sonora2::common::getLookupKey(file, nullptr)->equals("wav"))
-            if (const P<IFileTag> own = filetag::CFileTagFactory::get()->create(file))
+            if (const P<IFileTag> own = filetag::getLibrary()->createTag(file))
                 for (const auto& field : kFields) source.texts.push_back(((*own).*field.get)());
     } catch (const peru::CFileFormatNotSupportedError&) {
         // Keep what has been read so far.
@@ -55,12 +54,13 @@ SSource readSource(const P<peru::IURI>& file) {
 // Stores the fields of a WAVE file that TagLib has missed. Returns their keys.
 std::vector<std::string> complement(const SSource& source, const P<peru::IURI>& file) {
     std::vector<std::string> stored;
-    const P<IFileTag> target = source.texts.empty() ? nullptr : filetag::CFileTagFactory::get()->create(file);
+    const P<IFileTag> target = source.texts.empty() ? nullptr : filetag::getLibrary()->createTag(file);
     if (!target) return stored;
     for (size_t i = 0; i < source.texts.size(); ++i) {
-        if (source.texts[i]->isEmpty() || !((*target).*kFields[i].get)()->isEmpty()) continue;
-        ((*target).*kFields[i].set)(source.texts[i]);
-        if (!((*target).*kFields[i].get)()->isEmpty()) stored.push_back(kFields[i].key);
+        const auto& field = kFields[i];
+        if (source.texts[i]->isEmpty() || !((*target).*field.get)()->isEmpty()) continue;
+        ((*target).*field.set)(source.texts[i]);
+        if (!((*target).*field.get)()->isEmpty()) stored.push_back(field.key);
     }
     if (!stored.empty()) target->store();
     return stored;
@@ -70,7 +70,7 @@ std::vector<std::string> complement(const SSource& source, const P<peru::IURI>& 
 std::string writeTarget(const SSource& source, const P<peru::IURI>& to) {
     std::vector<std::string> lost;
     try {
-        const filetag::STransferReport report = filetag::addTags(to, source.all);
+        const filetag::STransferReport report = filetag::getLibrary()->addTags(to, source.all);
         const std::vector<std::string> stored = complement(source, to);
         for (const P<IString>& field : report.lostFields) {
             const std::string name = CString::toStdString(field);

@@ -1,8 +1,8 @@
-#include "filetag/FileTagFactory.h"
 #include "peru/log/ILog.h"
 #include "sonora2/plugins/PluginExtensions.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
+#include "tonewright/exports/FileTags.h"
 #include "tonewright/exports/Handles.h"
 
 using namespace tonewright;
@@ -16,7 +16,7 @@ void TONEWRIGHT_InitDiscio(uint8_t /*flag*/) {
 void TONEWRIGHT_SetTempExtension(const char16_t* extension) {
     barrier([&] {
         requireApp()->getWritePluginHandler()->setURISuffix(toString(extension));
-        filetag::CFileTagFactory::get()->setTempExtension(toString(extension));
+        setTagTempExtension(toString(extension));
     });
 }
 
