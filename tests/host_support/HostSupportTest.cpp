@@ -8,9 +8,12 @@
 #include <tonewright/host.h>
 
 #include <atomic>
+#include <fcntl.h>
 #include <fstream>
 #include <random>
+#include <sys/file.h>
 #include <thread>
+#include <unistd.h>
 
 using namespace tests;
 
@@ -146,6 +149,7 @@ TEST_F(Host, FailuresAreRememberedForEachThread) {
         EXPECT_NE(std::string(failure.kind).find("Error"), std::string::npos) << failure.kind;
         EXPECT_STRNE(failure.title, "");
     }
+    EXPECT_EQ(TONEWRIGHT_Host_GetLastFailure(nullptr), 1);
     std::thread([] { EXPECT_EQ(TONEWRIGHT_Host_GetLastFailure(nullptr), 0); }).join();
     EXPECT_EQ(TONEWRIGHT_Host_GetMediaInfo(nullptr, nullptr), 0);
     EXPECT_STREQ(lastFailure().message, "The handle is not an audio source");
@@ -289,6 +293,7 @@ TEST_F(Host, ReaderSeeksToTheFrame) {
         ASSERT_EQ(TONEWRIGHT_Host_ReadFrames(reader, all.data(), 20000), 20000);
         EXPECT_TRUE(all == pcm);
         EXPECT_EQ(TONEWRIGHT_Host_ReadFrames(reader, all.data(), 1), 0);
+        EXPECT_EQ(TONEWRIGHT_Host_ReadFrames(reader, nullptr, 0), 0);
         std::mt19937 random(3);
         for (int i = 0; i < 50; ++i) {
             const size_t frame = random() % 20000, count = 1 + random() % 9000;
@@ -427,6 +432,25 @@ TEST_F(Host, OutputAppearsCompleteOrNotAtAll) {
 }
 
 // Checked by reading the copy with mutagen.
+TEST_F(Host, OutputSweepsWhatKilledProcessesLeft) {
+    const auto yesterday = std::filesystem::file_time_type::clock::now() - std::chrono::hours(24);
+    for (const auto& [name, bytes] :
+         std::initializer_list<std::pair<const char*, const char*>>{{"a.wav.part123", ""},
+                                                                    {"b.wav.part4", "sound"},
+                                                                    {"c.wav.part", ""},
+                                                                    {"part5.wav", ""},
+                                                                    {"d.wav.part6", ""}})
+        std::filesystem::last_write_time(folder.write(name, bytes), yesterday);
+    folder.write("young.wav.part8", "");
+    const int locked = ::open((folder / "d.wav.part6").c_str(), O_RDONLY);
+    ASSERT_EQ(::flock(locked, LOCK_EX), 0);
+    { const CHandle output(TONEWRIGHT_Host_CreateOutput((folder / "x.wav").c_str(), ".part7", 0)); }
+    ::close(locked);
+    EXPECT_FALSE(std::filesystem::exists(folder / "a.wav.part123"));
+    for (const char* kept : {"b.wav.part4", "c.wav.part", "part5.wav", "d.wav.part6", "young.wav.part8"})
+        EXPECT_TRUE(std::filesystem::exists(folder / kept)) << kept;
+}
+
 TEST_F(Host, TagsAreCopiedWhole) {
     const std::string from = folder / "a.flac";
     for (const char* name : {"a.flac", "b.flac", "c.wav"})
