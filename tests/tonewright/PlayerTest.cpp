@@ -368,6 +368,10 @@ TEST_F(Player, Threads_MayCallEverythingAtOnce) {
     last.join();
     EXPECT_EQ(p.stop(), 0);
     EXPECT_EQ(p.device->overlaps, 0);
+    // A seek of a stopped player is where the next play begins.
+    const auto control = behind<tonewright::IPlayerControl>(p.player);
+    control->seek(0);
+    control->setVolume(1);
     EXPECT_EQ(p.play(), 0);
     EXPECT_TRUE(p.device->written() == playedBytes(script));
 }

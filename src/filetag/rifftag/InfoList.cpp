@@ -71,13 +71,18 @@ void CInfoList::set(const FourCC& id, std::string_view value) {
 std::vector<uint8_t> CInfoList::render(bool padded) const {
     std::vector<uint8_t> chunk(m_chunk.begin(), m_chunk.begin() + kListHeader);
     std::vector<uint8_t> unpadded;
+    std::vector<FourCC> late; // ids of the entries in there
     SEntry entry{0, 0, kListHeader};
     while (getEntry(entry.end, entry)) {
         const size_t value = entry.offset + kEntryHeader;
         const bool odd = entry.size % 2 != 0;
         const bool hasPad = entry.end > value + entry.size;
-        std::vector<uint8_t>& target = odd && !padded && !hasPad ? unpadded : chunk;
         const SChunkHeader header{readId(entry.offset), static_cast<uint32_t>(entry.size)};
+        // Of several entries of one id the first one counts, so that the others stay behind it.
+        const bool isLate = std::find(late.begin(), late.end(), header.id) != late.end();
+        const bool isLast = isLate || (odd && !padded && !hasPad);
+        if (isLast && !isLate) late.push_back(header.id);
+        std::vector<uint8_t>& target = isLast ? unpadded : chunk;
         const auto* bytes = reinterpret_cast<const uint8_t*>(&header);
         target.insert(target.end(), bytes, bytes + sizeof header);
         const auto begin = m_chunk.begin() + static_cast<ptrdiff_t>(value);
