@@ -29,6 +29,7 @@ struct SConvertOptions : SFormatOptions {
     bool force = false;
     bool carryTags = true;
     bool salvage = false;
+    std::string resampler; // "default" or "best"; empty: as the environment says
     EOutput show = EOutput::normal;
 };
 

@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <cstdlib>
 #include <set>
 #include <sstream>
 #include <stdexcept>
@@ -167,6 +168,8 @@ fs::path chooseOutput(const SConvertOptions& options, const fs::path& input) {
 
 int convert(CLibrary& library, const SConvertOptions& options) {
     if (!options.directory.empty()) fs::create_directories(options.directory);
+    // Read whenever a conversion starts; no other thread runs yet.
+    if (!options.resampler.empty()) ::setenv("TONEWRIGHT_RESAMPLER", options.resampler.c_str(), 1);
     CProgress progress(options.show);
     CConverter converter(library, options, progress);
 

@@ -121,6 +121,11 @@ void addConvert(CLI::App& app, SConvertOptions& options, Run& run) {
         ->option_text("N")
         ->check(CLI::Range(1, 256));
     command->add_flag("-f,--force", options.force, "Replace existing files");
+    command
+        ->add_option("--resampler", options.resampler,
+                     "default, or best: a steeper filter for changes of the sample rate")
+        ->option_text("NAME")
+        ->check(CLI::IsMember({"default", "best"}).description(""));
     command->add_flag("--salvage", options.salvage,
                       "Replace damaged parts of the input with silence instead of failing");
     command->add_flag_callback(

@@ -124,6 +124,22 @@ TEST_F(Convert, WritesWhatPeersRead) {
     }
 }
 
+// A tone between the two limits of Nyquist must not come back as another one.
+TEST_F(Convert, BestResamplerLeavesNoAlias) {
+    peer({"sox", "-n", "-r", "96000", "-b", "24", "-c", "1", "high.wav", "synth", "1", "sine", "23000", "vol",
+          "0.5"});
+    double peaks[2] = {};
+    for (const bool best : {false, true}) {
+        succeed({"convert", "high.wav", "-f", "-o", "low.wav", "--rate", "44100", "--resampler",
+                 best ? "best" : "default"});
+        const std::string stats =
+            run({"sox", (folder / "low.wav").string(), "-n", "trim", "0.1", "0.8", "stat"}).err;
+        peaks[best] = std::stod(stats.substr(stats.find("Maximum amplitude:") + 18));
+    }
+    EXPECT_GT(peaks[0], 0.05);
+    EXPECT_LT(peaks[1], 0.001);
+}
+
 TEST_F(Convert, MeansWhatTheOptionsSay) {
     static const struct {
         SSound input;
