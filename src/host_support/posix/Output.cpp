@@ -34,17 +34,19 @@ void sweep(const fs::path& folder, std::string suffix) {
     if (digits == suffix.size()) return; // the suffix has no process number
     suffix.resize(digits);
     std::error_code error;
-    for (const fs::directory_entry& entry : fs::directory_iterator(folder, error)) {
-        const std::string name = entry.path().filename();
-        const size_t end = name.find_last_not_of("0123456789") + 1;
-        if (end == name.size() || !name.substr(0, end).ends_with(suffix)) continue;
-        const int file = ::open(entry.path().c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
+    for (fs::directory_iterator entries(folder, error), end; !error && entries != end;
+         entries.increment(error)) {
+        const fs::path& path = entries->path();
+        const std::string name = path.filename();
+        const size_t number = name.find_last_not_of("0123456789") + 1;
+        if (number == name.size() || !name.substr(0, number).ends_with(suffix)) continue;
+        const int file = ::open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
         struct stat status;
         if (file >= 0 && ::fstat(file, &status) == 0 && S_ISREG(status.st_mode) && status.st_size == 0 &&
             std::chrono::system_clock::from_time_t(status.st_mtime) <
                 std::chrono::system_clock::now() - kLeftoverAge &&
             ::flock(file, LOCK_EX | LOCK_NB) == 0)
-            ::unlink(entry.path().c_str());
+            ::unlink(path.c_str());
         if (file >= 0) ::close(file);
     }
 }
@@ -62,16 +64,15 @@ void sweep(const fs::path& folder, std::string suffix) {
 COutput::COutput(const std::string& path, const std::string& suffix, int32_t flags) : m_flags(flags) {
     findTarget(path);
     nameTemporary(suffix);
-    claim();
     const std::string folder = fs::path(m_target).parent_path();
     if (std::unique_lock lock(g_mutex); g_swept.insert(folder).second) {
         lock.unlock();
         sweep(folder, suffix);
     }
+    claim();
     try {
         create();
     } catch (...) {
-        m_isOver = true; // there is nothing to remove
         std::lock_guard lock(g_mutex);
         g_claimed.erase(m_temporary);
         throw;
