@@ -39,14 +39,6 @@ std::string tellReason(const SEncodeFiles& files, const std::string& temporaryEn
     return asReason(std::move(reason), files.input);
 }
 
-} // namespace
-
-std::string setTemporaryEnding(CLibrary& library) {
-    const std::string ending = ".part" + std::to_string(::getpid());
-    library.SetTempExtension(std::u16string(ending.begin(), ending.end()).c_str());
-    return ending;
-}
-
 CHandle createFormat(CLibrary& library, const fs::path& temporary, const SSampleFormat& samples,
                      const SFormatOptions& options) {
     const double quality = options.quality ? std::max(*options.quality, 1e-9) : 0.0; // 0.0 means unset
@@ -54,6 +46,14 @@ CHandle createFormat(CLibrary& library, const fs::path& temporary, const SSample
     return CHandle(library.CreateAudioFormatFromURI(toURI(temporary).c_str(), samples.rate, samples.channels,
                                                     samples.bytesPerSample, quality, options.bitRate,
                                                     options.minBitRate, options.maxBitRate));
+}
+
+} // namespace
+
+std::string setTemporaryEnding(CLibrary& library) {
+    const std::string ending = ".part" + std::to_string(::getpid());
+    library.SetTempExtension(std::u16string(ending.begin(), ending.end()).c_str());
+    return ending;
 }
 
 CHandle requireFormat(CLibrary& library, const fs::path& temporary, const SSampleFormat& samples,

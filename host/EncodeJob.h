@@ -12,11 +12,8 @@ namespace host {
 // Sets the library's suffix of files still being written, for the whole process, and returns it.
 std::string setTemporaryEnding(CLibrary& library);
 
-// Empty if the target cannot be written in this format; takeFailure() then returns the reason, if one is
-// known.
-CHandle createFormat(CLibrary& library, const std::filesystem::path& temporary, const SSampleFormat& samples,
-                     const SFormatOptions& options);
-// The same, but throws std::runtime_error. `subject` is the name of the output in the message.
+// A format that writes to `temporary`. Throws std::runtime_error with the reason if the target cannot be
+// written like this; `subject` is the name of the output in the message.
 CHandle requireFormat(CLibrary& library, const std::filesystem::path& temporary, const SSampleFormat& samples,
                       const SFormatOptions& options, const std::filesystem::path& output,
                       const std::string& subject);

@@ -1,7 +1,5 @@
 // Queries the plug-ins for the properties of files and the capabilities of targets.
 #include "host_support/Guard.h"
-#include "peru/strings/StringFormat.h"
-#include "peru/system/IPathes.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
 #include "sonora2/media/IMediaDescription.h"

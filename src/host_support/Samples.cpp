@@ -1,9 +1,6 @@
 // Host-defined sources, and reading the samples of any source.
 #include "host_support/Guard.h"
 #include "host_support/HostSource.h"
-#include "sonora2/context/SonoraContextAudio.h"
-#include "sonora2/encoding/SampleReader.h"
-#include "sonora2/plugins/MediaEnvironment.h"
 
 #include <limits>
 #include <memory>
@@ -13,6 +10,8 @@ using namespace tonewright::host_support;
 using sonora2::common::IAudioSource;
 
 namespace {
+
+constexpr int64_t kMostFrames = INT64_C(1) << 48; // of a call; more does not fit into memory
 
 // Shared by the read and seek functions of one source.
 struct SUser {
@@ -134,7 +133,7 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_CreateReader(TONEWRIGHT_Handle source) {
 int64_t TONEWRIGHT_Host_ReadFrames(TONEWRIGHT_Handle reader, void* samples, int64_t frames) {
     return guard<int64_t>(-1, [&] {
         const P<CReader> object = require<CReader>(reader, "a reader");
-        if (frames < 0 || (!samples && frames > 0))
+        if (frames < 0 || frames > kMostFrames || (!samples && frames > 0))
             throw peru::CError("The buffer or the number of frames is invalid");
         return object->read(static_cast<uint8_t*>(samples), frames);
     });

@@ -27,9 +27,9 @@ constexpr struct {
 
 struct SSource {
     filetag::STags all;
-    P<IFileTag>
-        own; // read by the tag classes of the exports, which find fields of WAVE files that TagLib does not
-    std::vector<P<IString>> texts; // of `own`, parallel to kFields
+    // Of a WAVE file, where the tag class of the exports finds fields that TagLib does not; parallel to
+    // kFields.
+    std::vector<P<IString>> texts;
 
     bool isEmpty() const {
         return all.fields.empty() && all.pictures.empty() &&
