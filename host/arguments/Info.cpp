@@ -1,0 +1,20 @@
+#include "commands/Info.h"
+#include "arguments/Arguments.h"
+
+#include <memory>
+
+namespace host {
+
+void addInfo(CLI::App& app, Run& run) {
+    const auto files = std::make_shared<std::vector<std::filesystem::path>>();
+    const auto json = std::make_shared<bool>(false);
+    CLI::App* command = app.add_subcommand(
+        "info", "Show duration, sample rate, channels and bits per sample of sound files.");
+    command->add_option("FILE", *files, "Files to examine")->required()->option_text("...");
+    command->add_flag("--json", *json, "Print one JSON object per line");
+    command->callback([files, json, &run] {
+        run = [files, json](CLibrary& library) { return showInfo(library, *files, *json); };
+    });
+}
+
+} // namespace host

@@ -1,0 +1,29 @@
+// What the arguments of several commands have in common.
+#pragma once
+
+#include "library/Library.h"
+#include "media/FormatOptions.h"
+#include "terminal/Progress.h"
+
+#include <CLI/CLI.hpp>
+#include <functional>
+#include <set>
+#include <string>
+
+namespace host {
+
+// The command that the user chose; set by the parser. Returns an exit code.
+using Run = std::function<int(CLibrary&)>;
+
+// A check for numbers, since CLI::Range accepts NaN.
+std::string isNumber(const std::string& text);
+
+// The options of the output format. `widths` are the bits per sample to choose from.
+void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& widths);
+// Throws CLI::ValidationError if the bit rates contradict each other.
+void checkBitRates(const SFormatOptions& options);
+
+// "--json" and "--quiet".
+void addOutput(CLI::App& command, EOutput& show);
+
+} // namespace host

@@ -1,0 +1,209 @@
+#include "commands/Convert.h"
+#include "base/Cancel.h"
+#include "base/ExitCodes.h"
+#include "base/Text.h"
+#include "library/Failure.h"
+#include "media/EncodeJob.h"
+#include "media/Output.h"
+#include "media/SoundFile.h"
+
+#include <algorithm>
+#include <atomic>
+#include <cstdlib>
+#include <set>
+#include <sstream>
+#include <stdexcept>
+#include <system_error>
+#include <thread>
+
+namespace host {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+class CConverter {
+public:
+    CConverter(CLibrary& library, const SConvertOptions& options, CProgress& progress)
+        : m_library(library), m_options(options), m_progress(progress),
+          m_temporaryEnding(setTemporaryEnding(library)) {}
+
+    // True if the file was written. Thread-safe.
+    bool run(const fs::path& input, const fs::path& output);
+
+private:
+    struct SEnds {
+        CHandle source;
+        CHandle format;
+    };
+
+    void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
+    void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
+                  CProgress::Job job);
+    void warn(const CHandle& source, const fs::path& input, CProgress::Job job);
+    SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
+    std::vector<SSampleFormat> listCandidates(const SSampleFormat& own) const;
+
+    CLibrary& m_library;
+    const SConvertOptions& m_options;
+    CProgress& m_progress;
+    std::string m_temporaryEnding;
+};
+
+// The preferred format first, then those that most targets can hold. Values set by the user never change.
+std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) const {
+    std::vector<SSampleFormat> candidates;
+    const auto add = [&](int rate, int channels, int bytes) {
+        const SSampleFormat candidate{m_options.rate.value_or(rate), m_options.channels.value_or(channels),
+                                      m_options.bits ? *m_options.bits / 8 : bytes};
+        if (std::find(candidates.begin(), candidates.end(), candidate) == candidates.end())
+            candidates.push_back(candidate);
+    };
+    // Rates that a limited codec may accept: the next higher ones first, a lower one only if there are none.
+    std::vector<int> rates{own.rate};
+    for (int rate : {8000, 11025, 16000, 22050, 32000, 44100, 48000})
+        if (rate > own.rate) rates.push_back(rate);
+    if (rates.size() == 1) rates.push_back(own.rate % 11025 == 0 ? 44100 : 48000);
+    for (int rate : rates)
+        for (int channels : {own.channels, 2, 1})
+            for (int bytes : {own.bytesPerSample, 3, 2})
+                if (channels <= own.channels && bytes <= std::max(own.bytesPerSample, 2))
+                    add(rate, channels, bytes);
+    return candidates;
+}
+
+// Creates a format that the target can hold, and a source that delivers it. The input is opened only once.
+CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& temporary,
+                                       const fs::path& output) {
+    SSoundFile sound = openSoundFile(input);
+    const std::u16string target = toURI(temporary);
+    const std::vector<SSampleFormat> candidates = listCandidates(sound.samples);
+    const auto fits = [&](const SSampleFormat& samples) {
+        return TONEWRIGHT_Host_CanWrite(target.c_str(), samples.rate, samples.channels,
+                                        samples.bytesPerSample) == 1;
+    };
+    const auto found = std::find_if(candidates.begin(), candidates.end(), fits);
+    const SSampleFormat samples = found == candidates.end() ? candidates.front() : *found;
+
+    SEnds ends;
+    ends.format = requireFormat(m_library, temporary, samples, m_options, output, output.string());
+    clearFailure();
+    if (samples != sound.samples &&
+        TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels,
+                                        samples.bytesPerSample) != 1)
+        throw std::runtime_error(takeFailure(
+            "Cannot be converted from " + describe(sound.samples) + " to " + describe(samples), input));
+    ends.source = std::move(sound.source);
+    if (m_options.salvage) TONEWRIGHT_Host_SetSalvage(ends.source.get(), 1);
+    return ends;
+}
+
+// Fields that the output's format cannot hold are omitted with a warning. A tag that cannot be read does not
+// fail the conversion.
+void CConverter::carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
+                          CProgress::Job job) {
+    clearFailure();
+    char* lost = nullptr;
+    const int32_t copied = TONEWRIGHT_Host_CopyTags(toURI(input).c_str(), toURI(temporary).c_str(), &lost);
+    if (copied == 0)
+        return m_progress.warn(job, "The tag could not be read and is not copied: " +
+                                        takeFailure("unknown", input));
+    if (copied < 0) {
+        std::string reason = takeFailure("unknown", temporary);
+        replaceAll(reason, m_temporaryEnding, "");
+        throw std::runtime_error("The tag of " + output.native() + " could not be written: " + reason);
+    }
+    if (lost) m_progress.warn(job, std::string("The new file cannot hold these fields of the tag: ") + lost);
+    TONEWRIGHT_Host_Free(lost);
+}
+
+// Reports the decoder's warnings.
+void CConverter::warn(const CHandle& source, const fs::path& input, CProgress::Job job) {
+    char* const lines = TONEWRIGHT_Host_TakeWarnings(source.get());
+    if (!lines) return;
+    std::istringstream text(lines);
+    TONEWRIGHT_Host_Free(lines);
+    for (std::string line; std::getline(text, line);) m_progress.warn(job, asReason(withPaths(line), input));
+}
+
+void CConverter::convert(const fs::path& input, const fs::path& output, CProgress::Job job) {
+    const auto started = std::chrono::steady_clock::now();
+    checkInput(input);
+    if (isSameFile(input, output)) throw std::runtime_error("Input and output are the same file");
+    COutput place(output, m_temporaryEnding, m_options.force);
+
+    SEnds ends = openEnds(input, place.getTemporary(), output);
+    const double duration = m_library.AudioSource_GetDuration(ends.source.get());
+    const bool done = encode(m_library, ends.source, ends.format, m_progress, job,
+                             {input, place.getTemporary(), output}, m_temporaryEnding);
+    warn(ends.source, input, job);
+    ends = {};
+    if (!done) return m_progress.cancel(job);
+    if (m_options.carryTags) carryTag(input, place.getTemporary(), output, job);
+    const uint64_t bytes = fs::file_size(place.getTemporary());
+    place.commit();
+    const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
+    m_progress.finish(job, {duration, elapsed.count(), bytes, codecName(output)});
+}
+
+bool CConverter::run(const fs::path& input, const fs::path& output) {
+    const CProgress::Job job = m_progress.start(input, output, nlohmann::json::object());
+    try {
+        convert(input, output, job);
+        return !isCancelled();
+    } catch (const std::exception& error) {
+        m_progress.fail(job, error.what());
+        return false;
+    }
+}
+
+fs::path chooseOutput(const SConvertOptions& options, const fs::path& input) {
+    if (!options.output.empty()) return options.output;
+    fs::path name = input.filename();
+    name.replace_extension(options.extension);
+    return (options.directory.empty() ? input.parent_path() : options.directory) / name;
+}
+
+} // namespace
+
+int convert(CLibrary& library, const SConvertOptions& options) {
+    if (!options.directory.empty()) fs::create_directories(options.directory);
+    // Read whenever a conversion starts; no other thread runs yet.
+    if (!options.resampler.empty()) ::setenv("TONEWRIGHT_RESAMPLER", options.resampler.c_str(), 1);
+    CProgress progress(options.show);
+    CConverter converter(library, options, progress);
+
+    std::atomic<size_t> next{0};
+    std::atomic<bool> failed{false};
+    // If several inputs have the same target, the first one gets it, whatever the order of the threads.
+    std::vector<fs::path> outputs;
+    std::vector<bool> isFirst;
+    std::set<fs::path> taken;
+    for (const fs::path& input : options.inputs) {
+        outputs.push_back(chooseOutput(options, input));
+        isFirst.push_back(taken.insert(fs::absolute(outputs.back()).lexically_normal()).second);
+    }
+    const auto work = [&] {
+        for (size_t i; !isCancelled() && (i = next++) < options.inputs.size();) {
+            if (!isFirst[i]) {
+                progress.fail(progress.start(options.inputs[i], outputs[i], nlohmann::json::object()),
+                              "Another input is already converted to " + outputs[i].string());
+                failed = true;
+            } else if (!converter.run(options.inputs[i], outputs[i])) {
+                failed = true;
+            }
+        }
+    };
+    std::vector<std::thread> others;
+    const size_t threads = std::min<size_t>(static_cast<size_t>(options.jobs), options.inputs.size());
+    try {
+        for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
+    } catch (const std::system_error&) {
+        // No more threads available: the existing ones do all the work.
+    }
+    work();
+    for (std::thread& thread : others) thread.join();
+    return isCancelled() ? kExitCancelled : failed ? kExitFailure : kExitSuccess;
+}
+
+} // namespace host

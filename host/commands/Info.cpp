@@ -1,0 +1,60 @@
+#include "commands/Info.h"
+#include "base/Cancel.h"
+#include "base/ExitCodes.h"
+#include "base/Text.h"
+#include "commands/ForEachFile.h"
+#include "library/Failure.h"
+#include "media/SoundFile.h"
+#include "terminal/Progress.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <set>
+#include <stdexcept>
+#include <utility>
+
+namespace host {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+std::string codecOf(const SSoundFile& sound, const fs::path& file) {
+    return *sound.info.codec ? sound.info.codec : codecName(file);
+}
+
+std::string formatBitRate(int64_t bitsPerSecond) { // 320 kbit/s
+    return bitsPerSecond > 0 ? std::to_string((bitsPerSecond + 500) / 1000) + " kbit/s" : "-";
+}
+
+} // namespace
+
+int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
+    bool hasHeading = json;
+    return forEachFile(files, json, EReader::needed, [&](const fs::path& file) {
+        const SSoundFile sound = openSoundFile(file);
+        const TONEWRIGHT_MediaInfo& info = sound.info;
+        const uint64_t bytes = fs::file_size(file);
+        if (!std::exchange(hasHeading, true))
+            std::printf("%11s %7s %8s %5s %10s %10s  %-12s  %s\n", "duration", "rate", "channels", "bits",
+                        "bit rate", "size", "codec", "file");
+        if (json)
+            std::printf("%s\n", toLine({{"file", file.native()},
+                                        {"codec", codecOf(sound, file)},
+                                        {"duration", info.duration},
+                                        {"rate", info.sampleRate},
+                                        {"channels", info.channelCount},
+                                        {"bits", info.bytesPerSample * 8},
+                                        {"bit_rate", info.bitRate},
+                                        {"bytes", bytes},
+                                        {"plugin", info.plugin}})
+                                    .c_str());
+        else
+            std::printf("%11s %7d %8d %5d %10s %10s  %-12s  %s\n", formatDuration(info.duration).c_str(),
+                        info.sampleRate, info.channelCount, info.bytesPerSample * 8,
+                        formatBitRate(info.bitRate).c_str(), formatSize(bytes).c_str(),
+                        codecOf(sound, file).c_str(), toPrintable(file.native()).c_str());
+    });
+}
+
+} // namespace host

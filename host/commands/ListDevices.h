@@ -1,0 +1,9 @@
+// tonewright devices
+#pragma once
+
+namespace host {
+
+// Returns an exit code.
+int listDevices(bool json);
+
+} // namespace host

@@ -1,0 +1,76 @@
+#include "media/SoundFile.h"
+
+#include "base/Text.h"
+#include "library/Failure.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <stdexcept>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace host {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+[[noreturn]] void throwSystem(int error) {
+    throw std::runtime_error(std::strerror(error));
+}
+
+} // namespace
+
+SSoundFile openSoundFile(const fs::path& file) {
+    checkInput(file);
+    SSoundFile sound;
+    sound.info.size = sizeof sound.info;
+    clearFailure();
+    sound.source = CHandle(TONEWRIGHT_Host_OpenMedia(toURI(file).c_str(), &sound.info));
+    if (!sound.source) throw std::runtime_error(takeFailure("The file cannot be read", file));
+    sound.samples = {sound.info.sampleRate, sound.info.channelCount, sound.info.bytesPerSample};
+    return sound;
+}
+
+void checkInput(const fs::path& file) {
+    struct stat status;
+    if (::stat(file.c_str(), &status) != 0) throwSystem(errno);
+    if (S_ISDIR(status.st_mode)) throwSystem(EISDIR);
+    if (!S_ISREG(status.st_mode)) throw std::runtime_error("Is not a regular file");
+    if (status.st_size == 0) throw std::runtime_error("The file is empty");
+    if (::access(file.c_str(), R_OK) != 0) throwSystem(errno);
+}
+
+std::string describe(const SSampleFormat& samples) {
+    return std::to_string(samples.rate) + " Hz, " + std::to_string(samples.channels) +
+           (samples.channels == 1 ? " channel and " : " channels and ") +
+           std::to_string(samples.bytesPerSample * 8) + " bits";
+}
+
+std::string describeKind(const fs::path& file) {
+    return file.has_extension() ? file.extension().string() + " files" : "files without an extension";
+}
+
+std::string codecName(const fs::path& file) {
+    std::string extension = file.extension();
+    std::transform(extension.begin(), extension.end(), extension.begin(),
+                   [](unsigned char c) { return std::tolower(c); });
+    static constexpr struct {
+        const char* extension;
+        const char* codec;
+    } kCodecs[] = {{".flac", "FLAC"}, {".mp3", "MP3"},  {".ogg", "Ogg Vorbis"}, {".oga", "Ogg Vorbis"},
+                   {".wav", "WAV"},   {".wave", "WAV"}, {".aif", "AIFF"},       {".aiff", "AIFF"},
+                   {".au", "AU"},     {".snd", "AU"},   {".caf", "CAF"},        {".w64", "Wave64"},
+                   {".rf64", "RF64"}};
+    for (const auto& known : kCodecs)
+        if (extension == known.extension) return known.codec;
+    return extension.empty() ? "unknown" : extension.substr(1);
+}
+
+bool isSameFile(const fs::path& a, const fs::path& b) {
+    std::error_code none;
+    return fs::equivalent(a, b, none);
+}
+
+} // namespace host

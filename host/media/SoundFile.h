@@ -1,0 +1,44 @@
+// Input files.
+#pragma once
+
+#include "library/Library.h"
+
+#include <filesystem>
+#include <string>
+#include <tonewright/host.h>
+
+namespace host {
+
+struct SSampleFormat {
+    int rate = 44100;
+    int channels = 2;
+    int bytesPerSample = 2;
+
+    bool operator==(const SSampleFormat&) const = default;
+};
+
+// "44100 Hz, 2 channels and 16 bits"
+std::string describe(const SSampleFormat& samples);
+
+// A file opened in its own format: the source is open and converts nothing.
+struct SSoundFile {
+    CHandle source;
+    SSampleFormat samples;
+    TONEWRIGHT_MediaInfo info = {};
+};
+
+// Throws std::runtime_error with the reason.
+SSoundFile openSoundFile(const std::filesystem::path& file);
+
+// Throws std::runtime_error with the reason unless this is a readable regular file that is not empty.
+void checkInput(const std::filesystem::path& file);
+
+bool isSameFile(const std::filesystem::path& a, const std::filesystem::path& b);
+
+// ".xyz files", for messages.
+std::string describeKind(const std::filesystem::path& file);
+
+// Names the codec by the file's extension.
+std::string codecName(const std::filesystem::path& file);
+
+} // namespace host

@@ -1,0 +1,104 @@
+#include "terminal/Keyboard.h"
+
+#include "base/Cancel.h"
+
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <poll.h>
+#include <termios.h>
+#include <unistd.h>
+
+namespace host {
+
+namespace {
+
+constexpr std::array kSignals{SIGTSTP, SIGQUIT, SIGABRT, SIGSEGV, SIGBUS, SIGFPE, SIGILL};
+
+termios g_mode = {};                      // the terminal's original mode
+volatile std::sig_atomic_t g_isTaken = 0; // the terminal is in our mode
+struct sigaction g_reactions[kSignals.size()];
+
+// Changing the mode from the background would suspend the program.
+bool isForeground() {
+    return ::tcgetpgrp(STDIN_FILENO) == ::getpgrp();
+}
+
+void setMode(const termios& mode) {
+    while (::tcsetattr(STDIN_FILENO, TCSANOW, &mode) != 0 && errno == EINTR) {
+    }
+}
+
+void take() {
+    if (g_isTaken || isCancelled() || !isForeground()) return;
+    sigset_t all, old;
+    sigfillset(&all);
+    ::pthread_sigmask(SIG_SETMASK, &all, &old);
+    if (::tcgetattr(STDIN_FILENO, &g_mode) == 0) {
+        termios mode = g_mode;
+        mode.c_lflag &= ~static_cast<tcflag_t>(ICANON | ECHO);
+        mode.c_cc[VMIN] = 1;
+        mode.c_cc[VTIME] = 0;
+        setMode(mode);
+        g_isTaken = 1;
+    }
+    ::pthread_sigmask(SIG_SETMASK, &old, nullptr);
+}
+
+// Async-signal-safe.
+void giveBack() {
+    if (!g_isTaken) return;
+    g_isTaken = 0;
+    if (isForeground()) setMode(g_mode);
+}
+
+// Restores the terminal and lets the signal take its original effect. If the program continues after that,
+// the handler is installed again.
+void onSignal(int signal) {
+    const int error = errno;
+    giveBack();
+    size_t i = 0;
+    while (kSignals[i] != signal) ++i;
+    struct sigaction own;
+    sigset_t only, old;
+    sigemptyset(&only);
+    sigaddset(&only, signal);
+    ::sigaction(signal, &g_reactions[i], &own);
+    ::raise(signal);
+    ::pthread_sigmask(SIG_UNBLOCK, &only, &old);
+    ::pthread_sigmask(SIG_SETMASK, &old, nullptr);
+    ::sigaction(signal, &own, nullptr);
+    errno = error;
+}
+
+} // namespace
+
+CKeyboard::CKeyboard() {
+    struct sigaction action = {};
+    action.sa_handler = onSignal;
+    sigemptyset(&action.sa_mask);
+    for (size_t i = 0; i < kSignals.size(); ++i) {
+        ::sigaction(kSignals[i], nullptr, &g_reactions[i]);
+        if (g_reactions[i].sa_handler != SIG_IGN) ::sigaction(kSignals[i], &action, nullptr);
+    }
+    onCancel(giveBack);
+    take();
+}
+
+CKeyboard::~CKeyboard() {
+    onCancel(nullptr);
+    giveBack();
+    for (size_t i = 0; i < kSignals.size(); ++i) ::sigaction(kSignals[i], &g_reactions[i], nullptr);
+}
+
+char CKeyboard::wait(int milliseconds) {
+    take(); // again after the program was suspended or came to the foreground
+    pollfd input{STDIN_FILENO, POLLIN, 0};
+    if (::poll(&input, g_isTaken ? 1 : 0, milliseconds) <= 0) return 0;
+    char key = 0;
+    if ((input.revents & POLLIN) != 0 && ::read(STDIN_FILENO, &key, 1) == 1) return key;
+    ::poll(nullptr, 0, milliseconds); // poll() returns at once for a terminal that is gone
+    return 0;
+}
+
+} // namespace host
