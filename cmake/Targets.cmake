@@ -72,10 +72,10 @@ function(tw_library name)
     endif()
 endfunction()
 
-# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...] [SERIAL test...]): a test binary built from the
-# current folder. The SERIAL tests run alone.
+# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...] [REALTIME test...]): a test binary built from the
+# current folder. The REALTIME tests, patterns such as Play.*, get that label; scripts/run-tests.sh runs them apart.
 function(tw_test name)
-    cmake_parse_arguments(arg "" "" "FOLDERS;PRIVATE;LABELS;SERIAL" ${ARGN})
+    cmake_parse_arguments(arg "" "" "FOLDERS;PRIVATE;LABELS;REALTIME" ${ARGN})
     tw_sources(sources ${arg_FOLDERS})
     if(NOT sources)
         return()
@@ -88,13 +88,15 @@ function(tw_test name)
     # sanitizer covers the code under test only.
     target_compile_options(${name} PRIVATE -O1 -g1 -fno-sanitize=undefined)
     target_precompile_headers(${name} PRIVATE <gtest/gtest.h> <string> <vector>)
-    set(settings DISCOVERY_TIMEOUT 60 NO_PRETTY_VALUES PROPERTIES TIMEOUT 600 LABELS "${name};${arg_LABELS}")
-    if(arg_SERIAL)
-        list(JOIN arg_SERIAL : serial)
-        gtest_discover_tests(${name} TEST_FILTER -${serial} ${settings})
-        gtest_discover_tests(${name} TEST_FILTER ${serial} TEST_LIST ${name}_serial ${settings} RUN_SERIAL ON)
+    set(settings DISCOVERY_TIMEOUT 60 NO_PRETTY_VALUES PROPERTIES TIMEOUT 600)
+    if(arg_REALTIME)
+        list(JOIN arg_REALTIME : realtime)
+        gtest_discover_tests(${name} TEST_FILTER -${realtime} ${settings} LABELS "${name};${arg_LABELS}")
+        gtest_discover_tests(
+            ${name} TEST_FILTER ${realtime} TEST_LIST ${name}_realtime ${settings} LABELS "${name};realtime;${arg_LABELS}"
+        )
     else()
-        gtest_discover_tests(${name} ${settings})
+        gtest_discover_tests(${name} ${settings} LABELS "${name};${arg_LABELS}")
     endif()
 endfunction()
 

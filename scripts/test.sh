@@ -6,4 +6,4 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 preset=${TONEWRIGHT_PRESET:-release}
 scripts/build.sh "$preset"
-exec ctest --preset "$preset" -j "$(nproc)" "$@"
+exec scripts/run-tests.sh "$preset" "$@"
