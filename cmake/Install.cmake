@@ -1,5 +1,6 @@
 # Installation: libraries in lib, plug-ins in lib/tonewright, companions in libexec/tonewright, headers in
-# include/tonewright, documentation in share/doc/tonewright, a pkg-config file and a CMake package.
+# include/tonewright, documentation in share/doc/tonewright, manual pages and completions, pkg-config files and a CMake
+# package.
 #
 # Libraries that plug-ins and C++ hosts link (peru, peru_media, sonora2, filetag) are public and have a soname in lib. The
 # others are installed next to the plug-ins, where only the front library finds them.
@@ -98,6 +99,7 @@ install(
 )
 install(DIRECTORY ${PROJECT_SOURCE_DIR}/docs DESTINATION ${doc_dir}/tonewright COMPONENT development)
 
+include(Pages)
 if(PROJECT_IS_TOP_LEVEL)
     include(Packages)
 endif()
