@@ -13,7 +13,6 @@ set(CPACK_DEB_COMPONENT_INSTALL ON)
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_ENABLE_COMPONENT_DEPENDS ON)
 set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
-set(CPACK_DEBIAN_PACKAGE_GENERATE_SHLIBS ON) # dependencies of other packages on the libraries
 set(CPACK_DEBIAN_PACKAGE_RELEASE 1)
 set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "") # each package has a first line of its own
 # The packages contain these libraries themselves; dpkg-shlibdeps finds them in the build tree.
@@ -32,7 +31,6 @@ set(CPACK_DEBIAN_LIBRARIES_PACKAGE_DEPENDS "libportaudio2") # loaded at the firs
 set(CPACK_DEBIAN_PROGRAM_PACKAGE_SECTION sound)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SHLIBDEPS OFF)
-set(CPACK_DEBIAN_LIBRARIES_PACKAGE_CONTROL_EXTRA ${PROJECT_SOURCE_DIR}/packaging/triggers)
 set(CPACK_COMPONENT_PROGRAM_DEPENDS libraries)
 set(CPACK_COMPONENT_DEVELOPMENT_DEPENDS libraries)
 set(CPACK_COMPONENT_LIBRARIES_DESCRIPTION
@@ -42,7 +40,9 @@ and MP3, and the programs that the library starts."
 )
 set(CPACK_COMPONENT_PROGRAM_DESCRIPTION
     "converts, plays, records, mixes and tags sound files
-The command line program of the Tonewright library."
+The command line program of the Tonewright library. It reads and writes WAV,
+FLAC, Ogg Vorbis and MP3, carries tags and pictures from one format to the
+other, and replaces a file only by a complete one."
 )
 set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION
     "core library of a desktop audio suite (development files)
@@ -50,8 +50,39 @@ Headers, documentation and examples for programs that use the library and for
 authors of media plug-ins."
 )
 
-# Every Debian package has a copyright file and two compressed changelogs under its own name.
 if(TONEWRIGHT_PACKAGING)
+    # What packages built against the libraries depend on. The C interfaces stay compatible, so each of their functions has
+    # the version that introduced it; a user of the C++ libraries needs exactly the version it was built against. Not
+    # CPACK_DEBIAN_PACKAGE_GENERATE_SHLIBS, which treats both alike.
+    set(shlibs)
+    foreach(library ${libraries})
+        string(APPEND shlibs "lib${library} ${PROJECT_VERSION_MAJOR} ${libraries_package} (= ${PROJECT_VERSION}-${CPACK_DEBIAN_PACKAGE_RELEASE})\n")
+    endforeach()
+    foreach(library tonewright tonewright_host)
+        string(APPEND shlibs "lib${library} ${PROJECT_VERSION_MAJOR} ${libraries_package} (>= ${PROJECT_VERSION})\n")
+    endforeach()
+    file(WRITE ${PROJECT_BINARY_DIR}/shlibs "${shlibs}")
+    set(symbols ${PROJECT_BINARY_DIR}/symbols)
+    set(known_symbols ${PROJECT_SOURCE_DIR}/packaging/${libraries_package}.symbols)
+    add_custom_command(
+        OUTPUT ${symbols}
+        COMMAND dpkg-gensymbols -p${libraries_package} -v${PROJECT_VERSION} -I${known_symbols} -O${symbols}
+                -e$<TARGET_FILE:tonewright> -e$<TARGET_FILE:tonewright_host_support>
+        DEPENDS ${c_libraries} ${known_symbols}
+        COMMENT "Versions of the exported functions"
+        VERBATIM
+    )
+    add_custom_target(exported_symbols ALL DEPENDS ${symbols})
+    set(CPACK_DEBIAN_LIBRARIES_PACKAGE_CONTROL_EXTRA ${PROJECT_SOURCE_DIR}/packaging/triggers ${PROJECT_BINARY_DIR}/shlibs ${symbols})
+
+    install(
+        FILES ${PROJECT_SOURCE_DIR}/packaging/${libraries_package}.lintian-overrides
+        DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/lintian/overrides
+        RENAME ${libraries_package}
+        COMPONENT libraries
+    )
+
+    # Every Debian package has a copyright file and two compressed changelogs under its own name.
     find_program(GZIP gzip REQUIRED)
     set(changelogs ${PROJECT_BINARY_DIR}/changelog.gz ${PROJECT_BINARY_DIR}/changelog.Debian.gz)
     string(TIMESTAMP date "%a, %d %b %Y %H:%M:%S +0000" UTC)

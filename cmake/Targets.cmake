@@ -40,7 +40,8 @@ set(TONEWRIGHT_COMPANION_FOLDER ${CMAKE_INSTALL_LIBEXECDIR}/tonewright)
 
 # tw_library(NAME [INTERNAL] [C_INTERFACE] FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library with the
 # alias tw::NAME. An INTERNAL one is installed to the plug-in folder, since only other libraries of the project link it.
-# With C_INTERFACE its users need no C++ compiler.
+# With C_INTERFACE its users need no C++ compiler, and it exports C functions only: those in the exports.map of its folder,
+# or all of Tonewright's.
 function(tw_library name)
     cmake_parse_arguments(arg "INTERNAL;C_INTERFACE" "" "FOLDERS;PUBLIC;PRIVATE" ${ARGN})
     tw_sources(sources ${arg_FOLDERS})
@@ -54,6 +55,9 @@ function(tw_library name)
     target_include_directories(${name} PUBLIC $<BUILD_INTERFACE:${PROJECT_SOURCE_DIR}/src>)
     if(NOT arg_C_INTERFACE)
         target_compile_features(${name} INTERFACE cxx_std_20)
+    elseif(NOT EXISTS ${CMAKE_CURRENT_SOURCE_DIR}/exports.map)
+        target_link_options(${name} PRIVATE -Wl,--version-script=${PROJECT_SOURCE_DIR}/cmake/c-interface.map)
+        set_property(TARGET ${name} APPEND PROPERTY LINK_DEPENDS ${PROJECT_SOURCE_DIR}/cmake/c-interface.map)
     endif()
     target_link_libraries(${name} PUBLIC ${arg_PUBLIC} PRIVATE ${arg_PRIVATE} Threads::Threads)
     target_link_options(${name} PRIVATE ${TONEWRIGHT_LINK_STRICTLY})
