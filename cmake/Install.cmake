@@ -97,7 +97,12 @@ install(
     DESTINATION ${doc_dir}/tonewright
     COMPONENT program
 )
-install(DIRECTORY ${PROJECT_SOURCE_DIR}/docs DESTINATION ${doc_dir}/tonewright COMPONENT development)
+install(
+    DIRECTORY ${PROJECT_SOURCE_DIR}/docs
+    DESTINATION ${doc_dir}/tonewright
+    COMPONENT development
+    PATTERN Doxyfile EXCLUDE
+)
 
 include(Pages)
 if(PROJECT_IS_TOP_LEVEL)

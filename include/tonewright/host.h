@@ -53,6 +53,7 @@ TONEWRIGHT_API size_t TONEWRIGHT_Host_GetTextLength(TONEWRIGHT_Handle handle);
 
 /* --- Log and failures ---------------------------------------------------------------------------- */
 
+/* Levels of messages, in the order of their rank. */
 typedef enum TONEWRIGHT_LogLevel {
     TONEWRIGHT_LOG_TRACE = 0,
     TONEWRIGHT_LOG_DEBUG = 1,
@@ -160,6 +161,7 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_CanWrite(const char16_t* uri, int32_t sam
  * target. The host passes the same suffix to TONEWRIGHT_SetTempExtension, so that the extension before it
  * still selects the format and the kind of tag. */
 
+/* Bits of the flags of an output. */
 typedef enum TONEWRIGHT_OutputFlags {
     TONEWRIGHT_OUTPUT_REPLACE =
         1, /* the target may exist, and so may a temporary file left by a process that ended */
@@ -223,11 +225,13 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_Seek(TONEWRIGHT_Handle reader, double sec
 
 /* --- Sound devices ------------------------------------------------------------------------------- */
 
+/* What a device does. */
 typedef enum TONEWRIGHT_DeviceDirection {
     TONEWRIGHT_DEVICE_OUTPUT = 0,
     TONEWRIGHT_DEVICE_INPUT = 1
 } TONEWRIGHT_DeviceDirection;
 
+/* Properties of a sound device. */
 typedef struct TONEWRIGHT_DeviceInfo {
     size_t size;
     const char* id; /* like the other strings valid until the list is destroyed */
@@ -255,6 +259,7 @@ TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_OpenInputDevice(const char* id)
  * callback. Any thread may replace one while a job runs; a call already in progress still completes on the
  * old callback. Threads and restrictions are those of tonewright.h. */
 
+/* What a callback asks of the job. */
 typedef enum TONEWRIGHT_Answer {
     TONEWRIGHT_STOP = 0, /* ends the job normally: the file holds what was written */
     TONEWRIGHT_CONTINUE = 1,
