@@ -47,7 +47,9 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     sonora2/media/IAudioFormat.h
     sonora2/media/IAudioSource.h
     sonora2/media/IAudioStreamInfos.h
+    sonora2/media/IClippingPrevention.h
     sonora2/media/IDiscardable.h
+    sonora2/media/IFloatSamples.h
     sonora2/media/IFormat.h
     sonora2/media/IMediaDescription.h
     sonora2/media/ISalvage.h

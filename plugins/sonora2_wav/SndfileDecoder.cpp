@@ -139,7 +139,7 @@ SDecodedMedia CSndfileDecoder::open(const SDecoderOptions& options) {
     m_frames = std::max<int64_t>(info.frames, 0);
     if (frameBytes > 0) m_frames = std::min(m_frames, getLength(this) / frameBytes);
     if (isMpeg(sampleFormat)) countFrames();
-    return {m_format, m_frames, getCodecName(sampleFormat)};
+    return {m_format, m_frames, getCodecName(sampleFormat), getFloatBytes()};
 }
 
 // The library only estimates the length of MPEG audio.
@@ -187,6 +187,8 @@ void CSndfileDecoder::close() {
     m_handle.reset();
     m_input.reset();
     m_position = m_checked = 0;
+    m_deliversFloat = false;
+    m_scale = 0.0;
 }
 
 int CSndfileDecoder::read(uint8_t* pcm, int frames) {
@@ -195,6 +197,8 @@ int CSndfileDecoder::read(uint8_t* pcm, int frames) {
     const auto countSamples = [&](sf_count_t got) { return static_cast<size_t>(got) * m_format.channels; };
     sf_count_t got = 0;
     frames = static_cast<int>(std::min<int64_t>(frames, m_frames - m_position));
+    if (m_deliversFloat) return readFloat(pcm, frames);
+    if (getFloatBytes() > 0 && m_scale == 0.0) findScale();
     switch (m_transfer) {
     case ETransfer::raw:
     case ETransfer::rawSigned8: {
@@ -220,12 +224,14 @@ int CSndfileDecoder::read(uint8_t* pcm, int frames) {
     case ETransfer::floats:
         m_floats.resize(samples);
         got = sf_readf_float(handle, m_floats.data(), frames);
+        scale(m_floats, countSamples(got));
         checkClipping(m_floats.data(), got);
         pcm::packFloat(m_floats.data(), pcm, 4, countSamples(got));
         break;
     case ETransfer::doubles: {
         m_doubles.resize(samples);
         got = sf_readf_double(handle, m_doubles.data(), frames);
+        scale(m_doubles, countSamples(got));
         checkClipping(m_doubles.data(), got);
         const size_t count = countSamples(got);
         for (size_t i = 0; i < count; ++i) {
@@ -239,6 +245,46 @@ int CSndfileDecoder::read(uint8_t* pcm, int frames) {
     m_position += got;
     if (m_position >= m_frames) reportClipping();
     return static_cast<int>(got);
+}
+
+int CSndfileDecoder::getFloatBytes() const {
+    return m_transfer == ETransfer::floats ? 4 : m_transfer == ETransfer::doubles ? 8 : 0;
+}
+
+int CSndfileDecoder::readFloat(uint8_t* pcm, int frames) {
+    SNDFILE* handle = m_handle.get();
+    const sf_count_t got = m_transfer == ETransfer::floats
+                               ? sf_readf_float(handle, reinterpret_cast<float*>(pcm), frames)
+                               : sf_readf_double(handle, reinterpret_cast<double*>(pcm), frames);
+    m_position += std::max<sf_count_t>(got, 0);
+    return static_cast<int>(std::max<sf_count_t>(got, 0));
+}
+
+// A peak stored in the file may be wrong or missing.
+void CSndfileDecoder::findScale() {
+    m_scale = 1.0;
+    if (!m_options.preventClipping) return;
+    constexpr int kFrames = 4096;
+    m_doubles.resize(static_cast<size_t>(m_format.channels) * kFrames);
+    const int64_t position = m_position;
+    double peak = 0.0;
+    seek(0);
+    for (sf_count_t got; (got = sf_readf_double(m_handle.get(), m_doubles.data(), kFrames)) > 0;)
+        for (sf_count_t i = 0; i < got * m_format.channels; ++i)
+            if (const double level = std::fabs(m_doubles[static_cast<size_t>(i)]); std::isfinite(level))
+                peak = std::max(peak, level);
+    seek(position);
+    if (peak <= 1.0) return;
+    m_scale = 1.0 / peak;
+    m_options.warn("%s: reduced by %.1f dB to prevent clipping", m_file.getDisplayName(),
+                   20.0 * std::log10(peak));
+}
+
+template <class Sample> void CSndfileDecoder::scale(std::vector<Sample>& samples, size_t count) const {
+    if (m_scale == 1.0) return;
+    // One step less, so that the rounded peak does not exceed full scale.
+    const Sample factor = std::nextafter(static_cast<Sample>(m_scale), Sample{0});
+    for (size_t i = 0; i < count; ++i) samples[i] *= factor;
 }
 
 void CSndfileDecoder::seek(int64_t frame) {

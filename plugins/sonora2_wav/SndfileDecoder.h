@@ -15,8 +15,9 @@ struct SSndfileCloser {
 };
 using SndfileHandle = std::unique_ptr<SNDFILE, SSndfileCloser>;
 
-// Linear PCM is delivered bit for bit, floating point as 32 bits, compressed samples as the 16 bits that they
-// were made from. A stated length that the file cannot hold is reduced to what is there.
+// Linear PCM is delivered bit for bit, floating point on request, otherwise as 32 bits, compressed samples as
+// the 16 bits that they were made from. A stated length that the file cannot hold is reduced to what is
+// there.
 class CSndfileDecoder : public IDecoder {
 public:
     explicit CSndfileDecoder(const SMediaFile& file);
@@ -27,6 +28,7 @@ public:
     void close() override;
     int read(uint8_t* pcm, int frames) override;
     void seek(int64_t frame) override;
+    void deliverFloat() override { m_deliversFloat = true; }
 
 private:
     // How samples are read from the library.
@@ -41,6 +43,10 @@ private:
     SNDFILE* openHandle(SF_INFO& info);
     void countFrames();
     void chooseTransfer(int sampleFormat);
+    int getFloatBytes() const;
+    int readFloat(uint8_t* pcm, int frames);
+    void findScale();
+    template <class Sample> void scale(std::vector<Sample>& samples, size_t count) const;
     template <class Sample> void checkClipping(const Sample* samples, sf_count_t frames);
     void reportClipping();
 
@@ -53,6 +59,8 @@ private:
     int64_t m_frames = 0;
     int64_t m_position = 0; // next frame to read
     ETransfer m_transfer = ETransfer::raw;
+    bool m_deliversFloat = false;
+    double m_scale = 0.0;            // of floating-point samples; 0.0 until it is determined
     std::vector<int32_t> m_integers; // reused by every read
     std::vector<float> m_floats;
     std::vector<double> m_doubles;

@@ -46,19 +46,24 @@ struct CSndfileEncoder::SContainer {
     bool signed8;
     bool below4GiB; // its header stores 32-bit sizes
     int headerBytes;
+    int floatHeaderBytes; // the same for floating-point samples
     int alignment;
+
+    int getHeaderBytes(const SPcmFormat& samples) const {
+        return samples.isFloat ? floatHeaderBytes : headerBytes;
+    }
 };
 
 const CSndfileEncoder::SContainer& CSndfileEncoder::findContainer(const std::string& extension) {
     static constexpr std::array<SContainer, 8> kContainers{{
-        {"aif", SF_FORMAT_AIFF, true, true, 54, 2},
-        {"aiff", SF_FORMAT_AIFF, true, true, 54, 2},
-        {"aifc", SF_FORMAT_AIFF, true, true, 54, 2},
-        {"au", SF_FORMAT_AU, true, true, 24, 1},
-        {"snd", SF_FORMAT_AU, true, true, 24, 1},
-        {"caf", SF_FORMAT_CAF, true, false, 4096, 2},
-        {"w64", SF_FORMAT_W64, false, false, 104, 1},
-        {"rf64", SF_FORMAT_RF64, false, false, 104, 2},
+        {"aif", SF_FORMAT_AIFF, true, true, 54, 72, 2},
+        {"aiff", SF_FORMAT_AIFF, true, true, 54, 72, 2},
+        {"aifc", SF_FORMAT_AIFF, true, true, 54, 72, 2},
+        {"au", SF_FORMAT_AU, true, true, 24, 24, 1},
+        {"snd", SF_FORMAT_AU, true, true, 24, 24, 1},
+        {"caf", SF_FORMAT_CAF, true, false, 4096, 4096, 2},
+        {"w64", SF_FORMAT_W64, false, false, 104, 136, 1},
+        {"rf64", SF_FORMAT_RF64, false, false, 104, 136, 2},
     }};
     const auto found = std::ranges::find(kContainers, extension, &SContainer::extension);
     return found != kContainers.end() ? *found : kContainers.front();
@@ -72,7 +77,9 @@ SF_INFO CSndfileEncoder::describe(const SPcmFormat& format) const {
     info.samplerate = format.rate;
     info.channels = format.channels;
     info.format = m_container.format;
-    if (format.bytesPerSample == 1)
+    if (format.isFloat)
+        info.format |= format.bytesPerSample == 4 ? SF_FORMAT_FLOAT : SF_FORMAT_DOUBLE;
+    else if (format.bytesPerSample == 1)
         info.format |= m_container.signed8 ? SF_FORMAT_PCM_S8 : SF_FORMAT_PCM_U8;
     else
         info.format |= kWidths[static_cast<size_t>(format.bytesPerSample - 2)];
@@ -86,6 +93,11 @@ bool CSndfileEncoder::accepts(const SPcmFormat& format) const {
          format.channels, format.rate, format.bytesPerSample * 8);
 }
 
+bool CSndfileEncoder::holdsFloat(const SPcmFormat& format) const {
+    const SF_INFO info = describe(format);
+    return sf_format_check(&info);
+}
+
 void CSndfileEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
     m_file = &file;
     m_format = settings.format;
@@ -97,13 +109,14 @@ void CSndfileEncoder::open(COutputFile& file, const SEncoderSettings& settings) 
     if (!m_handle)
         fail("could not write %s: %s", file.getFile().getDisplayName(),
              peru::CString::fromUTF8(sf_strerror(nullptr)));
+    sf_command(m_handle.get(), SFC_SET_ADD_PEAK_CHUNK, nullptr, SF_FALSE);
     m_swapped = sf_command(m_handle.get(), SFC_RAW_DATA_NEEDS_ENDSWAP, nullptr, 0) == SF_TRUE;
 }
 
 void CSndfileEncoder::write(const uint8_t* pcm, int frames) {
     const int64_t bytes = int64_t{frames} * m_format.frameBytes();
     const size_t samples = static_cast<size_t>(frames) * m_format.channels;
-    if (m_container.below4GiB && m_bytes + bytes + m_container.headerBytes >= kFourGiB)
+    if (m_container.below4GiB && m_bytes + bytes + m_container.getHeaderBytes(m_format) >= kFourGiB)
         fail("%s would grow beyond 4 GiB, which its format cannot hold", m_file->getFile().getDisplayName());
     SNDFILE* handle = m_handle.get();
     bool written = false;
@@ -113,6 +126,10 @@ void CSndfileEncoder::write(const uint8_t* pcm, int frames) {
         written = sf_write_raw(handle, m_signed8.data(), bytes) == bytes;
     } else if (m_format.bytesPerSample == 1 || !m_swapped) {
         written = sf_write_raw(handle, pcm, bytes) == bytes;
+    } else if (m_format.isFloat) {
+        written = m_format.bytesPerSample == 4
+                      ? sf_writef_float(handle, reinterpret_cast<const float*>(pcm), frames) == frames
+                      : sf_writef_double(handle, reinterpret_cast<const double*>(pcm), frames) == frames;
     } else if (m_format.bytesPerSample == 2) {
         written = sf_writef_short(handle, reinterpret_cast<const short*>(pcm), frames) == frames;
     } else if (m_format.bytesPerSample == 4) {
@@ -166,7 +183,7 @@ void CSndfileEncoder::correctSizes() {
 int64_t CSndfileEncoder::estimateBytes(double seconds, const SEncoderSettings& settings) const {
     const int64_t samples = std::llround(seconds * settings.format.rate) * settings.format.frameBytes();
     const int64_t alignment = m_container.alignment;
-    return m_container.headerBytes + (samples + alignment - 1) / alignment * alignment;
+    return m_container.getHeaderBytes(settings.format) + (samples + alignment - 1) / alignment * alignment;
 }
 
 } // namespace sonora2::plugins::wav

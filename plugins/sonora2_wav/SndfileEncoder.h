@@ -19,6 +19,7 @@ public:
     void update() override;
     void finish() override;
     int64_t estimateBytes(double seconds, const SEncoderSettings& settings) const override; // exact
+    bool holdsFloat(const SPcmFormat& format) const override;
 
 private:
     struct SContainer;

@@ -12,13 +12,15 @@ constexpr int kPlainFormatBytes = 16;
 constexpr int kExtensibleFormatBytes = 40;
 constexpr int kSizesBytes = 28;                           // of the chunk that holds the sizes of RF64
 constexpr int kFixedBytes = 12 + 8 + kSizesBytes + 8 + 8; // header size without the format
+constexpr int kFactBytes = 4; // the number of frames, which only files of integers may omit
 constexpr uint16_t kPcm = 1;
+constexpr uint16_t kFloat = 3;
 constexpr uint16_t kExtensible = 0xFFFE;
 constexpr uint32_t kInSizesChunk = 0xFFFFFFFF;
 
 // The usual speaker mask for each number of channels; more channels have none.
 constexpr std::array<uint32_t, 9> kSpeakers{0, 0x4, 0x3, 0x7, 0x33, 0x37, 0x3F, 0x70F, 0x63F};
-// The subformat GUID of linear PCM without its first two bytes.
+// The subformat GUIDs of integers and floating-point samples without their first two bytes.
 constexpr std::array<uint8_t, 14> kSubformat{0, 0, 0, 0, 0x10, 0, 0x80, 0, 0, 0xAA, 0, 0x38, 0x9B, 0x71};
 
 bool isExtensible(const SPcmFormat& format) {
@@ -26,7 +28,13 @@ bool isExtensible(const SPcmFormat& format) {
 }
 
 int getHeaderBytes(const SPcmFormat& format) {
-    return kFixedBytes + (isExtensible(format) ? kExtensibleFormatBytes : kPlainFormatBytes);
+    return kFixedBytes + (isExtensible(format) ? kExtensibleFormatBytes : kPlainFormatBytes) +
+           (format.isFloat ? 8 + kFactBytes : 0);
+}
+
+bool fits(const SPcmFormat& format) {
+    return format.channels <= UINT16_MAX / format.bytesPerSample &&
+           int64_t{format.rate} * format.frameBytes() <= UINT32_MAX;
 }
 
 class CHeader {
@@ -45,19 +53,21 @@ public:
 private:
     template <class T> void putInteger(T value) { append(&value, sizeof(value)); }
 
-    std::array<uint8_t, kFixedBytes + kExtensibleFormatBytes> m_bytes{};
+    std::array<uint8_t, kFixedBytes + kExtensibleFormatBytes + 8 + kFactBytes> m_bytes{};
     size_t m_size = 0;
 };
 
 } // namespace
 
 bool CWavEncoder::accepts(const SPcmFormat& format) const {
-    if (format.channels <= UINT16_MAX / format.bytesPerSample &&
-        int64_t{format.rate} * format.frameBytes() <= UINT32_MAX)
-        return true;
+    if (fits(format)) return true;
     fail("WAV files hold frames of up to 65535 bytes and up to 4 GiB per second, not %d channels at %d Hz in "
          "%d bits",
          format.channels, format.rate, format.bytesPerSample * 8);
+}
+
+bool CWavEncoder::holdsFloat(const SPcmFormat& format) const {
+    return fits(format);
 }
 
 void CWavEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
@@ -122,8 +132,13 @@ void CWavEncoder::writeHeader() {
         header.put16(kExtensibleFormatBytes - kPlainFormatBytes - 2);
         header.put16(m_format.bytesPerSample * 8);
         header.put32(channels < kSpeakers.size() ? kSpeakers[channels] : 0);
-        header.put16(kPcm);
+        header.put16(m_format.isFloat ? kFloat : kPcm);
         header.append(kSubformat.data(), kSubformat.size());
+    }
+    if (m_format.isFloat) {
+        header.put("fact");
+        header.put32(kFactBytes);
+        header.put32(large ? kInSizesChunk : m_dataBytes / m_format.frameBytes());
     }
     header.put("data");
     header.put32(large ? kInSizesChunk : m_dataBytes);

@@ -1,4 +1,4 @@
-// Encodes WAV.
+// Encodes WAV, also with floating-point samples.
 #pragma once
 
 #include "support/Encoder.h"
@@ -15,6 +15,7 @@ public:
     void update() override;
     void finish() override;
     int64_t estimateBytes(double seconds, const SEncoderSettings& settings) const override; // exact
+    bool holdsFloat(const SPcmFormat& format) const override;
 
 private:
     void writeHeader();

@@ -10,11 +10,14 @@ struct SDecodedMedia {
     SPcmFormat format;
     int64_t frames = 0;     // exact: what reading an intact file to its end delivers
     std::string codec = {}; // to show to users, such as "FLAC" or "PCM signed 24 bit"; empty when unknown
+    int floatBytes = 0;     // size of the file's floating-point samples if deliverFloat() is supported
 };
 
 struct SDecoderOptions {
     // Continue after damage: missing sound is replaced by silence of the same length and reported to the log.
     bool salvage = false;
+    // Scale floating-point samples that exceed full scale when converting them to integers.
+    bool preventClipping = false;
     P<common::ILogManager> log = {}; // may be empty
 
     // Reports something that does not stop the decoding.
@@ -40,6 +43,9 @@ public:
     virtual int read(uint8_t* pcm, int frames) = 0;
     // The next read starts at exactly this frame, from 0 to the number of frames inclusive.
     virtual void seek(int64_t frame) = 0;
+    // From the next seek() until close(), reads deliver the file's floating-point samples instead of
+    // integers. Only called if open() has stated their size.
+    virtual void deliverFloat() {}
 };
 
 } // namespace sonora2::plugins

@@ -43,7 +43,7 @@ void CDecoderSource::open() {
     if (isOpened()) return;
     try {
         openDecoder();
-        startProducer();
+        startProducer(getStartFrame());
     } catch (...) {
         m_producer.reset();
         m_decoder->close(); // also after an open() that threw
@@ -56,6 +56,8 @@ void CDecoderSource::close() {
     m_readAhead.reset();
     m_producer.reset();
     m_decoder->close();
+    if (!m_media.format.isFloat) return;
+    m_media.format = m_delivered = m_integerFormat;
 }
 
 void CDecoderSource::skipToTime(double fTimestamp) {
@@ -98,15 +100,46 @@ void CDecoderSource::setAudioStream(int nAudioIndex) {
 }
 
 void CDecoderSource::setSalvage(bool salvage) {
-    if (salvage == m_salvage) return;
+    change(m_salvage, salvage);
+}
+
+void CDecoderSource::setClippingPrevention(bool prevent) {
+    change(m_preventClipping, prevent);
+}
+
+void CDecoderSource::change(bool& option, bool value) {
+    if (value == option) return;
     const bool reopen = isOpened();
     close();
-    m_salvage = salvage;
+    option = value;
     if (reopen) open();
 }
 
 SDecoderOptions CDecoderSource::getOptions() const {
-    return {m_salvage, m_log};
+    return {m_salvage, m_preventClipping, m_log};
+}
+
+bool CDecoderSource::canUseFloat(int bytesPerSample) {
+    return isOpened() && bytesPerSample > 0 && m_media.floatBytes == bytesPerSample &&
+           m_wanted == SPcmFormat();
+}
+
+void CDecoderSource::useFloat(int bytesPerSample) {
+    if (!canUseFloat(bytesPerSample))
+        fail("%s cannot be read as floating-point samples of %d bits", m_file.getDisplayName(),
+             bytesPerSample * 8);
+    m_readAhead.reset();
+    m_media.format.bytesPerSample = bytesPerSample;
+    m_media.format.isFloat = true;
+    m_delivered = m_media.format;
+    try {
+        m_decoder->deliverFloat();
+        m_decoder->seek(0); // where a new producer begins
+        startProducer(m_delivering);
+    } catch (...) {
+        close();
+        throw;
+    }
 }
 
 P<peru::IString> CDecoderSource::getCodecName() {
@@ -139,6 +172,7 @@ P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {
 
 void CDecoderSource::openDecoder() {
     m_media = m_decoder->open(getOptions());
+    m_integerFormat = m_media.format;
     const SPcmFormat& own = m_media.format;
     const bool sound = own.rate > 0 && own.channels > 0 && own.bytesPerSample >= 1 &&
                        own.bytesPerSample <= 4 && m_media.frames >= 0;
@@ -158,19 +192,24 @@ void CDecoderSource::chooseFormat(const SPcmFormat& wanted) {
     m_total = CChunkProducer::countDelivered(m_media, m_delivered);
 }
 
-void CDecoderSource::startProducer() {
+void CDecoderSource::startProducer(int64_t frame) {
     m_producer =
         std::make_unique<CChunkProducer>(m_context, m_file, *m_decoder, m_media, m_delivered, getOptions());
-    restartAt(toFrame(m_startTime));
+    restartAt(frame);
 }
 
 void CDecoderSource::setDeliveredFormat(int sampleRate, int channelCount, int bytesPerSample) {
     const SPcmFormat wanted{sampleRate, channelCount, bytesPerSample};
+    if (m_media.format.isFloat) { // only while open
+        close();
+        m_wanted = wanted;
+        return open();
+    }
     if (isOpened()) {
         chooseFormat(wanted);
         m_readAhead.reset();
         m_decoder->seek(0); // where a new producer begins
-        startProducer();
+        startProducer(getStartFrame());
     }
     m_wanted = wanted;
 }

@@ -2,6 +2,8 @@
 #pragma once
 
 #include "sonora2/media/IAudioSource.h"
+#include "sonora2/media/IClippingPrevention.h"
+#include "sonora2/media/IFloatSamples.h"
 #include "sonora2/media/IMediaDescription.h"
 #include "sonora2/media/ISalvage.h"
 #include "support/ReadAhead.h"
@@ -16,7 +18,9 @@ namespace sonora2::plugins {
 class CDecoderSource : public peru::CObject,
                        public common::IAudioSource,
                        public common::IMediaDescription,
-                       public common::ISalvage {
+                       public common::ISalvage,
+                       public common::IClippingPrevention,
+                       public common::IFloatSamples {
 public:
     // Created closed. A zero in `wanted` selects the file's own value.
     CDecoderSource(const P<common::ISonoraContext>& context, const P<peru::IString>& pluginName,
@@ -47,20 +51,28 @@ public:
     void setSalvage(bool salvage) override;
     bool getSalvage() override { return m_salvage; }
 
+    void setClippingPrevention(bool prevent) override;
+    bool getClippingPrevention() override { return m_preventClipping; }
+
+    bool canUseFloat(int bytesPerSample) override;
+    void useFloat(int bytesPerSample) override;
+
     P<peru::IString> getCodecName() override;
     int64_t getBitRate() override; // of the whole file, including tags and covers
     int getOwnSampleRate() override { return m_media.format.rate; }
     int getOwnChannelCount() override { return m_media.format.channels; }
-    int getOwnBytesPerSample() override { return m_media.format.bytesPerSample; }
+    int getOwnBytesPerSample() override { return m_integerFormat.bytesPerSample; }
     void setDeliveredFormat(int sampleRate, int channelCount, int bytesPerSample) override;
     P<peru::IString> takeWarnings() override;
 
 private:
     void openDecoder();
+    void change(bool& option, bool value);
     SDecoderOptions getOptions() const;
     void requireOpened() const;
     void chooseFormat(const SPcmFormat& wanted);
-    void startProducer();
+    void startProducer(int64_t frame); // in delivered frames from the beginning of the file
+    int64_t getStartFrame() const { return toFrame(m_startTime); }
     int64_t toFrame(double seconds) const;
     void restartAt(int64_t frame); // in delivered frames from the beginning of the file
 
@@ -70,9 +82,11 @@ private:
     SPcmFormat m_wanted;
     double m_startTime = 0.0;
     bool m_salvage = false;
+    bool m_preventClipping = false;
     std::unique_ptr<IDecoder> m_decoder;
     P<CWarningLog> m_log;
     SDecodedMedia m_media;                      // known once opened
+    SPcmFormat m_integerFormat;                 // of the file's samples unless floating point is used
     SPcmFormat m_delivered;                     // known once opened
     int64_t m_total = 0;                        // delivered frames of the whole file
     int64_t m_delivering = 0;                   // next frame for the consumer

@@ -34,6 +34,8 @@ public:
     virtual void finish() = 0;
     // Estimated file size in bytes for that many seconds; may be called in any state.
     virtual int64_t estimateBytes(double seconds, const SEncoderSettings& settings) const = 0;
+    // Whether files can hold this format of floating-point samples. Other encoders never receive one.
+    virtual bool holdsFloat(const SPcmFormat&) const { return false; }
 };
 
 } // namespace sonora2::plugins

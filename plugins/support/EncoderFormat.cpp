@@ -14,7 +14,8 @@ constexpr auto kUpdate = std::chrono::milliseconds(500);
 
 CEncoderFormat::CEncoderFormat(const P<peru::IString>& pluginName, const SMediaFile& file,
                                EncoderFactory makeEncoder, const SPcmFormat& format)
-    : m_pluginName(pluginName), m_file(file), m_makeEncoder(makeEncoder), m_estimator(makeEncoder(file)) {
+    : m_pluginName(pluginName), m_file(file), m_makeEncoder(makeEncoder), m_estimator(makeEncoder(file)),
+      m_integerFormat(format) {
     m_settings.format = format;
 }
 
@@ -28,13 +29,15 @@ CEncoderFormat::~CEncoderFormat() {
 
 void CEncoderFormat::open() {
     if (isOpened()) return;
-    auto output = std::make_unique<COutputFile>(m_file);
+    std::unique_ptr<COutputFile> output;
     auto encoder = m_makeEncoder(m_file);
     try {
+        output = std::make_unique<COutputFile>(m_file);
         encoder->open(*output, m_settings);
     } catch (...) {
         encoder.reset();
-        output->discard();
+        if (output) output->discard();
+        m_settings.format = m_integerFormat;
         throw;
     }
     m_output = std::move(output);
@@ -46,6 +49,7 @@ void CEncoderFormat::open() {
 void CEncoderFormat::close() {
     const std::unique_ptr<COutputFile> output = std::move(m_output);
     const std::unique_ptr<IEncoder> encoder = std::move(m_encoder);
+    m_settings.format = m_integerFormat;
     // The failed write has already been reported, and the rest cannot be completed.
     if (!output || m_failed) return;
     try {
@@ -61,6 +65,7 @@ void CEncoderFormat::discard() noexcept {
     m_encoder.reset();
     if (m_output) m_output->discard();
     m_output.reset();
+    m_settings.format = m_integerFormat;
 }
 
 int64_t CEncoderFormat::getEstimatedSizeBytes(double fDuration) {
@@ -110,6 +115,19 @@ void CEncoderFormat::writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) {
         m_failed = true;
         throw;
     }
+}
+
+bool CEncoderFormat::canUseFloat(int bytesPerSample) {
+    // Narrower integers have been asked for.
+    if (m_integerFormat.bytesPerSample != 4 || (bytesPerSample != 4 && bytesPerSample != 8)) return false;
+    return m_estimator->holdsFloat({m_integerFormat.rate, m_integerFormat.channels, bytesPerSample, true});
+}
+
+void CEncoderFormat::useFloat(int bytesPerSample) {
+    requireClosed("the sample format");
+    if (!canUseFloat(bytesPerSample))
+        fail("%s cannot hold floating-point samples of %d bits", m_file.getDisplayName(), bytesPerSample * 8);
+    m_settings.format = {m_integerFormat.rate, m_integerFormat.channels, bytesPerSample, true};
 }
 
 void CEncoderFormat::requireClosed(const char* what) const {

@@ -4,6 +4,7 @@
 #include "sonora2/context/ISonoraContext.h"
 #include "sonora2/media/IAudioFormat.h"
 #include "sonora2/media/IDiscardable.h"
+#include "sonora2/media/IFloatSamples.h"
 #include "support/Encoder.h"
 
 #include <chrono>
@@ -15,7 +16,10 @@ namespace sonora2::plugins {
 // by close(), as a whole. A new one is complete on the disk twice a second while it grows, so that a
 // recording whose process is killed can still be played. A failed write throws at once or at the latest from
 // close(). Quality and bit rates can be set while closed. Each opening starts a new file.
-class CEncoderFormat : public peru::CObject, public common::IAudioFormat, public common::IDiscardable {
+class CEncoderFormat : public peru::CObject,
+                       public common::IAudioFormat,
+                       public common::IDiscardable,
+                       public common::IFloatSamples {
 public:
     // Created closed. `makeEncoder` returns a new encoder for each opening.
     using EncoderFactory = std::unique_ptr<IEncoder> (*)(const SMediaFile& file);
@@ -38,6 +42,9 @@ public:
     void setAudioBitRate(int nNominal, int nMin, int nMax) override;
     void writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) override;
 
+    bool canUseFloat(int bytesPerSample) override;
+    void useFloat(int bytesPerSample) override;
+
 private:
     void requireClosed(const char* what) const;
 
@@ -45,6 +52,7 @@ private:
     SMediaFile m_file;
     EncoderFactory m_makeEncoder;
     std::unique_ptr<IEncoder> m_estimator; // used for estimates only, never opened
+    const SPcmFormat m_integerFormat;      // unless floating point is used
     SEncoderSettings m_settings;
     std::unique_ptr<COutputFile> m_output;           // while open
     std::unique_ptr<IEncoder> m_encoder;             // writes to the output

@@ -15,11 +15,12 @@ namespace sonora2::plugins {
 
 using peru::P;
 
-// Interleaved PCM as in chunks: 8 bit unsigned, 16, 24 and 32 bit signed little-endian.
+// Interleaved PCM as in chunks: 8 bit unsigned, 16, 24 and 32 bit signed little-endian, or floating point.
 struct SPcmFormat {
     int rate = 0; // frames per second
     int channels = 0;
     int bytesPerSample = 0;
+    bool isFloat = false; // numbers of 4 or 8 bytes, see IFloatSamples
 
     int frameBytes() const { return channels * bytesPerSample; }
     bool operator==(const SPcmFormat&) const = default;

@@ -2,6 +2,7 @@
 #include "host_support/Guard.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
+#include "sonora2/media/IClippingPrevention.h"
 #include "sonora2/media/IMediaDescription.h"
 #include "sonora2/media/ISalvage.h"
 #include "sonora2/plugins/MediaEnvironment.h"
@@ -128,6 +129,14 @@ int32_t TONEWRIGHT_Host_SetSourceFormat(TONEWRIGHT_Handle source, int32_t sample
 int32_t TONEWRIGHT_Host_SetSalvage(TONEWRIGHT_Handle source, int32_t salvage) {
     return guard(0, [&] {
         require<ISalvage>(source, "a source that can be salvaged")->setSalvage(salvage != 0);
+        return 1;
+    });
+}
+
+int32_t TONEWRIGHT_Host_SetClippingPrevention(TONEWRIGHT_Handle source, int32_t prevent) {
+    return guard(0, [&] {
+        require<IClippingPrevention>(source, "a source that can prevent clipping")
+            ->setClippingPrevention(prevent != 0);
         return 1;
     });
 }

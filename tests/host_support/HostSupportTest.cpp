@@ -202,6 +202,28 @@ TEST_F(Host, MediaInfoIsTheFilesOwn) {
     }
 }
 
+TEST_F(Host, FloatBeyondFullScaleStaysOrIsScaled) {
+    const std::string file = folder / "in.wav";
+    ASSERT_EQ(run({"ffmpeg", "-v", "error", "-f", "lavfi", "-i", "aevalsrc=4*sin(440*2*PI*t):s=8000:d=1",
+                   "-c:a", "pcm_f32le", file})
+                  .exitCode,
+              0);
+    for (const auto& [target, prevent, warning] :
+         {std::tuple{"a.w64", 0, ""}, {"b.flac", 0, "clipped"}, {"c.flac", 1, "reduced by 12.0 dB"}}) {
+        TONEWRIGHT_MediaInfo info = {};
+        info.size = sizeof info;
+        const CHandle source(TONEWRIGHT_Host_OpenMedia(uriOf(file).c_str(), &info));
+        EXPECT_EQ(TONEWRIGHT_Host_SetClippingPrevention(source, prevent), 1);
+        EXPECT_EQ(encode(source, folder / target, 8000, 1, info.bytesPerSample), TONEWRIGHT_OK);
+        const Owned<char> lines(TONEWRIGHT_Host_TakeWarnings(source));
+        EXPECT_NE(std::string(lines ? lines.get() : "").find(warning), std::string::npos) << lines.get();
+        EXPECT_EQ(!lines, !*warning) << target;
+        const CHandle written(TONEWRIGHT_Host_OpenMedia(uriOf(folder / target).c_str(), &info));
+        EXPECT_EQ(std::string(info.codec) == "PCM float 32 bit", !*warning) << info.codec;
+    }
+    EXPECT_EQ(TONEWRIGHT_Host_SetClippingPrevention(nullptr, 1), 0);
+}
+
 TEST_F(Host, CapabilitiesAreWhatTheEncoderTakes) {
     const struct {
         const char* name;

@@ -83,6 +83,18 @@ protected:
     P<IAudioSource> openSource(const std::filesystem::path& path, const SShape& shape = {}) {
         return handler->createAudioSource(toURI(path), shape.rate, shape.channels, shape.bytes, true);
     }
+    // An open source in the file's own format.
+    P<IAudioSource> openOwn(const std::filesystem::path& path, const char* plugin) {
+        for (int i = 0; i < handler->getPluginCount(); ++i) {
+            const P<sonora2::common::ISonoraPlugin> candidate = handler->getPlugin(i);
+            if (text(candidate->getPluginName()) != plugin) continue;
+            auto source = peru::interfaceCast<IAudioSource>(
+                candidate->tryCreateSource(toURI(path), sonora2::common::kAudioSource, true, nullptr));
+            source->open();
+            return source;
+        }
+        throw std::runtime_error(plugin);
+    }
     P<IAudioFormat> makeFormat(const std::filesystem::path& path, const SShape& shape = {}) {
         return handler->createAudioFormat(toURI(path), shape.rate, shape.channels, shape.bytes);
     }

@@ -1,9 +1,11 @@
 #include "sonora2/encoding/AudioEncoder.h"
 
+#include "peru/IInterfaceQuery.h"
 #include "sonora2/context/LoggedCall.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/encoding/SampleReader.h"
 #include "sonora2/media/CloseGuard.h"
+#include "sonora2/media/IFloatSamples.h"
 
 #include <limits>
 
@@ -67,8 +69,27 @@ void CAudioEncoder::close() {
     m_source->close();
 }
 
+// Both ends are at hand here, and nothing between them looks at the samples.
+bool CAudioEncoder::agreeOnFloat() {
+    const auto source = peru::interfaceCast<IFloatSamples>(m_source);
+    const auto format = peru::interfaceCast<IFloatSamples>(m_format);
+    if (!source || !format || m_format->isOpened()) return false;
+    if (m_source->getSampleRate() != m_format->getSampleRate() ||
+        m_source->getChannelCount() != m_format->getChannelCount())
+        return false;
+    for (const int bytes : {4, 8}) {
+        if (!source->canUseFloat(bytes) || !format->canUseFloat(bytes)) continue;
+        format->useFloat(bytes);
+        source->useFloat(bytes);
+        return true;
+    }
+    return false;
+}
+
 void CAudioEncoder::encode() {
     if (!m_source->isOpened()) m_source->open();
+    // Closing returns the source to integers, which its next user expects.
+    const CCloseGuard guard(*m_source, agreeOnFloat());
     if (!m_format->isOpened()) m_format->open();
     // Queried once: it may cost a round trip to another process.
     const double duration = m_source->getDuration();

@@ -25,7 +25,8 @@ public:
     bool hasListener(const IEncodeListener* listener) const;
 
     // Returns when everything is written or a listener has returned false; both are a normal end with source
-    // and format closed. Listeners are called on this thread.
+    // and format closed. Listeners are called on this thread. Floating-point samples pass unchanged if both
+    // source and format support them (IFloatSamples).
     void encode();
 
     int getSampleRate() const { return m_sampleRate; }
@@ -34,6 +35,7 @@ public:
 
 private:
     bool notify(double total, double current);
+    bool agreeOnFloat();
     void close();
 
     P<peru::TFrailArray<IEncodeListener>> m_listeners;
