@@ -47,7 +47,7 @@ void CChunkProducer::requireDeliverable(const SMediaFile& file, const SPcmFormat
                                         const SPcmFormat& wanted) {
     if (own == wanted) return;
     const auto [low, high] = std::minmax(own.rate, wanted.rate);
-    if (!samplerateconverter::CSampleRateConverter::canConvert(own.channels, wanted.channels))
+    if (!CFormatConverter::canConvert(own.channels, wanted.channels))
         fail("%s has %d channels and cannot be converted to %d Hz, %d channels", file.getDisplayName(),
              own.channels, wanted.rate, wanted.channels);
     if (high / low >= kMaxRatio || high > kMaxRate)
@@ -103,14 +103,10 @@ P<audio::IAudioChunk> CChunkProducer::nextPlain() {
 
 P<audio::IAudioChunk> CChunkProducer::nextConverted() {
     const int64_t frameBytes = m_wanted.frameBytes();
-    if (!m_converter) {
-        m_converter = peru::make<samplerateconverter::CSampleRateConverter>(
-            m_media.format.rate, m_media.format.channels, m_media.format.bytesPerSample, m_wanted.rate,
-            m_wanted.channels, m_wanted.bytesPerSample, m_memory);
-    }
+    if (!m_converter) m_converter.emplace(m_media.format, m_wanted, m_memory);
     const int ownFrameBytes = m_media.format.frameBytes();
     while (m_position < m_end) {
-        P<audio::IAudioChunk> converted;
+        P<peru::IMemoryBlock> block;
         if (m_flushed) return nullptr; // the silence after the end is used up
         P<peru::IMemoryBlock> own = m_memory->getBlock(int64_t{m_ownChunkFrames} * ownFrameBytes);
         const int64_t left = m_media.frames - m_read;
@@ -122,11 +118,10 @@ P<audio::IAudioChunk> CChunkProducer::nextConverted() {
             m_flushed = true; // the filter still holds the last frames
             m_end = std::min(m_end, scale(m_read, m_wanted.rate, m_media.format.rate));
             if (m_position >= m_end) return nullptr;
-            converted = m_converter->convert(nullptr, 0);
+            block = m_converter->convert(nullptr, 0);
         } else {
-            converted = m_converter->convert(own->getData(), frames * ownFrameBytes);
+            block = m_converter->convert(own->getData(), frames);
         }
-        P<peru::IMemoryBlock> block = converted->getMemoryBlock();
         int64_t count = block->getSize() / frameBytes;
         const int64_t dropped = std::min(count, m_drop);
         m_drop -= dropped;

@@ -2,10 +2,12 @@
 #pragma once
 
 #include "sonora2/context/ISonoraContext.h"
-#include "sonora2/samplerateconverter/SampleRateConverter.h"
+#include "sonora2/media/IAudioChunk.h"
 #include "support/Decoder.h"
+#include "support/FormatConverter.h"
 
 #include <exception>
+#include <optional>
 
 namespace sonora2::plugins {
 
@@ -18,7 +20,7 @@ public:
     CChunkProducer(const P<common::ISonoraContext>& context, const SMediaFile& file, IDecoder& decoder,
                    const SDecodedMedia& media, const SPcmFormat& wanted, const SDecoderOptions& options);
 
-    // Throws if the sample rate converter does not support this pair of formats. Equal formats need none.
+    // Throws if there is no conversion between the two formats. Equal formats need none.
     static void requireDeliverable(const SMediaFile& file, const SPcmFormat& own, const SPcmFormat& wanted);
     static int64_t countDelivered(const SDecodedMedia& media, const SPcmFormat& wanted);
 
@@ -56,7 +58,7 @@ private:
 
     // Only while converting.
     bool m_converting;
-    P<samplerateconverter::CSampleRateConverter> m_converter;
+    std::optional<CFormatConverter> m_converter;
     int m_ownChunkFrames = 0;
     int64_t m_drop = 0; // converted frames to discard after a seek
     bool m_flushed = false;

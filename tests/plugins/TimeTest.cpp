@@ -132,6 +132,36 @@ TEST_P(Time, ClosingWhileReadingAhead_StartsAnew) {
     }
 }
 
+// Every channel of a file is converted like a mono file with the same sound.
+TEST_F(CPluginTest, ManyChannels_AreConvertedAndStayInPlace) {
+    const auto pick = [](const std::string& pcm, const SShape& shape, int channel) {
+        std::string picked;
+        for (size_t at = channel * shape.bytes; at < pcm.size(); at += shape.frameBytes())
+            picked += pcm.substr(at, shape.bytes);
+        return picked;
+    };
+    for (const int channels : {3, 4, 6, 8}) {
+        const SShape own{44100, channels, 3};
+        const std::string pcm = makeMusic(own, 12011);
+        writeFile(folder / "x.wav", pcm, own);
+        for (const SShape& shape : {SShape{44100, channels, 2}, SShape{44100, channels, 4},
+                                    SShape{48000, channels, 2}, SShape{22050, channels, 3}}) {
+            P<IAudioSource> source = openSource(folder / "x.wav", shape);
+            ASSERT_TRUE(source);
+            const std::string all = readAll(source);
+            for (int i = 0; i < channels; ++i) {
+                SCOPED_TRACE(std::to_string(shape.rate) + " Hz, channel " + std::to_string(i));
+                writeFile(folder / "mono.wav", pick(pcm, own, i), {44100, 1, 3});
+                const std::string mono =
+                    readAll(openSource(folder / "mono.wav", {shape.rate, 1, shape.bytes}));
+                EXPECT_TRUE(pick(all, shape, i) == mono);
+            }
+            source->skipToTime(0.1);
+            EXPECT_TRUE(readAll(source) == all.substr(std::llround(0.1 * shape.rate) * shape.frameBytes()));
+        }
+    }
+}
+
 INSTANTIATE_TEST_SUITE_P(Formats, Time, ::testing::ValuesIn(kFormatCases), printName);
 
 } // namespace
