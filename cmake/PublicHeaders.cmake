@@ -67,6 +67,7 @@ set(TONEWRIGHT_PUBLIC_HEADERS
 
 # Headers of the library that plug-ins are built on.
 set(TONEWRIGHT_PLUGIN_HEADERS
+    support/BitRate.h
     support/Decoder.h
     support/Encoder.h
     support/EncoderFormat.h

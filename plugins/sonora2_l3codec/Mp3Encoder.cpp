@@ -1,5 +1,6 @@
 #include "sonora2_l3codec/Mp3Encoder.h"
 
+#include "support/BitRate.h"
 #include "support/Pcm.h"
 
 #include <algorithm>
@@ -14,14 +15,15 @@ namespace {
 constexpr double kDefaultQuality = 0.8; // V2
 constexpr int kRates[] = {8000, 11025, 12000, 16000, 22050, 24000, 32000, 44100, 48000};
 
-// The codec takes whole kbit/s; 0 would leave the choice to it.
 int toKilobits(int bitRate) {
-    return std::max(bitRate / 1000, 1);
+    return bitRate / 1000; // never 0, which would leave the choice to the codec
 }
 
-// MPEG-1 has other bit rates than the versions for lower sample rates.
-int getLowestBitRate(int rate) {
-    return rate >= 32000 ? 32000 : 8000;
+// Those of MPEG-1, MPEG-2 and MPEG-2.5. The codec would silently use the nearest one instead of others.
+SBitRateRange getBitRates(int rate) {
+    return rate >= 32000   ? SBitRateRange{32000, 320000}
+           : rate >= 16000 ? SBitRateRange{8000, 160000}
+                           : SBitRateRange{8000, 64000};
 }
 
 float toVbrQuality(double quality) {
@@ -50,11 +52,9 @@ bool CMp3Encoder::accepts(const SPcmFormat& format) const {
 void CMp3Encoder::open(COutputFile& file, const SEncoderSettings& settings) {
     m_file = &file;
     m_format = settings.format;
-    const int lowest = getLowestBitRate(m_format.rate);
-    for (const int bitRate : {settings.nominalBitRate, settings.maxBitRate})
-        if (bitRate > 0 && bitRate < lowest)
-            fail("could not write %s: %d bits per second are too few, MP3 at %d Hz needs at least %d",
-                 file.getFile().getDisplayName(), bitRate, m_format.rate, lowest);
+    const SBitRateRange range = getBitRates(m_format.rate);
+    for (const int bitRate : {settings.nominalBitRate, settings.maxBitRate, settings.minBitRate})
+        requireBitRate(file.getFile(), "MP3", m_format, bitRate, range);
     m_encoder.reset(lame_init());
     lame_t encoder = m_encoder.get();
     if (!encoder) throw std::bad_alloc();

@@ -1,6 +1,7 @@
 #include "sonora2_vorbis/VorbisEncoder.h"
 
 #include "sonora2_vorbis/ChannelOrder.h"
+#include "support/BitRate.h"
 #include "support/Pcm.h"
 
 #include <algorithm>
@@ -21,6 +22,33 @@ constexpr int kFramesAtOnce = 1024;
 
 int orOpen(int bitRate) {
     return bitRate > 0 ? bitRate : -1;
+}
+
+bool hasMode(const SPcmFormat& format, int bitRate) {
+    vorbis_info info;
+    vorbis_info_init(&info);
+    const bool found = vorbis_encode_init(&info, format.channels, format.rate, -1, bitRate, -1) == 0;
+    vorbis_info_clear(&info);
+    return found;
+}
+
+// The codec has no function for this. The modes of a format cover one range of bit rates, which includes that
+// of any quality. To a precision of 100 bit/s.
+SBitRateRange findBitRates(const SPcmFormat& format) {
+    constexpr int kStep = 100, kMost = 20'000'000 / kStep;
+    vorbis_info info;
+    vorbis_info_init(&info);
+    vorbis_encode_init_vbr(&info, format.channels, format.rate, static_cast<float>(kDefaultQuality));
+    const int inside = static_cast<int>(info.bitrate_nominal / kStep);
+    vorbis_info_clear(&info);
+    const auto find = [&](int accepted, int refused) {
+        while (std::abs(accepted - refused) > 1) {
+            const int middle = (accepted + refused) / 2;
+            (hasMode(format, middle * kStep) ? accepted : refused) = middle;
+        }
+        return accepted * kStep;
+    };
+    return {find(inside, 0), find(inside, kMost)};
 }
 
 } // namespace
@@ -53,6 +81,11 @@ void CVorbisEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
                                        orOpen(settings.nominalBitRate), orOpen(settings.minBitRate))
                   : vorbis_encode_init_vbr(&m_info, m_format.channels, m_format.rate,
                                            static_cast<float>(settings.quality.value_or(kDefaultQuality)));
+    if (error != 0 && byBitRate) {
+        const SBitRateRange range = findBitRates(m_format);
+        for (const int bitRate : {settings.nominalBitRate, settings.maxBitRate, settings.minBitRate})
+            requireBitRate(file.getFile(), "Vorbis", m_format, bitRate, range);
+    }
     if (error != 0)
         fail("could not write %s: Vorbis has no mode for %d channels at %d Hz with a bit rate of %d (at "
              "least %d, at "

@@ -3,6 +3,7 @@
 
 #include "peru/strings/StringFormat.h"
 #include "sonora2/context/SonoraError.h"
+#include "sonora2/media/IDiscardable.h"
 #include "sonora2/media/ISalvage.h"
 
 #include <chrono>
@@ -294,15 +295,40 @@ TEST_F(CPluginTest, RefusedShape_StatesWhyAndKeepsTheOldFile) {
     }
 }
 
-TEST_F(CPluginTest, BitRateThatIsTooLow_IsRefusedWithoutAFile) {
-    for (const auto& [name, reason] :
-         {std::pair{"x.mp3", "192 bits per second are too few, MP3 at 44100 Hz needs at least 32000"},
-          std::pair{"x.ogg", "2 channels at 44100 Hz with a bit rate of 192 "}}) {
-        P<IAudioFormat> format = makeFormat(folder / name);
-        format->setAudioBitRate(192, 0, 0);
+TEST_F(CPluginTest, BitRateOutOfRange_IsRefusedWithoutAFile) {
+    const struct {
+        const char* name;
+        int rate, channels, nominal, maximum;
+        const char* reason; // empty: accepted
+    } rows[] = {
+        {"x.mp3", 44100, 2, 192, 0,
+         "192 bit/s is below the range of MP3 for 44100 Hz and 2 channels, "
+         "32000 to 320000 bit/s (192k?)"},
+        {"x.mp3", 48000, 1, 31999, 0, "31999 bit/s is below"},
+        {"x.mp3", 32000, 2, 32000, 320000, ""},
+        {"x.mp3", 32000, 2, 32000, 320001, "320001 bit/s is above"},
+        {"x.mp3", 24000, 2, 160000, 0, ""},
+        {"x.mp3", 24000, 2, 192000, 0,
+         "above the range of MP3 for 24000 Hz and 2 channels, 8000 to 160000 bit/s"},
+        {"x.mp3", 12000, 2, 64000, 0, ""},
+        {"x.mp3", 12000, 2, 64001, 0, "8000 to 64000 bit/s"},
+        {"x.ogg", 44100, 2, 192, 0, "192 bit/s is below the range of Vorbis for 44100 Hz and 2 channels, "},
+        {"x.ogg", 44100, 2, 192, 0, " bit/s (192k?)"},
+        {"x.ogg", 8000, 1, 900000, 0,
+         "900000 bit/s is above the range of Vorbis for 8000 Hz and 1 channels, "},
+        {"x.ogg", 44100, 2, 128000, 160000, ""},
+    };
+    for (const auto& row : rows) {
+        P<IAudioFormat> format = makeFormat(folder / row.name, {row.rate, row.channels, 2});
+        format->setAudioBitRate(row.nominal, 0, row.maximum);
+        if (!*row.reason) {
+            EXPECT_NO_THROW(format->open()) << row.name << row.nominal;
+            peru::interfaceCast<sonora2::common::IDiscardable>(format)->discard();
+            continue;
+        }
         const std::string error = errorOf([&] { format->open(); });
-        EXPECT_NE(std::string::npos, error.find(reason)) << error;
-        EXPECT_FALSE(std::filesystem::exists(folder / name));
+        EXPECT_NE(std::string::npos, error.find(row.reason)) << error;
+        EXPECT_FALSE(std::filesystem::exists(folder / row.name));
     }
 }
 
