@@ -75,6 +75,8 @@ SDecodedMedia CMpegDecoder::open(const SDecoderOptions& options) {
              MPG123_OK)
         failToOpen();
     seek(0);
+    m_mpegFrames = std::max(mpg123_spf(handle), 1);
+    m_checkedUntil = 0;
     return {m_format, m_scan.frames, getCodecName()};
 }
 
@@ -143,6 +145,8 @@ void CMpegDecoder::scan() {
 
 int CMpegDecoder::read(uint8_t* pcm, int frames) {
     size_t done = 0;
+    // One MPEG frame at a time, so that none escapes checkContinuity().
+    frames = std::min(frames, m_mpegFrames);
     const size_t wanted = static_cast<size_t>(frames) * static_cast<size_t>(m_format.frameBytes());
     int result = MPG123_NEW_FORMAT;
     // The format is announced once, before the first frame.
@@ -154,6 +158,7 @@ int CMpegDecoder::read(uint8_t* pcm, int frames) {
     if (done == 0 && result != MPG123_OK && result != MPG123_DONE)
         fail("could not decode %s at %.3f seconds: %s", m_file.getDisplayName(), toSeconds(m_position),
              describe(mpg123_errcode(m_handle.get())));
+    checkContinuity();
     int count = static_cast<int>(done / static_cast<size_t>(m_format.frameBytes()));
     if (count == 0 && m_position < m_scan.frames && m_scan.identity == identify()) {
         // Frames with an intact header may still be impossible to decode.
@@ -167,6 +172,25 @@ int CMpegDecoder::read(uint8_t* pcm, int frames) {
     return count;
 }
 
+// The codec silently skips what it does not recognise as a frame. Tags inside the sound are left by programs
+// that join files.
+void CMpegDecoder::checkContinuity() {
+    mpg123_frameinfo info{};
+    if (mpg123_info(m_handle.get(), &info) != MPG123_OK) return;
+    const int64_t start = mpg123_framepos(m_handle.get());
+    if (start < m_frameEnd) return; // still the same frame
+    if (m_frameEnd > 0 && start > m_frameEnd && start > m_checkedUntil) {
+        const int64_t skipped = start - skipTags(m_input.get(), m_frameEnd);
+        seekInput(this, m_inputPosition, SEEK_SET);
+        if (skipped > 0 && info.bitrate > 0)
+            m_options.warn("%s is damaged at %.3f seconds: %d bytes, about %.3f seconds, were skipped",
+                           m_file.getDisplayName(), toSeconds(m_position), skipped,
+                           static_cast<double>(skipped) / (info.bitrate * 125.0));
+    }
+    m_frameEnd = start + info.framesize;
+    m_checkedUntil = std::max(m_checkedUntil, start);
+}
+
 void CMpegDecoder::seek(int64_t frame) {
     if (mpg123_seek(m_handle.get(), m_scan.start + frame, SEEK_SET) < 0) {
         const char* reason = describe(mpg123_errcode(m_handle.get()));
@@ -174,6 +198,7 @@ void CMpegDecoder::seek(int64_t frame) {
     }
     m_position = frame;
     m_padding = false;
+    m_frameEnd = 0;
 }
 
 const char* CMpegDecoder::describe(int error) const {

@@ -46,6 +46,7 @@ private:
     std::string getCodecName();
     SIdentity identify() const;
     void scan();
+    void checkContinuity();
     const char* describe(int error) const;
     [[noreturn]] void failToOpen() const;
     double toSeconds(int64_t frame) const { return static_cast<double>(frame) / m_format.rate; }
@@ -62,7 +63,10 @@ private:
     int64_t m_inputPosition = 0;
     std::unique_ptr<mpg123_handle, SDelete> m_handle; // while open
     int64_t m_position = 0;                           // next frame to read
-    bool m_padding = false;                           // silence is delivered for frames that are missing
+    int m_mpegFrames = 1152;                          // decoded frames in an MPEG frame
+    int64_t m_frameEnd = 0;     // where the next MPEG frame should start in the file; 0 if unknown
+    int64_t m_checkedUntil = 0; // damage before this offset has been reported
+    bool m_padding = false;     // silence is delivered for frames that are missing
 };
 
 } // namespace sonora2::plugins

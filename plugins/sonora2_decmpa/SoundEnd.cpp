@@ -69,11 +69,6 @@ int64_t getTagAfter(std::FILE* file, int64_t start) {
     return head.starts_with("TAG") ? kID3v1Bytes : 0;
 }
 
-int64_t skipTags(std::FILE* file, int64_t offset) {
-    for (int64_t size = getTagAfter(file, offset); size > 0; size = getTagAfter(file, offset)) offset += size;
-    return offset;
-}
-
 // The bits of a frame header that stay the same within a stream: version, layer and rate.
 uint32_t getConstantBits(std::string_view header) {
     return toNumber(header, 8, true) & 0xFFFE0C00;
@@ -87,6 +82,11 @@ bool isHeader(std::string_view header) {
 }
 
 } // namespace
+
+int64_t skipTags(std::FILE* file, int64_t offset) {
+    for (int64_t size = getTagAfter(file, offset); size > 0; size = getTagAfter(file, offset)) offset += size;
+    return offset;
+}
 
 int64_t findSoundEnd(std::FILE* file) {
     int64_t end = ::fseeko(file, 0, SEEK_END) == 0 ? ::ftello(file) : 0;

@@ -11,4 +11,7 @@ namespace sonora2::plugins {
 // Leaves the file at its start.
 int64_t findSoundEnd(std::FILE* file);
 
+// Returns the offset behind all tags that start at `offset`, one after the other.
+int64_t skipTags(std::FILE* file, int64_t offset);
+
 } // namespace sonora2::plugins

@@ -122,6 +122,10 @@ TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
         {"several tags behind", "cat plain.mp3 tags > x.mp3", true},
         {"other data behind", "{ cat plain.mp3; printf %5000d 0; tail -c 20000 plain.mp3; } > x.mp3", true},
         {"two in one", "cat plain.mp3 plain.mp3 > x.mp3", false},
+        {"two with a tag between",
+         "{ cat plain.mp3; printf 'ID3\\003\\000\\000\\000\\000\\001\\000'; "
+         "head -c 128 /dev/zero; cat plain.mp3; } > x.mp3",
+         false},
         {"zeros behind", "{ cat plain.mp3; head -c 300000 /dev/zero; } > x.mp3", true},
         {"zeros between",
          "{ lame --silent -t in.wav -; head -c 300000 /dev/zero; lame --silent -t in.wav -; } "
@@ -133,6 +137,7 @@ TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
     for (const SMp3File& file : files) {
         SCOPED_TRACE(file.name);
         run(file.command);
+        log->lines.clear();
         const SShape delivered{file.name == std::string("low rate") ? 22050 : 44100, 2, 2};
         const std::string ours = read(folder / "x.mp3", delivered);
         const std::string layer = file.name == std::string("layer II") ? "II" : "III";
@@ -145,8 +150,44 @@ TEST_F(Lossy, ForeignMp3_IsReadAsOthersReadIt) {
         }
         // The first frame after a gap lacks the bits that it refers back to; decoders conceal this
         // differently.
-        const size_t first = file.name == std::string("zeros between") ? 90000 * 4 : SIZE_MAX;
+        const bool isGap = file.name == std::string("zeros between");
+        const bool isJoined = isGap || file.name == std::string("two with a tag between");
+        const size_t first = isJoined ? 90000 * 4 : SIZE_MAX;
         EXPECT_LE(getDistance(ours.substr(0, first), theirs), 2);
+        const auto isDamage = [](const std::string& line) { return line.find("damaged") != line.npos; };
+        EXPECT_EQ(isGap ? 1 : 0, std::ranges::count_if(log->lines, isDamage));
+    }
+}
+
+// Constant 128 kbit/s: 16 bytes are a millisecond.
+TEST_F(Lossy, DamagedMp3_IsLocated) {
+    writeFile(folder / "in.wav", makeMusic({}, 5 * 44100));
+    run("lame --silent -b 128 in.wav plain.mp3");
+    const std::string whole = readFile(folder / "plain.mp3");
+    const auto path = folder / "x.mp3";
+    const std::pair<size_t, size_t> damages[] = {{20000, 5000}, {50000, 500}, {70000, 1}};
+    std::string bytes = whole;
+    for (const auto& [at, size] : damages) bytes.replace(whole.find("\xFF\xFB", at), size, size, '\x55');
+    folder.write("x.mp3", bytes);
+    P<IAudioSource> source = openSource(path);
+    readAll(source);
+    source->skipToTime(0.5);
+    readAll(source); // is not reported again
+    ASSERT_EQ(4u, log->lines.size());
+    EXPECT_NE(std::string::npos, log->lines[0].find("is incomplete"));
+    double lost = 0.0;
+    for (size_t i = 0; i < 3; ++i) {
+        double place = 0.0, seconds = 0.0;
+        int skipped = 0;
+        const std::string& line = log->lines[i + 1];
+        ASSERT_EQ(0u, line.find(path.string() + " is damaged at "));
+        std::sscanf(line.c_str() + path.string().size(), " is damaged at %lf seconds: %d bytes, about %lf",
+                    &place, &skipped, &seconds);
+        EXPECT_NEAR(static_cast<double>(damages[i].first) / 16000, place + lost, 0.08) << line;
+        EXPECT_NEAR(static_cast<double>(damages[i].second), skipped, 2 * 418) << line;
+        EXPECT_GE(skipped, static_cast<int>(damages[i].second)) << line;
+        EXPECT_NEAR(skipped / 16000.0, seconds, 0.001) << line;
+        lost += seconds;
     }
 }
 
