@@ -1,4 +1,4 @@
-// Files whose writer did not store the size of the sound.
+// Files whose writer left out what a reader needs.
 #pragma once
 
 #include <array>
@@ -17,5 +17,9 @@ struct SPatch {
 // Replaces the size of the sound in a WAV or RF64 file that was never completed, and in a CAF file that is
 // not complete, by what is there. Leaves the file at its start.
 SPatch findMissingSize(std::FILE* file);
+
+// Replaces the width of ALAC samples in the description of a CAF file by the one in the codec's own header,
+// where the description states none. Leaves the file at its start.
+SPatch findMissingWidth(std::FILE* file);
 
 } // namespace sonora2::plugins::wav

@@ -1,5 +1,6 @@
 #include "sonora2_wav/SndfileDecoder.h"
 
+#include "sonora2_wav/CodecName.h"
 #include "support/Pcm.h"
 
 #include <algorithm>
@@ -125,11 +126,8 @@ SDecodedMedia CSndfileDecoder::open(const SDecoderOptions& options) {
     m_input = openForReading(m_file);
     if (!isOwnContainer(m_input.get()))
         fail("could not read %s: it is another kind of file than its name suggests", m_file.getDisplayName());
-    m_patch = findMissingSize(m_input.get());
     SF_INFO info{};
-    m_handle.reset(openHandle(info));
-    if (!m_handle)
-        fail("could not read %s: %s", m_file.getDisplayName(), peru::CString::fromUTF8(sf_strerror(nullptr)));
+    openHandle(info);
     m_format = {info.samplerate, info.channels, 0};
     chooseTransfer(info.format & SF_FORMAT_SUBMASK);
 
@@ -317,11 +315,19 @@ void CSndfileDecoder::reportClipping() {
     m_peak = 0.0;
 }
 
-SNDFILE* CSndfileDecoder::openHandle(SF_INFO& info) {
-    if (m_patch.size > 0)
+void CSndfileDecoder::openHandle(SF_INFO& info) {
+    m_patches = {findMissingSize(m_input.get()), findMissingWidth(m_input.get())};
+    if (m_patches[0].size > 0)
         m_options.warn("%s was not completed by its writer and is read to its end", m_file.getDisplayName());
     SF_VIRTUAL_IO io{getLength, seekInput, readInput, writeNothing, tellInput};
-    return sf_open_virtual(&io, SFM_READ, &info, this);
+    m_handle.reset(sf_open_virtual(&io, SFM_READ, &info, this));
+    if (m_handle) return;
+    const std::string codec =
+        readUnsupportedCodec(m_input.get(), sf_error(nullptr) == SF_ERR_UNSUPPORTED_ENCODING);
+    if (!codec.empty())
+        fail("could not read %s: the codec %s is not supported in this type of file", m_file.getDisplayName(),
+             peru::CString::fromUTF8(codec));
+    fail("could not read %s: %s", m_file.getDisplayName(), peru::CString::fromUTF8(sf_strerror(nullptr)));
 }
 
 sf_count_t CSndfileDecoder::getLength(void* self) {
@@ -341,10 +347,11 @@ sf_count_t CSndfileDecoder::readInput(void* data, sf_count_t size, void* self) {
     const int64_t at = tellInput(self);
     const auto got =
         static_cast<int64_t>(std::fread(data, 1, static_cast<size_t>(size), decoder.m_input.get()));
-    for (size_t i = 0; i < decoder.m_patch.size; ++i) {
-        const int64_t place = decoder.m_patch.offset + static_cast<int64_t>(i) - at;
-        if (place >= 0 && place < got) static_cast<uint8_t*>(data)[place] = decoder.m_patch.bytes[i];
-    }
+    for (const SPatch& patch : decoder.m_patches)
+        for (size_t i = 0; i < patch.size; ++i) {
+            const int64_t place = patch.offset + static_cast<int64_t>(i) - at;
+            if (place >= 0 && place < got) static_cast<uint8_t*>(data)[place] = patch.bytes[i];
+        }
     return got;
 }
 

@@ -40,7 +40,7 @@ private:
     static sf_count_t writeNothing(const void* data, sf_count_t size, void* self);
     static sf_count_t tellInput(void* self);
 
-    SNDFILE* openHandle(SF_INFO& info);
+    void openHandle(SF_INFO& info);
     void countFrames();
     void chooseTransfer(int sampleFormat);
     int getFloatBytes() const;
@@ -52,8 +52,8 @@ private:
 
     SMediaFile m_file;
     SDecoderOptions m_options;
-    InputFile m_input; // read by the handle
-    SPatch m_patch;    // applied to what the handle reads
+    InputFile m_input;               // read by the handle
+    std::array<SPatch, 2> m_patches; // applied to what the handle reads
     SndfileHandle m_handle;
     SPcmFormat m_format;
     int64_t m_frames = 0;

@@ -96,6 +96,8 @@ const SPeerFile kPeerFiles[] = {
     {"al.caf", "ffmpeg -v error -i in.wav -c:a pcm_alaw al.caf", 2, true, "A-law"},
     {"g.aiff", "sox in.wav -b 8 -D g.aiff", 1, true, "PCM signed 8 bit"},
     {"i.caf", "ffmpeg -v error -i in.wav -c:a pcm_s24be i.caf", 3, true, "PCM signed 24 bit"},
+    {"alac16.caf", "ffmpeg -v error -i in.wav -c:a alac -sample_fmt s16p alac16.caf", 2, true, "ALAC"},
+    {"alac24.caf", "ffmpeg -v error -i in.wav -c:a alac alac24.caf", 3, true, "ALAC"},
     {"j.w64", "sox in.wav -b 16 -D j.w64", 2, true},
     {"k.snd", "ffmpeg -v error -i in.wav -f au -c:a pcm_s16be k.snd", 2, true},
     {"l.flac", "flac -s8 in.wav -o l.flac", 3, true, "FLAC"},
@@ -116,6 +118,24 @@ TEST_F(CPluginTest, PeerFile_IsReadAsItsOwnProgramReadsIt) {
         ASSERT_EQ(20011u * 2 * file.bytes, pcm.size());
         EXPECT_EQ(file.codec, codecOf(source));
         EXPECT_TRUE(!file.exact || pcm == decodeByPeer(file.name, file.bytes));
+    }
+}
+
+TEST_F(CPluginTest, UnsupportedCodec_IsNamed) {
+    writeFile(folder / "in.wav", makeMusic({}, 5000));
+    const std::tuple<const char*, const char*, const char*> files[] = {
+        {"x.caf", "-c:a adpcm_ima_qt", "IMA ADPCM (ima4)"},
+        {"y.caf", "-c:a libopus -ar 48000", "Opus (opus)"},
+        {"x.wav", "-c:a ac3", "AC-3 (0x2000)"},
+    };
+    for (const auto& [name, options, codec] : files) {
+        run("ffmpeg -v error -i in.wav " + std::string(options) + " " + name);
+        log->lines.clear();
+        EXPECT_FALSE(openSource(folder / name)) << name;
+        ASSERT_FALSE(log->lines.empty());
+        EXPECT_NE(std::string::npos, log->lines[0].find("the codec " + std::string(codec) +
+                                                        " is not supported in this type of file"))
+            << log->lines[0];
     }
 }
 
