@@ -118,7 +118,8 @@ typedef struct TONEWRIGHT_MediaInfo {
 
 /* Opens a file in its own format: an open source that converts nothing. An encoder writes the floating-point
  * samples of such a source unchanged if the target has 4 bytes per sample and holds them (WAV, AIFF, AU, CAF,
- * W64, RF64); everybody else receives integers. The plug-ins for the extension are tried in order. `info` may be null. Null if no plug-in can read the file. */
+ * W64, RF64); otherwise they become integers. The plug-ins for the extension are tried in order. `info` may
+ * be null. Null if no plug-in can read the file. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_OpenMedia(const char16_t* uri, TONEWRIGHT_MediaInfo* info);
 
 /* The same properties for an existing source, which is opened for this if necessary and closed again. */
@@ -133,9 +134,10 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetSourceFormat(TONEWRIGHT_Handle source,
  * failing; TONEWRIGHT_Host_TakeWarnings then reports where. 0 for a source that does not support this. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetSalvage(TONEWRIGHT_Handle source, int32_t salvage);
 
-/* With a nonzero `prevent`, a file of floating-point samples that exceed full scale is made quieter as a whole
- * instead of clipping when it is delivered as integers; TONEWRIGHT_Host_TakeWarnings then reports by how much.
- * Such a file is read twice. Other files are not changed. 0 for a source that does not support this. */
+/* With a nonzero `prevent`, a file of floating-point samples that exceed full scale is made quieter as a
+ * whole instead of clipping when it is delivered as integers; TONEWRIGHT_Host_TakeWarnings then reports by
+ * how much. Such a file is read twice. Other files are not changed. 0 for a source that does not support
+ * this. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetClippingPrevention(TONEWRIGHT_Handle source, int32_t prevent);
 
 /* Warnings about the sound read since the last call, such as clipping or repaired damage: one per line, or

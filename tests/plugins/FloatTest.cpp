@@ -68,11 +68,14 @@ TEST_F(Float, PassesUnchangedWhereBothFilesHoldIt) {
             EXPECT_TRUE(readAll(source) == integers);
             EXPECT_EQ(20011 / 44100.0, source->getDuration());
         }
-        // Another width, or a source whose format was chosen.
+        // Another width, a source whose format was chosen, and another rate.
         EXPECT_FALSE(peru::interfaceCast<IFloatSamples>(makeFormat(folder / "y.wav"))->canUseFloat(bytes));
-        encode(openSource(folder / "in.wav", shape), makeFormat(folder / "y.wav", shape));
-        EXPECT_TRUE(read(folder / "y.wav", shape) == integers);
-        EXPECT_EQ("PCM signed 32 bit", codecOf(openSource(folder / "y.wav", shape)));
+        for (const auto& [from, rate] : {std::pair{openSource(folder / "in.wav", shape), 44100},
+                                         std::pair{openOwn(folder / "in.wav", "sonora2_wav"), 48000}}) {
+            encode(from, makeFormat(folder / "y.wav", {rate, 2, 4}));
+            EXPECT_TRUE(read(folder / "y.wav", {rate, 2, 4}) == integers);
+            EXPECT_EQ("PCM signed 32 bit", codecOf(openSource(folder / "y.wav", {rate, 2, 4})));
+        }
     }
 }
 

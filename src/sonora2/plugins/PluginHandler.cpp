@@ -301,7 +301,7 @@ SFailure CPluginHandler::explainSource(const P<IURI>& uri, int mask, const SAtte
             const CCloseGuard guard(*source);
             source->open();
             const int channels = source->getChannelCount();
-            if ((mask & kAudioSource) &&
+            if ((mask & kAudioSource) && channels != wanted.nChannelCount &&
                 !samplerateconverter::CSampleRateConverter::canConvert(channels, wanted.nChannelCount))
                 return makeFailure(peru::format("%s has %d channels, which cannot be converted to %d", name,
                                                 channels, wanted.nChannelCount),
