@@ -38,7 +38,7 @@ check_command() {
     if command -v groff >/dev/null; then
         [[ -z $(groff -man -ww -z -Tutf8 "$page" 2>&1) ]] || fail "groff warns about the manual page of $name"
     fi
-    for option in $(grep -oE '^  (-[a-zA-Z],)?--?[a-z-]+' <<<"$help" | tr ',' ' '); do
+    for option in $(grep -oE '^  (-[a-zA-Z],)?--?[a-zA-Z0-9-]+' <<<"$help" | tr ',' ' '); do
         grep -qE -- "(^| )\\\\fB${option//-/\\\\-}\\\\fR" "$page" || fail "the manual page of $name lacks $option"
         [[ " $(complete_words "$@" -) " == *" $option "* ]] || fail "$name is not completed with $option"
     done
