@@ -16,7 +16,7 @@ add_custom_command(
     COMMENT "Manual pages and completions"
     VERBATIM
 )
-add_custom_target(pages ALL DEPENDS ${pages}.stamp)
+add_custom_target(tonewright_pages ALL DEPENDS ${pages}.stamp)
 
 # Debian's zsh searches site-functions below /usr/local only.
 set(zsh_folder $<IF:$<BOOL:${TONEWRIGHT_PACKAGING}>,vendor-completions,site-functions>)
