@@ -13,6 +13,7 @@ public:
     virtual void setTempExtension(const P<peru::IString>& extension) = 0;
     virtual STags readAllTags(const P<peru::IURI>& file) = 0;
     virtual STransferReport addTags(const P<peru::IURI>& file, const STags& tags) = 0;
+    virtual bool changeTags(const P<peru::IURI>& file, const STagChange& change) = 0;
 };
 
 // The function "filetag_getLibrary" that the library exports.

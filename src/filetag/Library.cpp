@@ -19,6 +19,9 @@ public:
     STransferReport addTags(const P<peru::IURI>& file, const STags& tags) override {
         return filetag::addTags(file, tags);
     }
+    bool changeTags(const P<peru::IURI>& file, const STagChange& change) override {
+        return filetag::changeTags(file, change);
+    }
 };
 
 } // namespace

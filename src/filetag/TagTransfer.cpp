@@ -126,6 +126,31 @@ std::vector<STagPicture> findLostPictures(const std::vector<SPicture>& wanted, s
     return lost;
 }
 
+// Makes a change to the file as it is then, and does so again if a program that ignores locks has changed it
+// meanwhile.
+template <class Change> auto changeFile(const P<IURI>& file, Change change) {
+    for (int attempt = 1;; ++attempt) {
+        CAnyTagFile target(file, posix::EAccess::exclusive);
+        try {
+            return change(target);
+        } catch (const posix::CFileChangedError&) {
+            if (attempt == posix::kAttempts) throw;
+        }
+    }
+}
+
+bool hasPicture(const std::vector<SPicture>& pictures, const SPicture& picture) {
+    return std::any_of(pictures.begin(), pictures.end(),
+                       [&](const SPicture& other) { return other.data == picture.data; });
+}
+
+[[noreturn]] void failField(const P<IString>& key, const P<IURI>& file) {
+    throw CFileError(localize("filetag.SetTagField.NotSupported",
+                              "The field '%FIELD%' cannot be stored in the file '%FILE%'.",
+                              {{"%FIELD%", key}, {"%FILE%", getShownName(file)}}),
+                     file);
+}
+
 STransferReport write(CAnyTagFile& file, const PropertyMap& fields, const std::vector<SPicture>* pictures) {
     file.write(fields, pictures);
     STransferReport report;
@@ -174,57 +199,89 @@ STags readAllTags(const P<IURI>& file) {
 STransferReport writeAllTags(const P<IURI>& file, const STags& tags) {
     const PropertyMap fields = fromPublic(tags.fields);
     const std::vector<SPicture> pictures = fromPublic(tags.pictures);
-    CAnyTagFile target(file);
-    STransferReport report = write(target, fields, &pictures);
-    target.commit();
-    return report;
+    return changeFile(file, [&](CAnyTagFile& target) {
+        STransferReport report = write(target, fields, &pictures);
+        target.commit();
+        return report;
+    });
 }
 
 void setTagField(const P<IURI>& file, const CStringArg& key, const std::vector<P<IString>>& values) {
-    CAnyTagFile target(file);
-    PropertyMap fields = target.readFields();
-    const String name = toTagText(key).upper();
-    fields.erase(name);
-    PropertyMap wanted;
-    for (const P<IString>& value : values)
-        if (value && !value->isEmpty()) wanted.insert(name, toTagText(value));
-    fields.merge(wanted);
-    target.write(fields, nullptr);
-    if (!findLostFields(wanted, target.readFields()).empty())
-        throw CFileError(localize("filetag.SetTagField.NotSupported",
-                                  "The field '%FIELD%' cannot be stored in the file '%FILE%'.",
-                                  {{"%FIELD%", key}, {"%FILE%", getShownName(file)}}),
-                         file);
-    target.commit();
+    changeTags(file, {{{fromTagText(toTagText(key)), values}}, {}, false, {}});
 }
 
 std::vector<STagPicture> setTagPictures(const P<IURI>& file, const std::vector<STagPicture>& pictures) {
     const std::vector<SPicture> wanted = fromPublic(pictures);
-    CAnyTagFile target(file);
-    STransferReport report = write(target, target.readFields(), &wanted);
-    target.commit();
-    return std::move(report.lostPictures);
+    return changeFile(file, [&](CAnyTagFile& target) {
+        STransferReport report = write(target, target.readFields(), &wanted);
+        target.commit();
+        return std::move(report.lostPictures);
+    });
 }
 
 STransferReport addTags(const P<IURI>& file, const STags& tags) {
-    CAnyTagFile target(file);
     PropertyMap carried = fromPublic(tags.fields);
     for (const char* key : kTechnical) carried.erase(key);
     useCommonNames(carried);
-    PropertyMap fields = target.readFields();
-    for (const auto& [key, values] : carried) fields.replace(key, values);
-    std::vector<SPicture> pictures = fromPublic(tags.pictures);
-    const size_t carriedPictures = pictures.size();
-    for (const SPicture& picture : target.readPictures())
-        if (std::none_of(pictures.begin(), pictures.begin() + static_cast<std::ptrdiff_t>(carriedPictures),
-                         [&](const SPicture& other) { return other.data == picture.data; }))
-            pictures.push_back(picture);
+    const std::vector<SPicture> carriedPictures = fromPublic(tags.pictures);
+    return changeFile(file, [&](CAnyTagFile& target) {
+        PropertyMap fields = target.readFields();
+        for (const auto& [key, values] : carried) fields.replace(key, values);
+        std::vector<SPicture> pictures = carriedPictures;
+        for (const SPicture& picture : target.readPictures())
+            if (!hasPicture(carriedPictures, picture)) pictures.push_back(picture);
 
-    STransferReport report = write(target, fields, &pictures);
-    for (const P<IString>& name : tags.others)
-        if (!contains(kTechnical, toTagText(name))) report.lostFields.push_back(name);
-    target.commit();
-    return report;
+        STransferReport report = write(target, fields, &pictures);
+        for (const P<IString>& name : tags.others)
+            if (!contains(kTechnical, toTagText(name))) report.lostFields.push_back(name);
+        target.commit();
+        return report;
+    });
+}
+
+bool changeTags(const P<IURI>& file, const STagChange& change) {
+    PropertyMap wanted, removed;
+    for (const STagField& field : change.fields) {
+        const String key = toTagText(field.key).upper();
+        removed.insert(key, StringList());
+        for (const P<IString>& value : field.values)
+            if (value && !value->isEmpty()) wanted.insert(key, toTagText(value));
+    }
+    const std::vector<SPicture> added = fromPublic(change.addedPictures);
+    const auto isRemoved = [&](const SPicture& picture) {
+        const std::vector<int32_t>& types = change.removedPictures;
+        return change.removesAllPictures ||
+               std::find(types.begin(), types.end(), picture.type) != types.end();
+    };
+    return changeFile(file, [&](CAnyTagFile& target) {
+        const PropertyMap before = target.readFields();
+        PropertyMap fields = before;
+        for (const auto& entry : removed) fields.erase(entry.first);
+        fields.merge(wanted);
+        const std::vector<SPicture> old = target.readPictures();
+        std::vector<SPicture> pictures = old;
+        pictures.erase(std::remove_if(pictures.begin(), pictures.end(), isRemoved), pictures.end());
+        // In front, since formats without types show the first one.
+        pictures.insert(pictures.begin(), added.begin(), added.end());
+        const bool picturesChange = !std::equal(pictures.begin(), pictures.end(), old.begin(), old.end(),
+                                                [](const SPicture& a, const SPicture& b) {
+                                                    return a.data == b.data && a.type == b.type &&
+                                                           a.mimeType == b.mimeType &&
+                                                           a.description == b.description;
+                                                });
+        if (fields == before && !picturesChange) return false;
+
+        const STransferReport report = write(target, fields, picturesChange ? &pictures : nullptr);
+        for (const P<IString>& name : report.lostFields)
+            if (wanted.contains(toTagText(name)) || before.contains(toTagText(name))) failField(name, file);
+        if (!report.lostPictures.empty())
+            throw CFileError(localize("filetag.ChangeTags.Picture",
+                                      "The picture cannot be stored in the file '%FILE%'.",
+                                      {{"%FILE%", getShownName(file)}}),
+                             file);
+        target.commit();
+        return true;
+    });
 }
 
 STransferReport transferTags(const P<IURI>& source, const P<IURI>& target) {

@@ -35,6 +35,15 @@ struct STags {
     std::vector<P<peru::IString>> others;
 };
 
+// A change of some fields and pictures; the others stay.
+struct STagChange {
+    std::vector<STagField>
+        fields; // replace those of the same key, in any case; without values they are removed
+    std::vector<int32_t> removedPictures; // by `fileType`
+    bool removesAllPictures = false;
+    std::vector<STagPicture> addedPictures; // become the first ones
+};
+
 // What the target's format could not hold, or holds in a shortened form.
 struct STransferReport {
     std::vector<P<peru::IString>> lostFields;
@@ -45,13 +54,17 @@ struct STransferReport {
 // All functions accept every format with tags, whatever the extension: besides those of CFileTagFactory also
 // Opus, Speex, MP4, AIFF, APE, WavPack, Musepack and True Audio. They throw CFileError: CFileNotFoundError,
 // CFileAccessDeniedError, and CFileFormatNotSupportedError for other content. A file is replaced as by
-// IFileTag::store: after an error it is unchanged. Functions may be called from any thread, but not for the
-// same file at the same time.
+// IFileTag::store: after an error it is unchanged. Functions may be called from any thread. They read and
+// write under a lock, so that changes that several threads or processes make to one file are all kept.
 
 FILETAG_API STags readAllTags(const P<peru::IURI>& file);
 
 // Replaces all fields and pictures; whatever `others` names stays in the file.
 FILETAG_API STransferReport writeAllTags(const P<peru::IURI>& file, const STags& tags);
+
+// Returns false if the file is like that already; it is then not written. Throws CFileError if the format
+// cannot hold the new fields and pictures, or cannot keep the others.
+FILETAG_API bool changeTags(const P<peru::IURI>& file, const STagChange& change);
 
 // Sets one field, or removes it if there are no values. Throws CFileError if the format cannot hold them.
 FILETAG_API void setTagField(const P<peru::IURI>& file, const peru::CStringArg& key,

@@ -154,6 +154,56 @@ TEST(TagTransfer, ReportsWhatTheTargetCannotHold) {
     EXPECT_FALSE(getFields(readAllTags(toURI(target))).contains("MOOD"));
 }
 
+// A Vorbis comment in FLAC has at most 16 MB.
+TEST(TagTransfer, LeavesOutTheLongestFieldsWhereNotAllFit) {
+    const CTempFolder folder;
+    const auto target = makePlain(folder, "a", "flac");
+    const std::string long1(9'000'000, 'l'), long2(8'500'000, 'm');
+    setTagField(toURI(target), "MOOD", {tests::fromStandard(long2)});
+    const STransferReport report =
+        addTags(toURI(target), makeTags({{"LYRICS", {long1}}, {"TITLE", {"T"}}}, {}));
+    ASSERT_EQ(report.lostFields.size(), 1u);
+    EXPECT_EQ(tests::text(report.lostFields[0]), "LYRICS");
+    EXPECT_EQ(tests::run({"metaflac", "--show-tag=TITLE", target}).out, "TITLE=T\n");
+    CFields fields = getFields(readAllTags(toURI(target)));
+    EXPECT_TRUE(fields["MOOD"].at(0) == long2) << "what was there stays";
+    EXPECT_EQ(tests::errorOf([&] {
+                  setTagField(toURI(target), "LYRICS", {tests::fromStandard(long1)});
+              }).find("The field 'LYRICS' cannot be stored"),
+              0u);
+    EXPECT_TRUE(getFields(readAllTags(toURI(target))) == fields);
+}
+
+TEST(TagTransfer, ChangesFieldsAndPicturesTogether) {
+    const CTempFolder folder;
+    for (const std::string format : {"flac", "mp3", "opus", "m4a", "wav"}) {
+        SCOPED_TRACE(format);
+        const auto file = makePlain(folder, "a", format);
+        writeAllTags(toURI(file), makeTags({{"TITLE", {"T"}}, {"MOOD", {"m"}}},
+                                           {makePicture(3, "image/png", "\x89PNG 1")}));
+        STagChange change;
+        change.fields = makeTags({{"title", {"a", "b"}}, {"COMPOSER", {"C"}}}, {}).fields;
+        change.fields.push_back({tests::fromStandard("mood"), {}});
+        change.addedPictures = {makePicture(3, "image/jpeg", "\xff\xd8\xff 2")};
+        change.removedPictures = {3};
+        EXPECT_TRUE(changeTags(toURI(file), change));
+        const STags tags = readAllTags(toURI(file));
+        CFields fields = getFields(tags);
+        fields.erase("ENCODER");
+        EXPECT_EQ(fields, (CFields{{"COMPOSER", {"C"}}, {"TITLE", {"a", "b"}}}));
+        ASSERT_EQ(tags.pictures.size(), 1u);
+        EXPECT_EQ(toString(tags.pictures[0]), "\xff\xd8\xff 2");
+        // In MP4 pictures have no description.
+        EXPECT_EQ(changeTags(toURI(file), change), format == "m4a") << "like that already";
+        const std::string before = tests::readFile(file);
+        EXPECT_FALSE(changeTags(
+            toURI(file), {{{tests::fromStandard("composer"), {tests::fromStandard("C")}}}, {4}, false, {}}));
+        EXPECT_TRUE(tests::readFile(file) == before);
+        EXPECT_TRUE(changeTags(toURI(file), {{}, {}, true, {}}));
+        EXPECT_TRUE(readAllTags(toURI(file)).pictures.empty());
+    }
+}
+
 TEST(TagTransfer, RefusesWhatIsNoSound) {
     const CTempFolder folder;
     const std::string wave = tests::readFile(makePlain(folder, "a", "wav"));

@@ -2,14 +2,13 @@
 
 #include "filetag/id3tag/CoverArt.h"
 #include "filetag/id3tag/OldTag.h"
+#include "filetag/id3tag/TextFrames.h"
 
 #include <apetag.h>
-#include <id3v1genres.h>
 #include <id3v1tag.h>
 #include <id3v2framefactory.h>
 #include <id3v2header.h>
 #include <id3v2tag.h>
-#include <textidentificationframe.h>
 
 #include <algorithm>
 
@@ -18,55 +17,11 @@ namespace filetag::id3tag {
 using namespace peru;
 using taglib::EField;
 using TagLib::ID3v2::AttachedPictureFrame;
-using TagLib::ID3v2::CommentsFrame;
-using TagLib::ID3v2::TextIdentificationFrame;
-using TagLib::ID3v2::UserTextIdentificationFrame;
 
 namespace {
 
-const char* getFrameId(EField field) {
-    switch (field) {
-    case EField::title:
-        return "TIT2";
-    case EField::artist:
-        return "TPE1";
-    case EField::album:
-        return "TALB";
-    case EField::albumArtist:
-        return "TPE2";
-    case EField::trackNumber:
-        return "TRCK";
-    case EField::year:
-        return "TDRC";
-    case EField::genre:
-        return "TCON";
-    case EField::comment:
-        return "COMM";
-    }
-    return "";
-}
-
-// Converts an ID3v1 genre number to its name.
-TagLib::String toGenre(const TagLib::String& text) {
-    bool isNumber = false;
-    const int number = text.toInt(&isNumber);
-    const TagLib::String name = isNumber ? TagLib::ID3v1::genre(number) : TagLib::String();
-    return name.isEmpty() ? text : name;
-}
-
 constexpr EField kFields[] = {EField::title,       EField::artist, EField::album, EField::albumArtist,
                               EField::trackNumber, EField::year,   EField::genre, EField::comment};
-
-// Some programs write the comment as a user text frame named "comment".
-UserTextIdentificationFrame* findOtherComment(TagLib::ID3v2::Tag* tag) {
-    return UserTextIdentificationFrame::find(tag, "comment");
-}
-
-// Other descriptions mark comments in which programs store data of their own.
-bool isPlainComment(const TagLib::String& description) {
-    const TagLib::String upper = description.upper();
-    return upper.isEmpty() || upper == "COMMENT" || upper == "ID3V1 COMMENT";
-}
 
 const char* getApeKey(EField field) {
     switch (field) {
@@ -144,34 +99,6 @@ P<IString> CID3Tag::getTagType() const {
     return m_apeTag ? newString("APE") : CString::empty();
 }
 
-CommentsFrame* CID3Tag::findComment() const {
-    CommentsFrame* found = nullptr;
-    for (TagLib::ID3v2::Frame* frame : m_tag->frameList("COMM")) {
-        auto* comment = dynamic_cast<CommentsFrame*>(frame);
-        if (!comment) continue;
-        if (comment->description().isEmpty()) return comment;
-        if (!found && isPlainComment(comment->description())) found = comment;
-    }
-    return found;
-}
-
-TagLib::String CID3Tag::readComment() const {
-    if (const CommentsFrame* comment = findComment()) return comment->text();
-    const UserTextIdentificationFrame* other = findOtherComment(m_tag);
-    return other && other->fieldList().size() > 1 ? other->fieldList()[1] : TagLib::String();
-}
-
-TagLib::String CID3Tag::readFrame(EField field) const {
-    if (!m_tag) return {};
-    if (field == EField::comment) return readComment();
-    const TagLib::ID3v2::FrameList frames = m_tag->frameList(getFrameId(field));
-    if (frames.isEmpty()) return {};
-    const auto* frame = dynamic_cast<const TextIdentificationFrame*>(frames.front());
-    if (!frame || frame->fieldList().isEmpty()) return {};
-    const TagLib::String text = frame->fieldList().front();
-    return field == EField::genre ? toGenre(text) : text;
-}
-
 // ID3v1 truncates texts, so the APE tag takes precedence if it has the same text in full.
 TagLib::String CID3Tag::readField(EField field) const {
     const TagLib::String text = readFrame(field);
@@ -181,34 +108,16 @@ TagLib::String CID3Tag::readField(EField field) const {
     return old.isEmpty() || ape.startsWith(old) ? ape : old;
 }
 
-void CID3Tag::writeComment(const TagLib::String& text) {
-    m_editedIds.insert(m_editedIds.end(), {"COMM", "TXXX"});
-    while (UserTextIdentificationFrame* other = findOtherComment(m_tag)) m_tag->removeFrame(other);
-    if (text.isEmpty()) {
-        while (CommentsFrame* comment = findComment()) m_tag->removeFrame(comment);
-        return;
-    }
-    CommentsFrame* comment = findComment();
-    if (!comment) {
-        auto fresh = std::make_unique<CommentsFrame>(TagLib::String::UTF8);
-        comment = fresh.get();
-        m_tag->addFrame(fresh.release());
-    }
-    comment->setTextEncoding(TagLib::String::UTF8);
-    comment->setText(text);
+TagLib::String CID3Tag::readFrame(EField field) const {
+    return m_tag ? readTextFrame(*m_tag, field) : TagLib::String();
 }
 
 void CID3Tag::writeFrame(EField field, const TagLib::String& text) {
     if (!text.isEmpty()) createTag();
     if (!m_tag) return;
-    if (field == EField::comment) return writeComment(text);
-    const char* id = getFrameId(field);
-    m_editedIds.emplace_back(id);
-    m_tag->removeFrames(id);
-    if (text.isEmpty()) return;
-    auto frame = std::make_unique<TextIdentificationFrame>(id, TagLib::String::UTF8);
-    frame->setText(text);
-    m_tag->addFrame(frame.release());
+    const std::vector<TagLib::ByteVector> ids = getTextFrameIds(field);
+    m_editedIds.insert(m_editedIds.end(), ids.begin(), ids.end());
+    writeTextFrame(*m_tag, field, text);
 }
 
 void CID3Tag::writeField(EField field, const TagLib::String& text) {

@@ -5,7 +5,6 @@
 #include "filetag/taglib/TagLibTag.h"
 
 #include <attachedpictureframe.h>
-#include <commentsframe.h>
 #include <mpegfile.h>
 
 #include <vector>
@@ -41,11 +40,8 @@ private:
     std::vector<TagLib::ID3v2::AttachedPictureFrame*> getPictures() const;
     TagLib::ID3v2::AttachedPictureFrame* getPicture(int32_t index) const; // null if out of range
     void createTag();
-    TagLib::ID3v2::CommentsFrame* findComment() const; // the one shown to users; null if there is none
-    TagLib::String readComment() const;
     TagLib::String readFrame(taglib::EField field) const;
     void writeFrame(taglib::EField field, const TagLib::String& text);
-    void writeComment(const TagLib::String& text);
 
     taglib::SId3Tag m_source; // the ID3v2 tag in the file
     mutable std::vector<TagLib::ByteVector> m_editedIds;

@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
+#include <ctime>
 #include <fcntl.h>
 #include <sys/file.h>
 #include <system_error>
@@ -16,15 +17,43 @@
 namespace filetag::posix {
 
 using namespace peru;
+using std::chrono::steady_clock;
 
 namespace {
 
 constexpr int64_t kPage = 4096;
 
+constexpr std::chrono::seconds kLongestWait(10);
+
+// Where the file system has no locks, checkUnchanged() still narrows the gap to the time of the store.
+void lock(int descriptor, steady_clock::time_point end, const P<IURI>& uri) {
+    while (::flock(descriptor, LOCK_EX | LOCK_NB) != 0 && errno == EWOULDBLOCK) {
+        if (steady_clock::now() >= end)
+            throw CFileError(localize("filetag.COpenedFile.InUse",
+                                      "The file '%FILE%' is in use by another program.",
+                                      {{"%FILE%", getShownName(uri)}}),
+                             uri);
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    }
+}
+
 std::string getPath(const P<IURI>& file) {
     const std::string path = CString::toStdString(getPathes()->toPlatformPath(file));
     if (path.empty()) throw CURITypeNotSupportedError(file);
     return path;
+}
+
+// The tick of the clock that file systems use; twice the longest one of usual kernels.
+constexpr int64_t kTick = 20'000'000;
+
+int64_t toNanoseconds(const timespec& time) {
+    return int64_t{time.tv_sec} * 1'000'000'000 + time.tv_nsec;
+}
+
+bool isOlderThanATick(const timespec& time) {
+    timespec now = {};
+    ::clock_gettime(CLOCK_REALTIME, &now);
+    return toNanoseconds(now) - toNanoseconds(time) > kTick;
 }
 
 bool isSameTime(const timespec& one, const timespec& other) {
@@ -45,8 +74,18 @@ CDescriptor::~CDescriptor() {
     if (m_descriptor >= 0) ::close(m_descriptor);
 }
 
-COpenedFile::COpenedFile(const P<IURI>& uri)
-    : m_uri(uri), m_path(getPath(uri)), m_file(openPath()), m_state(readState(m_file.get())) {}
+PERU_EXCEPTION_IMPL(CFileChangedError)
+
+CFileChangedError::CFileChangedError(const P<IURI>& file)
+    : CFileError(localize("filetag.CTagLibIOStream.FileChanged",
+                          "The file '%FILE%' was changed by another program.",
+                          {{"%FILE%", getShownName(file)}}),
+                 file) {}
+
+COpenedFile::COpenedFile(const P<IURI>& uri, EAccess access)
+    : m_uri(uri), m_path(getPath(uri)), m_file(access == EAccess::exclusive ? openLocked() : openPath()),
+      m_state(readState(m_file.get())),
+      m_certain(access == EAccess::exclusive || isOlderThanATick(m_state.status.st_mtim)) {}
 
 void COpenedFile::fail(int error) const {
     if (error == EACCES || error == EPERM) throw CFileAccessDeniedError(m_uri);
@@ -55,6 +94,22 @@ void COpenedFile::fail(int error) const {
                               {{"%FILE%", getShownName(m_uri)},
                                {"%MSG%", CString::fromUTF8(std::generic_category().message(error))}}),
                      m_uri);
+}
+
+// The file that was locked may have been replaced by the program that held the lock before.
+int COpenedFile::openLocked() const {
+    const steady_clock::time_point end = steady_clock::now() + kLongestWait;
+    for (;;) {
+        const CDescriptor file(openPath());
+        lock(file.get(), end, m_uri);
+        struct stat opened = {}, named = {};
+        if (::fstat(file.get(), &opened) != 0) fail(errno);
+        if (::stat(m_path.c_str(), &named) != 0) fail(errno);
+        if (opened.st_dev != named.st_dev || opened.st_ino != named.st_ino) continue;
+        const int descriptor = ::fcntl(file.get(), F_DUPFD_CLOEXEC, 0);
+        if (descriptor < 0) fail(errno);
+        return descriptor;
+    }
 }
 
 int COpenedFile::openPath() const {
@@ -97,28 +152,11 @@ void COpenedFile::checkUnchanged() const {
     if (now.status.st_dev == old.st_dev && now.status.st_ino == old.st_ino &&
         now.status.st_size == old.st_size && !isTouched(now.status, old) && now.pages == m_state.pages)
         return;
-    failChanged();
-}
-
-void COpenedFile::failChanged() const {
-    throw CFileError(localize("filetag.CTagLibIOStream.FileChanged",
-                              "The file '%FILE%' was changed by another program.",
-                              {{"%FILE%", getShownName(m_uri)}}),
-                     m_uri);
+    throw CFileChangedError(m_uri);
 }
 
 COpenedFile::CLock::CLock(const COpenedFile& file) : m_descriptor(file.m_file.get()) {
-    using namespace std::chrono;
-    const auto end = steady_clock::now() + seconds(10);
-    // Where the file system has no locks, checkUnchanged() still narrows the gap to the time of the store.
-    while (::flock(m_descriptor, LOCK_EX | LOCK_NB) != 0 && errno == EWOULDBLOCK) {
-        if (steady_clock::now() >= end)
-            throw CFileError(localize("filetag.COpenedFile.InUse",
-                                      "The file '%FILE%' is in use by another program.",
-                                      {{"%FILE%", getShownName(file.m_uri)}}),
-                             file.m_uri);
-        std::this_thread::sleep_for(milliseconds(5));
-    }
+    lock(m_descriptor, steady_clock::now() + kLongestWait, file.m_uri);
 }
 
 COpenedFile::CLock::~CLock() {

@@ -1,7 +1,9 @@
 #include "filetag/rifftag/RIFFTag.h"
 
 #include "filetag/Text.h"
+#include "filetag/id3tag/TextFrames.h"
 #include "filetag/posix/OpenedFile.h"
+#include "filetag/taglib/Texts.h"
 #include "peru/Errors.h"
 #include "peru/files/IFileReplacement.h"
 #include "peru/streams/IStreamManager.h"
@@ -22,6 +24,15 @@ constexpr FourCC kTrackNumber{'T', 'R', 'C', 'K'};
 constexpr FourCC kYear{'I', 'C', 'R', 'D'};
 constexpr FourCC kGenre{'I', 'G', 'N', 'R'};
 constexpr FourCC kComment{'I', 'C', 'M', 'T'};
+
+taglib::EField getField(const FourCC& id) {
+    return id == kTitle         ? taglib::EField::title
+           : id == kArtist      ? taglib::EField::artist
+           : id == kTrackNumber ? taglib::EField::trackNumber
+           : id == kYear        ? taglib::EField::year
+           : id == kGenre       ? taglib::EField::genre
+                                : taglib::EField::comment;
+}
 
 // The list is held in memory. No program writes one anywhere near this size.
 constexpr int64_t kMaxList = 64 * 1024 * 1024;
@@ -79,11 +90,40 @@ std::vector<uint8_t> readList(const P<peru::ISeekableInStream>& file, const P<pe
     return {};
 }
 
-int64_t getNewSize(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri, int64_t listSize) {
+using Texts = std::map<FourCC, std::string>;
+
+// A chunk that gets another body.
+struct SNewChunk {
+    int64_t offset = -1; // in the old file; -1 for none
+    TagLib::ByteVector body;
+};
+
+// The ID3v2 chunk with these texts, if that differs from the one in the file.
+SNewChunk changeId3Chunk(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri,
+                         const Texts& texts) {
+    CChunkReader chunks = readChunks(file, uri);
+    for (SChunk chunk; chunks.next(chunk);) {
+        if (chunk.id != FourCC{'i', 'd', '3', ' '} && chunk.id != FourCC{'I', 'D', '3', ' '}) continue;
+        if (chunk.size > kMaxList) break;
+        TagLib::ByteVector old(static_cast<unsigned int>(chunk.size), '\0');
+        file->seek(chunk.offset + kChunkHeader);
+        file->read(old.data(), chunk.size);
+        std::map<taglib::EField, TagLib::String> fields;
+        for (const auto& [id, text] : texts) fields[getField(id)] = taglib::toTagText(readNarrowText(text));
+        const TagLib::ByteVector body = id3tag::changeTexts(old, fields);
+        if (body != old) return {chunk.offset, body};
+        break;
+    }
+    return {};
+}
+
+int64_t getNewSize(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri, int64_t listSize,
+                   const SNewChunk& changed) {
     CChunkReader chunks = readChunks(file, uri);
     int64_t size = CChunkReader::kHeaderSize + listSize;
     for (SChunk chunk; chunks.next(chunk);) {
         if (chunk.info) continue;
+        if (chunk.offset == changed.offset) chunk.size = changed.body.size();
         size += kChunkHeader + chunk.size + (needsPad(chunk) ? 1 : 0);
     }
     return size;
@@ -117,10 +157,17 @@ private:
 };
 
 void copyFile(const P<peru::ISeekableInStream>& file, const P<peru::IURI>& uri,
-              const std::vector<uint8_t>& list, CCopier& copier) {
+              const std::vector<uint8_t>& list, const SNewChunk& changed, CCopier& copier) {
     CChunkReader chunks = readChunks(file, uri);
     for (SChunk chunk; chunks.next(chunk);) {
         if (chunk.info) continue;
+        if (chunk.offset == changed.offset) {
+            const SChunkHeader header{chunk.id, changed.body.size()};
+            copier.write(&header, sizeof header);
+            copier.write(changed.body.data(), changed.body.size());
+            if (changed.body.size() % 2 != 0) copier.write("", 1);
+            continue;
+        }
         const int64_t body = chunk.offset + kChunkHeader;
         const bool mended = chunk.size != chunk.toldSize;
         if (mended) {
@@ -156,18 +203,33 @@ void CRIFFTag::close() {
     m_modified = false;
     m_list.reset();
     m_stored.clear();
+    m_texts.clear();
 }
 
 void CRIFFTag::store() {
     if (!m_modified) return;
+    for (int attempt = 1; m_modified; ++attempt) {
+        try {
+            storeOnce();
+        } catch (const posix::CFileChangedError&) {
+            if (attempt == posix::kAttempts) throw;
+        }
+    }
+}
+
+void CRIFFTag::storeOnce() {
     withFileErrors(m_uri, [this] {
-        const std::vector<uint8_t> list = m_list->render(isPaddingWanted());
-        const auto listSize = static_cast<int64_t>(list.size());
-        const posix::COpenedFile file(m_uri);
+        const posix::COpenedFile file(m_uri, posix::EAccess::exclusive);
         const posix::COpenedFile::CLock lock(file);
-        file.checkUnchanged();
         const P<peru::ISeekableInStream> old = openFile(m_uri);
-        const int64_t size = getNewSize(old, m_uri, listSize);
+        if (std::vector<uint8_t> now = readList(old, m_uri); now != m_stored) {
+            m_list = now.empty() ? CInfoList() : CInfoList(now);
+            m_stored = std::move(now);
+            for (const auto& [id, bytes] : m_texts) setInList(id, bytes);
+        }
+        const std::vector<uint8_t> list = m_list->render(isPaddingWanted());
+        const SNewChunk id3 = changeId3Chunk(old, m_uri, m_texts);
+        const int64_t size = getNewSize(old, m_uri, static_cast<int64_t>(list.size()), id3);
         if (size > kMaxFile)
             throw peru::CFileError(
                 peru::localize("filetag.CRIFFTag.fileTooLarge",
@@ -175,19 +237,19 @@ void CRIFFTag::store() {
                                "file cannot hold."),
                 m_uri);
 
-        // Other chunks are copied as they are now, but the list would undo what another program has stored.
-        if (readList(old, m_uri) != m_stored) file.failChanged();
         const P<peru::IFileReplacement> replacement = peru::getSystem()->startReplacement(m_uri);
         CCopier copier(replacement);
         const auto riffSize = static_cast<uint32_t>(size - kChunkHeader);
         copier.write("RIFF", 4);
         copier.write(&riffSize, sizeof riffSize);
         copier.write("WAVE", 4);
-        copyFile(old, m_uri, list, copier);
+        copyFile(old, m_uri, list, id3, copier);
+        file.checkUnchanged();
         replacement->commit();
         m_stored = list;
+        m_texts.clear();
+        m_modified = false;
     });
-    m_modified = false;
 }
 
 P<peru::IString> CRIFFTag::get(const FourCC& id) const {
@@ -196,13 +258,18 @@ P<peru::IString> CRIFFTag::get(const FourCC& id) const {
 
 void CRIFFTag::set(const FourCC& id, const peru::CStringArg& value) {
     if (!m_opened) return;
-    const std::string bytes = peru::CString::toStdString(value);
+    std::string bytes = peru::CString::toStdString(value);
+    setInList(id, bytes);
+    m_texts[id] = std::move(bytes);
+    m_modified = true;
+}
+
+void CRIFFTag::setInList(const FourCC& id, const std::string& bytes) {
     // Checked here, so that every list that was stored can be opened again.
     const int64_t used = m_list ? m_list->getSize() : 0;
     if (used + static_cast<int64_t>(bytes.size()) + 32 > kMaxList) throwListTooLarge(m_uri);
     if (!m_list) m_list.emplace();
     m_list->set(id, bytes);
-    m_modified = true;
 }
 
 void CRIFFTag::setTitle(const peru::CStringArg& title) {

@@ -5,7 +5,9 @@
 #include "filetag/rifftag/InfoList.h"
 #include "peru/Object.h"
 
+#include <map>
 #include <optional>
+#include <string>
 
 namespace filetag::rifftag {
 
@@ -13,6 +15,8 @@ namespace filetag::rifftag {
 // others of that type. Entries of odd size get a pad byte only if the environment variable
 // TONEWRIGHT_PAD_INFO is "1". Texts are written as UTF-8. Album and album artist are not supported. Setting
 // an empty text writes an entry without characters.
+//
+// Texts in an ID3v2 chunk, which many programs prefer, follow those of the list as they are set.
 //
 // RF64, the variant for files over 4 GB, is not supported.
 class FILETAG_API CRIFFTag : public peru::CObject, public IFileTag {
@@ -24,7 +28,8 @@ public:
     void open() override;
     void close() override;
     P<peru::IURI> getURI() const override { return m_uri; }
-    // Does not touch the file if nothing was set. The tag stays open.
+    // Does not touch the file if nothing was set. If another program has changed the list since it was
+    // opened, what was set is set in the new one. The tag stays open.
     void store() override;
 
     void setTitle(const peru::CStringArg& title) override;
@@ -48,12 +53,15 @@ public:
 private:
     P<peru::IString> get(const FourCC& id) const;
     void set(const FourCC& id, const peru::CStringArg& value);
+    void setInList(const FourCC& id, const std::string& bytes);
+    void storeOnce();
 
     P<peru::IURI> m_uri;
     bool m_opened = false;
     bool m_modified = false;
-    std::optional<CInfoList> m_list; // empty if the file has none
-    std::vector<uint8_t> m_stored;   // the list in the file, empty if it has none
+    std::optional<CInfoList> m_list;       // empty if the file has none
+    std::vector<uint8_t> m_stored;         // the list in the file, empty if it has none
+    std::map<FourCC, std::string> m_texts; // that were set
 };
 
 } // namespace filetag::rifftag

@@ -230,6 +230,25 @@ bool saveOggFlac(TagLib::Ogg::FLAC::File& file) {
     return file.TagLib::Ogg::File::save();
 }
 
+// Vorbis comments in FLAC have at most 16 MB. Leaves out the longest ones of the changed fields, so that what
+// was in the file stays.
+void fitComment(TagLib::FLAC::File& file, const PropertyMap& before) {
+    TagLib::Ogg::XiphComment* comment = file.xiphComment(false);
+    while (comment && !fitsFlacBlock(comment->render(false).size())) {
+        String longest;
+        unsigned int size = 0;
+        for (const auto& [key, values] : comment->fieldListMap()) {
+            const unsigned int length = values.toString("").size();
+            if (length <= size || key == kPictureField || (before.contains(key) && before[key] == values))
+                continue;
+            longest = key;
+            size = length;
+        }
+        if (size == 0) return;
+        comment->removeFields(longest);
+    }
+}
+
 bool save(TagLib::File& file) {
     if (auto* mpeg = dynamic_cast<TagLib::MPEG::File*>(&file))
         return mpeg->save(TagLib::MPEG::File::AllTags, TagLib::MPEG::File::StripOthers, TagLib::ID3v2::v4,
@@ -242,7 +261,7 @@ bool save(TagLib::File& file) {
 
 } // namespace
 
-CAnyTagFile::CAnyTagFile(const P<IURI>& uri) : m_uri(uri), m_stream(uri) {
+CAnyTagFile::CAnyTagFile(const P<IURI>& uri, posix::EAccess access) : m_uri(uri), m_stream(uri, access) {
     open();
 }
 
@@ -305,6 +324,7 @@ void CAnyTagFile::write(const PropertyMap& fields, const std::vector<SPicture>* 
         if (auto* asf = dynamic_cast<TagLib::ASF::File*>(file))
             writeFreeFields(*asf->tag(), before, fields, unsupported);
         if (mpeg) writeOtherTags(*mpeg, fields);
+        if (auto* flac = dynamic_cast<TagLib::FLAC::File*>(file)) fitComment(*flac, before);
     }
     if (pictures) writePictures(*file, *pictures);
     if (!m_lostFrames.empty()) failLostFrame(m_lostFrames.front(), m_uri);

@@ -14,8 +14,8 @@ using TagLib::PropertyMap;
 // Writing changes the file in memory; commit() writes it to disk. One thread at a time.
 class CAnyTagFile {
 public:
-    // Throws CFileError.
-    explicit CAnyTagFile(const P<peru::IURI>& uri);
+    // Throws CFileError. With exclusive access no other tag is stored to the file until the end of commit().
+    explicit CAnyTagFile(const P<peru::IURI>& uri, posix::EAccess access = posix::EAccess::shared);
 
     // Names without a key are in unsupportedData().
     PropertyMap readFields() const;
@@ -24,7 +24,9 @@ public:
     // Replaces all fields and, if given, all pictures, and reads the result back, which shows what the format
     // does not hold.
     void write(const PropertyMap& fields, const std::vector<SPicture>* pictures);
-    void commit(); // write() must not be called afterwards
+    // write() must not be called afterwards. Throws posix::CFileChangedError if another program changed the
+    // file.
+    void commit();
 
 private:
     void open();

@@ -26,8 +26,8 @@ std::string_view toView(const TagLib::ByteVector& bytes) {
 
 } // namespace
 
-CTagLibIOStream::CTagLibIOStream(const P<IURI>& file)
-    : m_uri(file), m_opened(std::make_unique<posix::COpenedFile>(file)),
+CTagLibIOStream::CTagLibIOStream(const P<IURI>& file, posix::EAccess access)
+    : m_uri(file), m_opened(std::make_unique<posix::COpenedFile>(file, access)),
       m_path(CString::toStdString(getPathes()->toPlatformPath(file))), m_file(m_opened->duplicate(), true),
       m_oldSize(m_file.length()) {}
 
@@ -187,11 +187,12 @@ void CTagLibIOStream::replaceFile() {
     replacement->commit();
 }
 
-void CTagLibIOStream::commit() {
+void CTagLibIOStream::commit(bool certain) {
     if (!m_pieces || !m_pieces->isChanged()) return;
     // The pieces refer to the file that was opened; combined with any other they would corrupt it.
     const posix::COpenedFile::CLock lock(*m_opened);
     m_opened->checkUnchanged();
+    if (certain && !m_opened->isCertain()) throw posix::CFileChangedError(m_uri);
     if (m_pieces->getSize() == m_oldSize) {
         const SRange range = findDifference();
         if (range.end == 0) return;

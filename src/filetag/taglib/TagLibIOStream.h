@@ -2,6 +2,7 @@
 #pragma once
 
 #include "filetag/Api.h"
+#include "filetag/posix/OpenedFile.h"
 #include "filetag/taglib/PieceTable.h"
 #include "peru/uri/IURI.h"
 
@@ -11,10 +12,6 @@
 #include <optional>
 #include <string>
 
-namespace filetag::posix {
-class COpenedFile;
-}
-
 namespace filetag::taglib {
 
 using peru::P;
@@ -23,15 +20,16 @@ using peru::P;
 // changed. TagLib calls only the operations of IOStream.
 class FILETAG_API CTagLibIOStream : public TagLib::IOStream {
 public:
-    // Throws CFileError if the file cannot be read.
-    explicit CTagLibIOStream(const P<peru::IURI>& file);
+    // Throws CFileError if the file cannot be read. With exclusive access no other tag is stored to the file
+    // until the end of commit().
+    explicit CTagLibIOStream(const P<peru::IURI>& file, posix::EAccess access = posix::EAccess::shared);
     ~CTagLibIOStream() override;
 
     // Writes the changes to disk. A change within one page of the file is written in place by a single call,
     // which cannot be torn; any other change makes a copy of the file, which then replaces it. Throws
-    // CFileError and leaves the file unchanged on failure, and also if another program has changed it since
-    // it was opened.
-    void commit();
+    // CFileError and leaves the file unchanged on failure; posix::CFileChangedError if another program has
+    // changed it since it was opened and, with `certain`, also if that cannot be ruled out.
+    void commit(bool certain = false);
 
     TagLib::FileName name() const override;
     TagLib::ByteVector readBlock(unsigned long length) override;

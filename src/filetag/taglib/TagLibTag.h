@@ -7,6 +7,7 @@
 
 #include <tfile.h>
 
+#include <map>
 #include <memory>
 
 namespace filetag::taglib {
@@ -21,6 +22,9 @@ public:
     void open() override;
     void close() override;
     P<peru::IURI> getURI() const override { return m_uri; }
+    // If another program has changed the file since it was opened, the texts that were set are set in its new
+    // content, and it is opened anew. Pictures are not, since they might be other ones: with changed pictures
+    // the store fails.
     void store() override;
 
     void setTitle(const peru::CStringArg& title) override { set(EField::title, title); }
@@ -44,7 +48,7 @@ public:
                          EPictureType type) override;
 
     // Called by pictures, which write through to the tag: there is something to store.
-    void markChanged() const { m_changed = true; }
+    void markChanged() const { m_picturesChanged = true; }
     // Changes with every open() and close(), which end the validity of pictures.
     uint32_t getGeneration() const { return m_generation; }
 
@@ -61,14 +65,17 @@ protected:
     virtual bool save(TagLib::File& file, TagLib::IOStream&) { return file.save(); }
 
 private:
+    void openWith(posix::EAccess access);
     void set(EField field, const peru::CStringArg& text);
     P<peru::IString> get(EField field) const;
+    void write(bool certain); // the changes that were made to the tag
 
     P<peru::IURI> m_uri;
     std::unique_ptr<CTagLibIOStream> m_stream; // null after store; otherwise outlives m_file
     std::unique_ptr<TagLib::File> m_file;
     uint32_t m_generation = 0;
-    mutable bool m_changed = false;
+    std::map<EField, TagLib::String> m_texts; // that were set
+    mutable bool m_picturesChanged = false;
 };
 
 } // namespace filetag::taglib
