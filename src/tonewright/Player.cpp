@@ -27,7 +27,6 @@ constexpr uint8_t kSilentByte = 0x80; // 8-bit samples are unsigned
 constexpr int kIdleRounds = 5;
 constexpr uint32_t kIdleMilliseconds = 100;
 constexpr int kTurnRounds = 10; // of a millisecond
-constexpr uint32_t kStopMilliseconds = 10000;
 
 bool hasFormat(IAudioSource& source, const CAudioFormat& format) {
     return source.getSampleRate() == format.getSampleRate() &&
@@ -51,14 +50,16 @@ private:
 };
 
 CPlayer::CPlayer(const P<peru::IURI>& uri, const P<IPluginHandler>& handler)
-    : CPlayer(uri, handler, nullptr) {}
+    : CPlayer(uri, handler, nullptr, kStopMilliseconds) {}
 
-CPlayer::CPlayer(const P<IAudioSource>& source) : CPlayer(nullptr, nullptr, source) {}
+CPlayer::CPlayer(const P<IAudioSource>& source, uint32_t stopMilliseconds)
+    : CPlayer(nullptr, nullptr, source, stopMilliseconds) {}
 
-CPlayer::CPlayer(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, const P<IAudioSource>& source)
-    : m_ended(peru::getSignalFactory()->createSignal()), m_wake(peru::getSignalFactory()->createSignal()),
-      m_uri(uri), m_handler(handler), m_lock(peru::getMutexFactory()->createMutex()),
-      m_control(peru::getMutexFactory()->createMutex()) {
+CPlayer::CPlayer(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, const P<IAudioSource>& source,
+                 uint32_t stopMilliseconds)
+    : m_stopMilliseconds(stopMilliseconds), m_ended(peru::getSignalFactory()->createSignal()),
+      m_wake(peru::getSignalFactory()->createSignal()), m_uri(uri), m_handler(handler),
+      m_lock(peru::getMutexFactory()->createMutex()), m_control(peru::getMutexFactory()->createMutex()) {
     m_ended->set();
     const auto device = peru::media::getSystem()->getDefaultOutDevice();
     if (!device) throw peru::CError("CPlayer::init could not open audio device");
@@ -100,7 +101,7 @@ void CPlayer::play() {
     {
         peru::CMutexLock control(m_control);
         // A play() that has reached its end may still need half a second to return.
-        if (m_isFeeding && m_state == TONEWRIGHT_PLAYER_STOPPED) m_ended->wait(kStopMilliseconds);
+        if (m_isFeeding && m_state == TONEWRIGHT_PLAYER_STOPPED) m_ended->wait(m_stopMilliseconds);
         if (m_isFeeding) throw peru::CError("CPlayer::play the player is playing already");
         m_ended->reset();
         m_isFeeding = true;
@@ -281,7 +282,7 @@ void CPlayer::stop() {
     if (m_state == TONEWRIGHT_PLAYER_STOPPED) return;
     m_state = TONEWRIGHT_PLAYER_STOPPED;
     m_wake->set();
-    if (!m_ended->wait(kStopMilliseconds))
+    if (!m_ended->wait(m_stopMilliseconds))
         throw peru::CError("playerthread could not be stopped in 10seconds");
     CTurn turn(*this);
     halt();

@@ -22,11 +22,14 @@ namespace tonewright {
 // during a call.
 class CPlayer : public peru::CObject, public IPlayerProgressTarget, public IPlayerControl {
 public:
+    static constexpr uint32_t kStopMilliseconds = 10000;
+
     // Both throw CError if there is no suitable device, format or source. The first asks the handler for a
     // source in a format that the device supports; the second never converts, so the device must support the
     // source's own format.
     CPlayer(const P<peru::IURI>& uri, const P<sonora2::common::IPluginHandler>& handler);
-    explicit CPlayer(const P<sonora2::common::IAudioSource>& source);
+    explicit CPlayer(const P<sonora2::common::IAudioSource>& source,
+                     uint32_t stopMilliseconds = kStopMilliseconds);
     ~CPlayer() override; // never throws or waits: no thread is in play() any more
 
     // Returns at the end of the source or after stop(); the next call plays from the source's beginning.
@@ -35,8 +38,8 @@ public:
     void play();
     // Toggles between paused and playing. Does nothing while a stop is under way.
     void pause();
-    // Waits until play() has finished; returns at once if nothing is playing. Throws CError after ten
-    // seconds, which is also the result of the first stop after a play() that ended with an exception.
+    // Waits until play() has finished; returns at once if nothing is playing. Throws CError after the time
+    // limit, which is also the result of the first stop after a play() that ended with an exception.
     void stop();
     // A call already under way still completes on the old callback.
     void setCallback(TONEWRIGHT_PlayerCallback callback) { m_callback = callback; }
@@ -68,8 +71,8 @@ private:
         int32_t state;
     };
 
-    explicit CPlayer(const P<peru::IURI>& uri, const P<sonora2::common::IPluginHandler>& handler,
-                     const P<sonora2::common::IAudioSource>& source);
+    CPlayer(const P<peru::IURI>& uri, const P<sonora2::common::IPluginHandler>& handler,
+            const P<sonora2::common::IAudioSource>& source, uint32_t stopMilliseconds);
 
     // Those marked "locked" are called with m_lock held.
     void start();
@@ -94,6 +97,7 @@ private:
     void report(const SReport& report) const; // not locked
     void reportState();                       // not locked
 
+    const uint32_t m_stopMilliseconds;
     P<peru::ISignal> m_ended; // reset while play() runs and after it has thrown
     P<peru::ISignal> m_wake;  // ends the feeding thread's idle time
     P<peru::IURI> m_uri;

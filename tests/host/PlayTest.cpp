@@ -6,16 +6,18 @@ namespace {
 
 // The program must not wait for a failing thread, which would take ten seconds.
 constexpr double kQuick = 8;
+// The most takes of a test that a busy sound server may spoil.
+constexpr int kTakes = 4;
 
 class Play : public CSoundTest {
 protected:
     Play() : CSoundTest(EMicrophone::none) {}
 
-    // Plays noise and returns the sound that was heard, without the silence before and after.
-    std::string hear(const SSound& noise, SProcessResult& result) {
-        write("noise.wav", noise);
+    // Plays the files and returns the sound that was heard, without the silence before and after.
+    std::string hear(std::vector<std::string> arguments) {
+        arguments.insert(arguments.begin(), {"play", "-q"});
         const std::unique_ptr<CProcess> ears = server.listen();
-        result = tonewright({"play", "noise.wav", "-q"});
+        const SProcessResult result = tonewright(arguments);
         EXPECT_EQ(result.exitCode, 0);
         EXPECT_EQ(result.out + result.err, "");
         return trim(ears->readOut());
@@ -24,50 +26,40 @@ protected:
 
 } // namespace
 
-// While other tests run, the sound server may have to wait for a processor and then plays a gap of its own.
-// That is a failure only if it happens every time.
-TEST_F(Play, IsBitExactAndHardlyCostsAnything) {
-    const SSound noise = makeLoudNoise(30);
-    SProcessResult result;
-    std::string heard = hear(noise, result);
-    for (int again = 0; again < 2 && heard != noise.samples; ++again) {
-        EXPECT_TRUE(withoutGaps(heard) == noise.samples);
-        heard = hear(noise, result);
-    }
+TEST_F(Play, IsBitExact) {
+    const SSound noise = makeLoudNoise(3);
+    write("noise.wav", noise);
+    std::string heard;
+    for (int take = 0; take < kTakes && heard != noise.samples; ++take) heard = hear({"noise.wav"});
     EXPECT_TRUE(heard == noise.samples);
-    const double cost = result.cpuSeconds / 30;
-    RecordProperty("cost", std::to_string(cost));
-#ifndef TONEWRIGHT_SANITIZED
-    EXPECT_LT(cost, 0.05); // of a core; about a third of that on an idle machine
-#endif
 }
 
-// Gaps are reported but allowed here; no sound is lost, repeated or out of order.
+// Gaps are allowed here; no sound is lost, repeated or out of order.
 TEST_F(Play, LosesNothingOnABusyMachine) {
     std::vector<std::unique_ptr<CProcess>> others;
     for (int i = 0; i < 4; ++i)
         others.push_back(std::make_unique<CProcess>(
             std::vector<std::string>{"setpriv", "--pdeathsig", "KILL", "sh", "-c", "while :; do :; done"}));
-    const SSound noise = makeLoudNoise(30);
-    SProcessResult result;
-    const std::string heard = hear(noise, result);
-    const std::string sound = withoutGaps(heard);
-    RecordProperty("gaps", std::to_string(static_cast<double>(heard.size() - sound.size()) / 4 / 44100));
+    const SSound noise = makeLoudNoise(3);
+    write("noise.wav", noise);
+    std::string sound;
+    for (int take = 0; take < kTakes && sound != noise.samples; ++take)
+        sound = withoutGaps(hear({"noise.wav"}));
     EXPECT_TRUE(sound == noise.samples);
 }
 
 TEST_F(Play, PausesWithoutLosingAnything) {
-    const SSound noise = makeLoudNoise(4);
+    const SSound noise = makeLoudNoise(2);
     write("noise.wav", noise);
     const std::unique_ptr<CProcess> ears = server.listen();
     const auto terminal = start({"play", "noise.wav"});
     CProcess& program = terminal->getProcess();
     const auto isPaused = [](const auto& event) { return event.value("state", "") == "paused"; };
-    waitForPosition(program, 1);
+    waitForPosition(program, 0.3);
     terminal->type(' ');
     const double paused = waitFor(program, isPaused)["position"];
-    EXPECT_LT(paused, 4);
-    std::this_thread::sleep_for(std::chrono::seconds(1)); // the pause lasts this long
+    EXPECT_LT(paused, 2);
+    std::this_thread::sleep_for(std::chrono::milliseconds(500)); // the pause lasts this long
     terminal->type(' ');
     const SProcessResult result = program.wait();
     EXPECT_EQ(result.exitCode, 0) << result.out << terminal->getScreen();
@@ -77,13 +69,14 @@ TEST_F(Play, PausesWithoutLosingAnything) {
     ASSERT_NE(gap, std::string::npos);
     const size_t start = gap / 4 * 4 + (heard.substr(gap / 4 * 4, 4) == std::string(4, '\0') ? 0 : 4);
     const size_t silent = heard.find_first_not_of('\0', start) / 4 * 4 - start;
-    EXPECT_GE(silent, 44100u * 4 * 9 / 10);
+    EXPECT_GE(silent, 44100u * 4 * 4 / 10);
     EXPECT_TRUE(withoutGaps(heard) == noise.samples);
     EXPECT_TRUE(terminal->isInUsualMode());
 }
 
 TEST_F(Play, TellsWhereItIs) {
     write("a.wav", makeTone(44100, 2, 16, 1.5));
+    write("b.wav", makeTone(44100, 2, 16, 0.2));
     const std::vector<nlohmann::json> events = parseLines(succeed({"play", "a.wav", "--json"}));
     EXPECT_EQ(events.front()["event"], "start");
     EXPECT_EQ(events.back()["event"], "done");
@@ -99,7 +92,7 @@ TEST_F(Play, TellsWhereItIs) {
         last = event["position"];
     }
     EXPECT_GE(count, 3u); // twice a second
-    EXPECT_EQ(succeed({"play", "a.wav"}), "a.wav: 0:01.5 played\n");
+    EXPECT_EQ(succeed({"play", "b.wav"}), "b.wav: 0:00.2 played\n");
 }
 
 TEST_F(Play, IsOneLineOnATerminal) {
@@ -159,7 +152,7 @@ TEST_F(Play, GoesOnWithTheNextFile) {
     EXPECT_NE(err.find("missing.wav: No such file"), std::string::npos) << err;
     EXPECT_NE(err.find("tonewright: bad.wav: Could not read: "), std::string::npos) << err;
     EXPECT_NE(err.find("tonewright: notes.txt: No plug-in reads .txt files"), std::string::npos) << err;
-    EXPECT_TRUE(trim(ears->readOut()) == noise.samples);
+    EXPECT_TRUE(withoutGaps(ears->readOut()) == noise.samples);
 }
 
 TEST_F(Play, EndsWithTheSoundServerInAPauseToo) {
