@@ -137,6 +137,8 @@ void CPlayer::start() {
     m_state.compare_exchange_strong(paused, TONEWRIGHT_PLAYER_PLAYING);
     // The device counts its position from open() and may still hold sound from before the last stop.
     if (m_device->isOpened()) m_device->close();
+    if (m_hasPlayed && !m_isDeviceChosen) followDefaultDevice();
+    m_hasPlayed = true;
     openDevice();
     m_writtenBytes = 0;
     m_isSilenceWritten = false;
@@ -339,8 +341,8 @@ bool CPlayer::isPastEnd() {
 
 void CPlayer::restartAt(double seconds) {
     STitle& heard = getHeard(m_device->getPosition());
+    heard.source->skipToTime(seconds); // first: a source that cannot seek goes on undisturbed
     returnUnheard();
-    heard.source->skipToTime(seconds);
     m_device->stop();
     const double position = m_device->getPosition();
     heard.offset = seconds - position;
@@ -372,6 +374,28 @@ double CPlayer::getVolume() {
     return m_volume;
 }
 
+// The default may have changed since the last play(). If the new one cannot be used, the old one may still be
+// there.
+void CPlayer::followDefaultDevice() {
+    quietly("CPlayer", [this] {
+        const auto device = peru::media::getSystem()->getDefaultOutDevice();
+        const auto isSame = [this, &device] {
+            return device->getName()->equals(m_device->getName()) &&
+                   device->getHostApiDisplayName()->equals(m_device->getHostApiDisplayName());
+        };
+        if (device && device != m_device && !isSame()) exchangeDevice(device);
+    });
+}
+
+void CPlayer::exchangeDevice(const P<peru::media::IAudioOutDevice>& device) {
+    const P<IAudioSource> source = m_titles.front().source;
+    const auto format =
+        device->getFormat(source->getSampleRate(), source->getBytesPerSample(), source->getChannelCount());
+    const bool isConvertible = m_handler && m_sourceIndex == 0 && (!format || !hasFormat(*source, *format));
+    useDevice(device, isConvertible ? nullptr : source);
+    m_device->setGain(m_volume);
+}
+
 void CPlayer::setDevice(const P<peru::media::IAudioOutDevice>& device) {
     if (!device) throw peru::CInvalidArgError("device", "CPlayer::setDevice");
     const auto requireStopped = [this] {
@@ -382,13 +406,9 @@ void CPlayer::setDevice(const P<peru::media::IAudioOutDevice>& device) {
     CTurn turn(*this);
     requireStopped();
     const P<peru::media::IAudioOutDevice> old = m_device;
-    const P<IAudioSource> source = m_titles.front().source;
-    const auto format =
-        device->getFormat(source->getSampleRate(), source->getBytesPerSample(), source->getChannelCount());
-    const bool isConvertible = m_handler && m_sourceIndex == 0 && (!format || !hasFormat(*source, *format));
-    useDevice(device, isConvertible ? nullptr : source);
+    exchangeDevice(device);
     if (old->isOpened()) old->close();
-    m_device->setGain(m_volume);
+    m_isDeviceChosen = true;
     m_state = TONEWRIGHT_PLAYER_STOPPED;
 }
 

@@ -32,7 +32,8 @@ public:
                      uint32_t stopMilliseconds = kStopMilliseconds);
     ~CPlayer() override; // never throws or waits: no thread is in play() any more
 
-    // Returns at the end of the source or after stop(); the next call plays from the source's beginning.
+    // Returns at the end of the source or after stop(); the next call plays from the source's beginning, on
+    // the device that is the default one by then unless setDevice() has chosen one.
     // Exceptions of source, device and callback propagate. Throws CError, without disturbing playback, while
     // another thread is in play().
     void play();
@@ -88,9 +89,11 @@ private:
     void returnUnheard();           // locked; back into the queue with what is not yet heard
     void restartAt(double seconds); // locked; drops the device's queue
     void useDevice(const P<peru::media::IAudioOutDevice>& device,
-                   const P<sonora2::common::IAudioSource>& source); // locked; throws without an effect
-    bool isPastEnd();                                               // locked
-    STitle& getHeard(double position);                              // locked; retires what has ended
+                   const P<sonora2::common::IAudioSource>& source);     // locked; throws without an effect
+    void exchangeDevice(const P<peru::media::IAudioOutDevice>& device); // locked; the same, with the source
+    void followDefaultDevice();                                         // locked
+    bool isPastEnd();                                                   // locked
+    STitle& getHeard(double position);                                  // locked; retires what has ended
     int64_t getBytesPerSecond() const;
     SReport makeReport(); // locked
     bool isObserved() const { return m_callback || m_progress.get(); }
@@ -117,6 +120,8 @@ private:
     int32_t m_sourceIndex = 0;
     bool m_isSilenceWritten = false;
     bool m_isQueueUsed = false;
+    bool m_hasPlayed = false;
+    bool m_isDeviceChosen = false; // by setDevice()
     double m_volume = 1.0;
 
     // Held by stop() throughout, and by play() only while it changes the state, so that a new play() cannot

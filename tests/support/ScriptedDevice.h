@@ -28,11 +28,12 @@ public:
             return peru::make<CAudioFormat>(rate, channels, bytes * 8);
         };
     P<CAudioFormat> format; // of the last open
+    std::string name = "scripted";
     std::atomic<int> opens{0};
     std::atomic<int> overlaps{0}; // concurrent calls where only one at a time is allowed
 
     P<peru::IString> getId() const override { return peru::CString::fromUTF8("7"); }
-    P<peru::IString> getName() const override { return peru::CString::fromUTF8("scripted"); }
+    P<peru::IString> getName() const override { return peru::CString::fromUTF8(name); }
     P<peru::IString> getListName() const override { return getName(); }
     P<peru::IString> getHostApi() const override { return getName(); }
     bool isDefault() const override { return true; }
@@ -248,13 +249,18 @@ private:
     std::thread m_thread;
 };
 
-// Replaces the machine's devices by one of each kind, either of which may be missing.
+// Replaces the machine's devices by one of each kind, either of which may be missing, until it is destroyed.
+// Created and destroyed in order, by one thread.
 class CScriptedSystem {
 public:
     explicit CScriptedSystem(const P<CScriptedOutDevice>& out, const P<CScriptedInDevice>& in = nullptr) {
-        peru::media::setSystem(peru::make<CSystem>(out, in));
+        s_current = peru::make<CSystem>(out, in);
+        peru::media::setSystem(s_current);
     }
-    ~CScriptedSystem() { peru::media::setSystem(nullptr); }
+    ~CScriptedSystem() {
+        s_current = m_before;
+        peru::media::setSystem(s_current);
+    }
     CScriptedSystem(const CScriptedSystem&) = delete;
     CScriptedSystem& operator=(const CScriptedSystem&) = delete;
 
@@ -275,6 +281,9 @@ private:
         P<CScriptedOutDevice> m_out;
         P<CScriptedInDevice> m_in;
     };
+
+    static inline P<peru::media::ISystem> s_current;
+    const P<peru::media::ISystem> m_before = s_current;
 };
 
 } // namespace tests

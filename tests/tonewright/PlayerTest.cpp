@@ -110,6 +110,10 @@ protected:
         CLibraryTest::SetUp();
         takeReports();
     }
+
+private:
+    // A player that plays again looks for the default device; there is no other than the test's own.
+    CScriptedSystem m_noDevices{nullptr};
 };
 
 TEST_F(Player, Play_DeliversTheSourceUnchangedAndThenSilence) {
@@ -473,6 +477,26 @@ TEST_F(Player, Device_IsExchangedWhileStopped) {
     behind<tonewright::IPlayerControl>(file)->setDevice(unfit);
     EXPECT_EQ(TONEWRIGHT_Player_Play(file.get()), 0);
     EXPECT_EQ(unfit->format->getSampleRate(), 48000);
+}
+
+TEST_F(Player, Play_FollowsTheDefaultDevice) {
+    for (const bool isChosen : {false, true}) {
+        SPlayer p(SFakeSource{});
+        behind<tonewright::IPlayerControl>(p.player)->setVolume(0.5);
+        if (isChosen) behind<tonewright::IPlayerControl>(p.player)->setDevice(p.device);
+        EXPECT_EQ(p.play(), 0);
+        const auto other = peru::make<CScriptedOutDevice>(), unfit = peru::make<CScriptedOutDevice>();
+        other->name = unfit->name = "other";
+        unfit->takes = [](int32_t, int32_t, int32_t) { return peru::make<CAudioFormat>(48000, 2, 16); };
+        for (const auto& device : {unfit, other}) {
+            CScriptedSystem system(device);
+            EXPECT_EQ(p.play(), 0);
+        }
+        EXPECT_EQ(p.device->opens, isChosen ? 3 : 2);
+        EXPECT_EQ(unfit->opens, 0) << "no format of the source: the old device goes on";
+        EXPECT_TRUE(other->written() == (isChosen ? "" : playedBytes(SFakeSource{})));
+        EXPECT_EQ(other->getGain(), isChosen ? 1.0 : 0.5);
+    }
 }
 
 TEST_F(Player, Players_LeaveNothingBehind) {
