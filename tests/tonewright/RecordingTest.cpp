@@ -101,6 +101,9 @@ TEST_F(Recording, Source_FindsAFormatOfTheDevice) {
                 EXPECT_NEAR((first->getSize() + second->getSize()) / (c.channels * c.bytes),
                             2.0 * frames * c.rate / device->format->getSampleRate(), 40.0);
             }
+            EXPECT_TRUE(device->deliver(sent));
+            EXPECT_EQ(source->getNextAudioChunk()->getTimestamp(),
+                      (first->getSize() + second->getSize()) / (c.channels * c.bytes * 1.0 * c.rate));
             EXPECT_TRUE(device->deliver(sent)) << "left in the queue, and gone with the next opening";
             source->close();
         }
