@@ -70,6 +70,11 @@ P<IString> SLanguageId::getThreeLetterCode() const {
     return bibliographicCode ? peru::newString(threeLetterForm(bibliographicCode)) : CString::empty();
 }
 
+P<IString> SLanguageId::getText() const {
+    if (!bibliographicCode || !countryCode) return CString::empty();
+    return (*shortCode ? peru::newString(shortCode) : getThreeLetterCode()) + "-" + countryCode;
+}
+
 SLanguageId findLanguageId(const CStringArg& text, ELanguageIdKind kind) {
     if (text.isEmpty()) return {};
     P<IString> wanted = CString::empty()->concat(text);

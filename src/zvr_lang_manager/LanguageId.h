@@ -28,6 +28,9 @@ struct SLanguageId {
 
     // The terminological three-letter code; empty in a record without a language.
     ZVR_LANG_API peru::P<peru::IString> getThreeLetterCode() const;
+    // The form "de-AT", with the three-letter code of a language that has no shorter one; empty in a record
+    // without a language or a country.
+    ZVR_LANG_API peru::P<peru::IString> getText() const;
 };
 
 // Returns an invalid record if nothing matches or the text is empty. With languageAndCountry a language
