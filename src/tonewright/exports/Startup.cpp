@@ -2,6 +2,7 @@
 #include "peru/GlobalObjFactory.h"
 #include "peru/log/ILog.h"
 #include "peru/strings/StringFormat.h"
+#include "tonewright/Languages.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"
@@ -64,6 +65,7 @@ void TONEWRIGHT_SetLanguageID(const char16_t* language) {
             zvr_lang::findLanguageId(language, zvr_lang::ELanguageIdKind::languageAndCountry);
         if (id.valid) {
             requireApp()->setLanguageId(id);
+            applyLanguage(id);
             return;
         }
         peru::SLogMessage message;
