@@ -2,12 +2,14 @@
 
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
+#include "peru/net/HTTPStreamFactory.h"
 #include "peru/streams/posix/DiskStreamFactory.h"
 
 namespace peru {
 
 CStreamManager::CStreamManager() : m_mutex(getMutexFactory()->createMutex()), m_factories(10, 1) {
     m_factories.add(make<posix::CDiskStreamFactory>());
+    m_factories.add(make<net::CHTTPStreamFactory>());
 }
 
 CStreamManager::~CStreamManager() = default;

@@ -7,7 +7,7 @@
 
 namespace peru {
 
-// Contains the disk factory from the start.
+// Contains the factories for files and for HTTP from the start.
 class PERU_API CStreamManager : public CStreamFactory, public IStreamManager {
 public:
     CStreamManager();

@@ -1,0 +1,96 @@
+#include "peru/net/posix/ProxyManager.h"
+
+#include "peru/GlobalObjFactory.h"
+#include "peru/net/HTTPHeaders.h"
+#include "peru/net/IPAddress.h"
+#include "peru/net/ProxyRules.h"
+#include "peru/net/posix/AddressText.h"
+#include "peru/net/posix/BackgroundTask.h"
+
+#include <cstdlib>
+#include <gio/gio.h>
+
+namespace peru::net::posix {
+
+namespace {
+
+// The candidates in order of preference, as text: the thread that finds them may outlive the singletons that
+// parsing needs.
+using Candidates = std::vector<std::string>;
+
+class CProxyLookUp : public CObject, public IProxyLookUp {
+public:
+    using CTask = TBackgroundTask<Candidates>;
+
+    explicit CProxyLookUp(const P<CTask>& task) : m_task(task) {}
+    bool isDone(const SNetWait& wait) override { return m_task->isDone(wait); }
+    P<IURI> getProxy() const override {
+        if (!m_task->isDone({})) return nullptr;
+        for (const std::string& candidate : m_task->getResult()) {
+            if (candidate == "direct://") return nullptr;
+            // Kinds that this client does not speak are skipped.
+            if (P<IURI> proxy = parseProxy(candidate)) return proxy;
+        }
+        return nullptr;
+    }
+
+private:
+    P<CTask> m_task;
+};
+
+bool isThisMachine(const P<IURI>& target) {
+    const std::string host = getNetworkHost(target);
+    if (equalsIgnoreCase(host, "localhost")) return true;
+    const P<CIPAddress> address = CIPAddress::tryParse(CString::fromUTF8(host));
+    return address && address->isLoopback();
+}
+
+Candidates askDesktop(const std::string& target) {
+    GProxyResolver* resolver = g_proxy_resolver_get_default();
+    char** found = resolver ? g_proxy_resolver_lookup(resolver, target.c_str(), nullptr, nullptr) : nullptr;
+    Candidates candidates;
+    for (char** entry = found; entry && *entry; ++entry) candidates.emplace_back(*entry);
+    g_strfreev(found);
+    return candidates;
+}
+
+const char* getNoProxy() {
+    const char* list = std::getenv("no_proxy");
+    if (!list) list = std::getenv("NO_PROXY");
+    return list ? list : "";
+}
+
+} // namespace
+
+CProxyManager::CProxyManager() = default;
+CProxyManager::~CProxyManager() = default;
+
+P<IProxyLookUp> CProxyManager::startLookUp(const P<IURI>& target) {
+    using CTask = CProxyLookUp::CTask;
+    // HTTP_PROXY in capitals is not read: a web server's scripts get it from a header of the client.
+    // HTTP_PROXY in capitals is not read: in a web server's scripts it is a header that the client chose.
+    const char* proxy = std::getenv("http_proxy");
+    if (isBypassed(getNoProxy(), target) || (!proxy && isThisMachine(target)))
+        return make<CProxyLookUp>(CTask::finished({}));
+    if (proxy) return make<CProxyLookUp>(CTask::finished({proxy}));
+    return make<CProxyLookUp>(
+        CTask::start([text = CString::toStdString(target->getAsString())] { return askDesktop(text); }));
+}
+
+P<IURI> CProxyManager::getProxy(const P<IURI>& target) {
+    const P<IProxyLookUp> lookUp = startLookUp(target);
+    lookUp->isDone({SNetWait::kForever, nullptr});
+    return lookUp->getProxy();
+}
+
+} // namespace peru::net::posix
+
+namespace peru::net {
+
+P<IProxyManager> getProxyManager() {
+    static const CGlobalObjFactory::SKey key;
+    return CGlobalObjFactory::get<IProxyManager>(
+        key, []() -> P<IProxyManager> { return make<posix::CProxyManager>(); });
+}
+
+} // namespace peru::net
