@@ -15,7 +15,8 @@ namespace {
 
 constexpr size_t kBlock = 64 * 1024;
 
-// No limit is as good as one of seven weeks, and simpler where the limit also marks that silence has begun.
+// 0 means no limit. Seven weeks serve as well and, unlike an empty value, can also mark that silence has
+// begun.
 std::optional<std::chrono::steady_clock::time_point> endAfter(uint32_t milliseconds) {
     if (milliseconds == 0) milliseconds = UINT32_MAX;
     return std::chrono::steady_clock::now() + std::chrono::milliseconds(milliseconds);

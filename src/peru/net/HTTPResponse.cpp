@@ -145,50 +145,58 @@ size_t CHTTPChunkDecoder::decode(std::string_view& bytes, char* buffer, size_t s
             if (m_rest == 0) m_state = EState::dataEnd;
             continue;
         }
-        const char c = bytes.front();
+        if (!take(bytes.front())) {
+            if (written > 0) break; // the next call throws
+            throw makeIllegalResponseError();
+        }
         bytes.remove_prefix(1);
-        if (m_maxExtraSize != 0 && ++m_extraSize > m_maxExtraSize) throw makeIllegalResponseError();
-        if (m_state == EState::trailer)
-            takeTrailerCharacter(c);
-        else
-            takeSizeCharacter(c);
     }
     return written;
 }
 
-// The size line, the extensions in it, and the line end after the data.
-void CHTTPChunkDecoder::takeSizeCharacter(char c) {
-    if (c == '\n') {
-        // Some servers end lines with a line feed alone.
-        m_carriageReturn = false;
-        if (m_state == EState::dataEnd) {
-            m_state = EState::size;
-            m_digits = 0;
-            m_extraSize = 0;
-            return;
-        }
-        if (m_digits == 0) throw makeIllegalResponseError();
-        m_state = m_rest > 0 ? EState::data : EState::trailer;
-        return;
+// Returns false for a character that is illegal, and again if it is tried again.
+bool CHTTPChunkDecoder::take(char c) {
+    if (m_maxExtraSize != 0 && ++m_extraSize > m_maxExtraSize) return false;
+    if (m_state == EState::trailer) {
+        takeTrailerCharacter(c);
+        return true;
     }
-    if (m_carriageReturn) throw makeIllegalResponseError();
+    // Some servers end lines with a line feed alone.
+    if (c == '\n') return takeLineEnd();
+    if (m_carriageReturn) return false;
     if (c == '\r') {
         m_carriageReturn = true;
-        return;
+        return true;
     }
-    if (m_state == EState::extension) return;
-    if (m_state == EState::dataEnd) throw makeIllegalResponseError();
+    return m_state == EState::extension || (m_state == EState::size && takeSizeCharacter(c));
+}
+
+// The end of a size line, or the one after the data.
+bool CHTTPChunkDecoder::takeLineEnd() {
+    m_carriageReturn = false;
+    if (m_state == EState::dataEnd) {
+        m_state = EState::size;
+        m_digits = 0;
+        m_extraSize = 0;
+        return true;
+    }
+    if (m_digits == 0) return false;
+    m_state = m_rest > 0 ? EState::data : EState::trailer;
+    return true;
+}
+
+bool CHTTPChunkDecoder::takeSizeCharacter(char c) {
     const char lower = static_cast<char>(c | 0x20);
     const int digit = c >= '0' && c <= '9' ? c - '0' : lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
-    if (digit >= 0) {
-        if (m_rest > std::numeric_limits<int64_t>::max() >> 4) throw makeIllegalResponseError();
-        m_rest = m_rest << 4 | digit;
-        ++m_digits;
-    } else if (m_digits > 0 && (c == ';' || c == ' ' || c == '\t')) {
+    if (digit < 0) {
+        if (m_digits == 0 || (c != ';' && c != ' ' && c != '\t')) return false;
         m_state = EState::extension;
-    } else {
-        throw makeIllegalResponseError();
+        return true;
     }
+    if (m_rest > std::numeric_limits<int64_t>::max() >> 4) return false;
+    m_rest = m_rest << 4 | digit;
+    ++m_digits;
+    return true;
 }
 
 void CHTTPChunkDecoder::takeTrailerCharacter(char c) {

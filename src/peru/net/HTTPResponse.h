@@ -63,14 +63,17 @@ public:
     explicit CHTTPChunkDecoder(size_t maxExtraSize) : m_maxExtraSize(maxExtraSize) {}
 
     // Decodes from the front of `bytes`, which it shortens, into the buffer. Returns the number of bytes
-    // written; 0 if more input is needed or the end was reached. Throws CError for illegal bytes.
+    // written; 0 if more input is needed or the end was reached. Throws CError for illegal bytes, once the
+    // data before them has been delivered.
     size_t decode(std::string_view& bytes, char* buffer, size_t size);
     bool isAtEnd() const { return m_state == EState::end; }
 
 private:
     enum class EState { size, extension, data, dataEnd, trailer, end };
 
-    void takeSizeCharacter(char c);
+    bool take(char c);
+    bool takeLineEnd();
+    bool takeSizeCharacter(char c);
     void takeTrailerCharacter(char c);
 
     EState m_state = EState::size;

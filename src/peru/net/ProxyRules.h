@@ -9,7 +9,7 @@
 namespace peru::net {
 
 // Accepts "host", "host:port" and a URI with user and password. The result always has a port, 8080 if none is
-// given. Empty for a proxy of another kind and for text that is none.
+// given. Empty for another kind of proxy and for invalid text.
 PERU_API P<IURI> parseProxy(std::string_view text);
 
 // Whether the list of exceptions, separated by commas, semicolons or blanks, covers the target. An entry is a

@@ -377,7 +377,7 @@ TEST(Http, CancelInEveryState) {
                 settings.connectTimeout = settings.silenceTimeout = 0;
                 if (step == EHTTPStep::chooseTarget) settings.proxies = make<CEndlessProxies>();
                 P<IInStream> body;
-                if (step == EHTTPStep::sendRequest) body = toStream(std::string(50'000'000, 'x'));
+                if (step == EHTTPStep::sendRequest) body = toStream(std::string(20'000'000, 'x'));
                 const auto operation =
                     make<CHTTPOperation>(make<CHTTPRequest>("POST", toURI(base), body), settings);
                 std::thread rival([&] {

@@ -28,7 +28,7 @@ public:
         if (!m_task->isDone({})) return nullptr;
         for (const std::string& candidate : m_task->getResult()) {
             if (candidate == "direct://") return nullptr;
-            // Kinds that this client does not speak are skipped.
+            // Kinds that this client does not support are skipped.
             if (P<IURI> proxy = parseProxy(candidate)) return proxy;
         }
         return nullptr;
