@@ -197,6 +197,69 @@ TONEWRIGHT_API void TONEWRIGHT_Host_KeepOutput(TONEWRIGHT_Handle output);
  * read; -1 if the target's tag cannot be written, in which case the target is unchanged. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_CopyTags(const char16_t* source, const char16_t* target, char** lost);
 
+/* --- Tags: all fields and pictures of all formats -------------------------------------------------- */
+
+/* The functions TONEWRIGHT_FileTag_... access eight fields of the formats of TONEWRIGHT_CreateFileTag. These
+ * access every field and picture, in every format that TONEWRIGHT_Host_GetTagSupport reports. Names of fields
+ * are the same for all formats: TITLE, ARTIST, ALBUM, ALBUMARTIST, TRACKNUMBER, DATE, GENRE, COMMENT,
+ * COMPOSER and so on; a name without an equivalent in the format is stored as it is where the format allows
+ * that. */
+
+typedef enum TONEWRIGHT_TagSupport {
+    TONEWRIGHT_TAG_FIELDS = 1,   /* these functions read and write fields */
+    TONEWRIGHT_TAG_PICTURES = 2, /* ... and pictures */
+    TONEWRIGHT_TAG_EXPORTS = 4   /* TONEWRIGHT_CreateFileTag also supports the file */
+} TONEWRIGHT_TagSupport;
+
+/* What is supported for files with that extension: bits of TONEWRIGHT_TagSupport, 0 for none. The file is not
+ * accessed. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagSupport(const char16_t* uri);
+
+/* Reads a file's tag: a handle to a copy of its content, or null if the file cannot be read or its content
+ * has no known format. A file without a tag has a copy without entries. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_ReadTags(const char16_t* uri);
+/* The number of entries: the values of all fields, sorted by name, and then data that has no text form. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagEntryCount(TONEWRIGHT_Handle tags);
+/* The texts are valid until the handle is destroyed. A field with several values has several entries of one
+ * name. The value of data without a text form is null, and its name is the format's own, such as "PRIV". */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagEntry(TONEWRIGHT_Handle tags, int32_t index, const char** name,
+                                                   const char** value);
+
+typedef struct TONEWRIGHT_TagPicture {
+    size_t size;
+    const void* data; /* a picture file */
+    size_t dataSize;
+    const char* mimeType;
+    const char* description;
+    int32_t
+        type; /* the number of the ID3v2 APIC frame: 3 is the front cover, 4 the back cover, 0 any other */
+    int32_t width; /* in pixels, like the height; 0 when unknown */
+    int32_t height;
+} TONEWRIGHT_TagPicture;
+
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagPictureCount(TONEWRIGHT_Handle tags);
+/* The pointers are valid until the handle is destroyed. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagPicture(TONEWRIGHT_Handle tags, int32_t index,
+                                                     TONEWRIGHT_TagPicture* picture);
+
+/* A set of changes, at first empty, that can be applied to any number of files. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateTagChange(void);
+/* Replaces the values of a field by this one; calls with the same name add further values. A null or empty
+ * value removes the field. Names consist of printable ASCII characters except '=', in either case; 0 for
+ * others. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_ChangeTagField(TONEWRIGHT_Handle change, const char* name,
+                                                      const char* value);
+/* Removes the pictures of a type, or all for -1, before others are added. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_RemoveTagPictures(TONEWRIGHT_Handle change, int32_t type);
+/* Adds a copy of the picture in front of the others. If its MIME type is null or empty it is detected, and if
+ * its size in pixels is 0 it is read from the data. 0 if the type cannot be detected. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_AddTagPicture(TONEWRIGHT_Handle change,
+                                                     const TONEWRIGHT_TagPicture* picture);
+/* Makes all changes to a file or none. Returns 1 if the file was changed, 0 if it was like that already, and
+ * -1 on failure, also if the format cannot hold a field or picture. Other processes that change the same file
+ * through this library meanwhile lose nothing. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_ApplyTagChange(TONEWRIGHT_Handle change, const char16_t* uri);
+
 /* --- Host-defined sources, and reading ----------------------------------------------------------- */
 
 /* Samples from a host. `read` reads up to `frames` frames and returns their number, 0 at the end, -1 on
