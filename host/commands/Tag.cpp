@@ -1,10 +1,12 @@
 #include "commands/Tag.h"
 #include "base/Text.h"
 #include "commands/ForEachFile.h"
+#include "library/Failure.h"
 #include "media/FileTag.h"
 #include "media/SoundFile.h"
 #include "terminal/Progress.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <stdexcept>
 
@@ -16,67 +18,152 @@ namespace {
 
 constexpr size_t kTitleColumns = 14;
 
-CFileTag openTag(CLibrary& library, const fs::path& file) {
-    checkInput(file);
-    CFileTag tag(library, file);
-    if (!tag)
-        throw std::runtime_error("No tag is known for " +
-                                 (isWideWav(file) ? std::string("RF64 files") : describeKind(file)));
-    return tag;
+std::string formatLine(std::string title, const std::string& text) {
+    title = toPrintable(title);
+    title.resize(std::max(kTitleColumns, title.size() + 1), ' ');
+    return "  " + title + toPrintable(text) + "\n";
+}
+
+void printLines(const fs::path& file, const std::string& lines) {
+    std::printf("%s\n%s", toPrintable(file.native()).c_str(), lines.empty() ? "  (empty)\n" : lines.c_str());
 }
 
 void show(CLibrary& library, const fs::path& file, bool json) {
-    const CFileTag tag = openTag(library, file);
+    const TagTexts texts = readTagTexts(library, file);
     if (json) {
         nlohmann::json line{{"file", file.native()}};
-        for (const STagField& field : getTagFields()) line[field.key] = toUTF8(tag.get(field).c_str());
+        for (const STagField& field : getTagFields()) line[field.key] = texts.at(field.name);
         std::printf("%s\n", toLine(line).c_str());
         return;
     }
     std::string lines;
-    for (const STagField& field : getTagFields()) {
-        const std::string text = toPrintable(toUTF8(tag.get(field).c_str()));
-        if (text.empty()) continue;
-        std::string title = field.title;
-        title.resize(kTitleColumns, ' ');
-        lines += "  " + title + text + "\n";
-    }
-    std::printf("%s\n%s", toPrintable(file.native()).c_str(), lines.empty() ? "  (empty)\n" : lines.c_str());
+    for (const STagField& field : getTagFields())
+        if (const std::string& text = texts.at(field.name); !text.empty())
+            lines += formatLine(field.title, text);
+    printLines(file, lines);
 }
 
-// Returns whether the file was written; a file that already has these values is not.
-bool change(CLibrary& library, const fs::path& file, const SSetTagOptions& options) {
-    CFileTag tag = openTag(library, file);
+void showAll(const fs::path& file, bool json) {
+    const SWholeTag tag = readWholeTag(file);
+    if (json) {
+        nlohmann::json line{{"file", file.native()},
+                            {"fields", nlohmann::json::object()},
+                            {"pictures", nlohmann::json::array()},
+                            {"others", tag.others}};
+        for (const auto& [name, values] : tag.fields) line["fields"][name] = values;
+        for (const STagPicture& picture : tag.pictures) line["pictures"].push_back(toJson(picture));
+        std::printf("%s\n", toLine(line).c_str());
+        return;
+    }
+    std::string lines;
+    for (const auto& [name, values] : tag.fields)
+        for (const std::string& value : values) lines += formatLine(name, value);
+    for (const STagPicture& picture : tag.pictures) lines += formatLine("(picture)", describe(picture));
+    for (const std::string& name : tag.others) lines += formatLine("(other)", name);
+    printLines(file, lines);
+}
+
+// Whether the exports cannot make this change to a WAV file.
+bool needsWholeTag(CLibrary& library, const fs::path& file, const STagFields& fields) {
+    if (codecName(file) != "WAV") return false;
+    const TagTexts texts = readTagTexts(library, file);
+    for (const char* name : {"album", "album-artist"})
+        if (const auto wanted = fields.usual.find(name);
+            wanted != fields.usual.end() && texts.at(name) != toUTF8(wanted->second.c_str()))
+            return true;
+    return false;
+}
+
+// Through the functions for whole tags, which can hold what the exports cannot.
+bool changeWholeTag(CLibrary& library, const fs::path& file, const STagFields& fields) {
+    CTagChange change;
+    const TagTexts texts = readTagTexts(library, file);
+    for (const auto& [name, text] : fields.usual)
+        if (const std::string wanted = toUTF8(text.c_str()); texts.at(name) != wanted)
+            setTagText(change, file, name, wanted);
+    for (const auto& [name, value] : fields.others) change.setField(name, value);
+    return change.apply(file);
+}
+
+void copy(const fs::path& from, const fs::path& to, bool json) {
+    checkTagged(to);
+    if (isSameFile(from, to)) throw std::runtime_error("Is the file to copy from");
+    clearFailure();
+    char* names = nullptr;
+    const int32_t copied = TONEWRIGHT_Host_CopyTags(toURI(from).c_str(), toURI(to).c_str(), &names);
+    const std::string lost = names ? names : "";
+    TONEWRIGHT_Host_Free(names);
+    if (copied != 1)
+        throw std::runtime_error(copied == 0 ? "The tag of " + from.native() +
+                                                   " cannot be read: " + takeFailure("unknown", from)
+                                             : takeFailure("The tag could not be written", to));
+    if (json)
+        std::printf("%s\n", toLine({{"file", to.native()}, {"lost", lost}}).c_str());
+    else
+        std::printf("%s: copied\n", toPrintable(to.native()).c_str());
+    if (!json && !lost.empty()) printFailure(to, "Warning: cannot hold these fields of the tag: " + lost);
+}
+
+} // namespace
+
+std::string describe(const STagPicture& picture) {
+    std::string text = getPictureTypeName(picture.type) + ", " + picture.mimeType + ", ";
+    if (picture.width > 0)
+        text += std::to_string(picture.width) + "x" + std::to_string(picture.height) + ", ";
+    text += formatSize(picture.data.size());
+    return picture.description.empty() ? text : text + ", " + picture.description;
+}
+
+nlohmann::json toJson(const STagPicture& picture) {
+    return {{"type", getPictureTypeName(picture.type)},
+            {"mime_type", picture.mimeType},
+            {"bytes", picture.data.size()},
+            {"width", picture.width},
+            {"height", picture.height},
+            {"description", picture.description}};
+}
+
+bool changeTag(CLibrary& library, const fs::path& file, const STagFields& fields) {
+    checkTagged(file);
+    CFileTag tag(library, file);
+    if (!tag || !fields.others.empty() || needsWholeTag(library, file, fields))
+        return changeWholeTag(library, file, fields);
     bool changed = false;
     for (const STagField& field : getTagFields()) {
-        const auto wanted = options.fields.find(field.name);
-        if (wanted == options.fields.end() || tag.get(field) == wanted->second) continue;
+        const auto wanted = fields.usual.find(field.name);
+        if (wanted == fields.usual.end() || tag.get(field) == wanted->second) continue;
         tag.set(field, wanted->second);
-        // If one field cannot be set, none is written.
-        if (tag.get(field).empty() && !wanted->second.empty())
-            throw std::runtime_error("No " + std::string(field.title) + " can be stored in " +
-                                     describeKind(file));
         changed = true;
     }
     if (changed) tag.store();
     return changed;
 }
 
-} // namespace
+void printChanged(const fs::path& file, bool changed, bool json) {
+    if (json)
+        std::printf("%s\n", toLine({{"file", file.native()}, {"changed", changed}}).c_str());
+    else
+        std::printf("%s: %s\n", toPrintable(file.native()).c_str(), changed ? "changed" : "unchanged");
+}
 
-int showTags(CLibrary& library, const std::vector<fs::path>& files, bool json) {
-    return forEachFile(files, json, EReader::needed,
-                       [&](const fs::path& file) { show(library, file, json); });
+int showTags(CLibrary& library, const SShowTagOptions& options) {
+    return forEachFile(options.files, options.json, EReader::needed, [&](const fs::path& file) {
+        if (options.all)
+            showAll(file, options.json);
+        else
+            show(library, file, options.json);
+    });
 }
 
 int setTags(CLibrary& library, const SSetTagOptions& options) {
     return forEachFile(options.files, options.json, EReader::optional, [&](const fs::path& file) {
-        const bool changed = change(library, file, options);
-        if (options.json)
-            std::printf("%s\n", toLine({{"file", file.native()}, {"changed", changed}}).c_str());
-        else
-            std::printf("%s: %s\n", toPrintable(file.native()).c_str(), changed ? "changed" : "unchanged");
+        printChanged(file, changeTag(library, file, options.fields), options.json);
     });
+}
+
+int copyTags(const SCopyTagOptions& options) {
+    return forEachFile(options.to, options.json, EReader::optional,
+                       [&](const fs::path& file) { copy(options.from, file, options.json); });
 }
 
 } // namespace host
