@@ -6,11 +6,13 @@
 namespace host {
 
 void addFormats(CLI::App& app, Run& run) {
-    const auto json = std::make_shared<bool>(false);
+    const auto options = std::make_shared<SFormatsOptions>();
     CLI::App* command = app.add_subcommand("formats", "List the file extensions that can be read.");
-    command->add_flag("--json", *json, "Print one JSON object");
+    command->add_flag("-l,--long", options->table,
+                      "Print a table that also shows what can be written and which files can have a tag");
+    command->add_flag("--json", options->json, "Print one JSON object with all of this");
     command->callback(
-        [json, &run] { run = [json](CLibrary& library) { return listFormats(library, *json); }; });
+        [options, &run] { run = [options](CLibrary& library) { return listFormats(library, *options); }; });
 }
 
 } // namespace host

@@ -1,6 +1,7 @@
 #include "commands/Formats.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "media/WholeTag.h"
 #include "terminal/Progress.h"
 
 #include <cstdio>
@@ -9,20 +10,44 @@
 
 namespace host {
 
-int listFormats(CLibrary& library, bool json) {
-    CHandle extensions(library.getValidCodecExtensions(TONEWRIGHT_AUDIO_SOURCE));
-    std::set<std::string> names;
+namespace {
+
+using Names = std::set<std::string>;
+
+Names getExtensions(CLibrary& library, int32_t types) {
+    const CHandle extensions(library.getValidCodecExtensions(types));
+    Names names;
     for (int32_t i = 0; i < library.getExtensionCount(extensions.get()); ++i) {
-        CHandle text(library.getExtension(extensions.get(), i));
+        const CHandle text(library.getExtension(extensions.get(), i));
         if (text) names.insert(toUTF8(TONEWRIGHT_GetText(text.get())));
     }
-    if (json) {
-        std::printf("%s\n", toLine({{"read", names}}).c_str());
+    return names;
+}
+
+} // namespace
+
+int listFormats(CLibrary& library, const SFormatsOptions& options) {
+    const Names read = getExtensions(library, TONEWRIGHT_AUDIO_SOURCE),
+                written = getExtensions(library, TONEWRIGHT_AUDIO_FORMAT);
+    Names all = read, tagged;
+    all.insert(written.begin(), written.end());
+    for (const std::string& name : all)
+        if (canHaveTag("x." + name)) tagged.insert(name);
+    if (options.json) {
+        std::printf("%s\n", toLine({{"read", read}, {"write", written}, {"tag", tagged}}).c_str());
+    } else if (options.table) {
+        std::printf("%-10s %-5s %-5s %s\n", "extension", "read", "write", "tag");
+        const auto mark = [](const Names& names, const std::string& name) {
+            return names.count(name) ? "yes" : "-";
+        };
+        for (const std::string& name : all)
+            std::printf("%-10s %-5s %-5s %s\n", name.c_str(), mark(read, name), mark(written, name),
+                        mark(tagged, name));
     } else {
-        for (const std::string& name : names) std::printf("%s\n", name.c_str());
+        for (const std::string& name : read) std::printf("%s\n", name.c_str());
     }
     flushOutput();
-    return names.empty() ? kExitFailure : kExitSuccess;
+    return read.empty() ? kExitFailure : kExitSuccess;
 }
 
 } // namespace host

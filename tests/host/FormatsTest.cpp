@@ -1,0 +1,31 @@
+#include "host/Program.h"
+
+#include <array>
+#include <cstdio>
+
+using namespace tests;
+
+using Formats = CProgramTest;
+
+// What is listed as written or tagged can be.
+TEST_F(Formats, AreWrittenAndTaggedAsListed) {
+    const nlohmann::json listed = nlohmann::json::parse(succeed({"formats", "--json"}));
+    const std::string table = succeed({"formats", "--long"});
+    write("in.wav", makeTone(48000, 2, 16, 0.3));
+    for (const std::string& name : listed["read"].get<std::set<std::string>>()) {
+        SCOPED_TRACE(name);
+        const auto has = [&](const char* list) {
+            const auto names = listed[list].get<std::set<std::string>>();
+            return names.count(name) > 0;
+        };
+        const SProcessResult result = tonewright({"convert", "in.wav", "-o", "out." + name});
+        EXPECT_EQ(result.exitCode == 0, has("write")) << result.err;
+        const auto mark = [&](const char* list) { return has(list) ? "yes" : "-"; };
+        std::array<char, 64> line;
+        std::snprintf(line.data(), line.size(), "\n%-10s %-5s %-5s %s\n", name.c_str(), "yes", mark("write"),
+                      mark("tag"));
+        EXPECT_NE(table.find(line.data()), std::string::npos) << line.data() << table;
+        if (!has("write")) continue;
+        EXPECT_EQ(tonewright({"tag", "set", "--title", "T", "out." + name}).exitCode == 0, has("tag"));
+    }
+}
