@@ -5,9 +5,11 @@
 #include "commands/ForEachFile.h"
 #include "library/Failure.h"
 #include "media/SoundFile.h"
+#include "media/WholeTag.h"
 #include "terminal/Progress.h"
 
 #include <algorithm>
+#include <cmath>
 #include <cstdio>
 #include <set>
 #include <stdexcept>
@@ -23,6 +25,20 @@ std::string codecOf(const SSoundFile& sound, const fs::path& file) {
     return *sound.info.codec ? sound.info.codec : codecName(file);
 }
 
+// Plug-ins count the whole file, in which pictures can take more space than the sound.
+int64_t getBitRate(const TONEWRIGHT_MediaInfo& info, const fs::path& file) {
+    if (info.bitRate <= 0 || info.duration <= 0 || !canHaveTag(file)) return info.bitRate;
+    double pictures = 0;
+    try {
+        for (const STagPicture& picture : readWholeTag(file).pictures)
+            pictures += static_cast<double>(picture.data.size());
+    } catch (const std::exception&) {
+        return info.bitRate; // a file without a readable tag can still be played
+    }
+    if (hasVorbisComment(file) && !hasExtension(file, {".flac"})) pictures *= 4.0 / 3; // in Base64
+    return std::max<int64_t>(info.bitRate - std::llround(pictures * 8 / info.duration), 0);
+}
+
 std::string formatBitRate(int64_t bitsPerSecond) { // 320 kbit/s
     return bitsPerSecond > 0 ? std::to_string((bitsPerSecond + 500) / 1000) + " kbit/s" : "-";
 }
@@ -35,8 +51,9 @@ int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
         const SSoundFile sound = openSoundFile(file);
         const TONEWRIGHT_MediaInfo& info = sound.info;
         const uint64_t bytes = fs::file_size(file);
+        const int64_t bitRate = getBitRate(info, file);
         if (!std::exchange(hasHeading, true))
-            std::printf("%11s %7s %8s %5s %10s %10s  %-12s  %s\n", "duration", "rate", "channels", "bits",
+            std::printf("%11s %7s %8s %5s %10s %10s  %-20s  %s\n", "duration", "rate", "channels", "bits",
                         "bit rate", "size", "codec", "file");
         if (json)
             std::printf("%s\n", toLine({{"file", file.native()},
@@ -45,14 +62,14 @@ int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
                                         {"rate", info.sampleRate},
                                         {"channels", info.channelCount},
                                         {"bits", info.bytesPerSample * 8},
-                                        {"bit_rate", info.bitRate},
+                                        {"bit_rate", bitRate},
                                         {"bytes", bytes},
                                         {"plugin", info.plugin}})
                                     .c_str());
         else
-            std::printf("%11s %7d %8d %5d %10s %10s  %-12s  %s\n", formatDuration(info.duration).c_str(),
+            std::printf("%11s %7d %8d %5d %10s %10s  %-20s  %s\n", formatDuration(info.duration).c_str(),
                         info.sampleRate, info.channelCount, info.bytesPerSample * 8,
-                        formatBitRate(info.bitRate).c_str(), formatSize(bytes).c_str(),
+                        formatBitRate(bitRate).c_str(), formatSize(bytes).c_str(),
                         codecOf(sound, file).c_str(), toPrintable(file.native()).c_str());
     });
 }
