@@ -48,7 +48,7 @@ class Entry:
 @dataclass
 class Command:
     path: tuple
-    description: list = field(default_factory=list)  # paragraphs
+    description: list = field(default_factory=list)  # paragraphs, and lists of lines to be shown as they are
     usage: str = ""
     sections: list = field(default_factory=list)  # (title, entries), or (title, lines) for a text
     footer: list = field(default_factory=list)
@@ -67,7 +67,7 @@ class Command:
 
     @property
     def summary(self):
-        sentence = re.split(r"[.:](?: |$)", self.description[0])[0] if self.description else self.page
+        sentence = re.split(r"[.:;](?: |$)", self.description[0])[0] if self.description else self.page
         sentence = re.sub(r" \([^()]*\)$", "", sentence)
         return sentence[0].lower() + sentence[1:]
 
@@ -82,8 +82,13 @@ def run(program, *arguments):
     return subprocess.run([program, *arguments], capture_output=True, text=True, stdin=subprocess.DEVNULL)
 
 
-def paragraphs(lines):
-    return [" ".join(text.split()) for text in re.split(r"\n\s*\n", "\n".join(lines)) if text.strip()]
+def paragraphs(text):
+    result = []
+    for block in re.split(r"\n\s*\n", text.strip("\n")):
+        plain = [line.strip() for line in block.splitlines() if not line.startswith(" ")]
+        aligned = [line for line in block.splitlines() if line.startswith(" ")]
+        result += ([" ".join(plain)] if plain else []) + ([aligned] if aligned else [])
+    return result
 
 
 def parse(text, path):
@@ -94,14 +99,16 @@ def parse(text, path):
         before, usage, rest = "", *text.partition("Usage: ")[1:]
     if not usage:
         raise ValueError("no usage line")
-    command.description = paragraphs(before.splitlines())
+    command.description = paragraphs(before)
     command.usage, _, rest = rest.partition("\n")
-    blocks = re.split(r"\n\s*\n", rest.strip("\n"))
-    for i, block in enumerate(blocks):
+    # A line of blanks is part of a description.
+    for block in re.split(r"\n\n+", rest.strip("\n")):
         title, _, body = block.partition("\n")
         lines = body.splitlines()
+        if title.startswith(" "):
+            raise ValueError(f"cannot parse {title!r}")
         if not re.fullmatch(r"\S.*:", title) or not lines:
-            command.footer += paragraphs([block])
+            command.footer += paragraphs(block)
         elif title.lower().startswith("example"):
             command.sections.append((title[:-1], [line.strip() for line in lines]))
         else:
@@ -112,12 +119,16 @@ def parse(text, path):
 
 def parse_entries(lines):
     entries = []
+    is_complete = False  # only the first paragraph counts; the rest is on the command's own page
     for line in lines:
         found = re.match(r"  (\S.*?)(?:  +(\S.*))?$", line)
         if found:
             entries.append(Entry(found.group(1).strip(), found.group(2) or ""))
+            is_complete = False
         elif line.startswith("      ") and entries:
-            entries[-1].text = f"{entries[-1].text} {line.strip()}".strip()
+            is_complete = is_complete or not line.strip()
+            if not is_complete:
+                entries[-1].text = f"{entries[-1].text} {line.strip()}".strip()
         else:
             raise ValueError(f"cannot parse {line!r}")
     return entries
@@ -173,11 +184,18 @@ def usage_line(command):
     return f"\\fB{roff(' '.join(command.path))}\\fR " + " ".join(marked)
 
 
+def texts(paragraphs):
+    lines = []
+    for text in paragraphs:
+        lines += [".PP", roff(text)] if isinstance(text, str) else [".EX", *map(roff, text), ".EE"]
+    return lines
+
+
 def manual_page(command, commands, version):
     lines = [f'.TH {command.page.upper()} 1 "" "{NAME.capitalize()} {version}" "User Commands"']
     lines += [".SH NAME", f"{roff(command.page)} \\- {roff(command.summary)}"]
     lines += [".SH SYNOPSIS", usage_line(command), ".SH DESCRIPTION"]
-    lines += [line for text in command.description for line in (".PP", roff(text))][1:]
+    lines += texts(command.description)[1:]
     for title, entries in command.sections:
         heading = {"positionals": "ARGUMENTS", "subcommands": "COMMANDS"}.get(title.lower(), title.upper())
         lines.append(f".SH {heading}")
@@ -198,9 +216,9 @@ def manual_page(command, commands, version):
                     text += roff(f". Not together with {', '.join(entry.excludes)}.")
             lines += [".TP", head, text]
     for text in command.footer:
-        codes = re.fullmatch(r"Exit codes: (.*)", text)
+        codes = isinstance(text, str) and re.fullmatch(r"Exit codes: (.*)", text)
         if not codes:
-            lines += [".PP", roff(text)]
+            lines += texts([text])
             continue
         lines.append(".SH EXIT STATUS")
         for code in re.split(r", (?=\d+ )", codes.group(1).rstrip(".")):
