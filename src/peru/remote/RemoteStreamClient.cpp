@@ -9,6 +9,7 @@
 #include "peru/strings/StringFormat.h"
 
 #include <algorithm>
+#include <string_view>
 
 namespace peru {
 
@@ -18,12 +19,18 @@ constexpr int64_t kTempBlock = 0x100000;
 constexpr uint32_t kLongestPoll = 100;  // milliseconds that a stop may have to wait
 constexpr uint32_t kTrailerWait = 1000; // milliseconds for the word that ends a request
 
-const char kFunction[] = "function";
-const char kVoid[] = "void";
-const char kExecute[] = "execute";
-const char kReturn[] = "return";
-const char kNotFound[] = "notfound";
-const char kError[] = "Error:";
+constexpr char kFunction[] = "function";
+constexpr char kVoid[] = "void";
+constexpr char kExecute[] = "execute";
+constexpr char kReturn[] = "return";
+constexpr char kNotFound[] = "notfound";
+constexpr char kError[] = "Error:";
+
+// A string in its wire form, without creating one.
+void writeWord(IDataOutStream& stream, std::string_view word) {
+    stream.writeInt32(static_cast<int32_t>(word.size()));
+    stream.write(word.data(), static_cast<int64_t>(word.size()));
+}
 
 void logFailure(const CException& exception) noexcept {
     try {
@@ -146,10 +153,10 @@ void CRemoteStreamClient::closeStreams() noexcept {
 
 void CRemoteStreamClient::writeRequest(CRemoteProc& proc) {
     try {
-        m_out->writeString(newString(proc.isVoid() ? kVoid : kFunction));
+        writeWord(*m_out, proc.isVoid() ? kVoid : kFunction);
         m_out->writeString(proc.getName());
         for (const P<CRemoteVar>& param : proc.getParams()) param->writeTo(m_out);
-        m_out->writeString(newString(kExecute));
+        writeWord(*m_out, kExecute);
         m_out->flush();
     } catch (...) {
         // Half a request would make the other end take the next one for the rest of it.
@@ -249,7 +256,7 @@ bool CRemoteStreamClient::processOne() {
     if (!proc || proc->isVoid() == m_isFunction) {
         m_stage = EStage::between;
         if (!m_isFunction) throw CRemoteException(newString("Remote Procedure not found on this computer"));
-        m_out->writeString(newString(kNotFound));
+        writeWord(*m_out, kNotFound);
         m_out->flush();
         return false;
     }
@@ -258,28 +265,33 @@ bool CRemoteStreamClient::processOne() {
     deadline.pause();
     proc->execute();
     deadline.restart();
-    if (m_isFunction) {
-        m_out->writeString(newString(kReturn));
-        for (const P<CRemoteVar>& result : P<CRemoteFunction>(proc)->getResults()) result->writeTo(m_out);
-        m_out->flush();
-    }
+    if (m_isFunction) writeAnswer(*P<CRemoteFunction>(proc));
     m_stage = EStage::between;
     return true;
 }
 
+void CRemoteStreamClient::writeAnswer(const CRemoteFunction& function) {
+    try {
+        writeWord(*m_out, kReturn);
+        for (const P<CRemoteVar>& result : function.getResults()) result->writeTo(m_out);
+        m_out->flush();
+    } catch (...) {
+        if (!m_message->discard()) closeStreams();
+        throw;
+    }
+}
+
 // Returns false if the connection can no longer be used.
 bool CRemoteStreamClient::answerException(const CException& exception) {
-    // Once a part of the answer is sent, no other answer can follow. A message that was not read to its end
-    // leaves its rest in the stream.
-    const bool canAnswer = m_message->discard();
+    // A message that was not read to its end leaves its rest in the stream.
     const EStage stage = std::exchange(m_stage, EStage::between);
-    if (canAnswer && m_isFunction && stage != EStage::between) {
+    if (m_isFunction && stage != EStage::between) {
         const P<IString> description = exception.getDescription();
         const CDeadlineScope deadline(*this);
         m_out->writeString(format("Error: %s", description->isEmpty() ? exception.getTitle() : description));
         m_out->flush();
     }
-    return canAnswer && stage != EStage::reading;
+    return stage != EStage::reading;
 }
 
 // Serves one message; returns false if the connection can no longer be used.

@@ -85,6 +85,7 @@ private:
     void work();
     bool serve();
     bool serveOne(bool& isExecuted);
+    void writeAnswer(const CRemoteFunction& function);
     bool answerException(const CException& exception);
     void closeStreams() noexcept;
 

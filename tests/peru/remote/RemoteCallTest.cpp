@@ -275,6 +275,23 @@ TEST_F(RemotePipe, ErrorsOfAProcedureLeaveTheConnectionUsable) {
     }
 }
 
+TEST(RemoteCall, AnUnwritableValueLeavesNothingBehind) {
+    class CUnwritable : public CShort {
+        void writeTo(const P<IDataOutStream>&) const override { throw CError("unwritable"); }
+    };
+    class CHalfFunction : public CRemoteFunction {
+    public:
+        CHalfFunction() : CRemoteFunction("half") {
+            addParam<CRemoteVarObject>("o")->setValue(make<CUnwritable>());
+        }
+    };
+    const P<CMemoryIOStream> out = memory();
+    const P<CRemoteStreamClient> client = make<CRemoteStreamClient>(memory(kAddAnswer), out);
+    EXPECT_EQ(errorOf([&] { client->call(make<CHalfFunction>()); }), "unwritable");
+    client->call(make<CAddFunction>(5, -2));
+    EXPECT_EQ(bytesOf(out), kAddRequest);
+}
+
 TEST_F(RemotePipe, BothEndsCallInTurn) {
     m_calling->addProc(make<CAddFunction>());
     m_calling->startWorkInThread(1);

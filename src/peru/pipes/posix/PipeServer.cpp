@@ -8,6 +8,7 @@
 #include "peru/system/ITimeManager.h"
 
 #include <cerrno>
+#include <climits>
 #include <optional>
 #include <poll.h>
 #include <sys/epoll.h>
