@@ -7,11 +7,20 @@
 namespace host {
 
 void addDevices(CLI::App& app, Run& run) {
-    const auto json = std::make_shared<bool>(false);
+    struct SOptions {
+        bool json = false;
+        bool watches = false;
+    };
+    const auto options = std::make_shared<SOptions>();
     CLI::App* command = app.add_subcommand("devices", "List the sound devices that play and record.");
-    command->add_flag("--json", *json, "Print one JSON object per line");
-    command->callback([json, &run] {
-        run = [json](CLibrary&) { return needingDevice(*json, [&] { return listDevices(*json); }); };
+    command->add_flag("--json", options->json, "Print one JSON object per line");
+    command->add_flag("-w,--watch", options->watches,
+                      "Also print devices that are added or removed later, until Ctrl-C");
+    command->callback([options, &run] {
+        run = [options](CLibrary&) {
+            if (options->watches) return watchDevices(options->json);
+            return needingDevice(options->json, [&] { return listDevices(options->json); });
+        };
     });
 }
 

@@ -29,6 +29,28 @@ TEST_F(Devices, AreListedWithTheirDefaults) {
         EXPECT_NE(table.find(word), std::string::npos) << table;
 }
 
+TEST_F(Devices, AreWatched) {
+    const std::string path = std::getenv("ALSA_CONFIG_PATH"), before = readFile(path);
+    CProcess program({kProgram, "devices", "--watch", "--json"}, folder.path(), programEnvironment());
+    const auto happens = [&](const std::string& event, const std::string& name) {
+        const nlohmann::json found = waitFor(program, [&](const auto& line) {
+            return line["event"] == event && line["direction"] == "output" && line["name"] == name;
+        });
+        return !found.is_null();
+    };
+    EXPECT_TRUE(happens("present", "default"));
+    folder.write("new.conf", "pcm.aaa { type pulse server \"" + std::string(std::getenv("PULSE_SERVER")) +
+                                 "\" }\n" + before);
+    std::filesystem::copy_file(folder / "new.conf", path, std::filesystem::copy_options::overwrite_existing);
+    EXPECT_TRUE(happens("added", "aaa"));
+    std::ofstream(path) << before;
+    EXPECT_TRUE(happens("removed", "aaa"));
+    program.signal(SIGTERM);
+    const SProcessResult result = program.wait();
+    EXPECT_EQ(result.exitCode, 0);
+    EXPECT_EQ(result.err, "");
+}
+
 TEST_F(Devices, AreMissedInOneLine) {
     server.kill();
     write("in.wav", makeTone(44100, 2, 16, 0.1));
