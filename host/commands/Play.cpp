@@ -2,20 +2,23 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
-#include "library/Failure.h"
-#include "media/Arrangement.h"
 #include "media/Devices.h"
-#include "media/SoundFile.h"
+#include "media/PlaySession.h"
+#include "media/PlaySource.h"
+#include "media/Playlist.h"
 #include "terminal/Keyboard.h"
 #include "terminal/LiveLine.h"
 
 #include <algorithm>
-#include <atomic>
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <deque>
 #include <memory>
+#include <optional>
+#include <random>
+#include <set>
 #include <stdexcept>
-#include <system_error>
 #include <thread>
 #include <tonewright/host.h>
 
@@ -26,180 +29,410 @@ namespace fs = std::filesystem;
 namespace {
 
 constexpr int kPollMilliseconds = 50;
+constexpr auto kEndPause = std::chrono::milliseconds(10);
+constexpr int kVolumeStep = 5;   // percent
+constexpr double kShortStep = 5; // seconds
+constexpr double kLongStep = 60;
+// The next item is opened once less than this is left to be heard, in seconds. The player reads 30 seconds
+// ahead and must know by then what follows.
+constexpr double kAhead = 45;
+constexpr size_t kMostAhead = 64; // items that are open at a time, which only matters if they are short
+// A device that has gone is replaced by another one only if it has played for that long, in seconds.
+constexpr double kProofOfLife = 0.5;
+constexpr int kDeviceAttempts = 8;
+constexpr auto kDevicePause = std::chrono::milliseconds(250);
 
-// What the player last reported; one player plays at a time.
-struct SState {
-    std::atomic<double> duration{0};
-    std::atomic<double> position{0};
-    std::atomic<int32_t> state{TONEWRIGHT_PLAYER_STOPPED};
-};
+// What every device can play is tried first.
+const SSampleFormat kFormats[] = {{44100, 2, 2}, {48000, 2, 2}, {44100, 1, 2}, {48000, 1, 2}};
 
-void onPlayer(double duration, double position, int32_t state, void* user) {
-    auto& shared = *static_cast<SState*>(user);
-    shared.duration = duration;
-    if (state != TONEWRIGHT_PLAYER_STOPPED) shared.position = position; // a stopped player reports 0
-    shared.state = state;
-}
-
-// Shared by all threads that use the player. Stopping a player that is failing at the same time takes ten
-// seconds; that thread is not waited for.
-class CSession {
-public:
-    CSession(CLibrary& library, CHandle player) : m_library(library), m_player(std::move(player)) {
-        ++s_alive;
-        TONEWRIGHT_Host_SetPlayerProgress(m_player.get(), onPlayer, &m_state);
-    }
-    ~CSession() {
-        m_player.reset();
-        --s_alive;
-    }
-    CSession(const CSession&) = delete;
-    CSession& operator=(const CSession&) = delete;
-
-    static bool isAnyAlive() { return s_alive > 0; }
-
-    void play() { // returns at the end
-        clearFailure();
-        m_failed = m_library.Player_Play(m_player.get()) != TONEWRIGHT_OK;
-        if (m_failed) {
-            m_reason = takeFailure("The file cannot be played");
-            TONEWRIGHT_Host_SetPlayerProgress(m_player.get(), nullptr, nullptr);
-        }
-        m_ended = true;
-    }
-    const SState& getState() const { return m_state; }
-    bool hasBegun() const { return m_state.state != TONEWRIGHT_PLAYER_STOPPED; }
-    bool hasEnded() const { return m_ended; }
-    bool hasFailed() const { return m_failed; }
-    const std::string& getReason() const { return m_reason; }
-
-    // Ignored before playback has begun.
-    void togglePause() {
-        if (hasBegun() && !m_ended) m_library.Player_Pause(m_player.get());
-    }
-    void stop() { m_library.Player_Stop(m_player.get()); } // waits for play() to end
-
-private:
-    CLibrary& m_library;
-    SState m_state; // outlives the player, which reports to it
-    CHandle m_player;
-    std::string m_reason;
-    bool m_failed = false;
-    std::atomic<bool> m_ended{false}; // publishes the two above
-    static inline std::atomic<int> s_alive{0};
-};
+// Counts the items that were passed: with --loop, it goes on counting when the list starts over.
+using Turn = size_t;
 
 class CJukebox {
 public:
-    CJukebox(CLibrary& library, EOutput show) : m_library(library), m_line(show, "input") {}
+    CJukebox(CLibrary& library, const SPlayOptions& options, std::vector<SPlayItem> items);
 
-    // Returns at the end of the file; false when it failed.
-    bool play(const fs::path& file);
-    bool isStopped() const { return m_stopped || isCancelled(); }
+    void play(); // returns at the end of the list or when the user stops it
+    bool hasFailed() const { return m_hasFailed; }
 
 private:
-    CHandle makePlayer(const fs::path& file);
-    void watch(const std::shared_ptr<CSession>& session);
-    void show(const SState& state);
+    enum class ERequest { none, next, previous, stop };
+
+    // An item of the running session, by the player's index.
+    struct SPlaying {
+        Turn turn;
+        double duration;
+        std::shared_ptr<CPlayResult> result;
+    };
+    struct SMissing {
+        Turn turn;
+        std::string reason;
+    };
+
+    const SPlayItem& itemOf(Turn turn) const { return m_items[turn % m_items.size()]; }
+    bool hasItem(Turn turn) const;
+    std::optional<Turn> playFrom(Turn turn, double seconds);
+    bool openSession(double seconds);
+    std::optional<SPlaySource> openNext(const SSampleFormat& format);
+    void enqueueAhead();
+    void run();
+    void handleKey(int key);
+    void hear(size_t index);
+    std::optional<Turn> conclude();
+    Turn findBefore(Turn turn) const;
+    std::optional<Turn> replaceDevice(const std::string& reason);
+    void reportMissing(Turn before);
+    void begin();
+    void end(bool isWhole);
+    void show();
+    nlohmann::json describeItem(Turn turn) const;
+    double getVolume() const { return m_isMuted ? 0 : m_volume / 100.0; }
 
     CLibrary& m_library;
+    const SPlayOptions& m_options;
+    const std::vector<SPlayItem> m_items;
     CKeyboard m_keyboard;
     CLiveLine m_line;
-    bool m_stopped = false; // by the q key
+    std::string m_device; // id; empty for the default device
+    int m_volume;         // percent
+    bool m_isMuted = false;
+    bool m_hasFailed = false;
+
+    // Of the running session
+    std::unique_ptr<CPlaySession> m_session;
+    SSampleFormat m_format;
+    std::deque<SPlaying> m_playing;
+    std::deque<SMissing> m_missing; // items that could not be opened, until their turn has come
+    Turn m_next = 0;                // the next item to be opened
+    size_t m_heard = 0;             // index into m_playing
+    double m_from = 0;              // where the first item starts, in seconds
+    ERequest m_request = ERequest::none;
+    std::chrono::steady_clock::time_point m_begun;
+    size_t m_barren = 0;    // items in succession that could not be opened
+    std::set<size_t> m_bad; // indices of items that could not be opened
 };
 
-void CJukebox::show(const SState& state) {
-    const bool isPaused = state.state == TONEWRIGHT_PLAYER_PAUSED;
-    const double duration = state.duration, position = std::min<double>(state.position, duration);
-    const std::string at = formatDuration(position), all = formatDuration(duration);
-    m_line.update(
-        at + " / " + all + (isPaused ? "  paused" : ""), at + " of " + all,
-        {{"position", position}, {"duration", duration}, {"state", isPaused ? "paused" : "playing"}});
+CJukebox::CJukebox(CLibrary& library, const SPlayOptions& options, std::vector<SPlayItem> items)
+    : m_library(library), m_options(options), m_items(std::move(items)), m_line(options.show, "input"),
+      m_volume(options.volume) {
+    if (!options.device.empty()) m_device = findOutDevice(options.device).id;
 }
 
-// Stopping waits for the playing thread, which may take a while, so it runs on its own thread unless none can
-// be created.
-std::thread startStopper(const std::shared_ptr<CSession>& session) {
-    try {
-        return std::thread([session] { session->stop(); });
-    } catch (const std::system_error&) {
-        session->stop();
-        return {};
+bool CJukebox::hasItem(Turn turn) const {
+    return turn < m_items.size() || (m_options.loops && m_barren < m_items.size());
+}
+
+nlohmann::json CJukebox::describeItem(Turn turn) const {
+    const SPlayItem& item = itemOf(turn);
+    nlohmann::json details = {{"index", turn % m_items.size() + 1}, {"count", m_items.size()}};
+    if (!item.title.empty()) details["title"] = item.title;
+    if (item.track > 0) details["track"] = item.track;
+    if (item.file != item.name) details["file"] = item.file.native();
+    return details;
+}
+
+// The names of a cue sheet's tracks are shown with their states.
+std::string describeTrack(const SPlayItem& item) {
+    if (item.track == 0) return {};
+    return "track " + std::to_string(item.track) + (item.title.empty() ? "" : " " + toPrintable(item.title)) +
+           ", ";
+}
+
+void CJukebox::play() {
+    std::optional<Turn> turn = 0;
+    double seconds = m_options.start;
+    while (turn && !isCancelled()) {
+        turn = playFrom(*turn, seconds);
+        seconds = m_from;
     }
 }
 
-// Shows the state and handles keys until playback has ended.
-void CJukebox::watch(const std::shared_ptr<CSession>& session) {
-    std::thread stopper;
-    while (!session->hasEnded()) {
-        const char key = m_keyboard.wait(kPollMilliseconds);
-        m_stopped = m_stopped || key == 'q' || key == 'Q';
-        if (key == ' ') session->togglePause();
-        // A stop before playback has begun would have no effect.
-        const bool hasBegun = session->hasBegun();
-        if (isStopped() && hasBegun && !stopper.joinable()) stopper = startStopper(session);
-        if (hasBegun && m_line.isDue()) show(session->getState());
-    }
-    if (!stopper.joinable()) return;
-    if (session->hasFailed())
-        stopper.detach();
-    else
-        stopper.join();
+// Plays from that item on until the end, a key or a failure. Returns where to go on; m_from is the time.
+std::optional<Turn> CJukebox::playFrom(Turn turn, double seconds) {
+    m_playing.clear();
+    m_missing.clear();
+    m_heard = 0;
+    m_request = ERequest::none;
+    m_next = turn;
+    const bool isOpen = openSession(seconds);
+    reportMissing(isOpen ? m_playing.front().turn : m_next);
+    if (!isOpen) return std::nullopt;
+    run();
+    return conclude();
 }
 
-CHandle CJukebox::makePlayer(const fs::path& file) {
-    checkInput(file);
-    if (!isArrangement(file)) {
-        clearFailure();
-        CHandle player(m_library.CreatePlayerFromURI(toURI(file).c_str()));
-        if (!player) throw std::runtime_error(takeFailure("The file cannot be played", file));
-        return player;
-    }
-    const CHandle source = openArrangement(m_library, file, SSampleFormat());
-    CHandle player(m_library.CreatePlayerFromAudioSource(source.get()));
-    if (!player) throw std::runtime_error(takeFailure("The file cannot be played", file));
-    return player;
-}
-
-bool CJukebox::play(const fs::path& file) {
-    const auto started = std::chrono::steady_clock::now();
-    m_line.start(file, nlohmann::json::object());
-    std::shared_ptr<CSession> session;
-    try {
-        session = std::make_shared<CSession>(m_library, makePlayer(file));
-        std::thread thread([session] { session->play(); });
-        watch(session);
-        thread.join();
-        if (session->hasFailed()) {
-            throw std::runtime_error(asReason(session->getReason(), file));
+// Opens the next item that can be opened. Empty at the end of the list.
+std::optional<SPlaySource> CJukebox::openNext(const SSampleFormat& format) {
+    while (hasItem(m_next) && !isCancelled()) {
+        const Turn turn = m_next++;
+        try {
+            SPlaySource opened = openPlaySource(m_library, itemOf(turn), format);
+            m_barren = 0;
+            m_playing.push_back({turn, opened.duration, opened.result});
+            return opened;
+        } catch (const std::exception& failure) {
+            ++m_barren;
+            m_bad.insert(turn % m_items.size());
+            m_missing.push_back({turn, failure.what()});
         }
-    } catch (const std::exception& failure) {
-        m_line.fail(failure.what());
-        return false;
     }
-    const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
-    if (isStopped())
-        m_line.cancel({{"position", session->getState().position.load()}});
-    else
-        m_line.finish(formatDuration(session->getState().duration) + " played",
-                      {{"duration", session->getState().duration.load()}, {"seconds", elapsed.count()}});
-    return true;
+    return std::nullopt;
+}
+
+// False if nothing is left to play. Throws CNoDevice.
+bool CJukebox::openSession(double seconds) {
+    std::string reason;
+    const Turn first = m_next;
+    for (const SSampleFormat& format : kFormats) {
+        m_next = first;
+        m_missing.clear();
+        m_playing.clear();
+        const std::optional<SPlaySource> opened = openNext(format);
+        if (!opened) return false;
+        try {
+            m_session = std::make_unique<CPlaySession>(m_library, opened->source, m_device);
+        } catch (const std::runtime_error& failure) {
+            if (reason.empty()) reason = failure.what();
+            if (readDevices(TONEWRIGHT_DEVICE_OUTPUT).empty()) break;
+            continue;
+        }
+        m_format = format;
+        m_session->setVolume(getVolume());
+        // A time that was meant for an item which cannot be played does not apply to the next one.
+        m_from = m_playing.front().turn == first ? seconds : 0;
+        enqueueAhead();
+        m_session->start(m_from);
+        return true;
+    }
+    findDefaultOutDevice();
+    throw CNoDevice(reason);
+}
+
+void CJukebox::enqueueAhead() {
+    double left = m_playing[m_heard].duration - m_session->getState().position;
+    for (size_t i = m_heard + 1; i < m_playing.size(); ++i) left += m_playing[i].duration;
+    while (left < kAhead && m_playing.size() - m_heard < kMostAhead) {
+        const std::optional<SPlaySource> opened = openNext(m_format);
+        if (!opened) return;
+        if (!m_session->enqueue(opened->source)) { // the player is failing, and its end follows
+            m_next = m_playing.back().turn;
+            m_playing.pop_back();
+            return;
+        }
+        left += opened->duration;
+    }
+}
+
+void CJukebox::handleKey(int key) {
+    const double position = m_session->getState().position;
+    const auto changeVolume = [this](int step) {
+        m_volume = std::clamp(m_volume + step, 0, kMostVolume);
+        m_isMuted = false;
+        m_session->setVolume(getVolume());
+    };
+    switch (key) {
+    case ' ':
+        return m_session->togglePause();
+    case 'q':
+    case 'Q':
+        m_request = ERequest::stop;
+        return;
+    case 'n':
+    case '>':
+        m_request = ERequest::next;
+        return;
+    case 'p':
+    case '<':
+        m_request = ERequest::previous;
+        return;
+    case kKeyLeft:
+        return m_session->seek(std::max(position - kShortStep, 0.0));
+    case kKeyRight:
+        return m_session->seek(position + kShortStep);
+    case kKeyDown:
+    case kKeyShiftLeft:
+        return m_session->seek(std::max(position - kLongStep, 0.0));
+    case kKeyUp:
+    case kKeyShiftRight:
+        return m_session->seek(position + kLongStep);
+    case '+':
+    case '=':
+    case '0':
+        return changeVolume(kVolumeStep);
+    case '-':
+    case '9':
+        return changeVolume(-kVolumeStep);
+    case 'm':
+    case 'M':
+        m_isMuted = !m_isMuted;
+        return m_session->setVolume(getVolume());
+    default:
+        return;
+    }
+}
+
+// Shows the state and handles keys until the session has ended.
+void CJukebox::run() {
+    begin();
+    while (!m_session->hasEnded()) {
+        // Keys pressed while this item ends are meant for the next one.
+        if (m_request != ERequest::none)
+            std::this_thread::sleep_for(kEndPause);
+        else if (const int key = m_keyboard.waitForKey(kPollMilliseconds); key != 0)
+            handleKey(key);
+        if (isCancelled()) m_request = ERequest::stop;
+        hear(static_cast<size_t>(m_session->getIndex()));
+        if (m_request != ERequest::none) {
+            m_session->stop();
+            continue;
+        }
+        enqueueAhead();
+        // The player would wait for the stated end of the last item if that has ended early.
+        const double length = m_playing[m_heard].result->getLength();
+        if (m_heard + 1 == m_playing.size() && length >= 0 && m_session->getState().position >= length)
+            m_request = ERequest::next;
+        if (m_session->hasBegun() && m_line.isDue()) show();
+    }
+}
+
+// Reports what has ended and what has begun since.
+void CJukebox::hear(size_t index) {
+    for (index = std::min(index, m_playing.size() - 1); m_heard < index;) {
+        end(true);
+        ++m_heard;
+        m_from = 0;
+        reportMissing(m_playing[m_heard].turn);
+        begin();
+    }
+}
+
+void CJukebox::reportMissing(Turn before) {
+    while (!m_missing.empty() && m_missing.front().turn < before) {
+        const SMissing missing = m_missing.front();
+        m_missing.pop_front();
+        m_line.start(itemOf(missing.turn).name, describeItem(missing.turn));
+        m_line.fail(missing.reason);
+        m_hasFailed = true;
+    }
+}
+
+void CJukebox::begin() {
+    m_begun = std::chrono::steady_clock::now();
+    const Turn turn = m_playing[m_heard].turn;
+    nlohmann::json details = describeItem(turn);
+    if (m_from > 0) details["position"] = m_from;
+    m_line.start(itemOf(turn).name, details);
+}
+
+// `isWhole`: the item was heard to its end.
+void CJukebox::end(bool isWhole) {
+    const SPlaying& playing = m_playing[m_heard];
+    const std::string track = describeTrack(itemOf(playing.turn));
+    if (isWhole && playing.result->getLength() >= 0 && !playing.result->getFailure().empty()) {
+        m_line.fail(track + playing.result->getFailure());
+        m_hasFailed = true;
+    } else if (isWhole) {
+        const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - m_begun;
+        m_line.finish(track + formatDuration(playing.duration) + " played",
+                      {{"duration", playing.duration}, {"seconds", elapsed.count()}});
+    } else {
+        m_line.cancel({{"position", m_session->getState().position}});
+    }
+}
+
+// Where to go on after the session has ended.
+std::optional<Turn> CJukebox::conclude() {
+    const std::string reason = m_session->finish();
+    hear(static_cast<size_t>(m_session->getIndex()));
+    const Turn turn = m_playing[m_heard].turn;
+    if (!reason.empty() && m_request == ERequest::none) return replaceDevice(reason);
+    const double length = m_playing[m_heard].result->getLength();
+    const bool isWhole = m_request == ERequest::none || (m_request == ERequest::next && length >= 0 &&
+                                                         m_session->getState().position >= length);
+    end(isWhole);
+    m_session.reset();
+    m_from = 0;
+    if (m_request == ERequest::stop) return std::nullopt;
+    return m_request == ERequest::previous ? findBefore(turn) : turn + 1;
+}
+
+// The item before that can be played, otherwise the same one.
+Turn CJukebox::findBefore(Turn turn) const {
+    for (Turn before = turn; before-- > 0;)
+        if (m_bad.count(before % m_items.size()) == 0) return before;
+    return turn;
+}
+
+// The sound system may need a moment to choose another device.
+std::optional<Turn> CJukebox::replaceDevice(const std::string& reason) {
+    const Turn turn = m_playing[m_heard].turn;
+    const double position = m_session->getState().position;
+    const bool hasPlayed = m_session->hasBegun() && position >= m_from + kProofOfLife;
+    m_session.reset();
+    m_device.clear();
+    for (int i = 0; hasPlayed && i < kDeviceAttempts && !isCancelled(); ++i) {
+        if (i > 0) std::this_thread::sleep_for(kDevicePause);
+        try {
+            const SDevice device = findDefaultOutDevice();
+            m_line.fail(reason + "; going on with '" + device.name + "'");
+            m_from = position;
+            return turn;
+        } catch (const CNoDevice&) {
+            // Perhaps the next time.
+        }
+    }
+    m_line.fail(reason);
+    m_hasFailed = true;
+    return std::nullopt;
+}
+
+void CJukebox::show() {
+    const CPlaySession::SState state = m_session->getState();
+    const SPlaying& playing = m_playing[m_heard];
+    // A duration of 0 is an unknown one.
+    const double position =
+        playing.duration > 0 ? std::min(state.position, playing.duration) : state.position;
+    const std::string at = formatDuration(position), all = formatDuration(playing.duration);
+    std::string live = describeTrack(itemOf(playing.turn)) + at + " / " + all;
+    if (m_items.size() > 1)
+        live +=
+            "  " + std::to_string(playing.turn % m_items.size() + 1) + "/" + std::to_string(m_items.size());
+    if (m_isMuted)
+        live += "  muted";
+    else if (m_volume != 100)
+        live += "  volume " + std::to_string(m_volume) + " %";
+    nlohmann::json details = {{"position", position},
+                              {"duration", playing.duration},
+                              {"state", state.isPaused ? "paused" : "playing"},
+                              {"volume", m_volume}};
+    if (m_isMuted) details["muted"] = true;
+    m_line.update(live + (state.isPaused ? "  paused" : ""), at + " of " + all, details);
+}
+
+std::set<std::string> readExtensions(CLibrary& library) {
+    const CHandle extensions(library.getValidCodecExtensions(TONEWRIGHT_AUDIO_SOURCE));
+    std::set<std::string> names;
+    for (int32_t i = 0; i < library.getExtensionCount(extensions.get()); ++i) {
+        const CHandle text(library.getExtension(extensions.get(), i));
+        if (text) names.insert(toUTF8(TONEWRIGHT_GetText(text.get())));
+    }
+    return names;
 }
 
 } // namespace
 
 int play(CLibrary& library, const SPlayOptions& options) {
     requireOutDevice();
+    std::vector<SPlayItem> items = listItems(options.inputs, readExtensions(library), options.isRecursive);
+    if (options.isShuffled) std::shuffle(items.begin(), items.end(), std::mt19937(std::random_device()()));
     bool failed = false;
     {
-        CJukebox jukebox(library, options.show);
-        for (const fs::path& file : options.files) {
-            failed = !jukebox.play(file) || failed;
-            if (jukebox.isStopped()) break;
-        }
+        CJukebox jukebox(library, options, std::move(items));
+        jukebox.play();
+        failed = jukebox.hasFailed();
     }
     const int code = isCancelled() ? kExitCancelled : failed ? kExitFailure : kExitSuccess;
-    if (!CSession::isAnyAlive()) return code;
+    if (!CPlaySession::isAnyAlive()) return code;
     std::fflush(nullptr);
     std::_Exit(code);
 }

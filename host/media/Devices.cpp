@@ -72,9 +72,22 @@ void requireOutDevice() {
     // machine causes gaps. A latency above one chunk of sound causes a gap at the beginning, and from 150 ms
     // on the server reports a delay that is too short, so that the last samples may be cut off.
     ::setenv("PULSE_LATENCY_MSEC", "100", 0);
+    findDefaultOutDevice();
+}
+
+SDevice findDefaultOutDevice() {
     for (const SDevice& device : readDevices(TONEWRIGHT_DEVICE_OUTPUT))
-        if (device.isDefault) return;
+        if (device.isDefault) return device;
     throw CNoDevice("There is no sound device to play on");
+}
+
+SDevice findOutDevice(const std::string& idOrName) {
+    const std::vector<SDevice> devices = readDevices(TONEWRIGHT_DEVICE_OUTPUT);
+    if (devices.empty()) throw CNoDevice("There is no sound device to play on");
+    for (const auto member : {&SDevice::id, &SDevice::name})
+        for (const SDevice& device : devices)
+            if (device.*member == idOrName) return device;
+    throw CNoDevice("There is no output device " + toPrintable(idOrName) + "; tonewright devices lists them");
 }
 
 CHandle openInDevice(const std::string& id) {

@@ -41,6 +41,11 @@ template <class Command> int needingDevice(bool json, Command command) {
 // Throws CNoDevice if there is no output device.
 void requireOutDevice();
 
+// The output device with that id or name. Throws CNoDevice.
+SDevice findOutDevice(const std::string& idOrName);
+// The default output device. Throws CNoDevice.
+SDevice findDefaultOutDevice();
+
 // Opens the input device with that id, or the default one if the id is empty. Throws CNoDevice.
 CHandle openInDevice(const std::string& id);
 

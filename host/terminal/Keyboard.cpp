@@ -5,13 +5,28 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
+#include <cstring>
 #include <poll.h>
+#include <string>
 #include <termios.h>
 #include <unistd.h>
 
 namespace host {
 
 namespace {
+
+constexpr char kEscape = '\x1b';
+constexpr int kSequenceMilliseconds = 100; // between the bytes of one key
+constexpr size_t kLongestSequence = 8;
+
+// What terminals send after an escape character.
+constexpr struct {
+    const char* sequence;
+    int key;
+} kSequences[] = {{"[C", kKeyRight},       {"OC", kKeyRight}, {"[D", kKeyLeft},
+                  {"OD", kKeyLeft},        {"[A", kKeyUp},    {"OA", kKeyUp},
+                  {"[B", kKeyDown},        {"OB", kKeyDown},  {"[1;2C", kKeyShiftRight},
+                  {"[1;2D", kKeyShiftLeft}};
 
 constexpr std::array kSignals{SIGTSTP, SIGQUIT, SIGABRT, SIGSEGV, SIGBUS, SIGFPE, SIGILL};
 
@@ -92,7 +107,28 @@ CKeyboard::~CKeyboard() {
 }
 
 char CKeyboard::wait(int milliseconds) {
+    const int key = waitForKey(milliseconds);
+    return key > 0 && key < 128 ? static_cast<char>(key) : '\0';
+}
+
+int CKeyboard::waitForKey(int milliseconds) {
     take(); // again after the program was suspended or came to the foreground
+    const char first = readByte(milliseconds);
+    if (first != kEscape) return static_cast<unsigned char>(first);
+    // Parameters, then a letter; the rest of a sequence that is not known must not count as keys.
+    std::string sequence;
+    do {
+        const char next = readByte(kSequenceMilliseconds);
+        if (next == 0) return sequence.empty() ? kEscape : 0;
+        sequence += next;
+    } while (sequence.size() < kLongestSequence &&
+             (sequence.size() < 2 || std::strchr("0123456789;", sequence.back()) != nullptr));
+    for (const auto& known : kSequences)
+        if (sequence == known.sequence) return known.key;
+    return 0;
+}
+
+char CKeyboard::readByte(int milliseconds) {
     pollfd input{STDIN_FILENO, POLLIN, 0};
     if (::poll(&input, g_isTaken ? 1 : 0, milliseconds) <= 0) return 0;
     char key = 0;
