@@ -367,7 +367,8 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetRecordingLevels(TONEWRIGHT_Handle sour
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_SeekPlayer(TONEWRIGHT_Handle player, double seconds);
 /* A factor applied to the samples, effective at once; 1.0 leaves them unchanged. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetPlayerVolume(TONEWRIGHT_Handle player, double factor);
-/* Selects the output device of a stopped player by its id. */
+/* Selects the output device of a stopped player by its id. Without it, each TONEWRIGHT_Player_Play uses the
+ * device that is the default one at that time. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetPlayerDevice(TONEWRIGHT_Handle player, const char* id);
 /* Plays the source after everything already queued, without a gap. If its format differs from that of the
  * current source, the result is 0 and nothing is queued. Must be called before the last second of the current
