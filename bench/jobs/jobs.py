@@ -12,6 +12,8 @@ import sys
 import tempfile
 import time
 
+from playing import bench_playing
+
 SOUNDS = sorted(pathlib.Path("/usr/share/sounds/alsa").glob("*.wav")) + sorted(
     pathlib.Path("/usr/share/sounds/freedesktop/stereo").glob("*.oga")
 )
@@ -205,7 +207,7 @@ def main():
     parser.add_argument("build", type=pathlib.Path)
     parser.add_argument("--minutes", type=int, default=10, help="length of the material")
     parser.add_argument("--repeat", type=int, default=3, help="runs of each job, interleaved with its peer")
-    parser.add_argument("--only", default="", help="only jobs whose name contains this text; \"tags\" and \"mixing\" select those groups")
+    parser.add_argument("--only", default="", help="only jobs whose name contains this text; \"tags\", \"mixing\" and \"playing\" select those groups")
     arguments = parser.parse_args()
 
     host = arguments.build / "bin/tonewright"
@@ -242,6 +244,8 @@ def main():
         bench_tags(host, work, wav, arguments.repeat)
     if arguments.only.lower() in "mixing":
         bench_mixing(host, work, wav, arguments.minutes, arguments.repeat)
+    if arguments.only.lower() in "playing":
+        bench_playing(host, work, wav, run)
     if not arguments.only:
         print("\nPeak memory by length, WAV to FLAC:")
         for title, seconds in (("1 minute", 60), ("6 hours", 6 * 3600)):
