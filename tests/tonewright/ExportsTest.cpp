@@ -81,7 +81,6 @@ TEST_F(Exports, Plugins_ThatFailAreSeenByTheHostsLog) {
     EXPECT_TRUE(log->take().empty());
     TONEWRIGHT_AddProxyLogManager(log->getHandle());
     TONEWRIGHT_SetLanguageID(u"xx-nowhere");
-    TONEWRIGHT_SetLanguageID(u"de-AT");
     TONEWRIGHT_SetLanguageID(nullptr);
     EXPECT_THAT(
         log->take(),
