@@ -144,6 +144,13 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetClippingPrevention(TONEWRIGHT_Handle s
  * null if there are none. Some warnings are known only after the source has been closed. */
 TONEWRIGHT_API char* TONEWRIGHT_Host_TakeWarnings(TONEWRIGHT_Handle source);
 
+/* Settings of TONEWRIGHT_CreateAudioFormatFromURI that a type of file may ignore. */
+typedef enum TONEWRIGHT_Setting {
+    TONEWRIGHT_SETTING_QUALITY = 1,
+    TONEWRIGHT_SETTING_BIT_RATE = 2, /* and its limits */
+    TONEWRIGHT_SETTING_WIDTH = 4     /* files store samples of that width; lossy codecs do not */
+} TONEWRIGHT_Setting;
+
 /* What files of a type can hold. */
 typedef struct TONEWRIGHT_Capabilities {
     size_t size;
@@ -151,6 +158,8 @@ typedef struct TONEWRIGHT_Capabilities {
     uint32_t widths;        /* bit n - 1: n bytes per sample, for 1 to 4 */
     int32_t rateCount;
     int32_t rates[32]; /* those of the usual rates from 8000 to 384000 Hz that are accepted, ascending */
+    uint32_t settings; /* the TONEWRIGHT_Setting bits that have an effect; all of them if the plug-in does not
+                          report it */
 } TONEWRIGHT_Capabilities;
 
 /* Asks the plug-in that would write the file; nothing is written. 0 if no plug-in writes that type. */

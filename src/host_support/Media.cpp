@@ -3,6 +3,7 @@
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
 #include "sonora2/media/IClippingPrevention.h"
+#include "sonora2/media/IFormatSettings.h"
 #include "sonora2/media/IMediaDescription.h"
 #include "sonora2/media/ISalvage.h"
 #include "sonora2/plugins/MediaEnvironment.h"
@@ -79,19 +80,36 @@ void fillInfo(const P<IAudioSource>& source, TONEWRIGHT_MediaInfo* info) {
     fillRecord(info, values);
 }
 
-// Whether one of the plug-ins for the file accepts the format. The reasons of those that do not are ignored.
-bool canWrite(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int rate, int channels, int bytes) {
+// The format of the first plug-in for the file that accepts these numbers, or an empty handle. The reasons of
+// those that do not are ignored.
+P<IFormat> findFormat(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int rate, int channels,
+                      int bytes) {
     ISonoraPlugin::SFormatParams params;
     params.nSampleRate = rate;
     params.nChannelCount = channels;
     params.nBytesPerSample = bytes;
-    return askPlugins(uri, handler, kAudioFormat, [&](ISonoraPlugin& plugin) {
+    P<IFormat> format;
+    askPlugins(uri, handler, kAudioFormat, [&](ISonoraPlugin& plugin) {
         try {
-            return plugin.tryCreateFormat(uri, kAudioFormat, false, &params) != nullptr;
+            format = plugin.tryCreateFormat(uri, kAudioFormat, false, &params);
+            return format != nullptr;
         } catch (const peru::CException&) {
             return false;
         }
     });
+    return format;
+}
+
+bool canWrite(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int rate, int channels, int bytes) {
+    return findFormat(uri, handler, rate, channels, bytes) != nullptr;
+}
+
+uint32_t getUsedSettings(const P<IFormat>& format) {
+    static_assert(static_cast<int>(TONEWRIGHT_SETTING_QUALITY) == IFormatSettings::kQuality &&
+                  static_cast<int>(TONEWRIGHT_SETTING_BIT_RATE) == IFormatSettings::kBitRate &&
+                  static_cast<int>(TONEWRIGHT_SETTING_WIDTH) == IFormatSettings::kSampleWidth);
+    const auto settings = peru::interfaceCast<IFormatSettings>(format);
+    return settings ? settings->getUsedSettings() : IFormatSettings::kAllSettings;
 }
 
 } // namespace
@@ -169,6 +187,7 @@ int32_t TONEWRIGHT_Host_GetCapabilities(const char16_t* uri, TONEWRIGHT_Capabili
                     if (rate == 0 && canWrite(target, handler, candidate, count, width))
                         rate = candidate, channels = count, bytes = width;
         if (rate > 0) {
+            values.settings = getUsedSettings(findFormat(target, handler, rate, channels, bytes));
             for (const int candidate : kRates)
                 if (canWrite(target, handler, candidate, channels, bytes))
                     values.rates[values.rateCount++] = candidate;
