@@ -9,6 +9,8 @@
 #include <cmath>
 #include <cstdio>
 #include <cstring>
+#include <cwchar>
+#include <locale.h>
 #include <memory>
 #include <stdexcept>
 
@@ -25,6 +27,20 @@ int hexDigit(char c) {
     if (c >= 'A' && c <= 'F') return c - 'A' + 10;
     if (c >= 'a' && c <= 'f') return c - 'a' + 10;
     return -1;
+}
+
+// Moves on by one character and returns its columns. Bytes that are not UTF-8 are shown as one column each.
+size_t takeCharacter(std::string_view text, size_t& at) {
+    static const locale_t kUTF8 = ::newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr);
+    const locale_t old = kUTF8 ? ::uselocale(kUTF8) : nullptr;
+    wchar_t character = 0;
+    std::mbstate_t state = {};
+    const size_t size = std::mbrtowc(&character, text.data() + at, text.size() - at, &state);
+    const bool isValid = size != 0 && size <= text.size() - at;
+    const int columns = isValid ? ::wcwidth(character) : 1;
+    if (old) ::uselocale(old);
+    at += isValid ? size : 1;
+    return columns < 0 ? 1 : static_cast<size_t>(columns);
 }
 
 struct SFree {
@@ -101,11 +117,19 @@ std::string withPaths(std::string_view message) {
     return result;
 }
 
+size_t countColumns(std::string_view text) {
+    size_t columns = 0;
+    for (size_t at = 0; at < text.size();) columns += takeCharacter(text, at);
+    return columns;
+}
+
 std::string fitColumns(std::string text, size_t columns) {
-    // Cut between characters: continuation bytes take no column.
-    const auto continues = [&](size_t at) { return at < text.size() && (text[at] & 0xC0) == 0x80; };
     size_t taken = 0, cut = 0;
-    for (; cut < text.size() && (taken < columns || continues(cut)); ++cut) taken += !continues(cut);
+    for (size_t at = 0; at < text.size(); cut = at) {
+        const size_t width = takeCharacter(text, at);
+        if (taken + width > columns) break;
+        taken += width;
+    }
     text.resize(cut);
     text.append(columns - taken, ' ');
     return text;

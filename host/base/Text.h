@@ -20,6 +20,8 @@ std::string toPrintable(std::string_view text);
 std::string withPaths(std::string_view message);
 // Rewords a reason that is shown after the name of the file concerned, so that it does not repeat the name.
 std::string asReason(std::string message, const std::filesystem::path& about);
+// The columns that the text takes on a terminal.
+size_t countColumns(std::string_view text);
 // Cuts the text, or pads it with spaces, to that number of terminal columns.
 std::string fitColumns(std::string text, size_t columns);
 void replaceAll(std::string& text, const std::string& what, const std::string& with);

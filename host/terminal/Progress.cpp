@@ -2,7 +2,10 @@
 
 #include "base/Text.h"
 
+#include <algorithm>
 #include <cstdio>
+#include <cstdlib>
+#include <string_view>
 #include <sys/ioctl.h>
 #include <unistd.h>
 
@@ -12,7 +15,18 @@ namespace {
 
 constexpr auto kRedraw = std::chrono::milliseconds(100);
 constexpr auto kPlainLine = std::chrono::seconds(5);
-constexpr size_t kDefaultColumns = 80;
+constexpr size_t kDefaultColumns = 80, kDefaultRows = 24;
+
+size_t getTerminalRows() {
+    winsize size = {};
+    const bool isKnown = ::ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_row > 0;
+    return isKnown ? size.ws_row : kDefaultRows;
+}
+
+bool canMoveCursor() {
+    const char* terminal = std::getenv("TERM");
+    return ::isatty(STDERR_FILENO) && !(terminal && std::string_view(terminal) == "dumb");
+}
 
 std::string name(const std::filesystem::path& path) {
     return toPrintable(path.native());
@@ -22,15 +36,16 @@ std::string name(const std::filesystem::path& path) {
 
 size_t getTerminalColumns() {
     winsize size = {};
-    return ::ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 ? size.ws_col : kDefaultColumns;
+    const bool isKnown = ::ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0;
+    return isKnown ? std::max<size_t>(size.ws_col, 2) : kDefaultColumns;
 }
 
 std::string toLine(const nlohmann::json& value) {
     return value.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
 }
 
-CProgress::CProgress(EOutput output)
-    : m_output(output), m_bars(output == EOutput::normal && ::isatty(STDERR_FILENO)) {}
+CProgress::CProgress(EOutput output, std::FILE* results)
+    : m_output(output), m_results(results), m_bars(output == EOutput::normal && canMoveCursor()) {}
 
 CProgress::~CProgress() {
     eraseBars();
@@ -61,7 +76,7 @@ void CProgress::advance(Job job, double fraction) {
         emit(job, "progress", {{"fraction", fraction}});
     } else if (m_output == EOutput::normal && now - entry.told >= kPlainLine) {
         entry.told = now;
-        std::printf("%s: %.0f %%\n", name(entry.input).c_str(), fraction * 100);
+        std::fprintf(m_results, "%s: %.0f %%\n", name(entry.input).c_str(), fraction * 100);
         flushEvents();
     }
 }
@@ -75,12 +90,11 @@ void CProgress::finish(Job job, const SJobResult& result) {
           {"duration", result.duration},
           {"seconds", result.elapsed},
           {"bytes", result.bytes}});
-    if (m_output == EOutput::normal) {
-        std::printf("%s: %s, %s, %s, %.0f times real time\n", name(m_jobs[job].output).c_str(),
-                    result.codec.c_str(), formatDuration(result.duration).c_str(),
-                    formatSize(result.bytes).c_str(), result.duration / std::max(result.elapsed, 1e-6));
-        flushEvents();
-    }
+    char speed[48];
+    std::snprintf(speed, sizeof speed, "%.0f times real time",
+                  result.duration / std::max(result.elapsed, 1e-6));
+    say(name(m_jobs[job].output) + ": " + result.codec + ", " + formatDuration(result.duration) + ", " +
+        formatSize(result.bytes) + ", " + speed);
     drawBars();
 }
 
@@ -112,6 +126,28 @@ void CProgress::cancel(Job job) {
     drawBars();
 }
 
+void CProgress::skip(Job job) {
+    std::lock_guard lock(m_mutex);
+    m_jobs[job].running = false;
+    eraseBars();
+    emit(job, "skipped", nlohmann::json::object());
+    say(name(m_jobs[job].output) + ": skipped, it exists");
+    drawBars();
+}
+
+void CProgress::plan(Job job, bool replaces) {
+    std::lock_guard lock(m_mutex);
+    m_jobs[job].running = false;
+    emit(job, "planned", {{"replaces", replaces}});
+    say(name(m_jobs[job].input) + " -> " + name(m_jobs[job].output) + (replaces ? " (replaced)" : ""));
+}
+
+void CProgress::say(const std::string& line) {
+    if (m_output != EOutput::normal) return;
+    std::fprintf(m_results, "%s\n", line.c_str());
+    flushEvents();
+}
+
 void CProgress::emit(Job job, const char* event, nlohmann::json details) {
     if (m_output != EOutput::json) return;
     details["event"] = event;
@@ -121,35 +157,53 @@ void CProgress::emit(Job job, const char* event, nlohmann::json details) {
     flushEvents();
 }
 
+// If the window became narrower since, the terminal has broken the lines into several.
 void CProgress::eraseBars() {
-    for (; m_drawn > 0; --m_drawn) std::fputs("\x1b[1A\x1b[2K", stderr);
+    const size_t columns = getTerminalColumns();
+    for (; !m_drawn.empty(); m_drawn.pop_back())
+        for (size_t rows = std::max<size_t>((m_drawn.back() + columns - 1) / columns, 1); rows > 0; --rows)
+            std::fputs("\x1b[1A\x1b[2K", stderr);
     std::fflush(stderr);
 }
 
+// More bars than rows would scroll, and could not be erased.
 void CProgress::drawBars() {
     if (!m_bars) return;
-    const size_t columns = getTerminalColumns();
+    const size_t columns = getTerminalColumns(), most = std::max<size_t>(getTerminalRows(), 2) - 1;
     for (const SJob& job : m_jobs) {
-        if (!job.running) continue;
-        std::fprintf(stderr, "%s\n", drawBar(job, columns).c_str());
-        ++m_drawn;
+        if (!job.running || m_drawn.size() >= most) continue;
+        // Some terminals begin a new line once the last column is filled.
+        const std::string bar = drawBar(job, columns - 1);
+        std::fprintf(stderr, "%s\n", bar.c_str());
+        m_drawn.push_back(countColumns(bar));
     }
     std::fflush(stderr);
 }
 
+// A narrow terminal loses the time left first, then the bar, and then most of the name.
 std::string CProgress::drawBar(const SJob& job, size_t width) const {
-    constexpr size_t kName = 24, kFixed = kName + 18;
-    const std::string file = fitColumns(name(job.input.filename()), kName);
-
-    const size_t cells = width > kFixed + 10 ? std::min<size_t>(width - kFixed, 50) : 10;
-    const size_t filled = static_cast<size_t>(job.fraction * static_cast<double>(cells));
-    const double elapsed = std::chrono::duration<double>(Clock::now() - job.started).count();
-    std::string left = "  --:--";
-    if (job.fraction > 0.02) left = "  " + formatDuration(elapsed * (1 - job.fraction) / job.fraction);
+    constexpr size_t kName = 24, kPercent = 5, kTime = 12, kLeastBar = 10, kMostBar = 50;
     char percent[16];
-    std::snprintf(percent, sizeof percent, "] %3.0f %%", job.fraction * 100);
-    return file + " [" + std::string(std::min(filled, cells), '#') +
-           std::string(cells - std::min(filled, cells), '.') + percent + left;
+    std::snprintf(percent, sizeof percent, "%3.0f %%", job.fraction * 100);
+    const std::string file = name(job.input.filename());
+    if (width < kPercent + 3)
+        return fitColumns(std::to_string(static_cast<int>(job.fraction * 100)) + "%", width);
+
+    // Two columns for the brackets and one between each two parts
+    const size_t nameColumns = std::min(kName, std::max<size_t>(width / 3, 8));
+    const size_t fixed = nameColumns + 1 + 2 + 1 + kPercent;
+    if (width < fixed + kLeastBar) return fitColumns(file, width - kPercent - 1) + " " + percent;
+    const bool hasTime = width >= fixed + kLeastBar + kTime;
+    const size_t cells = std::min(width - fixed - (hasTime ? kTime : 0), kMostBar);
+    const size_t filled = std::min(static_cast<size_t>(job.fraction * static_cast<double>(cells)), cells);
+    std::string left;
+    if (hasTime) {
+        const double elapsed = std::chrono::duration<double>(Clock::now() - job.started).count();
+        left = "  --:--";
+        if (job.fraction > 0.02) left = "  " + formatDuration(elapsed * (1 - job.fraction) / job.fraction);
+    }
+    return fitColumns(file, nameColumns) + " [" + std::string(filled, '#') +
+           std::string(cells - filled, '.') + "] " + percent + left;
 }
 
 } // namespace host

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <chrono>
+#include <cstdio>
 #include <filesystem>
 #include <mutex>
 #include <nlohmann/json.hpp>
@@ -27,7 +28,8 @@ struct SJobResult {
 // everything goes to standard output.
 class CProgress {
 public:
-    explicit CProgress(EOutput output);
+    // `results` receives what would otherwise go to standard output, except for JSON.
+    explicit CProgress(EOutput output, std::FILE* results = stdout);
     ~CProgress();
 
     using Job = size_t;
@@ -39,6 +41,10 @@ public:
     void warn(Job job, const std::string& reason);
     void fail(Job job, const std::string& reason);
     void cancel(Job job);
+    // The output exists and is left as it is.
+    void skip(Job job);
+    // Shows a job that is not run. `replaces`: the output exists.
+    void plan(Job job, bool replaces);
 
 private:
     using Clock = std::chrono::steady_clock;
@@ -52,6 +58,7 @@ private:
         bool running = true;
     };
 
+    void say(const std::string& line);
     void tell(Job job, const char* event, const std::string& reason);
     void emit(Job job, const char* event, nlohmann::json details);
     void eraseBars();
@@ -59,14 +66,15 @@ private:
     std::string drawBar(const SJob& job, size_t width) const;
 
     EOutput m_output;
+    std::FILE* m_results;
     bool m_bars;
     std::mutex m_mutex; // guards the members below and both streams
     std::vector<SJob> m_jobs;
-    size_t m_drawn = 0; // lines of bars on the screen
+    std::vector<size_t> m_drawn; // the bars on the screen: columns of each line
     Clock::time_point m_lastDrawn;
 };
 
-size_t getTerminalColumns(); // of standard error
+size_t getTerminalColumns(); // of standard error; at least 2
 
 // Serialises the value as one line. Bytes that are not valid UTF-8, as in file names, become U+FFFD.
 std::string toLine(const nlohmann::json& value);
