@@ -6,6 +6,7 @@
 #include "base/Text.h"
 #include "library/HostLog.h"
 #include "media/Devices.h"
+#include "media/FormatOptions.h"
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
@@ -46,6 +47,9 @@ int runCommand(const Run& run, CLibrary& library) {
         const int code = run(library);
         requireOutput();
         return code;
+    } catch (const CUsageError& failure) {
+        std::fprintf(stderr, "tonewright: %s\n", toPrintable(failure.what()).c_str());
+        return kExitUsage;
     } catch (const CNoDevice& failure) {
         std::fprintf(stderr, "tonewright: %s\n", failure.what());
         return kExitNoDevice;

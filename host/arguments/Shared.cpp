@@ -2,7 +2,6 @@
 
 #include <cmath>
 #include <cstdlib>
-#include <map>
 
 namespace host {
 
@@ -10,9 +9,44 @@ std::string isNumber(const std::string& text) {
     return std::isnan(std::strtod(text.c_str(), nullptr)) ? "is not a number" : "";
 }
 
+std::string toWholeNumber(std::string& text, const std::string& unit) {
+    char* end = nullptr;
+    double number = std::strtod(text.c_str(), &end);
+    std::string rest = CLI::detail::to_lower(CLI::detail::trim_copy(end));
+    if (end == text.c_str() || !std::isfinite(number)) return text + " is not a number";
+    if (rest.ends_with(unit)) rest.resize(rest.size() - unit.size());
+    if (rest == "k")
+        number *= 1000;
+    else if (!rest.empty())
+        return text + " has an unknown unit";
+    // The product of a decimal fraction may miss the whole number by a rounding error.
+    const double whole = std::round(number);
+    if (std::abs(number - whole) > 1e-6 || std::abs(whole) > 1e9) return text + " is not a whole number";
+    text = std::to_string(static_cast<long>(whole));
+    return "";
+}
+
+namespace {
+
+CLI::Validator numberOf(const std::string& unit) {
+    return CLI::Validator([unit](std::string& text) { return toWholeNumber(text, unit); }, "");
+}
+
+// 192 is a slip far more often than a wish.
+std::string isBitRate(const std::string& text) {
+    const long bitRate = std::strtol(text.c_str(), nullptr, 10);
+    if (bitRate >= 1000 && bitRate <= 100'000'000) return "";
+    if (bitRate > 0 && bitRate < 1000)
+        return text + " bits per second are too few; " + text + "k means " + text + "000";
+    return text + " is not between 1k and 100000k";
+}
+
+} // namespace
+
 void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& widths) {
-    command.add_option("--rate", options.rate, "Sample rate in Hz")
+    command.add_option("--rate", options.rate, "Sample rate, such as 48000 or 44.1k")
         ->option_text("HZ")
+        ->transform(numberOf("hz"))
         ->check(CLI::Range(1, 768000));
     command.add_option("--channels", options.channels, "Number of channels")
         ->option_text("N")
@@ -24,28 +58,27 @@ void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& 
                                          : "Bits per sample: 8, 16 or 24")
         ->option_text("N")
         ->check(CLI::IsMember(widths));
-    command
-        .add_option("--quality", options.quality,
-                    "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression")
-        ->option_text("Q")
-        ->check(CLI::Range(0.0, 1.0))
-        ->check(isNumber);
-    const CLI::Range bitRates(1, 100'000'000);
-    const auto units = CLI::AsNumberWithUnit(std::map<std::string, int>{{"k", 1000}},
-                                             CLI::AsNumberWithUnit::CASE_INSENSITIVE);
+    auto* quality =
+        command
+            .add_option("--quality", options.quality,
+                        "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression")
+            ->option_text("Q")
+            ->check(CLI::Range(0.0, 1.0))
+            ->check(isNumber);
     auto* bitRate = command.add_option("--bitrate", options.bitRate, "Bits per second, such as 192k")
                         ->option_text("N")
-                        ->transform(units)
-                        ->check(bitRates);
+                        ->transform(numberOf("bit/s"))
+                        ->check(isBitRate)
+                        ->excludes(quality);
     command.add_option("--min-bitrate", options.minBitRate, "Minimum bits per second")
         ->option_text("N")
-        ->transform(units)
-        ->check(bitRates)
+        ->transform(numberOf("bit/s"))
+        ->check(isBitRate)
         ->needs(bitRate);
     command.add_option("--max-bitrate", options.maxBitRate, "Maximum bits per second")
         ->option_text("N")
-        ->transform(units)
-        ->check(bitRates)
+        ->transform(numberOf("bit/s"))
+        ->check(isBitRate)
         ->needs(bitRate);
 }
 

@@ -20,6 +20,9 @@ std::string isNumber(const std::string& text);
 
 // The options of the output format. `widths` are the bits per sample to choose from.
 void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& widths);
+// "44100", "44.1k" or "44.1 kHz" as a whole number. Transforms the text, or returns why it is none.
+std::string toWholeNumber(std::string& text, const std::string& unit);
+
 // Throws CLI::ValidationError if the bit rates contradict each other.
 void checkBitRates(const SFormatOptions& options);
 

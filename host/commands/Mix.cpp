@@ -42,6 +42,7 @@ void mix(CLibrary& library, const SMixOptions& options, CProgress& progress, CPr
 } // namespace
 
 int mix(CLibrary& library, const SMixOptions& options) {
+    requireEffect(options, options.output);
     CProgress progress(options.show);
     const CProgress::Job job = progress.start(options.input, options.output, nlohmann::json::object());
     try {

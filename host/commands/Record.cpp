@@ -191,6 +191,7 @@ std::string toReason(const std::string& message, const fs::path& output) {
 } // namespace
 
 int record(CLibrary& library, const SRecordOptions& options) {
+    requireEffect(options, options.output);
     const CHandle device = openInDevice(options.device);
     CLiveLine line(options.show, "output");
     line.start(options.output, nlohmann::json::object());

@@ -1,0 +1,38 @@
+#include "media/FormatOptions.h"
+
+#include "base/Text.h"
+#include "library/Failure.h"
+#include "media/SoundFile.h"
+
+#include <tonewright/host.h>
+
+namespace host {
+
+void requireEffect(const SFormatOptions& options, const std::filesystem::path& target) {
+    const struct {
+        bool isSet;
+        uint32_t setting;
+        const char* option;
+        const char* reason;
+    } checks[] = {
+        {options.quality.has_value(), TONEWRIGHT_SETTING_QUALITY, "--quality",
+         "their samples are stored as they are"},
+        {options.bitRate > 0, TONEWRIGHT_SETTING_BIT_RATE, "--bitrate", "their size follows from the sound"},
+        {options.bits.has_value(), TONEWRIGHT_SETTING_WIDTH, "--bits",
+         "the codec has no fixed number of bits per sample"},
+    };
+    bool hasWork = false;
+    for (const auto& check : checks) hasWork = hasWork || check.isSet;
+    if (!hasWork) return;
+    TONEWRIGHT_Capabilities capabilities = {};
+    capabilities.size = sizeof capabilities;
+    const bool isKnown = TONEWRIGHT_Host_GetCapabilities(toURI(target).c_str(), &capabilities) == 1;
+    clearFailure();
+    if (!isKnown) return;
+    for (const auto& check : checks)
+        if (check.isSet && !(capabilities.settings & check.setting))
+            throw CUsageError(std::string(check.option) + " has no effect on " + describeKind(target) + ": " +
+                              check.reason);
+}
+
+} // namespace host
