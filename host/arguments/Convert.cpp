@@ -1,11 +1,118 @@
 #include "commands/Convert.h"
 #include "arguments/Arguments.h"
+#include "arguments/Presets.h"
+#include "media/InputContent.h"
 
 #include <algorithm>
 #include <memory>
+#include <stdexcept>
 #include <thread>
+#include <unistd.h>
+#include <utility>
 
 namespace host {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+CNamePattern parsePattern(const std::string& text) {
+    try {
+        return CNamePattern(text);
+    } catch (const std::invalid_argument& error) {
+        throw CLI::ValidationError("--name", error.what());
+    }
+}
+
+void addFiles(CLI::App& command, SConvertOptions& options) {
+    command.add_option("IN", options.inputs, "Files to convert, folders with -r, or - for standard input")
+        ->required()
+        ->option_text("...");
+    command.add_flag("-r,--recursive", options.recursive,
+                     "Convert the files in and below folders; hidden ones are left out");
+    command
+        .add_option("-o,--output", options.output,
+                    "File to write; its extension selects the format. With --to: a folder,\n"
+                    "which exists or ends in /, or - for standard output")
+        ->option_text("FILE");
+    command
+        .add_option("--to", options.extension,
+                    "Extension of the files to write, such as flac; beside the inputs by default")
+        ->option_text("EXT");
+    command
+        .add_option("--directory", options.directory, "Folder for the files of --to; it is created if needed")
+        ->option_text("FOLDER")
+        ->excludes("--output");
+    command
+        .add_option_function<std::string>(
+            "--name", [&](const std::string& text) { options.names = parsePattern(text); },
+            "Names of the files of --to from tags, such as '%artist%/%track% %title%';\n"
+            "folders are created, and the folders of the inputs are not kept. Fields:\n" +
+                CNamePattern::describeFields())
+        ->option_text("PATTERN");
+}
+
+void addExisting(CLI::App& command, SConvertOptions& options) {
+    auto* force = command.add_flag_callback(
+        "-f,--force", [&] { options.existing = EExisting::replace; }, "Replace existing files");
+    command
+        .add_flag_callback(
+            "--skip", [&] { options.existing = EExisting::skip; }, "Leave existing files as they are")
+        ->excludes(force);
+    command.add_flag("-n,--dry-run", options.dryRun,
+                     "Print what would be written where, and every problem; write nothing");
+}
+
+void addCare(CLI::App& command, SConvertOptions& options) {
+    command.add_flag("--salvage", options.salvage,
+                     "Replace damaged parts of the input with silence instead of failing");
+    command.add_flag_callback(
+        "--no-tags", [&] { options.carryTags = false; },
+        "Do not copy title, artist and the other fields of tags");
+    command.add_flag("--times", options.carryTimes, "Give each output the modification time of its input");
+}
+
+// The parts of `output` that depend on --to.
+void placeOutput(SConvertOptions& options) {
+    const bool isFolder = options.output.native().ends_with('/');
+    std::error_code none;
+    if (options.output.empty() && options.extension.empty())
+        throw CLI::RequiredError("Either --output or --to");
+    // A preset may set --to, so this is not checked by the parser.
+    if (options.extension.empty() && (!options.directory.empty() || options.names))
+        throw CLI::RequiredError("--to");
+    if (options.extension == "." || options.extension.find('/') != std::string::npos)
+        throw CLI::ValidationError("--to", "takes an extension, such as flac");
+    if (isStandardStream(options.output)) {
+        if (options.extension.empty())
+            throw CLI::ValidationError("--output", "- needs --to, which selects the format");
+        if (options.show == EOutput::json)
+            throw CLI::ValidationError("--json", "cannot share standard output with the sound");
+        if (!options.dryRun && ::isatty(STDOUT_FILENO))
+            throw CLI::ValidationError("--output", "standard output is a terminal");
+    } else if (!options.output.empty() && options.extension.empty()) {
+        if (isFolder) throw CLI::ValidationError("--output", "names a folder, which needs --to");
+    } else if (!options.output.empty()) {
+        if (!isFolder && !fs::is_directory(options.output, none))
+            throw CLI::ValidationError("--output",
+                                       "with --to takes an existing folder, a name that ends in /, or -");
+        options.directory = std::exchange(options.output, fs::path());
+    }
+    if (!options.output.empty() && options.names)
+        throw CLI::ValidationError("--name", "names the files of --to, not a single output");
+    if (!options.output.empty() && (options.inputs.size() != 1 || options.recursive))
+        throw CLI::ValidationError("--output", "takes one input; use --to for several");
+}
+
+void checkStandardInput(const SConvertOptions& options) {
+    if (std::none_of(options.inputs.begin(), options.inputs.end(), isStandardStream)) return;
+    if (options.inputs.size() > 1 || options.output.empty())
+        throw CLI::ValidationError("-", "standard input is the only input and needs --output");
+    if (!options.dryRun && ::isatty(STDIN_FILENO))
+        throw CLI::ValidationError("-", "standard input is a terminal");
+}
+
+} // namespace
 
 void addConvert(CLI::App& app, Run& run) {
     const auto options = std::make_shared<SConvertOptions>();
@@ -14,47 +121,27 @@ void addConvert(CLI::App& app, Run& run) {
         "Convert sound files. Sample rate, channels and bits per sample stay those of the input unless\n"
         "options change them or the target cannot hold them. Existing files are replaced only with\n"
         "--force. A file that fails is reported and the next one is converted.");
-    command->add_option("IN", options->inputs, "Files to convert")->required()->option_text("...");
-    auto* output = command
-                       ->add_option("-o,--output", options->output,
-                                    "File to write; its extension selects the format (one input only)")
-                       ->option_text("FILE");
-    auto* to = command
-                   ->add_option("--to", options->extension,
-                                "Extension of the files to write, such as flac, beside the inputs")
-                   ->option_text("EXT");
-    output->excludes(to);
-    command
-        ->add_option("--directory", options->directory,
-                     "Folder for the files of --to; it is created if needed")
-        ->option_text("FOLDER")
-        ->needs(to);
+    addFiles(*command, *options);
+    addPresets(*command);
     addFormat(*command, *options, {8, 16, 24, 32});
+    command
+        ->add_option("--resampler", options->resampler,
+                     "default, or best: a steeper filter for changes of the sample rate")
+        ->option_text("NAME")
+        ->check(CLI::IsMember({"default", "best"}).description(""));
+    addExisting(*command, *options);
+    addCare(*command, *options);
     options->jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
     command
         ->add_option("-j,--jobs", options->jobs,
                      "Files converted at a time (default: number of processor cores)")
         ->option_text("N")
         ->check(CLI::Range(1, 256));
-    command->add_flag("-f,--force", options->force, "Replace existing files");
-    command
-        ->add_option("--resampler", options->resampler,
-                     "default, or best: a steeper filter for changes of the sample rate")
-        ->option_text("NAME")
-        ->check(CLI::IsMember({"default", "best"}).description(""));
-    command->add_flag("--salvage", options->salvage,
-                      "Replace damaged parts of the input with silence instead of failing");
-    command->add_flag_callback(
-        "--no-tags", [options] { options->carryTags = false; },
-        "Do not copy title, artist and the other fields of tags");
     addOutput(*command, options->show);
-    command->callback([options, &run] {
-        if (options->output.empty() == options->extension.empty())
-            throw CLI::RequiredError("Either --output or --to");
-        if (!options->output.empty() && options->inputs.size() != 1)
-            throw CLI::ValidationError("--output", "takes one input; use --to for several");
-        if (options->extension == "." || options->extension.find('/') != std::string::npos)
-            throw CLI::ValidationError("--to", "takes an extension, such as flac");
+    command->callback([options, command, &run] {
+        applyPreset(*command);
+        placeOutput(*options);
+        checkStandardInput(*options);
         checkBitRates(*options);
         run = [options](CLibrary& library) { return convert(library, *options); };
     });

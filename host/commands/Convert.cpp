@@ -2,17 +2,23 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "commands/ConversionPlan.h"
 #include "library/Failure.h"
 #include "media/EncodeJob.h"
+#include "media/InputContent.h"
 #include "media/Output.h"
 #include "media/SoundFile.h"
 
 #include <algorithm>
 #include <atomic>
+#include <cerrno>
 #include <cstdlib>
-#include <set>
+#include <cstring>
+#include <fcntl.h>
+#include <optional>
 #include <sstream>
 #include <stdexcept>
+#include <sys/stat.h>
 #include <system_error>
 #include <thread>
 
@@ -22,14 +28,26 @@ namespace fs = std::filesystem;
 
 namespace {
 
+// Of reading and of modification.
+void copyTimes(const fs::path& from, const fs::path& to) {
+    struct stat status;
+    if (::stat(from.c_str(), &status) != 0) return;
+    const struct timespec times[] = {status.st_atim, status.st_mtim};
+    if (::utimensat(AT_FDCWD, to.c_str(), times, 0) != 0)
+        throw std::runtime_error(std::string("The times of the input cannot be copied: ") +
+                                 std::strerror(errno));
+}
+
 class CConverter {
 public:
     CConverter(CLibrary& library, const SConvertOptions& options, CProgress& progress)
         : m_library(library), m_options(options), m_progress(progress),
           m_temporaryEnding(setTemporaryEnding(library)) {}
 
-    // True if the file was written. Thread-safe.
-    bool run(const fs::path& input, const fs::path& output);
+    // True if the file was written or may be skipped. Thread-safe.
+    bool run(const SConversion& conversion);
+    // Prints what run() would do; creates nothing.
+    bool show(const SConversion& conversion);
 
 private:
     struct SEnds {
@@ -37,7 +55,8 @@ private:
         CHandle format;
     };
 
-    void convert(const fs::path& input, const fs::path& output, CProgress::Job job);
+    bool convert(const SConversion& conversion, CProgress::Job job);
+    bool isSkipped(const SConversion& conversion) const;
     void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
                   CProgress::Job job);
     void warn(const CHandle& source, const fs::path& input, CProgress::Job job);
@@ -126,30 +145,64 @@ void CConverter::warn(const CHandle& source, const fs::path& input, CProgress::J
     for (std::string line; std::getline(text, line);) m_progress.warn(job, asReason(withPaths(line), input));
 }
 
-void CConverter::convert(const fs::path& input, const fs::path& output, CProgress::Job job) {
-    const auto started = std::chrono::steady_clock::now();
-    checkInput(input);
-    if (isSameFile(input, output)) throw std::runtime_error("Input and output are the same file");
-    COutput place(output, m_temporaryEnding, m_options.force);
-
-    SEnds ends = openEnds(input, place.getTemporary(), output);
-    const double duration = m_library.AudioSource_GetDuration(ends.source.get());
-    const bool done = encode(m_library, ends.source, ends.format, m_progress, job,
-                             {input, place.getTemporary(), output}, m_temporaryEnding);
-    warn(ends.source, input, job);
-    ends = {};
-    if (!done) return m_progress.cancel(job);
-    if (m_options.carryTags) carryTag(input, place.getTemporary(), output, job);
-    const uint64_t bytes = fs::file_size(place.getTemporary());
-    place.commit();
-    const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
-    m_progress.finish(job, {duration, elapsed.count(), bytes, codecName(output)});
+bool CConverter::isSkipped(const SConversion& conversion) const {
+    std::error_code none;
+    return m_options.existing == EExisting::skip && conversion.problem.empty() &&
+           !isStandardStream(conversion.output) && fs::is_regular_file(conversion.output, none);
 }
 
-bool CConverter::run(const fs::path& input, const fs::path& output) {
-    const CProgress::Job job = m_progress.start(input, output, nlohmann::json::object());
+// False if it did not end with a result, without a reason to report.
+bool CConverter::convert(const SConversion& conversion, CProgress::Job job) {
+    const auto started = std::chrono::steady_clock::now();
+    if (!conversion.problem.empty()) throw std::runtime_error(conversion.problem);
+    const CInputContent content(conversion.input);
+    if (isCancelled()) return false;
+    const fs::path& input = content.getPath();
+
+    std::optional<CPrivateFolder> spool;
+    fs::path target = conversion.output;
+    if (isStandardStream(target)) {
+        spool.emplace();
+        target = spool->getPath() / "output";
+        target.replace_extension(m_options.extension);
+    } else if (createsFolders(m_options) && target.has_parent_path()) {
+        std::error_code error;
+        fs::create_directories(target.parent_path(), error);
+        if (error)
+            throw std::runtime_error("The folder " + target.parent_path().string() +
+                                     " cannot be created: " + error.message());
+    }
+    COutput place(target, m_temporaryEnding, m_options.existing == EExisting::replace);
+    const fs::path& temporary = place.getTemporary();
+    const fs::path& output = conversion.output;
+
+    SEnds ends = openEnds(input, temporary, output);
+    const double duration = m_library.AudioSource_GetDuration(ends.source.get());
+    const bool done = encode(m_library, ends.source, ends.format, m_progress, job, {input, temporary, output},
+                             m_temporaryEnding);
+    warn(ends.source, input, job);
+    ends = {};
+    if (!done) return false;
+    if (m_options.carryTags) carryTag(input, temporary, output, job);
+    const uint64_t bytes = fs::file_size(temporary);
+    if (m_options.carryTimes && !isStandardStream(conversion.input)) copyTimes(conversion.input, temporary);
+    place.commit();
+    if (spool && !copyToStandardOutput(target)) return false;
+    const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
+    m_progress.finish(job, {duration, elapsed.count(), bytes, codecName(target)});
+    return true;
+}
+
+bool CConverter::run(const SConversion& conversion) {
+    const CProgress::Job job =
+        m_progress.start(conversion.input, conversion.output, nlohmann::json::object());
     try {
-        convert(input, output, job);
+        if (isSkipped(conversion)) {
+            m_progress.skip(job);
+        } else if (!convert(conversion, job)) {
+            m_progress.cancel(job);
+            return false;
+        }
         return !isCancelled();
     } catch (const std::exception& error) {
         m_progress.fail(job, error.what());
@@ -157,45 +210,46 @@ bool CConverter::run(const fs::path& input, const fs::path& output) {
     }
 }
 
-fs::path chooseOutput(const SConvertOptions& options, const fs::path& input) {
-    if (!options.output.empty()) return options.output;
-    fs::path name = input.filename();
-    name.replace_extension(options.extension);
-    return (options.directory.empty() ? input.parent_path() : options.directory) / name;
+bool CConverter::show(const SConversion& conversion) {
+    const CProgress::Job job =
+        m_progress.start(conversion.input, conversion.output, nlohmann::json::object());
+    try {
+        if (isSkipped(conversion)) {
+            m_progress.skip(job);
+            return true;
+        }
+        if (const std::string problem = findProblem(conversion, m_options); !problem.empty())
+            throw std::runtime_error(problem);
+        std::error_code none;
+        m_progress.plan(job, !isStandardStream(conversion.output) && fs::exists(conversion.output, none));
+        return true;
+    } catch (const std::exception& error) {
+        m_progress.fail(job, error.what());
+        return false;
+    }
 }
 
 } // namespace
 
 int convert(CLibrary& library, const SConvertOptions& options) {
-    if (!options.directory.empty()) fs::create_directories(options.directory);
+    fs::path target = "output";
+    target.replace_extension(options.extension);
+    requireEffect(options, options.extension.empty() ? options.output : target);
     // Read whenever a conversion starts; no other thread runs yet.
     if (!options.resampler.empty()) ::setenv("TONEWRIGHT_RESAMPLER", options.resampler.c_str(), 1);
-    CProgress progress(options.show);
+    const std::vector<SConversion> plan = planConversions(library, options);
+    CProgress progress(options.show, isStandardStream(options.output) ? stderr : stdout);
     CConverter converter(library, options, progress);
 
     std::atomic<size_t> next{0};
     std::atomic<bool> failed{false};
-    // If several inputs have the same target, the first one gets it, whatever the order of the threads.
-    std::vector<fs::path> outputs;
-    std::vector<bool> isFirst;
-    std::set<fs::path> taken;
-    for (const fs::path& input : options.inputs) {
-        outputs.push_back(chooseOutput(options, input));
-        isFirst.push_back(taken.insert(fs::absolute(outputs.back()).lexically_normal()).second);
-    }
     const auto work = [&] {
-        for (size_t i; !isCancelled() && (i = next++) < options.inputs.size();) {
-            if (!isFirst[i]) {
-                progress.fail(progress.start(options.inputs[i], outputs[i], nlohmann::json::object()),
-                              "Another input is already converted to " + outputs[i].string());
-                failed = true;
-            } else if (!converter.run(options.inputs[i], outputs[i])) {
-                failed = true;
-            }
-        }
+        for (size_t i; !isCancelled() && (i = next++) < plan.size();)
+            if (!(options.dryRun ? converter.show(plan[i]) : converter.run(plan[i]))) failed = true;
     };
     std::vector<std::thread> others;
-    const size_t threads = std::min<size_t>(static_cast<size_t>(options.jobs), options.inputs.size());
+    const size_t threads =
+        options.dryRun ? 1 : std::min<size_t>(static_cast<size_t>(options.jobs), plan.size());
     try {
         for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
     } catch (const std::system_error&) {

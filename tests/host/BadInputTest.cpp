@@ -2,6 +2,9 @@
 
 #include <sys/stat.h>
 #include <sys/statvfs.h>
+#include <sys/wait.h>
+
+#include <thread>
 
 using namespace tests;
 
@@ -216,4 +219,32 @@ TEST_F(BadOutput, BelongsToTheFirstOfTwoInputs) {
     EXPECT_EQ(std::count(message.begin(), message.end(), '\n'), 2) << message;
     EXPECT_NE(message.find("tonewright: b/x.wav: "), std::string::npos) << message;
     EXPECT_EQ(readWav("out/x.wav").rate, 44100);
+}
+
+// Stopped in the middle, so that the other program is certainly the first.
+TEST_F(BadOutput, IsNotReplacedIfItAppearsMeanwhile) {
+    constexpr uint32_t kBytes = 600 * 176400;
+    folder.write("in.wav", makeWavHeader({}, kBytes));
+    std::filesystem::resize_file(folder / "in.wav", 44 + uint64_t{kBytes});
+    bool isStopped = false;
+    for (int attempt = 0; attempt < 20 && !isStopped; ++attempt) {
+        CProcess process({kProgram, "convert", "in.wav", "-o", "out.flac", "--skip"}, folder.path(),
+                         programEnvironment());
+        while (process.isRunning() && list().size() < 2) std::this_thread::yield();
+        process.signal(SIGSTOP);
+        siginfo_t state = {};
+        ::waitid(P_PID, static_cast<id_t>(process.getId()), &state, WSTOPPED | WEXITED | WNOWAIT);
+        isStopped = state.si_code == CLD_STOPPED && !std::filesystem::exists(folder / "out.flac");
+        folder.write("out.flac", "precious");
+        process.signal(SIGCONT);
+        const SProcessResult result = process.wait();
+        if (isStopped) {
+            EXPECT_EQ(result.exitCode, 1);
+            expectMessage(result.err, {"out.flac was created in the meantime"});
+            EXPECT_EQ(readFile(folder / "out.flac"), "precious");
+        }
+        std::filesystem::remove(folder / "out.flac");
+        EXPECT_EQ(list(), std::set<std::string>{"in.wav"});
+    }
+    EXPECT_TRUE(isStopped) << "the conversion always ended before";
 }

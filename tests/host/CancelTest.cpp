@@ -1,5 +1,7 @@
 #include "host/Program.h"
 
+#include <sys/stat.h>
+
 #include <chrono>
 #include <thread>
 
@@ -33,19 +35,23 @@ protected:
 
 } // namespace
 
+// To its end the conversion would take minutes.
 TEST_F(Cancel, LeavesEverythingAsItWas) {
-    folder.write("out.flac", "precious");
+    folder.write("out.mp3", "precious");
     for (int signal : {SIGINT, SIGTERM, SIGHUP}) {
         SCOPED_TRACE(signal);
-        CProcess process({kProgram, "convert", "long.wav", "-f", "-o", "out.flac"}, folder.path(),
-                         programEnvironment());
+        CProcess process({kProgram, "convert", "long.wav", "-f", "-o", "out.mp3", "--rate", "48000",
+                          "--resampler", "best"},
+                         folder.path(), programEnvironment());
         ASSERT_TRUE(waitFor([&] { return countTemporary() == 1; }));
+        const auto start = std::chrono::steady_clock::now();
         process.signal(signal);
         const SProcessResult result = process.wait();
+        EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(30));
         EXPECT_EQ(result.exitCode, 130) << result.err;
         EXPECT_EQ(result.err, "");
-        EXPECT_EQ(list(), (std::set<std::string>{"long.wav", "out.flac"}));
-        EXPECT_EQ(readFile(folder / "out.flac"), "precious");
+        EXPECT_EQ(list(), (std::set<std::string>{"long.wav", "out.mp3"}));
+        EXPECT_EQ(readFile(folder / "out.mp3"), "precious");
     }
 }
 
@@ -93,4 +99,32 @@ TEST_F(Cancel, DoesNotComeFromAReaderThatLeft) {
                                       folder.path(), programEnvironment());
     EXPECT_EQ(result.out, "0\n") << result.err;
     peer({"flac", "-t", "-s", "out.flac"});
+}
+
+// A stream that does not end is left, and so is one that nobody reads.
+TEST_F(Cancel, EndsWaitingForOtherPrograms) {
+    write("in.wav", makeNoise(44100, 2, 16, 500000));
+    ASSERT_EQ(::mkfifo((folder / "pipe").c_str(), 0600), 0);
+    auto environment = programEnvironment();
+    environment.emplace_back("TMPDIR", folder.path().string());
+    const auto before = list();
+    const auto isSpooling = [&] {
+        for (const std::string& name : list())
+            if (name.starts_with("tonewright-") && !name.ends_with('/') &&
+                name.find(".part") == std::string::npos)
+                return true;
+        return false;
+    };
+    for (const char* arguments : {"- -o out.wav <&3", "in.wav -o - --to wav >&3"}) {
+        SCOPED_TRACE(arguments);
+        CProcess process(
+            {"bash", "-c", std::string("exec 3<>pipe; exec \"$0\" convert ") + arguments, kProgram},
+            folder.path(), environment);
+        ASSERT_TRUE(waitFor(isSpooling));
+        process.signal(SIGTERM);
+        EXPECT_TRUE(waitFor([&] { return !process.isRunning(); }));
+        process.signal(SIGKILL);
+        EXPECT_EQ(process.wait().exitCode, 130);
+        EXPECT_EQ(list(), before);
+    }
 }

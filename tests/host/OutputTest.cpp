@@ -10,11 +10,12 @@ namespace {
 
 class Output : public CProgramTest {
 protected:
-    // Runs the program on a terminal and returns everything shown.
-    std::string onTerminal(const std::string& arguments) {
+    // Runs the program on a terminal of that width and returns everything shown.
+    std::string onTerminal(const std::string& arguments, int columns = 80) {
         const SProcessResult result =
-            run({"script", "-qec", std::string(kProgram) + " " + arguments, "/dev/null"}, folder.path(),
-                programEnvironment());
+            run({"script", "-qec", "stty cols " + std::to_string(columns) + "; " + kProgram + " " + arguments,
+                 "/dev/null"},
+                folder.path(), programEnvironment());
         EXPECT_EQ(result.exitCode, 0) << result.out;
         return result.out;
     }
@@ -108,6 +109,39 @@ TEST_F(Output, HasABarOnATerminalOnly) {
     EXPECT_EQ(onTerminal("convert --json a.wav -o json.flac").find('\x1b'), std::string::npos);
 }
 
+TEST_F(Output, HasABarThatFitsTheTerminal) {
+    const std::string name =
+        "\xe9\x9f\xb3\xe9\x9f\xb3\xe9\x9f\xb3 and a very long name.wav"; // wide characters
+    folder.write(name, makeWavHeader({}, 300 * 176400));
+    std::filesystem::resize_file(folder / name, 44 + 300 * 176400);
+    for (const int columns : {5, 20, 40, 60, 0}) { // 0: the width is unknown
+        std::string shown = onTerminal("convert '" + name + "' -f -o a.flac", columns);
+        shown.resize(shown.find("a.flac: FLAC"));
+        for (size_t at; (at = shown.find('\x1b')) != std::string::npos;)
+            shown.erase(at, shown.find_first_of("AK", at) + 1 - at);
+        std::istringstream lines(shown);
+        size_t count = 0;
+        for (std::string line; std::getline(lines, line); ++count) {
+            line.erase(line.find_last_not_of('\r') + 1);
+            size_t wide = 0, more = 0;
+            for (const char byte : line) wide += byte == '\xe9', more += (byte & 0xC0) == 0x80;
+            EXPECT_LT(line.size() - more + wide, static_cast<size_t>(columns > 0 ? columns : 80)) << line;
+            EXPECT_NE(line.find('%'), std::string::npos) << line;
+        }
+        EXPECT_GT(count, 0u) << columns;
+    }
+}
+
+TEST_F(Output, TakesOptionsOfTheProgramAnywhere) {
+    write("a.wav", makeTone(8000, 1, 16, 0.1));
+    const SProcessResult loud = tonewright({"convert", "a.wav", "-o", "b.flac", "--log-level", "debug"});
+    EXPECT_EQ(loud.exitCode, 0);
+    EXPECT_NE(loud.err, "");
+    const SProcessResult unknown = tonewright({"convert", "a.wav", "-o", "c.flac", "--loglevel", "debug"});
+    EXPECT_EQ(unknown.exitCode, 2);
+    EXPECT_NE(unknown.err.find("--loglevel"), std::string::npos) << unknown.err;
+}
+
 TEST_F(Output, TellsWhatFilesHold) {
     const std::map<std::string, SSound> sounds = {{"a.wav", makeTone(96000, 6, 24, 0.5)},
                                                   {"b.flac", makeTone(44100, 1, 16, 1.5)},
@@ -189,6 +223,15 @@ TEST_F(Output, RefusesWrongArguments) {
              {"convert", "a.wav", "-o", "b.flac", "-j", "0"},
              {"convert", "a.wav", "--to", "fl/ac"},
              {"convert", "a.wav", "-o", "b.flac", "--directory", "."},
+             {"convert", "a.wav", "-o", "new/"},
+             {"convert", "-r", ".", "-o", "b.flac"},
+             {"convert", "a.wav", "--to", "flac", "--skip", "--force"},
+             {"convert", "a.wav", "-o", "b.flac", "--name", "%title%"},
+             {"convert", "a.wav", "--to", "flac", "--name", "%titel%"},
+             {"convert", "a.wav", "-o", "b.flac", "--rate", "44.1234k"},
+             {"convert", "a.wav", "-o", "b.flac", "--rate", "44.1M"},
+             {"convert", "a.wav", "-o", "b.mp3", "--bitrate", "192"},
+             {"convert", "a.wav", "-o", "b.mp3", "--bitrate", "192k", "--quality", "0.5"},
              {"convert", "a.wav", "-o", "b.flac", "-q", "--json"},
              {"convert", "a.wav", "-o", ""},
              {"info"},

@@ -1,0 +1,87 @@
+#include "host/Program.h"
+
+using namespace tests;
+
+namespace {
+
+class Stream : public CProgramTest {
+protected:
+    void SetUp() override { std::filesystem::create_directory(folder / "tmp"); }
+    // Whatever happens, no temporary file remains.
+    void TearDown() override { EXPECT_TRUE(std::filesystem::is_empty(folder / "tmp")); }
+    // A command for bash, in which "$0" is the program.
+    SProcessResult shell(const std::string& command) {
+        auto environment = programEnvironment();
+        environment.emplace_back("TMPDIR", (folder / "tmp").string());
+        return run({"timeout", "-s", "KILL", "60", "bash", "-c", "set -o pipefail; " + command, kProgram},
+                   folder.path(), environment);
+    }
+};
+
+} // namespace
+
+TEST_F(Stream, KeepsEverySampleBetweenPeers) {
+    const SSound sound = makeNoise(44100, 2, 16, 30011);
+    write("in.wav", sound);
+    for (const char* source : {"cat in.wav", "flac -c -s in.wav", "sox in.wav -t aiff -",
+                               "sox in.wav -t au -", "ffmpeg -v error -i in.wav -f wav -"})
+        for (const char* way : {" | \"$0\" convert - -o - --to wav > out.wav",
+                                " | \"$0\" convert - -o - --to .flac | flac -d -s -f -o out.wav -",
+                                " | \"$0\" convert - -f -o out.wav > said"}) {
+            const SProcessResult result = shell(std::string(source) + way);
+            EXPECT_EQ(result.exitCode, 0) << source << way << result.err;
+            EXPECT_TRUE(readWav("out.wav") == sound) << source << way;
+        }
+    EXPECT_EQ(readFile(folder / "said").find("out.wav: WAV, "), 0u);
+    for (const char* codec : {"ogg", "mp3"}) { // an MP3 with a tag in front
+        const SProcessResult result = shell(std::string("ffmpeg -v error -i in.wav -metadata title=x -f ") +
+                                            codec + " - | \"$0\" convert - -o - --to wav > out.wav");
+        EXPECT_EQ(result.exitCode, 0) << result.err;
+        EXPECT_NEAR(readWav("out.wav").seconds(), sound.seconds(), 0.06) << codec;
+    }
+}
+
+TEST_F(Stream, CarriesNothingButTheSound) {
+    write("in.wav", makeTone(8000, 1, 16, 0.2));
+    const SProcessResult result = shell("\"$0\" convert in.wav -o - --to flac --rate 44.1k | flac -t -s -");
+    EXPECT_EQ(result.exitCode, 0);
+    EXPECT_EQ(result.err.find("-: FLAC, 0:00.2, "), 0u) << result.err;
+    // Also without an extension
+    std::filesystem::rename(folder / "in.wav", folder / "song");
+    EXPECT_EQ(shell("\"$0\" convert song -q -o song.flac && flac -t -s song.flac").err, "");
+}
+
+TEST_F(Stream, EndsWithItsReader) {
+    write("in.wav", makeNoise(44100, 2, 16, 500000));
+    const SProcessResult result =
+        shell("\"$0\" convert -q in.wav -o - --to wav | head -c 1000 > start; echo ${PIPESTATUS[0]}");
+    EXPECT_EQ(result.out + result.err, "1\n");
+    EXPECT_EQ(shell("\"$0\" convert -q in.wav -o - --to wav > /dev/full").err,
+              "tonewright: in.wav: Standard output cannot be written: No space left on device\n");
+}
+
+TEST_F(Stream, IsRefusedWhereItMakesNoSense) {
+    write("in.wav", makeTone(8000, 1, 16, 0.2));
+    static const struct {
+        const char* command;
+        int code;
+        const char* reason;
+    } kCases[] = {
+        {"\"$0\" convert in.wav -o -", 2, "--to"},
+        {"\"$0\" convert in.wav -o - --to wav --json", 2, "--json"},
+        {"\"$0\" convert - in.wav -o - --to wav < in.wav", 2, "one input"},
+        {"\"$0\" convert - --to wav < in.wav", 2, "--output"},
+        {"script -qec \"'$0' convert in.wav -o - --to wav\" /dev/null", 2, "terminal"},
+        {"\"$0\" convert - -o out.wav < /dev/null", 1, "The file is empty"},
+        {"echo text without sound | \"$0\" convert - -o out.wav", 1, "-: The format is unknown"},
+        {"\"$0\" convert - -o - --to xyz < in.wav", 1, "No plug-in writes .xyz files"},
+        {"TMPDIR=/missing \"$0\" convert - -o out.wav < in.wav", 1, "/missing: No such file"},
+    };
+    for (const auto& each : kCases) {
+        const SProcessResult result = shell(each.command);
+        EXPECT_EQ(result.exitCode, each.code) << each.command;
+        EXPECT_NE((result.out + result.err).find(each.reason), std::string::npos)
+            << each.command << ": " << result.out << result.err;
+        EXPECT_EQ(list(), (std::set<std::string>{"in.wav", "tmp/"})) << each.command;
+    }
+}
