@@ -24,6 +24,12 @@ std::string_view toView(const TagLib::ByteVector& bytes) {
     return {bytes.data(), bytes.size()};
 }
 
+[[noreturn]] void failToRead(const P<IURI>& file) {
+    throw CFileError(localize("filetag.CTagLibIOStream.ReadError", "The file '%FILE%' could not be read.",
+                              {{"%FILE%", getShownName(file)}}),
+                     file);
+}
+
 } // namespace
 
 CTagLibIOStream::CTagLibIOStream(const P<IURI>& file, posix::EAccess access)
@@ -38,7 +44,13 @@ TagLib::FileName CTagLibIOStream::name() const {
 }
 
 TagLib::ByteVector CTagLibIOStream::readBlock(unsigned long length) {
-    if (!m_pieces) return m_file.readBlock(length);
+    if (!m_pieces) {
+        const int64_t end = std::max<int64_t>(m_oldSize - m_file.tell(), 0);
+        const TagLib::ByteVector bytes = m_file.readBlock(length);
+        // TagLib would take this for the end of the file, and a store would lose the rest of the tag.
+        if (bytes.size() < std::min<uint64_t>(length, static_cast<uint64_t>(end))) failToRead(m_uri);
+        return bytes;
+    }
     const int64_t left = std::max<int64_t>(m_pieces->getSize() - m_position, 0);
     const int64_t end =
         m_position + (length < static_cast<unsigned long>(left) ? static_cast<int64_t>(length) : left);
@@ -105,10 +117,7 @@ CPieceTable& CTagLibIOStream::change() {
 std::string CTagLibIOStream::readOld(int64_t offset, int64_t size) {
     m_file.seek(offset, Beginning);
     const TagLib::ByteVector bytes = m_file.readBlock(static_cast<unsigned long>(size));
-    if (bytes.size() != static_cast<uint64_t>(size))
-        throw CFileError(localize("filetag.CTagLibIOStream.ReadError", "The file '%FILE%' could not be read.",
-                                  {{"%FILE%", getShownName(m_uri)}}),
-                         m_uri);
+    if (bytes.size() != static_cast<uint64_t>(size)) failToRead(m_uri);
     return std::string(bytes.data(), bytes.size());
 }
 
