@@ -51,6 +51,7 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     sonora2/media/IDiscardable.h
     sonora2/media/IFloatSamples.h
     sonora2/media/IFormat.h
+    sonora2/media/IFormatSettings.h
     sonora2/media/IMediaDescription.h
     sonora2/media/ISalvage.h
     sonora2/media/ISource.h

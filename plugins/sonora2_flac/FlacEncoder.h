@@ -18,6 +18,9 @@ public:
     ~CFlacEncoder() override;
 
     bool accepts(const SPcmFormat& format) const override;
+    uint32_t getUsedSettings() const override {
+        return common::IFormatSettings::kQuality | common::IFormatSettings::kSampleWidth;
+    }
     void open(COutputFile& file, const SEncoderSettings& settings) override;
     void write(const uint8_t* pcm, int frames) override;
     void finish() override;

@@ -15,6 +15,9 @@ public:
     ~CVorbisEncoder() override;
 
     bool accepts(const SPcmFormat& format) const override;
+    uint32_t getUsedSettings() const override {
+        return common::IFormatSettings::kQuality | common::IFormatSettings::kBitRate;
+    }
     void open(COutputFile& file, const SEncoderSettings& settings) override;
     void write(const uint8_t* pcm, int frames) override;
     void finish() override;

@@ -14,6 +14,7 @@ public:
     explicit CSndfileEncoder(const std::string& extension);
 
     bool accepts(const SPcmFormat& format) const override;
+    uint32_t getUsedSettings() const override { return common::IFormatSettings::kSampleWidth; }
     void open(COutputFile& file, const SEncoderSettings& settings) override;
     void write(const uint8_t* pcm, int frames) override;
     void update() override;

@@ -10,6 +10,7 @@ namespace sonora2::plugins::wav {
 class CWavEncoder : public IEncoder {
 public:
     bool accepts(const SPcmFormat& format) const override;
+    uint32_t getUsedSettings() const override { return common::IFormatSettings::kSampleWidth; }
     void open(COutputFile& file, const SEncoderSettings& settings) override;
     void write(const uint8_t* pcm, int frames) override;
     void update() override;

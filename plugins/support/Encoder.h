@@ -1,6 +1,7 @@
 // The interface that the author of a writing plug-in implements.
 #pragma once
 
+#include "sonora2/media/IFormatSettings.h"
 #include "support/MediaFile.h"
 #include "support/OutputFile.h"
 
@@ -25,6 +26,8 @@ public:
     // Whether the codec supports this format; called once before a format object is returned. May throw the
     // reason instead of returning false.
     virtual bool accepts(const SPcmFormat& format) const = 0;
+    // The settings that have an effect on the file: a combination of IFormatSettings::ESetting.
+    virtual uint32_t getUsedSettings() const { return common::IFormatSettings::kAllSettings; }
     // Throws if the settings are invalid; the target file has not been touched then.
     virtual void open(COutputFile& file, const SEncoderSettings& settings) = 0;
     virtual void write(const uint8_t* pcm, int frames) = 0;

@@ -19,7 +19,8 @@ namespace sonora2::plugins {
 class CEncoderFormat : public peru::CObject,
                        public common::IAudioFormat,
                        public common::IDiscardable,
-                       public common::IFloatSamples {
+                       public common::IFloatSamples,
+                       public common::IFormatSettings {
 public:
     // Created closed. `makeEncoder` returns a new encoder for each opening.
     using EncoderFactory = std::unique_ptr<IEncoder> (*)(const SMediaFile& file);
@@ -35,6 +36,7 @@ public:
     P<peru::IString> getPluginName() override { return m_pluginName; }
     int64_t getEstimatedSizeBytes(double fDuration) override;
 
+    uint32_t getUsedSettings() override { return m_estimator->getUsedSettings(); }
     int getSampleRate() override { return m_settings.format.rate; }
     int getChannelCount() override { return m_settings.format.channels; }
     int getBytesPerSample() override { return m_settings.format.bytesPerSample; }

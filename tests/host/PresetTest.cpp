@@ -66,6 +66,37 @@ TEST_F(Preset, SetsWhatTheUserDoesNot) {
     EXPECT_EQ(std::count(listed.begin(), listed.end(), '\n'), 7);
 }
 
+// Some of these would silently give another file than the user expects.
+TEST_F(Preset, AndOptionsAreRefusedWithoutEffect) {
+    static const struct {
+        const char* output;
+        std::vector<std::string> options;
+        const char* reason; // null if the options have an effect
+    } kCases[] = {
+        {"out.wav", {"--quality", "0.5"}, "--quality has no effect on .wav files"},
+        {"out.aiff", {"--quality", "0.5"}, "--quality has no effect on .aiff files"},
+        {"out.wav", {"--bitrate", "192k"}, "--bitrate has no effect on .wav files"},
+        {"out.flac", {"--bitrate", "192k"}, "--bitrate has no effect on .flac files"},
+        {"out.flac", {"--preset", "podcast"}, "--bitrate has no effect on .flac files"},
+        {"out.mp3", {"--bits", "16"}, "--bits has no effect on .mp3 files"},
+        {"out.ogg", {"--preset", "phone"}, "--bits has no effect on .ogg files"},
+        {"out.flac", {"--quality", "0.5", "--bits", "16"}, nullptr},
+        {"out.caf", {"--bits", "24"}, nullptr},
+        {"out.mp3", {"--quality", "0.5"}, nullptr},
+        {"out.ogg", {"--bitrate", "96k"}, nullptr},
+    };
+    for (const auto& each : kCases) {
+        std::vector<std::string> command{"convert", "in.wav", "-q", "-o", each.output};
+        command.insert(command.end(), each.options.begin(), each.options.end());
+        const SProcessResult result = withPresets(command);
+        EXPECT_EQ(result.exitCode, each.reason ? 2 : 0) << each.output << result.err;
+        EXPECT_EQ(result.err.find(each.reason ? each.reason : "tonewright"),
+                  each.reason ? 12 : std::string::npos)
+            << result.err;
+        EXPECT_EQ(std::filesystem::exists(folder / each.output), !each.reason);
+    }
+}
+
 TEST_F(Preset, IsRefusedWithFileAndKey) {
     static const struct {
         const char* text;

@@ -229,8 +229,10 @@ TEST_F(Host, CapabilitiesAreWhatTheEncoderTakes) {
         const char* name;
         int lowest, highest, channels;
         uint32_t widths; // bit n - 1: n bytes
-    } cases[] = {
-        {"x.mp3", 8000, 48000, 2, 0x2}, {"x.flac", 8000, 384000, 8, 0x7}, {"x.wav", 8000, 384000, 32, 0xF}};
+        uint32_t settings;
+    } cases[] = {{"x.mp3", 8000, 48000, 2, 0x2, TONEWRIGHT_SETTING_QUALITY | TONEWRIGHT_SETTING_BIT_RATE},
+                 {"x.flac", 8000, 384000, 8, 0x7, TONEWRIGHT_SETTING_QUALITY | TONEWRIGHT_SETTING_WIDTH},
+                 {"x.wav", 8000, 384000, 32, 0xF, TONEWRIGHT_SETTING_WIDTH}};
     for (const auto& each : cases) {
         const std::u16string uri = uriOf(folder / each.name);
         TONEWRIGHT_Capabilities can = {};
@@ -241,6 +243,7 @@ TEST_F(Host, CapabilitiesAreWhatTheEncoderTakes) {
         EXPECT_EQ(can.rates[can.rateCount - 1], each.highest) << each.name;
         EXPECT_EQ(can.channelCounts >> (each.channels - 1), 1u) << each.name;
         EXPECT_EQ(can.widths & each.widths, each.widths) << each.name << can.widths;
+        EXPECT_EQ(can.settings, each.settings) << each.name;
         EXPECT_EQ(TONEWRIGHT_Host_CanWrite(uri.c_str(), each.highest, 2, 2), 1) << each.name;
         if (each.channels < 32) {
             EXPECT_EQ(TONEWRIGHT_Host_CanWrite(uri.c_str(), 44100, each.channels + 1, 2), 0) << each.name;
