@@ -66,6 +66,8 @@ void addExisting(CLI::App& command, SConvertOptions& options) {
 void addCare(CLI::App& command, SConvertOptions& options) {
     command.add_flag("--salvage", options.salvage,
                      "Replace damaged parts of the input with silence instead of failing");
+    command.add_flag("--prevent-clipping", options.preventClipping,
+                     "Make floating-point sound that exceeds full scale quieter instead of clipping it");
     command.add_flag_callback(
         "--no-tags", [&] { options.carryTags = false; },
         "Do not copy title, artist and the other fields of tags");

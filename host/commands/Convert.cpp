@@ -107,13 +107,15 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
     SEnds ends;
     ends.format = requireFormat(m_library, temporary, samples, m_options, output, output.string());
     clearFailure();
-    if (samples != sound.samples &&
+    // A width that the user asks for means integers, also where the target could hold floating point.
+    if ((samples != sound.samples || m_options.bits) &&
         TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels,
                                         samples.bytesPerSample) != 1)
         throw std::runtime_error(takeFailure(
             "Cannot be converted from " + describe(sound.samples) + " to " + describe(samples), input));
     ends.source = std::move(sound.source);
     if (m_options.salvage) TONEWRIGHT_Host_SetSalvage(ends.source.get(), 1);
+    if (m_options.preventClipping) TONEWRIGHT_Host_SetClippingPrevention(ends.source.get(), 1);
     return ends;
 }
 

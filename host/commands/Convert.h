@@ -29,6 +29,7 @@ struct SConvertOptions : SFormatOptions {
     bool carryTags = true;
     bool carryTimes = false;
     bool salvage = false;
+    bool preventClipping = false;
     std::string resampler; // "default" or "best"; empty: as the environment says
     EOutput show = EOutput::normal;
 };

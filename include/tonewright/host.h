@@ -214,6 +214,7 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_CopyTags(const char16_t* source, const ch
  * COMPOSER and so on; a name without an equivalent in the format is stored as it is where the format allows
  * that. */
 
+/* Which tags of a type can be read and written. */
 typedef enum TONEWRIGHT_TagSupport {
     TONEWRIGHT_TAG_FIELDS = 1,   /* these functions read and write fields */
     TONEWRIGHT_TAG_PICTURES = 2, /* ... and pictures */
@@ -234,6 +235,7 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagEntryCount(TONEWRIGHT_Handle tags);
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagEntry(TONEWRIGHT_Handle tags, int32_t index, const char** name,
                                                    const char** value);
 
+/* A picture of a tag. */
 typedef struct TONEWRIGHT_TagPicture {
     size_t size;
     const void* data; /* a picture file */
@@ -246,6 +248,7 @@ typedef struct TONEWRIGHT_TagPicture {
     int32_t height;
 } TONEWRIGHT_TagPicture;
 
+/* The number of pictures; 0 for an invalid handle. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagPictureCount(TONEWRIGHT_Handle tags);
 /* The pointers are valid until the handle is destroyed. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagPicture(TONEWRIGHT_Handle tags, int32_t index,

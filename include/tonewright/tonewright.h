@@ -171,8 +171,10 @@ TONEWRIGHT_API uint8_t TONEWRIGHT_OnWindowShown(TONEWRIGHT_WindowHandle window);
  * destroyed, and no other thread may be inside the library. Harmless when not started. */
 TONEWRIGHT_API void TONEWRIGHT_DeInitAll(void);
 
-/* Sets the user interface language: language and country, such as "en-US" or "deu-AT". Null is ignored; an
- * unknown text is logged and leaves the language unchanged. */
+/* Sets the language of all messages from now on: language and country, such as "en-US" or "deu-AT". Where the
+ * country has no translation, that of another country in the same language is used, otherwise English. Null
+ * is ignored; an unknown text is logged and leaves the language unchanged. Call it on one thread at a time;
+ * other threads may use the library meanwhile. */
 TONEWRIGHT_API void TONEWRIGHT_SetLanguageID(const char16_t* language);
 
 /* Writes the feature record, exactly 9 bytes: its size as a 32-bit number (9) and five one-byte flags. A null
