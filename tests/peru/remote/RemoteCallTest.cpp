@@ -102,9 +102,14 @@ private:
     P<CRemoteVarObject> m_result = addResult<CRemoteVarObject>();
 };
 
-const std::string kAddRequest = wire("function") + wire("add") + wire("a") + hex("05000000") + wire("b") +
-                                hex("FEFFFFFF") + wire("execute");
-const std::string kAddAnswer = wire("return") + wire("Result") + hex("03000000");
+// Functions, since objects of the library are not available before main().
+std::string addRequest() {
+    return wire("function") + wire("add") + wire("a") + hex("05000000") + wire("b") + hex("FEFFFFFF") +
+           wire("execute");
+}
+std::string addAnswer() {
+    return wire("return") + wire("Result") + hex("03000000");
+}
 
 TEST(RemoteVar, HasItsWireForm) {
     const P<CRemoteVarObject> object = make<CRemoteVarObject>("o", make<CShort>(int16_t{7}));
@@ -161,15 +166,15 @@ TEST(RemoteVar, RefusesWhatItDoesNotExpect) {
 
 TEST(RemoteCall, WritesTheRequestAndReadsTheAnswer) {
     const P<CMemoryIOStream> out = memory();
-    const P<CRemoteStreamClient> client = make<CRemoteStreamClient>(memory(kAddAnswer), out);
+    const P<CRemoteStreamClient> client = make<CRemoteStreamClient>(memory(addAnswer()), out);
     EXPECT_EQ(client->callReturningInt(make<CAddFunction>(5, -2)), 3);
-    EXPECT_EQ(bytesOf(out), kAddRequest);
+    EXPECT_EQ(bytesOf(out), addRequest());
 
     const P<CMemoryIOStream> quit = memory();
     make<CRemoteStreamClient>(memory(), quit)->quit(); // waits for no answer
     EXPECT_EQ(bytesOf(quit), wire("void") + wire("Quit") + wire("execute"));
     EXPECT_THROW(client->callReturningString(make<CAddFunction>()), CCastError);
-    EXPECT_EQ(bytesOf(out), kAddRequest) << "nothing is called";
+    EXPECT_EQ(bytesOf(out), addRequest()) << "nothing is called";
 }
 
 TEST(RemoteCall, NamesWhatIsWrongWithTheAnswer) {
@@ -196,10 +201,10 @@ TEST(RemoteCall, ServesOneMessageAtATime) {
         std::string answer;
     };
     int calls = 0;
-    const std::string addAndMore = kAddRequest.substr(0, kAddRequest.size() - wire("execute").size());
+    const std::string addAndMore = addRequest().substr(0, addRequest().size() - wire("execute").size());
     const SCase cases[] = {
-        {kAddRequest, true, kAddAnswer},
-        {addAndMore, true, kAddAnswer},
+        {addRequest(), true, addAnswer()},
+        {addAndMore, true, addAnswer()},
         {wire("void") + wire("note") + wire("execute"), true, ""},
         {wire("execute"), false, ""},
         {wire(""), false, ""},
@@ -286,10 +291,10 @@ TEST(RemoteCall, AnUnwritableValueLeavesNothingBehind) {
         }
     };
     const P<CMemoryIOStream> out = memory();
-    const P<CRemoteStreamClient> client = make<CRemoteStreamClient>(memory(kAddAnswer), out);
+    const P<CRemoteStreamClient> client = make<CRemoteStreamClient>(memory(addAnswer()), out);
     EXPECT_EQ(errorOf([&] { client->call(make<CHalfFunction>()); }), "unwritable");
     client->call(make<CAddFunction>(5, -2));
-    EXPECT_EQ(bytesOf(out), kAddRequest);
+    EXPECT_EQ(bytesOf(out), addRequest());
 }
 
 TEST_F(RemotePipe, BothEndsCallInTurn) {
@@ -375,12 +380,12 @@ protected:
 
 TEST_F(RemotePeer, MessagesLeaveInOneWrite) {
     std::thread caller([&] { EXPECT_EQ(m_remote->callReturningInt(make<CAddFunction>(5, -2)), 3); });
-    EXPECT_EQ(m_peer->receive(), kAddRequest);
-    m_peer->send(kAddAnswer);
+    EXPECT_EQ(m_peer->receive(), addRequest());
+    m_peer->send(addAnswer());
     caller.join();
     m_remote->startWorkInThread(10);
-    for (const char byte : kAddRequest) m_peer->send(std::string(1, byte)); // arrives in pieces
-    EXPECT_EQ(m_peer->receive(), kAddAnswer);
+    for (const char byte : addRequest()) m_peer->send(std::string(1, byte)); // arrives in pieces
+    EXPECT_EQ(m_peer->receive(), addAnswer());
 }
 
 TEST_F(RemotePeer, SilenceEndsWithTheDeadline) {
