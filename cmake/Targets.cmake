@@ -76,10 +76,11 @@ function(tw_library name)
     endif()
 endfunction()
 
-# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [LABELS label...] [REALTIME test...]): a test binary built from the
-# current folder. The REALTIME tests, patterns such as Play.*, get that label; scripts/run-tests.sh runs them apart.
+# tw_test(NAME [FOLDERS folder...] [PRIVATE lib...] [REALTIME test...]): a test binary built from the current folder. Its
+# tests have the label NAME, except the REALTIME ones, patterns such as Play.*: they have NAME_realtime, and
+# scripts/run-tests.sh runs them apart.
 function(tw_test name)
-    cmake_parse_arguments(arg "" "" "FOLDERS;PRIVATE;LABELS;REALTIME" ${ARGN})
+    cmake_parse_arguments(arg "" "" "FOLDERS;PRIVATE;REALTIME" ${ARGN})
     tw_sources(sources ${arg_FOLDERS})
     if(NOT sources)
         return()
@@ -95,12 +96,12 @@ function(tw_test name)
     set(settings DISCOVERY_TIMEOUT 60 NO_PRETTY_VALUES PROPERTIES TIMEOUT 600)
     if(arg_REALTIME)
         list(JOIN arg_REALTIME : realtime)
-        gtest_discover_tests(${name} TEST_FILTER -${realtime} ${settings} LABELS "${name};${arg_LABELS}")
+        gtest_discover_tests(${name} TEST_FILTER -${realtime} ${settings} LABELS ${name})
         gtest_discover_tests(
-            ${name} TEST_FILTER ${realtime} TEST_LIST ${name}_realtime ${settings} LABELS "${name};realtime;${arg_LABELS}"
+            ${name} TEST_FILTER ${realtime} TEST_LIST ${name}_realtime ${settings} LABELS ${name}_realtime
         )
     else()
-        gtest_discover_tests(${name} ${settings} LABELS "${name};${arg_LABELS}")
+        gtest_discover_tests(${name} ${settings} LABELS ${name})
     endif()
 endfunction()
 
