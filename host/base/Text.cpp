@@ -144,6 +144,7 @@ void replaceAll(std::string& text, const std::string& what, const std::string& w
 std::string asReason(std::string message, const std::filesystem::path& about) {
     const std::filesystem::path absolute = std::filesystem::absolute(about);
     for (const std::string& name : {absolute.lexically_normal().native(), absolute.native()}) {
+        if (message.starts_with(name + ": ")) message.erase(0, name.size() + 2);
         replaceAll(message, " " + name + ":", ":");
         for (const char* article : {"the ", "The ", ""})
             replaceAll(message, article + ("file '" + name + "'"), "this file");
