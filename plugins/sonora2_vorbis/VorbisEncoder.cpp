@@ -27,20 +27,19 @@ int orOpen(int bitRate) {
 bool hasMode(const SPcmFormat& format, int bitRate) {
     vorbis_info info;
     vorbis_info_init(&info);
-    const bool found = vorbis_encode_init(&info, format.channels, format.rate, -1, bitRate, -1) == 0;
+    // Only chooses the mode: the codec's set-up of some modes allocates memory that it never frees.
+    const bool found = vorbis_encode_setup_managed(&info, format.channels, format.rate, -1, bitRate, -1) == 0;
     vorbis_info_clear(&info);
     return found;
 }
 
 // Found by trial, to 100 bit/s: the codec cannot be asked. The modes of a format cover a single range, which
-// contains the bit rate of every quality.
+// contains the bit rate of every quality. 0 to 0 if there is no mode.
 SBitRateRange findBitRates(const SPcmFormat& format) {
     constexpr int kStep = 100, kMost = 20'000'000 / kStep;
-    vorbis_info info;
-    vorbis_info_init(&info);
-    vorbis_encode_init_vbr(&info, format.channels, format.rate, static_cast<float>(kDefaultQuality));
-    const int inside = static_cast<int>(info.bitrate_nominal / kStep);
-    vorbis_info_clear(&info);
+    int inside = 1;
+    while (inside < kMost && !hasMode(format, inside * kStep)) inside += inside / 4 + 1;
+    if (inside >= kMost) return {0, 0};
     const auto find = [&](int accepted, int refused) {
         while (std::abs(accepted - refused) > 1) {
             const int middle = (accepted + refused) / 2;
@@ -84,7 +83,7 @@ void CVorbisEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
     if (error != 0 && byBitRate) {
         const SBitRateRange range = findBitRates(m_format);
         for (const int bitRate : {settings.nominalBitRate, settings.maxBitRate, settings.minBitRate})
-            requireBitRate(file.getFile(), "Vorbis", m_format, bitRate, range);
+            if (range.highest > 0) requireBitRate(file.getFile(), "Vorbis", m_format, bitRate, range);
     }
     if (error != 0)
         fail("could not write %s: Vorbis has no mode for %d channels at %d Hz with a bit rate of %d (at "

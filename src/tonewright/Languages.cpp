@@ -6,7 +6,6 @@
 #include "tonewright/Quietly.h"
 #include "zvr_lang_manager/LanguageManager.h"
 
-#include <ranges>
 #include <vector>
 
 namespace tonewright {
@@ -40,10 +39,10 @@ void applyLanguage(const zvr_lang::SLanguageId& id) {
     const P<zvr_lang::CLanguageManager> manager = zvr_lang::getLanguageManager();
     if (manager->getPacks().empty()) {
         const std::vector<P<peru::IURI>> folders = findFolders();
-        for (const P<peru::IURI>& folder : std::views::reverse(folders))
+        for (auto folder = folders.rbegin(); folder != folders.rend(); ++folder)
             for (const char* name : kPacks)
                 quietly("applyLanguage", [&] {
-                    manager->addPack(folder, peru::newString(name), peru::newString(name) + "-");
+                    manager->addPack(*folder, peru::newString(name), peru::newString(name) + "-");
                 });
     }
     manager->setCurrentLanguage(id);
