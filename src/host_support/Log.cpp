@@ -30,9 +30,10 @@ public:
         for (const P<peru::IString>& line : message.extraLines) text += "\n" + toText(line);
         std::string kind, title, reason;
         if (message.exception) {
-            kind = peru::getClassName(typeid(*message.exception));
-            title = toText(message.exception->getTitle());
-            reason = toText(message.exception->getDescription());
+            const auto& exception = *message.exception;
+            kind = peru::getClassName(typeid(exception));
+            title = toText(exception.getTitle());
+            reason = toText(exception.getDescription());
         }
         const TONEWRIGHT_LogMessage record{sizeof(record), message.level, component.c_str(), text.c_str(),
                                            kind.c_str(),   title.c_str(), reason.c_str()};
