@@ -217,15 +217,7 @@ void CHTTPClient::redirect(const P<IURI>& uri) {
     ++m_redirections;
     disconnect();
     P<CHTTPRequest> next = m_request->redirect(uri, m_response->getStatus() == 303);
-    if (next->getBody()) {
-        const P<IResetableInStream> body = tryCast<IResetableInStream>(next->getBody());
-        if (!body)
-            throw CInvalidObjectStateError(
-                localize("peru.net.CHTTPOperation.cannotReset.requestBodyStreamNotResetable",
-                         "Cannot reset HTTP operation because the request body stream is not resetable."),
-                P<IBase>::share(this));
-        body->reset();
-    }
+    next->rewindBody();
     m_request = std::move(next);
     m_response.reset();
     enter(EHTTPStep::chooseTarget);

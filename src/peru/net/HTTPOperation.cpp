@@ -44,15 +44,7 @@ bool CHTTPOperation::isCancelled() const {
 }
 
 void CHTTPOperation::reset() {
-    if (m_request->getBody()) {
-        const P<IResetableInStream> body = tryCast<IResetableInStream>(m_request->getBody());
-        if (!body)
-            throw CInvalidObjectStateError(
-                localize("peru.net.CHTTPOperation.cannotReset.requestBodyStreamNotResetable",
-                         "Cannot reset HTTP operation because the request body stream is not resetable."),
-                P<IBase>::share(this));
-        body->reset();
-    }
+    m_request->rewindBody();
     m_client->close();
     start();
 }

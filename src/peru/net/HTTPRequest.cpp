@@ -4,6 +4,7 @@
 #include "peru/net/posix/AddressText.h"
 #include "peru/streams/Base64Streams.h"
 #include "peru/streams/MemoryIOStream.h"
+#include "peru/strings/IStringLocalizer.h"
 #include "peru/uri/URIEscapes.h"
 
 #include <charconv>
@@ -102,6 +103,17 @@ SHTTPRequestHead composeRequestHead(const CHTTPRequest& request, const P<IURI>& 
         head.bytes += header.name + ": " + header.value + "\r\n";
     head.bytes += "\r\n";
     return head;
+}
+
+void CHTTPRequest::rewindBody() {
+    if (!getBody()) return;
+    const P<IResetableInStream> body = tryCast<IResetableInStream>(getBody());
+    if (!body)
+        throw CInvalidObjectStateError(
+            localize("peru.net.CHTTPOperation.cannotReset.requestBodyStreamNotResetable",
+                     "Cannot reset HTTP operation because the request body stream is not resetable."),
+            P<IBase>::share(this));
+    body->reset();
 }
 
 } // namespace peru::net

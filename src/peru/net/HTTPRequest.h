@@ -25,6 +25,9 @@ public:
     // The body ends with the stream. Its length is taken from a "Content-Length" header, otherwise from the
     // stream if that is seekable; a body of unknown length is sent in chunks.
     const P<IInStream>& getBody() const { return m_body; }
+    // Prepares the body, if any, to be sent again. Throws CInvalidObjectStateError if its stream cannot be
+    // reset.
+    void rewindBody();
     // Besides these, the client adds "Host", "Connection" and what the body and the proxy need.
     CHTTPHeaders& getHeaders() { return m_headers; }
     const CHTTPHeaders& getHeaders() const { return m_headers; }
