@@ -29,7 +29,8 @@ public:
 // from pipe: " and the system's text otherwise. readSome returns 0 instead of throwing CFinishedError.
 class PERU_API IPipeInStream : public virtual IInStream, public virtual IPipeStream {
 public:
-    // Bytes that can be read without waiting; 0 if the pipe is not usable. Any thread may ask.
+    // Bytes that can be read without waiting; 0 if the pipe is not usable. Any thread may ask; bytes that
+    // another thread is just taking over may be missing or count twice.
     virtual int64_t getAvailable() const = 0;
     // True as soon as a read would not wait: bytes have arrived or the peer has closed the pipe. False when
     // the time is over, after abort(), and on a pipe that is not usable.

@@ -9,6 +9,7 @@
 #include <cstring>
 #include <functional>
 #include <sys/socket.h>
+#include <sys/time.h>
 #include <sys/un.h>
 #include <thread>
 #include <unistd.h>
@@ -47,6 +48,8 @@ public:
         const int result = listens ? ::bind(m_socket, generic, sizeof address) | ::listen(m_socket, 0)
                                    : ::connect(m_socket, generic, sizeof address);
         EXPECT_EQ(result, 0) << path;
+        const timeval patience = {30, 0};
+        ::setsockopt(m_socket, SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
     }
     ~CRawSocket() { ::close(m_socket); }
     CRawSocket(const CRawSocket&) = delete;
@@ -55,7 +58,7 @@ public:
     void send(const std::string& bytes) const {
         EXPECT_EQ(::send(m_socket, bytes.data(), bytes.size(), MSG_NOSIGNAL), ssize_t(bytes.size()));
     }
-    // Up to `size` bytes from a single call; empty at the end.
+    // Up to `size` bytes from a single call; empty at the end, or if nothing arrives for half a minute.
     std::string receive(size_t size = 65536) const {
         std::string bytes(size, '\0');
         bytes.resize(static_cast<size_t>(std::max<ssize_t>(::recv(m_socket, bytes.data(), size, 0), 0)));

@@ -102,6 +102,30 @@ private:
     P<CRemoteVarObject> m_result = addResult<CRemoteVarObject>();
 };
 
+// Says when its value is about to be read.
+class CAnnouncedVar : public CRemoteVarInteger {
+public:
+    CAnnouncedVar(const char* name, std::atomic<bool>& isReading)
+        : CRemoteVarInteger(name), m_isReading(isReading) {}
+
+protected:
+    void readValue(IDataInStream& stream) override {
+        m_isReading = true;
+        CRemoteVarInteger::readValue(stream);
+    }
+
+private:
+    std::atomic<bool>& m_isReading;
+};
+
+class CAnnouncedFunction : public CRemoteFunction {
+public:
+    explicit CAnnouncedFunction(std::atomic<bool>& isReading) : CRemoteFunction("wait") {
+        addParam(make<CAnnouncedVar>("a", isReading));
+    }
+    void execute() override {}
+};
+
 // Functions, since objects of the library are not available before main().
 std::string addRequest() {
     return wire("function") + wire("add") + wire("a") + hex("05000000") + wire("b") + hex("FEFFFFFF") +
@@ -428,9 +452,11 @@ TEST_F(RemotePeer, UnreadableMessagesEndTheConnection) {
 }
 
 TEST_F(RemotePeer, HalfAMessageStopsNobody) {
+    std::atomic<bool> isReading = false;
+    m_remote->addProc(make<CAnnouncedFunction>(isReading));
     m_remote->startWorkInThread(1000);
-    m_peer->send(wire("function") + wire("add") + wire("a") + "12");
-    while (m_end->getInStream()->getAvailable() > 0) std::this_thread::yield();
+    m_peer->send(wire("function") + wire("wait") + wire("a") + "12");
+    while (!isReading) std::this_thread::yield();
     m_remote->stopWorkInThread();
     EXPECT_EQ(m_peer->receive(), wire("Error: Read was aborted"));
     EXPECT_EQ(m_peer->receive(), "");
