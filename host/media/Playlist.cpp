@@ -13,6 +13,7 @@
 #include <stdexcept>
 #include <string_view>
 #include <tonewright/host.h>
+#include <utility>
 
 namespace host {
 
