@@ -54,7 +54,14 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     sonora2/media/IFormatSettings.h
     sonora2/media/IMediaDescription.h
     sonora2/media/ISalvage.h
+    sonora2/media/ISonoraPicture.h
     sonora2/media/ISource.h
+    sonora2/media/IVideoSource.h
+    sonora2/pictures/NV12Picture.h
+    sonora2/pictures/Picture.h
+    sonora2/pictures/RGBPicture.h
+    sonora2/pictures/YUY2Picture.h
+    sonora2/pictures/YV12Picture.h
     sonora2/plugins/ISonoraPlugin.h
     sonora2/samplerateconverter/SampleRateConverter.h
 

@@ -6,6 +6,7 @@
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/media/AudioChunk.h"
 #include "sonora2/media/AudioStreamInfos.h"
+#include "sonora2/pictures/SonoraPictureRemote.h"
 #include "sonora2/plugins/PluginExtensions.h"
 
 #include <cstdint>
@@ -32,12 +33,31 @@ template <class T> bool read(const P<T>& object, const P<IDataInStream>& stream)
     }
 }
 
+// The dimensions need not match the bytes: every use of the pixels must throw or stay within the block.
+void readPicture(const P<IDataInStream>& stream) {
+    const auto carrier = make<common::CSonoraPictureRemote>(make<CMemoryManager>());
+    if (!read(carrier, stream)) return;
+    const P<common::ISonoraPicture> picture = carrier->getPicture();
+    const int width = picture->getWidth(), height = picture->getHeight();
+    try {
+        picture->getRGBPicture()->createThumbnail();
+        picture->createThumbnail()->getRGBPicture();
+        for (int plane = 0; plane < 3; ++plane) {
+            picture->getImagePlane(plane, width / 3, height / 3, width / 2, height / 2);
+            picture->fillPlaneBlack(plane, width / 2, height / 2, width - width / 2, height - height / 2);
+        }
+        picture->drawInto(picture, 0, 1, 1, 0, width - 1, height - 1);
+        picture->getImagePlane(1, 0, 0, width, height);
+    } catch (const CException&) {
+    }
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     if (size == 0) return 0;
     const P<IDataInStream> stream = makeStream(data + 1, size - 1);
-    switch (data[0] % 4) {
+    switch (data[0] % 5) {
     case 0: {
         const auto context = make<audio::CSonoraContextAudio>();
         if (!read(context, stream) && context->getPluginNameCount() != 0) std::abort();
@@ -51,6 +71,9 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         break;
     case 3:
         read(make<audio::CAudioChunk>(0.0, make<CMemoryBlock>()), stream);
+        break;
+    case 4:
+        readPicture(stream);
         break;
     }
     return 0;

@@ -1,0 +1,27 @@
+// A plane of Y, and one of U and V in turns at half the width and height.
+#pragma once
+
+#include "sonora2/pictures/Picture.h"
+
+namespace sonora2::common {
+
+class SONORA2_API CNV12Picture : public CPicture {
+public:
+    explicit CNV12Picture(const P<peru::IMemoryManager>& memory, double timestamp = 0.0, int width = 0,
+                          int height = 0, bool flipped = false, P<peru::IMemoryBlock> block = nullptr);
+    ~CNV12Picture() override;
+
+    int getPictureType() const override { return kNV12; }
+    P<peru::IString> getPixelShaderName() const override;
+    static int64_t getBlockBytes(int width, int height) { return int64_t{width} * height * 3 / 2; }
+
+protected:
+    const char* getClassName() const override { return "CNV12Picture"; }
+    int getPlaneCount() const override { return 2; }
+    SPlane getPlane(int plane) const override;
+    int64_t getLayoutBytes(int width, int height) const override { return getBlockBytes(width, height); }
+    P<CPicture> createSame(int width, int height, P<peru::IMemoryBlock> block) const override;
+    void convertToRGB(uint32_t* pixels) const override;
+};
+
+} // namespace sonora2::common
