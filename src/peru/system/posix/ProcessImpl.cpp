@@ -25,14 +25,17 @@ void CProcessImpl::collect() {
     // Does not reap the child yet: its id stays reserved, so terminate() cannot signal another process.
     do result = waitid(P_PID, static_cast<id_t>(m_id), &info, WEXITED | WNOWAIT);
     while (result != 0 && errno == EINTR);
+    P<IAction> action;
     {
         CMutexLock lock(m_mutex);
         int status = 0;
         if (waitpid(m_id, &status, WNOHANG) == m_id)
             m_exitCode = WIFSIGNALED(status) ? 128 + WTERMSIG(status) : WEXITSTATUS(status);
         m_collected = true;
+        action.swap(m_endAction);
     }
     m_ended->set();
+    if (action) action->run();
 }
 
 bool CProcessImpl::wait(uint32_t milliseconds, int& exitCode) {
@@ -42,9 +45,28 @@ bool CProcessImpl::wait(uint32_t milliseconds, int& exitCode) {
     return true;
 }
 
-void CProcessImpl::terminate() {
+void CProcessImpl::signal(int number) {
     CMutexLock lock(m_mutex);
-    if (!m_collected) kill(m_id, SIGTERM);
+    if (!m_collected) ::kill(m_id, number);
+}
+
+void CProcessImpl::terminate() {
+    signal(SIGTERM);
+}
+
+void CProcessImpl::kill() {
+    signal(SIGKILL);
+}
+
+void CProcessImpl::setEndAction(const P<IAction>& action) {
+    {
+        CMutexLock lock(m_mutex);
+        if (!m_collected) {
+            m_endAction = action;
+            return;
+        }
+    }
+    if (action) getThreadManager()->createThread(action);
 }
 
 } // namespace peru::posix

@@ -24,16 +24,21 @@ public:
     // code in this program reaped the child.
     bool wait(uint32_t milliseconds, int& exitCode) override;
     void terminate() override; // sends SIGTERM; does nothing if the child has ended
+    void kill() override;
+    void setEndAction(const P<IAction>& action) override; // runs on the waiting thread if set in time
 
     // Waits for the child to end and reaps it.
     void collect();
 
 private:
+    void signal(int number);
+
     const pid_t m_id;
     P<ISignal> m_ended;
     P<IMutex> m_mutex;        // guards the members below and is held while the id is used
     bool m_collected = false; // reaped; the system may reuse the id
     int m_exitCode = -1;
+    P<IAction> m_endAction;
 };
 
 } // namespace peru::posix

@@ -49,8 +49,9 @@ private:
 };
 
 // A child inherits the priority of the thread that starts it. If the system refuses, the priority stays.
-void setNormalPriority(pid_t id) {
-    if (getpriority(PRIO_PROCESS, static_cast<id_t>(id)) != 0)
+void setPriority(pid_t id, int niceValue) {
+    if (getpriority(PRIO_PROCESS, static_cast<id_t>(id)) != niceValue &&
+        setpriority(PRIO_PROCESS, static_cast<id_t>(id), niceValue) != 0)
         setpriority(PRIO_PROCESS, static_cast<id_t>(id), 0);
     sched_param parameters{};
     if (sched_getscheduler(id) != SCHED_OTHER) sched_setscheduler(id, SCHED_OTHER, &parameters);
@@ -58,7 +59,8 @@ void setNormalPriority(pid_t id) {
 
 } // namespace
 
-P<IProcess> CProcessManager::start(const P<IURI>& executable, const std::vector<P<IString>>& arguments) {
+P<IProcess> CProcessManager::start(const P<IURI>& executable, const std::vector<P<IString>>& arguments,
+                                   int niceValue) {
     std::vector<std::string> texts{toPath(executable)};
     for (const P<IString>& argument : arguments) texts.push_back(CString::toStdString(argument));
     std::vector<char*> pointers;
@@ -72,7 +74,7 @@ P<IProcess> CProcessManager::start(const P<IURI>& executable, const std::vector<
         throw CError(
             localize("peru.CProcessManager.startError", "Error starting '%FILE%' (%ERRORDESC%).",
                      {{"%FILE%", CString::fromUTF8(texts[0])}, {"%ERRORDESC%", getSystemText(error)}}));
-    setNormalPriority(id);
+    setPriority(id, niceValue);
     try {
         P<CProcessImpl> process = make<CProcessImpl>(id);
         process->watch();

@@ -10,7 +10,8 @@ namespace peru::posix {
 // lower than normal priority of the parent if the user may not raise it.
 class CProcessManager : public CObject, public IProcessManager {
 public:
-    P<IProcess> start(const P<IURI>& executable, const std::vector<P<IString>>& arguments) override;
+    P<IProcess> start(const P<IURI>& executable, const std::vector<P<IString>>& arguments,
+                      int niceValue) override;
     int64_t getCurrentProcessId() const override;
 };
 
