@@ -36,6 +36,8 @@ struct SInstalled {
     char application[256] = {};
     char report[4096] = {};
     char dump[4096] = {};
+    int reportFile = -1;
+    const char* details = nullptr;
     struct sigaction previous[kSignalCount] = {};
     std::terminate_handler previousTerminate = nullptr;
     uintptr_t stackLimit = std::numeric_limits<uintptr_t>::max();
@@ -93,9 +95,12 @@ void writeFrame(CSafeWriter& out, uintptr_t address) {
     out.text("\n");
 }
 
-void writeReport(size_t signalIndex, const siginfo_t& signal, size_t threadCount) {
-    CSafeWriter out(g_installed.report);
+void writeReport(CSafeWriter& out, size_t signalIndex, const siginfo_t& signal, size_t threadCount) {
     out.text(g_installed.application);
+    if (g_installed.details) {
+        out.text("\n");
+        out.text(g_installed.details);
+    }
     out.text("\n\nTime: ");
     out.number(static_cast<uint64_t>(std::time(nullptr)));
     out.text(" s since 1970 UTC\nProcess: ");
@@ -182,8 +187,14 @@ void writeFiles(int number, const siginfo_t& signal, const ucontext_t& context) 
     const CWatchdog watchdog(number);
     const size_t threads = captureThreads(context, g_threads, kMaxThreads);
     // The report first: it is small, and says most if the dump cannot be finished.
-    writeReport(getIndex(number), signal, threads);
-    {
+    if (g_installed.reportFile >= 0) {
+        CSafeWriter report(g_installed.reportFile);
+        writeReport(report, getIndex(number), signal, threads);
+    } else {
+        CSafeWriter report(g_installed.report);
+        writeReport(report, getIndex(number), signal, threads);
+    }
+    if (g_installed.dump[0]) {
         CSafeWriter dump(g_installed.dump);
         writeMiniDump(dump, signal, g_threads, threads, g_installed.stackLimit);
     }
@@ -235,7 +246,9 @@ void useAlternateStack() {
 void install(const SNames& names) {
     copyText(g_installed.application, sizeof g_installed.application, names.application);
     copyText(g_installed.report, sizeof g_installed.report, names.report);
-    copyText(g_installed.dump, sizeof g_installed.dump, names.dump, ".dmp");
+    copyText(g_installed.dump, sizeof g_installed.dump, names.dump, names.dump ? ".dmp" : "");
+    g_installed.reportFile = names.reportFile;
+    g_installed.details = names.details;
     if (g_isInstalled) return;
     g_isInstalled = true;
 

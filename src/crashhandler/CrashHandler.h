@@ -7,7 +7,12 @@ namespace crashhandler {
 struct SNames {
     const char* application; // name and version for the report
     const char* report;      // path of the text report
-    const char* dump;        // path of the minidump without its ".dmp"
+    const char* dump;        // path of the minidump without its ".dmp"; null for none
+    // An open file that takes the report instead of the path, for a process that may not open files.
+    int reportFile = -1;
+    // Further lines of the report, read at the time of the crash; null for none. The text may change at any
+    // time as long as it stays terminated.
+    const char* details = nullptr;
 };
 
 // Installs handlers for the fatal signals and the terminate handler of the process. A crash writes both

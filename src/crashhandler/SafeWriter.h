@@ -14,6 +14,8 @@ public:
     // Replaces an existing file; only the user has access to the new one. Fails for anything but a regular
     // file.
     explicit CSafeWriter(const char* path);
+    // Takes over an open file.
+    explicit CSafeWriter(int file) : m_file(file) {}
     ~CSafeWriter();
     CSafeWriter(const CSafeWriter&) = delete;
     CSafeWriter& operator=(const CSafeWriter&) = delete;
