@@ -77,7 +77,8 @@ protected:
         for (const SFormatCase& format : kFormatCases)
             if (names.insert(format.plugin).second) context->addPluginName(format.plugin);
         context->addPluginName("sonora2_decmpa"); // reads what sonora2_l3codec writes
-        handler = peru::make<sonora2::common::CPluginHandler>(context);
+        // All tests also hold for plug-ins in slave processes.
+        handler = peru::make<sonora2::common::CPluginHandler>(context, std::getenv("TEST_BOXED") != nullptr);
     }
 
     P<IAudioSource> openSource(const std::filesystem::path& path, const SShape& shape = {}) {

@@ -5,6 +5,8 @@
 #include "peru/system/IPathes.h"
 #include "peru/system/ISystem.h"
 #include "peru/uri/URI.h"
+#include "sonora2/boxed/BoxedSettings.h"
+#include "sonora2/boxed/PluginModuleBoxed.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
 #include "sonora2/plugins/ParameterRecord.h"
@@ -96,18 +98,26 @@ CPluginHandler::~CPluginHandler() = default;
 void CPluginHandler::loadPlugin(const peru::CStringArg& name) {
     try {
         const P<IString> fileName = peru::format(kLibraryNameFormat, name);
-        if (m_boxed) {
-            P<IString> text = peru::format("there is no slave process to run the plugin in: %s", fileName);
-            throw CSonoraError(text);
-        }
         const P<IURI> library = findLibrary(fileName);
         if (!library) throw CSonoraError(peru::format("could not load plugin: %s", fileName));
         const P<ISonoraPlugin> module = peru::make<CPluginModule>(m_context, library);
-        addPlugin(module, module);
+        if (m_boxed || isBoxedPlugin(m_context, name))
+            addPlugin(makeBoxed(*module, library), module);
+        else
+            addPlugin(module, module);
     } catch (const peru::CException& e) {
         log(kSeverityWarning,
             peru::format("Error while loading DLL: %s - %s", e.getTitle(), e.getDescription()));
     }
+}
+
+// The slave loads the library that was found here.
+P<ISonoraPlugin> CPluginHandler::makeBoxed(ISonoraPlugin& module, const P<IURI>& library) const {
+    const P<IString> name = CString::fromUTF8(CString::toStdString(module.getPluginName()));
+    m_context->setParameter(kBoxedParameterKey,
+                            CString::fromUTF8(kBoxedLibraryParameter + CString::toStdString(name)),
+                            library->getAsString());
+    return peru::make<CPluginModuleBoxed>(m_context, name);
 }
 
 void CPluginHandler::addPlugin(const P<ISonoraPlugin>& plugin, const P<ISonoraPlugin>& plainPlugin) {
@@ -163,7 +173,7 @@ P<IPluginExtensions> CPluginHandler::getValidExtensions(int mask) {
         for (const char* extension : kImageExtensions) all->addExtension(CString::fromUTF8(extension));
         return all;
     }
-    for (const P<ISonoraPlugin>& plugin : m_plugins) {
+    for (const P<ISonoraPlugin>& plugin : m_plainPlugins) {
         const P<IPluginExtensions> extensions = plugin->getValidExtensions(mask);
         for (int i = 0; extensions && i < extensions->getCount(); ++i)
             all->addExtension(extensions->getExtension(i));

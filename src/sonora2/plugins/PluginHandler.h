@@ -20,7 +20,8 @@ namespace sonora2::common {
 class SONORA2_API CPluginHandler : public peru::CObject, public IPluginHandler {
 public:
     // Loads the context's plug-ins, or the default ones if it names none; failures to load are only logged.
-    // The preference may be empty.
+    // The preference may be empty. `boxed` runs all plug-ins in slave processes; otherwise the context names
+    // those that do (see BoxedSettings.h).
     explicit CPluginHandler(const P<ISonoraContext>& context, bool boxed = false,
                             const peru::CStringArg& uriSuffix = "",
                             const P<IPluginPreference>& preference = nullptr);
@@ -49,8 +50,8 @@ public:
     void setURISuffix(const peru::CStringArg& suffix) override;
     P<peru::IString> getURISuffix() override;
 
-    // `plugin` creates objects, `plainPlugin` is asked for extensions; in this process both are the same
-    // object. Must not be called once create calls may run.
+    // `plugin` creates objects, `plainPlugin` is asked for extensions and never starts a slave; for plug-ins
+    // that run in this process both are the same object. Must not be called once create calls may run.
     void addPlugin(const P<ISonoraPlugin>& plugin, const P<ISonoraPlugin>& plainPlugin);
 
 private:
@@ -70,6 +71,7 @@ private:
     void storePreferred(int mask, const P<peru::IURI>& uri, ISonoraPlugin& plugin);
     P<peru::IString> getShownName(const P<peru::IURI>& uri) const;
     P<peru::IURI> findLibrary(const P<peru::IString>& fileName) const;
+    P<ISonoraPlugin> makeBoxed(ISonoraPlugin& module, const P<peru::IURI>& library) const;
     void log(int32_t severity, const P<peru::IString>& text) const;
 
     std::vector<P<ISonoraPlugin>> m_plugins;

@@ -1,0 +1,25 @@
+// Settings of boxed plug-ins, stored as parameters of the context.
+#pragma once
+
+#include "sonora2/context/ISonoraContext.h"
+
+#include <cstdint>
+
+namespace sonora2::common {
+
+constexpr uint32_t kBoxedParameterKey = 2;
+// Names of the plug-ins that run in a process of their own, separated by commas, or "all". Used when a
+// plug-in handler loads its plug-ins.
+constexpr const char* kBoxedPluginsParameter = "plugins";
+// Milliseconds that one call into a slave may take before the slave counts as hanging and is killed. 0 means
+// without limit; if empty, the default.
+constexpr const char* kBoxedDeadlineParameter = "deadline";
+constexpr uint32_t kBoxedDeadline = 30'000;
+// Followed by a plug-in's name: the URI of its library. The slave searches for the library without it.
+constexpr const char* kBoxedLibraryParameter = "library:";
+
+SONORA2_API uint32_t getBoxedDeadline(const P<ISonoraContext>& context); // milliseconds
+// Whether the context's list contains the plug-in.
+SONORA2_API bool isBoxedPlugin(const P<ISonoraContext>& context, const peru::CStringArg& name);
+
+} // namespace sonora2::common

@@ -1,0 +1,142 @@
+#include "sonora2/boxed/PicturePrefetch.h"
+
+#include "peru/Errors.h"
+
+namespace sonora2::common {
+
+namespace {
+
+constexpr size_t kMostPictures = 3;
+constexpr uint32_t kIdleWait = 1000;    // milliseconds
+constexpr uint32_t kPictureWait = 5000; // milliseconds
+
+class CWork : public peru::CObject, public peru::IAction {
+public:
+    explicit CWork(std::function<void()> body) : m_body(std::move(body)) {}
+    void run() override { m_body(); }
+
+private:
+    std::function<void()> m_body;
+};
+
+} // namespace
+
+CPicturePrefetch::CPicturePrefetch(Fetch fetch)
+    : m_fetch(std::move(fetch)), m_mutex(peru::getMutexFactory()->createMutex()),
+      m_stop(peru::getSignalFactory()->createSignal()),
+      m_moreWanted(peru::getSignalFactory()->createSignal()) {}
+
+CPicturePrefetch::~CPicturePrefetch() {
+    stop();
+}
+
+void CPicturePrefetch::start() {
+    if (m_running) return;
+    clear();
+    m_stop->reset();
+    m_running = true;
+    m_thread =
+        peru::getThreadManager()->createThread(P<peru::IAction>(peru::make<CWork>([this] { work(); })));
+}
+
+void CPicturePrefetch::stop() {
+    if (!m_thread) return;
+    m_running = false;
+    m_stop->set();
+    m_moreWanted->set();
+    m_thread->wait();
+    m_thread = nullptr;
+    clear();
+}
+
+void CPicturePrefetch::clear() {
+    {
+        const peru::CMutexLock lock(m_mutex);
+        m_pictures.clear();
+        m_isAtEnd = false;
+        m_failure = nullptr;
+        ++m_generation;
+    }
+    m_moreWanted->set();
+}
+
+bool CPicturePrefetch::isEmpty() const {
+    const peru::CMutexLock lock(m_mutex);
+    return m_pictures.empty();
+}
+
+void CPicturePrefetch::work() {
+    while (m_running && !m_stop->wait(0)) {
+        const bool isWanted = m_moreWanted->wait(kIdleWait);
+        if (m_stop->wait(0)) return;
+        bool isFull;
+        {
+            const peru::CMutexLock lock(m_mutex);
+            isFull = m_pictures.size() >= kMostPictures || m_isAtEnd || m_failure;
+            if (!isWanted || isFull) m_moreWanted->reset();
+        }
+        if (!isWanted || isFull) continue;
+        P<peru::CException> failure;
+        try {
+            uint64_t generation = 0;
+            P<ISonoraPicture> picture;
+            const auto locked = [&] {
+                const peru::CMutexLock lock(m_mutex);
+                generation = m_generation;
+            };
+            const bool isEnd = m_fetch(locked, picture) == EFetched::end;
+            append(picture, generation, isEnd);
+        } catch (const peru::CException& exception) {
+            failure = exception.clone();
+        } catch (const std::exception&) {
+            failure = peru::CError("std::exception in CEncapsulatedSource", "CEncapsulatedSource").clone();
+        } catch (...) {
+            failure = peru::CError("unknown exception in buffering thread").clone();
+        }
+        if (!failure) continue;
+        const peru::CMutexLock lock(m_mutex);
+        m_failure = failure;
+    }
+}
+
+void CPicturePrefetch::append(const P<ISonoraPicture>& picture, uint64_t generation, bool isEnd) {
+    const peru::CMutexLock lock(m_mutex);
+    if (generation != m_generation) return; // from before a change of the position
+    m_isAtEnd = isEnd;
+    if (!isEnd) m_pictures.push_back(picture);
+    if (m_pictures.size() >= kMostPictures) m_moreWanted->reset();
+}
+
+void CPicturePrefetch::waitForPicture() {
+    for (uint32_t waited = 0;; ++waited) {
+        {
+            const peru::CMutexLock lock(m_mutex);
+            if (!m_pictures.empty() || m_isAtEnd) return;
+            if (m_failure) m_failure->raise();
+        }
+        if (waited == kPictureWait)
+            throw peru::CError("CEncapsulatedSource: timeout while prefetching image");
+        peru::getThreadManager()->sleep(1);
+    }
+}
+
+P<ISonoraPicture> CPicturePrefetch::take() {
+    waitForPicture();
+    P<ISonoraPicture> picture;
+    {
+        const peru::CMutexLock lock(m_mutex);
+        if (m_pictures.empty()) return nullptr;
+        picture = m_pictures.front();
+        m_pictures.pop_front();
+    }
+    m_moreWanted->set();
+    return picture;
+}
+
+P<ISonoraPicture> CPicturePrefetch::peek() {
+    waitForPicture();
+    const peru::CMutexLock lock(m_mutex);
+    return m_pictures.empty() ? nullptr : m_pictures.front();
+}
+
+} // namespace sonora2::common
