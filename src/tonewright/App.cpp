@@ -5,6 +5,7 @@
 #include "peru/log/ILog.h"
 #include "peru/system/ISystem.h"
 #include "peru/uri/URI.h"
+#include "sonora2/boxed/BoxedSettings.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/plugins/MediaEnvironment.h"
 #include "tonewright/Quietly.h"
@@ -32,6 +33,9 @@ constexpr const char* kReadPlugins[] = {"sonora2_flac", "sonora2_decmpa",  "sono
                                         "sonora2_wmf",  "sonora2_dsgraph", "sonora2_discio"};
 constexpr const char* kWritePlugins[] = {"sonora2_flac", "sonora2_l3codec", "sonora2_vorbis", "sonora2_wav",
                                          "sonora2_wmf"};
+
+// They read many formats of unknown origin.
+constexpr const char* kBoxedPlugins = "sonora2_dsgraph,sonora2_wmf";
 
 constexpr const char* kProductFolder = "Zelvanor Tonewright 4/";
 
@@ -61,6 +65,21 @@ std::set<std::string> findAddedPlugins() {
         }
     }
     return names;
+}
+
+// TONEWRIGHT_BOXED lists further plug-ins that run in a process of their own, "all", or "none".
+// TONEWRIGHT_BOXED_DEADLINE is the number of milliseconds after which such a process counts as hanging.
+void setBoxedPlugins(ISonoraContext& context) {
+    using namespace sonora2::common;
+    const auto set = [&](const char* parameter, const std::string& value) {
+        context.setParameter(kBoxedParameterKey, parameter, peru::CString::fromUTF8(value));
+    };
+    const char* value = std::getenv("TONEWRIGHT_BOXED");
+    const std::string list = value ? value : "";
+    if (list != "none")
+        set(kBoxedPluginsParameter, list.empty() ? kBoxedPlugins : list + "," + kBoxedPlugins);
+    if (const char* deadline = std::getenv("TONEWRIGHT_BOXED_DEADLINE"))
+        set(kBoxedDeadlineParameter, deadline);
 }
 
 bool fail(const char* text) {
@@ -129,6 +148,7 @@ P<ISonoraContext> CApp::makeContext(uint64_t flags, std::span<const char* const>
     for (const char* name : plugins) context->addPluginName(name);
     for (const std::string& name : findAddedPlugins()) context->addPluginName(peru::CString::fromUTF8(name));
     context->setSwitchB(true);
+    setBoxedPlugins(*context);
     return context;
 }
 
