@@ -30,10 +30,9 @@ int openPrivate(const char* path) {
     if (::lstat(path, &status) == 0 && S_ISREG(status.st_mode)) ::unlink(path);
     const int file = ::open(path, O_WRONLY | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK, 0600);
     if (file < 0) return -1;
-    const bool isUsable =
-        ::fstat(file, &status) == 0 && S_ISREG(status.st_mode) && status.st_uid == ::geteuid() &&
-        // A confined process may not change modes.
-        ((status.st_mode & 07777) == 0600 || ::fchmod(file, 0600) == 0) && ::ftruncate(file, 0) == 0;
+    const bool isUsable = ::fstat(file, &status) == 0 && S_ISREG(status.st_mode) &&
+                          status.st_uid == ::geteuid() && ::fchmod(file, 0600) == 0 &&
+                          ::ftruncate(file, 0) == 0;
     if (isUsable) return file;
     ::close(file);
     return -1;

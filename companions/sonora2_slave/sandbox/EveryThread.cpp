@@ -65,8 +65,8 @@ bool isRunning(pid_t thread) {
 
 // Asks the thread and waits until it has answered or ended.
 void ask(pid_t thread, int signal) {
-    constexpr int kRounds = 5000; // of a millisecond
-    const timespec pause{0, 1'000'000};
+    constexpr int kRounds = 50000; // of 0.1 ms
+    const timespec pause{0, 100'000};
     const size_t before = g_answers;
     if (::syscall(SYS_tgkill, ::getpid(), thread, signal) != 0) return; // it has ended
     for (int i = 0; g_answers == before && isRunning(thread); ++i) {
