@@ -1,4 +1,4 @@
-#include "sandbox/Sandbox.h"
+#include "sandbox/JobAccess.h"
 
 #include "peru/files/IFileReplacement.h"
 #include "peru/system/ISystem.h"
@@ -79,14 +79,8 @@ protected:
     const std::filesystem::path m_target = write("out/old.wav", "old");
 
     SSandbox reading() const {
-        SSandbox sandbox;
-        sandbox.readable = {m_medium};
+        SSandbox sandbox = sonora2::slave::allowReading(m_medium);
         sandbox.writable = {m_crashLog};
-        return sandbox;
-    }
-    SSandbox writing() const {
-        SSandbox sandbox;
-        sandbox.writable = {m_target.parent_path(), m_crashLog};
         return sandbox;
     }
 };
@@ -182,9 +176,11 @@ TEST_F(Sandbox, LeavesWhatCodecsNeed) {
 
 TEST_F(Sandbox, LetsAFormatReplaceItsTarget) {
     std::filesystem::permissions(m_target, std::filesystem::perms(0640));
+    const std::filesystem::path link = m_folder / "music/link.wav";
+    std::filesystem::create_symlink("../out/old.wav", link);
     const auto replace = [&] {
         try {
-            const auto replacement = peru::getSystem()->startReplacement(toURI(m_target));
+            const auto replacement = peru::getSystem()->startReplacement(toURI(link));
             replacement->getStream()->write("new", 3);
             replacement->commit();
             std::filesystem::remove(m_folder.write("out/removed", "x"));
@@ -193,10 +189,16 @@ TEST_F(Sandbox, LetsAFormatReplaceItsTarget) {
         }
         return tryOpen(m_other, O_RDONLY) == EACCES ? 0 : 2;
     };
-    EXPECT_EQ(inside(writing(), replace), 0);
+    EXPECT_EQ(inside(sonora2::slave::allowWriting(link), replace), 0);
     EXPECT_EQ(readFile(m_target), "new");
     EXPECT_EQ(std::filesystem::status(m_target).permissions(), std::filesystem::perms(0640));
     EXPECT_EQ(std::distance(std::filesystem::directory_iterator(m_target.parent_path()), {}), 1);
+}
+
+TEST_F(Sandbox, GrantsADeviceAndNotItsFolder) {
+    const SSandbox sandbox = sonora2::slave::allowWriting("/dev/full");
+    EXPECT_EQ(inside(sandbox, [] { return tryOpen("/dev/full", O_WRONLY); }), 0);
+    EXPECT_EQ(inside(sandbox, [] { return tryOpen("/dev/tty", O_WRONLY); }), EACCES);
 }
 
 TEST_F(Sandbox, ConfinesThreadsThatAreRunning) {
