@@ -1,4 +1,4 @@
-#include "sandbox/JobAccess.h"
+#include "sonora2_slave/sandbox/JobAccess.h"
 
 #include "peru/files/IFileReplacement.h"
 #include "peru/system/ISystem.h"
@@ -27,8 +27,8 @@
 namespace {
 
 using namespace tests;
-using sonora2::slave::enterSandbox;
-using sonora2::slave::SSandbox;
+using slave::enterSandbox;
+using slave::SSandbox;
 
 constexpr int kEntryFailed = 254;
 
@@ -79,7 +79,7 @@ protected:
     const std::filesystem::path m_target = write("out/old.wav", "old");
 
     SSandbox reading() const {
-        SSandbox sandbox = sonora2::slave::allowReading(m_medium);
+        SSandbox sandbox = slave::allowReading(m_medium);
         sandbox.writable = {m_crashLog};
         return sandbox;
     }
@@ -119,7 +119,7 @@ TEST_F(Sandbox, RefusesWhatACodecHasNoUseFor) {
         {"make a network socket", [] { return errorIf(::socket(AF_INET, SOCK_STREAM, 0) < 0); }},
         {"execute a program", execute},
         {"fork", [] { return tryCall(SYS_fork); }},
-        {"trace the host", [&] { return errorIf(::ptrace(PTRACE_ATTACH, parent, 0, 0) < 0); }},
+        {"trace the host", [&] { return errorIf(::ptrace(PTRACE_SEIZE, parent, 0, 0) < 0); }},
         {"signal the host", [&] { return errorIf(::kill(parent, 0) < 0); }},
         {"signal a thread of the host", [&] { return tryCall(SYS_tgkill, parent, parent, 0); }},
         {"signal the process group", [] { return errorIf(::kill(0, 0) < 0); }},
@@ -189,14 +189,14 @@ TEST_F(Sandbox, LetsAFormatReplaceItsTarget) {
         }
         return tryOpen(m_other, O_RDONLY) == EACCES ? 0 : 2;
     };
-    EXPECT_EQ(inside(sonora2::slave::allowWriting(link), replace), 0);
+    EXPECT_EQ(inside(slave::allowWriting(link), replace), 0);
     EXPECT_EQ(readFile(m_target), "new");
     EXPECT_EQ(std::filesystem::status(m_target).permissions(), std::filesystem::perms(0640));
     EXPECT_EQ(std::distance(std::filesystem::directory_iterator(m_target.parent_path()), {}), 1);
 }
 
 TEST_F(Sandbox, GrantsADeviceAndNotItsFolder) {
-    const SSandbox sandbox = sonora2::slave::allowWriting("/dev/full");
+    const SSandbox sandbox = slave::allowWriting("/dev/full");
     EXPECT_EQ(inside(sandbox, [] { return tryOpen("/dev/full", O_WRONLY); }), 0);
     EXPECT_EQ(inside(sandbox, [] { return tryOpen("/dev/tty", O_WRONLY); }), EACCES);
 }

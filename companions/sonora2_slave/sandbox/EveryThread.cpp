@@ -1,4 +1,4 @@
-#include "sandbox/EveryThread.h"
+#include "sonora2_slave/sandbox/EveryThread.h"
 
 #include <atomic>
 #include <cerrno>
@@ -12,7 +12,7 @@
 #include <system_error>
 #include <unistd.h>
 
-namespace sonora2::slave {
+namespace slave {
 
 namespace {
 
@@ -103,4 +103,4 @@ void runOnEveryThread(int (*call)(int), int argument) {
     if (error != 0) throw std::system_error(error, std::generic_category(), "could not confine a thread");
 }
 
-} // namespace sonora2::slave
+} // namespace slave

@@ -1,7 +1,7 @@
 // Changes the properties that Linux has for each thread instead of each process.
 #pragma once
 
-namespace sonora2::slave {
+namespace slave {
 
 // Calls `call(argument)` on all threads of the process, the calling one last. It runs in a signal handler on
 // the others, may only make system calls, and returns 0 or an errno value. Threads that are created meanwhile
@@ -9,4 +9,4 @@ namespace sonora2::slave {
 // seconds because it blocks all signals. One call at a time.
 void runOnEveryThread(int (*call)(int argument), int argument);
 
-} // namespace sonora2::slave
+} // namespace slave

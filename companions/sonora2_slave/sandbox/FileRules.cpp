@@ -1,6 +1,6 @@
-#include "sandbox/FileRules.h"
+#include "sonora2_slave/sandbox/FileRules.h"
 
-#include "sandbox/EveryThread.h"
+#include "sonora2_slave/sandbox/EveryThread.h"
 
 #include <cerrno>
 #include <fcntl.h>
@@ -11,7 +11,7 @@
 #include <system_error>
 #include <unistd.h>
 
-namespace sonora2::slave {
+namespace slave {
 
 namespace {
 
@@ -119,4 +119,4 @@ bool CFileRules::enforce() {
     return m_ruleset >= 0;
 }
 
-} // namespace sonora2::slave
+} // namespace slave

@@ -3,7 +3,7 @@
 
 #include <filesystem>
 
-namespace sonora2::slave {
+namespace slave {
 
 // Everything that is not allowed is refused with EACCES. Newer kernels refuse more: connections over TCP and
 // to abstract sockets, signals to other processes, requests to devices. Without Landlock all operations do
@@ -28,4 +28,4 @@ private:
     uint64_t m_handled = 0; // rights that this kernel knows
 };
 
-} // namespace sonora2::slave
+} // namespace slave

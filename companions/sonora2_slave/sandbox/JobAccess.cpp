@@ -1,6 +1,6 @@
-#include "sandbox/JobAccess.h"
+#include "sonora2_slave/sandbox/JobAccess.h"
 
-namespace sonora2::slave {
+namespace slave {
 
 namespace {
 
@@ -45,4 +45,4 @@ SSandbox allowWriting(const fs::path& target) {
     return sandbox;
 }
 
-} // namespace sonora2::slave
+} // namespace slave

@@ -1,9 +1,9 @@
 // What a slave may touch for the one medium that it was started for.
 #pragma once
 
-#include "sandbox/Sandbox.h"
+#include "sonora2_slave/sandbox/Sandbox.h"
 
-namespace sonora2::slave {
+namespace slave {
 
 // The medium, and the files beside it that its format consists of.
 SSandbox allowReading(const std::filesystem::path& medium);
@@ -12,4 +12,4 @@ SSandbox allowReading(const std::filesystem::path& medium);
 // written beside it. Of a device or a pipe, only itself.
 SSandbox allowWriting(const std::filesystem::path& target);
 
-} // namespace sonora2::slave
+} // namespace slave

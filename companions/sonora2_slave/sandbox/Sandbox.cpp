@@ -1,7 +1,7 @@
-#include "sandbox/Sandbox.h"
+#include "sonora2_slave/sandbox/Sandbox.h"
 
-#include "sandbox/FileRules.h"
-#include "sandbox/SystemCallFilter.h"
+#include "sonora2_slave/sandbox/FileRules.h"
+#include "sonora2_slave/sandbox/SystemCallFilter.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -11,7 +11,7 @@
 #include <system_error>
 #include <unistd.h>
 
-namespace sonora2::slave {
+namespace slave {
 
 namespace {
 
@@ -99,4 +99,4 @@ std::vector<std::string> enterSandbox(const SSandbox& sandbox) {
     return lacking;
 }
 
-} // namespace sonora2::slave
+} // namespace slave

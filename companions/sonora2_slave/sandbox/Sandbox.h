@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-namespace sonora2::slave {
+namespace slave {
 
 inline constexpr uint64_t kDefaultMemoryLimit = uint64_t{1} << 30;
 inline constexpr unsigned kDefaultFileLimit = 64;
@@ -35,4 +35,4 @@ struct SSandbox {
 // end. Calls of other threads may be interrupted once (EINTR).
 std::vector<std::string> enterSandbox(const SSandbox& sandbox);
 
-} // namespace sonora2::slave
+} // namespace slave

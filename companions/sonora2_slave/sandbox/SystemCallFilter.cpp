@@ -1,4 +1,4 @@
-#include "sandbox/SystemCallFilter.h"
+#include "sonora2_slave/sandbox/SystemCallFilter.h"
 
 #include <cerrno>
 #include <fcntl.h>
@@ -14,7 +14,7 @@
 #include <unistd.h>
 #include <vector>
 
-namespace sonora2::slave {
+namespace slave {
 
 namespace {
 
@@ -144,4 +144,4 @@ bool filterSystemCalls(bool makesFiles) {
     return filter.load();
 }
 
-} // namespace sonora2::slave
+} // namespace slave

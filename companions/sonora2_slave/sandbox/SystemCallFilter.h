@@ -1,7 +1,7 @@
 // The system calls that a process may make, enforced by seccomp.
 #pragma once
 
-namespace sonora2::slave {
+namespace slave {
 
 // Refuses, for all threads and for good, what neither codecs nor this system need: EPERM, so that a library
 // that only tries continues without. `makesFiles` permits changing the attributes of open files, which an
@@ -9,4 +9,4 @@ namespace sonora2::slave {
 // std::system_error on other failures.
 bool filterSystemCalls(bool makesFiles);
 
-} // namespace sonora2::slave
+} // namespace slave

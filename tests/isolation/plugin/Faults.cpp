@@ -108,7 +108,7 @@ const std::map<std::string, std::function<void()>> kFaults = {
     {"exec", execute},
     {"fork", [] { report("fork", ::fork() < 0); }},
     {"signal-parent", [] { report("signal", ::kill(::getppid(), SIGKILL) != 0); }},
-    {"trace-parent", [] { report("trace", ::ptrace(PTRACE_ATTACH, ::getppid(), 0, 0) != 0); }},
+    {"trace-parent", [] { report("trace", ::ptrace(PTRACE_SEIZE, ::getppid(), 0, 0) != 0); }},
 };
 
 } // namespace
