@@ -13,7 +13,10 @@
 #include "sonora2/plugins/PluginModule.h"
 #include "sonora2_slave/CrashDetails.h"
 #include "sonora2_slave/ServedMedia.h"
+#include "sonora2_slave/sandbox/JobAccess.h"
 
+#include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <limits>
 
@@ -25,6 +28,7 @@ using Remote = ISonoraPluginRemote;
 
 namespace {
 
+constexpr const char* kSandboxVariable = "TONEWRIGHT_BOXED_SANDBOX"; // "none": for debugging
 constexpr int kPollInterval = 100; // milliseconds; data wakes the thread earlier
 
 std::string toPath(const P<peru::IURI>& file) {
@@ -107,9 +111,23 @@ ISonoraPlugin& CSlave::requirePlugin() const {
 }
 
 // Called on the serving thread, before the plug-in gets to see the medium.
-void CSlave::beforeMedia(const P<peru::IURI>& medium, bool) {
+void CSlave::beforeMedia(const P<peru::IURI>& medium, bool isWritten) {
     if (!medium) throw CSonoraError("a medium is missing");
     CCrashDetails::setFile(CString::toStdString(peru::getShownName(medium)));
+    if (!m_isConfined) confine(medium, isWritten);
+}
+
+// For good: a slave that is asked for a second medium cannot open it.
+void CSlave::confine(const P<peru::IURI>& medium, bool isWritten) {
+    const char* mode = std::getenv(kSandboxVariable);
+    if (!mode || std::strcmp(mode, "none") != 0) {
+        SSandbox sandbox = isWritten ? allowWriting(toPath(medium)) : allowReading(toPath(medium));
+        sandbox.memoryLimit = uint64_t{getBoxedMemory(m_context)} << 20;
+        const std::vector<std::string> lacking = enterSandbox(sandbox);
+        if (m_context->getParameter(kBoxedParameterKey, kBoxedWarnedParameter)->isEmpty())
+            for (const std::string& text : lacking) m_log->log(kSeverityWarning, CString::fromUTF8(text));
+    }
+    m_isConfined = true;
 }
 
 void CSlave::servePlugin() {

@@ -41,6 +41,7 @@ private:
     sonora2::common::ISonoraPlugin& requirePlugin() const;
     void servePlugin();
     void beforeMedia(const P<peru::IURI>& medium, bool isWritten);
+    void confine(const P<peru::IURI>& medium, bool isWritten);
 
     SSlaveOptions m_options;
     P<CSlaveLog> m_log;
@@ -49,6 +50,7 @@ private:
     P<sonora2::common::ISonoraPlugin> m_plugin;
     P<peru::CException> m_loadFailure;
     P<peru::CRemoteStreamClient> m_remote; // destroyed first: its procedures hold objects of the plug-in
+    bool m_isConfined = false;
     std::atomic<bool> m_hasQuit{false};
 };
 

@@ -6,12 +6,23 @@
 
 namespace sonora2::common {
 
+namespace {
+
+uint32_t getNumber(const P<ISonoraContext>& context, const char* name, uint32_t otherwise) {
+    const std::string text = peru::CString::toStdString(context->getParameter(kBoxedParameterKey, name));
+    uint32_t number = 0;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    return error == std::errc() && end == text.data() + text.size() ? number : otherwise;
+}
+
+} // namespace
+
 uint32_t getBoxedDeadline(const P<ISonoraContext>& context) {
-    const std::string text =
-        peru::CString::toStdString(context->getParameter(kBoxedParameterKey, kBoxedDeadlineParameter));
-    uint32_t milliseconds = 0;
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), milliseconds);
-    return error == std::errc() && end == text.data() + text.size() ? milliseconds : kBoxedDeadline;
+    return getNumber(context, kBoxedDeadlineParameter, kBoxedDeadline);
+}
+
+uint32_t getBoxedMemory(const P<ISonoraContext>& context) {
+    return getNumber(context, kBoxedMemoryParameter, kBoxedMemory);
 }
 
 bool isBoxedPlugin(const P<ISonoraContext>& context, const peru::CStringArg& name) {

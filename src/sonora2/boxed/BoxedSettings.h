@@ -15,10 +15,16 @@ constexpr const char* kBoxedPluginsParameter = "plugins";
 // without limit; if empty, the default.
 constexpr const char* kBoxedDeadlineParameter = "deadline";
 constexpr uint32_t kBoxedDeadline = 30'000;
+// MiB that a slave may use in addition to its libraries; 0 means without limit; if empty, the default.
+constexpr const char* kBoxedMemoryParameter = "memory";
+constexpr uint32_t kBoxedMemory = 1024;
+// Set once a slave has had the opportunity to log what the kernel lacks for its sandbox.
+constexpr const char* kBoxedWarnedParameter = "warned";
 // Followed by a plug-in's name: the URI of its library. The slave searches for the library without it.
 constexpr const char* kBoxedLibraryParameter = "library:";
 
 SONORA2_API uint32_t getBoxedDeadline(const P<ISonoraContext>& context); // milliseconds
+SONORA2_API uint32_t getBoxedMemory(const P<ISonoraContext>& context);   // MiB
 // Whether the context's list contains the plug-in.
 SONORA2_API bool isBoxedPlugin(const P<ISonoraContext>& context, const peru::CStringArg& name);
 

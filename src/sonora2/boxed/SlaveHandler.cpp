@@ -150,6 +150,7 @@ void CSlaveHandler::createSlave() {
         m_context->writeTo(out);
         out->flush();
     });
+    m_context->setParameter(kBoxedParameterKey, kBoxedWarnedParameter, peru::newString("1"));
     m_pluginClient = client;
     if (const P<ILogManager> log = m_context->getLogManager())
         replayLog(call("getLog", [&] { return client->getLog(); }), *log);

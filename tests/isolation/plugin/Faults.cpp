@@ -34,7 +34,7 @@ void report(const char* attempt, bool hasFailed) {
 }
 
 void writeToNull() {
-    int* volatile nowhere = nullptr;
+    volatile int* volatile nowhere = nullptr;
     *nowhere = 1;
 }
 

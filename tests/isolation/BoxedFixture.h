@@ -1,0 +1,168 @@
+// A host whose only plug-in is the faulty one, in a process of its own.
+#pragma once
+
+#include "peru/IInterfaceQuery.h"
+#include "sonora2/boxed/BoxedSettings.h"
+#include "sonora2/context/LastFailure.h"
+#include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/context/SonoraError.h"
+#include "sonora2/media/IDiscardable.h"
+#include "sonora2/plugins/PluginHandler.h"
+#include "support/Environment.h"
+#include "support/Files.h"
+#include "support/MediaBase.h"
+#include "support/TempFolder.h"
+
+#include <chrono>
+#include <fstream>
+#include <functional>
+#include <sstream>
+#include <sys/wait.h>
+#include <thread>
+
+namespace tests {
+
+// The children of a process, by the parents of all processes.
+inline std::vector<pid_t> listChildren(pid_t parent) {
+    std::vector<pid_t> children;
+    for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
+        const std::string text = readFile(entry.path() / "stat");
+        const size_t end = text.rfind(") ");
+        if (end == std::string::npos) continue;
+        std::istringstream fields(text.substr(end + 2));
+        char state = 0;
+        pid_t id = 0;
+        fields >> state >> id;
+        if (id == parent) children.push_back(std::atoi(text.c_str()));
+    }
+    return children;
+}
+
+// Waits for what other processes and threads do, but not forever.
+inline bool waitUntil(const std::function<bool()>& condition) {
+    for (int i = 0; i < 2'000; ++i) {
+        if (condition()) return true;
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+    }
+    return condition();
+}
+
+class Boxed : public testing::Test {
+protected:
+    static constexpr int kFrames = 20'000;
+
+    Boxed() { setDeadline(30'000); }
+
+    void setDeadline(int milliseconds) {
+        m_context->setParameter(sonora2::common::kBoxedParameterKey, sonora2::common::kBoxedDeadlineParameter,
+                                peru::CString::fromUTF8(std::to_string(milliseconds)));
+    }
+    void setMemory(int mebibytes) {
+        m_context->setParameter(sonora2::common::kBoxedParameterKey, sonora2::common::kBoxedMemoryParameter,
+                                peru::CString::fromUTF8(std::to_string(mebibytes)));
+    }
+
+    // Run a whole job and return the message of its error; empty if there was none. Errors of other types
+    // than the framework's leave the functions.
+    std::string decode(const std::string& name, std::string* samples = nullptr) {
+        return messageOf([&] {
+            const auto uri = toURI(m_media.write(name, std::to_string(kFrames)));
+            const auto source = m_handler->createAudioSource(uri, 1000, 2, 2, false);
+            if (!source) throw failure();
+            source->open();
+            source->getDuration();
+            source->skipToTime(0.5);
+            source->skipToTime(0.0);
+            source->getSampleRate();
+            const std::string all = readAll(source);
+            if (samples) *samples = all;
+            source->close();
+        });
+    }
+    std::string encode(const std::filesystem::path& target) {
+        P<sonora2::common::IAudioFormat> format;
+        const std::string message = messageOf([&] {
+            format = m_handler->createAudioFormat(toURI(target), 1000, 2, 2);
+            if (!format) throw failure();
+            format->setAudioQuality(0.5);
+            format->open();
+            format->getEstimatedSizeBytes(1.0);
+            for (int i = 0; i < 200; ++i) format->writeAudioChunk(m_chunk);
+            format->close();
+        });
+        // As an encoding job does.
+        const auto discardable = peru::interfaceCast<sonora2::common::IDiscardable>(format);
+        if (!message.empty() && discardable) discardable->discard();
+        return message;
+    }
+
+    // The next job works, and nothing is left of those before it.
+    void expectHealthy() {
+        std::string samples;
+        EXPECT_EQ(decode("healthy.faulty", &samples), "");
+        EXPECT_EQ(samples, m_expected);
+        EXPECT_TRUE(waitUntil([] { return listChildren(::getpid()).empty(); }));
+        EXPECT_EQ(countEntries(m_temporary.path()), 0u);
+        EXPECT_TRUE(waitUntil([&] { return countSockets() == 0; }));
+    }
+    size_t countSockets() const {
+        size_t count = 0;
+        for (const auto& entry : std::filesystem::recursive_directory_iterator(m_runtime.path()))
+            count += entry.is_socket();
+        return count;
+    }
+    static size_t countDescriptors() { return countEntries("/proc/self/fd"); }
+
+    CTempFolder m_media;
+    CTempFolder m_out;
+    CTempFolder m_temporary;
+    CTempFolder m_runtime;
+    CEnvironment m_pluginPath{"TONEWRIGHT_PLUGIN_PATH", FAULTY_PLUGINS};
+    CEnvironment m_temporaryPath{"TMPDIR", m_temporary.path().string()};
+    CEnvironment m_runtimePath{"XDG_RUNTIME_DIR", m_runtime.path().string()};
+    P<sonora2::audio::CSonoraContextAudio> m_context = makeContext();
+    P<sonora2::common::CPluginHandler> m_handler =
+        peru::make<sonora2::common::CPluginHandler>(m_context, true);
+    const P<sonora2::audio::IAudioChunk> m_chunk = makeChunk();
+    const std::string m_expected = makeExpected();
+
+private:
+    static P<sonora2::audio::CSonoraContextAudio> makeContext() {
+        const auto context = peru::make<sonora2::audio::CSonoraContextAudio>();
+        context->addPluginName("sonora2_faulty");
+        return context;
+    }
+    static P<sonora2::audio::IAudioChunk> makeChunk() {
+        const std::string bytes = patternBytes(20'000);
+        const P<peru::IMemoryBlock> block =
+            peru::make<peru::CMemoryBlock>(static_cast<int64_t>(bytes.size()));
+        bytes.copy(reinterpret_cast<char*>(block->getData()), bytes.size());
+        return peru::make<sonora2::audio::CAudioChunk>(0.0, block);
+    }
+    // The plug-in's signal.
+    static std::string makeExpected() {
+        std::string bytes;
+        for (int frame = 0; frame < kFrames; ++frame)
+            for (int channel = 0; channel < 2; ++channel) {
+                const int sample = (frame * 4 + channel) & 0x7fff;
+                bytes += {static_cast<char>(sample), static_cast<char>(sample >> 8)};
+            }
+        return bytes;
+    }
+    static sonora2::common::CSonoraError failure() {
+        return sonora2::common::CSonoraError(
+            peru::CString::fromUTF8(sonora2::common::getLastFailure().message));
+    }
+    template <class Job> static std::string messageOf(Job job) {
+        sonora2::common::clearLastFailure();
+        try {
+            job();
+        } catch (const sonora2::common::CSonoraError& error) {
+            const std::string message = text(error.getDescription());
+            return message.empty() ? "an error without a text" : message;
+        }
+        return {};
+    }
+};
+
+} // namespace tests

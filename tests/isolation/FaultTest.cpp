@@ -1,0 +1,141 @@
+#include "isolation/BoxedFixture.h"
+#include "isolation/plugin/Faults.h"
+
+#include <gmock/gmock.h>
+
+#include <sys/socket.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+namespace {
+
+using namespace tests;
+using testing::HasSubstr;
+using testing::Not;
+
+struct SFault {
+    const char* name;
+    const char* message; // part of it
+};
+
+// With sanitizers, some crashes are exits with an error of theirs.
+#ifdef TONEWRIGHT_SANITIZED
+constexpr const char* kSegmentation = "sonora2_faulty";
+constexpr const char* kAbort = "sonora2_faulty";
+#else
+constexpr const char* kSegmentation = "SIGSEGV";
+constexpr const char* kAbort = "SIGABRT";
+#endif
+
+const SFault kCrashes[] = {
+    {"null-write", kSegmentation}, {"stack-overflow", kSegmentation}, {"abort", kAbort},
+    {"terminate", kAbort},         {"exit", "exit code 3"},           {"kill", "signal 9"},
+};
+const SFault kExceptions[] = {
+    {"throw-std", "a mistake of the plug-in"},
+    {"throw-own", "an error of the plug-in"},
+    {"throw-int", "exception"},
+};
+constexpr const char* kReading[] = {
+    "create", "open", "skipToTime", "getDuration", "getSampleRate", "getNextAudioChunk", "close"};
+constexpr const char* kWriting[] = {
+    "create", "setAudioQuality", "open", "getEstimatedSizeBytes", "writeAudioChunk", "close"};
+
+std::string nameOf(const SFault& fault, const char* operation) {
+    return std::string(fault.name) + "@" + operation + ".faulty";
+}
+
+} // namespace
+
+TEST_F(Boxed, EveryCrashWhileReadingIsAnError) {
+    for (const SFault& fault : kCrashes)
+        EXPECT_THAT(decode(nameOf(fault, "getNextAudioChunk")), HasSubstr(fault.message)) << fault.name;
+    for (const char* operation : kReading)
+        EXPECT_THAT(decode(nameOf(kCrashes[4], operation)), HasSubstr("exit code 3")) << operation;
+    expectHealthy();
+}
+
+TEST_F(Boxed, EveryCrashWhileWritingIsAnErrorAndLeavesNoFile) {
+    for (const SFault& fault : kCrashes)
+        EXPECT_THAT(encode(m_out / nameOf(fault, "writeAudioChunk")), HasSubstr(fault.message)) << fault.name;
+    for (const char* operation : kWriting)
+        EXPECT_THAT(encode(m_out / nameOf(kCrashes[4], operation)), HasSubstr("exit code 3")) << operation;
+    EXPECT_EQ(countEntries(m_out.path()), 0u);
+    const auto existing = m_out.write(nameOf(kCrashes[4], "close"), "old");
+    EXPECT_THAT(encode(existing), HasSubstr("exit code 3"));
+    EXPECT_EQ(readFile(existing), "old");
+    EXPECT_EQ(countEntries(m_out.path()), 1u);
+    expectHealthy();
+}
+
+TEST_F(Boxed, ExceptionsCrossWithTheirText) {
+    for (const SFault& fault : kExceptions) {
+        for (const char* operation : kReading)
+            EXPECT_THAT(decode(nameOf(fault, operation)), HasSubstr(fault.message))
+                << fault.name << operation;
+        for (const char* operation : kWriting)
+            EXPECT_THAT(encode(m_out / nameOf(fault, operation)), HasSubstr(fault.message))
+                << fault.name << operation;
+    }
+    EXPECT_EQ(countEntries(m_out.path()), 0u);
+    expectHealthy();
+}
+
+TEST_F(Boxed, HangsEndAtTheDeadline) {
+    setDeadline(1'000);
+    EXPECT_THAT(decode("hang@getNextAudioChunk.faulty"), HasSubstr("does not respond"));
+    EXPECT_THAT(encode(m_out / "hang@close.faulty"), HasSubstr("does not respond"));
+    EXPECT_EQ(countEntries(m_out.path()), 0u);
+    setDeadline(30'000);
+    expectHealthy();
+}
+
+TEST_F(Boxed, NonsenseOnTheWireIsAnError) {
+    const size_t before = countDescriptors();
+    for (const char* operation : {"create", "getNextAudioChunk"})
+        for (const char* fault : {"garbage", "close-all"})
+            EXPECT_THAT(decode(nameOf({fault, ""}, operation)), Not("")) << fault << operation;
+    expectHealthy();
+    EXPECT_TRUE(waitUntil([&] { return countDescriptors() <= before + 1; })); // the random numbers' device
+}
+
+TEST_F(Boxed, MemoryIsLimited) {
+#ifdef TONEWRIGHT_SANITIZED
+    GTEST_SKIP() << "sanitizers reserve more memory than any limit";
+#endif
+    setMemory(128);
+    EXPECT_THAT(decode("allocate@open.faulty"), HasSubstr("bad_alloc"));
+    EXPECT_THAT(encode(m_out / "allocate@writeAudioChunk.faulty"), HasSubstr("bad_alloc"));
+    EXPECT_EQ(countEntries(m_out.path()), 0u);
+    expectHealthy();
+}
+
+TEST_F(Boxed, HostilePluginsReachNothing) {
+    const auto victim = m_media.write("private.txt", "secret");
+    const std::string socketPath = m_media / "socket";
+    const int listener = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    socketPath.copy(address.sun_path, sizeof address.sun_path - 1);
+    ASSERT_EQ(::bind(listener, reinterpret_cast<sockaddr*>(&address), sizeof address), 0);
+    ASSERT_EQ(::listen(listener, 8), 0);
+    const CEnvironment file(faulty::kVictimFile, victim.string());
+    const CEnvironment peer(faulty::kVictimSocket, socketPath);
+
+    for (const char* attempt :
+         {"read-outside", "write-outside", "connect", "exec", "fork", "signal-parent", "trace-parent"}) {
+        for (const char* operation : {"create", "getNextAudioChunk"})
+            EXPECT_THAT(decode(nameOf({attempt, ""}, operation)), HasSubstr("refused")) << attempt;
+        EXPECT_THAT(encode(m_out / nameOf({attempt, ""}, "writeAudioChunk")), HasSubstr("refused"))
+            << attempt;
+    }
+    EXPECT_EQ(readFile(victim), "secret");
+    EXPECT_LT(::accept(listener, nullptr, nullptr), 0);
+    ::close(listener);
+    expectHealthy();
+}
+
+TEST_F(Boxed, AFloodOfLogLinesDoesNotDrownTheHost) {
+    EXPECT_EQ(decode("flood-log@getNextAudioChunk.faulty"), "");
+    expectHealthy();
+}
