@@ -17,6 +17,7 @@ class CFailures : public peru::CObject {
 public:
     void keep(const peru::CException& exception);
     P<peru::IString> take();
+    bool isEmpty() const { return !m_first; }
 
 private:
     P<peru::IString> m_first;
@@ -42,10 +43,12 @@ template <class Proc, class Body> void addFunction(peru::IRemote& remote, const 
         [operation, body](Proc& proc) { guarded(operation, [&] { body(proc); }); }));
 }
 
-// A procedure without one, whose errors are kept.
+// A procedure without one, whose errors are kept. Until the host has seen one, nothing else is executed: a
+// caller in the same process would not have gone on either, such as closing a file with a part missing.
 template <class Proc, class Body>
 P<peru::CRemoteProc> serveVoid(const P<CFailures>& failures, const char* operation, Body body) {
     return sonora2::common::serveProc<Proc>([operation, failures, body](Proc& proc) {
+        if (!failures->isEmpty()) return;
         try {
             guarded(operation, [&] { body(proc); });
         } catch (const peru::CException& exception) {
