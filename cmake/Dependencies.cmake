@@ -13,6 +13,7 @@ pkg_check_modules(MPG123 REQUIRED IMPORTED_TARGET libmpg123)
 pkg_check_modules(TAGLIB REQUIRED IMPORTED_TARGET taglib)
 pkg_check_modules(PNG REQUIRED IMPORTED_TARGET libpng)
 pkg_check_modules(SECCOMP REQUIRED IMPORTED_TARGET libseccomp)
+pkg_check_modules(AV REQUIRED IMPORTED_TARGET libavformat libavcodec libswscale libswresample libavutil)
 
 find_path(LAME_INCLUDE_DIR lame/lame.h REQUIRED)
 find_library(LAME_LIBRARY mp3lame REQUIRED)

@@ -20,6 +20,14 @@ constexpr int64_t kRunUp = 64;
 constexpr int kMaxRatio = 1024;
 constexpr int kMaxRate = 1 << 20;
 
+// More than any file holds, and small enough to be scaled.
+constexpr int64_t kUnlimited = int64_t{1} << 40;
+
+SDecodedMedia withoutEstimate(SDecodedMedia media) {
+    if (media.isEstimate) media.frames = kUnlimited;
+    return media;
+}
+
 // round(value * numerator / denominator) without overflow for the frame counts of any file that fits a disk.
 int64_t scale(int64_t value, int64_t numerator, int64_t denominator) {
     const int64_t whole = value / denominator;
@@ -33,8 +41,8 @@ CChunkProducer::CChunkProducer(const P<common::ISonoraContext>& context, const S
                                IDecoder& decoder, const SDecodedMedia& media, const SPcmFormat& wanted,
                                const SDecoderOptions& options)
     : m_memory(context->getMemoryManager()), m_file(file), m_decoder(decoder), m_options(options),
-      m_media(media), m_wanted(wanted), m_total(countDelivered(media, wanted)), m_end(m_total),
-      m_converting(!(media.format == wanted)) {
+      m_media(withoutEstimate(media)), m_wanted(wanted), m_total(countDelivered(m_media, wanted)),
+      m_end(m_total), m_converting(!(media.format == wanted)) {
     m_chunkFrames = std::clamp(kChunkBytes / wanted.frameBytes(), 1, kChunkFrames);
     if (m_converting) {
         // Frames of the file that convert to about one delivered chunk.
@@ -145,7 +153,7 @@ int CChunkProducer::readOwn(uint8_t* pcm, int frames) {
             const int count = m_decoder.read(pcm + int64_t{filled} * frameBytes, frames - filled);
             if (count <= 0) {
                 m_ended = true;
-                reportEarlyEnd();
+                if (!m_media.isEstimate) reportEarlyEnd();
                 break;
             }
             filled += count;

@@ -47,7 +47,7 @@ private:
     SDecodedMedia m_media;
     SPcmFormat m_wanted;
     int m_chunkFrames;      // delivered frames per chunk
-    const int64_t m_total;  // delivered frames
+    const int64_t m_total;  // delivered frames; unlimited if the decoder only estimates them
     int64_t m_end;          // where delivery ends; before m_total if the decoder stopped early
     int64_t m_position = 0; // next frame to deliver
     int64_t m_origin = 0;

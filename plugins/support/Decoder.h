@@ -8,9 +8,10 @@ namespace sonora2::plugins {
 
 struct SDecodedMedia {
     SPcmFormat format;
-    int64_t frames = 0;     // exact: what reading an intact file to its end delivers
-    std::string codec = {}; // to show to users, such as "FLAC" or "PCM signed 24 bit"; empty when unknown
-    int floatBytes = 0;     // size of the file's floating-point samples if deliverFloat() is supported
+    int64_t frames = 0;      // exact: what reading an intact file to its end delivers
+    std::string codec = {};  // to show to users, such as "FLAC" or "PCM signed 24 bit"; empty when unknown
+    int floatBytes = 0;      // size of the file's floating-point samples if deliverFloat() is supported
+    bool isEstimate = false; // the length is not exact: the sound ends where read() returns 0
 };
 
 struct SDecoderOptions {
@@ -39,9 +40,10 @@ public:
     virtual void close() = 0; // also called after open() has thrown; no effect when closed
     // Reads up to `frames` frames and returns the number read, which may be smaller; 0 means the end.
     // Everything that can be decoded before a damaged place is returned before the failure is thrown. An end
-    // before the stated number of frames is reported by the caller.
+    // before the stated number of frames is reported by the caller unless that is an estimate.
     virtual int read(uint8_t* pcm, int frames) = 0;
-    // The next read starts at exactly this frame, from 0 to the number of frames inclusive.
+    // The next read starts at exactly this frame, from 0 to the number of frames inclusive. If that is an
+    // estimate, the frame may be behind the end, and the next read returns 0.
     virtual void seek(int64_t frame) = 0;
     // From the next seek() until close(), reads deliver the file's floating-point samples instead of
     // integers. Only called if open() has stated their size.

@@ -54,6 +54,8 @@ void CDecoderSource::open() {
 void CDecoderSource::close() {
     if (!isOpened()) return;
     m_readAhead.reset();
+    m_peeked.reset();
+    m_peekError.reset();
     m_producer.reset();
     m_decoder->close();
     if (!m_media.format.isFloat) return;
@@ -69,7 +71,7 @@ double CDecoderSource::getDuration() {
     if (m_delivered.rate == 0) return 0.0;
     const int64_t start = toFrame(m_startTime);
     if (start == 0) return static_cast<double>(m_media.frames) / m_media.format.rate;
-    return static_cast<double>(m_total - start) / m_delivered.rate;
+    return static_cast<double>(std::max<int64_t>(m_total - start, 0)) / m_delivered.rate;
 }
 
 int CDecoderSource::getBufferStatus() {
@@ -79,7 +81,12 @@ int CDecoderSource::getBufferStatus() {
 }
 
 bool CDecoderSource::isEOF() {
-    if (!isOpened() || m_delivering >= m_total) return true;
+    if (!isOpened()) return true;
+    if (m_media.isEstimate) {
+        peekChunk();
+        return !m_peeked && !m_peekError;
+    }
+    if (m_delivering >= m_total) return true;
     return m_readAhead && m_readAhead->isEnded();
 }
 
@@ -161,13 +168,32 @@ int64_t CDecoderSource::getBitRate() {
 P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {
     requireOpened();
     if (isEOF()) return nullptr;
+    if (m_peekError) std::exchange(m_peekError, nullptr)->raise();
+    P<audio::IAudioChunk> chunk = m_peeked ? std::move(m_peeked) : pullChunk();
+    if (chunk) m_delivering += chunk->getSize() / static_cast<uint32_t>(m_delivered.frameBytes());
+    return chunk;
+}
+
+// Where the length is an estimate, only the next chunk tells whether there is one.
+void CDecoderSource::peekChunk() {
+    if (m_peeked || m_peekError) return;
+    try {
+        m_peeked = pullChunk();
+    } catch (const peru::CException& error) {
+        m_peekError = error.clone();
+    }
+    if (m_peeked || m_peekError || m_delivering == m_total || m_isBehindEnd) return;
+    // Now the length is known.
+    m_total = m_delivering;
+    m_media.frames = std::llround(static_cast<double>(m_total) * m_media.format.rate / m_delivered.rate);
+}
+
+P<audio::IAudioChunk> CDecoderSource::pullChunk() {
     if (!m_readAhead) {
         m_readAhead = std::make_unique<CReadAhead>(
             *m_producer, getReadAheadChunks(m_delivered, m_producer->getChunkFrames()));
     }
-    P<audio::IAudioChunk> chunk = m_readAhead->next();
-    if (chunk) m_delivering += chunk->getSize() / static_cast<uint32_t>(m_delivered.frameBytes());
-    return chunk;
+    return m_readAhead->next();
 }
 
 void CDecoderSource::openDecoder() {
@@ -222,14 +248,18 @@ int64_t CDecoderSource::toFrame(double seconds) const {
     // The time of a frame maps back to that frame despite rounding; times in between map to the next frame.
     const double frame = seconds * m_delivered.rate;
     if (!(frame > 0.0)) return 0;
-    if (frame >= static_cast<double>(m_total)) return m_total;
+    if (frame >= static_cast<double>(m_total))
+        return m_media.isEstimate ? std::llround(std::min(frame, 1e12)) : m_total;
     const double nearest = std::nearbyint(frame);
     return static_cast<int64_t>(std::fabs(frame - nearest) < 1e-3 ? nearest : std::ceil(frame));
 }
 
 void CDecoderSource::restartAt(int64_t frame) {
     m_readAhead.reset();
-    m_delivering = m_total; // at the end if the seek fails
+    m_peeked.reset();
+    m_peekError.reset();
+    m_isBehindEnd = m_media.isEstimate && frame >= m_total; // perhaps
+    m_delivering = m_total;                                 // at the end if the seek fails
     m_producer->setOrigin(toFrame(m_startTime));
     m_producer->seek(frame);
     m_delivering = frame;

@@ -32,7 +32,7 @@ public:
     void open() override;
     void close() override;
     void skipToTime(double fTimestamp) override;
-    double getDuration() override; // exact
+    double getDuration() override; // exact, or an estimate until the end has been read
     int getBufferStatus() override;
     bool isEOF() override;
     // On an open source, delivery restarts at the new start time.
@@ -75,6 +75,8 @@ private:
     int64_t getStartFrame() const { return toFrame(m_startTime); }
     int64_t toFrame(double seconds) const;
     void restartAt(int64_t frame); // in delivered frames from the beginning of the file
+    P<audio::IAudioChunk> pullChunk();
+    void peekChunk();
 
     P<common::ISonoraContext> m_context;
     P<peru::IString> m_pluginName;
@@ -90,6 +92,9 @@ private:
     SPcmFormat m_delivered;                     // known once opened
     int64_t m_total = 0;                        // delivered frames of the whole file
     int64_t m_delivering = 0;                   // next frame for the consumer
+    P<audio::IAudioChunk> m_peeked;             // read to find out whether this is the end
+    P<peru::CException> m_peekError;            // thrown by the next read
+    bool m_isBehindEnd = false;                 // reading started at an estimated end
     std::unique_ptr<CChunkProducer> m_producer; // while open
     std::unique_ptr<CReadAhead> m_readAhead;    // uses the producer
 };

@@ -1,0 +1,40 @@
+// Reads the packets of one stream of a media file.
+#pragma once
+
+#include "codecs/AvHandles.h"
+#include "support/MediaFile.h"
+
+namespace sonora2::plugins::av {
+
+// Reads the file itself and nothing else: formats that refer to other files or to the network cannot open
+// them. Failures are thrown as CSonoraError.
+class CDemuxer {
+public:
+    CDemuxer(const SMediaFile& file, AVMediaType type);
+    ~CDemuxer();
+    CDemuxer(const CDemuxer&) = delete;
+    CDemuxer& operator=(const CDemuxer&) = delete;
+
+    AVFormatContext& getFormat() { return *m_format; }
+    AVStream& getStream() { return *m_format->streams[m_stream]; }
+    double getDuration() const; // seconds; below 0 if unknown
+
+    bool read(AVPacket& packet); // false at the end
+    // To a packet at or before the time; false if that is not possible. `flags` as of av_seek_frame().
+    bool seek(int64_t timestamp, int flags);
+
+    // A decoder for the stream, not opened yet.
+    Codec createCodec();
+
+private:
+    static int readBytes(void* self, uint8_t* buffer, int size);
+    static int64_t seekBytes(void* self, int64_t offset, int whence);
+
+    SMediaFile m_file;
+    InputFile m_input;
+    IoContext m_io;
+    AVFormatContext* m_format = nullptr;
+    int m_stream = -1;
+};
+
+} // namespace sonora2::plugins::av
