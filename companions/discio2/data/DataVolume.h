@@ -1,0 +1,39 @@
+// The file system of a data disc.
+#pragma once
+
+#include "Error.h"
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace discio {
+
+struct SDataEntry {
+    std::string name;   // UTF-8
+    std::string stored; // the name in the form that the file system looks up
+    bool isFolder = false;
+    int64_t size = 0;
+    int64_t modified = -1; // seconds since 1970
+};
+
+// Names of the folders from the root, in their stored form.
+using DataPath = std::vector<std::string>;
+
+// Any thread.
+class IDataVolume {
+public:
+    virtual ~IDataVolume() = default;
+    virtual std::string getTitle() = 0;
+    virtual std::vector<SDataEntry> list(const DataPath& folder) = 0; // throws CDiscError
+};
+
+// ISO 9660 if there is one, otherwise UDF. Throws CDiscError.
+std::shared_ptr<IDataVolume> openDataVolume(const std::string& path);
+
+// The stored path of a folder that is named with "\" or "/" between its parts. Throws CDiscError if it does
+// not exist.
+DataPath findFolder(IDataVolume& volume, const std::string& path);
+
+} // namespace discio

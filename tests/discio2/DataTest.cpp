@@ -1,0 +1,74 @@
+#include "discio2/DiscSupport.h"
+
+using namespace tests;
+
+namespace {
+
+// All entries below a cursor, with "\" behind folders.
+std::vector<std::string> listAll(DISCIO_DataCursor* cursor) {
+    std::vector<std::string> found;
+    while (DISCIO_DataCursorNext(cursor) == 1) {
+        std::string path = narrow(DISCIO_DataCursorGetDiscPathW(cursor));
+        if (DISCIO_DataCursorIsFolder(cursor) == 1) {
+            found.push_back(path + "\\");
+            const Discio<DISCIO_DataCursor> sub(DISCIO_DataCursorCreateSubCursor(cursor));
+            for (const std::string& each : listAll(sub.get())) found.push_back(each);
+        } else {
+            found.push_back(path + " " + std::to_string(DISCIO_DataCursorGetSize(cursor)));
+        }
+    }
+    std::sort(found.begin(), found.end());
+    return found;
+}
+
+} // namespace
+
+// Other programs write the file systems.
+TEST(Data, FilesAreListedInEveryFileSystem) {
+    const CTempFolder folder;
+    std::filesystem::create_directories(folder / "in/Sub folder/deep");
+    folder.write("in/a rather long name.text", "12345");
+    folder.write("in/Sub folder/deep/x.bin", std::string(5000, 'x'));
+    const std::vector<std::string> expected{"\\Sub folder\\", "\\Sub folder\\deep\\",
+                                            "\\Sub folder\\deep\\x.bin 5000", "\\a rather long name.text 5"};
+    for (const std::vector<std::string>& options :
+         {std::vector<std::string>{"-J"}, {"-R"}, {"-J", "-R"}, {"-udf", "-R"}}) {
+        std::vector<std::string> command{"genisoimage", "-quiet", "-V", "My disc", "-o", "disc.iso"};
+        command.insert(command.end(), options.begin(), options.end());
+        command.push_back("in");
+        ASSERT_EQ(run(command, folder.path()).exitCode, 0);
+        const SOpenDisc open(folder / "disc.iso");
+        ASSERT_TRUE(open.disc) << open.getError();
+        EXPECT_EQ(DISCIO_DiscHasDataComponent(open.disc.get()), 1);
+        EXPECT_EQ(DISCIO_DiscHasAudioComponent(open.disc.get()), 0);
+        EXPECT_EQ(narrow(DISCIO_DiscDataGetTitleW(open.disc.get())), "My disc");
+        const Discio<DISCIO_DataCursor> cursor(DISCIO_DiscDataCreateCursorW(open.disc.get(), u"\\"));
+        ASSERT_TRUE(cursor) << open.getError();
+        EXPECT_EQ(listAll(cursor.get()), expected) << options[0];
+        EXPECT_EQ(DISCIO_DiscDataFolderExistsW(open.disc.get(), u"Sub folder\\deep\\"), 1);
+        EXPECT_EQ(DISCIO_DiscDataFolderExistsW(open.disc.get(), u"Sub folder\\none"), 0);
+        EXPECT_EQ(DISCIO_DiscDataFolderExistsW(open.disc.get(), u"a rather long name.text"), 0);
+        EXPECT_EQ(DISCIO_GetLastError(nullptr), DISCIO_ERROR_NOT_A_FOLDER);
+    }
+}
+
+TEST(Data, AMixedDiscHasBothComponents) {
+    const CTempFolder folder;
+    folder.write("file", "12345");
+    ASSERT_EQ(run({"genisoimage", "-quiet", "-J", "-o", "data.iso", "file"}, folder.path()).exitCode, 0);
+    const std::string audio = makeSectors(10, 7);
+    folder.write("audio.bin", audio);
+    const auto blocks = std::filesystem::file_size(folder / "data.iso") / 2048;
+    const SOpenDisc open(folder.write(
+        "mixed.cue", "FILE data.iso BINARY\nTRACK 01 MODE1/2048\nINDEX 01 00:00:00\n"
+                     "FILE audio.bin BINARY\nTRACK 02 AUDIO\nPREGAP 00:02:00\nINDEX 01 00:00:00\n"));
+    ASSERT_TRUE(open.disc) << open.getError();
+    EXPECT_EQ(open.describe(), "0+" + std::to_string(blocks) + "-150 " + std::to_string(blocks + 150) +
+                                   "+10-150 | " + std::to_string(blocks + 160));
+    EXPECT_EQ(DISCIO_DiscGetComponentCount(open.disc.get()), 2);
+    EXPECT_EQ(DISCIO_DiscGetComponentType(open.disc.get(), 0), 2);
+    EXPECT_EQ(DISCIO_DiscGetComponentType(open.disc.get(), 1), 1);
+    EXPECT_TRUE(open.readSegment(0) == audio);
+    const Discio<DISCIO_DataCursor> cursor(DISCIO_DiscDataCreateCursorW(open.disc.get(), u""));
+    EXPECT_EQ(listAll(cursor.get()), std::vector<std::string>{"\\file 5"}) << open.getError();
+}
