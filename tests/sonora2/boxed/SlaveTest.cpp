@@ -65,7 +65,7 @@ TEST_F(Slave, Death_IsAnErrorAndTheNextSourceWorks) {
     {
         const P<IAudioSource> source = open(*boxed);
         source->getNextAudioChunk();
-        ::kill(slaveOf(), SIGKILL);
+        signalSlave(SIGKILL);
         const std::string reason = reasonOf([&] { bytesOf(source); });
         EXPECT_THAT(reason, HasSubstr("testplugin_good"));
         EXPECT_THAT(reason, HasSubstr("x.tst"));
@@ -81,7 +81,7 @@ TEST_F(Slave, Death_IsAnErrorAndTheNextSourceWorks) {
 #ifndef TONEWRIGHT_SANITIZED
 TEST_F(Slave, Crash_IsReportedWithThePluginAndTheFile) {
     const P<IAudioSource> source = open(*boxed);
-    ::kill(slaveOf(), SIGSEGV);
+    signalSlave(SIGSEGV);
     const std::string reason = reasonOf([&] { bytesOf(source); });
     EXPECT_THAT(reason,
                 testing::StartsWith("CSonoraPluginBoxed::checkForSlaveError: Error in sonora2_slave:\n\n"));
@@ -95,7 +95,7 @@ TEST_F(Slave, Hang_EndsWithTheDeadline) {
     context->setParameter(kBoxedParameterKey, kBoxedDeadlineParameter, peru::CString::fromUTF8("2000"));
     const P<IAudioSource> source = open(*boxed);
     ASSERT_TRUE(source);
-    ::kill(slaveOf(), SIGSTOP);
+    signalSlave(SIGSTOP);
     const auto start = std::chrono::steady_clock::now();
     EXPECT_THAT(reasonOf([&] { bytesOf(source); }), HasSubstr("does not respond"));
     EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(60));
@@ -126,7 +126,7 @@ TEST_F(Slave, UnfinishedOutputOfADeadSlave_IsRemovedByDiscard) {
         const P<IAudioFormat> format = write(name);
         // What the plug-in would write.
         if (std::string(name) == "new.tst") folder.write(name, "new");
-        ::kill(slaveOf(), SIGKILL);
+        signalSlave(SIGKILL);
         EXPECT_NE("", reasonOf([&] { format->close(); })) << "the file is not complete";
         peru::interfaceCast<IDiscardable>(format)->discard();
     }
