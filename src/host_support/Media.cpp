@@ -26,7 +26,7 @@ bool askPlugins(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int 
     const P<peru::IString> wanted = getLookupKey(uri, handler->getURISuffix());
     for (int i = 0; i < handler->getPluginCount(); ++i) {
         const P<ISonoraPlugin> plugin = handler->getPlugin(i);
-        const P<IPluginExtensions> extensions = plugin->getValidExtensions(type);
+        const P<IPluginExtensions> extensions = handler->getPlainPlugin(i)->getValidExtensions(type);
         for (int k = 0; extensions && k < extensions->getCount(); ++k) {
             if (!extensions->getExtension(k)->equals(wanted)) continue;
             if (ask(*plugin)) return true;

@@ -42,6 +42,9 @@ public:
     // Suffix of temporary names; removed from a name before its extension is determined.
     virtual void setURISuffix(const peru::CStringArg& suffix) = 0;
     virtual P<peru::IString> getURISuffix() = 0;
+    // The same plug-in as getPlugin, in this process in any case: for questions about types and extensions,
+    // which should not start a process. Must not be used to create objects.
+    virtual P<ISonoraPlugin> getPlainPlugin(int index) = 0;
 };
 
 } // namespace sonora2::common

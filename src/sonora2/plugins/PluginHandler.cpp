@@ -147,6 +147,12 @@ P<ISonoraPlugin> CPluginHandler::getPlugin(int index) {
     return m_plugins[static_cast<size_t>(index)];
 }
 
+P<ISonoraPlugin> CPluginHandler::getPlainPlugin(int index) {
+    if (index < 0 || index >= getPluginCount())
+        throw peru::CInvalidArgError("index", "CPluginHandler::getPlainPlugin");
+    return m_plainPlugins[static_cast<size_t>(index)];
+}
+
 void CPluginHandler::setVerifyByOpening(bool verify) {
     peru::CMutexLock lock(m_lock);
     m_verifyByOpening = verify;

@@ -49,6 +49,7 @@ public:
     bool getVerifyByOpening() override;
     void setURISuffix(const peru::CStringArg& suffix) override;
     P<peru::IString> getURISuffix() override;
+    P<ISonoraPlugin> getPlainPlugin(int index) override; // throws CInvalidArgError
 
     // `plugin` creates objects, `plainPlugin` is asked for extensions and never starts a slave; for plug-ins
     // that run in this process both are the same object. Must not be called once create calls may run.
