@@ -1,5 +1,6 @@
 #include "sonora2/boxed/BoxedSettings.h"
 
+#include <algorithm>
 #include <charconv>
 #include <string>
 #include <string_view>
@@ -29,10 +30,14 @@ bool isBoxedPlugin(const P<ISonoraContext>& context, const peru::CStringArg& nam
     const std::string list =
         peru::CString::toStdString(context->getParameter(kBoxedParameterKey, kBoxedPluginsParameter));
     const std::string wanted = peru::CString::toStdString(name);
+    const auto isNamed = [&](std::string_view each) {
+        constexpr std::string_view kPrefix = "sonora2_";
+        return each == wanted || (wanted.starts_with(kPrefix) && wanted.substr(kPrefix.size()) == each);
+    };
     std::string_view rest = list;
     while (!rest.empty()) {
         const std::string_view each = rest.substr(0, rest.find(','));
-        if (each == "all" || each == wanted) return true;
+        if (each == "all" || isNamed(each)) return true;
         rest.remove_prefix(std::min(rest.size(), each.size() + 1));
     }
     return false;

@@ -8,8 +8,8 @@
 namespace sonora2::common {
 
 constexpr uint32_t kBoxedParameterKey = 2;
-// Names of the plug-ins that run in a process of their own, separated by commas, or "all". Used when a
-// plug-in handler loads its plug-ins.
+// Names of the plug-ins that run in a process of their own, separated by commas and with or without their
+// "sonora2_", or "all". Used when a plug-in handler loads its plug-ins.
 constexpr const char* kBoxedPluginsParameter = "plugins";
 // Milliseconds that one call into a slave may take before the slave counts as hanging and is killed. 0 means
 // without limit; if empty, the default.
