@@ -1,6 +1,7 @@
 // tonewright: converts, plays, mixes and records sound files, shows their properties, draws their waveforms
 // and changes their tags.
 #include "arguments/Arguments.h"
+#include "arguments/Shared.h"
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
@@ -78,6 +79,8 @@ int main(int argc, char** argv) {
                    "Print the library's log from this level on: trace, debug, info, warning, error or off")
         ->option_text("LEVEL")
         ->transform(CLI::CheckedTransformer(kLogLevels, CLI::ignore_case).description(""));
+    std::string boxed;
+    addBoxed(app, boxed);
     app.footer(
         "Exit codes: 0 success, 1 a file failed, 2 invalid arguments, 3 no sound device, 4 the library "
         "cannot be loaded or started, 130 stopped by Ctrl-C.");
@@ -101,6 +104,7 @@ int main(int argc, char** argv) {
 
     // Other programs stop reading the fields of a WAV file at one of odd length without padding.
     ::setenv("TONEWRIGHT_PAD_INFO", "1", 0);
+    if (!boxed.empty()) ::setenv("TONEWRIGHT_BOXED", boxed.c_str(), 1);
     try {
         watchForCancel();
         CLibrary library;

@@ -89,6 +89,17 @@ void checkBitRates(const SFormatOptions& options) {
         throw CLI::ValidationError("--max-bitrate", "is less than --bitrate");
 }
 
+void addBoxed(CLI::App& app, std::string& plugins) {
+    app.add_flag(
+           "--boxed{all}", plugins,
+           "Run plug-ins in processes of their own, so that one that crashes on a damaged file does not "
+           "end the job: all, none, or names separated by commas, such as --boxed=flac,vorbis")
+        ->check([](const std::string& list) {
+            return list.find_first_of(" ;/") == std::string::npos ? std::string()
+                                                                  : "names are separated by commas";
+        });
+}
+
 void addOutput(CLI::App& command, EOutput& show) {
     auto* json = command.add_flag_callback(
         "--json", [&] { show = EOutput::json; }, "Print events as JSON, one per line");

@@ -26,6 +26,9 @@ std::string toWholeNumber(std::string& text, const std::string& unit);
 // Throws CLI::ValidationError if the bit rates contradict each other.
 void checkBitRates(const SFormatOptions& options);
 
+// "--boxed" with or without a list of plug-ins, which is left empty without the option.
+void addBoxed(CLI::App& app, std::string& plugins);
+
 // "--json" and "--quiet".
 void addOutput(CLI::App& command, EOutput& show);
 
