@@ -1,0 +1,100 @@
+// Decoding in a slave process compared with decoding in this process: wall time, and the processor time of
+// both processes. The start and the end of the slave are included.
+#include "peru/system/IPathes.h"
+#include "sonora2/context/SonoraContextAudio.h"
+#include "sonora2/media/AudioChunk.h"
+#include "sonora2/plugins/PluginHandler.h"
+
+#include <benchmark/benchmark.h>
+
+#include <cmath>
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+#include <sys/resource.h>
+
+using namespace sonora2::common;
+using peru::CString;
+
+namespace {
+
+constexpr int kRate = 44100;
+constexpr int kSeconds = 300;
+
+double getProcessorTime() {
+    double seconds = 0.0;
+    for (const int who : {RUSAGE_SELF, RUSAGE_CHILDREN}) {
+        rusage usage = {};
+        ::getrusage(who, &usage);
+        for (const timeval& time : {usage.ru_utime, usage.ru_stime})
+            seconds += static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_usec) / 1e6;
+    }
+    return seconds;
+}
+
+class CMedia {
+public:
+    CMedia() {
+        std::string name = std::filesystem::temp_directory_path() / "boxed-bench-XXXXXX";
+        m_folder = ::mkdtemp(name.data());
+        for (const char* plugin : {"sonora2_flac", "sonora2_decmpa", "sonora2_l3codec"})
+            m_context->addPluginName(plugin);
+        plain = peru::make<CPluginHandler>(m_context, false);
+        boxed = peru::make<CPluginHandler>(m_context, true);
+        for (const char* extension : {"flac", "mp3"}) write(extension);
+    }
+    ~CMedia() { std::filesystem::remove_all(m_folder); }
+
+    P<peru::IURI> getURI(const std::string& extension) const {
+        return peru::getPathes()->fromPlatformPath(
+            CString::fromUTF8((m_folder / ("x." + extension)).string()));
+    }
+
+    P<CPluginHandler> plain;
+    P<CPluginHandler> boxed;
+
+private:
+    // Tones with noise, which compress about as well as music.
+    void write(const std::string& extension) {
+        const P<IAudioFormat> format = plain->createAudioFormat(getURI(extension), kRate, 2, 2);
+        format->open();
+        uint32_t noise = 1;
+        for (int second = 0; second < kSeconds; ++second) {
+            const auto block = peru::make<peru::CMemoryBlock>(kRate * 4);
+            auto* samples = reinterpret_cast<int16_t*>(block->getData());
+            for (int i = 0; i < kRate; ++i) {
+                noise = noise * 1664525 + 1013904223;
+                const double tone = std::sin(0.05 * i + second) + std::sin(0.013 * i);
+                samples[i * 2] = static_cast<int16_t>(8000 * tone + static_cast<int>(noise >> 22) - 512);
+                samples[i * 2 + 1] = static_cast<int16_t>(7000 * tone + static_cast<int>(noise >> 23) - 256);
+            }
+            format->writeAudioChunk(peru::make<sonora2::audio::CAudioChunk>(second, block));
+        }
+        format->close();
+    }
+
+    std::filesystem::path m_folder;
+    P<sonora2::audio::CSonoraContextAudio> m_context = peru::make<sonora2::audio::CSonoraContextAudio>();
+};
+
+void decode(benchmark::State& state, const char* extension, bool isBoxed) {
+    static CMedia s_media;
+    const double start = getProcessorTime();
+    int64_t bytes = 0;
+    for (auto _ : state) {
+        const P<IAudioSource> source = (isBoxed ? s_media.boxed : s_media.plain)
+                                           ->createAudioSource(s_media.getURI(extension), kRate, 2, 2, true);
+        while (!source->isEOF())
+            if (const auto chunk = source->getNextAudioChunk()) bytes += chunk->getSize();
+    }
+    state.SetBytesProcessed(bytes);
+    state.counters["processors"] =
+        benchmark::Counter((getProcessorTime() - start) * 1e3, benchmark::Counter::kAvgIterations);
+}
+
+BENCHMARK_CAPTURE(decode, flac_plain, "flac", false)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(decode, flac_boxed, "flac", true)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(decode, mp3_plain, "mp3", false)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(decode, mp3_boxed, "mp3", true)->UseRealTime()->Unit(benchmark::kMillisecond);
+
+} // namespace
