@@ -6,10 +6,21 @@ namespace slave {
 
 namespace {
 
-char g_text[2048];
+constexpr size_t kSize = 2048;
+constexpr size_t kCallRoom = 128; // for the line of the call
+
+char g_text[kSize];
 std::string g_plugin;
 std::string g_file;
+const char* g_operation = nullptr;
 size_t g_callStart = 0; // where the line of the call begins
+
+void writeCall() {
+    if (g_operation)
+        std::snprintf(g_text + g_callStart, kCallRoom, "Call: %s\n", g_operation);
+    else
+        g_text[g_callStart] = '\0';
+}
 
 } // namespace
 
@@ -19,30 +30,29 @@ const char* CCrashDetails::getText() {
 
 void CCrashDetails::setPlugin(const std::string& name) {
     g_plugin = name;
-    write(nullptr);
+    write();
 }
 
 void CCrashDetails::setFile(const std::string& name) {
     g_file = name;
-    write(nullptr);
+    write();
 }
 
-void CCrashDetails::write(const char* operation) {
-    int length = std::snprintf(g_text, sizeof g_text - 128, "Plug-in: %s\n", g_plugin.c_str());
-    if (!g_file.empty() && length > 0 && static_cast<size_t>(length) < sizeof g_text - 128)
-        length += std::snprintf(g_text + length, sizeof g_text - 128 - static_cast<size_t>(length),
-                                "File: %s\n", g_file.c_str());
-    g_text[sizeof g_text - 128] = '\0';
-    g_callStart = std::char_traits<char>::length(g_text);
-    if (operation) std::snprintf(g_text + g_callStart, sizeof g_text - g_callStart, "Call: %s\n", operation);
+void CCrashDetails::write() {
+    std::string text = "Plug-in: " + g_plugin + "\n";
+    if (!g_file.empty()) text += "File: " + g_file + "\n";
+    g_callStart = text.copy(g_text, kSize - kCallRoom);
+    writeCall();
 }
 
 CCrashDetails::CCall::CCall(const char* operation) {
-    std::snprintf(g_text + g_callStart, sizeof g_text - g_callStart, "Call: %s\n", operation);
+    g_operation = operation;
+    writeCall();
 }
 
 CCrashDetails::CCall::~CCall() {
-    g_text[g_callStart] = '\0';
+    g_operation = nullptr;
+    writeCall();
 }
 
 } // namespace slave

@@ -16,14 +16,14 @@ public:
     // The operation that is executed during the scope.
     class CCall {
     public:
-        explicit CCall(const char* operation);
+        explicit CCall(const char* operation); // a literal
         ~CCall();
         CCall(const CCall&) = delete;
         CCall& operator=(const CCall&) = delete;
     };
 
 private:
-    static void write(const char* operation);
+    static void write();
 };
 
 } // namespace slave

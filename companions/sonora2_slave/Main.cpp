@@ -87,7 +87,7 @@ void installCrashHandler([[maybe_unused]] int file) {
 #ifndef TONEWRIGHT_SANITIZED // which report crashes themselves
     if (file < 0) return;
     crashhandler::install({"Tonewright " TONEWRIGHT_VERSION " sonora2_slave", nullptr, nullptr, file,
-                           slave::CCrashDetails::getText()});
+                           slave::CCrashDetails::getText(), false});
 #endif
 }
 

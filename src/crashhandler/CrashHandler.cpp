@@ -38,6 +38,7 @@ struct SInstalled {
     char dump[4096] = {};
     int reportFile = -1;
     const char* details = nullptr;
+    bool modules = true;
     struct sigaction previous[kSignalCount] = {};
     std::terminate_handler previousTerminate = nullptr;
     uintptr_t stackLimit = std::numeric_limits<uintptr_t>::max();
@@ -123,6 +124,7 @@ void writeReport(CSafeWriter& out, size_t signalIndex, const siginfo_t& signal, 
     void* frames[128];
     const int count = ::backtrace(frames, std::size(frames));
     for (int i = 0; i < count; ++i) writeFrame(out, reinterpret_cast<uintptr_t>(frames[i]));
+    if (!g_installed.modules) return;
     out.text("\nModules:\n");
     out.writeFile("/proc/self/maps");
 }
@@ -249,6 +251,7 @@ void install(const SNames& names) {
     copyText(g_installed.dump, sizeof g_installed.dump, names.dump, names.dump ? ".dmp" : "");
     g_installed.reportFile = names.reportFile;
     g_installed.details = names.details;
+    g_installed.modules = names.modules;
     if (g_isInstalled) return;
     g_isInstalled = true;
 

@@ -13,6 +13,7 @@ struct SNames {
     // Further lines of the report, read at the time of the crash; null for none. The text may change at any
     // time as long as it stays terminated.
     const char* details = nullptr;
+    bool modules = true; // list the modules of the process in the report
 };
 
 // Installs handlers for the fatal signals and the terminate handler of the process. A crash writes both
