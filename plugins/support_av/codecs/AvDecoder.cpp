@@ -2,12 +2,14 @@
 
 #include "codecs/AvErrors.h"
 #include "codecs/AvLog.h"
+#include "codecs/Mp4Length.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "support/Pcm.h"
 
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <new>
 #include <string_view>
@@ -20,6 +22,7 @@ namespace {
 constexpr int kMaxChannels = 64;
 constexpr double kPreroll = 0.25;    // seconds that a lossy codec needs to settle after a seek
 constexpr double kNearby = 2.0;      // seconds that are decoded rather than skipped
+constexpr int kMaxSilence = 10;      // seconds for a damaged packet
 constexpr int kTolerated = 32;       // packets at a start that refer to what precedes them
 constexpr double kMissing = 0.25;    // seconds by which containers misstate the length
 constexpr int kUncertainPackets = 4; // packets by which they do
@@ -67,10 +70,16 @@ bool isMp4(const AVFormatContext& format) {
     return std::string_view(format.iformat->name).find("mp4") != std::string_view::npos;
 }
 
+// Whether a decoder can start at any packet and soon delivers the same samples, at the time of that packet.
+bool canStartAnywhere(AVCodecID codec) {
+    return codec != AV_CODEC_ID_TRUEHD && codec != AV_CODEC_ID_MLP && codec != AV_CODEC_ID_SPEEX &&
+           codec != AV_CODEC_ID_GSM;
+}
+
 // Whether a time base tells frames apart.
 bool isExact(AVRational timeBase, int rate) {
     const int64_t framesPerTick = int64_t{timeBase.num} * rate;
-    return framesPerTick > 0 && (framesPerTick % timeBase.den == 0 || timeBase.den % framesPerTick == 0);
+    return framesPerTick > 0 && timeBase.den % framesPerTick == 0;
 }
 
 } // namespace
@@ -87,6 +96,10 @@ SDecodedMedia CAvDecoder::open(const SDecoderOptions& options) {
     chooseFormat();
     m_firstTime = m_frame->pts;
     m_firstCount = m_frame->nb_samples;
+    if (m_lostAtStart > 0) {
+        silence(m_lostAtStart);
+        m_firstTime = AV_NOPTS_VALUE; // not the time of frame 0
+    }
     convertFrame();
     m_packetFrames = 0;
     try {
@@ -125,6 +138,7 @@ void CAvDecoder::start() {
     m_position = 0;
     m_hasDecoded = m_flushed = m_mustRestart = false;
     m_failures = 0;
+    m_lostAtStart = 0;
     m_damage = nullptr;
 }
 
@@ -156,25 +170,35 @@ void CAvDecoder::chooseFormat() {
 void CAvDecoder::estimateLength() {
     const AVFormatContext& format = m_demuxer->getFormat();
     const AVStream& stream = m_demuxer->getStream();
-    const AVRational frames{1, m_format.rate};
     const double duration = m_demuxer->getDuration();
     m_estimate = duration > 0 ? std::llround(std::min(duration, 1e8) * m_format.rate) : 0;
-    m_stated = m_trimmedEnd = 0;
+    m_stated = m_statedEnd = 0;
+    m_hasExactEnd = false;
     if (format.duration_estimation_method == AVFMT_DURATION_FROM_BITRATE || duration < 0) {
         scanPackets();
         if (m_packets.frames > 0) m_estimate = m_packets.frames;
     } else if (stream.duration > 0 || format.nb_streams == 1) {
         m_stated = m_estimate;
     }
-    if (isMp4(format)) {
-        const int64_t stated = getStatedFrames(format);
-        const bool isWhole = stream.duration > 0 && isExact(stream.time_base, m_format.rate);
-        m_trimmedEnd = stated > 0 ? stated
-                       : isWhole  ? av_rescale_q(stream.duration, stream.time_base, frames)
-                                  : 0;
-        if (stated > 0) m_estimate = stated;
-    }
+    m_isMp4 = isMp4(format) && isExact(stream.time_base, m_format.rate);
+    if (m_isMp4) findStatedEnd();
     m_estimate = std::max(m_estimate, countPending());
+}
+
+// In this order: a comment, the media's own duration if the edit list agrees, the edit list.
+void CAvDecoder::findStatedEnd() {
+    AVStream& stream = m_demuxer->getStream();
+    const AVRational frames{1, m_format.rate};
+    m_statedEnd = getStatedFrames(m_demuxer->getFormat());
+    m_hasExactEnd = m_statedEnd > 0;
+    const AVIndexEntry* const first = avformat_index_get_entry(&stream, 0);
+    if (!m_hasExactEnd && first && m_stated > 0 && m_firstTime != AV_NOPTS_VALUE) {
+        const int64_t duration = readMediaDuration(openForReading(m_file).get(), stream.index);
+        const int64_t end = av_rescale_q(duration + first->timestamp - m_firstTime, stream.time_base, frames);
+        m_hasExactEnd = duration > 0 && std::abs(end - m_stated) <= m_format.rate / 1000 + 1;
+        m_statedEnd = m_hasExactEnd ? end : m_stated;
+    }
+    if (m_statedEnd > 0) m_estimate = m_statedEnd;
 }
 
 // Files without a length and without timestamps: AAC, AC-3 and other plain streams.
@@ -213,6 +237,7 @@ bool CAvDecoder::readFrame() {
         if (m_hasSilenced) return false;
     }
     // A file that was cut off ends with a damaged packet.
+    if (m_damage && !m_hasDecoded) std::rethrow_exception(std::exchange(m_damage, nullptr));
     if (m_damage)
         m_options.warn("%s", peru::localize("sonora2.av.DamagedEnd", "%FILE% is damaged at its end",
                                             {{"%FILE%", m_file.getDisplayName()}}));
@@ -238,7 +263,7 @@ bool CAvDecoder::sendPacket() {
 
 void CAvDecoder::handleDamage(int error) {
     if (error == AVERROR(ENOMEM)) throw std::bad_alloc();
-    if (!m_hasDecoded) {
+    if (!m_hasDecoded && !isLossless(*m_codec)) {
         // Packets at a start may refer to others that precede them.
         if (++m_failures > kTolerated) failAt(m_file, toSeconds(m_position), describe(error));
         return;
@@ -252,13 +277,25 @@ void CAvDecoder::handleDamage(int error) {
         }
         return;
     }
-    const int64_t lost = std::clamp<int64_t>(m_packetDuration, 0, m_format.rate);
-    appendSilence(lost);
+    const int64_t lost =
+        std::clamp<int64_t>(m_packetDuration, 0, int64_t{kMaxSilence} * m_codec->sample_rate);
+    if (m_format.rate == 0) {
+        m_lostAtStart += lost; // the width of a sample is not known yet
+        return;
+    }
+    silence(lost);
+}
+
+void CAvDecoder::silence(int64_t frames) {
+    const double at = toSeconds(m_position + countPending());
+    m_hasSilenced = frames > 0;
+    const uint8_t silent = m_format.bytesPerSample == 1 ? 128 : 0;
+    m_pending.insert(m_pending.end(), static_cast<size_t>(frames * m_format.frameBytes()), silent);
     m_options.warn("%s", peru::localize("sonora2.av.Silenced",
                                         "%FILE% is damaged: %FROM% to %TO% seconds were replaced by silence",
                                         {{"%FILE%", m_file.getDisplayName()},
                                          {"%FROM%", peru::format("%.3f", at)},
-                                         {"%TO%", peru::format("%.3f", at + toSeconds(lost))}}));
+                                         {"%TO%", peru::format("%.3f", at + toSeconds(frames))}}));
 }
 
 void CAvDecoder::prepareConverter() {
@@ -288,6 +325,22 @@ void CAvDecoder::prepareConverter() {
     m_convertedChannels = m_frame->ch_layout.nb_channels;
 }
 
+// The last packet of an MPEG-4 file has more frames than there is sound.
+int CAvDecoder::countUsedFrames() const {
+    const int frames = m_frame->nb_samples;
+    if (!m_isMp4) return frames;
+    if (m_statedEnd > 0) {
+        const int64_t at = m_position + countPending();
+        const int limit = static_cast<int>(std::clamp<int64_t>(m_statedEnd - at, 0, frames));
+        const int slack = m_hasExactEnd ? 0 : m_format.rate / 1000 + 1;
+        return limit + slack >= frames ? frames : limit;
+    }
+    // A file of fragments says it packet by packet.
+    const AVRational timeBase = m_demuxer->getStream().time_base;
+    const int64_t own = av_rescale_q(m_frame->pkt_duration, timeBase, {1, m_format.rate});
+    return own > 0 && own < frames ? static_cast<int>(own) : frames;
+}
+
 void CAvDecoder::convertFrame() {
     if (m_frame->sample_rate != m_format.rate)
         failAt(m_file, toSeconds(m_position + countPending()),
@@ -295,7 +348,8 @@ void CAvDecoder::convertFrame() {
     if (!m_converter || m_convertedFrom != m_frame->format ||
         m_convertedChannels != m_frame->ch_layout.nb_channels)
         prepareConverter();
-    const int frames = m_frame->nb_samples;
+    const int frames = countUsedFrames();
+    if (frames == 0) return;
     const size_t samples = static_cast<size_t>(frames) * static_cast<size_t>(m_format.channels);
     const bool isPacked = m_format.bytesPerSample == 3; // from 32 bits
     const size_t bytes = samples * static_cast<size_t>(isPacked ? 4 : m_format.bytesPerSample);
@@ -314,10 +368,8 @@ void CAvDecoder::convertFrame() {
     m_pending.resize(at + samples * 3);
 }
 
-void CAvDecoder::appendSilence(int64_t frames) {
-    m_hasSilenced = frames > 0;
-    const uint8_t silence = m_format.bytesPerSample == 1 ? 128 : 0;
-    m_pending.insert(m_pending.end(), static_cast<size_t>(frames * m_format.frameBytes()), silence);
+double CAvDecoder::toSeconds(int64_t frame) const {
+    return m_format.rate > 0 ? static_cast<double>(frame) / m_format.rate : 0.0;
 }
 
 int64_t CAvDecoder::countPending() const {
@@ -328,8 +380,6 @@ int64_t CAvDecoder::countPending() const {
 
 int CAvDecoder::read(uint8_t* pcm, int frames) {
     const CAvLog log(m_options.log);
-    if (m_trimmedEnd > 0)
-        frames = static_cast<int>(std::clamp<int64_t>(m_trimmedEnd - m_position, 0, frames));
     while (frames > 0 && countPending() == 0) {
         if (readFrame()) {
             convertFrame();
@@ -371,13 +421,14 @@ void CAvDecoder::seek(int64_t frame) {
     const int64_t ahead = frame - m_position;
     const bool isNear = ahead >= 0 && ahead <= std::llround(kNearby * m_format.rate);
     if (!m_mustRestart && isNear) return drop(ahead);
-    if (!m_mustRestart && frame > m_format.rate && (seekByPlace(frame) || seekByTime(frame))) return;
+    const bool canJump = !m_mustRestart && frame > m_format.rate && canStartAnywhere(m_codec->codec_id);
+    if (canJump && (seekByPlace(frame) || seekByTime(frame))) return;
     start();
     drop(frame);
 }
 
 void CAvDecoder::drop(int64_t frames) {
-    const int64_t end = m_trimmedEnd > 0 ? std::min(m_position + frames, m_trimmedEnd) : m_position + frames;
+    const int64_t end = m_position + frames;
     while (m_position < end) {
         if (countPending() == 0) {
             if (readFrame()) convertFrame();

@@ -38,12 +38,14 @@ private:
     void openCodec();
     void chooseFormat();
     void estimateLength();
+    void findStatedEnd();
     void scanPackets();
     bool readFrame(); // false at the end, and if there is silence instead
     bool sendPacket();
     void handleDamage(int error);
     void convertFrame();
-    void appendSilence(int64_t frames);
+    int countUsedFrames() const;
+    void silence(int64_t frames);
     void prepareConverter();
     void requireComplete();
     bool seekByTime(int64_t frame);
@@ -52,7 +54,7 @@ private:
     int64_t findFrame(int64_t timestamp) const;
     void drop(int64_t frames);
     int64_t countPending() const;
-    double toSeconds(int64_t frame) const { return static_cast<double>(frame) / m_format.rate; }
+    double toSeconds(int64_t frame) const;
 
     SMediaFile m_file;
     SDecoderOptions m_options;
@@ -64,7 +66,9 @@ private:
     int64_t m_estimate = 0;
     bool m_hasScanned = false; // for packets
     int64_t m_stated = 0;      // frames according to the container; 0 if it does not say
-    int64_t m_trimmedEnd = 0;  // where the sound ends although more can be decoded; 0 if nowhere
+    bool m_isMp4 = false;
+    bool m_hasExactEnd = false;
+    int64_t m_statedEnd = 0; // where the sound ends although the last packet has more; 0 if it does not say
 
     std::unique_ptr<CDemuxer> m_demuxer; // while open
     Codec m_codec;
@@ -78,6 +82,7 @@ private:
     int m_packetFrames = 0;               // frames of the others; 0 if they vary
     bool m_hasDecoded = false;            // since the last start or seek
     int m_failures = 0;                   // packets that could not be decoded before that
+    int64_t m_lostAtStart = 0;            // frames of packets that could not be decoded before the first
     std::exception_ptr m_damage;          // thrown if sound follows it
     int64_t m_place = -1;                 // of the packet decoded last, in the file
     int64_t m_packetDuration = 0;         // of the same packet, in frames

@@ -93,6 +93,8 @@ void CWmaEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
     stream->time_base = m_codec->time_base;
     check(avcodec_parameters_from_context(stream->codecpar, m_codec.get()));
     check(avformat_write_header(m_container, nullptr));
+    // Decoders drop two blocks at the start, of which the codec adds one.
+    sendBlock();
 }
 
 void CWmaEncoder::write(const uint8_t* pcm, int frames) {
@@ -134,9 +136,7 @@ void CWmaEncoder::encode(AVFrame* frame) {
 }
 
 void CWmaEncoder::finish() {
-    if (m_filled > 0) sendBlock();
-    // A block can only be decoded together with the next one.
-    if (m_written > 0) sendBlock();
+    if (m_filled > 0 || m_written == m_codec->frame_size) sendBlock();
     encode(nullptr);
     check(av_write_trailer(m_container));
     avio_flush(m_io.get());
