@@ -1,6 +1,7 @@
 #include "CdText.h"
 
 #include <cdio/cdtext.h>
+#include <cdio/logging.h>
 #include <memory>
 
 namespace discio {
@@ -35,6 +36,7 @@ void addCdText(std::string_view packs, STableOfContents& contents) {
     std::vector<uint8_t> bytes(packs.begin(), packs.end());
     bytes.resize(bytes.size() / kPackBytes * kPackBytes);
     if (bytes.empty()) return;
+    cdio_log_set_handler([](cdio_log_level_t, const char*) {}); // it would print to standard output
     const std::unique_ptr<cdtext_t, void (*)(cdtext_t*)> texts(cdtext_init(), cdtext_destroy);
     if (texts && cdtext_data_init(texts.get(), bytes.data(), bytes.size()) == 0)
         addCdText(texts.get(), contents);
