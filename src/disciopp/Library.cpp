@@ -1,0 +1,23 @@
+#include "disciopp/ILibrary.h"
+
+namespace disciopp {
+
+namespace {
+
+class CLibrary : public CBase, public ILibrary {
+public:
+    CLibrary() = default;
+    ~CLibrary() override = default;
+
+    void createDiscio() override { getDiscio(); }
+    P<IDriveManager> getDriveManager() override { return disciopp::getDriveManager(); }
+    P<ITrackStream> openTrack(const P<peru::IURI>& uri) override { return disciopp::openTrack(uri); }
+};
+
+} // namespace
+
+} // namespace disciopp
+
+extern "C" DISCIOPP_API void disciopp_getLibrary(disciopp::P<disciopp::ILibrary>& library) {
+    library = peru::make<disciopp::CLibrary>();
+}

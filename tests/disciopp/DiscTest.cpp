@@ -1,0 +1,119 @@
+#include "discio2/DiscSupport.h"
+#include "disciopp/Errors.h"
+#include "disciopp/FileSystems.h"
+#include "disciopp/IDrive.h"
+#include "disciopp/ITrackStream.h"
+#include "peru/Errors.h"
+#include "peru/GlobalObjFactory.h"
+#include "peru/uri/URI.h"
+#include "support/Environment.h"
+#include "support/Files.h"
+
+using namespace tests;
+using namespace disciopp;
+
+namespace {
+
+struct SDiscs : testing::Test {
+    ~SDiscs() override { peru::CGlobalObjFactory::shutdown(); }
+
+    P<IDrive> getDrive() {
+        const P<IDriveManager> manager = getDriveManager();
+        return manager->getDriveAt(manager->getDriveCount() - 1); // the machine may have others
+    }
+    std::vector<std::string> list(const P<peru::IFileObject>& object) {
+        std::vector<std::string> names;
+        const P<peru::IFileObjectCursor> cursor = object->enumerate();
+        while (cursor->next()) names.push_back(text(cursor->getFileObject()->getName()));
+        std::sort(names.begin(), names.end());
+        return names;
+    }
+
+    CTempFolder folder;
+    CEnvironment environment{"TONEWRIGHT_DRIVE_FOLDERS", folder.path().string()};
+};
+
+} // namespace
+
+TEST_F(SDiscs, AudioTracksAreFiles) {
+    const std::string samples = makeSectors(24, 5);
+    folder.write("a.bin", samples);
+    std::string sheet = "FILE a.bin BINARY\n";
+    std::vector<std::string> names;
+    for (int i = 1; i <= 12; ++i) {
+        const std::string number = (i < 10 ? "0" : "") + std::to_string(i);
+        sheet += "TRACK " + number + " AUDIO\nINDEX 01 00:00:" + (2 * i - 2 < 10 ? "0" : "") +
+                 std::to_string(2 * i - 2) + "\n";
+        names.push_back("Track" + number + ".cda");
+    }
+    folder.write("a.cue", sheet);
+    const P<IDrive> drive = getDrive();
+    const P<IDisc> disc = drive->getDisc();
+    ASSERT_TRUE(disc);
+    EXPECT_TRUE(peru::tryCast<IAudioCDDisc>(disc));
+    EXPECT_EQ(text(disc->getDisplayName()), "(" + folder.path().string() + ") Audio CD");
+    EXPECT_EQ(list(drive->getFileSystem()->getRoot()), names);
+    const P<peru::IURI> uri = drive->getPath()->appendPath("Track10.cda");
+    const P<peru::IFileObject> track = drive->getFileSystem()->getFileObject(uri);
+    ASSERT_TRUE(track);
+    EXPECT_EQ(track->getSize(), 2 * 2352);
+    EXPECT_TRUE(track->getURI()->equals(uri));
+    EXPECT_FALSE(drive->getFileSystem()->getFileObject(drive->getPath()->appendPath("Track1.cda")));
+    EXPECT_THROW(track->enumerate(), peru::CFileError);
+    const std::string image = "discioppdiscimage://" + (folder / "a.cue").string() + "/Track10.cda";
+    for (const P<peru::IURI>& each : {uri, P<peru::IURI>(peru::make<peru::CURI>(image.c_str()))}) {
+        const P<ITrackStream> stream = openTrack(each);
+        const DISCIO_PCMAudioStream& pcm = stream->get();
+        ASSERT_EQ(pcm.funcs->open(pcm.user), 1);
+        std::string block(2 * 2352, '\0');
+        int32_t delivered = 0;
+        EXPECT_EQ(pcm.funcs->read(pcm.user, block.data(), 2 * 588, &delivered), 1);
+        EXPECT_TRUE(block == samples.substr(18 * 2352, 2 * 2352));
+    }
+    for (const char* bad :
+         {"http://x/Track01.cda", "discioppvirtualdisc:///Track01.cda", "file:///dev/null/Track01.cda",
+          "file:///x/Track1.cda", "discioppdiscimage:///none.cue/Track01.cda"})
+        EXPECT_THROW(openTrack(peru::make<peru::CURI>(bad)), peru::CException) << bad;
+    EXPECT_THROW(openTrack(peru::make<peru::CURI>("http://x/Track01.cda")), CUnknownURIScheme);
+    EXPECT_EQ(errorOf([&] { openTrack(drive->getPath()->appendPath("Track13.cda")); }),
+              "The specified object does not exist. (track 13)");
+}
+
+TEST_F(SDiscs, FilesOfADataDiscAreFoundByTheirPath) {
+    const CTempFolder content;
+    std::filesystem::create_directories(content / "Some folder/inner");
+    content.write("Some folder/inner/file one", "12345");
+    ASSERT_EQ(run({"genisoimage", "-quiet", "-J", "-V", "", "-o", (folder / "d.iso").string(),
+                   content.path().string()})
+                  .exitCode,
+              0);
+    const P<IDrive> drive = getDrive();
+    const P<IDisc> disc = drive->getDisc();
+    ASSERT_TRUE(disc);
+    EXPECT_FALSE(peru::tryCast<IAudioCDDisc>(disc));
+    EXPECT_EQ(text(disc->getTitle()), "[No Title]");
+    const P<IFileSystem> files = drive->getFileSystem();
+    EXPECT_EQ(list(files->getRoot()), std::vector<std::string>{"Some folder"});
+    const P<peru::IURI> uri = drive->getPath()->appendPath("Some folder/inner/file one");
+    const P<peru::IFileObject> file = files->getFileObject(uri);
+    ASSERT_TRUE(file);
+    EXPECT_EQ(file->getSize(), 5);
+    EXPECT_TRUE(file->getAttributes().readOnly);
+    EXPECT_FALSE(files->getFileObject(uri->appendPath("below a file")));
+    EXPECT_FALSE(files->getFileObject(toURI("/elsewhere")));
+    EXPECT_THROW(files->deleteFile(uri), peru::CException);
+    EXPECT_EQ(text(toDiscPath(uri, drive->getPath())), "Some folder\\inner\\file one");
+    EXPECT_EQ(text(toDiscPath(peru::make<peru::CURI>("a/b/"), nullptr)), "a\\b");
+}
+
+TEST_F(SDiscs, WithoutAMediumEverythingIsEmpty) {
+    const P<IDrive> drive = getDrive();
+    EXPECT_FALSE(drive->testDisc());
+    EXPECT_TRUE(list(drive->getFileSystem()->getRoot()).empty());
+    EXPECT_THROW(drive->openTray(), CDISCIOPPException);
+    EXPECT_EQ(text(getMediumTypeText(2)), "CD-R");
+    EXPECT_EQ(text(getMediumTypeText(0)), "None");
+    EXPECT_EQ(text(getMediumTypeText(-1)), "Unknown");
+    EXPECT_EQ(text(getMediumTypeText(14)), "BD-RE");
+    EXPECT_EQ(text(getMediumTypeText(15)), "Unknown");
+}
