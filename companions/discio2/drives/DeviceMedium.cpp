@@ -142,6 +142,7 @@ public:
         m_drive.reset(cdio_cddap_identify_cdio(m_device.get(), CDDA_MESSAGE_FORGETIT, nullptr));
         if (!m_drive || cdio_cddap_open(m_drive.get()) != 0)
             throw CDiscError(DISCIO_ERROR_DEVICE, path + " cannot read audio");
+        m_drive->bigendianp = 0; // as READ CD delivers; the library's guess from the sound errs with noise
         m_paranoia.reset(cdio_paranoia_init(m_drive.get()));
         cdio_paranoia_modeset(m_paranoia.get(), PARANOIA_MODE_FULL ^ PARANOIA_MODE_NEVERSKIP);
         cdio_paranoia_set_range(m_paranoia.get(), track.start, track.end() - 1);
