@@ -13,11 +13,18 @@ namespace peru::net {
 
 namespace {
 
-std::string toHostHeader(const P<IURI>& uri) {
+enum class EDefaultPort { omit, keep };
+
+std::string toAuthority(const P<IURI>& uri, EDefaultPort defaultPort) {
     std::string host = posix::getNetworkHost(uri);
     if (host.find(':') != std::string::npos) host = "[" + host.substr(0, host.find('%')) + "]";
-    if (uri->hasPort() && uri->getPort() != 80) host += ":" + std::to_string(uri->getPort());
+    if (uri->hasPort() && (uri->getPort() != 80 || defaultPort == EDefaultPort::keep))
+        host += ":" + std::to_string(uri->getPort());
     return host;
+}
+
+std::string toHostHeader(const P<IURI>& uri) {
+    return toAuthority(uri, EDefaultPort::omit);
 }
 
 std::string toPathAndQuery(const P<IURI>& uri) {
@@ -83,8 +90,7 @@ P<CHTTPRequest> CHTTPRequest::redirect(const P<IURI>& uri, bool otherResource) c
 SHTTPRequestHead composeRequestHead(const CHTTPRequest& request, const P<IURI>& proxy) {
     const P<IURI>& uri = request.getURI();
     CHTTPHeaders headers = request.getHeaders();
-    const std::string host = toHostHeader(uri);
-    if (!headers.find("Host")) headers.set("Host", host.c_str());
+    if (!headers.find("Host")) headers.set("Host", toHostHeader(uri).c_str());
     headers.set("Connection", "close");
     if (uri->hasUserInfo() && !headers.find("Authorization"))
         headers.set("Authorization", toBasic(uri).c_str());
@@ -97,8 +103,10 @@ SHTTPRequestHead composeRequestHead(const CHTTPRequest& request, const P<IURI>& 
     else if (request.getBody() || request.getMethod() == "POST" || request.getMethod() == "PUT")
         headers.set("Content-Length", std::to_string(head.bodySize).c_str());
 
-    head.bytes = request.getMethod() + " " + (proxy ? "http://" + host : "") + toPathAndQuery(uri) + " " +
-                 CHTTPRequest::kProtocol + "\r\n";
+    // A proxy gets the port as the caller wrote it.
+    const std::string origin = proxy ? "http://" + toAuthority(uri, EDefaultPort::keep) : "";
+    head.bytes =
+        request.getMethod() + " " + origin + toPathAndQuery(uri) + " " + CHTTPRequest::kProtocol + "\r\n";
     for (const CHTTPHeaders::SHeader& header : headers)
         head.bytes += header.name + ": " + header.value + "\r\n";
     head.bytes += "\r\n";

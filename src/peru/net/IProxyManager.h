@@ -27,5 +27,7 @@ public:
 // The settings of the environment (http_proxy, no_proxy), otherwise those of the desktop. They are read with
 // every look-up; nothing is loaded before the first one.
 PERU_API P<IProxyManager> getProxyManager();
+// The same settings for a protocol whose proxies have another port than 8080 where the settings state none.
+PERU_API P<IProxyManager> createProxyManager(int32_t defaultPort);
 
 } // namespace peru::net

@@ -12,8 +12,6 @@ namespace peru::net {
 
 namespace {
 
-constexpr int32_t kDefaultProxyPort = 8080;
-
 bool parseDecimal(std::string_view text, uint32_t& number) {
     const char* end = text.data() + text.size();
     const auto [stop, error] = std::from_chars(text.data(), end, number);
@@ -70,7 +68,7 @@ bool covers(std::string_view entry, std::string_view host, const P<CIPAddress>& 
 
 } // namespace
 
-P<IURI> parseProxy(std::string_view text) {
+P<IURI> parseProxy(std::string_view text, int32_t defaultPort) {
     text = trimBlanks(text);
     if (text.empty()) return nullptr;
     const std::string full =
@@ -78,7 +76,7 @@ P<IURI> parseProxy(std::string_view text) {
     try {
         const P<IURI> uri = make<CURI>(CString::fromUTF8(full));
         if (!uri->getScheme()->equalsIgnoreCase("http") || posix::getNetworkHost(uri).empty()) return nullptr;
-        const int32_t port = uri->hasPort() ? uri->getPort() : kDefaultProxyPort;
+        const int32_t port = uri->hasPort() ? uri->getPort() : defaultPort;
         if (port < 1 || port > 0xFFFF) return nullptr;
         std::string authority = CString::toStdString(uri->getHost()) + ":" + std::to_string(port);
         if (uri->hasUserInfo()) authority = CString::toStdString(uri->getUserInfo()) + "@" + authority;

@@ -8,9 +8,11 @@
 
 namespace peru::net {
 
-// Accepts "host", "host:port" and a URI with user and password. The result always has a port, 8080 if none is
-// given. Empty for another kind of proxy and for invalid text.
-PERU_API P<IURI> parseProxy(std::string_view text);
+inline constexpr int32_t kDefaultProxyPort = 8080;
+
+// Accepts "host", "host:port" and a URI with user and password. The result always has a port: `defaultPort`
+// if none is given. Empty for another kind of proxy and for invalid text.
+PERU_API P<IURI> parseProxy(std::string_view text, int32_t defaultPort = kDefaultProxyPort);
 
 // Whether the list of exceptions, separated by commas, semicolons or blanks, covers the target. An entry is a
 // host with all its subdomains (".example.org" and "*.example.org" mean the same), an address, a network such

@@ -552,6 +552,9 @@ TEST(Http, Proxies) {
     EXPECT_EQ(received,
               "GET http://www.example.org/a?b HTTP/1.1\r\nHost: www.example.org\r\nConnection: close\r\n"
               "Proxy-Authorization: Basic bWU6d29yZA==\r\n\r\n");
+    EXPECT_EQ(get("http://www.example.org:80/"), "200 hello");
+    EXPECT_EQ(received.substr(0, 75),
+              "GET http://www.example.org:80/ HTTP/1.1\r\nHost: www.example.org\r\nConnection:");
     const P<IProxyManager> manager = getProxyManager();
     EXPECT_EQ(text(manager->getProxy(toURI("http://example.org"))->getAsString()),
               "http://me:word@" + proxy.getBase().substr(7));
@@ -560,6 +563,8 @@ TEST(Http, Proxies) {
     const CEnvironment withoutPort("http_proxy", "http://proxy.example.org/");
     EXPECT_EQ(text(manager->getProxy(toURI("http://example.org"))->getAsString()),
               "http://proxy.example.org:8080");
+    EXPECT_EQ(text(createProxyManager(80)->getProxy(toURI("http://example.org"))->getAsString()),
+              "http://proxy.example.org:80");
     const CEnvironment socks("http_proxy", "socks5://proxy:1");
     EXPECT_TRUE(manager->isDirect(toURI("http://example.org")));
 }

@@ -22,20 +22,21 @@ class CProxyLookUp : public CObject, public IProxyLookUp {
 public:
     using CTask = TBackgroundTask<Candidates>;
 
-    explicit CProxyLookUp(const P<CTask>& task) : m_task(task) {}
+    CProxyLookUp(const P<CTask>& task, int32_t defaultPort) : m_task(task), m_defaultPort(defaultPort) {}
     bool isDone(const SNetWait& wait) override { return m_task->isDone(wait); }
     P<IURI> getProxy() const override {
         if (!m_task->isDone({})) return nullptr;
         for (const std::string& candidate : m_task->getResult()) {
             if (candidate == "direct://") return nullptr;
             // Kinds that this client does not support are skipped.
-            if (P<IURI> proxy = parseProxy(candidate)) return proxy;
+            if (P<IURI> proxy = parseProxy(candidate, m_defaultPort)) return proxy;
         }
         return nullptr;
     }
 
 private:
     P<CTask> m_task;
+    const int32_t m_defaultPort;
 };
 
 bool isThisMachine(const P<IURI>& target) {
@@ -62,19 +63,19 @@ const char* getNoProxy() {
 
 } // namespace
 
-CProxyManager::CProxyManager() = default;
+CProxyManager::CProxyManager(int32_t defaultPort) : m_defaultPort(defaultPort) {}
 CProxyManager::~CProxyManager() = default;
 
 P<IProxyLookUp> CProxyManager::startLookUp(const P<IURI>& target) {
     using CTask = CProxyLookUp::CTask;
-    // HTTP_PROXY in capitals is not read: a web server's scripts get it from a header of the client.
     // HTTP_PROXY in capitals is not read: in a web server's scripts it is a header that the client chose.
     const char* proxy = std::getenv("http_proxy");
     if (isBypassed(getNoProxy(), target) || (!proxy && isThisMachine(target)))
-        return make<CProxyLookUp>(CTask::finished({}));
-    if (proxy) return make<CProxyLookUp>(CTask::finished({proxy}));
+        return make<CProxyLookUp>(CTask::finished({}), m_defaultPort);
+    if (proxy) return make<CProxyLookUp>(CTask::finished({proxy}), m_defaultPort);
     return make<CProxyLookUp>(
-        CTask::start([text = CString::toStdString(target->getAsString())] { return askDesktop(text); }));
+        CTask::start([text = CString::toStdString(target->getAsString())] { return askDesktop(text); }),
+        m_defaultPort);
 }
 
 P<IURI> CProxyManager::getProxy(const P<IURI>& target) {
@@ -90,7 +91,11 @@ namespace peru::net {
 P<IProxyManager> getProxyManager() {
     static const CGlobalObjFactory::SKey key;
     return CGlobalObjFactory::get<IProxyManager>(
-        key, []() -> P<IProxyManager> { return make<posix::CProxyManager>(); });
+        key, []() -> P<IProxyManager> { return make<posix::CProxyManager>(kDefaultProxyPort); });
+}
+
+P<IProxyManager> createProxyManager(int32_t defaultPort) {
+    return make<posix::CProxyManager>(defaultPort);
 }
 
 } // namespace peru::net

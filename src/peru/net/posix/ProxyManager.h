@@ -11,11 +11,14 @@ namespace peru::net::posix {
 // own. This machine itself never goes through the desktop's proxy.
 class PERU_API CProxyManager : public CObject, public IProxyManager {
 public:
-    CProxyManager();
+    explicit CProxyManager(int32_t defaultPort);
     ~CProxyManager() override;
 
     P<IProxyLookUp> startLookUp(const P<IURI>& target) override;
     P<IURI> getProxy(const P<IURI>& target) override;
+
+private:
+    const int32_t m_defaultPort;
 };
 
 } // namespace peru::net::posix
