@@ -36,6 +36,7 @@ public:
     // The same for content that is written in pieces or partly copied from the old file. Throws CFileError,
     // or CFileAccessDeniedError if the user may not write the file.
     virtual P<IFileReplacement> startReplacement(const P<IURI>& file) = 0;
+    virtual P<IURI> getCacheFolder() = 0; // $XDG_CACHE_HOME, with a trailing "/"
 };
 
 PERU_API P<ISystem> getSystem();

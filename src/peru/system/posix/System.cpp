@@ -113,6 +113,10 @@ P<IURI> CSystem::getConfigurationFolder() {
     return getUserFolder("XDG_CONFIG_HOME", ".config");
 }
 
+P<IURI> CSystem::getCacheFolder() {
+    return getUserFolder("XDG_CACHE_HOME", ".cache");
+}
+
 P<IURI> CSystem::getTemporaryFolder() {
     std::string folder = getAbsoluteVariable("TMPDIR");
     return toFolderURI(folder.empty() ? "/tmp" : folder);

@@ -31,6 +31,7 @@ public:
     // Refuses a target that is not a regular file or that the user may not write.
     void replaceFile(const P<IURI>& file, const void* data, int64_t size) override;
     P<IFileReplacement> startReplacement(const P<IURI>& file) override;
+    P<IURI> getCacheFolder() override;
 };
 
 } // namespace peru::posix
