@@ -1,0 +1,4 @@
+// Export macro of libfreedb. Everything else is compiled with hidden visibility.
+#pragma once
+
+#define FREEDB_API __attribute__((visibility("default")))
