@@ -3,9 +3,9 @@
  *
  * The library works on the same handles as libtonewright and offers text in other encodings, log callbacks,
  * the reasons of failures, the properties of files, the capabilities of targets, sources that read from
- * memory or from callbacks, reading samples, sound devices, callbacks with user data, and all fields of a
- * tag. Unless documented otherwise, a function requires the started library (TONEWRIGHT_InitStartup), and its
- * handles must be destroyed before TONEWRIGHT_DeInitAll.
+ * memory or from callbacks, reading samples, sound devices, callbacks with user data, all fields of a tag,
+ * look-ups of discs, and downloads. Unless documented otherwise, a function requires the started library
+ * (TONEWRIGHT_InitStartup), and its handles must be destroyed before TONEWRIGHT_DeInitAll.
  *
  * Text is UTF-8 here, except for URIs, which are UTF-16 as in tonewright.h. Paths are bytes and need not be
  * UTF-8. Pointers in a record that a function fills stay valid for the time documented there; other text that
@@ -395,6 +395,121 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetPlayerSourceIndex(TONEWRIGHT_Handle pl
 /* Reads an editor's XML for TONEWRIGHT_CreateAudioSourceFromEditorXml from a file and resolves relative URIs
  * against the file's folder. Null if the file is not XML, has no tracks, or a track has no URI. */
 TONEWRIGHT_API char16_t* TONEWRIGHT_Host_ReadArrangement(const char* path);
+
+/* --- Look-up of discs (CDDB) --------------------------------------------------------------------- */
+
+/* Album and track titles of an audio CD from a server that speaks the CDDB protocol over HTTP. No server is
+ * built in. Positions on a disc are in frames of 1/75 second and include the pre-gap, as CDDB states them:
+ * the first track of most discs starts at 150. */
+
+/* Bits of the flags of a look-up. */
+typedef enum TONEWRIGHT_CDDBFlags {
+    TONEWRIGHT_CDDB_REFRESH =
+        1 /* asks the server even if the answer is in the cache, and replaces it there */
+} TONEWRIGHT_CDDBFlags;
+
+/* The server, and what it is told about the client. Numbers that are 0 and pointers that are null have the
+ * default named here. Text is copied. */
+typedef struct TONEWRIGHT_CDDBSettings {
+    size_t size;
+    const char* host;       /* name or address of the server; required */
+    int32_t port;           /* 80 */
+    const char* path;       /* "/~cddb/cddb.cgi" */
+    const char* clientName; /* of the application; required, like its version */
+    const char* clientVersion;
+    const char* user;        /* "anon" */
+    const char* userHost;    /* "anon" */
+    const char* proxy;       /* "host", "host:port" or a URI, where the port is 80 unless stated; null: the
+                                proxy of the system; empty: none */
+    const char* noProxy;     /* hosts that `proxy` does not serve, in the form of no_proxy; none */
+    int32_t connectTimeout;  /* milliseconds until the connection stands; 10000 */
+    int32_t silenceTimeout;  /* milliseconds without a byte; 30000 */
+    int32_t totalTimeout;    /* milliseconds for each request; unlimited */
+    const char* codePage;    /* encoding of replies that are not UTF-8, by its name for iconv; the one that
+                                the server states, otherwise Windows-1252 */
+    const char* cacheFolder; /* folder for answers, created when needed; null: "tonewright/cddb" in
+                                $XDG_CACHE_HOME; empty: none */
+    uint32_t flags;          /* bits of TONEWRIGHT_CDDBFlags */
+} TONEWRIGHT_CDDBSettings;
+
+/* The id of a disc with `count` tracks (1 to 99), from their offsets and that of the lead-out. Returns 0 and
+ * leaves `id` unchanged if the offsets do not ascend. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBDiscId(const int32_t* offsets, int32_t count, int32_t leadOut,
+                                                     uint32_t* id);
+
+/* A client; nothing is sent. Null for missing settings. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateCDDB(const TONEWRIGHT_CDDBSettings* settings);
+
+/* The outcome of a query. */
+typedef enum TONEWRIGHT_CDDBResult {
+    TONEWRIGHT_CDDB_FAILED = -1, /* the server cannot be reached or reports a failure, or it was cancelled */
+    TONEWRIGHT_CDDB_NO_MATCH = 1,
+    TONEWRIGHT_CDDB_EXACT = 2,  /* one or more candidates are the disc */
+    TONEWRIGHT_CDDB_INEXACT = 3 /* candidates are similar discs only */
+} TONEWRIGHT_CDDBResult;
+
+/* Asks which records fit a disc, and waits for the answer. Returns a TONEWRIGHT_CDDBResult. The candidates
+ * replace those of the last query. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_QueryCDDB(TONEWRIGHT_Handle cddb, const int32_t* offsets,
+                                                 int32_t count, int32_t leadOut);
+
+/* A record that fits. The text is valid until the next query or until the handle is destroyed. */
+typedef struct TONEWRIGHT_CDDBCandidate {
+    size_t size;
+    const char* category;
+    uint32_t id;       /* of the record, which need not be that of the disc */
+    const char* title; /* usually artist and album */
+} TONEWRIGHT_CDDBCandidate;
+
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBCandidateCount(TONEWRIGHT_Handle cddb);
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBCandidate(TONEWRIGHT_Handle cddb, int32_t index,
+                                                        TONEWRIGHT_CDDBCandidate* candidate);
+
+/* Reads the record of a candidate, and waits for it: a handle that is independent of the client, or null on
+ * failure. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_ReadCDDB(TONEWRIGHT_Handle cddb, int32_t index);
+
+/* A disc. Text is never null and valid until the record is destroyed; what the record does not have is
+ * empty. */
+typedef struct TONEWRIGHT_CDDBRecord {
+    size_t size;
+    const char* artist;
+    const char* title;
+    const char* year;
+    const char* genre;
+    const char* notes; /* may have several lines */
+    int32_t trackCount;
+} TONEWRIGHT_CDDBRecord;
+
+typedef struct TONEWRIGHT_CDDBTrack {
+    size_t size;
+    const char* artist; /* empty unless the disc is a compilation */
+    const char* title;
+    const char* notes;
+} TONEWRIGHT_CDDBTrack;
+
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBRecord(TONEWRIGHT_Handle record, TONEWRIGHT_CDDBRecord* disc);
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBTrack(TONEWRIGHT_Handle record, int32_t index,
+                                                    TONEWRIGHT_CDDBTrack* track);
+
+/* Ends the call of this client that is running, at once, and all later ones when they begin. Any thread. */
+TONEWRIGHT_API void TONEWRIGHT_Host_CancelCDDB(TONEWRIGHT_Handle cddb);
+
+/* --- Downloads ----------------------------------------------------------------------------------- */
+
+/* A download of a resource with an "http" URI, to which redirections are followed; nothing is sent. The proxy
+ * is that of the system. Null for another kind of URI. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateDownload(const char16_t* uri);
+/* Bytes received so far, and in total or -1 if that is unknown. Called on the thread of the download; returns
+ * TONEWRIGHT_CONTINUE, or TONEWRIGHT_STOP to cancel it. */
+typedef int32_t (*TONEWRIGHT_DownloadProgress)(int64_t received, int64_t total, void* user);
+/* Writes the resource to a file, which is created or overwritten; the path of an output (see above) makes the
+ * result appear complete or not at all. Can be called once. `progress` may be null. 0 on failure, also for a
+ * status other than 200 to 299 and for a body shorter than announced; the file is then incomplete. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_RunDownload(TONEWRIGHT_Handle download, const char* path,
+                                                   TONEWRIGHT_DownloadProgress progress, void* user);
+/* Ends the download at once, or when it begins. Any thread. */
+TONEWRIGHT_API void TONEWRIGHT_Host_CancelDownload(TONEWRIGHT_Handle download);
 
 #ifdef __cplusplus
 } /* extern "C" */
