@@ -15,5 +15,7 @@ void addPlay(CLI::App& app, Run& run);
 void addMix(CLI::App& app, Run& run);
 void addRecord(CLI::App& app, Run& run);
 void addTag(CLI::App& app, Run& run);
+void addCddb(CLI::App& app, Run& run);
+void addGet(CLI::App& app, Run& run);
 
 } // namespace host

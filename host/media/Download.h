@@ -1,0 +1,25 @@
+// Files on web servers.
+#pragma once
+
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+
+namespace host {
+
+// "http://..."; a file whose name begins like that is "./http:...".
+bool isWebAddress(const std::filesystem::path& file);
+
+// The name at the end of an address, unescaped, such as "x.flac"; empty if it has none that a file could
+// have.
+std::filesystem::path getWebName(const std::filesystem::path& address);
+
+// Bytes so far, and in total or -1.
+using DownloadProgress = std::function<void(int64_t received, int64_t total)>;
+
+// Writes the content of an address to a file, which is created or overwritten. False if Ctrl-C ended it; the
+// file is then incomplete, as it is after a failure. Throws std::runtime_error.
+bool download(const std::filesystem::path& address, const std::filesystem::path& file,
+              const DownloadProgress& progress = nullptr);
+
+} // namespace host
