@@ -25,7 +25,9 @@ CNamePattern parsePattern(const std::string& text) {
 }
 
 void addFiles(CLI::App& command, SConvertOptions& options) {
-    command.add_option("IN", options.inputs, "Files to convert, folders with -r, or - for standard input")
+    command
+        .add_option("IN", options.inputs,
+                    "Files or http addresses to convert, folders with -r, or - for standard input")
         ->required()
         ->option_text("...");
     command.add_flag("-r,--recursive", options.recursive,

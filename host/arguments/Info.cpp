@@ -10,7 +10,7 @@ void addInfo(CLI::App& app, Run& run) {
     const auto json = std::make_shared<bool>(false);
     CLI::App* command = app.add_subcommand(
         "info", "Show duration, sample rate, channels and bits per sample of sound files.");
-    command->add_option("FILE", *files, "Files to examine")->required()->option_text("...");
+    command->add_option("FILE", *files, "Files or http addresses to examine")->required()->option_text("...");
     command->add_flag("--json", *json, "Print one JSON object per line");
     command->callback([files, json, &run] {
         run = [files, json](CLibrary& library) { return showInfo(library, *files, *json); };

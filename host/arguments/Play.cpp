@@ -45,7 +45,9 @@ void addPlay(CLI::App& app, Run& run) {
                                    "  + or 0, - or 9   louder, softer\n"
                                    "  m                mute\n"
                                    "  q or Ctrl-C      stop");
-    command->add_option("INPUT", options->inputs, "Files, folders, playlists and cue sheets to play")
+    command
+        ->add_option("INPUT", options->inputs,
+                     "Files, http addresses, folders, playlists and cue sheets to play")
         ->required()
         ->option_text("...");
     command->add_flag("-r,--recursive", options->isRecursive, "Also play what is in folders below a folder");

@@ -2,6 +2,7 @@
 
 #include "base/Text.h"
 #include "library/Failure.h"
+#include "media/Download.h"
 #include "media/FileTag.h"
 #include "media/InputContent.h"
 #include "media/InputFiles.h"
@@ -48,12 +49,17 @@ fs::path chooseOutput(CLibrary& library, const SConvertOptions& options, const S
     if (!options.output.empty()) return options.output;
     if (options.names) {
         const std::string dot = options.extension.starts_with('.') ? "" : ".";
+        if (isWebAddress(input.file)) throw std::runtime_error("--name cannot name the copy of an address");
         const fs::path& folder = options.directory.empty() ? input.file.parent_path() : options.directory;
         return folder / options.names->expand(readFields(library, input.file), dot + options.extension);
     }
-    fs::path name = input.file.filename();
+    const bool isWeb = isWebAddress(input.file);
+    fs::path name = isWeb ? getWebName(input.file) : input.file.filename();
+    if (isWeb && name.empty()) throw std::runtime_error("The address has no file name; --output is needed");
     name.replace_extension(options.extension);
-    return (options.directory.empty() ? input.file.parent_path() : options.directory / input.below) / name;
+    const fs::path beside =
+        isWeb ? fs::path() : input.file.parent_path(); // a copy goes to the current folder
+    return (options.directory.empty() ? beside : options.directory / input.below) / name;
 }
 
 std::string findFolderProblem(fs::path folder) {
@@ -106,7 +112,7 @@ bool createsFolders(const SConvertOptions& options) {
 std::string findProblem(const SConversion& conversion, const SConvertOptions& options) {
     if (!conversion.problem.empty()) return conversion.problem;
     const fs::path& output = conversion.output;
-    if (!isStandardStream(conversion.input)) checkInput(conversion.input);
+    if (!isStandardStream(conversion.input) && !isWebAddress(conversion.input)) checkInput(conversion.input);
     if (isStandardStream(output)) return "";
     std::error_code none;
     if (fs::is_directory(output, none)) return output.string() + " cannot be written: Is a directory";

@@ -4,6 +4,8 @@
 #include "base/Text.h"
 #include "commands/ForEachFile.h"
 #include "library/Failure.h"
+#include "media/Download.h"
+#include "media/InputContent.h"
 #include "media/SoundFile.h"
 #include "media/WholeTag.h"
 #include "terminal/Progress.h"
@@ -11,6 +13,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
+#include <optional>
 #include <set>
 #include <stdexcept>
 #include <utility>
@@ -48,16 +51,20 @@ std::string formatBitRate(int64_t bitsPerSecond) { // 320 kbit/s
 int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
     bool hasHeading = json;
     return forEachFile(files, json, EReader::needed, [&](const fs::path& file) {
-        const SSoundFile sound = openSoundFile(file);
+        std::optional<CInputContent> content;
+        if (isWebAddress(file)) content.emplace(file);
+        if (isCancelled()) return;
+        const fs::path& opened = content ? content->getPath() : file;
+        const SSoundFile sound = openSoundFile(opened);
         const TONEWRIGHT_MediaInfo& info = sound.info;
-        const uint64_t bytes = fs::file_size(file);
-        const int64_t bitRate = getBitRate(info, file);
+        const uint64_t bytes = fs::file_size(opened);
+        const int64_t bitRate = getBitRate(info, opened);
         if (!std::exchange(hasHeading, true))
             std::printf("%11s %7s %8s %5s %10s %10s  %-20s  %s\n", "duration", "rate", "channels", "bits",
                         "bit rate", "size", "codec", "file");
         if (json)
             std::printf("%s\n", toLine({{"file", file.native()},
-                                        {"codec", codecOf(sound, file)},
+                                        {"codec", codecOf(sound, opened)},
                                         {"duration", info.duration},
                                         {"rate", info.sampleRate},
                                         {"channels", info.channelCount},
@@ -70,7 +77,7 @@ int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
             std::printf("%11s %7d %8d %5d %10s %10s  %-20s  %s\n", formatDuration(info.duration).c_str(),
                         info.sampleRate, info.channelCount, info.bytesPerSample * 8,
                         formatBitRate(bitRate).c_str(), formatSize(bytes).c_str(),
-                        codecOf(sound, file).c_str(), toPrintable(file.native()).c_str());
+                        codecOf(sound, opened).c_str(), toPrintable(file.native()).c_str());
     });
 }
 

@@ -3,6 +3,8 @@
 #include "base/ExitCodes.h"
 #include "base/Text.h"
 #include "media/Devices.h"
+#include "media/Download.h"
+#include "media/InputContent.h"
 #include "media/PlaySession.h"
 #include "media/PlaySource.h"
 #include "media/Playlist.h"
@@ -419,11 +421,29 @@ std::set<std::string> readExtensions(CLibrary& library) {
     return names;
 }
 
+// Copies what is on web servers before anything plays: the player reads every item several times. The copies
+// live as long as the result.
+std::vector<std::unique_ptr<CInputContent>> fetchItems(std::vector<SPlayItem>& items) {
+    std::vector<std::unique_ptr<CInputContent>> copies;
+    for (SPlayItem& item : items) {
+        if (!item.failure.empty() || !isWebAddress(item.file) || isCancelled()) continue;
+        try {
+            copies.push_back(std::make_unique<CInputContent>(item.file));
+            item.file = copies.back()->getPath();
+        } catch (const std::exception& failure) {
+            item.failure = failure.what();
+        }
+    }
+    return copies;
+}
+
 } // namespace
 
 int play(CLibrary& library, const SPlayOptions& options) {
     requireOutDevice();
     std::vector<SPlayItem> items = listItems(options.inputs, readExtensions(library), options.isRecursive);
+    const std::vector<std::unique_ptr<CInputContent>> copies = fetchItems(items);
+    if (isCancelled()) return kExitCancelled;
     if (options.isShuffled) std::shuffle(items.begin(), items.end(), std::mt19937(std::random_device()()));
     bool failed = false;
     {

@@ -1,6 +1,7 @@
 #include "media/InputContent.h"
 
 #include "base/Cancel.h"
+#include "media/Download.h"
 #include "media/SoundFile.h"
 
 #include <algorithm>
@@ -120,9 +121,18 @@ CInputContent::CInputContent(const fs::path& input) : m_path(input) {
                 "The format is unknown: standard input must be a sound file, such as WAV "
                 "or FLAC");
         }
-        const fs::path named = m_path.native() + extension;
-        fs::rename(m_path, named);
-        m_path = named;
+        nameCopy(extension);
+        return;
+    }
+    if (isWebAddress(input)) {
+        m_folder.emplace();
+        m_path = m_folder->getPath() / "input";
+        if (!download(input, m_path)) return;
+        // A name may say more than the content: Opus and Vorbis begin alike.
+        const std::string detected = detectExtension(m_path);
+        const fs::path named = getWebName(input).extension();
+        const bool isNamed = detected.empty() || (detected == ".ogg" && !named.empty());
+        nameCopy(isNamed ? named : fs::path(detected));
         return;
     }
     checkInput(input);
@@ -132,6 +142,12 @@ CInputContent::CInputContent(const fs::path& input) : m_path(input) {
     m_folder.emplace();
     m_path = m_folder->getPath() / ("input" + extension);
     fs::create_symlink(fs::absolute(input), m_path);
+}
+
+void CInputContent::nameCopy(const fs::path& extension) {
+    const fs::path named = m_path.native() + extension.native();
+    fs::rename(m_path, named);
+    m_path = named;
 }
 
 void CInputContent::copyStandardInput() {

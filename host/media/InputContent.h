@@ -18,16 +18,18 @@ std::string detectExtension(const std::filesystem::path& file);
 
 // The file to open for an input. Since the library chooses the decoder by the extension, an input without one
 // is opened through a link that has the extension of its format. Decoders read back and forth, so standard
-// input is copied to a temporary file first. Both are in a private folder, which the destructor removes.
+// input, and the content of a web address, are copied to a temporary file first. All of these are in a
+// private folder, which the destructor removes.
 class CInputContent {
 public:
-    // Throws std::runtime_error. After Ctrl-C the copy of standard input may be incomplete.
+    // Throws std::runtime_error. After Ctrl-C a copy may be incomplete.
     explicit CInputContent(const std::filesystem::path& input);
 
     const std::filesystem::path& getPath() const { return m_path; }
 
 private:
     void copyStandardInput();
+    void nameCopy(const std::filesystem::path& extension);
 
     std::optional<CPrivateFolder> m_folder;
     std::filesystem::path m_path;
