@@ -23,7 +23,12 @@ public:
 
     // Returns null if the key is missing.
     V* find(const IString& key) const {
-        const std::unique_ptr<SNode>& node = *getLink(m_slots, key);
+        const std::unique_ptr<SNode>& node = *getLink(m_slots, key.getHash(), key);
+        return node ? &node->value : nullptr;
+    }
+    // The same for text that is no string object, with its hash.
+    V* find(uint32_t hash, const CStringArg& key) const {
+        const std::unique_ptr<SNode>& node = *getLink(m_slots, hash, key);
         return node ? &node->value : nullptr;
     }
 
@@ -39,7 +44,7 @@ public:
 
     // Returns whether the key existed.
     bool remove(const IString& key) {
-        std::unique_ptr<SNode>* link = getLink(m_slots, key);
+        std::unique_ptr<SNode>* link = getLink(m_slots, key.getHash(), key);
         if (!*link) return false;
         std::unique_ptr<SNode> removed = std::move(*link);
         *link = std::move(removed->next);
@@ -75,8 +80,7 @@ private:
 
     // The link to the key's node, or the empty link at the end of its chain. Texts are only compared if the
     // hashes are equal.
-    template <class S> static auto* getLink(S& slots, const IString& key) {
-        uint32_t hash = key.getHash();
+    template <class S> static auto* getLink(S& slots, uint32_t hash, const CStringArg& key) {
         auto* link = &slots[hash % slots.size()];
         while (*link && !((*link)->hash == hash && (*link)->key->equals(key))) link = &(*link)->next;
         return link;

@@ -16,6 +16,8 @@ public:
     // Returns the localizer's own entry if it is not empty, otherwise the parent's result, otherwise the
     // default text.
     virtual P<IString> getText(const CStringArg& key, const P<IString>& defaultText) = 0;
+    // The same without a default text: an empty handle if there is no entry.
+    virtual P<IString> findText(const CStringArg& key) = 0;
 };
 
 PERU_API P<IStringLocalizer> getStringLocalizer();

@@ -157,16 +157,19 @@ template <class U> uint32_t hashUnits(text::SUnits<U> units, int32_t count) {
 
 } // namespace
 
+uint32_t text::getHash(const SStringView& view) {
+    if (int32_t width = getFixedWidth(view))
+        return withUnits(view, width, [&](auto units) { return hashUnits(units, view.length); });
+    uint32_t hash = 0;
+    CStringWindow window(*view.encoding, view.data, view.byteSize, 0);
+    for (char32_t ch; window.next(ch);) hash = addToHash(hash, ch);
+    return hash;
+}
+
 uint32_t CString::getHash() const {
     uint32_t hash = m_hash.load(std::memory_order_relaxed);
     if (hash != 0) return hash;
-    SStringView all = view();
-    if (int32_t width = text::getFixedWidth(all)) {
-        hash = text::withUnits(all, width, [&](auto units) { return hashUnits(units, all.length); });
-    } else {
-        CStringWindow window(*m_encoding.get(), m_data, m_byteSize, 0);
-        for (char32_t ch; window.next(ch);) hash = addToHash(hash, ch);
-    }
+    hash = text::getHash(view());
     m_hash.store(hash, std::memory_order_relaxed);
     return hash;
 }

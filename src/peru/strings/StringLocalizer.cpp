@@ -2,45 +2,48 @@
 
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
+#include "peru/strings/StringText.h"
 
 namespace peru {
 
-namespace {
-
-P<ICharEncoding> getEncoding(const CStringArg& text) {
-    return P<ICharEncoding>::share(const_cast<ICharEncoding*>(&text.getEncoding()));
-}
-
-} // namespace
-
-CStringLocalizer::CStringLocalizer() : m_mutex(getMutexFactory()->createMutex()) {}
+CStringLocalizer::CStringLocalizer() = default;
 
 CStringLocalizer::~CStringLocalizer() = default;
 
 void CStringLocalizer::clear() {
-    CMutexLock lock(m_mutex);
+    std::unique_lock lock(m_mutex);
     m_texts.clear();
 }
 
 void CStringLocalizer::setParent(const P<IStringLocalizer>& parent) {
     if (parent == P<IStringLocalizer>::share(this))
         throw CInvalidArgError("parent", "setParent", P<IBase>(P<CStringLocalizer>::share(this)));
-    CMutexLock lock(m_mutex);
+    std::unique_lock lock(m_mutex);
     m_parent = parent;
 }
 
 void CStringLocalizer::setText(const CStringArg& key, const P<IString>& text) {
-    auto ownKey = make<CString>(getEncoding(key), key.getData(), key.getByteSize());
-    CMutexLock lock(m_mutex);
+    const P<IString> ownKey = CString::fromView(key.getView());
+    std::unique_lock lock(m_mutex);
     m_texts.set(ownKey, text);
 }
 
 P<IString> CStringLocalizer::getText(const CStringArg& key, const P<IString>& defaultText) {
-    const CString wanted(getEncoding(key), key.getData(), key.getByteSize(), EStringStorage::refer);
-    CMutexLock lock(m_mutex);
-    const P<IString>* own = m_texts.find(wanted);
-    if (own && *own && (*own)->getDataSize() > 0) return *own;
+    std::shared_lock lock(m_mutex);
+    if (const P<IString>* own = findOwn(key)) return *own;
     return m_parent ? m_parent->getText(key, defaultText) : defaultText;
+}
+
+P<IString> CStringLocalizer::findText(const CStringArg& key) {
+    std::shared_lock lock(m_mutex);
+    if (const P<IString>* own = findOwn(key)) return *own;
+    return m_parent ? m_parent->findText(key) : nullptr;
+}
+
+const P<IString>* CStringLocalizer::findOwn(const CStringArg& key) const {
+    if (m_texts.getCount() == 0) return nullptr;
+    const P<IString>* own = m_texts.find(text::getHash(key.getView()), key);
+    return own && *own && (*own)->getDataSize() > 0 ? own : nullptr;
 }
 
 P<IStringLocalizer> getStringLocalizer() {
@@ -71,7 +74,9 @@ P<IString> fillPlaceholders(const P<IString>& text, std::initializer_list<SPlace
 
 P<IString> localize(const char* key, const char* defaultText,
                     std::initializer_list<SPlaceholder> placeholders) {
-    return fillPlaceholders(getStringLocalizer()->getText(key, newString(defaultText)), placeholders);
+    P<IString> text = getStringLocalizer()->findText(key);
+    if (!text) text = newString(defaultText);
+    return fillPlaceholders(text, placeholders);
 }
 
 } // namespace peru

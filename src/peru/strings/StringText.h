@@ -64,6 +64,8 @@ int compare(const SStringView& a, const SStringView& b);
 bool equals(const SStringView& a, const SStringView& b);
 int compareIgnoreCase(const SStringView& a, const SStringView& b);
 bool startsWith(const SStringView& text, const SStringView& prefix);
+// IString::getHash of the text.
+uint32_t getHash(const SStringView& view);
 
 // Bytes that the text needs in another encoding, -1 if a character cannot be encoded there. Needs a counted
 // length. Malformed bytes need none, except that malformed UTF-8 counts as unencodable in Latin-1, so that an
