@@ -21,12 +21,12 @@ P<IString> ownText(const CStringArg& text, const char* whenEmpty = "") {
 }
 
 P<IString> describe(const P<IBase>& object) {
-    return object ? object->getObjectDesc() : newString("unknown object");
+    return object ? object->getObjectDesc() : localize("peru.unknownObject", "unknown object");
 }
 
 P<IString> uriText(const P<IURI>& uri) {
     P<IString> text = uri ? uri->getAsString() : nullptr;
-    return text && !text->isEmpty() ? text : newString("<uri unknown>");
+    return text && !text->isEmpty() ? text : localize("peru.unknownURI", "<uri unknown>");
 }
 
 P<IString> withObject(const CStringArg& description, const P<IBase>& object) {
@@ -40,9 +40,13 @@ P<IString> byURI(const P<IURI>& uri, const char* key, const char* text, const ch
     return uri ? localize(key, text) : localize(generalKey, generalText);
 }
 
-P<IString> streamText(const char* general, const char* withURI, const P<IURI>& uri) {
-    if (!uri) return newString(general);
-    return newString(withURI) + " (uri: '" + uri->getAsString() + "').";
+// The text, or the second one if it is missing.
+P<IString> orText(const CStringArg& text, const char* key, const char* otherwise) {
+    return isMissing(text) ? localize(key, otherwise) : ownText(text);
+}
+
+P<IString> orTitle(const CStringArg& title) {
+    return orText(title, "peru.CObjectError.Title", "Object error");
 }
 
 } // namespace
@@ -54,8 +58,7 @@ CError::CError(const CStringArg& description, const CStringArg& title)
 PERU_EXCEPTION_IMPL(CObjectError)
 CObjectError::CObjectError(const CStringArg& description, const P<IBase>& object, const std::type_info* type,
                            const CStringArg& title)
-    : CError(withObject(description, object), isMissing(title) ? CStringArg("Object error") : title),
-      m_object(object), m_type(type) {
+    : CError(withObject(description, object), orTitle(title)), m_object(object), m_type(type) {
     if (!m_type && object) {
         const IBase& known = *object;
         m_type = &typeid(known);
@@ -64,9 +67,11 @@ CObjectError::CObjectError(const CStringArg& description, const P<IBase>& object
 
 PERU_EXCEPTION_IMPL(CCastError)
 CCastError::CCastError(const P<IBase>& object, const std::type_info& source, const std::type_info& target)
-    : CObjectError(newString("Error casting a '") + getClassName(source).c_str() + "' object to '" +
-                       getClassName(target).c_str() + "'",
-                   object, &source, "Cast error") {}
+    : CObjectError("", object, &source, localize("peru.CCastError.Title", "Cast error")) {
+    m_description =
+        localize("peru.CCastError.Desc", "Error casting a '%SOURCE%' object to '%TARGET%'",
+                 {{"%SOURCE%", getClassName(source).c_str()}, {"%TARGET%", getClassName(target).c_str()}});
+}
 
 // From here on, constructors with values in their text set the description themselves: a value that happens
 // to contain a placeholder of a base class must not be expanded there.
@@ -74,8 +79,9 @@ CCastError::CCastError(const P<IBase>& object, const std::type_info& source, con
 PERU_EXCEPTION_IMPL(CInvalidObjectStateError)
 CInvalidObjectStateError::CInvalidObjectStateError(const CStringArg& detail, const P<IBase>& object)
     : CObjectError("", object) {
-    m_description =
-        (newString("The object is in an invalid state (") + describe(object) + "): ")->concat(detail);
+    m_description = localize("peru.CInvalidObjectStateError.Desc",
+                             "The object is in an invalid state (%OBJECTDESC%): %DETAIL%",
+                             {{"%OBJECTDESC%", describe(object)}, {"%DETAIL%", detail}});
 }
 
 PERU_EXCEPTION_IMPL(CEndOfEnumError)
@@ -87,24 +93,31 @@ PERU_EXCEPTION_IMPL(CInvalidArgError)
 CInvalidArgError::CInvalidArgError(const CStringArg& argument, const CStringArg& method,
                                    const P<IBase>& object)
     : CObjectError("", object) {
-    m_description = newString("An invalid argument was passed to method '") +
-                    ownText(method, "unspecified method") + "' of '" + describe(object) +
-                    "': " + ownText(argument, "unspecified argument");
+    m_description = localize(
+        "peru.CInvalidArgError.Desc",
+        "An invalid argument was passed to method '%METHOD%' of '%OBJECTDESC%': %ARGUMENT%",
+        {{"%METHOD%", orText(method, "peru.CInvalidArgError.Method", "unspecified method")},
+         {"%OBJECTDESC%", describe(object)},
+         {"%ARGUMENT%", orText(argument, "peru.CInvalidArgError.Argument", "unspecified argument")}});
 }
 
 PERU_EXCEPTION_IMPL(CMethodNotImplementedError)
 CMethodNotImplementedError::CMethodNotImplementedError(const CStringArg& method, const P<IBase>& object)
     : CObjectError("", object) {
-    m_description = newString("Method not implemented (") + describe(object) +
-                    "): " + ownText(method, "unspecified method.");
+    m_description = localize(
+        "peru.CMethodNotImplementedError.Desc", "Method not implemented (%OBJECTDESC%): %METHOD%",
+        {{"%OBJECTDESC%", describe(object)},
+         {"%METHOD%", orText(method, "peru.CMethodNotImplementedError.Method", "unspecified method.")}});
 }
 
 PERU_EXCEPTION_IMPL(CParseError)
-CParseError::CParseError(const CStringArg& description) : CError(description, "Parse error") {}
+CParseError::CParseError(const CStringArg& description)
+    : CError(description, localize("peru.CParseError.Title", "Parse error")) {}
 
 PERU_EXCEPTION_IMPL(CInvalidVolumeIDError)
 CInvalidVolumeIDError::CInvalidVolumeIDError(const CStringArg& id)
-    : CError(newString("Invalid volume id: ")->concat(id), "Invalid Volume ID Error") {}
+    : CError(localize("peru.CInvalidVolumeIDError.Desc", "Invalid volume id: %ID%", {{"%ID%", id}}),
+             localize("peru.CInvalidVolumeIDError.Title", "Invalid Volume ID Error")) {}
 
 PERU_EXCEPTION_IMPL(CNoSuchObjectError)
 CNoSuchObjectError::CNoSuchObjectError()
@@ -176,12 +189,18 @@ CStreamError::CStreamError(const CStringArg& description, const P<IURI>& uri, co
 
 PERU_EXCEPTION_IMPL(CStreamClosedError)
 CStreamClosedError::CStreamClosedError(const P<IURI>& uri) : CStreamError("", uri) {
-    m_description = streamText("The stream has been closed.", "The stream has been closed", uri);
+    m_description =
+        uri ? localize("peru.CStreamClosedError.Desc", "The stream has been closed (uri: '%URI%').",
+                       {{"%URI%", uri->getAsString()}})
+            : localize("peru.CStreamClosedError.GeneralDesc", "The stream has been closed.");
 }
 
 PERU_EXCEPTION_IMPL(CEndOfStreamError)
 CEndOfStreamError::CEndOfStreamError(const P<IURI>& uri) : CStreamError("", uri) {
-    m_description = streamText("Unexpected end of data stream.", "Unexpected end of data stream", uri);
+    m_description =
+        uri ? localize("peru.CEndOfStreamError.Desc", "Unexpected end of data stream (uri: '%URI%').",
+                       {{"%URI%", uri->getAsString()}})
+            : localize("peru.CEndOfStreamError.GeneralDesc", "Unexpected end of data stream.");
 }
 
 } // namespace peru

@@ -1,12 +1,15 @@
 #include "peru/media/Errors.h"
 
+#include "peru/strings/LocalizedFormat.h"
+
 #include <portaudio.h>
 
 namespace peru::media {
 
 PERU_EXCEPTION_IMPL(CMediaException)
 CMediaException::CMediaException(const CStringArg& description)
-    : CException(newString("")->concat(description), newString("Sound device error")) {}
+    : CException(newString("")->concat(description),
+                 localize("peru.media.Error.Title", "Sound device error")) {}
 
 PERU_EXCEPTION_IMPL(CPortaudioException)
 CPortaudioException::CPortaudioException(int32_t code)

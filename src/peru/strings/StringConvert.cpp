@@ -112,7 +112,8 @@ int64_t parseInteger(const CStringArg& text, int base) {
     int64_t value = 0;
     const char* end = digits.data() + digits.size();
     auto [stop, error] = std::from_chars(digits.data(), end, value, base);
-    if (digits.empty() || error != std::errc() || stop != end) throw CParseError("Error parsing integer.");
+    if (digits.empty() || error != std::errc() || stop != end)
+        throw CParseError(localize("peru.CInteger.parseError", "Error parsing integer."));
     return value;
 }
 
