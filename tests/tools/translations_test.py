@@ -73,6 +73,10 @@ class Translations(unittest.TestCase):
             (default, "%SRC%, %DEST%, %MSG%", "punctuation"),
             ("shell error %d", "%s", "conversions differ"),
             ("shell error %d", "100 %FILE% %d", "%FILE% is not in"),
+            ("%d of %.3f in %s", "%3$s: %2$.3f, %1$d", None),
+            ("%d of %.3f in %s", "%s: %.3f, %d", "conversions differ"),
+            ("%d of %.3f in %s", "%3$s: %2$d, %1$.3f", "conversions differ"),
+            ("%d of %d", "%1$d, %1$d", "conversions differ"),
             ("&Open", "Oeffnen", "accelerator"),
             ("Save\tCtrl+S", "Speichern\tStrg+S", None),
         ]

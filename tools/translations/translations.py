@@ -18,7 +18,7 @@ import packs
 ROOT = pathlib.Path(__file__).resolve().parents[2]
 PO = ROOT / "po"
 TEMPLATE = PO / "tonewright.pot"
-FOLDERS = ["src", "plugins", "companions"]
+FOLDERS = ["src", "plugins", "companions", "host"]
 APPLICATION = ("tonewright", "Tonewright")
 
 # The pack of a key whose first part is not "peru". The library registers the packs under these names.
@@ -26,6 +26,33 @@ COMMON = "common"
 
 # Explains the placeholders to translators.
 PLACEHOLDERS = {
+    "%ARGUMENT%": "what is wrong with an argument of a function",
+    "%BITS%": "the number of bits per sample",
+    "%CHANNELS%": "the number of channels",
+    "%CODEC%": "the name of a codec, such as FLAC",
+    "%DETAIL%": "what is wrong",
+    "%DURATION%": "a duration, such as 3:05.2",
+    "%EXTENSION%": "the extension of a file, such as .flac",
+    "%FIELDS%": "a list of placeholders for the fields of tags, such as %artist%",
+    "%FORMAT%": "a format of sound, such as '44100 Hz, 2 channels and 16 bits'",
+    "%FROM%": "a format of sound, such as '44100 Hz, 2 channels and 16 bits'",
+    "%ID%": "the identifier of a volume",
+    "%KIND%": "a type of files, such as '.flac files'",
+    "%LIST%": "a list of names, separated by commas",
+    "%METHOD%": "the name of a function",
+    "%NUMBER%": "a number",
+    "%OPTION%": "an option of the program, such as --bits",
+    "%ORIGIN%": "the path of a file or 'the preset NAME'",
+    "%PERCENT%": "a number in percent",
+    "%RATE%": "the number of samples per second",
+    "%REASON%": "a sentence with the reason, without a full stop",
+    "%SIZE%": "the size of a file, such as 1.2 MB",
+    "%SOURCE%": "the name of a class",
+    "%SPEED%": "a number",
+    "%TARGET%": "the name of a class",
+    "%TEXT%": "a text that the user has given",
+    "%TITLE%": "the title of a track",
+    "%TO%": "a format of sound, such as '44100 Hz, 2 channels and 16 bits'",
     "%CODE%": "the code of a character, such as 0x2A",
     "%DESC%": "the description of an object",
     "%DEST%": "the file or folder that is written",
@@ -39,17 +66,17 @@ PLACEHOLDERS = {
     "%KEY%": "the name of a group of settings",
     "%LINE%": "a line number",
     "%MSG%": "the operating system's text for the error, without a full stop",
-    "%NAME%": "the name of a sound device",
+    "%NAME%": "the name of something, such as a sound device, a command or a preset",
     "%OBJECTDESC%": "the description of an object",
     "%PACKAGE%": "the name of a package",
-    "%POSITION%": "a position, counted in characters",
+    "%POSITION%": "a position, counted in characters or as a time",
     "%REQUIRED%": "the name of a package",
     "%SRC%": "the file or folder that is read",
-    "%TYPE%": "what was given instead of a MIME type",
+    "%TYPE%": "a type of pictures, or what was given instead of a MIME type",
     "%URI%": "the location of a file or stream",
 }
 PLACEHOLDER = re.compile(r"%[A-Z]+%")
-CONVERSION = re.compile(r"%[-+ #0]*(?:\*|\d+)?(?:\.(?:\*|\d+))?[hlLqjzt]*[cCdioxXueEfgGsS%]")
+CONVERSION = re.compile(r"%(?P<number>\d+\$)?[-+ #0]*(?:\*|\d+)?(?:\.(?:\*|\d+))?[hlLqjzt]*[cCdioxXueEfgGsS%]")
 ACCELERATOR = re.compile(r"&(?!&)\w|\t[A-Za-z0-9+]+$")
 LANGUAGE = re.compile(r"[a-z]{2,3}[-_][A-Z]{2}")
 
@@ -195,7 +222,20 @@ def unpack(arguments):
 # --- Checks ---
 
 
-def check_entry(default, translation):
+def conversions_of(key, text):
+    """Returns the conversions in the order of their values; numbered ones ("%2$s") may be in any order."""
+    if key.startswith("host."):
+        return []  # these have placeholders only
+    found = [(match["number"], match[0]) for match in CONVERSION.finditer(PLACEHOLDER.sub("", text)) if match[0] != "%%"]
+    if not any(number for number, _ in found):
+        return [conversion for _, conversion in found]
+    numbered = sorted((int((number or "0$")[:-1]), conversion.replace(number or "", "", 1)) for number, conversion in found)
+    if [number for number, _ in numbered] != list(range(1, len(found) + 1)):
+        return ["not numbered from 1 on"]
+    return [conversion for _, conversion in numbered]
+
+
+def check_entry(default, translation, key=""):
     """Returns what is wrong with a translation."""
     faults = []
     wanted, given = Counter(PLACEHOLDER.findall(default)), Counter(PLACEHOLDER.findall(translation))
@@ -203,14 +243,13 @@ def check_entry(default, translation):
         faults.append(f"{name} is lost")
     for name in sorted(set(given - wanted)):
         faults.append(f"{name} is not in the default text")
-    # The values are inserted in the order of the conversions, so that must not change.
-    conversions = [CONVERSION.findall(PLACEHOLDER.sub("", text)) for text in (default, translation)]
+    conversions = [conversions_of(key, text) for text in (default, translation)]
     if conversions[0] != conversions[1]:
         faults.append(f"the conversions differ: {' '.join(conversions[0])} and {' '.join(conversions[1])}")
     accelerators = [bool(ACCELERATOR.search(text)) for text in (default, translation)]
     if accelerators[0] != accelerators[1]:
         faults.append("only one of the texts has an accelerator")
-    if default.rstrip().endswith((".", ":")) and translation.rstrip()[-1:] not in ".:。：":
+    if default.rstrip().endswith((".", ":")) and translation.rstrip()[-1:] not in tuple(".:。："):
         faults.append("the punctuation at the end is lost")
     return faults
 
@@ -236,7 +275,7 @@ def check(arguments):
                 continue
             if entry.msgctxt in translated:
                 faults.append(f"{place}: a second translation")
-            faults.extend(f"{place}: {fault}" for fault in check_entry(text.default, entry.msgstr))
+            faults.extend(f"{place}: {fault}" for fault in check_entry(text.default, entry.msgstr, entry.msgctxt))
             if entry.msgid != text.default:
                 notes.append(f"{place}: the default text has changed: run translations.py update")
             elif not entry.fuzzy:
