@@ -56,7 +56,8 @@ SDecodedMedia CMpegDecoder::open(const SDecoderOptions& options) {
     m_inputPosition = 0;
     int error = MPG123_OK;
     m_handle.reset(mpg123_new(nullptr, &error));
-    if (!m_handle) fail("could not open %s: %s", m_file.getDisplayName(), describe(error));
+    if (!m_handle)
+        fail({"sonora2.plugins.open", "could not open %s: %s"}, m_file.getDisplayName(), describe(error));
     mpg123_handle* handle = m_handle.get();
     mpg123_param(handle, MPG123_ADD_FLAGS, MPG123_QUIET | MPG123_SKIP_ID3V2, 0);
     // Gapless mode would trust the length stated in the file.
@@ -128,8 +129,10 @@ void CMpegDecoder::scan() {
         // somewhere in the middle.
         const int64_t behind = told == decoded && padding > kDecoderDelay ? padding - kDecoderDelay : 0;
         if (const int64_t stated = told - delay - padding; stated > decoded - before)
-            m_options.warn("%s is incomplete: %.3f of %.3f seconds were found", m_file.getDisplayName(),
-                           toSeconds(std::max<int64_t>(decoded - before, 0)), toSeconds(stated));
+            m_options.warn(
+                {"sonora2.CMpegDecoder.incomplete", "%s is incomplete: %.3f of %.3f seconds were found"},
+                m_file.getDisplayName(), toSeconds(std::max<int64_t>(decoded - before, 0)),
+                toSeconds(stated));
         if (before + behind <= decoded) {
             scan.start = before;
             scan.frames = decoded - before - behind;
@@ -153,17 +156,18 @@ int CMpegDecoder::read(uint8_t* pcm, int frames) {
     for (int i = 0; i < 2 && result == MPG123_NEW_FORMAT && done == 0; ++i)
         result = mpg123_read(m_handle.get(), pcm, wanted, &done);
     if (result == MPG123_NEW_FORMAT && done == 0)
-        fail("%s changes its format at %.3f seconds, which is not supported", m_file.getDisplayName(),
-             toSeconds(m_position));
+        fail({"sonora2.CMpegDecoder.change", "%s changes its format at %.3f seconds, which is not supported"},
+             m_file.getDisplayName(), toSeconds(m_position));
     if (done == 0 && result != MPG123_OK && result != MPG123_DONE)
-        fail("could not decode %s at %.3f seconds: %s", m_file.getDisplayName(), toSeconds(m_position),
-             describe(mpg123_errcode(m_handle.get())));
+        fail({"sonora2.plugins.decode", "could not decode %s at %.3f seconds: %s"}, m_file.getDisplayName(),
+             toSeconds(m_position), describe(mpg123_errcode(m_handle.get())));
     checkContinuity();
     int count = static_cast<int>(done / static_cast<size_t>(m_format.frameBytes()));
     if (count == 0 && m_position < m_scan.frames && m_scan.identity == identify()) {
         // Frames with an intact header may still be impossible to decode.
         if (!std::exchange(m_padding, true))
-            m_options.warn("%s is damaged: %.3f seconds could not be decoded, silence follows the sound",
+            m_options.warn({"sonora2.CMpegDecoder.undecodable",
+                            "%s is damaged: %.3f seconds could not be decoded, silence follows the sound"},
                            m_file.getDisplayName(), toSeconds(m_scan.frames - m_position));
         count = static_cast<int>(std::min<int64_t>(frames, m_scan.frames - m_position));
         std::memset(pcm, 0, wanted);
@@ -183,7 +187,8 @@ void CMpegDecoder::checkContinuity() {
         const int64_t skipped = start - skipTags(m_input.get(), m_frameEnd);
         seekInput(this, m_inputPosition, SEEK_SET);
         if (skipped > 0 && info.bitrate > 0)
-            m_options.warn("%s is damaged at %.3f seconds: %d bytes, about %.3f seconds, were skipped",
+            m_options.warn({"sonora2.CMpegDecoder.skipped",
+                            "%s is damaged at %.3f seconds: %d bytes, about %.3f seconds, were skipped"},
                            m_file.getDisplayName(), toSeconds(m_position), skipped,
                            static_cast<double>(skipped) / (info.bitrate * 125.0));
     }
@@ -193,30 +198,33 @@ void CMpegDecoder::checkContinuity() {
 
 void CMpegDecoder::seek(int64_t frame) {
     if (mpg123_seek(m_handle.get(), m_scan.start + frame, SEEK_SET) < 0) {
-        const char* reason = describe(mpg123_errcode(m_handle.get()));
-        fail("could not find %.3f seconds in %s: %s", toSeconds(frame), m_file.getDisplayName(), reason);
+        const P<peru::IString> reason = describe(mpg123_errcode(m_handle.get()));
+        fail({"sonora2.plugins.seek", "could not find %.3f seconds in %s: %s"}, toSeconds(frame),
+             m_file.getDisplayName(), reason);
     }
     m_position = frame;
     m_padding = false;
     m_frameEnd = 0;
 }
 
-const char* CMpegDecoder::describe(int error) const {
+P<peru::IString> CMpegDecoder::describe(int error) const {
     switch (error) {
     case MPG123_ERR_READER:
-        return m_input && std::ferror(m_input.get()) ? "the file cannot be read"
-                                                     : "it ends before a whole frame";
+        if (m_input && std::ferror(m_input.get()))
+            return peru::localize("sonora2.plugins.unreadable", "the file cannot be read");
+        return peru::localize("sonora2.CMpegDecoder.noWholeFrame", "it ends before a whole frame");
     case MPG123_RESYNC_FAIL:
-        return "no MPEG audio frame was found";
+        return peru::localize("sonora2.CMpegDecoder.noFrame", "no MPEG audio frame was found");
     case MPG123_OUT_OF_MEM:
-        return "there is not enough memory";
+        return peru::localize("sonora2.CMpegDecoder.noMemory", "there is not enough memory");
     default:
-        return "the decoder failed";
+        return peru::localize("sonora2.CMpegDecoder.decoderFailed", "the decoder failed");
     }
 }
 
 void CMpegDecoder::failToOpen() const {
-    fail("could not open %s: %s", m_file.getDisplayName(), describe(mpg123_errcode(m_handle.get())));
+    fail({"sonora2.plugins.open", "could not open %s: %s"}, m_file.getDisplayName(),
+         describe(mpg123_errcode(m_handle.get())));
 }
 
 } // namespace sonora2::plugins

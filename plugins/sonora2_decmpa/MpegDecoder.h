@@ -47,7 +47,7 @@ private:
     SIdentity identify() const;
     void scan();
     void checkContinuity();
-    const char* describe(int error) const;
+    P<peru::IString> describe(int error) const;
     [[noreturn]] void failToOpen() const;
     double toSeconds(int64_t frame) const { return static_cast<double>(frame) / m_format.rate; }
     static ssize_t readInput(void* self, void* data, size_t size);

@@ -16,16 +16,24 @@ namespace {
 
 constexpr int kSearchedBytes = 64 * 1024; // for the start of the stream
 
-const char* describe(FLAC__StreamDecoderErrorStatus status) {
+constexpr peru::SLocalizedText kBadHeader{"sonora2.CFlacDecoder.badHeader",
+                                          "the header of a frame is damaged"};
+constexpr peru::SLocalizedText kBadChecksum{"sonora2.CFlacDecoder.badChecksum",
+                                            "the checksum of a frame is wrong"};
+constexpr peru::SLocalizedText kBadData{"sonora2.CFlacDecoder.badData", "the data of a frame is invalid"};
+constexpr peru::SLocalizedText kMissing{"sonora2.CFlacDecoder.missing", "data is missing or overwritten"};
+constexpr peru::SLocalizedText kNoMemory{"sonora2.CFlacDecoder.noMemory", "out of memory"};
+
+const peru::SLocalizedText& describe(FLAC__StreamDecoderErrorStatus status) {
     switch (status) {
     case FLAC__STREAM_DECODER_ERROR_STATUS_BAD_HEADER:
-        return "the header of a frame is damaged";
+        return kBadHeader;
     case FLAC__STREAM_DECODER_ERROR_STATUS_FRAME_CRC_MISMATCH:
-        return "the checksum of a frame is wrong";
+        return kBadChecksum;
     case FLAC__STREAM_DECODER_ERROR_STATUS_UNPARSEABLE_STREAM:
-        return "the data of a frame is invalid";
+        return kBadData;
     default:
-        return "data is missing or overwritten";
+        return kMissing;
     }
 }
 
@@ -51,7 +59,8 @@ SDecodedMedia CFlacDecoder::open(const SDecoderOptions& options) {
     if (!m_decoder) throw std::bad_alloc();
     if (FLAC__stream_decoder_init_stream(m_decoder.get(), onRead, onSeek, onTell, onLength, onEof, onFrame,
                                          onMetadata, onError, this) != FLAC__STREAM_DECODER_INIT_STATUS_OK)
-        fail("could not read %s: the decoder does not start", m_file.getDisplayName());
+        fail({"sonora2.CFlacDecoder.noStart", "could not read %s: the decoder does not start"},
+             m_file.getDisplayName());
     readMetadata();
     if (m_total == 0) {
         if (m_scanned < 0) {
@@ -93,7 +102,8 @@ int64_t CFlacDecoder::findStream() {
 
 void CFlacDecoder::readMetadata() {
     if (!FLAC__stream_decoder_process_until_end_of_metadata(m_decoder.get()) || m_bits == 0)
-        fail("could not read %s: no FLAC stream was found", m_file.getDisplayName());
+        fail({"sonora2.CFlacDecoder.noStream", "could not read %s: no FLAC stream was found"},
+             m_file.getDisplayName());
     forget(); // errors in metadata do not affect the sound
 }
 
@@ -130,10 +140,11 @@ int CFlacDecoder::read(uint8_t* pcm, int frames) {
     if (m_silence > 0) return deliverSilence(pcm, frames);
     if (m_restStart < m_rest.size()) return deliverRest(pcm, frames);
     if (m_change)
-        fail("%s changes at %.3f seconds from %s, which is not supported", m_file.getDisplayName(),
-             toSeconds(m_position), m_change);
+        fail({"sonora2.CFlacDecoder.change", "%s changes at %.3f seconds from %s, which is not supported"},
+             m_file.getDisplayName(), toSeconds(m_position), m_change);
     if (m_damage && !m_options.salvage)
-        fail("%s is damaged at %.3f seconds: %s", m_file.getDisplayName(), toSeconds(m_position), m_damage);
+        fail({"sonora2.CFlacDecoder.damaged", "%s is damaged at %.3f seconds: %s"}, m_file.getDisplayName(),
+             toSeconds(m_position), peru::format(*m_damage));
     return 0;
 }
 
@@ -191,7 +202,8 @@ void CFlacDecoder::forget() {
 void CFlacDecoder::rewind() {
     const int64_t total = m_total;
     if (!FLAC__stream_decoder_reset(m_decoder.get()))
-        fail("could not read %s: it cannot be rewound", m_file.getDisplayName());
+        fail({"sonora2.CFlacDecoder.noRewind", "could not read %s: it cannot be rewound"},
+             m_file.getDisplayName());
     readMetadata();
     m_position = 0;
     m_total = total;
@@ -223,9 +235,10 @@ bool CFlacDecoder::take(const FLAC__Frame& frame, const FLAC__int32* const plane
     if (static_cast<int>(header.channels) != m_format.channels ||
         static_cast<int>(header.bits_per_sample) != m_bits ||
         static_cast<int>(header.sample_rate) != m_format.rate) {
-        m_change = peru::format("%d Hz, %d channels, %d bits to %d Hz, %d channels, %d bits", m_format.rate,
-                                m_format.channels, m_bits, header.sample_rate, header.channels,
-                                header.bits_per_sample);
+        m_change = peru::format(
+            {"sonora2.CFlacDecoder.fromTo", "%d Hz, %d channels, %d bits to %d Hz, %d channels, %d bits"},
+            m_format.rate, m_format.channels, m_bits, header.sample_rate, header.channels,
+            header.bits_per_sample);
         return false;
     }
     const int frames = static_cast<int>(header.blocksize);
@@ -285,8 +298,9 @@ void CFlacDecoder::addDamage(int64_t from, int64_t frames) {
 
 void CFlacDecoder::reportDamage() {
     if (m_damagedFrom < 0) return;
-    m_options.warn("%s is damaged: %.3f to %.3f seconds were replaced by silence", m_file.getDisplayName(),
-                   toSeconds(m_damagedFrom), toSeconds(m_damagedTo));
+    m_options.warn(
+        {"sonora2.plugins.replaced", "%s is damaged: %.3f to %.3f seconds were replaced by silence"},
+        m_file.getDisplayName(), toSeconds(m_damagedFrom), toSeconds(m_damagedTo));
     m_damagedFrom = -1;
 }
 
@@ -334,7 +348,7 @@ FLAC__StreamDecoderWriteStatus CFlacDecoder::onFrame(const FLAC__StreamDecoder*,
     try {
         if (decoder->take(*frame, planes)) return FLAC__STREAM_DECODER_WRITE_STATUS_CONTINUE;
     } catch (const std::bad_alloc&) {
-        decoder->m_damage = "out of memory";
+        decoder->m_damage = &kNoMemory;
     }
     return FLAC__STREAM_DECODER_WRITE_STATUS_ABORT;
 }
@@ -351,7 +365,7 @@ void CFlacDecoder::onMetadata(const FLAC__StreamDecoder*, const FLAC__StreamMeta
 
 void CFlacDecoder::onError(const FLAC__StreamDecoder*, FLAC__StreamDecoderErrorStatus status, void* self) {
     CFlacDecoder* decoder = static_cast<CFlacDecoder*>(self);
-    if (!decoder->m_damage) decoder->m_damage = describe(status);
+    if (!decoder->m_damage) decoder->m_damage = &describe(status);
     if (status == FLAC__STREAM_DECODER_ERROR_STATUS_FRAME_CRC_MISMATCH) decoder->m_badChecksum = true;
 }
 

@@ -79,9 +79,9 @@ private:
     size_t m_restStart = 0;
     int64_t m_next = -1; // number of the frame after the last one that was decoded; -1 if unknown
 
-    const char* m_damage = nullptr; // first error since the last good frame
-    bool m_badChecksum = false;     // the next frame is damaged
-    int64_t m_damagedFrom = -1;     // frames replaced by silence that have not been reported; -1 if none
+    const peru::SLocalizedText* m_damage = nullptr; // first error since the last good frame
+    bool m_badChecksum = false;                     // the next frame is damaged
+    int64_t m_damagedFrom = -1; // frames replaced by silence that have not been reported; -1 if none
     int64_t m_damagedTo = -1;
     P<peru::IString> m_change; // of the format, within the stream; empty if there is none
 };

@@ -43,8 +43,9 @@ bool CFlacEncoder::accepts(const SPcmFormat& format) const {
     if (format.channels <= static_cast<int>(FLAC__MAX_CHANNELS) &&
         FLAC__format_sample_rate_is_valid(static_cast<uint32_t>(format.rate)))
         return true;
-    fail("FLAC files hold 1 to %d channels at up to %d Hz, not %d channels at %d Hz", FLAC__MAX_CHANNELS,
-         FLAC__MAX_SAMPLE_RATE, format.channels, format.rate);
+    fail({"sonora2.CFlacEncoder.formats",
+          "FLAC files hold 1 to %d channels at up to %d Hz, not %d channels at %d Hz"},
+         FLAC__MAX_CHANNELS, FLAC__MAX_SAMPLE_RATE, format.channels, format.rate);
 }
 
 void CFlacEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
@@ -76,7 +77,7 @@ void CFlacEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
         FLAC__stream_encoder_init_stream(encoder, onWrite, onSeek, onTell, nullptr, this);
     if (status == FLAC__STREAM_ENCODER_INIT_STATUS_OK) return;
     file.throwFailure();
-    fail("could not write %s: %s", file.getFile().getDisplayName(),
+    fail({"sonora2.plugins.write", "could not write %s: %s"}, file.getFile().getDisplayName(),
          FLAC__StreamEncoderInitStatusString[status]);
 }
 
@@ -134,7 +135,7 @@ void CFlacEncoder::writeSeekTable() {
 void CFlacEncoder::failEncoding() {
     COutputFile* file = std::exchange(m_file, nullptr);
     file->throwFailure();
-    fail("could not write %s: %s", file->getFile().getDisplayName(),
+    fail({"sonora2.plugins.write", "could not write %s: %s"}, file->getFile().getDisplayName(),
          FLAC__stream_encoder_get_resolved_state_string(m_encoder.get()));
 }
 

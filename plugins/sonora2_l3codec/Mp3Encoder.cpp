@@ -43,9 +43,8 @@ bool CMp3Encoder::accepts(const SPcmFormat& format) const {
     if (format.channels <= 2 &&
         std::find(std::begin(kRates), std::end(kRates), format.rate) != std::end(kRates))
         return true;
-    fail("MP3 files hold 1 or 2 channels at 8, 11.025, 12, 16, 22.05, 24, 32, 44.1 or 48 kHz, not %d "
-         "channels at "
-         "%d Hz",
+    fail({"sonora2.CMp3Encoder.formats", "MP3 files hold 1 or 2 channels at 8, 11.025, 12, 16, 22.05, 24, "
+                                         "32, 44.1 or 48 kHz, not %d channels at %d Hz"},
          format.channels, format.rate);
 }
 
@@ -82,7 +81,8 @@ void CMp3Encoder::open(COutputFile& file, const SEncoderSettings& settings) {
         if (settings.maxBitRate > 0) lame_set_VBR_max_bitrate_kbps(encoder, toKilobits(settings.maxBitRate));
     }
     if (lame_init_params(encoder) < 0)
-        fail("could not write %s: MP3 has no mode for %d Hz, %d channels and these bit rates",
+        fail({"sonora2.CMp3Encoder.noMode",
+              "could not write %s: MP3 has no mode for %d Hz, %d channels and these bit rates"},
              file.getFile().getDisplayName(), m_format.rate, m_format.channels);
 }
 
@@ -125,7 +125,8 @@ void CMp3Encoder::finish() {
 
 void CMp3Encoder::writeEncoded(int bytes) {
     if (bytes < 0)
-        fail("could not write %s: the MP3 encoder failed with %d", m_file->getFile().getDisplayName(), bytes);
+        fail({"sonora2.CMp3Encoder.failed", "could not write %s: the MP3 encoder failed with %d"},
+             m_file->getFile().getDisplayName(), bytes);
     m_file->write(m_encoded.data(), static_cast<size_t>(bytes));
 }
 

@@ -15,20 +15,20 @@ constexpr int kMaxChannels = 8;
 constexpr int kBlockFrames = 4096;
 constexpr int kMaxResyncFrames = 1 << 20; // searched for a position after a gap
 
-const char* describe(long error) {
+P<peru::IString> describe(long error) {
     switch (error) {
     case OV_EREAD:
-        return "the file cannot be read";
+        return peru::localize("sonora2.plugins.unreadable", "the file cannot be read");
     case OV_ENOTVORBIS:
-        return "there is no Vorbis stream in it";
+        return peru::localize("sonora2.CVorbisDecoder.noStream", "there is no Vorbis stream in it");
     case OV_EVERSION:
-        return "its version of Vorbis is unknown";
+        return peru::localize("sonora2.CVorbisDecoder.version", "its version of Vorbis is unknown");
     case OV_EBADHEADER:
-        return "its header is damaged";
+        return peru::localize("sonora2.CVorbisDecoder.header", "its header is damaged");
     case OV_EBADLINK:
-        return "it is damaged";
+        return peru::localize("sonora2.CVorbisDecoder.isDamaged", "it is damaged");
     default:
-        return "it cannot be decoded";
+        return peru::localize("sonora2.CVorbisDecoder.undecodable", "it cannot be decoded");
     }
 }
 
@@ -40,21 +40,26 @@ SDecodedMedia CVorbisDecoder::open(const SDecoderOptions& options) {
     InputFile file = openForReading(m_file);
     if (const int error = ov_open_callbacks(file.get(), &m_stream, nullptr, 0, OV_CALLBACKS_DEFAULT);
         error < 0)
-        fail("could not open %s: %s", m_file.getDisplayName(), describe(error));
+        fail({"sonora2.plugins.open", "could not open %s: %s"}, m_file.getDisplayName(), describe(error));
     static_cast<void>(file.release()); // now owned by the stream
     m_opened = true;
 
     const vorbis_info* info = ov_info(&m_stream, -1);
     const ogg_int64_t frames = ov_pcm_total(&m_stream, -1);
-    if (!info || frames < 0) fail("could not open %s: %s", m_file.getDisplayName(), describe(OV_EBADLINK));
+    if (!info || frames < 0)
+        fail({"sonora2.plugins.open", "could not open %s: %s"}, m_file.getDisplayName(),
+             describe(OV_EBADLINK));
     if (info->channels > kMaxChannels)
-        fail("could not open %s: it has %d channels", m_file.getDisplayName(), info->channels);
+        fail({"sonora2.CVorbisDecoder.channels", "could not open %s: it has %d channels"},
+             m_file.getDisplayName(), info->channels);
     m_format = {static_cast<int>(info->rate), info->channels, kBytesPerSample};
     // Streams may be chained, but chunks cannot express a change of format.
     for (int link = 0; link < ov_streams(&m_stream); ++link) {
         const vorbis_info* other = ov_info(&m_stream, link);
         if (other->rate != m_format.rate || other->channels != m_format.channels)
-            fail("could not open %s: it is a chain of streams in different formats", m_file.getDisplayName());
+            fail({"sonora2.CVorbisDecoder.chain",
+                  "could not open %s: it is a chain of streams in different formats"},
+                 m_file.getDisplayName());
     }
     return {m_format, frames, "Vorbis"};
 }
@@ -113,7 +118,7 @@ int CVorbisDecoder::decodeBlock(uint8_t* pcm, int frames) {
     const long got = ov_read_float(&m_stream, &planes, frames, &link);
     if (got == OV_HOLE) return OV_HOLE;
     if (got < 0)
-        fail("could not decode %s at %.3f seconds: %s", m_file.getDisplayName(),
+        fail({"sonora2.plugins.decode", "could not decode %s at %.3f seconds: %s"}, m_file.getDisplayName(),
              static_cast<double>(m_position) / m_format.rate, describe(got));
     const float* ordered[kMaxChannels];
     const int* order = getVorbisChannelOrder(m_format.channels);
@@ -128,8 +133,8 @@ int CVorbisDecoder::decodeBlock(uint8_t* pcm, int frames) {
 void CVorbisDecoder::seek(int64_t frame) {
     forget(frame);
     if (const int error = ov_pcm_seek_page(&m_stream, frame); error < 0)
-        fail("could not find %.3f seconds in %s: %s", static_cast<double>(frame) / m_format.rate,
-             m_file.getDisplayName(), describe(error));
+        fail({"sonora2.plugins.seek", "could not find %.3f seconds in %s: %s"},
+             static_cast<double>(frame) / m_format.rate, m_file.getDisplayName(), describe(error));
     const int64_t found = ov_pcm_tell(&m_stream);
     if (found > frame) return skipGap(found - frame);
     m_position = found;
@@ -143,11 +148,13 @@ void CVorbisDecoder::skipGap(int64_t frames) {
     const double from = static_cast<double>(m_position) / m_format.rate;
     const double length = static_cast<double>(frames) / m_format.rate;
     if (!m_options.salvage)
-        fail("%s is damaged at %.3f seconds: %.3f seconds of sound are missing", m_file.getDisplayName(),
-             from, length);
+        fail({"sonora2.CVorbisDecoder.damaged",
+              "%s is damaged at %.3f seconds: %.3f seconds of sound are missing"},
+             m_file.getDisplayName(), from, length);
     m_silence = frames;
-    m_options.warn("%s is damaged: %.3f to %.3f seconds were replaced by silence", m_file.getDisplayName(),
-                   from, from + length);
+    m_options.warn(
+        {"sonora2.plugins.replaced", "%s is damaged: %.3f to %.3f seconds were replaced by silence"},
+        m_file.getDisplayName(), from, from + length);
 }
 
 void CVorbisDecoder::forget(int64_t position) {

@@ -67,8 +67,9 @@ CVorbisEncoder::~CVorbisEncoder() {
 
 bool CVorbisEncoder::accepts(const SPcmFormat& format) const {
     if (format.channels <= kMaxChannels && format.rate <= kMaxRate) return true;
-    fail("Ogg Vorbis files hold 1 to %d channels at up to %d Hz, not %d channels at %d Hz", kMaxChannels,
-         kMaxRate, format.channels, format.rate);
+    fail({"sonora2.CVorbisEncoder.formats",
+          "Ogg Vorbis files hold 1 to %d channels at up to %d Hz, not %d channels at %d Hz"},
+         kMaxChannels, kMaxRate, format.channels, format.rate);
 }
 
 void CVorbisEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
@@ -86,9 +87,8 @@ void CVorbisEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
             if (range.highest > 0) requireBitRate(file.getFile(), "Vorbis", m_format, bitRate, range);
     }
     if (error != 0)
-        fail("could not write %s: Vorbis has no mode for %d channels at %d Hz with a bit rate of %d (at "
-             "least %d, at "
-             "most %d)",
+        fail({"sonora2.CVorbisEncoder.noMode", "could not write %s: Vorbis has no mode for %d channels at %d "
+                                               "Hz with a bit rate of %d (at least %d, at most %d)"},
              file.getFile().getDisplayName(), m_format.channels, m_format.rate, settings.nominalBitRate,
              settings.minBitRate, settings.maxBitRate);
     vorbis_analysis_init(&m_state, &m_info);

@@ -125,7 +125,9 @@ SDecodedMedia CSndfileDecoder::open(const SDecoderOptions& options) {
     m_options = options;
     m_input = openForReading(m_file);
     if (!isOwnContainer(m_input.get()))
-        fail("could not read %s: it is another kind of file than its name suggests", m_file.getDisplayName());
+        fail({"sonora2.CSndfileDecoder.otherKind",
+              "could not read %s: it is another kind of file than its name suggests"},
+             m_file.getDisplayName());
     SF_INFO info{};
     openHandle(info);
     m_format = {info.samplerate, info.channels, 0};
@@ -274,8 +276,8 @@ void CSndfileDecoder::findScale() {
     seek(position);
     if (peak <= 1.0) return;
     m_scale = 1.0 / peak;
-    m_options.warn("%s: reduced by %.1f dB to prevent clipping", m_file.getDisplayName(),
-                   20.0 * std::log10(peak));
+    m_options.warn({"sonora2.CSndfileDecoder.reduced", "%s: reduced by %.1f dB to prevent clipping"},
+                   m_file.getDisplayName(), 20.0 * std::log10(peak));
 }
 
 template <class Sample> void CSndfileDecoder::scale(std::vector<Sample>& samples, size_t count) const {
@@ -287,8 +289,8 @@ template <class Sample> void CSndfileDecoder::scale(std::vector<Sample>& samples
 
 void CSndfileDecoder::seek(int64_t frame) {
     if (sf_seek(m_handle.get(), frame, SEEK_SET) != frame)
-        fail("could not find frame %d of %s: %s", frame, m_file.getDisplayName(),
-             peru::CString::fromUTF8(sf_strerror(m_handle.get())));
+        fail({"sonora2.CSndfileDecoder.seek", "could not find frame %d of %s: %s"}, frame,
+             m_file.getDisplayName(), peru::CString::fromUTF8(sf_strerror(m_handle.get())));
     m_position = frame;
 }
 
@@ -309,8 +311,8 @@ template <class Sample> void CSndfileDecoder::checkClipping(const Sample* sample
 
 void CSndfileDecoder::reportClipping() {
     if (m_clipped == 0) return;
-    m_options.warn("%s: clipped %d samples, peak +%.1f dB", m_file.getDisplayName(), m_clipped,
-                   20.0 * std::log10(m_peak));
+    m_options.warn({"sonora2.CSndfileDecoder.clipped", "%s: clipped %d samples, peak +%.1f dB"},
+                   m_file.getDisplayName(), m_clipped, 20.0 * std::log10(m_peak));
     m_clipped = 0;
     m_peak = 0.0;
 }
@@ -318,16 +320,20 @@ void CSndfileDecoder::reportClipping() {
 void CSndfileDecoder::openHandle(SF_INFO& info) {
     m_patches = {findMissingSize(m_input.get()), findMissingWidth(m_input.get())};
     if (m_patches[0].size > 0)
-        m_options.warn("%s was not completed by its writer and is read to its end", m_file.getDisplayName());
+        m_options.warn({"sonora2.CSndfileDecoder.notCompleted",
+                        "%s was not completed by its writer and is read to its end"},
+                       m_file.getDisplayName());
     SF_VIRTUAL_IO io{getLength, seekInput, readInput, writeNothing, tellInput};
     m_handle.reset(sf_open_virtual(&io, SFM_READ, &info, this));
     if (m_handle) return;
     const std::string codec =
         readUnsupportedCodec(m_input.get(), sf_error(nullptr) == SF_ERR_UNSUPPORTED_ENCODING);
     if (!codec.empty())
-        fail("could not read %s: the codec %s is not supported in this type of file", m_file.getDisplayName(),
-             peru::CString::fromUTF8(codec));
-    fail("could not read %s: %s", m_file.getDisplayName(), peru::CString::fromUTF8(sf_strerror(nullptr)));
+        fail({"sonora2.CSndfileDecoder.codec",
+              "could not read %s: the codec %s is not supported in this type of file"},
+             m_file.getDisplayName(), peru::CString::fromUTF8(codec));
+    fail({"sonora2.plugins.read", "could not read %s: %s"}, m_file.getDisplayName(),
+         peru::CString::fromUTF8(sf_strerror(nullptr)));
 }
 
 sf_count_t CSndfileDecoder::getLength(void* self) {

@@ -89,8 +89,9 @@ SF_INFO CSndfileEncoder::describe(const SPcmFormat& format) const {
 bool CSndfileEncoder::accepts(const SPcmFormat& format) const {
     const SF_INFO info = describe(format);
     if (sf_format_check(&info)) return true;
-    fail(".%s files hold up to 1024 channels, not %d channels at %d Hz in %d bits", m_container.extension,
-         format.channels, format.rate, format.bytesPerSample * 8);
+    fail({"sonora2.CSndfileEncoder.formats",
+          ".%s files hold up to 1024 channels, not %d channels at %d Hz in %d bits"},
+         m_container.extension, format.channels, format.rate, format.bytesPerSample * 8);
 }
 
 bool CSndfileEncoder::holdsFloat(const SPcmFormat& format) const {
@@ -107,7 +108,7 @@ void CSndfileEncoder::open(COutputFile& file, const SEncoderSettings& settings) 
     m_handle.reset(sf_open_virtual(&io, SFM_WRITE, &info, &file));
     file.throwFailure();
     if (!m_handle)
-        fail("could not write %s: %s", file.getFile().getDisplayName(),
+        fail({"sonora2.plugins.write", "could not write %s: %s"}, file.getFile().getDisplayName(),
              peru::CString::fromUTF8(sf_strerror(nullptr)));
     sf_command(m_handle.get(), SFC_SET_ADD_PEAK_CHUNK, nullptr, SF_FALSE);
     m_swapped = sf_command(m_handle.get(), SFC_RAW_DATA_NEEDS_ENDSWAP, nullptr, 0) == SF_TRUE;
@@ -117,7 +118,8 @@ void CSndfileEncoder::write(const uint8_t* pcm, int frames) {
     const int64_t bytes = int64_t{frames} * m_format.frameBytes();
     const size_t samples = static_cast<size_t>(frames) * m_format.channels;
     if (m_container.below4GiB && m_bytes + bytes + m_container.getHeaderBytes(m_format) >= kFourGiB)
-        fail("%s would grow beyond 4 GiB, which its format cannot hold", m_file->getFile().getDisplayName());
+        fail({"sonora2.CSndfileEncoder.tooLarge", "%s would grow beyond 4 GiB, which its format cannot hold"},
+             m_file->getFile().getDisplayName());
     SNDFILE* handle = m_handle.get();
     bool written = false;
     if (m_format.bytesPerSample == 1 && m_container.signed8) {
@@ -143,7 +145,7 @@ void CSndfileEncoder::write(const uint8_t* pcm, int frames) {
     m_bytes += bytes;
     if (written) return;
     m_file->throwFailure();
-    fail("could not write %s: %s", m_file->getFile().getDisplayName(),
+    fail({"sonora2.plugins.write", "could not write %s: %s"}, m_file->getFile().getDisplayName(),
          peru::CString::fromUTF8(sf_strerror(handle)));
 }
 
@@ -155,7 +157,7 @@ void CSndfileEncoder::update() {
 void CSndfileEncoder::finish() {
     if (sf_close(m_handle.release()) != 0) {
         m_file->throwFailure();
-        fail("could not complete %s", m_file->getFile().getDisplayName());
+        fail({"sonora2.CSndfileEncoder.finish", "could not complete %s"}, m_file->getFile().getDisplayName());
     }
     if (m_bytes % 2 != 0) correctSizes();
 }

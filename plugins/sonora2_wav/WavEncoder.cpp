@@ -61,8 +61,8 @@ private:
 
 bool CWavEncoder::accepts(const SPcmFormat& format) const {
     if (fits(format)) return true;
-    fail("WAV files hold frames of up to 65535 bytes and up to 4 GiB per second, not %d channels at %d Hz in "
-         "%d bits",
+    fail({"sonora2.CWavEncoder.formats", "WAV files hold frames of up to 65535 bytes and up to 4 GiB per "
+                                         "second, not %d channels at %d Hz in %d bits"},
          format.channels, format.rate, format.bytesPerSample * 8);
 }
 

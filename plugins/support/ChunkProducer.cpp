@@ -56,10 +56,12 @@ void CChunkProducer::requireDeliverable(const SMediaFile& file, const SPcmFormat
     if (own == wanted) return;
     const auto [low, high] = std::minmax(own.rate, wanted.rate);
     if (!CFormatConverter::canConvert(own.channels, wanted.channels))
-        fail("%s has %d channels and cannot be converted to %d Hz, %d channels", file.getDisplayName(),
-             own.channels, wanted.rate, wanted.channels);
+        fail({"sonora2.CChunkProducer.channels",
+              "%s has %d channels and cannot be converted to %d Hz, %d channels"},
+             file.getDisplayName(), own.channels, wanted.rate, wanted.channels);
     if (high / low >= kMaxRatio || high > kMaxRate)
-        fail("%s has a sample rate of %d Hz and cannot be converted to %d Hz, %d channels",
+        fail({"sonora2.CChunkProducer.rate",
+              "%s has a sample rate of %d Hz and cannot be converted to %d Hz, %d channels"},
              file.getDisplayName(), own.rate, wanted.rate, wanted.channels);
 }
 
@@ -168,7 +170,8 @@ int CChunkProducer::readOwn(uint8_t* pcm, int frames) {
 
 // Only called when there are frames left.
 void CChunkProducer::reportEarlyEnd() const {
-    constexpr const char* kText = "%s ends after %.3f of %.3f seconds";
+    constexpr peru::SLocalizedText kText{"sonora2.CChunkProducer.earlyEnd",
+                                         "%s ends after %.3f of %.3f seconds"};
     const double rate = m_media.format.rate;
     const double at = static_cast<double>(m_read) / rate;
     const double total = static_cast<double>(m_media.frames) / rate;

@@ -22,6 +22,10 @@ struct SDecoderOptions {
     P<common::ILogManager> log = {}; // may be empty
 
     // Reports something that does not stop the decoding.
+    template <class... Args> void warn(const peru::SLocalizedText& text, const Args&... args) const {
+        if (log) log->log(common::kSeverityWarning, peru::format(text, args...));
+    }
+    // The same for text that is not translated.
     template <class... Args> void warn(const char* text, const Args&... args) const {
         if (log) log->log(common::kSeverityWarning, peru::format(text, args...));
     }

@@ -91,7 +91,9 @@ bool CDecoderSource::isEOF() {
 }
 
 void CDecoderSource::setStartTime(double fStartTime) {
-    if (!(fStartTime >= 0.0)) fail("%g is no start time for %s", fStartTime, m_file.getDisplayName());
+    if (!(fStartTime >= 0.0))
+        fail({"sonora2.CDecoderSource.startTime", "%g is no start time for %s"}, fStartTime,
+             m_file.getDisplayName());
     m_startTime = fStartTime;
     if (isOpened()) restartAt(toFrame(m_startTime));
 }
@@ -103,7 +105,9 @@ P<audio::IAudioStreamInfos> CDecoderSource::getAudioStreamInfos() {
 }
 
 void CDecoderSource::setAudioStream(int nAudioIndex) {
-    if (nAudioIndex != 0) fail("%s has no audio stream %d", m_file.getDisplayName(), nAudioIndex);
+    if (nAudioIndex != 0)
+        fail({"sonora2.CDecoderSource.noSuchStream", "%s has no audio stream %d"}, m_file.getDisplayName(),
+             nAudioIndex);
 }
 
 void CDecoderSource::setSalvage(bool salvage) {
@@ -133,8 +137,8 @@ bool CDecoderSource::canUseFloat(int bytesPerSample) {
 
 void CDecoderSource::useFloat(int bytesPerSample) {
     if (!canUseFloat(bytesPerSample))
-        fail("%s cannot be read as floating-point samples of %d bits", m_file.getDisplayName(),
-             bytesPerSample * 8);
+        fail({"sonora2.CDecoderSource.noFloat", "%s cannot be read as floating-point samples of %d bits"},
+             m_file.getDisplayName(), bytesPerSample * 8);
     m_readAhead.reset();
     m_media.format.bytesPerSample = bytesPerSample;
     m_media.format.isFloat = true;
@@ -203,7 +207,8 @@ void CDecoderSource::openDecoder() {
     const bool sound = own.rate > 0 && own.channels > 0 && own.bytesPerSample >= 1 &&
                        own.bytesPerSample <= 4 && m_media.frames >= 0;
     if (!sound)
-        fail("%s: %d channels at %d Hz are no sound", m_file.getDisplayName(), own.channels, own.rate);
+        fail({"sonora2.CDecoderSource.noSound", "%s: %d channels at %d Hz are no sound"},
+             m_file.getDisplayName(), own.channels, own.rate);
     chooseFormat(m_wanted);
 }
 
@@ -241,7 +246,8 @@ void CDecoderSource::setDeliveredFormat(int sampleRate, int channelCount, int by
 }
 
 void CDecoderSource::requireOpened() const {
-    if (!m_producer) fail("%s is not opened for reading", m_file.getDisplayName());
+    if (!m_producer)
+        fail({"sonora2.CDecoderSource.notOpened", "%s is not opened for reading"}, m_file.getDisplayName());
 }
 
 int64_t CDecoderSource::toFrame(double seconds) const {

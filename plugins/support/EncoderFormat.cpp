@@ -74,34 +74,42 @@ int64_t CEncoderFormat::getEstimatedSizeBytes(double fDuration) {
 }
 
 void CEncoderFormat::setAudioQuality(double fQuality) {
-    requireClosed("the quality");
-    if (std::isnan(fQuality)) fail("the quality for %s is not a number", m_file.getDisplayName());
+    requireClosed(
+        {"sonora2.CEncoderFormat.qualityFixed", "the quality cannot be changed while %s is being written"});
+    if (std::isnan(fQuality))
+        fail({"sonora2.CEncoderFormat.qualityNotANumber", "the quality for %s is not a number"},
+             m_file.getDisplayName());
     m_settings.quality = std::clamp(fQuality, 0.0, 1.0);
 }
 
 void CEncoderFormat::setAudioBitRate(int nNominal, int nMin, int nMax) {
-    requireClosed("the bit rate");
+    requireClosed(
+        {"sonora2.CEncoderFormat.bitRateFixed", "the bit rate cannot be changed while %s is being written"});
     if (nNominal < 0 || nMin < 0 || nMax < 0 || (nMax > 0 && (nMin > nMax || nNominal > nMax)) ||
         (nNominal > 0 && nMin > nNominal))
-        fail("the bit rates %d (at least %d, at most %d) for %s contradict each other", nNominal, nMin, nMax,
-             m_file.getDisplayName());
+        fail({"sonora2.CEncoderFormat.bitRatesContradict",
+              "the bit rates %d (at least %d, at most %d) for %s contradict each other"},
+             nNominal, nMin, nMax, m_file.getDisplayName());
     m_settings.nominalBitRate = nNominal;
     m_settings.minBitRate = nMin;
     m_settings.maxBitRate = nMax;
 }
 
 void CEncoderFormat::writeAudioChunk(const P<audio::IAudioChunk>& pAudioChunk) {
-    if (!isOpened()) fail("%s is not opened for writing", m_file.getDisplayName());
+    if (!isOpened())
+        fail({"sonora2.CEncoderFormat.notOpened", "%s is not opened for writing"}, m_file.getDisplayName());
     if (m_failed) {
         m_output->throwFailure();
-        fail("%s cannot be written on after a failure", m_file.getDisplayName());
+        fail({"sonora2.CEncoderFormat.failedBefore", "%s cannot be written on after a failure"},
+             m_file.getDisplayName());
     }
     if (!pAudioChunk || pAudioChunk->getSize() == 0) return;
     const uint32_t frameBytes = static_cast<uint32_t>(m_settings.format.frameBytes());
     const uint32_t size = pAudioChunk->getSize();
     if (size % frameBytes != 0)
-        fail("%d bytes of audio for %s are not whole frames of %d bytes", size, m_file.getDisplayName(),
-             frameBytes);
+        fail({"sonora2.CEncoderFormat.noWholeFrames",
+              "%d bytes of audio for %s are not whole frames of %d bytes"},
+             size, m_file.getDisplayName(), frameBytes);
     try {
         m_encoder->write(pAudioChunk->getData(), static_cast<int>(size / frameBytes));
         m_output->throwFailure();
@@ -124,14 +132,16 @@ bool CEncoderFormat::canUseFloat(int bytesPerSample) {
 }
 
 void CEncoderFormat::useFloat(int bytesPerSample) {
-    requireClosed("the sample format");
+    requireClosed({"sonora2.CEncoderFormat.formatFixed",
+                   "the sample format cannot be changed while %s is being written"});
     if (!canUseFloat(bytesPerSample))
-        fail("%s cannot hold floating-point samples of %d bits", m_file.getDisplayName(), bytesPerSample * 8);
+        fail({"sonora2.CEncoderFormat.noFloat", "%s cannot hold floating-point samples of %d bits"},
+             m_file.getDisplayName(), bytesPerSample * 8);
     m_settings.format = {m_integerFormat.rate, m_integerFormat.channels, bytesPerSample, true};
 }
 
-void CEncoderFormat::requireClosed(const char* what) const {
-    if (m_output) fail("%s cannot be changed while %s is being written", what, m_file.getDisplayName());
+void CEncoderFormat::requireClosed(const peru::SLocalizedText& text) const {
+    if (m_output) fail(text, m_file.getDisplayName());
 }
 
 } // namespace sonora2::plugins

@@ -48,7 +48,7 @@ public:
     void useFloat(int bytesPerSample) override;
 
 private:
-    void requireClosed(const char* what) const;
+    void requireClosed(const peru::SLocalizedText& text) const;
 
     P<peru::IString> m_pluginName;
     SMediaFile m_file;

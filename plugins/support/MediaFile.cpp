@@ -34,21 +34,27 @@ P<peru::IString> SMediaFile::getDisplayName() const {
     return path.empty() ? uri->getAsString() : peru::CString::fromUTF8(path);
 }
 
+namespace {
+
+constexpr peru::SLocalizedText kOpenFailed{"sonora2.plugins.open", "could not open %s: %s"};
+
+} // namespace
+
 InputFile openForReading(const SMediaFile& file) {
     std::error_code error;
     // A pipe would block, and a codec needs to seek.
     const std::filesystem::file_status status = std::filesystem::status(file.path, error);
-    if (error) failSystem("could not open", file, error.value());
-    if (std::filesystem::is_directory(status)) failSystem("could not open", file, EISDIR);
-    if (!std::filesystem::is_regular_file(status)) fail("%s is no file", file.getDisplayName());
+    if (error) failSystem(kOpenFailed, file, error.value());
+    if (std::filesystem::is_directory(status)) failSystem(kOpenFailed, file, EISDIR);
+    if (!std::filesystem::is_regular_file(status))
+        fail({"sonora2.plugins.noFile", "%s is no file"}, file.getDisplayName());
     InputFile input(std::fopen(file.path.c_str(), "rbe")); // closed in programs that are started meanwhile
-    if (!input) failSystem("could not open", file, errno);
+    if (!input) failSystem(kOpenFailed, file, errno);
     return input;
 }
 
-void failSystem(const char* doing, const SMediaFile& file, int errorNumber) {
-    fail("%s %s: %s", doing, file.getDisplayName(),
-         peru::CString::fromUTF8(std::generic_category().message(errorNumber)));
+void failSystem(const peru::SLocalizedText& text, const SMediaFile& file, int errorNumber) {
+    fail(text, file.getDisplayName(), peru::CString::fromUTF8(std::generic_category().message(errorNumber)));
 }
 
 } // namespace sonora2::plugins

@@ -1,7 +1,7 @@
 // The file that a plug-in reads or writes, and its audio format.
 #pragma once
 
-#include "peru/strings/StringFormat.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/uri/IURI.h"
 #include "sonora2/context/SonoraError.h"
 
@@ -48,10 +48,14 @@ using InputFile = std::unique_ptr<std::FILE, SFileCloser>;
 InputFile openForReading(const SMediaFile& file);
 
 // Throws CSonoraError; `text` is a format of CStringFormat.
+template <class... Args> [[noreturn]] void fail(const peru::SLocalizedText& text, const Args&... args) {
+    throw common::CSonoraError(peru::format(text, args...));
+}
+// The same for text that is not translated.
 template <class... Args> [[noreturn]] void fail(const char* text, const Args&... args) {
     throw common::CSonoraError(peru::format(text, args...));
 }
-// The same for a failed call of the system: "<doing> <file>: <reason>", such as "could not open".
-[[noreturn]] void failSystem(const char* doing, const SMediaFile& file, int errorNumber);
+// The same for a failed call of the system. The text's fields are the file and the reason.
+[[noreturn]] void failSystem(const peru::SLocalizedText& text, const SMediaFile& file, int errorNumber);
 
 } // namespace sonora2::plugins

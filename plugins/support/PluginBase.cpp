@@ -57,15 +57,16 @@ P<common::IFormat> CPluginBase::tryCreateFormat(const P<peru::IURI>& uri, int nT
     const SPcmFormat format{params.nSampleRate, params.nChannelCount, params.nBytesPerSample};
     bool accepted =
         format.rate > 0 && format.channels > 0 && format.bytesPerSample >= 1 && format.bytesPerSample <= 4;
-    P<peru::IString> reason = peru::format("%d channels at %d Hz in %d bits are not supported",
-                                           format.channels, format.rate, format.bytesPerSample * 8);
+    P<peru::IString> reason =
+        peru::format({"sonora2.CPluginBase.format", "%d channels at %d Hz in %d bits are not supported"},
+                     format.channels, format.rate, format.bytesPerSample * 8);
     try {
         accepted = accepted && factory(file)->accepts(format);
     } catch (const common::CSonoraError& error) {
         accepted = false;
         reason = error.getDescription();
     }
-    if (!accepted) fail("could not write %s: %s", file.getDisplayName(), reason);
+    if (!accepted) fail({"sonora2.plugins.write", "could not write %s: %s"}, file.getDisplayName(), reason);
     return peru::make<CEncoderFormat>(m_name, file, factory, format);
 }
 

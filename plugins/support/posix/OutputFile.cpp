@@ -16,6 +16,9 @@ namespace sonora2::plugins {
 
 namespace {
 
+constexpr peru::SLocalizedText kCreateFailed{"sonora2.plugins.create", "could not create %s: %s"};
+constexpr peru::SLocalizedText kWriteFailed{"sonora2.plugins.write", "could not write %s: %s"};
+
 constexpr size_t kBufferSize = 256 * 1024;
 constexpr int kMostLinks = 40;
 
@@ -50,18 +53,18 @@ COutputFile::COutputFile(const SMediaFile& file) : m_file(file) {
         m_identity[1] = status.st_ino;
         return;
     }
-    if (errno != EEXIST) failSystem("could not create", file, errno);
-    if (::stat(path.c_str(), &status) != 0) failSystem("could not create", file, errno);
+    if (errno != EEXIST) failSystem(kCreateFailed, file, errno);
+    if (::stat(path.c_str(), &status) != 0) failSystem(kCreateFailed, file, errno);
     if (S_ISREG(status.st_mode)) {
         try {
             m_replacement = peru::getSystem()->startReplacement(file.uri);
         } catch (const peru::CException& error) {
-            fail("could not create %s: %s", file.getDisplayName(), error.getDescription());
+            fail(kCreateFailed, file.getDisplayName(), error.getDescription());
         }
         return;
     }
     m_handle = ::open(path.c_str(), O_WRONLY | O_CLOEXEC);
-    if (m_handle < 0) failSystem("could not create", file, errno);
+    if (m_handle < 0) failSystem(kCreateFailed, file, errno);
 }
 
 COutputFile::~COutputFile() {
@@ -120,8 +123,8 @@ bool COutputFile::trySeek(int64_t position) noexcept {
 
 void COutputFile::throwFailure() const {
     if (!m_hasFailed) return;
-    if (m_reason) fail("could not write %s: %s", m_file.getDisplayName(), m_reason);
-    failSystem("could not write", m_file, m_error);
+    if (m_reason) fail(kWriteFailed, m_file.getDisplayName(), m_reason);
+    failSystem(kWriteFailed, m_file, m_error);
 }
 
 void COutputFile::discard() noexcept {
