@@ -4,6 +4,7 @@
 
 #include "filetag/ILibrary.h"
 #include "peru/Errors.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/system/IDynamicLibrary.h"
 #include "peru/system/IPathes.h"
@@ -33,7 +34,8 @@ inline SLoadedLibrary loadLibrary() {
         reinterpret_cast<GetLibraryFunction>(entry)(loaded.library);
         return loaded;
     }
-    throw peru::CError("The tag library " FILETAG_SONAME " is missing");
+    throw peru::CError(
+        peru::format({"filetag.Library.missing", "The tag library %s is missing"}, FILETAG_SONAME));
 }
 
 // Throws CError if the library is missing. Any thread.

@@ -1,5 +1,6 @@
 #include "host_support/Guard.h"
 #include "peru/streams/IStreamManager.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/xml/XmlDocument.h"
 
 #include <cstdlib>
@@ -13,7 +14,7 @@ namespace {
 void resolveMedium(const P<IXmlNode>& track, int number, const P<peru::IURI>& base) {
     const P<IXmlNode> node = track->getChildNode("Uri");
     if (!node || node->getText()->isEmpty())
-        throw peru::CError(CString::fromUTF8("Track " + std::to_string(number) + " has no Uri"));
+        throw peru::CError(peru::format({"tonewright.Arrangement.noUri", "Track %d has no Uri"}, number));
     const auto uri = peru::make<peru::CURI>(node->getText());
     if (uri->isRelative()) node->setText(uri->resolveAgainst(base)->getAsString());
 }
@@ -33,7 +34,9 @@ char16_t* TONEWRIGHT_Host_ReadArrangement(const char* path) {
         if (tracks)
             for (auto nodes = tracks->getChildNodesByName("Track"); nodes.hasMore();)
                 resolveMedium(nodes.getNext(), ++count, uri);
-        if (count == 0) throw peru::CError("This is not an arrangement: it has no tracks");
+        if (count == 0)
+            throw peru::CError(peru::localize("tonewright.Arrangement.noTracks",
+                                              "This is not an arrangement: it has no tracks"));
         const std::u16string xml = CString::toStdU16String(document->printToString());
         auto* copy = static_cast<char16_t*>(std::malloc((xml.size() + 1) * sizeof(char16_t)));
         if (copy) std::memcpy(copy, xml.c_str(), (xml.size() + 1) * sizeof(char16_t));

@@ -1,6 +1,7 @@
 // Callbacks with user data, and the control of a player.
 #include "host_support/Guard.h"
 #include "peru/media/ISystem.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "tonewright/ICallbackTargets.h"
 
 using namespace tonewright;
@@ -83,7 +84,8 @@ int32_t TONEWRIGHT_Host_SetPlayerDevice(TONEWRIGHT_Handle player, const char* id
             control->setDevice(device);
             return 1;
         }
-        throw peru::CError(peru::CString::fromUTF8("There is no output device " + std::string(id ? id : "")));
+        throw peru::CError(peru::format({"tonewright.Devices.noSuchOutput", "There is no output device %s"},
+                                        peru::CString::fromUTF8(id ? id : "")));
     });
 }
 
@@ -91,7 +93,8 @@ int32_t TONEWRIGHT_Host_EnqueueSource(TONEWRIGHT_Handle player, TONEWRIGHT_Handl
     return guard(0, [&] {
         const auto next = require<sonora2::common::IAudioSource>(source, "an audio source");
         if (!require<IPlayerControl>(player, "a player")->enqueue(next))
-            throw peru::CError("The next source has a different format from the current one");
+            throw peru::CError(peru::localize("tonewright.Player.otherFormat",
+                                              "The next source has a different format from the current one"));
         return 1;
     });
 }

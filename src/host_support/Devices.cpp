@@ -1,5 +1,6 @@
 #include "host_support/Guard.h"
 #include "peru/media/ISystem.h"
+#include "peru/strings/LocalizedFormat.h"
 
 #include <vector>
 
@@ -57,7 +58,7 @@ int32_t TONEWRIGHT_Host_GetDevice(TONEWRIGHT_Handle devices, int32_t index, TONE
     return guard(0, [&] {
         const P<CDeviceList> list = require<CDeviceList>(devices, "a list of devices");
         if (index < 0 || static_cast<size_t>(index) >= list->entries.size())
-            throw peru::CError("There is no such device");
+            throw peru::CError(peru::localize("tonewright.Devices.index", "There is no such device"));
         const CDeviceList::SEntry& entry = list->entries[static_cast<size_t>(index)];
         fillRecord(info, {sizeof(*info), entry.id.c_str(), entry.name.c_str(), entry.api.c_str(),
                           entry.channelCount, entry.isDefault ? 1 : 0});
@@ -70,13 +71,16 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_OpenInputDevice(const char* id) {
         const P<peru::media::ISystem> system = peru::media::getSystem();
         if (!id || !*id) {
             P<IAudioInDevice> device = system->getDefaultInDevice();
-            if (!device) throw peru::CError("There is no sound device to record from");
+            if (!device)
+                throw peru::CError(
+                    peru::localize("tonewright.Devices.noInput", "There is no sound device to record from"));
             return wrap(device);
         }
         for (auto devices = system->getInDevices(); devices.hasMore();) {
             const P<IAudioInDevice> device = devices.getNext();
             if (toText(device->getId()) == id) return wrap(device);
         }
-        throw peru::CError(CString::fromUTF8("There is no input device " + std::string(id)));
+        throw peru::CError(peru::format({"tonewright.Devices.noSuchInput", "There is no input device %s"},
+                                        CString::fromUTF8(id)));
     });
 }

@@ -1,4 +1,5 @@
 #include "host_support/Guard.h"
+#include "peru/strings/IStringLocalizer.h"
 #include "peru/system/IPathes.h"
 #include "sonora2/context/LastFailure.h"
 
@@ -31,7 +32,11 @@ void storeFailure(const std::exception& exception) noexcept {
 
 void storeUnknownFailure() noexcept {
     try {
-        sonora2::common::setLastFailure({"", "Error", "An unknown error occurred", ""});
+        sonora2::common::setLastFailure(
+            {"", peru::CString::toStdString(peru::localize("tonewright.Failure.title", "Error")),
+             peru::CString::toStdString(
+                 peru::localize("tonewright.Failure.unknown", "An unknown error occurred")),
+             ""});
     } catch (...) {
         // Out of memory: the previous record remains.
     }

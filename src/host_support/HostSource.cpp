@@ -1,6 +1,7 @@
 #include "host_support/HostSource.h"
 
 #include "peru/Errors.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/uri/URI.h"
 #include "sonora2/context/SonoraError.h"
@@ -23,8 +24,9 @@ void SHostSamples::check() const {
     if (rate >= 1 && channels >= 1 && channels <= 1024 && bytesPerSample >= 1 && bytesPerSample <= 4 &&
         frames >= -1)
         return;
-    throw peru::CError(peru::format("%d Hz, %d channels and %d bytes per sample are not a sound format", rate,
-                                    channels, bytesPerSample));
+    throw peru::CError(peru::format(
+        {"tonewright.HostSource.format", "%d Hz, %d channels and %d bytes per sample are not a sound format"},
+        rate, channels, bytesPerSample));
 }
 
 CHostSource::CHostSource(const SHostSamples& format, Read read, Seek seek)
@@ -41,7 +43,9 @@ void CHostSource::open() {
 }
 
 void CHostSource::skipToTime(double fTimestamp) {
-    if (!m_isOpened) throw sonora2::common::CSonoraError("The source is not open");
+    if (!m_isOpened)
+        throw sonora2::common::CSonoraError(
+            peru::localize("tonewright.HostSource.notOpened", "The source is not open"));
     moveTo(m_start + toFrame(fTimestamp));
     m_hasEnded = m_format.frames >= 0 && m_position >= m_format.frames;
 }
@@ -74,7 +78,9 @@ P<sonora2::audio::IAudioStreamInfos> CHostSource::getAudioStreamInfos() {
 }
 
 void CHostSource::setAudioStream(int nAudioIndex) {
-    if (nAudioIndex != 0) throw sonora2::common::CSonoraError("The source has one audio stream");
+    if (nAudioIndex != 0)
+        throw sonora2::common::CSonoraError(
+            peru::localize("tonewright.HostSource.oneStream", "The source has one audio stream"));
 }
 
 P<sonora2::audio::IAudioChunk> CHostSource::getNextAudioChunk() {
@@ -84,7 +90,9 @@ P<sonora2::audio::IAudioChunk> CHostSource::getNextAudioChunk() {
     const int64_t wanted =
         m_format.frames < 0 ? kChunkFrames : std::min(kChunkFrames, m_format.frames - m_position);
     const int64_t read = wanted > 0 ? m_read(block->getData(), wanted) : 0;
-    if (read < 0 || read > wanted) throw sonora2::common::CSonoraError("The host could not deliver samples");
+    if (read < 0 || read > wanted)
+        throw sonora2::common::CSonoraError(
+            peru::localize("tonewright.HostSource.read", "The host could not deliver samples"));
     block->setSize(read * frameBytes);
     const double time = static_cast<double>(m_position - m_start) / m_format.rate;
     m_position += read;
@@ -101,8 +109,9 @@ int64_t CHostSource::toFrame(double seconds) const {
 
 void CHostSource::moveTo(int64_t frame) {
     if (!m_seek || !m_seek(frame))
-        throw sonora2::common::CSonoraError(peru::format("The host's source cannot start at %g seconds",
-                                                         static_cast<double>(frame) / m_format.rate));
+        throw sonora2::common::CSonoraError(
+            peru::format({"tonewright.HostSource.seek", "The host's source cannot start at %g seconds"},
+                         static_cast<double>(frame) / m_format.rate));
     m_position = frame;
 }
 

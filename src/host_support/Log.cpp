@@ -1,6 +1,7 @@
 #include "host_support/Guard.h"
 #include "peru/ClassName.h"
 #include "peru/log/LogBase.h"
+#include "peru/strings/LocalizedFormat.h"
 
 using namespace tonewright::host_support;
 using peru::CString;
@@ -56,7 +57,8 @@ private:
 TONEWRIGHT_Handle TONEWRIGHT_Host_CreateLog(int32_t minimumLevel, TONEWRIGHT_LogCallback callback,
                                             void* user) {
     return guard<TONEWRIGHT_Handle>(nullptr, [&]() -> TONEWRIGHT_Handle {
-        if (!callback) throw peru::CError("A log needs a callback");
+        if (!callback)
+            throw peru::CError(peru::localize("tonewright.Log.noCallback", "A log needs a callback"));
         return wrap(peru::make<CCallbackLog>(minimumLevel, callback, user));
     });
 }

@@ -1,5 +1,6 @@
 // Queries the plug-ins for the properties of files and the capabilities of targets.
 #include "host_support/Guard.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
 #include "sonora2/media/IClippingPrevention.h"
@@ -16,7 +17,8 @@ using peru::CString;
 namespace {
 
 P<IPluginHandler> requireHandler(const P<IPluginHandler>& handler) {
-    if (!handler) throw peru::CError("The library is not started");
+    if (!handler)
+        throw peru::CError(peru::localize("tonewright.Media.notStarted", "The library is not started"));
     return handler;
 }
 
@@ -36,9 +38,12 @@ bool askPlugins(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int 
     return false;
 }
 
-std::string describeKind(const P<peru::IURI>& uri, IPluginHandler& handler) {
-    const std::string extension = CString::toStdString(getLookupKey(uri, handler.getURISuffix()));
-    return extension.empty() ? "files without an extension" : "." + extension + " files";
+[[noreturn]] void failWithoutPlugin(const P<peru::IURI>& uri, IPluginHandler& handler,
+                                    const peru::SLocalizedText& byExtension,
+                                    const peru::SLocalizedText& withoutExtension) {
+    const P<peru::IString> extension = getLookupKey(uri, handler.getURISuffix());
+    throw CSonoraError(extension->isEmpty() ? peru::format(withoutExtension)
+                                            : peru::format(byExtension, extension));
 }
 
 // An open source in the file's own format. Throws the reason of the first plug-in that failed.
@@ -59,7 +64,9 @@ P<IAudioSource> openMedia(const P<peru::IURI>& uri) {
     });
     if (isOpen) return source;
     if (reason) reason->raise();
-    throw CSonoraError(CString::fromUTF8("No plug-in reads " + describeKind(uri, *handler)));
+    failWithoutPlugin(
+        uri, *handler, {"tonewright.Media.noReader", "No plug-in reads .%s files"},
+        {"tonewright.Media.noReaderWithoutExtension", "No plug-in reads files without an extension"});
 }
 
 void fillInfo(const P<IAudioSource>& source, TONEWRIGHT_MediaInfo* info) {
@@ -137,7 +144,8 @@ int32_t TONEWRIGHT_Host_SetSourceFormat(TONEWRIGHT_Handle source, int32_t sample
                                         int32_t bytesPerSample) {
     return guard(0, [&] {
         if (sampleRate <= 0 || channelCount <= 0 || bytesPerSample <= 0 || bytesPerSample > 4)
-            throw peru::CError("The numbers are not a sound format");
+            throw peru::CError(
+                peru::localize("tonewright.Media.format", "The numbers are not a sound format"));
         require<IMediaDescription>(source, "a source of a file")
             ->setDeliveredFormat(sampleRate, channelCount, bytesPerSample);
         return 1;
@@ -173,7 +181,9 @@ int32_t TONEWRIGHT_Host_GetCapabilities(const char16_t* uri, TONEWRIGHT_Capabili
         const P<peru::IURI> target = tonewright::exports::toURI(uri);
         const P<IPluginHandler> handler = requireHandler(getMediaEnvironment().writeHandler);
         if (!askPlugins(target, handler, kAudioFormat, [](ISonoraPlugin&) { return true; }))
-            throw CSonoraError(CString::fromUTF8("No plug-in writes " + describeKind(target, *handler)));
+            failWithoutPlugin(target, *handler, {"tonewright.Media.noWriter", "No plug-in writes .%s files"},
+                              {"tonewright.Media.noWriterWithoutExtension",
+                               "No plug-in writes files without an extension"});
 
         // A codec's limits of rate, channels and width are taken as independent, so each is tested by varying
         // one format that is accepted.

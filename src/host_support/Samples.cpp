@@ -1,6 +1,7 @@
 // Host-defined sources, and reading the samples of any source.
 #include "host_support/Guard.h"
 #include "host_support/HostSource.h"
+#include "peru/strings/LocalizedFormat.h"
 
 #include <limits>
 #include <memory>
@@ -55,7 +56,8 @@ private:
             m_taken = 0;
             if (m_chunk) continue;
             if (m_source->isEOF()) return false;
-            throw peru::CError("The source delivers nothing although it is not at its end");
+            throw peru::CError(peru::localize("tonewright.Samples.stuck",
+                                              "The source delivers nothing although it is not at its end"));
         }
         return true;
     }
@@ -76,7 +78,8 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_CreateSourceFromCallbacks(int32_t sampleRate, 
         const SHostSamples format{sampleRate, channelCount, bytesPerSample, frameCount};
         format.check();
         if (!callbacks || callbacks->size < sizeof(*callbacks) || !callbacks->read)
-            throw peru::CError("A source needs a read function");
+            throw peru::CError(
+                peru::localize("tonewright.Samples.noReadFunction", "A source needs a read function"));
         const auto owner = std::make_shared<SUser>();
         owner->user = user;
         CHostSource::Seek seek;
@@ -102,7 +105,8 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_CreateSourceFromMemory(int32_t sampleRate, int
         const int64_t frameBytes = static_cast<int64_t>(channelCount) * bytesPerSample;
         if (frameCount < 0 || frameCount > std::numeric_limits<int64_t>::max() / frameBytes ||
             (!samples && frameCount > 0))
-            throw peru::CError("A source from memory needs samples and their number");
+            throw peru::CError(peru::localize("tonewright.Samples.noSamples",
+                                              "A source from memory needs samples and their number"));
         struct SCopy {
             std::vector<uint8_t> bytes;
             int64_t position = 0;
@@ -134,7 +138,8 @@ int64_t TONEWRIGHT_Host_ReadFrames(TONEWRIGHT_Handle reader, void* samples, int6
     return guard<int64_t>(-1, [&] {
         const P<CReader> object = require<CReader>(reader, "a reader");
         if (frames < 0 || frames > kMostFrames || (!samples && frames > 0))
-            throw peru::CError("The buffer or the number of frames is invalid");
+            throw peru::CError(peru::localize("tonewright.Samples.invalidBuffer",
+                                              "The buffer or the number of frames is invalid"));
         return object->read(static_cast<uint8_t*>(samples), frames);
     });
 }
@@ -142,7 +147,9 @@ int64_t TONEWRIGHT_Host_ReadFrames(TONEWRIGHT_Handle reader, void* samples, int6
 int32_t TONEWRIGHT_Host_Seek(TONEWRIGHT_Handle reader, double seconds) {
     return guard(0, [&] {
         const P<CReader> object = require<CReader>(reader, "a reader");
-        if (!(seconds >= 0.0)) throw peru::CError("The time to seek to is invalid");
+        if (!(seconds >= 0.0))
+            throw peru::CError(
+                peru::localize("tonewright.Samples.invalidTime", "The time to seek to is invalid"));
         object->seek(seconds);
         return 1;
     });

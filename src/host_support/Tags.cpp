@@ -1,6 +1,7 @@
 #include "filetag/LazyLibrary.h"
 #include "host_support/Guard.h"
 #include "host_support/PictureFormat.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "sonora2/plugins/PluginExtensions.h"
 
 #include <algorithm>
@@ -183,7 +184,7 @@ void keepMissedTexts(const P<peru::IURI>& file, filetag::STagChange& change) {
 
 template <class Item> const Item& getItem(const std::vector<Item>& items, int32_t index) {
     if (index < 0 || static_cast<size_t>(index) >= items.size())
-        throw peru::CError("The index is out of range");
+        throw peru::CError(peru::localize("tonewright.Tags.index", "The index is out of range"));
     return items[static_cast<size_t>(index)];
 }
 
@@ -260,7 +261,9 @@ int32_t TONEWRIGHT_Host_ChangeTagField(TONEWRIGHT_Handle change, const char* nam
     return guard(0, [&] {
         std::vector<filetag::STagField>& fields =
             require<CTagChange>(change, "a change of a tag")->change.fields;
-        if (!name || !isFieldName(name)) throw peru::CError("The name of the field is invalid");
+        if (!name || !isFieldName(name))
+            throw peru::CError(
+                peru::localize("tonewright.Tags.fieldName", "The name of the field is invalid"));
         const P<IString> key = CString::fromUTF8(name);
         auto field = std::find_if(fields.begin(), fields.end(), [&](const filetag::STagField& other) {
             return other.key->equalsIgnoreCase(key);
@@ -287,11 +290,14 @@ int32_t TONEWRIGHT_Host_AddTagPicture(TONEWRIGHT_Handle change, const TONEWRIGHT
         filetag::STagChange& target = require<CTagChange>(change, "a change of a tag")->change;
         TONEWRIGHT_TagPicture given = {};
         if (picture) std::memcpy(&given, picture, std::min(picture->size, sizeof given));
-        if (!given.data || given.dataSize == 0) throw peru::CError("The picture is empty");
+        if (!given.data || given.dataSize == 0)
+            throw peru::CError(peru::localize("tonewright.Tags.emptyPicture", "The picture is empty"));
         const std::string_view bytes(static_cast<const char*>(given.data), given.dataSize);
         const SPictureFormat format = detectPictureFormat(bytes);
         const std::string type = given.mimeType && *given.mimeType ? given.mimeType : format.mimeType;
-        if (type.empty()) throw peru::CError("The picture is not a JPEG, PNG, GIF, BMP or WebP file");
+        if (type.empty())
+            throw peru::CError(peru::localize("tonewright.Tags.pictureType",
+                                              "The picture is not a JPEG, PNG, GIF, BMP or WebP file"));
         filetag::STagPicture added;
         added.data = peru::make<peru::CMemoryBlock>(static_cast<int64_t>(bytes.size()));
         std::memcpy(added.data->getData(), bytes.data(), bytes.size());

@@ -1,4 +1,5 @@
 #include "host_support/Guard.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/system/IPathes.h"
 
 #include <cstdlib>
@@ -31,7 +32,7 @@ std::u16string decodeUTF8(const char* text) {
         static constexpr char32_t kLeast[] = {0, 0x80, 0x800, 0x10000};
         const bool isSurrogate = character >= 0xD800 && character < 0xE000;
         if (!isValid || character < kLeast[more] || isSurrogate || character > 0x10FFFF)
-            throw peru::CError("The text is not UTF-8");
+            throw peru::CError(peru::localize("tonewright.Text.notUTF8", "The text is not UTF-8"));
         if (character >= 0x10000) {
             result += static_cast<char16_t>(0xD7C0 + (character >> 10));
             character = 0xDC00 + (character & 0x3FF);
@@ -90,7 +91,9 @@ char* TONEWRIGHT_Host_URIToPath(const char16_t* uri) {
     return guard<char*>(nullptr, [&]() -> char* {
         const P<peru::IURI> parsed = tonewright::exports::toURI(uri);
         const std::string path = peru::CString::toStdString(peru::getPathes()->toPlatformPath(parsed));
-        if (path.empty() || parsed->isRelative()) throw peru::CError("The URI does not name a local file");
+        if (path.empty() || parsed->isRelative())
+            throw peru::CError(
+                peru::localize("tonewright.Text.notLocal", "The URI does not name a local file"));
         return duplicate(path);
     });
 }

@@ -1,6 +1,7 @@
 #include "tonewright/CancelAutoplay2.h"
 
 #include "peru/Errors.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/system/IPathes.h"
 #include "peru/system/ISystem.h"
@@ -42,7 +43,8 @@ CCancelAutoplay2::CCancelAutoplay2() {
         m_process = processes->start(companion, {ownId, peru::CString::fromUTF8("dummy")});
     } catch (const peru::CException&) {
         const P<peru::IString> path = peru::getPathes()->toPlatformPath(companion, true);
-        throw peru::CError(peru::format("CCancelAutoplay2: failed to execute \"%s\"", path));
+        throw peru::CError(peru::format(
+            {"tonewright.CCancelAutoplay2.execute", "CCancelAutoplay2: failed to execute \"%s\""}, path));
     }
 }
 

@@ -2,6 +2,7 @@
 
 #include "peru/Errors.h"
 #include "peru/streams/MemoryIOStream.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/uri/URI.h"
 #include "peru/xml/XmlDocument.h"
@@ -32,7 +33,7 @@ double readDouble(const P<IXmlNode>& parent, const char* name, double missing) {
     } catch (const peru::CParseError& error) {
         fail(error.getDescription());
     }
-    if (!std::isfinite(value)) fail(peru::CString::fromUTF8("Not a finite number."));
+    if (!std::isfinite(value)) fail(peru::localize("tonewright.EditorXml.notFinite", "Not a finite number."));
     return value;
 }
 
@@ -41,8 +42,9 @@ double readTime(const P<IXmlNode>& parent, const char* name) {
     constexpr double kLimit = 4000000.0;
     const double time = readDouble(parent, name, 0.0);
     if (std::fabs(time) <= kLimit) return time;
-    throw peru::CParseError(
-        peru::format("An arrangement is limited to %.0f seconds. (%s: \"%g\")", kLimit, name, time));
+    throw peru::CParseError(peru::format(
+        {"tonewright.EditorXml.limit", "An arrangement is limited to %.0f seconds. (%s: \"%g\")"}, kLimit,
+        name, time));
 }
 
 void readModifiers(const P<IXmlNode>& node, CTrack& track) {

@@ -1,5 +1,6 @@
 #include "tonewright/EncoderHandle.h"
 
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/system/IPathes.h"
 #include "sonora2/context/SonoraError.h"
@@ -55,19 +56,22 @@ void CEncoderHandle::requireOtherFile() const {
     const std::string from = toPath(m_source->getURI()), to = toPath(m_format->getURI());
     std::error_code none;
     if (!from.empty() && !to.empty() && std::filesystem::equivalent(from, to, none))
-        throw CSonoraError(
-            peru::format("%s cannot be written: it is the source of the same export", to.c_str()));
+        throw CSonoraError(peru::format({"tonewright.CEncoderHandle.sameFile",
+                                         "%s cannot be written: it is the source of the same export"},
+                                        peru::CString::fromUTF8(to)));
 }
 
 // Nothing between the two converts: the samples would be written as what they are not.
 void CEncoderHandle::requireSameFormat() const {
     const auto describe = [](auto& media) {
-        return peru::format("%d Hz, %d channels, %d bytes per sample", media.getSampleRate(),
-                            media.getChannelCount(), media.getBytesPerSample());
+        return peru::format({"tonewright.CEncoderHandle.format", "%d Hz, %d channels, %d bytes per sample"},
+                            media.getSampleRate(), media.getChannelCount(), media.getBytesPerSample());
     };
     const P<peru::IString> from = describe(*m_encoder), to = describe(*m_format);
     if (!from->equals(to))
-        throw CSonoraError(peru::format("the source delivers %s, but the format expects %s", from, to));
+        throw CSonoraError(peru::format(
+            {"tonewright.CEncoderHandle.otherFormat", "the source delivers %s, but the format expects %s"},
+            from, to));
 }
 
 void CEncoderHandle::discard() noexcept {

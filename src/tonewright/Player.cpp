@@ -3,6 +3,7 @@
 #include "peru/Errors.h"
 #include "peru/MemoryManager.h"
 #include "peru/media/ISystem.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/threads/IThreadManager.h"
 #include "tonewright/Quietly.h"
 #include "tonewright/ReasonedError.h"
@@ -62,7 +63,9 @@ CPlayer::CPlayer(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, con
       m_lock(peru::getMutexFactory()->createMutex()), m_control(peru::getMutexFactory()->createMutex()) {
     m_ended->set();
     const auto device = peru::media::getSystem()->getDefaultOutDevice();
-    if (!device) throw peru::CError("CPlayer::init could not open audio device");
+    if (!device)
+        throw peru::CError(
+            peru::localize("tonewright.CPlayer.noDevice", "CPlayer::init could not open audio device"));
     useDevice(device, source);
 }
 
@@ -73,13 +76,17 @@ void CPlayer::useDevice(const P<peru::media::IAudioOutDevice>& device, const P<I
                                : device->getFormat(kFileSampleRate, kFileBytesPerSample, kFileChannelCount);
     // Any other format would play the source at the wrong speed or as noise.
     if (!format || (source && !hasFormat(*source, *format)))
-        throw peru::CError("CPlayer::init could not find format for audio device");
+        throw peru::CError(peru::localize("tonewright.CPlayer.noFormat",
+                                          "CPlayer::init could not find format for audio device"));
     P<IAudioSource> used = source;
     sonora2::common::clearLastFailure();
     if (!used && m_handler)
         used = m_handler->createAudioSource(m_uri, format->getSampleRate(), format->getChannelCount(),
                                             format->getBitsPerSample() / 8, false);
-    if (!used) throw CReasonedError("CPlayer::init could not open source", sonora2::common::getLastFailure());
+    if (!used)
+        throw CReasonedError(
+            peru::localize("tonewright.CPlayer.noSource", "CPlayer::init could not open source"),
+            sonora2::common::getLastFailure());
     STitle title;
     title.source = used;
     title.duration = used->getDuration();
@@ -102,7 +109,9 @@ void CPlayer::play() {
         peru::CMutexLock control(m_control);
         // A play() that has reached its end may still need half a second to return.
         if (m_isFeeding && m_state == TONEWRIGHT_PLAYER_STOPPED) m_ended->wait(m_stopMilliseconds);
-        if (m_isFeeding) throw peru::CError("CPlayer::play the player is playing already");
+        if (m_isFeeding)
+            throw peru::CError(
+                peru::localize("tonewright.CPlayer.playing", "CPlayer::play the player is playing already"));
         m_ended->reset();
         m_isFeeding = true;
         m_state = TONEWRIGHT_PLAYER_PLAYING;
@@ -207,7 +216,8 @@ bool CPlayer::writeNext() {
             m_device->write(chunk->getData(), chunk->getSize());
             m_writtenBytes += chunk->getSize();
         } else if (!source->isEOF()) {
-            throw peru::CError("CPlayer: source return Chunk=NULL but is not EOF");
+            throw peru::CError(peru::localize("tonewright.CPlayer.noChunk",
+                                              "CPlayer: source return Chunk=NULL but is not EOF"));
         }
     }
     if (!source->isEOF() || !m_queue.empty()) return true;
@@ -224,7 +234,9 @@ bool CPlayer::beginNext() {
         m_queue.pop_front();
         const bool isOpened = quietly("CPlayer: skipped a queued source", [&] {
             if (!source->isOpened()) source->open();
-            if (!hasFormat(*source, *m_deviceFormat)) throw peru::CError("the device has another format");
+            if (!hasFormat(*source, *m_deviceFormat))
+                throw peru::CError(
+                    peru::localize("tonewright.CPlayer.otherFormat", "the device has another format"));
         });
         if (!isOpened) continue;
         STitle title;
@@ -285,7 +297,8 @@ void CPlayer::stop() {
     m_state = TONEWRIGHT_PLAYER_STOPPED;
     m_wake->set();
     if (!m_ended->wait(m_stopMilliseconds))
-        throw peru::CError("playerthread could not be stopped in 10seconds");
+        throw peru::CError(peru::localize("tonewright.CPlayer.notStopped",
+                                          "playerthread could not be stopped in 10seconds"));
     CTurn turn(*this);
     halt();
 }
@@ -399,7 +412,9 @@ void CPlayer::exchangeDevice(const P<peru::media::IAudioOutDevice>& device) {
 void CPlayer::setDevice(const P<peru::media::IAudioOutDevice>& device) {
     if (!device) throw peru::CInvalidArgError("device", "CPlayer::setDevice");
     const auto requireStopped = [this] {
-        if (m_isFeeding) throw peru::CError("CPlayer::setDevice the player is playing");
+        if (m_isFeeding)
+            throw peru::CError(
+                peru::localize("tonewright.CPlayer.setDevice", "CPlayer::setDevice the player is playing"));
     };
     requireStopped(); // before the lock: a stop that waits for this thread holds it
     peru::CMutexLock control(m_control);

@@ -1,6 +1,7 @@
 #include "tonewright/RecordingAudioSource.h"
 
 #include "peru/log/ILog.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/system/ITimeManager.h"
 #include "peru/threads/IThreadManager.h"
@@ -61,7 +62,8 @@ bool CRecordingAudioSource::findFormat() {
     peru::getLogManager()->warning(
         peru::CString::fromUTF8("tonewright_shared"),
         peru::format(
-            "CRecordingAudioSource: the device \"%s\" cannot record %d channels of %d bytes at %d Hz",
+            {"tonewright.CRecordingAudioSource.format",
+             "CRecordingAudioSource: the device \"%s\" cannot record %d channels of %d bytes at %d Hz"},
             m_device->getName(), m_channelCount, m_bytesPerSample, m_sampleRate));
     return false;
 }

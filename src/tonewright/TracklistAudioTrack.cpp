@@ -1,6 +1,7 @@
 #include "tonewright/TracklistAudioTrack.h"
 
 #include "peru/Errors.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/uri/URI.h"
 #include "sonora2/tracks/TrackCommands.h"
 #include "tonewright/ReasonedError.h"
@@ -49,7 +50,9 @@ void CTracklistAudioTrack::open() {
     const P<IAudioSource> source =
         m_pluginHandler->createAudioSource(uri, m_sampleRate, m_channelCount, m_bytesPerSample, true);
     if (!source)
-        throw CReasonedError("could not open source in CTracklistAudioTrack: " + uri->getAsString(),
+        throw CReasonedError(peru::format({"tonewright.CTracklistAudioTrack.open",
+                                           "could not open source in CTracklistAudioTrack: %s"},
+                                          uri->getAsString()),
                              sonora2::common::getLastFailure());
     source->skipToTime(m_track->getSourceStartTime());
     m_source = source;

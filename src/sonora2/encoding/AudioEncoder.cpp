@@ -1,6 +1,7 @@
 #include "sonora2/encoding/AudioEncoder.h"
 
 #include "peru/IInterfaceQuery.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "sonora2/context/LoggedCall.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/encoding/SampleReader.h"
@@ -101,7 +102,9 @@ void CAudioEncoder::encode() {
         const P<audio::IAudioChunk> chunk = reader->getSamples(kBlockFrames);
         if (!chunk) {
             if (reader->hasSamples())
-                throw CSonoraError("CAudioEncoder: AudioChunk=NULL but SampleReader hat samples!");
+                throw CSonoraError(
+                    peru::localize("sonora2.CAudioEncoder.noChunk",
+                                   "CAudioEncoder: AudioChunk=NULL but SampleReader hat samples!"));
             continue;
         }
         if (!notify(duration, chunk->getTimestamp())) return close();

@@ -1,5 +1,6 @@
 #include "sonora2/encoding/SampleReader.h"
 
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/AudioChunk.h"
@@ -21,8 +22,9 @@ CSampleReader::CSampleReader(const P<ISonoraContext>& context, const P<IAudioSou
     if (!wasOpened) m_source->close();
     if (bytes <= 0 || channels <= 0 || channels > std::numeric_limits<int>::max() / bytes)
         throw CSonoraError(peru::format(
-            "CSampleReader: the source has no usable format (%d channels of %d bytes per sample)", channels,
-            bytes));
+            {"sonora2.CSampleReader.format",
+             "CSampleReader: the source has no usable format (%d channels of %d bytes per sample)"},
+            channels, bytes));
     m_frameBytes = bytes * channels;
 }
 
@@ -39,7 +41,8 @@ P<audio::IAudioChunk> CSampleReader::getSamples(int frames) {
         const P<audio::IAudioChunk> chunk = m_source->getNextAudioChunk();
         if (!chunk) {
             if (!m_source->isEOF())
-                throw CSonoraError("CSampleReader: AudioChunk=NULL but Source is not EOF!");
+                throw CSonoraError(peru::localize("sonora2.CSampleReader.noChunk",
+                                                  "CSampleReader: AudioChunk=NULL but Source is not EOF!"));
             continue;
         }
         if (chunk->getSize() > 0) m_buffer->append(chunk->getMemoryBlock());

@@ -1,5 +1,6 @@
 #include "sonora2/plugins/PluginExtensions.h"
 
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/uri/URI.h"
 #include "sonora2/context/SonoraError.h"
 
@@ -44,11 +45,15 @@ void CPluginExtensions::writeTo(const P<peru::IDataOutStream>& stream) const {
 void CPluginExtensions::readFrom(const P<peru::IDataInStream>& stream) {
     m_extensions.clear();
     const int32_t count = stream->readInt32();
-    if (count < 0) throw CSonoraError("the list of file extensions has a negative count");
+    if (count < 0)
+        throw CSonoraError(peru::localize("sonora2.CPluginExtensions.negative",
+                                          "the list of file extensions has a negative count"));
     for (int32_t i = 0; i < count; ++i) {
         P<IString> extension = stream->readString();
         // At its end the stream delivers empty texts.
-        if (!extension || extension->isEmpty()) throw CSonoraError("the list of file extensions ends early");
+        if (!extension || extension->isEmpty())
+            throw CSonoraError(
+                peru::localize("sonora2.CPluginExtensions.early", "the list of file extensions ends early"));
         addExtension(extension);
     }
 }

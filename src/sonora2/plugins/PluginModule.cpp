@@ -1,5 +1,6 @@
 #include "sonora2/plugins/PluginModule.h"
 
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/uri/URI.h"
 #include "sonora2/context/SonoraError.h"
@@ -20,7 +21,8 @@ P<peru::IDynamicLibrary> loadLibrary(const P<ISonoraContext>& context, const P<p
     } catch (const peru::CException& e) {
         // The file exists, so the loader's reason matters: a missing symbol or dependency.
         if (P<ILogManager> log = context->getLogManager()) log->log(kSeverityDebug, e.getDescription());
-        throw CSonoraError(peru::format("could not load plugin: %s", name.c_str()));
+        throw CSonoraError(
+            peru::format({"sonora2.CPluginModule.load", "could not load plugin: %s"}, name.c_str()));
     }
 }
 
@@ -49,10 +51,14 @@ CPluginModule::CPluginModule(const P<ISonoraContext>& context, const P<peru::IUR
       m_library(loadLibrary(context, library, m_name)) {
     auto create = reinterpret_cast<PluginCreateFunction>(m_library->findSymbol(kPluginCreateName));
     if (!create)
-        throw CSonoraError(peru::format("could not load link create function for: %s", m_name.c_str()));
+        throw CSonoraError(
+            peru::format({"sonora2.CPluginModule.function", "could not load link create function for: %s"},
+                         m_name.c_str()));
     m_plugin = createPlugin(create, context);
     if (!m_plugin)
-        throw CSonoraError(peru::format("could not load link create plugin object for: %s", m_name.c_str()));
+        throw CSonoraError(
+            peru::format({"sonora2.CPluginModule.object", "could not load link create plugin object for: %s"},
+                         m_name.c_str()));
 }
 
 CPluginModule::~CPluginModule() {

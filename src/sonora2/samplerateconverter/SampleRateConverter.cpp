@@ -1,6 +1,7 @@
 #include "sonora2/samplerateconverter/SampleRateConverter.h"
 
 #include "peru/Errors.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "sonora2/media/AudioChunk.h"
 #include "sonora2/samplerateconverter/ChannelConverters.h"
@@ -70,16 +71,21 @@ struct CSampleRateConverter::SImpl {
 // Rejects unsupported formats at the first conversion, not earlier: a converter may never be used.
 void CSampleRateConverter::SImpl::prepare() {
     if (srcBytes < 1 || srcBytes > 4)
-        throw peru::CError(peru::format(
-            "CSampleRateConverter: could not convert samples to short SrcBytesPerSample %d", srcBytes));
+        throw peru::CError(
+            peru::format({"sonora2.CSampleRateConverter.source",
+                          "CSampleRateConverter: could not convert samples to short SrcBytesPerSample %d"},
+                         srcBytes));
     P<CChannelConverter> found = CChannelConverter::create(srcChannels, dstChannels);
     if (!found)
         throw peru::CError(
-            peru::format("CSampleRateConverter: no suitable ChannelConversion found for %d -> %d",
+            peru::format({"sonora2.CSampleRateConverter.channels",
+                          "CSampleRateConverter: no suitable ChannelConversion found for %d -> %d"},
                          srcChannels, dstChannels));
     if (dstBytes < 1 || dstBytes > 4)
-        throw peru::CError(peru::format(
-            "CSampleRateConverter: could not convert samples from short DstBytesPerSample %d", dstBytes));
+        throw peru::CError(
+            peru::format({"sonora2.CSampleRateConverter.destination",
+                          "CSampleRateConverter: could not convert samples from short DstBytesPerSample %d"},
+                         dstBytes));
     for (int i = 0; i < dstChannels; ++i) {
         SChannel& channel = channels[i];
         if (srcRate <= kMaxRate && dstRate <= kMaxRate)
@@ -87,7 +93,8 @@ void CSampleRateConverter::SImpl::prepare() {
                 resamplerInit(dstRate, srcRate, kFilterSize, kPhaseShift, kLinear, kCutoff, sampleBytes));
         if (!channel.resampler)
             throw peru::CError(
-                peru::format("CSampleRateConverter: no filter could be made for %d -> %d frames per second",
+                peru::format({"sonora2.CSampleRateConverter.filter",
+                              "CSampleRateConverter: no filter could be made for %d -> %d frames per second"},
                              srcRate, dstRate));
         channel.input = memoryManager->getBlock(0);
     }

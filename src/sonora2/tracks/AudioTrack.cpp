@@ -1,5 +1,6 @@
 #include "sonora2/tracks/AudioTrack.h"
 
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "sonora2/context/LoggedCall.h"
 #include "sonora2/context/SonoraError.h"
@@ -73,7 +74,9 @@ void CAudioTrack::makeEqualizer() {
     if (!m_equalizer) {
         m_context->getLogManager()->log(
             common::kSeverityWarning,
-            peru::format("CAudioTrack: no audio tools, equalizer preset %d is ignored", m_equalizerPreset));
+            peru::format({"sonora2.CAudioTrack.noAudioTools",
+                          "CAudioTrack: no audio tools, equalizer preset %d is ignored"},
+                         m_equalizerPreset));
         return;
     }
     m_equalizer->configure(source().getSampleRate(), source().getBytesPerSample(),
@@ -174,7 +177,8 @@ P<IAudioChunk> CAudioTrack::changeSpeed(const P<IAudioChunk>& chunk) {
                   bytes = source().getBytesPerSample();
         const double played = rate / m_speed;
         if (!(played >= 1.0 && played < (1 << 30)))
-            throw common::CSonoraError(peru::format("CAudioTrack: %g is no speed", m_speed));
+            throw common::CSonoraError(
+                peru::format({"sonora2.CAudioTrack.speed", "CAudioTrack: %g is no speed"}, m_speed));
         m_converter = peru::make<samplerateconverter::CSampleRateConverter>(
             rate, channels, bytes, static_cast<int>(played), channels, bytes, m_context->getMemoryManager());
     }

@@ -1,5 +1,6 @@
 #include "sonora2/tracks/AudioTracklist.h"
 
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/uri/URI.h"
 #include "sonora2/context/SonoraError.h"
@@ -40,7 +41,8 @@ CAudioTracklist::CAudioTracklist(bool openInThread, const P<common::ISonoraConte
                          sampleRate <= kMostBytes / (channelCount * bytesPerSample);
     if (!isSound)
         throw common::CSonoraError(peru::format(
-            "CAudioTracklist: %d frames per second of %d channels of %d bytes, %d at a time, are no sound",
+            {"sonora2.CAudioTracklist.format",
+             "CAudioTracklist: %d frames per second of %d channels of %d bytes, %d at a time, are no sound"},
             sampleRate, channelCount, bytesPerSample, framesPerStep));
 }
 
@@ -48,7 +50,9 @@ CAudioTracklist::~CAudioTracklist() = default;
 
 void CAudioTracklist::addTrack(const P<common::ITrack>& track, double start, double end) {
     const P<IAudioTrack> audioTrack = peru::tryCast<IAudioTrack>(track);
-    if (!audioTrack) throw peru::CError("only IAudioTrack items should be added to a CAudioTracklist!");
+    if (!audioTrack)
+        throw peru::CError(peru::localize("sonora2.CAudioTracklist.item",
+                                          "only IAudioTrack items should be added to a CAudioTracklist!"));
     CTracklist::addTrack(peru::make<CAudioChunkUnifierTrack>(m_context, audioTrack, m_framesPerStep,
                                                              m_sampleRate, m_channelCount, m_bytesPerSample),
                          start, end);

@@ -1,5 +1,6 @@
 #include "sonora2/tracks/Tracklist.h"
 
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "sonora2/context/LoggedCall.h"
 #include "sonora2/context/SonoraError.h"
@@ -29,7 +30,8 @@ CTracklist::CTracklist(int framerateNum, int framerateDen, int sortIndex, bool o
       m_lock(peru::getMutexFactory()->createMutex()), m_opener(peru::make<CTrackOpener>(log)) {
     if (framerateNum <= 0 || framerateDen <= 0)
         throw CSonoraError(
-            peru::format("CTracklist: %d / %d seconds are no frame", framerateNum, framerateDen));
+            peru::format({"sonora2.CTracklist.frame", "CTracklist: %d / %d seconds are no frame"},
+                         framerateNum, framerateDen));
 }
 
 CTracklist::~CTracklist() {

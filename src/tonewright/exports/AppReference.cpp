@@ -2,6 +2,7 @@
 
 #include "peru/Errors.h"
 #include "peru/log/ILog.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "tonewright/exports/Barrier.h"
 
@@ -42,8 +43,9 @@ P<CApp> exchangeApp(P<CApp> app) {
 
 void logNotAvailable(const char* exportName) noexcept {
     barrier([exportName] {
-        peru::getLogManager()->warning(peru::CString::fromUTF8("tonewright_shared"),
-                                       peru::format("%s is not available in this build", exportName));
+        peru::getLogManager()->warning(
+            peru::CString::fromUTF8("tonewright_shared"),
+            peru::format({"tonewright.notAvailable", "%s is not available in this build"}, exportName));
     });
 }
 

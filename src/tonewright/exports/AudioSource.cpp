@@ -1,4 +1,5 @@
 #include "peru/Errors.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "sonora2/context/LastFailure.h"
 #include "sonora2/encoding/SampleReader.h"
@@ -28,8 +29,10 @@ int getFramesPerStep(IAudioSource& source, double secondsPerStep) {
     const double frames = source.getSampleRate() * secondsPerStep;
     const int limit = std::numeric_limits<int32_t>::max() / (2 * source.getChannelCount());
     if (frames >= 1.0 && frames < limit) return static_cast<int>(frames);
-    throw peru::CError(peru::format(
-        "TONEWRIGHT_AudioSource_FetchStreamSamples: a step of %g seconds cannot be taken", secondsPerStep));
+    throw peru::CError(
+        peru::format({"tonewright.FetchStreamSamples.step",
+                      "TONEWRIGHT_AudioSource_FetchStreamSamples: a step of %g seconds cannot be taken"},
+                     secondsPerStep));
 }
 
 // True at the end of the source, false if the callback ended it.
@@ -37,7 +40,10 @@ bool fetchSamples(TONEWRIGHT_Handle handle, const P<IAudioSource>& source,
                   TONEWRIGHT_SamplesCallback callback, double secondsPerStep, void* user) {
     const P<sonora2::common::ISonoraContext> context = requireApp()->getReadContext();
     const int channels = source->getChannelCount();
-    if (channels < 1) throw peru::CError("TONEWRIGHT_AudioSource_FetchStreamSamples: a source of no channel");
+    if (channels < 1)
+        throw peru::CError(
+            peru::localize("tonewright.FetchStreamSamples.noChannel",
+                           "TONEWRIGHT_AudioSource_FetchStreamSamples: a source of no channel"));
     const int blockSize = channels * kStepsPerBlock;
     const int framesPerStep = getFramesPerStep(*source, secondsPerStep);
     const P<peru::IMemoryBlock> block = context->getMemoryManager()->getBlock(
