@@ -51,6 +51,23 @@ TONEWRIGHT_API void TONEWRIGHT_Host_DestroyHandle(TONEWRIGHT_Handle handle);
 TONEWRIGHT_API const char16_t* TONEWRIGHT_Host_GetText(TONEWRIGHT_Handle handle);
 TONEWRIGHT_API size_t TONEWRIGHT_Host_GetTextLength(TONEWRIGHT_Handle handle);
 
+/* --- Language ------------------------------------------------------------------------------------ */
+
+/* Sets the language of all texts from now on, by the name of a locale such as "de", "de-AT" or
+ * "de_AT.UTF-8"; null for that of the environment (LC_ALL, LC_MESSAGES, LANG). TONEWRIGHT_SetLanguageID does
+ * the same for "de-AT". English needs no language files and costs nothing. 0 if there is no such language or
+ * no translation; with null the texts stay English then, and the result is 1. Does not require the started
+ * library. One thread at a time; other threads may use the library meanwhile. TONEWRIGHT_DeInitAll resets the
+ * language. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_SetLanguage(const char* locale);
+
+/* The translation of a host's own text, or `defaultText` if there is none; the caller releases it. Keys are
+ * dotted names; host.* are those of the program tonewright. `placeholders` are names and values in turn, up
+ * to a null pointer, such as {"%FILE%", path, NULL}, and are filled in afterwards; null for none. Does not
+ * require the started library. Any thread. Null for a null argument and if memory is exhausted. */
+TONEWRIGHT_API char* TONEWRIGHT_Host_Localize(const char* key, const char* defaultText,
+                                              const char* const* placeholders);
+
 /* --- Log and failures ---------------------------------------------------------------------------- */
 
 /* Levels of messages, in the order of their rank. */

@@ -1,14 +1,15 @@
-#include "tonewright/Languages.h"
+#include "zvr_lang_manager/InstalledLanguages.h"
 
 #include "peru/files/IFileSystemManager.h"
 #include "peru/system/ISystem.h"
 #include "peru/uri/IURI.h"
-#include "tonewright/Quietly.h"
+#include "zvr_lang_manager/LanguageLog.h"
 #include "zvr_lang_manager/LanguageManager.h"
 
+#include <algorithm>
 #include <vector>
 
-namespace tonewright {
+namespace zvr_lang {
 
 using peru::P;
 
@@ -33,19 +34,47 @@ std::vector<P<peru::IURI>> findFolders() {
     return folders;
 }
 
-} // namespace
-
-void applyLanguage(const zvr_lang::SLanguageId& id) {
-    const P<zvr_lang::CLanguageManager> manager = zvr_lang::getLanguageManager();
-    if (manager->getPacks().empty()) {
-        const std::vector<P<peru::IURI>> folders = findFolders();
-        for (auto folder = folders.rbegin(); folder != folders.rend(); ++folder)
+P<CLanguageManager> getManagerWithPacks() {
+    const P<CLanguageManager> manager = getLanguageManager();
+    if (!manager->getPacks().empty()) return manager;
+    const std::vector<P<peru::IURI>> folders = findFolders();
+    for (auto folder = folders.rbegin(); folder != folders.rend(); ++folder) {
+        try {
             for (const char* name : kPacks)
-                quietly("applyLanguage", [&] {
-                    manager->addPack(*folder, peru::newString(name), peru::newString(name) + "-");
-                });
+                manager->addPack(*folder, peru::newString(name), peru::newString(name) + "-");
+        } catch (const std::exception& error) {
+            logLoadError(*folder, error);
+        }
     }
-    manager->setCurrentLanguage(id);
+    return manager;
 }
 
-} // namespace tonewright
+bool isEnglish(const std::string& name) {
+    const std::string language = name.substr(0, name.find_first_of("_-.@"));
+    return language.empty() || language == "C" || language == "POSIX" || language == "en" ||
+           language == "eng";
+}
+
+} // namespace
+
+void applyLanguage(const SLanguageId& id) {
+    getManagerWithPacks()->setCurrentLanguage(id);
+}
+
+bool applyLocale(const std::string& name) {
+    const P<CLanguageManager> known = getLanguageManager();
+    if (isEnglish(name)) {
+        // The files are not even listed if no other language has been set.
+        if (known->getCurrentLanguage().valid)
+            known->setCurrentLanguage(findLanguageId("en-US", ELanguageIdKind::languageAndCountry));
+        return true;
+    }
+    const P<CLanguageManager> manager = getManagerWithPacks();
+    const SLanguageId id = manager->findLocale(name);
+    const auto translates = [&](const P<CLanguagePack>& pack) { return pack->findFile(id) != nullptr; };
+    if (!id.valid || std::ranges::none_of(manager->getPacks(), translates)) return false;
+    manager->setCurrentLanguage(id);
+    return true;
+}
+
+} // namespace zvr_lang

@@ -25,12 +25,6 @@ void info(const P<IString>& text) {
     peru::getLogManager()->info(peru::newString(kLogComponent), text);
 }
 
-std::string getMessageLocale() {
-    for (const char* name : {"LC_ALL", "LC_MESSAGES", "LANG"})
-        if (const char* value = std::getenv(name); value && *value) return value;
-    return {};
-}
-
 } // namespace
 
 CLanguageManager::CLanguageManager() = default;
@@ -60,15 +54,25 @@ SLanguageId CLanguageManager::findByLanguage(const P<IString>& language) const {
     return {};
 }
 
-SLanguageId CLanguageManager::getSystemLanguage() const {
-    info(peru::newString("getting system language ID"));
-    info(peru::format("LCID: %d", kUnnumberedLocale));
-    std::string name = getMessageLocale();
+std::string CLanguageManager::getMessageLocale() {
+    for (const char* name : {"LC_ALL", "LC_MESSAGES", "LANG"})
+        if (const char* value = std::getenv(name); value && *value) return value;
+    return {};
+}
+
+SLanguageId CLanguageManager::findLocale(std::string name) const {
     name.resize(std::min(name.find_first_of(".@"), name.size()));
     std::ranges::replace(name, '_', '-');
     const P<IString> text = CString::fromUTF8(name);
     SLanguageId id = findLanguageId(text, ELanguageIdKind::languageAndCountry);
     if (!id.valid && !name.empty()) id = findByLanguage(text);
+    return id;
+}
+
+SLanguageId CLanguageManager::getSystemLanguage() const {
+    info(peru::newString("getting system language ID"));
+    info(peru::format("LCID: %d", kUnnumberedLocale));
+    const SLanguageId id = findLocale(getMessageLocale());
     info(id.valid ? peru::format("System Language ID: %s", id.getText())
                   : peru::newString("could not detect systemm language"));
     return id;

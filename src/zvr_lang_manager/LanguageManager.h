@@ -27,6 +27,10 @@ public:
     // locale without a country gets that of the first pack file in the language. Invalid if there is no
     // such language, as for "C".
     SLanguageId getSystemLanguage() const;
+    // The name of that locale; empty if none is set.
+    static std::string getMessageLocale();
+    // The language of a locale by its name, without the log lines.
+    SLanguageId findLocale(std::string name) const;
 
     // Replaces all texts of the string localizer. Texts that no pack has stay at their English defaults. A
     // file or a listener that fails is logged.

@@ -495,3 +495,31 @@ TEST_F(Host, TagsAreCopiedWhole) {
     EXPECT_EQ(TONEWRIGHT_Host_CopyTags(uriOf(folder / "none.flac").c_str(), uriOf(from).c_str(), &lost), 0);
     EXPECT_NE(std::string(lastFailure().file).find("none.flac"), std::string::npos) << lastFailure().file;
 }
+
+TEST(HostLanguage, TranslatesTheHostsOwnTextsAndTheLibrarys) {
+    if (!std::filesystem::exists(TONEWRIGHT_LANGUAGES)) GTEST_SKIP() << "no language files were built";
+    const auto localize = [](const char* key, const char* text, std::vector<const char*> values = {}) {
+        values.push_back(nullptr);
+        return std::string(Owned<char>(TONEWRIGHT_Host_Localize(key, text, values.data())).get());
+    };
+    // None of this needs the started library. Values are not expanded and need not be UTF-8.
+    EXPECT_EQ(localize("host.exists", "%FILE% is here: %FILE%", {"%FILE%", "%FILE%\xff"}),
+              "%FILE%\xff is here: %FILE%\xff");
+    EXPECT_EQ(TONEWRIGHT_Host_SetLanguage("de_AT.UTF-8"), 1);
+    EXPECT_EQ(localize("host.exists", "%FILE% exists", {"%FILE%", "a\xff", "%OTHER%", "b"}),
+              "a\xff ist vorhanden");
+    EXPECT_EQ(localize("my.key", "%A%%B%", {"%B%", "%A%", "%A%", "1"}), "1%A%");
+    for (const char* unknown : {"xx", "it_IT", "de_XX", "/", "\xff"}) {
+        EXPECT_EQ(TONEWRIGHT_Host_SetLanguage(unknown), 0) << unknown;
+        EXPECT_NE(std::string(lastFailure().message).find("Übersetzung"), std::string::npos);
+    }
+    EXPECT_EQ(localize("host.unknown", "unknown"), "unbekannt") << "the language stays";
+    EXPECT_EQ(TONEWRIGHT_Host_SetLanguage("en_US"), 1);
+    EXPECT_EQ(localize("host.unknown", "unknown"), "unknown");
+    EXPECT_FALSE(TONEWRIGHT_Host_Localize(nullptr, "text", nullptr));
+    const CEnvironment all("LC_ALL", "fr_FR.UTF-8");
+    EXPECT_EQ(TONEWRIGHT_Host_SetLanguage(nullptr), 1);
+    EXPECT_EQ(localize("host.unknown", "unknown"), "inconnu");
+    TONEWRIGHT_DeInitAll();
+    EXPECT_EQ(localize("host.unknown", "unknown"), "unknown");
+}

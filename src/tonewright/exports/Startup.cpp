@@ -2,10 +2,10 @@
 #include "peru/GlobalObjFactory.h"
 #include "peru/log/ILog.h"
 #include "peru/strings/StringFormat.h"
-#include "tonewright/Languages.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"
+#include "zvr_lang_manager/InstalledLanguages.h"
 
 #include <cstring>
 #include <string>
@@ -65,7 +65,7 @@ void TONEWRIGHT_SetLanguageID(const char16_t* language) {
             zvr_lang::findLanguageId(language, zvr_lang::ELanguageIdKind::languageAndCountry);
         if (id.valid) {
             requireApp()->setLanguageId(id);
-            applyLanguage(id);
+            zvr_lang::applyLanguage(id);
             return;
         }
         peru::SLogMessage message;
