@@ -1,5 +1,7 @@
 #include "base/Text.h"
 
+#include "base/Translation.h"
+
 #include <tonewright/host.h>
 
 #include <array>
@@ -54,7 +56,7 @@ template <class Char> using Owned = std::unique_ptr<Char, SFree>;
 
 std::u16string toURI(const std::filesystem::path& path) {
     const Owned<char16_t> uri(TONEWRIGHT_Host_PathToURI(path.c_str()));
-    if (!uri) throw std::runtime_error("The name cannot be used");
+    if (!uri) throw std::runtime_error(tr("host.unusableName", "The name cannot be used"));
     return uri.get();
 }
 
@@ -146,11 +148,13 @@ std::string asReason(std::string message, const std::filesystem::path& about) {
     for (const std::string& name : {absolute.lexically_normal().native(), absolute.native()}) {
         if (message.starts_with(name + ": ")) message.erase(0, name.size() + 2);
         replaceAll(message, " " + name + ":", ":");
+        if (!isEnglish()) continue; // the name fits into every sentence
         for (const char* article : {"the ", "The ", ""})
             replaceAll(message, article + ("file '" + name + "'"), "this file");
         replaceAll(message, name, "this file");
     }
-    if (message.ends_with('.')) message.pop_back();
+    for (const std::string_view stop : {".", "\u3002"})
+        if (message.ends_with(stop)) message.resize(message.size() - stop.size());
     if (!message.empty())
         message[0] = static_cast<char>(std::toupper(static_cast<unsigned char>(message[0])));
     return message;
@@ -159,7 +163,9 @@ std::string asReason(std::string message, const std::filesystem::path& about) {
 bool flushOutput() {
     if (std::fflush(stdout) == 0) return true;
     if (errno == EPIPE) return false;
-    throw std::runtime_error(std::string("Standard output cannot be written: ") + std::strerror(errno));
+    throw std::runtime_error(tr("host.Standard.unwritableReason",
+                                "Standard output cannot be written: %REASON%",
+                                {{"%REASON%", std::strerror(errno)}}));
 }
 
 void flushEvents() {
@@ -169,7 +175,9 @@ void flushEvents() {
 
 void requireOutput() {
     if (const int error = g_outputError; error != 0 && error != EPIPE)
-        throw std::runtime_error(std::string("Standard output cannot be written: ") + std::strerror(error));
+        throw std::runtime_error(tr("host.Standard.unwritableReason",
+                                    "Standard output cannot be written: %REASON%",
+                                    {{"%REASON%", std::strerror(error)}}));
 }
 
 std::string formatDuration(double seconds) {

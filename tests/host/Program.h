@@ -20,7 +20,7 @@ constexpr const char* kProgram = TONEWRIGHT_PROGRAM;
 constexpr int kSanitizerExit = 99;
 
 inline std::vector<std::pair<std::string, std::string>> programEnvironment() {
-    std::vector<std::pair<std::string, std::string>> environment;
+    std::vector<std::pair<std::string, std::string>> environment{{"LC_ALL", "C.UTF-8"}};
     for (const char* name : {"ASAN_OPTIONS", "UBSAN_OPTIONS", "TSAN_OPTIONS"}) {
         const char* old = std::getenv(name);
         environment.emplace_back(name, (old ? std::string(old) + ":" : std::string()) +
