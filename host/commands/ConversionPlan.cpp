@@ -1,6 +1,7 @@
 #include "commands/ConversionPlan.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 #include "media/Download.h"
 #include "media/FileTag.h"
@@ -66,9 +67,11 @@ std::string findFolderProblem(fs::path folder) {
     std::error_code none;
     folder = fs::absolute(folder);
     while (!fs::exists(folder, none) && folder.has_relative_path()) folder = folder.parent_path();
-    if (!fs::is_directory(folder, none)) return folder.string() + " is not a folder";
+    if (!fs::is_directory(folder, none))
+        return tr("host.notAFolder", "%FILE% is not a folder", {{"%FILE%", folder.string()}});
     if (::access(folder.c_str(), W_OK | X_OK) != 0)
-        return "The folder " + folder.string() + " cannot be written to";
+        return tr("host.readOnlyFolder", "The folder %FOLDER% cannot be written to",
+                  {{"%FOLDER%", folder.string()}});
     return "";
 }
 
@@ -94,11 +97,14 @@ std::vector<SConversion> planConversions(CLibrary& library, const SConvertOption
             // With --skip, an output that exists is not touched, whatever it is.
             const auto id = options.existing == EExisting::skip ? std::nullopt : identify(conversion.output);
             if (id && isSameFile(input.file, conversion.output))
-                conversion.problem = "Input and output are the same file";
+                conversion.problem = tr("host.sameFile", "Input and output are the same file");
             else if (id && sources.count(*id) > 0)
-                conversion.problem = "The output " + conversion.output.string() + " is another input";
+                conversion.problem = tr("host.Convert.isInput", "The output %FILE% is another input",
+                                        {{"%FILE%", conversion.output.string()}});
             else if (!taken.insert(toUniquePath(conversion.output)).second)
-                conversion.problem = "Another input is already converted to " + conversion.output.string();
+                conversion.problem =
+                    tr("host.Convert.sameOutput", "Another input is already converted to %FILE%",
+                       {{"%FILE%", conversion.output.string()}});
         }
         plan.push_back(std::move(conversion));
     }
@@ -115,15 +121,18 @@ std::string findProblem(const SConversion& conversion, const SConvertOptions& op
     if (!isStandardStream(conversion.input) && !isWebAddress(conversion.input)) checkInput(conversion.input);
     if (isStandardStream(output)) return "";
     std::error_code none;
-    if (fs::is_directory(output, none)) return output.string() + " cannot be written: Is a directory";
+    if (fs::is_directory(output, none))
+        return tr("host.isDirectory", "%FILE% cannot be written: Is a directory",
+                  {{"%FILE%", output.string()}});
     if (options.existing == EExisting::refuse && fs::exists(output, none))
-        return output.string() + " exists (--force replaces it)";
+        return tr("host.existsForce", "%FILE% exists (--force replaces it)", {{"%FILE%", output.string()}});
     clearFailure();
     if (TONEWRIGHT_Host_GetCapabilities(toURI(output).c_str(), nullptr) != 1)
-        return takeFailure("No plug-in writes " + describeKind(output));
+        return takeFailure(
+            tr("host.noWriter", "No plug-in writes %KIND%", {{"%KIND%", describeKind(output)}}));
     const fs::path folder = output.has_parent_path() ? output.parent_path() : ".";
     if (!createsFolders(options) && !fs::exists(folder, none))
-        return "The folder " + folder.string() + " does not exist";
+        return tr("host.noFolder", "The folder %FOLDER% does not exist", {{"%FOLDER%", folder.string()}});
     return findFolderProblem(folder);
 }
 

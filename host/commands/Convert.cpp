@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "commands/ConversionPlan.h"
 #include "library/Failure.h"
 #include "media/EncodeJob.h"
@@ -34,8 +35,8 @@ void copyTimes(const fs::path& from, const fs::path& to) {
     if (::stat(from.c_str(), &status) != 0) return;
     const struct timespec times[] = {status.st_atim, status.st_mtim};
     if (::utimensat(AT_FDCWD, to.c_str(), times, 0) != 0)
-        throw std::runtime_error(std::string("The times of the input cannot be copied: ") +
-                                 std::strerror(errno));
+        throw std::runtime_error(tr("host.Convert.times", "The times of the input cannot be copied: %REASON%",
+                                    {{"%REASON%", std::strerror(errno)}}));
 }
 
 class CConverter {
@@ -111,8 +112,10 @@ CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& te
     if ((samples != sound.samples || m_options.bits) &&
         TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels,
                                         samples.bytesPerSample) != 1)
-        throw std::runtime_error(takeFailure(
-            "Cannot be converted from " + describe(sound.samples) + " to " + describe(samples), input));
+        throw std::runtime_error(
+            takeFailure(tr("host.inconvertible", "Cannot be converted from %FROM% to %TO%",
+                           {{"%FROM%", describe(sound.samples)}, {"%TO%", describe(samples)}}),
+                        input));
     ends.source = std::move(sound.source);
     if (m_options.salvage) TONEWRIGHT_Host_SetSalvage(ends.source.get(), 1);
     if (m_options.preventClipping) TONEWRIGHT_Host_SetClippingPrevention(ends.source.get(), 1);
@@ -127,14 +130,20 @@ void CConverter::carryTag(const fs::path& input, const fs::path& temporary, cons
     char* lost = nullptr;
     const int32_t copied = TONEWRIGHT_Host_CopyTags(toURI(input).c_str(), toURI(temporary).c_str(), &lost);
     if (copied == 0)
-        return m_progress.warn(job, "The tag could not be read and is not copied: " +
-                                        takeFailure("unknown", input));
+        return m_progress.warn(job, tr("host.Convert.tagUnread",
+                                       "The tag could not be read and is not copied: %REASON%",
+                                       {{"%REASON%", takeFailure(tr("host.unknown", "unknown"), input)}}));
     if (copied < 0) {
-        std::string reason = takeFailure("unknown", temporary);
+        std::string reason = takeFailure(tr("host.unknown", "unknown"), temporary);
         replaceAll(reason, m_temporaryEnding, "");
-        throw std::runtime_error("The tag of " + output.native() + " could not be written: " + reason);
+        throw std::runtime_error(tr("host.Convert.tagUnwritten",
+                                    "The tag of %FILE% could not be written: %REASON%",
+                                    {{"%FILE%", output.native()}, {"%REASON%", reason}}));
     }
-    if (lost) m_progress.warn(job, std::string("The new file cannot hold these fields of the tag: ") + lost);
+    if (lost)
+        m_progress.warn(job,
+                        tr("host.Convert.lost", "The new file cannot hold these fields of the tag: %LIST%",
+                           {{"%LIST%", lost}}));
     TONEWRIGHT_Host_Free(lost);
 }
 
@@ -171,8 +180,9 @@ bool CConverter::convert(const SConversion& conversion, CProgress::Job job) {
         std::error_code error;
         fs::create_directories(target.parent_path(), error);
         if (error)
-            throw std::runtime_error("The folder " + target.parent_path().string() +
-                                     " cannot be created: " + error.message());
+            throw std::runtime_error(
+                tr("host.folderNotCreated", "The folder %FOLDER% cannot be created: %REASON%",
+                   {{"%FOLDER%", target.parent_path().string()}, {"%REASON%", error.message()}}));
     }
     COutput place(target, m_temporaryEnding, m_options.existing == EExisting::replace);
     const fs::path& temporary = place.getTemporary();

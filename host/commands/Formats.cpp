@@ -1,6 +1,7 @@
 #include "commands/Formats.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "media/WholeTag.h"
 #include "terminal/Progress.h"
 
@@ -36,13 +37,14 @@ int listFormats(CLibrary& library, const SFormatsOptions& options) {
     if (options.json) {
         std::printf("%s\n", toLine({{"read", read}, {"write", written}, {"tag", tagged}}).c_str());
     } else if (options.table) {
-        std::printf("%-10s %-5s %-5s %s\n", "extension", "read", "write", "tag");
-        const auto mark = [](const Names& names, const std::string& name) {
-            return names.count(name) ? "yes" : "-";
+        std::printf("%s\n", tr("host.Formats.header", "extension  read  write tag").c_str());
+        const std::string yes = tr("host.Formats.yes", "yes");
+        const auto mark = [&yes](const Names& names, const std::string& name) {
+            return names.count(name) ? yes : "-";
         };
         for (const std::string& name : all)
-            std::printf("%-10s %-5s %-5s %s\n", name.c_str(), mark(read, name), mark(written, name),
-                        mark(tagged, name));
+            std::printf("%-10s %s %s %s\n", name.c_str(), fitColumns(mark(read, name), 5).c_str(),
+                        fitColumns(mark(written, name), 5).c_str(), mark(tagged, name).c_str());
     } else {
         for (const std::string& name : read) std::printf("%s\n", name.c_str());
     }

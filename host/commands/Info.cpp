@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "commands/ForEachFile.h"
 #include "library/Failure.h"
 #include "media/Download.h"
@@ -60,8 +61,11 @@ int showInfo(CLibrary& library, const std::vector<fs::path>& files, bool json) {
         const uint64_t bytes = fs::file_size(opened);
         const int64_t bitRate = getBitRate(info, opened);
         if (!std::exchange(hasHeading, true))
-            std::printf("%11s %7s %8s %5s %10s %10s  %-20s  %s\n", "duration", "rate", "channels", "bits",
-                        "bit rate", "size", "codec", "file");
+            std::printf(
+                "%s\n",
+                tr("host.Info.header",
+                   "   duration    rate channels  bits   bit rate       size  codec                 file")
+                    .c_str());
         if (json)
             std::printf("%s\n", toLine({{"file", file.native()},
                                         {"codec", codecOf(sound, opened)},

@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "media/Devices.h"
 #include "terminal/Progress.h"
 
@@ -32,6 +33,14 @@ struct SListed {
     }
 };
 
+std::string translate(std::string_view word) {
+    if (word == "output") return tr("host.Devices.output", "output");
+    if (word == "input") return tr("host.Devices.input", "input");
+    if (word == "present") return tr("host.Devices.present", "present");
+    if (word == "added") return tr("host.Devices.added", "added");
+    return tr("host.Devices.removed", "removed");
+}
+
 void print(const SDevice& device, const char* direction, bool json, const char* event = nullptr) {
     if (json) {
         nlohmann::json line = {{"direction", direction},      {"id", device.id},
@@ -41,10 +50,10 @@ void print(const SDevice& device, const char* direction, bool json, const char* 
         std::printf("%s\n", toLine(line).c_str());
         return;
     }
-    if (event) std::printf("%-8s ", event);
-    std::printf("%-9s %4s %-8s %9d  %-10s  %s\n", direction, device.id.c_str(),
-                device.isDefault ? "default" : "", device.channels, device.api.c_str(),
-                toPrintable(device.name).c_str());
+    if (event) std::printf("%s ", fitColumns(translate(event), 8).c_str());
+    std::printf("%s %4s %s %9d  %-10s  %s\n", fitColumns(translate(direction), 9).c_str(), device.id.c_str(),
+                fitColumns(device.isDefault ? tr("host.Devices.default", "default") : "", 8).c_str(),
+                device.channels, device.api.c_str(), toPrintable(device.name).c_str());
 }
 
 // A sound system that cannot be reached has no devices at present.
@@ -78,9 +87,10 @@ void printDifference(const std::vector<SListed>& now, std::vector<SListed> befor
 int listDevices(bool json) {
     const std::vector<SDevice> outs = readDevices(TONEWRIGHT_DEVICE_OUTPUT);
     const std::vector<SDevice> ins = readDevices(TONEWRIGHT_DEVICE_INPUT);
-    if (outs.empty() && ins.empty()) throw CNoDevice("There is no sound device");
+    if (outs.empty() && ins.empty()) throw CNoDevice(tr("host.Devices.none", "There is no sound device"));
     if (!json)
-        std::printf("%-9s %4s %-8s %9s  %-10s  %s\n", "direction", "id", "", "channels", "host API", "name");
+        std::printf("%s\n",
+                    tr("host.Devices.header", "direction   id           channels  host API    name").c_str());
     for (const SDevice& device : outs) print(device, "output", json);
     for (const SDevice& device : ins) print(device, "input", json);
     flushOutput();

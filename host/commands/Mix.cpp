@@ -2,6 +2,7 @@
 #include "commands/Mix.h"
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
+#include "base/Translation.h"
 #include "media/Arrangement.h"
 #include "media/EncodeJob.h"
 #include "media/Output.h"
@@ -20,7 +21,7 @@ void mix(CLibrary& library, const SMixOptions& options, CProgress& progress, CPr
     const SSampleFormat samples{options.rate.value_or(44100), options.channels.value_or(2), 2};
     checkInput(options.input);
     if (isSameFile(options.input, options.output))
-        throw std::runtime_error("Input and output are the same file");
+        throw std::runtime_error(tr("host.sameFile", "Input and output are the same file"));
     const std::string ending = setTemporaryEnding(library);
     COutput place(options.output, ending, options.force);
     const fs::path& temporary = place.getTemporary();

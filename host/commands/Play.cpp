@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "media/Devices.h"
 #include "media/Download.h"
 #include "media/InputContent.h"
@@ -136,8 +137,10 @@ nlohmann::json CJukebox::describeItem(Turn turn) const {
 // The names of a cue sheet's tracks are shown with their states.
 std::string describeTrack(const SPlayItem& item) {
     if (item.track == 0) return {};
-    return "track " + std::to_string(item.track) + (item.title.empty() ? "" : " " + toPrintable(item.title)) +
-           ", ";
+    if (item.title.empty())
+        return tr("host.Play.track", "track %NUMBER%, ", {{"%NUMBER%", std::to_string(item.track)}});
+    return tr("host.Play.titledTrack", "track %NUMBER% %TITLE%, ",
+              {{"%NUMBER%", std::to_string(item.track)}, {"%TITLE%", toPrintable(item.title)}});
 }
 
 void CJukebox::play() {
@@ -335,7 +338,8 @@ void CJukebox::end(bool isWhole) {
         m_hasFailed = true;
     } else if (isWhole) {
         const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - m_begun;
-        m_line.finish(track + formatDuration(playing.duration) + " played",
+        m_line.finish(track + tr("host.Play.played", "%DURATION% played",
+                                 {{"%DURATION%", formatDuration(playing.duration)}}),
                       {{"duration", playing.duration}, {"seconds", elapsed.count()}});
     } else {
         m_line.cancel({{"position", m_session->getState().position}});
@@ -376,7 +380,8 @@ std::optional<Turn> CJukebox::replaceDevice(const std::string& reason) {
         if (i > 0) std::this_thread::sleep_for(kDevicePause);
         try {
             const SDevice device = findDefaultOutDevice();
-            m_line.fail(reason + "; going on with '" + device.name + "'");
+            m_line.fail(tr("host.Play.otherDevice", "%REASON%; going on with '%NAME%'",
+                           {{"%REASON%", reason}, {"%NAME%", device.name}}));
             m_from = position;
             return turn;
         } catch (const CNoDevice&) {
@@ -400,15 +405,19 @@ void CJukebox::show() {
         live +=
             "  " + std::to_string(playing.turn % m_items.size() + 1) + "/" + std::to_string(m_items.size());
     if (m_isMuted)
-        live += "  muted";
+        live += "  " + tr("host.Play.muted", "muted");
     else if (m_volume != 100)
-        live += "  volume " + std::to_string(m_volume) + " %";
+        live +=
+            "  " + tr("host.Play.volume", "volume %PERCENT% %", {{"%PERCENT%", std::to_string(m_volume)}});
     nlohmann::json details = {{"position", position},
                               {"duration", playing.duration},
                               {"state", state.isPaused ? "paused" : "playing"},
                               {"volume", m_volume}};
     if (m_isMuted) details["muted"] = true;
-    m_line.update(live + (state.isPaused ? "  paused" : ""), at + " of " + all, details);
+    m_line.update(
+        live + (state.isPaused ? "  " + tr("host.Play.paused", "paused") : ""),
+        tr("host.Play.position", "%POSITION% of %DURATION%", {{"%POSITION%", at}, {"%DURATION%", all}}),
+        details);
 }
 
 std::set<std::string> readExtensions(CLibrary& library) {

@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 #include "media/Devices.h"
 #include "media/EncodeJob.h"
@@ -107,8 +108,9 @@ CHandle CRecorder::openSource(const CHandle& device) {
         if (m_library.AudioSource_Open(source.get()) == TONEWRIGHT_OK) return source;
     }
     const std::string reason = takeFailure("");
-    throw std::runtime_error("The sound device cannot record " + describe(m_samples) +
-                             (reason.empty() ? "" : ": " + reason));
+    const std::string text = tr("host.Record.format", "The sound device cannot record %FORMAT%",
+                                {{"%FORMAT%", describe(m_samples)}});
+    throw std::runtime_error(reason.empty() ? text : text + ": " + reason);
 }
 
 // Shows the state and handles keys until the recording has ended.
@@ -129,8 +131,8 @@ void CRecorder::watch(const std::atomic<bool>& hasEnded, const COutput& place) {
 
 // Returns when the recording has ended and everything that the device delivered is in the file.
 void CRecorder::encode(const CHandle& source, const COutput& place) {
-    const CHandle format =
-        requireFormat(m_library, place.getTemporary(), m_samples, m_options, m_options.output, "The file");
+    const CHandle format = requireFormat(m_library, place.getTemporary(), m_samples, m_options,
+                                         m_options.output, tr("host.theFile", "The file"));
     const CHandle encoder(m_library.CreateAudioEncoder(source.get(), format.get()));
     int32_t result = TONEWRIGHT_ENCODER_FAILED;
     std::string reason;
@@ -138,7 +140,7 @@ void CRecorder::encode(const CHandle& source, const COutput& place) {
     std::thread thread([&] {
         clearFailure();
         result = m_library.AudioEncoder_Encode(encoder.get());
-        reason = takeFailure("The recording failed");
+        reason = takeFailure(tr("host.Record.failed", "The recording failed"));
         hasEnded = true;
     });
     watch(hasEnded, place);
@@ -149,12 +151,15 @@ void CRecorder::encode(const CHandle& source, const COutput& place) {
 void CRecorder::finish(COutput& place) {
     const double position = m_state.position;
     const bool wasWanted = m_state.isStopped || (m_state.limit > 0 && position >= m_state.limit);
-    if (!wasWanted && m_state.start < 0) throw std::runtime_error("The sound device delivers no sound");
+    if (!wasWanted && m_state.start < 0)
+        throw std::runtime_error(tr("host.Record.noSound", "The sound device delivers no sound"));
     const uint64_t bytes = countBytes(place);
     place.commit();
     if (!wasWanted)
-        throw std::runtime_error("The sound device stopped; the recording up to that point, " +
-                                 formatDuration(position) + ", was saved");
+        throw std::runtime_error(
+            tr("host.Record.stopped",
+               "The sound device stopped; the recording up to that point, %DURATION%, was saved",
+               {{"%DURATION%", formatDuration(position)}}));
     const std::string codec = codecName(m_options.output);
     m_line.finish(codec + ", " + formatDuration(position) + ", " + formatSize(bytes),
                   {{"codec", codec}, {"duration", position}, {"bytes", bytes}});
@@ -162,7 +167,8 @@ void CRecorder::finish(COutput& place) {
 
 // With --force, the remains of an earlier recording are removed only once this one can start.
 void CRecorder::run(const CHandle& device) {
-    requireFormat(m_library, m_options.output, m_samples, m_options, m_options.output, "The file");
+    requireFormat(m_library, m_options.output, m_samples, m_options, m_options.output,
+                  tr("host.theFile", "The file"));
     if (!m_options.force) COutput(m_options.output, kTemporaryEnding, false, EGrowth::live).keep();
     const CHandle source = openSource(device);
     COutput place(m_options.output, kTemporaryEnding, m_options.force, EGrowth::live);
@@ -176,9 +182,11 @@ void CRecorder::run(const CHandle& device) {
         std::error_code none;
         if (m_state.start < 0 || !fs::exists(place.getTemporary(), none) || countBytes(place) == 0) throw;
         place.keep();
-        throw std::runtime_error(std::string(failure.what()) +
-                                 (isOver ? "; the recording is in " : "; the part recorded so far is in ") +
-                                 place.getTemporary().string());
+        throw std::runtime_error(
+            isOver ? tr("host.Record.wholeIn", "%REASON%; the recording is in %FILE%",
+                        {{"%REASON%", failure.what()}, {"%FILE%", place.getTemporary().string()}})
+                   : tr("host.Record.partIn", "%REASON%; the part recorded so far is in %FILE%",
+                        {{"%REASON%", failure.what()}, {"%FILE%", place.getTemporary().string()}}));
     }
 }
 

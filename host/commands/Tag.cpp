@@ -1,5 +1,6 @@
 #include "commands/Tag.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "commands/ForEachFile.h"
 #include "library/Failure.h"
 #include "media/FileTag.h"
@@ -25,7 +26,8 @@ std::string formatLine(std::string title, const std::string& text) {
 }
 
 void printLines(const fs::path& file, const std::string& lines) {
-    std::printf("%s\n%s", toPrintable(file.native()).c_str(), lines.empty() ? "  (empty)\n" : lines.c_str());
+    std::printf("%s\n%s", toPrintable(file.native()).c_str(),
+                lines.empty() ? tr("host.Tag.empty", "  (empty)\n").c_str() : lines.c_str());
 }
 
 void show(CLibrary& library, const fs::path& file, bool json) {
@@ -39,7 +41,7 @@ void show(CLibrary& library, const fs::path& file, bool json) {
     std::string lines;
     for (const STagField& field : getTagFields())
         if (const std::string& text = texts.at(field.name); !text.empty())
-            lines += formatLine(field.title, text);
+            lines += formatLine(getTitle(field), text);
     printLines(file, lines);
 }
 
@@ -58,8 +60,9 @@ void showAll(const fs::path& file, bool json) {
     std::string lines;
     for (const auto& [name, values] : tag.fields)
         for (const std::string& value : values) lines += formatLine(name, value);
-    for (const STagPicture& picture : tag.pictures) lines += formatLine("(picture)", describe(picture));
-    for (const std::string& name : tag.others) lines += formatLine("(other)", name);
+    for (const STagPicture& picture : tag.pictures)
+        lines += formatLine(tr("host.Tag.picture", "(picture)"), describe(picture));
+    for (const std::string& name : tag.others) lines += formatLine(tr("host.Tag.other", "(other)"), name);
     printLines(file, lines);
 }
 
@@ -87,21 +90,26 @@ bool changeWholeTag(CLibrary& library, const fs::path& file, const STagFields& f
 
 void copy(const fs::path& from, const fs::path& to, bool json) {
     checkTagged(to);
-    if (isSameFile(from, to)) throw std::runtime_error("Is the file to copy from");
+    if (isSameFile(from, to)) throw std::runtime_error(tr("host.Tag.copySource", "Is the file to copy from"));
     clearFailure();
     char* names = nullptr;
     const int32_t copied = TONEWRIGHT_Host_CopyTags(toURI(from).c_str(), toURI(to).c_str(), &names);
     const std::string lost = names ? names : "";
     TONEWRIGHT_Host_Free(names);
     if (copied != 1)
-        throw std::runtime_error(copied == 0 ? "The tag of " + from.native() +
-                                                   " cannot be read: " + takeFailure("unknown", from)
-                                             : takeFailure("The tag could not be written", to));
+        throw std::runtime_error(
+            copied == 0 ? tr("host.Tag.unreadableSource", "The tag of %FILE% cannot be read: %REASON%",
+                             {{"%FILE%", from.native()},
+                              {"%REASON%", takeFailure(tr("host.unknown", "unknown"), from)}})
+                        : takeFailure(tr("host.Tag.unwritable", "The tag could not be written"), to));
     if (json)
         std::printf("%s\n", toLine({{"file", to.native()}, {"lost", lost}}).c_str());
     else
-        std::printf("%s: copied\n", toPrintable(to.native()).c_str());
-    if (!json && !lost.empty()) printFailure(to, "Warning: cannot hold these fields of the tag: " + lost);
+        std::printf("%s\n",
+                    tr("host.Tag.copied", "%FILE%: copied", {{"%FILE%", toPrintable(to.native())}}).c_str());
+    if (!json && !lost.empty())
+        printFailure(to, tr("host.Tag.lost", "Warning: cannot hold these fields of the tag: %LIST%",
+                            {{"%LIST%", lost}}));
 }
 
 } // namespace
@@ -143,7 +151,11 @@ void printChanged(const fs::path& file, bool changed, bool json) {
     if (json)
         std::printf("%s\n", toLine({{"file", file.native()}, {"changed", changed}}).c_str());
     else
-        std::printf("%s: %s\n", toPrintable(file.native()).c_str(), changed ? "changed" : "unchanged");
+        std::printf("%s\n", (changed ? tr("host.Tag.changed", "%FILE%: changed",
+                                          {{"%FILE%", toPrintable(file.native())}})
+                                     : tr("host.Tag.unchanged", "%FILE%: unchanged",
+                                          {{"%FILE%", toPrintable(file.native())}}))
+                                .c_str());
 }
 
 int showTags(CLibrary& library, const SShowTagOptions& options) {

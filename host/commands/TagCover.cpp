@@ -1,6 +1,7 @@
 #include "commands/TagCover.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "commands/ForEachFile.h"
 #include "commands/Tag.h"
 #include "media/Output.h"
@@ -28,18 +29,21 @@ const STagPicture& choosePicture(const SWholeTag& tag, const std::optional<int>&
         std::find_if(tag.pictures.begin(), tag.pictures.end(),
                      [&](const STagPicture& picture) { return picture.type == type.value_or(kFront); });
     if (found != tag.pictures.end()) return *found;
-    if (tag.pictures.empty()) throw std::runtime_error("Has no picture");
-    if (type) throw std::runtime_error("Has no picture of type " + getPictureTypeName(*type));
+    if (tag.pictures.empty()) throw std::runtime_error(tr("host.Cover.none", "Has no picture"));
+    if (type)
+        throw std::runtime_error(tr("host.Cover.noneOfType", "Has no picture of type %TYPE%",
+                                    {{"%TYPE%", getPictureTypeName(*type)}}));
     return tag.pictures.front();
 }
 
 std::string readPicture(const fs::path& file) {
     checkInput(file);
-    if (fs::file_size(file) > kLargestPicture) throw std::runtime_error("The picture is too large");
+    if (fs::file_size(file) > kLargestPicture)
+        throw std::runtime_error(tr("host.Cover.tooLarge", "The picture is too large"));
     std::ifstream in(file, std::ios::binary);
     std::ostringstream bytes;
     bytes << in.rdbuf();
-    if (!in) throw std::runtime_error("The file cannot be read");
+    if (!in) throw std::runtime_error(tr("host.unreadable", "The file cannot be read"));
     return bytes.str();
 }
 
@@ -47,7 +51,9 @@ void writePicture(const fs::path& target, const STagPicture& picture, bool force
     COutput output(target, ".part", force);
     std::ofstream out(output.getTemporary(), std::ios::binary);
     out << picture.data << std::flush;
-    if (!out) throw std::runtime_error(target.native() + " cannot be written");
+    if (!out)
+        throw std::runtime_error(
+            tr("host.unwritable", "%FILE% cannot be written", {{"%FILE%", target.native()}}));
     out.close();
     output.commit();
 }
@@ -63,7 +69,8 @@ int showCovers(const SCoverOptions& options) {
             std::printf("%s\n", toLine(line).c_str());
             return;
         }
-        std::printf("%s\n%s", toPrintable(file.native()).c_str(), tag.pictures.empty() ? "  (none)\n" : "");
+        std::printf("%s\n%s", toPrintable(file.native()).c_str(),
+                    tag.pictures.empty() ? tr("host.Cover.noPictures", "  (none)\n").c_str() : "");
         for (const STagPicture& picture : tag.pictures)
             std::printf("  %s\n", toPrintable(describe(picture)).c_str());
     });

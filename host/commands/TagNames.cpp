@@ -1,5 +1,6 @@
 #include "commands/TagNames.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "commands/ForEachFile.h"
 #include "commands/Tag.h"
 #include "media/FileTag.h"
@@ -29,11 +30,11 @@ const char* getKey(const std::string& name) {
 void setFromName(CLibrary& library, const fs::path& file, const STagNameOptions& options) {
     checkTagged(file);
     const auto found = options.pattern->match(fs::absolute(file));
-    if (!found) throw std::runtime_error("The name does not match the pattern");
+    if (!found) throw std::runtime_error(tr("host.Names.noMatch", "The name does not match the pattern"));
     STagFields fields;
     for (const auto& [name, text] : *found) {
         const std::optional<std::u16string> wide = toUTF16(text);
-        if (!wide) throw std::runtime_error("The name is not UTF-8");
+        if (!wide) throw std::runtime_error(tr("host.Names.notUTF8", "The name is not UTF-8"));
         fields.usual[name] = *wide;
     }
     if (!options.dryRun) return printChanged(file, changeTag(library, file, fields), options.json);
@@ -50,10 +51,13 @@ void setFromName(CLibrary& library, const fs::path& file, const STagNameOptions&
 }
 
 [[noreturn]] void failToMove(const fs::path& target, int error) {
-    throw std::runtime_error(error == EEXIST ? target.native() + " exists"
-                             : error == EXDEV
-                                 ? target.native() + " is on another file system"
-                                 : target.native() + " cannot be written: " + std::strerror(error));
+    if (error == EEXIST)
+        throw std::runtime_error(tr("host.exists", "%FILE% exists", {{"%FILE%", target.native()}}));
+    if (error == EXDEV)
+        throw std::runtime_error(tr("host.Names.otherFileSystem", "%FILE% is on another file system",
+                                    {{"%FILE%", target.native()}}));
+    throw std::runtime_error(tr("host.unwritableReason", "%FILE% cannot be written: %REASON%",
+                                {{"%FILE%", target.native()}, {"%REASON%", std::strerror(error)}}));
 }
 
 // Removes the folders that it made unless the move succeeds.
@@ -69,8 +73,9 @@ public:
             if (fs::create_directory(*each, error)) m_made.push_back(*each);
             if (!error) continue;
             remove();
-            throw std::runtime_error("The folder " + each->native() +
-                                     " cannot be created: " + error.message());
+            throw std::runtime_error(tr("host.folderNotCreated",
+                                        "The folder %FOLDER% cannot be created: %REASON%",
+                                        {{"%FOLDER%", each->native()}, {"%REASON%", error.message()}}));
         }
     }
     ~CFolders() { remove(); }
@@ -129,7 +134,9 @@ int renameByTags(CLibrary& library, const STagNameOptions& options) {
             std::printf("%s -> %s\n", toPrintable(file.native()).c_str(),
                         toPrintable(target.native()).c_str());
         else
-            std::printf("%s: unchanged\n", toPrintable(file.native()).c_str());
+            std::printf("%s\n", tr("host.Tag.unchanged", "%FILE%: unchanged",
+                                   {{"%FILE%", toPrintable(file.native())}})
+                                    .c_str());
     });
 }
 

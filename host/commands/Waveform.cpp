@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "commands/ForEachFile.h"
 #include "library/Failure.h"
 #include "media/Output.h"
@@ -127,7 +128,7 @@ CPicture draw(const SWave& wave, int height) {
 void drawFile(CLibrary& library, const SWaveformOptions& options) {
     checkInput(options.input);
     if (isSameFile(options.input, options.output))
-        throw std::runtime_error("Input and output are the same file");
+        throw std::runtime_error(tr("host.sameFile", "Input and output are the same file"));
     COutput place(options.output, ".part" + std::to_string(::getpid()), options.force);
     SSoundFile sound = openSoundFile(options.input);
     const SSampleFormat samples = sound.samples;
@@ -135,7 +136,8 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     // The library delivers waveforms of 16-bit sound only.
     clearFailure();
     if (TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels, 2) != 1)
-        throw std::runtime_error(takeFailure("The file cannot be read", options.input));
+        throw std::runtime_error(
+            takeFailure(tr("host.unreadable", "The file cannot be read"), options.input));
     const CHandle& source = sound.source;
 
     const double frames = duration * samples.rate;
@@ -147,12 +149,15 @@ void drawFile(CLibrary& library, const SWaveformOptions& options) {
     const bool complete = library.AudioSource_FetchStreamSamples(source.get(), onSamples,
                                                                  (step + 0.5) / samples.rate, &wave) != 0;
     if (isCancelled()) return;
-    if (!complete) throw std::runtime_error(takeFailure("The samples could not be read", options.input));
+    if (!complete)
+        throw std::runtime_error(
+            takeFailure(tr("host.Waveform.samples", "The samples could not be read"), options.input));
     const CPicture picture = draw(wave, options.height);
     try {
         picture.write(place.getTemporary());
     } catch (const std::exception& error) {
-        throw std::runtime_error("Could not write " + options.output.string() + ": " + error.what());
+        throw std::runtime_error(tr("host.Waveform.write", "Could not write %FILE%: %REASON%",
+                                    {{"%FILE%", options.output.string()}, {"%REASON%", error.what()}}));
     }
     place.commit();
 }

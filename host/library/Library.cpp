@@ -1,5 +1,7 @@
 #include "library/Library.h"
 
+#include "base/Translation.h"
+
 #include <cstdlib>
 #include <dlfcn.h>
 #include <filesystem>
@@ -29,16 +31,21 @@ CLibrary::CLibrary() {
     // Messages reach the user through the log, so the library does not print them as well.
     ::setenv("TONEWRIGHT_DEBUG_OUTPUT", "0", 0);
     m_module = ::dlopen(findLibrary().c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (!m_module) throw std::runtime_error(std::string("cannot load the library: ") + ::dlerror());
+    if (!m_module)
+        throw std::runtime_error(
+            tr("host.Library.load", "cannot load the library: %REASON%", {{"%REASON%", ::dlerror()}}));
 #define HOST_RESOLVE(name)                                                                                   \
     name = reinterpret_cast<decltype(name)>(::dlsym(m_module, "TONEWRIGHT_" #name));                         \
-    if (!name) throw std::runtime_error("the library has no function TONEWRIGHT_" #name);
+    if (!name)                                                                                               \
+        throw std::runtime_error(tr("host.Library.function", "the library has no function %NAME%",           \
+                                    {{"%NAME%", "TONEWRIGHT_" #name}}));
     HOST_FUNCTIONS(HOST_RESOLVE)
 #undef HOST_RESOLVE
 }
 
 void CLibrary::start() {
-    if (InitStartup() != TONEWRIGHT_OK) throw std::runtime_error("the library could not be started");
+    if (InitStartup() != TONEWRIGHT_OK)
+        throw std::runtime_error(tr("host.Library.start", "the library could not be started"));
 }
 
 // The module stays loaded: its singletons live until process end.

@@ -1,6 +1,7 @@
 #include "media/Arrangement.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 
 #include <algorithm>
@@ -20,7 +21,7 @@ bool isArrangement(const fs::path& file) {
 std::u16string readArrangement(const fs::path& file) {
     checkInput(file);
     char16_t* const text = TONEWRIGHT_Host_ReadArrangement(file.c_str());
-    if (!text) throw std::runtime_error(takeFailure("The file cannot be read", file));
+    if (!text) throw std::runtime_error(takeFailure(tr("host.unreadable", "The file cannot be read"), file));
     const std::u16string result = text;
     TONEWRIGHT_Host_Free(text);
     return result;
@@ -31,9 +32,11 @@ CHandle openArrangement(CLibrary& library, const fs::path& file, const SSampleFo
     clearFailure();
     CHandle source(library.CreateAudioSourceFromEditorXml(text.c_str(), samples.rate, samples.channels,
                                                           samples.bytesPerSample));
-    if (!source) throw std::runtime_error(takeFailure("The arrangement cannot be mixed", file));
+    if (!source)
+        throw std::runtime_error(takeFailure(tr("host.Mix.failed", "The arrangement cannot be mixed"), file));
     if (!(library.AudioSource_GetDuration(source.get()) > 0))
-        throw std::runtime_error("The arrangement is empty: no track ends after its start");
+        throw std::runtime_error(
+            tr("host.Mix.empty", "The arrangement is empty: no track ends after its start"));
     return source;
 }
 

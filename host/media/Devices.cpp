@@ -1,6 +1,7 @@
 #include "media/Devices.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "terminal/Progress.h"
 
 #include <cerrno>
@@ -43,7 +44,8 @@ void hushEngine() {
     TONEWRIGHT_Failure failure = {};
     failure.size = sizeof failure;
     TONEWRIGHT_Host_GetLastFailure(&failure);
-    throw CNoDevice("The sound system cannot be reached: " + std::string(failure.message));
+    throw CNoDevice(tr("host.Devices.unreachable", "The sound system cannot be reached: %REASON%",
+                       {{"%REASON%", failure.message}}));
 }
 
 } // namespace
@@ -78,25 +80,29 @@ void requireOutDevice() {
 SDevice findDefaultOutDevice() {
     for (const SDevice& device : readDevices(TONEWRIGHT_DEVICE_OUTPUT))
         if (device.isDefault) return device;
-    throw CNoDevice("There is no sound device to play on");
+    throw CNoDevice(tr("host.Devices.noOutput", "There is no sound device to play on"));
 }
 
 SDevice findOutDevice(const std::string& idOrName) {
     const std::vector<SDevice> devices = readDevices(TONEWRIGHT_DEVICE_OUTPUT);
-    if (devices.empty()) throw CNoDevice("There is no sound device to play on");
+    if (devices.empty()) throw CNoDevice(tr("host.Devices.noOutput", "There is no sound device to play on"));
     for (const auto member : {&SDevice::id, &SDevice::name})
         for (const SDevice& device : devices)
             if (device.*member == idOrName) return device;
-    throw CNoDevice("There is no output device " + toPrintable(idOrName) + "; tonewright devices lists them");
+    throw CNoDevice(tr("host.Devices.noSuchOutput",
+                       "There is no output device %NAME%; tonewright devices lists them",
+                       {{"%NAME%", toPrintable(idOrName)}}));
 }
 
 CHandle openInDevice(const std::string& id) {
     if (readDevices(TONEWRIGHT_DEVICE_INPUT).empty())
-        throw CNoDevice("There is no sound device to record from");
+        throw CNoDevice(tr("host.Devices.noInput", "There is no sound device to record from"));
     CHandle device(TONEWRIGHT_Host_OpenInputDevice(id.c_str()));
     if (device) return device;
-    if (id.empty()) throw CNoDevice("There is no sound device to record from");
-    throw CNoDevice("There is no input device " + toPrintable(id) + "; tonewright devices lists them");
+    if (id.empty()) throw CNoDevice(tr("host.Devices.noInput", "There is no sound device to record from"));
+    throw CNoDevice(tr("host.Devices.noSuchInput",
+                       "There is no input device %NAME%; tonewright devices lists them",
+                       {{"%NAME%", toPrintable(id)}}));
 }
 
 } // namespace host

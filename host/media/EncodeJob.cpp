@@ -2,6 +2,7 @@
 
 #include "base/Cancel.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 
 #include <algorithm>
@@ -30,7 +31,7 @@ int32_t onProgress(double fraction, void* user) {
 
 // Messages name the target instead of the temporary file.
 std::string tellReason(const SEncodeFiles& files, const std::string& temporaryEnding) {
-    std::string reason = takeFailure("The conversion failed");
+    std::string reason = takeFailure(tr("host.Convert.failed", "The conversion failed"));
     const fs::path absolute = fs::absolute(files.temporary);
     for (const std::string& shown : {absolute.lexically_normal().native(), absolute.native()})
         replaceAll(reason, shown, files.output.native());
@@ -60,7 +61,8 @@ CHandle requireFormat(CLibrary& library, const fs::path& temporary, const SSampl
                       const SFormatOptions& options, const fs::path& output, const std::string& subject) {
     CHandle format = createFormat(library, temporary, samples, options);
     if (format) return format;
-    std::string reason = takeFailure(subject + " cannot hold " + describe(samples));
+    std::string reason = takeFailure(tr("host.cannotHold", "%FILE% cannot hold %FORMAT%",
+                                        {{"%FILE%", subject}, {"%FORMAT%", describe(samples)}}));
     replaceAll(reason, temporary.native(), output.native());
     replaceAll(reason, temporary.filename().native(), output.filename().native());
     throw std::runtime_error(reason);

@@ -10,8 +10,9 @@
 namespace host {
 
 struct STagField {
-    const char* name; // on the command line
-    const char* key;  // in JSON
+    const char* name;     // on the command line
+    const char* key;      // in JSON
+    const char* titleKey; // of the translations
     const char* title;
     decltype(CLibrary::FileTag_GetTitle) CLibrary::*get;
     decltype(CLibrary::FileTag_SetTitle) CLibrary::*set;
@@ -19,6 +20,7 @@ struct STagField {
 
 // In display order.
 const std::vector<STagField>& getTagFields();
+std::string getTitle(const STagField& field); // in the user's language
 
 // Whether this is an RF64 file, the form of WAV for more than 4 GB, which cannot hold a tag.
 bool isWideWav(const std::filesystem::path& file);

@@ -1,6 +1,7 @@
 #include "media/FormatOptions.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 #include "media/SoundFile.h"
 
@@ -13,13 +14,14 @@ void requireEffect(const SFormatOptions& options, const std::filesystem::path& t
         bool isSet;
         uint32_t setting;
         const char* option;
-        const char* reason;
+        std::string reason;
     } checks[] = {
         {options.quality.has_value(), TONEWRIGHT_SETTING_QUALITY, "--quality",
-         "their samples are stored as they are"},
-        {options.bitRate > 0, TONEWRIGHT_SETTING_BIT_RATE, "--bitrate", "their size follows from the sound"},
+         tr("host.Effect.quality", "their samples are stored as they are")},
+        {options.bitRate > 0, TONEWRIGHT_SETTING_BIT_RATE, "--bitrate",
+         tr("host.Effect.bitRate", "their size follows from the sound")},
         {options.bits.has_value(), TONEWRIGHT_SETTING_WIDTH, "--bits",
-         "the codec has no fixed number of bits per sample"},
+         tr("host.Effect.bits", "the codec has no fixed number of bits per sample")},
     };
     bool hasWork = false;
     for (const auto& check : checks) hasWork = hasWork || check.isSet;
@@ -31,8 +33,9 @@ void requireEffect(const SFormatOptions& options, const std::filesystem::path& t
     if (!isKnown) return;
     for (const auto& check : checks)
         if (check.isSet && !(capabilities.settings & check.setting))
-            throw CUsageError(std::string(check.option) + " has no effect on " + describeKind(target) + ": " +
-                              check.reason);
+            throw CUsageError(tr(
+                "host.Effect.none", "%OPTION% has no effect on %KIND%: %REASON%",
+                {{"%OPTION%", check.option}, {"%KIND%", describeKind(target)}, {"%REASON%", check.reason}}));
 }
 
 } // namespace host

@@ -1,6 +1,7 @@
 #include "media/InputContent.h"
 
 #include "base/Cancel.h"
+#include "base/Translation.h"
 #include "media/Download.h"
 #include "media/SoundFile.h"
 
@@ -118,8 +119,8 @@ CInputContent::CInputContent(const fs::path& input) : m_path(input) {
         if (extension.empty()) {
             checkInput(m_path);
             throw std::runtime_error(
-                "The format is unknown: standard input must be a sound file, such as WAV "
-                "or FLAC");
+                tr("host.Input.unknownFormat",
+                   "The format is unknown: standard input must be a sound file, such as WAV or FLAC"));
         }
         nameCopy(extension);
         return;
@@ -154,14 +155,18 @@ void CInputContent::copyStandardInput() {
     m_folder.emplace();
     m_path = m_folder->getPath() / "input";
     const CDescriptor copy(::open(m_path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
-    if (copy.get() < 0) failSystem("Standard input cannot be copied to a temporary file");
+    if (copy.get() < 0)
+        failSystem(tr("host.Standard.copyFailed", "Standard input cannot be copied to a temporary file"));
     std::vector<char> block(kBlock);
     while (waitFor(STDIN_FILENO, POLLIN)) {
-        const size_t size = readSome(STDIN_FILENO, block, "Standard input cannot be read");
+        const size_t size =
+            readSome(STDIN_FILENO, block, tr("host.Standard.unreadable", "Standard input cannot be read"));
         if (size == 0) return;
         for (size_t written = 0; written < size;) {
             const ssize_t part = ::write(copy.get(), block.data() + written, size - written);
-            if (part < 0 && errno != EINTR) failSystem("Standard input cannot be copied to a temporary file");
+            if (part < 0 && errno != EINTR)
+                failSystem(
+                    tr("host.Standard.copyFailed", "Standard input cannot be copied to a temporary file"));
             written += part > 0 ? static_cast<size_t>(part) : 0;
         }
     }
@@ -169,9 +174,10 @@ void CInputContent::copyStandardInput() {
 
 bool copyToStandardOutput(const fs::path& file) {
     const CDescriptor from(::open(file.c_str(), O_RDONLY | O_CLOEXEC));
-    if (from.get() < 0) failSystem("The result cannot be read");
+    if (from.get() < 0) failSystem(tr("host.Standard.resultUnreadable", "The result cannot be read"));
     std::vector<char> block(kBlock);
-    while (const size_t size = readSome(from.get(), block, "The result cannot be read")) {
+    while (const size_t size = readSome(from.get(), block,
+                                        tr("host.Standard.resultUnreadable", "The result cannot be read"))) {
         for (size_t written = 0; written < size;) {
             if (!waitFor(STDOUT_FILENO, POLLOUT)) return false;
             // A pipe that is ready takes this much without blocking.
@@ -179,7 +185,7 @@ bool copyToStandardOutput(const fs::path& file) {
             const ssize_t part = ::write(STDOUT_FILENO, block.data() + written, most);
             if (part < 0 && errno == EPIPE) return false;
             if (part < 0 && errno != EINTR && errno != EAGAIN)
-                failSystem("Standard output cannot be written");
+                failSystem(tr("host.Standard.unwritable", "Standard output cannot be written"));
             written += part > 0 ? static_cast<size_t>(part) : 0;
         }
     }

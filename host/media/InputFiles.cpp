@@ -1,6 +1,7 @@
 #include "media/InputFiles.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 
 #include <algorithm>
 #include <set>
@@ -83,12 +84,15 @@ std::vector<SInputFile> listInputs(CLibrary& library, const std::vector<fs::path
         if (!fs::is_directory(input, none)) {
             found.push_back({input, "", ""});
         } else if (!recursive) {
-            found.push_back({input, "", "Is a directory; --recursive converts the files in it"});
+            found.push_back(
+                {input, "",
+                 tr("host.Convert.directory", "Is a directory; --recursive converts the files in it")});
         } else {
             const size_t before = found.size();
             CFolderWalk(found, extensions, isSame(input, excluded) ? fs::path() : excluded).visit(input, "");
             if (found.size() == before)
-                found.push_back({input, "", "The folder has no files that can be read"});
+                found.push_back(
+                    {input, "", tr("host.Convert.emptyFolder", "The folder has no files that can be read")});
         }
     }
     return found;

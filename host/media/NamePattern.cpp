@@ -1,5 +1,7 @@
 #include "media/NamePattern.h"
 
+#include "base/Translation.h"
+
 #include <algorithm>
 #include <set>
 #include <stdexcept>
@@ -110,7 +112,8 @@ CNamePattern::CNamePattern(const std::string& text) : m_parts(1) {
     bool hasField = false;
     for (size_t i = 0; i < text.size(); ++i) {
         const auto c = static_cast<unsigned char>(text[i]);
-        if (c < 0x20 || c == 0x7F) throw std::invalid_argument("has control characters");
+        if (c < 0x20 || c == 0x7F)
+            throw std::invalid_argument(tr("host.Pattern.control", "has control characters"));
         if (text[i] == '/') {
             m_parts.emplace_back();
         } else if (text[i] != '%') {
@@ -122,17 +125,21 @@ CNamePattern::CNamePattern(const std::string& text) : m_parts(1) {
             const size_t end = text.find('%', i + 1);
             const std::string name = text.substr(i + 1, end == std::string::npos ? end : end - i - 1);
             if (end == std::string::npos || !findField(name))
-                throw std::invalid_argument("has no field " + text.substr(i, name.size() + 2) +
-                                            "; known are " + describeFields() + ", and %% is a percent sign");
+                throw std::invalid_argument(tr(
+                    "host.Pattern.unknown", "has no field %NAME%; known are %LIST%, and %% is a percent sign",
+                    {{"%NAME%", text.substr(i, name.size() + 2)}, {"%LIST%", describeFields()}}));
             m_parts.back().push_back({true, name});
             hasField = true;
             i = end;
         }
     }
-    if (!hasField) throw std::invalid_argument("needs a field: " + describeFields());
+    if (!hasField)
+        throw std::invalid_argument(
+            tr("host.Pattern.noField", "needs a field: %LIST%", {{"%LIST%", describeFields()}}));
     for (const Part& part : m_parts)
         if (part.empty() || (part.size() == 1 && !part[0].isField && trim(part[0].text, ". ", ". ").empty()))
-            throw std::invalid_argument("must be a relative path without empty parts, '.' and '..'");
+            throw std::invalid_argument(
+                tr("host.Pattern.relative", "must be a relative path without empty parts, '.' and '..'"));
 }
 
 bool CNamePattern::uses(std::string_view field) const {

@@ -1,5 +1,6 @@
 #include "media/PlaySession.h"
 
+#include "base/Translation.h"
 #include "library/Failure.h"
 
 #include <algorithm>
@@ -22,7 +23,7 @@ public:
             return;
         }
         --s_alive;
-        throw std::runtime_error(takeFailure("The sound device cannot be used"));
+        throw std::runtime_error(takeFailure(tr("host.Play.device", "The sound device cannot be used")));
     }
     ~CShared() {
         m_player.reset();
@@ -34,7 +35,7 @@ public:
     void play() { // returns at the end
         clearFailure();
         if (m_library.Player_Play(m_player.get()) != TONEWRIGHT_OK) {
-            m_reason = takeFailure("The sound cannot be played");
+            m_reason = takeFailure(tr("host.Play.sound", "The sound cannot be played"));
             TONEWRIGHT_Host_SetPlayerProgress(m_player.get(), nullptr, nullptr);
         }
         m_hasEnded = true;

@@ -1,6 +1,7 @@
 #include "media/PlaySource.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 #include "media/Arrangement.h"
 
@@ -25,7 +26,8 @@ public:
     CItemReader(const SPlayItem& item, const SSampleFormat& samples, CHandle source, bool isPadded)
         : m_file(item.file), m_samples(samples), m_first(toFrames(item.begin)), m_isPadded(isPadded),
           m_source(std::move(source)), m_reader(TONEWRIGHT_Host_CreateReader(m_source.get())) {
-        if (!m_reader) throw std::runtime_error(takeFailure("The file cannot be read", m_file));
+        if (!m_reader)
+            throw std::runtime_error(takeFailure(tr("host.unreadable", "The file cannot be read"), m_file));
     }
 
     // Frames from the beginning of the item to its end, where the source has that duration.
@@ -33,8 +35,9 @@ public:
         const auto all = static_cast<int64_t>(std::ceil(duration * m_samples.rate - 1e-3));
         const int64_t end = item.end ? std::min(toFrames(*item.end), all) : all;
         if (end <= m_first && item.track > 0)
-            throw std::runtime_error("Track " + std::to_string(item.track) + " begins after the end of " +
-                                     item.file.filename().string());
+            throw std::runtime_error(
+                tr("host.Play.beyondEnd", "Track %NUMBER% begins after the end of %FILE%",
+                   {{"%NUMBER%", std::to_string(item.track)}, {"%FILE%", item.file.filename().string()}}));
         return end - m_first + (m_isPadded ? kStepFrames : 0);
     }
     const std::shared_ptr<CPlayResult>& getResult() const { return m_result; }
@@ -43,7 +46,7 @@ public:
         clearFailure();
         int64_t count = TONEWRIGHT_Host_ReadFrames(m_reader.get(), samples, frames);
         if (count < 0) {
-            end(takeFailure("The file cannot be read", m_file));
+            end(takeFailure(tr("host.unreadable", "The file cannot be read"), m_file));
             return 0;
         }
         if (m_isPadded && count < frames) {
@@ -90,8 +93,10 @@ CHandle openInFormat(CLibrary& library, const SPlayItem& item, const SSampleForm
     if (sound.samples != samples &&
         TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels,
                                         samples.bytesPerSample) != 1)
-        throw std::runtime_error(takeFailure(
-            "Cannot be converted from " + describe(sound.samples) + " to " + describe(samples), item.file));
+        throw std::runtime_error(
+            takeFailure(tr("host.inconvertible", "Cannot be converted from %FROM% to %TO%",
+                           {{"%FROM%", describe(sound.samples)}, {"%TO%", describe(samples)}}),
+                        item.file));
     return std::move(sound.source);
 }
 
@@ -106,7 +111,8 @@ SPlaySource openPlaySource(CLibrary& library, const SPlayItem& item, const SSamp
     made.result = reader->getResult();
     const int64_t frames = duration > 0 ? reader->measure(item, duration) : -1;
     if (item.begin > 0 && !reader->seek(0))
-        throw std::runtime_error(takeFailure("The file cannot be read from that time on", item.file));
+        throw std::runtime_error(
+            takeFailure(tr("host.Play.seek", "The file cannot be read from that time on"), item.file));
     TONEWRIGHT_SourceCallbacks callbacks = {};
     callbacks.size = sizeof callbacks;
     callbacks.read = [](void* user, void* target, int64_t count) {
@@ -118,7 +124,8 @@ SPlaySource openPlaySource(CLibrary& library, const SPlayItem& item, const SSamp
     callbacks.release = [](void* user) { delete static_cast<CItemReader*>(user); };
     made.source = CHandle(TONEWRIGHT_Host_CreateSourceFromCallbacks(
         samples.rate, samples.channels, samples.bytesPerSample, frames, &callbacks, reader.get()));
-    if (!made.source) throw std::runtime_error(takeFailure("The file cannot be played", item.file));
+    if (!made.source)
+        throw std::runtime_error(takeFailure(tr("host.Play.failed", "The file cannot be played"), item.file));
     static_cast<void>(reader.release()); // by the source
     made.duration = item.track > 0 ? static_cast<double>(frames) / samples.rate : duration;
     return made;

@@ -1,6 +1,7 @@
 #include "media/Playlist.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 
 #include <algorithm>
 #include <cctype>
@@ -91,8 +92,9 @@ bool isBefore(const std::string& a, const std::string& b) {
 std::string readText(const fs::path& file) {
     std::error_code error;
     if (!fs::is_regular_file(file, error))
-        throw std::runtime_error(error ? error.message() : "Is not a regular file");
-    if (fs::file_size(file, error) > kMostBytes) throw std::runtime_error("Is too large for a playlist");
+        throw std::runtime_error(error ? error.message() : tr("host.notRegular", "Is not a regular file"));
+    if (fs::file_size(file, error) > kMostBytes)
+        throw std::runtime_error(tr("host.Playlist.tooLarge", "Is too large for a playlist"));
     std::ifstream in(file, std::ios::binary);
     std::ostringstream text;
     text << in.rdbuf();
@@ -178,11 +180,13 @@ int64_t parseCueTime(std::string_view text) {
         const auto [next, error] = std::from_chars(at, end, parts[i]);
         if (error != std::errc() || parts[i] < 0 || parts[i] > 100'000'000 || (i < 2) != (next != end) ||
             (i < 2 && *next != ':'))
-            throw std::runtime_error("The time " + toPrintable(toText(text)) + " is invalid");
+            throw std::runtime_error(tr("host.Playlist.time", "The time %TEXT% is invalid",
+                                        {{"%TEXT%", toPrintable(toText(text))}}));
         at = next + 1;
     }
     if (parts[1] >= 60 || parts[2] >= kCueFrames)
-        throw std::runtime_error("The time " + toPrintable(toText(text)) + " is invalid");
+        throw std::runtime_error(
+            tr("host.Playlist.time", "The time %TEXT% is invalid", {{"%TEXT%", toPrintable(toText(text))}}));
     return (parts[0] * 60 + parts[1]) * kCueFrames + parts[2];
 }
 
@@ -247,13 +251,13 @@ fs::path resolve(const fs::path& playlist, std::string_view location) {
     if (colon != std::string::npos && scheme == "file") {
         const std::optional<std::u16string> uri = toUTF16(bytes);
         char* const path = uri ? TONEWRIGHT_Host_URIToPath(uri->c_str()) : nullptr;
-        if (!path) throw std::runtime_error("The address is invalid");
+        if (!path) throw std::runtime_error(tr("host.Playlist.address", "The address is invalid"));
         const fs::path file = path;
         TONEWRIGHT_Host_Free(path);
         return file;
     }
     if (colon != std::string::npos && bytes.compare(colon, 3, "://") == 0)
-        throw std::runtime_error("Only files can be played");
+        throw std::runtime_error(tr("host.Playlist.onlyFiles", "Only files can be played"));
     const fs::path folder = playlist.parent_path();
     const std::string text = toText(bytes);
     std::error_code none;
@@ -266,7 +270,8 @@ fs::path resolve(const fs::path& playlist, std::string_view location) {
 }
 
 void CLister::addFile(const fs::path& file, const std::string& title, const std::string& failure) {
-    if (m_items.size() >= kMostItems) throw std::length_error("The playlists have too many entries");
+    if (m_items.size() >= kMostItems)
+        throw std::length_error(tr("host.Playlist.tooMany", "The playlists have too many entries"));
     SPlayItem item;
     item.file = item.name = file;
     item.title = title;
@@ -279,8 +284,9 @@ template <class List> void CLister::enter(const fs::path& place, List list) {
     fs::path real = fs::canonical(place, error);
     if (error) return addFile(place, {}, error.message());
     if (std::find(m_under.begin(), m_under.end(), real) != m_under.end())
-        return addFile(place, {}, "Contains itself");
-    if (m_under.size() >= kMostLevels) return addFile(place, {}, "Is nested too deeply");
+        return addFile(place, {}, tr("host.Playlist.itself", "Contains itself"));
+    if (m_under.size() >= kMostLevels)
+        return addFile(place, {}, tr("host.Playlist.nested", "Is nested too deeply"));
     m_under.push_back(std::move(real));
     try {
         list();
@@ -326,11 +332,12 @@ void CLister::addFolder(const fs::path& folder) {
     const size_t before = m_items.size() - files.size();
     if (m_isRecursive)
         for (const std::string& name : folders) enter(folder / name, [&] { addFolder(folder / name); });
-    if (isTop && m_items.size() == before) throw std::runtime_error("The folder has no sound files");
+    if (isTop && m_items.size() == before)
+        throw std::runtime_error(tr("host.Playlist.noFiles", "The folder has no sound files"));
 }
 
 void CLister::addEntries(const fs::path& playlist, const std::vector<SEntry>& entries) {
-    if (entries.empty()) throw std::runtime_error("The playlist is empty");
+    if (entries.empty()) throw std::runtime_error(tr("host.Playlist.empty", "The playlist is empty"));
     for (const SEntry& entry : entries) {
         try {
             add(resolve(playlist, entry.location), entry.title);
@@ -351,7 +358,8 @@ void CLister::addCue(const fs::path& sheet) {
         SPlayItem& item = m_items.back();
         item.track = track.number;
         if (track.begin < 0 || track.file.empty()) {
-            item.failure = "Track " + std::to_string(track.number) + " has no beginning";
+            item.failure = tr("host.Playlist.noBeginning", "Track %NUMBER% has no beginning",
+                              {{"%NUMBER%", std::to_string(track.number)}});
             continue;
         }
         item.file = resolve(sheet, track.file);
@@ -361,9 +369,11 @@ void CLister::addCue(const fs::path& sheet) {
         if (!isFollowed) continue;
         item.end = tracks[i + 1].begin;
         if (*item.end <= item.begin)
-            item.failure = "Track " + std::to_string(track.number) + " ends before it begins";
+            item.failure = tr("host.Playlist.endsEarly", "Track %NUMBER% ends before it begins",
+                              {{"%NUMBER%", std::to_string(track.number)}});
     }
-    if (m_items.size() == before) throw std::runtime_error("The cue sheet has no tracks");
+    if (m_items.size() == before)
+        throw std::runtime_error(tr("host.Playlist.noTracks", "The cue sheet has no tracks"));
 }
 
 } // namespace

@@ -1,5 +1,7 @@
 #include "media/PrivateFolder.h"
 
+#include "base/Translation.h"
+
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
@@ -14,8 +16,9 @@ CPrivateFolder::CPrivateFolder() {
     const fs::path parent = chosen && *chosen ? chosen : "/tmp";
     std::string name = fs::absolute(parent / "tonewright-XXXXXX");
     if (!::mkdtemp(name.data()))
-        throw std::runtime_error("No temporary folder can be created in " + parent.string() + ": " +
-                                 std::strerror(errno));
+        throw std::runtime_error(tr("host.temporaryFolder",
+                                    "No temporary folder can be created in %FOLDER%: %REASON%",
+                                    {{"%FOLDER%", parent.string()}, {"%REASON%", std::strerror(errno)}}));
     m_path = name;
 }
 

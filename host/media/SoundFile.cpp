@@ -1,6 +1,7 @@
 #include "media/SoundFile.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 
 #include <algorithm>
@@ -28,7 +29,8 @@ SSoundFile openSoundFile(const fs::path& file) {
     sound.info.size = sizeof sound.info;
     clearFailure();
     sound.source = CHandle(TONEWRIGHT_Host_OpenMedia(toURI(file).c_str(), &sound.info));
-    if (!sound.source) throw std::runtime_error(takeFailure("The file cannot be read", file));
+    if (!sound.source)
+        throw std::runtime_error(takeFailure(tr("host.unreadable", "The file cannot be read"), file));
     sound.samples = {sound.info.sampleRate, sound.info.channelCount, sound.info.bytesPerSample};
     return sound;
 }
@@ -37,19 +39,23 @@ void checkInput(const fs::path& file) {
     struct stat status;
     if (::stat(file.c_str(), &status) != 0) throwSystem(errno);
     if (S_ISDIR(status.st_mode)) throwSystem(EISDIR);
-    if (!S_ISREG(status.st_mode)) throw std::runtime_error("Is not a regular file");
-    if (status.st_size == 0) throw std::runtime_error("The file is empty");
+    if (!S_ISREG(status.st_mode)) throw std::runtime_error(tr("host.notRegular", "Is not a regular file"));
+    if (status.st_size == 0) throw std::runtime_error(tr("host.emptyFile", "The file is empty"));
     if (::access(file.c_str(), R_OK) != 0) throwSystem(errno);
 }
 
 std::string describe(const SSampleFormat& samples) {
-    return std::to_string(samples.rate) + " Hz, " + std::to_string(samples.channels) +
-           (samples.channels == 1 ? " channel and " : " channels and ") +
-           std::to_string(samples.bytesPerSample * 8) + " bits";
+    const std::initializer_list<STextValue> values{{"%RATE%", std::to_string(samples.rate)},
+                                                   {"%CHANNELS%", std::to_string(samples.channels)},
+                                                   {"%BITS%", std::to_string(samples.bytesPerSample * 8)}};
+    return samples.channels == 1
+               ? tr("host.formatOfOneChannel", "%RATE% Hz, %CHANNELS% channel and %BITS% bits", values)
+               : tr("host.format", "%RATE% Hz, %CHANNELS% channels and %BITS% bits", values);
 }
 
 std::string describeKind(const fs::path& file) {
-    return file.has_extension() ? file.extension().string() + " files" : "files without an extension";
+    if (!file.has_extension()) return tr("host.filesWithoutExtension", "files without an extension");
+    return tr("host.filesOfKind", "%EXTENSION% files", {{"%EXTENSION%", file.extension().string()}});
 }
 
 std::string codecName(const fs::path& file) {
@@ -65,7 +71,7 @@ std::string codecName(const fs::path& file) {
                    {".rf64", "RF64"}};
     for (const auto& known : kCodecs)
         if (extension == known.extension) return known.codec;
-    return extension.empty() ? "unknown" : extension.substr(1);
+    return extension.empty() ? tr("host.unknown", "unknown") : extension.substr(1);
 }
 
 bool isSameFile(const fs::path& a, const fs::path& b) {

@@ -1,6 +1,7 @@
 #include "media/WholeTag.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 #include "media/FileTag.h"
 #include "media/SoundFile.h"
@@ -56,8 +57,11 @@ bool canHaveTag(const fs::path& file) {
 
 void checkTagged(const fs::path& file) {
     checkInput(file);
-    if (isWave(file) && isWideWav(file)) throw std::runtime_error("No tag is known for RF64 files");
-    if (!canHaveTag(file)) throw std::runtime_error("No tag is known for " + describeKind(file));
+    if (isWave(file) && isWideWav(file))
+        throw std::runtime_error(tr("host.Tag.rf64", "No tag is known for RF64 files"));
+    if (!canHaveTag(file))
+        throw std::runtime_error(
+            tr("host.Tag.unknownKind", "No tag is known for %KIND%", {{"%KIND%", describeKind(file)}}));
 }
 
 std::string SWholeTag::getFirst(const std::string& name) const {
@@ -70,7 +74,8 @@ SWholeTag readWholeTag(const fs::path& file) {
     checkTagged(file);
     clearFailure();
     const CHandle handle(TONEWRIGHT_Host_ReadTags(toURI(file).c_str()));
-    if (!handle) throw std::runtime_error(takeFailure("The tag cannot be read", file));
+    if (!handle)
+        throw std::runtime_error(takeFailure(tr("host.Tag.unreadable", "The tag cannot be read"), file));
     SWholeTag tag;
     for (int32_t i = 0; i < TONEWRIGHT_Host_GetTagEntryCount(handle.get()); ++i) {
         const char *name = nullptr, *value = nullptr;
@@ -112,7 +117,8 @@ CTagChange::CTagChange() : m_change(TONEWRIGHT_Host_CreateTagChange()) {}
 void CTagChange::setField(const std::string& name, const std::string& value) {
     clearFailure();
     if (TONEWRIGHT_Host_ChangeTagField(m_change.get(), name.c_str(), value.c_str()) != 1)
-        throw std::runtime_error(takeFailure("The field " + name + " cannot be set"));
+        throw std::runtime_error(
+            takeFailure(tr("host.Tag.unsettable", "The field %FIELD% cannot be set", {{"%FIELD%", name}})));
 }
 
 void CTagChange::removePictures(int type) {
@@ -130,13 +136,15 @@ void CTagChange::addPicture(const STagPicture& picture) {
                                       picture.width,
                                       picture.height};
     if (TONEWRIGHT_Host_AddTagPicture(m_change.get(), &given) != 1)
-        throw std::runtime_error(takeFailure("The picture cannot be used"));
+        throw std::runtime_error(takeFailure(tr("host.Cover.unusable", "The picture cannot be used")));
 }
 
 bool CTagChange::apply(const fs::path& file) const {
     clearFailure();
     const int32_t result = TONEWRIGHT_Host_ApplyTagChange(m_change.get(), toURI(file).c_str());
-    if (result < 0) throw std::runtime_error(takeFailure("The tag could not be written", file));
+    if (result < 0)
+        throw std::runtime_error(
+            takeFailure(tr("host.Tag.unwritable", "The tag could not be written"), file));
     return result == 1;
 }
 

@@ -1,6 +1,7 @@
 #include "terminal/Progress.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -90,11 +91,14 @@ void CProgress::finish(Job job, const SJobResult& result) {
           {"duration", result.duration},
           {"seconds", result.elapsed},
           {"bytes", result.bytes}});
-    char speed[48];
-    std::snprintf(speed, sizeof speed, "%.0f times real time",
-                  result.duration / std::max(result.elapsed, 1e-6));
-    say(name(m_jobs[job].output) + ": " + result.codec + ", " + formatDuration(result.duration) + ", " +
-        formatSize(result.bytes) + ", " + speed);
+    char speed[32];
+    std::snprintf(speed, sizeof speed, "%.0f", result.duration / std::max(result.elapsed, 1e-6));
+    say(tr("host.Progress.done", "%FILE%: %CODEC%, %DURATION%, %SIZE%, %SPEED% times real time",
+           {{"%FILE%", name(m_jobs[job].output)},
+            {"%CODEC%", result.codec},
+            {"%DURATION%", formatDuration(result.duration)},
+            {"%SIZE%", formatSize(result.bytes)},
+            {"%SPEED%", speed}}));
     drawBars();
 }
 
@@ -131,7 +135,7 @@ void CProgress::skip(Job job) {
     m_jobs[job].running = false;
     eraseBars();
     emit(job, "skipped", nlohmann::json::object());
-    say(name(m_jobs[job].output) + ": skipped, it exists");
+    say(tr("host.Progress.skipped", "%FILE%: skipped, it exists", {{"%FILE%", name(m_jobs[job].output)}}));
     drawBars();
 }
 
@@ -139,7 +143,8 @@ void CProgress::plan(Job job, bool replaces) {
     std::lock_guard lock(m_mutex);
     m_jobs[job].running = false;
     emit(job, "planned", {{"replaces", replaces}});
-    say(name(m_jobs[job].input) + " -> " + name(m_jobs[job].output) + (replaces ? " (replaced)" : ""));
+    say(name(m_jobs[job].input) + " -> " + name(m_jobs[job].output) +
+        (replaces ? " " + tr("host.Progress.replaced", "(replaced)") : ""));
 }
 
 void CProgress::say(const std::string& line) {
