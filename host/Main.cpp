@@ -5,6 +5,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/HostLog.h"
 #include "media/Devices.h"
 #include "media/FormatOptions.h"
@@ -42,6 +43,31 @@ std::vector<std::string> splitArguments(int argc, char** argv) {
     return arguments;
 }
 
+// The value of --lang, or null.
+const char* findLanguage(int argc, char** argv) {
+    for (int i = 1; i < argc && std::string_view(argv[i]) != "--"; ++i) {
+        const std::string_view argument = argv[i];
+        if (argument.starts_with("--lang=")) return argv[i] + std::string_view("--lang=").size();
+        if (argument == "--lang" && i + 1 < argc) return argv[i + 1];
+    }
+    return nullptr;
+}
+
+// The words of the parser's own. Commands inherit them if they are added afterwards.
+void translateHelp(CLI::App& app) {
+    app.option_defaults()->group(tr("host.help.Options", "Options"));
+    app.group(tr("host.help.Subcommands", "Subcommands"));
+    app.set_help_flag("-h,--help", tr("host.help.help", "Print this help message and exit"));
+    const auto formatter = app.get_formatter();
+    formatter->label("Usage", tr("host.help.Usage", "Usage"));
+    formatter->label("Positionals", tr("host.help.Positionals", "Positionals"));
+    formatter->label("OPTIONS", tr("host.help.OPTIONS", "OPTIONS"));
+    formatter->label("SUBCOMMAND", tr("host.help.SUBCOMMAND", "SUBCOMMAND"));
+    formatter->label("REQUIRED", tr("host.help.REQUIRED", "REQUIRED"));
+    formatter->label("Needs", tr("host.help.Needs", "Needs"));
+    formatter->label("Excludes", tr("host.help.Excludes", "Excludes"));
+}
+
 // Exceptions that the commands do not catch are failures of the job, not of loading the library.
 int runCommand(const Run& run, CLibrary& library) {
     try {
@@ -58,7 +84,8 @@ int runCommand(const Run& run, CLibrary& library) {
         std::error_code error;
         const bool isGone = std::filesystem::current_path(error).empty();
         std::fprintf(stderr, "tonewright: %s\n",
-                     isGone ? "The current folder does not exist" : failure.what());
+                     isGone ? tr("host.noCurrentFolder", "The current folder does not exist").c_str()
+                            : failure.what());
         return kExitFailure;
     }
 }
@@ -66,24 +93,41 @@ int runCommand(const Run& run, CLibrary& library) {
 } // namespace
 
 int main(int argc, char** argv) {
+    // Before the options are described.
+    const char* const language = findLanguage(argc, argv);
+    if (!setLanguage(language)) {
+        std::fprintf(stderr, "tonewright: There is no translation for the language %s\n",
+                     toPrintable(language).c_str());
+        return kExitUsage;
+    }
     CLI::App app(
-        "Converts, plays, mixes and records sound files, shows their properties, draws their waveforms "
-        "and changes their tags.",
+        tr("host.help",
+           "Converts, plays, mixes and records sound files, shows their properties, draws their waveforms "
+           "and changes their tags."),
         "tonewright");
-    app.set_version_flag("--version", "tonewright " TONEWRIGHT_VERSION);
+    translateHelp(app);
+    app.set_version_flag("--version", "tonewright " TONEWRIGHT_VERSION,
+                         tr("host.help.version", "Display program version information and exit"));
     app.require_subcommand(1);
     app.fallthrough(); // the options below may also follow the command
     app.get_formatter()->column_width(28);
     int32_t printLevel = std::numeric_limits<int32_t>::max();
-    app.add_option("--log-level", printLevel,
-                   "Print the library's log from this level on: trace, debug, info, warning, error or off")
+    app.add_option(
+           "--log-level", printLevel,
+           tr("host.help.logLevel",
+              "Print the library's log from this level on: trace, debug, info, warning, error or off"))
         ->option_text("LEVEL")
         ->transform(CLI::CheckedTransformer(kLogLevels, CLI::ignore_case).description(""));
     std::string boxed;
     addBoxed(app, boxed);
+    app.add_option("--lang")
+        ->description(tr("host.help.lang",
+                         "Language of the texts, such as de or de_AT (default: that of the environment)"))
+        ->option_text("LANGUAGE");
     app.footer(
-        "Exit codes: 0 success, 1 a file failed, 2 invalid arguments, 3 no sound device, 4 the library "
-        "cannot be loaded or started, 130 stopped by Ctrl-C.");
+        tr("host.help.exitCodes",
+           "Exit codes: 0 success, 1 a file failed, 2 invalid arguments, 3 no sound device, 4 the library "
+           "cannot be loaded or started, 130 stopped by Ctrl-C."));
 
     Run run;
     for (const auto add : {addConvert, addInfo, addFormats, addWaveform, addDevices, addPlay, addMix,
@@ -92,8 +136,11 @@ int main(int argc, char** argv) {
     // The parser's own message would not name the unknown command.
     const auto isMeant = [&](const CLI::App* command) { return command->check_name(argv[1]); };
     if (argc > 1 && argv[1][0] != '-' && app.get_subcommands(isMeant).empty()) {
-        std::fprintf(stderr, "Unknown command: %s\nRun with --help for more information.\n",
-                     toPrintable(argv[1]).c_str());
+        std::fprintf(stderr, "%s\n",
+                     tr("host.unknownCommand",
+                        "Unknown command: %NAME%\nRun with --help for more information.",
+                        {{"%NAME%", toPrintable(argv[1])}})
+                         .c_str());
         return kExitUsage;
     }
     try {

@@ -6,6 +6,7 @@ be parsed is an error.
 """
 
 import gzip
+import os
 import pathlib
 import re
 import shutil
@@ -79,7 +80,13 @@ def kind_of(title, entry):
 
 
 def run(program, *arguments):
-    return subprocess.run([program, *arguments], capture_output=True, text=True, stdin=subprocess.DEVNULL)
+    return subprocess.run(
+        [program, *arguments],
+        capture_output=True,
+        text=True,
+        stdin=subprocess.DEVNULL,
+        env={**os.environ, "LC_ALL": "C"},  # the pages are English
+    )
 
 
 def paragraphs(text):

@@ -1,6 +1,7 @@
 #include "commands/Convert.h"
 #include "arguments/Arguments.h"
 #include "arguments/Presets.h"
+#include "base/Translation.h"
 #include "media/InputContent.h"
 
 #include <algorithm>
@@ -27,53 +28,66 @@ CNamePattern parsePattern(const std::string& text) {
 void addFiles(CLI::App& command, SConvertOptions& options) {
     command
         .add_option("IN", options.inputs,
-                    "Files or http addresses to convert, folders with -r, or - for standard input")
+                    tr("host.help.convert.IN",
+                       "Files or http addresses to convert, folders with -r, or - for standard input"))
         ->required()
         ->option_text("...");
     command.add_flag("-r,--recursive", options.recursive,
-                     "Convert the files in and below folders; hidden ones are left out");
+                     tr("host.help.convert.recursive",
+                        "Convert the files in and below folders; hidden ones are left out"));
     command
         .add_option("-o,--output", options.output,
-                    "File to write; its extension selects the format. With --to: a folder,\n"
-                    "which exists or ends in /, or - for standard output")
+                    tr("host.help.convert.output",
+                       "File to write; its extension selects the format. With --to: a "
+                       "folder,\nwhich exists or ends in /, or - for standard output"))
         ->option_text("FILE");
     command
         .add_option("--to", options.extension,
-                    "Extension of the files to write, such as flac; beside the inputs by default")
+                    tr("host.help.convert.to",
+                       "Extension of the files to write, such as flac; beside the inputs by default"))
         ->option_text("EXT");
     command
-        .add_option("--directory", options.directory, "Folder for the files of --to; it is created if needed")
+        .add_option(
+            "--directory", options.directory,
+            tr("host.help.convert.directory", "Folder for the files of --to; it is created if needed"))
         ->option_text("FOLDER")
         ->excludes("--output");
     command
         .add_option_function<std::string>(
             "--name", [&](const std::string& text) { options.names = parsePattern(text); },
-            "Names of the files of --to from tags, such as '%artist%/%track% %title%';\n"
-            "folders are created, and the folders of the inputs are not kept. Fields:\n" +
-                CNamePattern::describeFields())
+            tr("host.help.convert.name",
+               "Names of the files of --to from tags, such as '%artist%/%track% %title%';\nfolders are "
+               "created, and the folders of the inputs are not kept. Fields:\n%FIELDS%",
+               {{"%FIELDS%", CNamePattern::describeFields()}}))
         ->option_text("PATTERN");
 }
 
 void addExisting(CLI::App& command, SConvertOptions& options) {
     auto* force = command.add_flag_callback(
-        "-f,--force", [&] { options.existing = EExisting::replace; }, "Replace existing files");
+        "-f,--force", [&] { options.existing = EExisting::replace; },
+        tr("host.help.force", "Replace existing files"));
     command
         .add_flag_callback(
-            "--skip", [&] { options.existing = EExisting::skip; }, "Leave existing files as they are")
+            "--skip", [&] { options.existing = EExisting::skip; },
+            tr("host.help.convert.skip", "Leave existing files as they are"))
         ->excludes(force);
     command.add_flag("-n,--dry-run", options.dryRun,
-                     "Print what would be written where, and every problem; write nothing");
+                     tr("host.help.convert.dryRun",
+                        "Print what would be written where, and every problem; write nothing"));
 }
 
 void addCare(CLI::App& command, SConvertOptions& options) {
     command.add_flag("--salvage", options.salvage,
-                     "Replace damaged parts of the input with silence instead of failing");
+                     tr("host.help.convert.salvage",
+                        "Replace damaged parts of the input with silence instead of failing"));
     command.add_flag("--prevent-clipping", options.preventClipping,
-                     "Make floating-point sound that exceeds full scale quieter instead of clipping it");
+                     tr("host.help.convert.preventClipping",
+                        "Make floating-point sound that exceeds full scale quieter instead of clipping it"));
     command.add_flag_callback(
         "--no-tags", [&] { options.carryTags = false; },
-        "Do not copy title, artist and the other fields of tags");
-    command.add_flag("--times", options.carryTimes, "Give each output the modification time of its input");
+        tr("host.help.convert.noTags", "Do not copy title, artist and the other fields of tags"));
+    command.add_flag("--times", options.carryTimes,
+                     tr("host.help.convert.times", "Give each output the modification time of its input"));
 }
 
 // The parts of `output` that depend on --to.
@@ -81,39 +95,48 @@ void placeOutput(SConvertOptions& options) {
     const bool isFolder = options.output.native().ends_with('/');
     std::error_code none;
     if (options.output.empty() && options.extension.empty())
-        throw CLI::RequiredError("Either --output or --to");
+        throw CLI::RequiredError(tr("host.Convert.eitherOutput", "Either --output or --to"));
     // A preset may set --to, so this is not checked by the parser.
     if (options.extension.empty() && (!options.directory.empty() || options.names))
         throw CLI::RequiredError("--to");
     if (options.extension == "." || options.extension.find('/') != std::string::npos)
-        throw CLI::ValidationError("--to", "takes an extension, such as flac");
+        throw CLI::ValidationError("--to", tr("host.Convert.extension", "takes an extension, such as flac"));
     if (isStandardStream(options.output)) {
         if (options.extension.empty())
-            throw CLI::ValidationError("--output", "- needs --to, which selects the format");
+            throw CLI::ValidationError("--output",
+                                       tr("host.Convert.needsTo", "- needs --to, which selects the format"));
         if (options.show == EOutput::json)
-            throw CLI::ValidationError("--json", "cannot share standard output with the sound");
+            throw CLI::ValidationError(
+                "--json", tr("host.Convert.jsonAndSound", "cannot share standard output with the sound"));
         if (!options.dryRun && ::isatty(STDOUT_FILENO))
-            throw CLI::ValidationError("--output", "standard output is a terminal");
+            throw CLI::ValidationError("--output",
+                                       tr("host.Convert.outputTerminal", "standard output is a terminal"));
     } else if (!options.output.empty() && options.extension.empty()) {
-        if (isFolder) throw CLI::ValidationError("--output", "names a folder, which needs --to");
+        if (isFolder)
+            throw CLI::ValidationError("--output",
+                                       tr("host.Convert.folderNeedsTo", "names a folder, which needs --to"));
     } else if (!options.output.empty()) {
         if (!isFolder && !fs::is_directory(options.output, none))
             throw CLI::ValidationError("--output",
-                                       "with --to takes an existing folder, a name that ends in /, or -");
+                                       tr("host.Convert.folderWithTo",
+                                          "with --to takes an existing folder, a name that ends in /, or -"));
         options.directory = std::exchange(options.output, fs::path());
     }
     if (!options.output.empty() && options.names)
-        throw CLI::ValidationError("--name", "names the files of --to, not a single output");
+        throw CLI::ValidationError(
+            "--name", tr("host.Convert.nameNeedsTo", "names the files of --to, not a single output"));
     if (!options.output.empty() && (options.inputs.size() != 1 || options.recursive))
-        throw CLI::ValidationError("--output", "takes one input; use --to for several");
+        throw CLI::ValidationError("--output",
+                                   tr("host.Convert.oneInput", "takes one input; use --to for several"));
 }
 
 void checkStandardInput(const SConvertOptions& options) {
     if (std::none_of(options.inputs.begin(), options.inputs.end(), isStandardStream)) return;
     if (options.inputs.size() > 1 || options.output.empty())
-        throw CLI::ValidationError("-", "standard input is the only input and needs --output");
+        throw CLI::ValidationError(
+            "-", tr("host.Convert.onlyInput", "standard input is the only input and needs --output"));
     if (!options.dryRun && ::isatty(STDIN_FILENO))
-        throw CLI::ValidationError("-", "standard input is a terminal");
+        throw CLI::ValidationError("-", tr("host.Convert.inputTerminal", "standard input is a terminal"));
 }
 
 } // namespace
@@ -122,23 +145,26 @@ void addConvert(CLI::App& app, Run& run) {
     const auto options = std::make_shared<SConvertOptions>();
     CLI::App* command = app.add_subcommand(
         "convert",
-        "Convert sound files. Sample rate, channels and bits per sample stay those of the input unless\n"
-        "options change them or the target cannot hold them. Existing files are replaced only with\n"
-        "--force. A file that fails is reported and the next one is converted.");
+        tr("host.help.convert",
+           "Convert sound files. Sample rate, channels and bits per sample stay those of the input "
+           "unless\noptions change them or the target cannot hold them. Existing files are replaced only "
+           "with\n--force. A file that fails is reported and the next one is converted."));
     addFiles(*command, *options);
     addPresets(*command);
     addFormat(*command, *options, {8, 16, 24, 32});
     command
         ->add_option("--resampler", options->resampler,
-                     "default, or best: a steeper filter for changes of the sample rate")
+                     tr("host.help.convert.resampler",
+                        "default, or best: a steeper filter for changes of the sample rate"))
         ->option_text("NAME")
         ->check(CLI::IsMember({"default", "best"}).description(""));
     addExisting(*command, *options);
     addCare(*command, *options);
     options->jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
     command
-        ->add_option("-j,--jobs", options->jobs,
-                     "Files converted at a time (default: number of processor cores)")
+        ->add_option(
+            "-j,--jobs", options->jobs,
+            tr("host.help.convert.jobs", "Files converted at a time (default: number of processor cores)"))
         ->option_text("N")
         ->check(CLI::Range(1, 256));
     addOutput(*command, options->show);

@@ -1,5 +1,6 @@
 #include "commands/Formats.h"
 #include "arguments/Arguments.h"
+#include "base/Translation.h"
 
 #include <memory>
 
@@ -7,10 +8,13 @@ namespace host {
 
 void addFormats(CLI::App& app, Run& run) {
     const auto options = std::make_shared<SFormatsOptions>();
-    CLI::App* command = app.add_subcommand("formats", "List the file extensions that can be read.");
+    CLI::App* command =
+        app.add_subcommand("formats", tr("host.help.formats", "List the file extensions that can be read."));
     command->add_flag("-l,--long", options->table,
-                      "Print a table that also shows what can be written and which files can have a tag");
-    command->add_flag("--json", options->json, "Print one JSON object with all of this");
+                      tr("host.help.formats.long",
+                         "Print a table that also shows what can be written and which files can have a tag"));
+    command->add_flag("--json", options->json,
+                      tr("host.help.formats.json", "Print one JSON object with all of this"));
     command->callback(
         [options, &run] { run = [options](CLibrary& library) { return listFormats(library, *options); }; });
 }

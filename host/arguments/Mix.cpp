@@ -1,5 +1,6 @@
 #include "commands/Mix.h"
 #include "arguments/Arguments.h"
+#include "base/Translation.h"
 
 #include <memory>
 
@@ -8,17 +9,20 @@ namespace host {
 void addMix(CLI::App& app, Run& run) {
     const auto options = std::make_shared<SMixOptions>();
     CLI::App* command = app.add_subcommand(
-        "mix",
-        "Mix an editor's arrangement into one sound file (default: 44100 Hz, 2 channels). Relative URIs\n"
-        "in it are resolved against its folder.");
-    command->add_option("ARRANGEMENT", options->input, "XML file that describes the tracks")
+        "mix", tr("host.help.mix", "Mix an editor's arrangement into one sound file (default: 44100 Hz, 2 "
+                                   "channels). Relative URIs\nin it are resolved against its folder."));
+    command
+        ->add_option("ARRANGEMENT", options->input,
+                     tr("host.help.mix.ARRANGEMENT", "XML file that describes the tracks"))
         ->required()
         ->option_text(" ");
-    command->add_option("-o,--output", options->output, "File to write; its extension selects the format")
+    command
+        ->add_option("-o,--output", options->output,
+                     tr("host.help.output", "File to write; its extension selects the format"))
         ->required()
         ->option_text("FILE");
     addFormat(*command, *options, {16});
-    command->add_flag("-f,--force", options->force, "Replace existing files");
+    command->add_flag("-f,--force", options->force, tr("host.help.force", "Replace existing files"));
     addOutput(*command, options->show);
     command->callback([options, &run] {
         checkBitRates(*options);

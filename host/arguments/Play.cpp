@@ -1,5 +1,6 @@
 #include "commands/Play.h"
 #include "arguments/Arguments.h"
+#include "base/Translation.h"
 #include "media/Devices.h"
 
 #include <charconv>
@@ -12,7 +13,8 @@ namespace {
 // Seconds, or [H:]M:S with seconds below 60.
 double parseTime(const std::string& text) {
     const auto refuse = [&text] {
-        throw CLI::ValidationError("--start", text + " is not a time such as 1:02.5");
+        throw CLI::ValidationError(
+            "--start", tr("host.Play.time", "%TEXT% is not a time such as 1:02.5", {{"%TEXT%", text}}));
     };
     double seconds = 0;
     int parts = 0;
@@ -31,41 +33,41 @@ double parseTime(const std::string& text) {
 
 void addPlay(CLI::App& app, Run& run) {
     const auto options = std::make_shared<SPlayOptions>();
-    CLI::App* command =
-        app.add_subcommand("play", "Play sound files and arrangements (.xml) without gaps between them; also "
-                                   "those in folders, playlists\n"
-                                   "(.m3u, .m3u8, .pls) and cue sheets (.cue). A file that fails is reported "
-                                   "and the next one is played.\n"
-                                   "\n"
-                                   "Keys:\n"
-                                   "  space            pause and resume\n"
-                                   "  left, right      5 seconds back, forward\n"
-                                   "  down, up         one minute back, forward; also shift and left, right\n"
-                                   "  n or >, p or <   next, previous item\n"
-                                   "  + or 0, - or 9   louder, softer\n"
-                                   "  m                mute\n"
-                                   "  q or Ctrl-C      stop");
+    CLI::App* command = app.add_subcommand(
+        "play", tr("host.help.play",
+                   "Play sound files and arrangements (.xml) without gaps between them; also those in "
+                   "folders, playlists\n(.m3u, .m3u8, .pls) and cue sheets (.cue). A file that fails is "
+                   "reported and the next one is played.\n\nKeys:\n  space            pause and resume\n  "
+                   "left, right      5 seconds back, forward\n  down, up         one minute back, forward; "
+                   "also shift and left, right\n  n or >, p or <   next, previous item\n  + or 0, - or 9   "
+                   "louder, softer\n  m                mute\n  q or Ctrl-C      stop"));
     command
-        ->add_option("INPUT", options->inputs,
-                     "Files, http addresses, folders, playlists and cue sheets to play")
+        ->add_option(
+            "INPUT", options->inputs,
+            tr("host.help.play.INPUT", "Files, http addresses, folders, playlists and cue sheets to play"))
         ->required()
         ->option_text("...");
-    command->add_flag("-r,--recursive", options->isRecursive, "Also play what is in folders below a folder");
+    command->add_flag("-r,--recursive", options->isRecursive,
+                      tr("host.help.play.recursive", "Also play what is in folders below a folder"));
     command
         ->add_option(
             "--device", options->device,
-            "Device to play on, by its id or name in tonewright devices (default: the default device)")
+            tr("host.help.play.device",
+               "Device to play on, by its id or name in tonewright devices (default: the default device)"))
         ->option_text("ID|NAME");
-    command->add_option("--volume", options->volume, "Volume in percent of the samples, from 0 to 130")
+    command
+        ->add_option("--volume", options->volume,
+                     tr("host.help.play.volume", "Volume in percent of the samples, from 0 to 130"))
         ->option_text("PERCENT")
         ->check(CLI::Range(0, kMostVolume));
     command
         ->add_option_function<std::string>(
             "--start", [options](const std::string& text) { options->start = parseTime(text); },
-            "Where to start in the first item, as 83.5 or 1:23.5")
+            tr("host.help.play.start", "Where to start in the first item, as 83.5 or 1:23.5"))
         ->option_text("TIME");
-    command->add_flag("--shuffle", options->isShuffled, "Play in random order");
-    command->add_flag("--loop", options->loops, "Start over at the end of the list");
+    command->add_flag("--shuffle", options->isShuffled, tr("host.help.play.shuffle", "Play in random order"));
+    command->add_flag("--loop", options->loops,
+                      tr("host.help.play.loop", "Start over at the end of the list"));
     addOutput(*command, options->show);
     command->callback([options, &run] {
         run = [options](CLibrary& library) {

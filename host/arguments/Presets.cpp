@@ -1,5 +1,7 @@
 #include "arguments/Presets.h"
 
+#include "base/Translation.h"
+
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -31,21 +33,34 @@ const char* const kCompression[] = {"quality", "bitrate", "min-bitrate", "max-bi
 
 const struct {
     const char* name;
+    const char* key;
     const char* purpose;
     Settings settings;
 } kBuiltIn[] = {
-    {"archive", "everything the input holds, as small as possible", {{"to", "flac"}, {"quality", "1.0"}}},
+    {"archive",
+     "host.Presets.archive",
+     "everything the input holds, as small as possible",
+     {{"to", "flac"}, {"quality", "1.0"}}},
     {"cd",
+     "host.Presets.cd",
      "sound for an audio CD",
      {{"to", "wav"}, {"rate", "44100"}, {"channels", "2"}, {"bits", "16"}, {"resampler", "best"}}},
     {"phone",
+     "host.Presets.phone",
      "announcements for telephone systems",
      {{"to", "wav"}, {"rate", "8000"}, {"channels", "1"}, {"bits", "16"}}},
     {"podcast",
+     "host.Presets.podcast",
      "speech for any player, about 43 MB per hour",
      {{"to", "mp3"}, {"rate", "44100"}, {"channels", "1"}, {"bitrate", "96k"}}},
-    {"portable", "music for any player, hardly distinguishable", {{"to", "mp3"}, {"quality", "0.8"}}},
-    {"speech", "speech, small", {{"to", "ogg"}, {"rate", "24000"}, {"channels", "1"}, {"quality", "0.2"}}},
+    {"portable",
+     "host.Presets.portable",
+     "music for any player, hardly distinguishable",
+     {{"to", "mp3"}, {"quality", "0.8"}}},
+    {"speech",
+     "host.Presets.speech",
+     "speech, small",
+     {{"to", "ogg"}, {"rate", "24000"}, {"channels", "1"}, {"quality", "0.2"}}},
 };
 
 bool isCompression(const std::string& key) {
@@ -72,20 +87,26 @@ std::string join(const Settings& settings) {
 SPreset readPreset(const fs::path& file) {
     std::ifstream stream(file);
     std::stringstream text;
-    if (!stream || !(text << stream.rdbuf())) fail(file.string() + " cannot be read");
+    if (!stream || !(text << stream.rdbuf()))
+        fail(tr("host.Presets.unreadable", "%FILE% cannot be read", {{"%FILE%", file.string()}}));
     SPreset preset{{}, "", file.string()};
     for (const CLI::ConfigItem& item : CLI::ConfigINI().from_config(text)) {
         if (!item.parents.empty())
-            fail(file.string() + ": sections, such as " + item.parents[0] + ", have no meaning");
+            fail(tr("host.Presets.section", "%FILE%: sections, such as %NAME%, have no meaning",
+                    {{"%FILE%", file.string()}, {"%NAME%", item.parents[0]}}));
         if (std::find(std::begin(kKeys), std::end(kKeys), item.name) == std::end(kKeys)) {
             std::string known;
             for (const char* key : kKeys) known += std::string(known.empty() ? "" : ", ") + key;
-            fail(file.string() + ": " + item.name + " is not a key; known are " + known);
+            fail(tr("host.Presets.key", "%FILE%: %NAME% is not a key; known are %LIST%",
+                    {{"%FILE%", file.string()}, {"%NAME%", item.name}, {"%LIST%", known}}));
         }
-        if (item.inputs.size() != 1) fail(file.string() + ": " + item.name + " takes one value");
+        if (item.inputs.size() != 1)
+            fail(tr("host.Presets.oneValue", "%FILE%: %NAME% takes one value",
+                    {{"%FILE%", file.string()}, {"%NAME%", item.name}}));
         preset.settings.emplace_back(item.name, item.inputs[0]);
     }
-    if (preset.settings.empty()) fail(file.string() + " sets nothing");
+    if (preset.settings.empty())
+        fail(tr("host.Presets.empty", "%FILE% sets nothing", {{"%FILE%", file.string()}}));
     return preset;
 }
 
@@ -103,18 +124,22 @@ SPreset findPreset(const std::string& name) {
     if (const auto file = files.find(name); file != files.end()) return readPreset(file->second);
     std::string known;
     for (const auto& preset : kBuiltIn) {
-        if (name == preset.name) return {preset.settings, preset.purpose, std::string("the preset ") + name};
+        if (name == preset.name)
+            return {preset.settings, tr(preset.key, preset.purpose),
+                    tr("host.Presets.preset", "the preset %NAME%", {{"%NAME%", name}})};
         known += std::string(known.empty() ? "" : ", ") + preset.name;
     }
     for (const auto& [own, file] : files) known += ", " + own;
-    fail("there is no preset " + name + "; known are " + known);
+    fail(tr("host.Presets.unknown", "there is no preset %NAME%; known are %LIST%",
+            {{"%NAME%", name}, {"%LIST%", known}}));
 }
 
 void listPresets() {
     const auto files = listFiles();
     for (const auto& preset : kBuiltIn)
         if (files.count(preset.name) == 0)
-            std::printf("%-12s %s: %s\n", preset.name, preset.purpose, join(preset.settings).c_str());
+            std::printf("%-12s %s: %s\n", preset.name, tr(preset.key, preset.purpose).c_str(),
+                        join(preset.settings).c_str());
     for (const auto& [name, file] : files) std::printf("%-12s %s\n", name.c_str(), file.c_str());
     std::fflush(stdout);
     throw CLI::Success();
@@ -123,9 +148,12 @@ void listPresets() {
 } // namespace
 
 void addPresets(CLI::App& command) {
-    command.add_option("--preset", "Options by name, such as podcast; others on the command line win")
+    command.add_option("--preset")
+        ->description(tr("host.help.convert.preset",
+                         "Options by name, such as podcast; others on the command line win"))
         ->option_text("NAME");
-    command.add_flag_callback("--list-presets", listPresets, "List the presets and end");
+    command.add_flag_callback("--list-presets", listPresets,
+                              tr("host.help.convert.listPresets", "List the presets and end"));
 }
 
 void applyPreset(CLI::App& command) {
@@ -144,7 +172,8 @@ void applyPreset(CLI::App& command) {
         if (!std::exchange(seen[key], true)) {
             if (isSet(key)) continue;
         } else {
-            fail(preset.origin + ": " + key + " is set twice");
+            fail(tr("host.Presets.twice", "%ORIGIN%: %NAME% is set twice",
+                    {{"%ORIGIN%", preset.origin}, {"%NAME%", key}}));
         }
         if ((isCompression(key) && ownCompression) || (key == "to" && namesFile)) continue;
         try {
@@ -154,9 +183,13 @@ void applyPreset(CLI::App& command) {
         }
     }
     const auto has = [&](const char* key) { return seen.count(key) > 0; };
-    if (has("quality") && has("bitrate")) fail(preset.origin + ": quality and bitrate exclude each other");
+    if (has("quality") && has("bitrate"))
+        fail(tr("host.Presets.exclusive", "%ORIGIN%: quality and bitrate exclude each other",
+                {{"%ORIGIN%", preset.origin}}));
     for (const char* limit : {"min-bitrate", "max-bitrate"})
-        if (has(limit) && !has("bitrate")) fail(preset.origin + ": " + limit + " needs bitrate");
+        if (has(limit) && !has("bitrate"))
+            fail(tr("host.Presets.needsBitrate", "%ORIGIN%: %NAME% needs bitrate",
+                    {{"%ORIGIN%", preset.origin}, {"%NAME%", limit}}));
 }
 
 } // namespace host

@@ -1,27 +1,33 @@
 #include "arguments/Shared.h"
 
+#include "base/Translation.h"
+
 #include <cmath>
 #include <cstdlib>
 
 namespace host {
 
 std::string isNumber(const std::string& text) {
-    return std::isnan(std::strtod(text.c_str(), nullptr)) ? "is not a number" : "";
+    return std::isnan(std::strtod(text.c_str(), nullptr))
+               ? tr("host.arguments.isNotANumber", "is not a number")
+               : "";
 }
 
 std::string toWholeNumber(std::string& text, const std::string& unit) {
     char* end = nullptr;
     double number = std::strtod(text.c_str(), &end);
     std::string rest = CLI::detail::to_lower(CLI::detail::trim_copy(end));
-    if (end == text.c_str() || !std::isfinite(number)) return text + " is not a number";
+    if (end == text.c_str() || !std::isfinite(number))
+        return tr("host.arguments.notANumber", "%TEXT% is not a number", {{"%TEXT%", text}});
     if (rest.ends_with(unit)) rest.resize(rest.size() - unit.size());
     if (rest == "k")
         number *= 1000;
     else if (!rest.empty())
-        return text + " has an unknown unit";
+        return tr("host.arguments.unit", "%TEXT% has an unknown unit", {{"%TEXT%", text}});
     // The product of a decimal fraction may miss the whole number by a rounding error.
     const double whole = std::round(number);
-    if (std::abs(number - whole) > 1e-6 || std::abs(whole) > 1e9) return text + " is not a whole number";
+    if (std::abs(number - whole) > 1e-6 || std::abs(whole) > 1e9)
+        return tr("host.arguments.notWhole", "%TEXT% is not a whole number", {{"%TEXT%", text}});
     text = std::to_string(static_cast<long>(whole));
     return "";
 }
@@ -37,45 +43,53 @@ std::string isBitRate(const std::string& text) {
     const long bitRate = std::strtol(text.c_str(), nullptr, 10);
     if (bitRate >= 1000 && bitRate <= 100'000'000) return "";
     if (bitRate > 0 && bitRate < 1000)
-        return text + " bits per second are too few; " + text + "k means " + text + "000";
-    return text + " is not between 1k and 100000k";
+        return tr("host.arguments.fewBits", "%TEXT% bits per second are too few; %TEXT%k means %TEXT%000",
+                  {{"%TEXT%", text}});
+    return tr("host.arguments.bitRate", "%TEXT% is not between 1k and 100000k", {{"%TEXT%", text}});
 }
 
 } // namespace
 
 void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& widths) {
-    command.add_option("--rate", options.rate, "Sample rate, such as 48000 or 44.1k")
+    command.add_option("--rate", options.rate, tr("host.help.rate", "Sample rate, such as 48000 or 44.1k"))
         ->option_text("HZ")
         ->transform(numberOf("hz"))
         ->check(CLI::Range(1, 768000));
-    command.add_option("--channels", options.channels, "Number of channels")
+    command.add_option("--channels", options.channels, tr("host.help.channels", "Number of channels"))
         ->option_text("N")
         ->check(CLI::Range(1, 32));
     command
         .add_option("--bits", options.bits,
-                    widths.size() == 1   ? "Bits per sample: 16"
-                    : widths.size() == 4 ? "Bits per sample: 8, 16, 24 or 32"
-                                         : "Bits per sample: 8, 16 or 24")
+                    widths.size() == 1   ? tr("host.help.bits16", "Bits per sample: 16")
+                    : widths.size() == 4 ? tr("host.help.bits32", "Bits per sample: 8, 16, 24 or 32")
+                                         : tr("host.help.bits24", "Bits per sample: 8, 16 or 24"))
         ->option_text("N")
         ->check(CLI::IsMember(widths));
     auto* quality =
         command
             .add_option("--quality", options.quality,
-                        "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression")
+                        tr("host.help.quality",
+                           "Quality from 0.0 (small) to 1.0 (best); FLAC: 1.0 is the best compression"))
             ->option_text("Q")
             ->check(CLI::Range(0.0, 1.0))
             ->check(isNumber);
-    auto* bitRate = command.add_option("--bitrate", options.bitRate, "Bits per second, such as 192k")
+    auto* bitRate = command
+                        .add_option("--bitrate", options.bitRate,
+                                    tr("host.help.bitrate", "Bits per second, such as 192k"))
                         ->option_text("N")
                         ->transform(numberOf("bit/s"))
                         ->check(isBitRate)
                         ->excludes(quality);
-    command.add_option("--min-bitrate", options.minBitRate, "Minimum bits per second")
+    command
+        .add_option("--min-bitrate", options.minBitRate,
+                    tr("host.help.minBitrate", "Minimum bits per second"))
         ->option_text("N")
         ->transform(numberOf("bit/s"))
         ->check(isBitRate)
         ->needs(bitRate);
-    command.add_option("--max-bitrate", options.maxBitRate, "Maximum bits per second")
+    command
+        .add_option("--max-bitrate", options.maxBitRate,
+                    tr("host.help.maxBitrate", "Maximum bits per second"))
         ->option_text("N")
         ->transform(numberOf("bit/s"))
         ->check(isBitRate)
@@ -84,9 +98,11 @@ void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& 
 
 void checkBitRates(const SFormatOptions& options) {
     if (options.minBitRate > options.bitRate)
-        throw CLI::ValidationError("--min-bitrate", "is greater than --bitrate");
+        throw CLI::ValidationError("--min-bitrate",
+                                   tr("host.arguments.aboveBitrate", "is greater than --bitrate"));
     if (options.maxBitRate > 0 && options.maxBitRate < options.bitRate)
-        throw CLI::ValidationError("--max-bitrate", "is less than --bitrate");
+        throw CLI::ValidationError("--max-bitrate",
+                                   tr("host.arguments.belowBitrate", "is less than --bitrate"));
 }
 
 void addBoxed(CLI::App& app, std::string& plugins) {
@@ -102,10 +118,10 @@ void addBoxed(CLI::App& app, std::string& plugins) {
 
 void addOutput(CLI::App& command, EOutput& show) {
     auto* json = command.add_flag_callback(
-        "--json", [&] { show = EOutput::json; }, "Print events as JSON, one per line");
+        "--json", [&] { show = EOutput::json; }, tr("host.help.json", "Print events as JSON, one per line"));
     command
         .add_flag_callback(
-            "-q,--quiet", [&] { show = EOutput::quiet; }, "Print failures only")
+            "-q,--quiet", [&] { show = EOutput::quiet; }, tr("host.help.quiet", "Print failures only"))
         ->excludes(json);
 }
 
