@@ -5,7 +5,6 @@
 #include <gmock/gmock.h>
 
 #include <atomic>
-#include <random>
 #include <thread>
 
 namespace {
@@ -173,13 +172,12 @@ TEST_F(LanguageManager, LeavesOutDamagedFiles) {
     EXPECT_TRUE(isLogged(lines->take()));
     EXPECT_EQ(get("a"), "default");
 
-    std::mt19937 random(1);
-    for (int i = 0; i < 200; ++i) {
-        std::string bytes = good;
-        for (int flips = 0; flips < 1 + i % 3; ++flips)
-            bytes[random() % bytes.size()] ^= static_cast<char>(1 << random() % 8);
-        load(bytes);
-    }
+    for (size_t i = 0; i < good.size(); ++i)
+        for (const char flip : {'\x01', '\xFF'}) {
+            std::string bytes = good;
+            bytes[i] ^= flip;
+            load(bytes);
+        }
 }
 
 // The texts are looked up while they are replaced: every message is whole, in one language or another.
