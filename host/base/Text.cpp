@@ -14,6 +14,7 @@
 #include <cwchar>
 #include <locale.h>
 #include <memory>
+#include <sstream>
 #include <stdexcept>
 
 namespace host {
@@ -143,7 +144,25 @@ void replaceAll(std::string& text, const std::string& what, const std::string& w
         text.replace(at, what.size(), with);
 }
 
+namespace {
+
+// A report of several lines, such as that of a plug-in that has crashed, as one line. The part from the list
+// of calls on is of no use there; the log has all of it.
+std::string toOneLine(const std::string& message) {
+    if (message.find('\n') == std::string::npos) return message;
+    std::string line, result;
+    for (std::istringstream lines(message); std::getline(lines, line) && !line.starts_with("Calls, ");) {
+        if (line.empty()) continue;
+        if (!result.empty()) result += result.back() == ':' ? " " : ", ";
+        result += line;
+    }
+    return result;
+}
+
+} // namespace
+
 std::string asReason(std::string message, const std::filesystem::path& about) {
+    message = toOneLine(message);
     const std::filesystem::path absolute = std::filesystem::absolute(about);
     for (const std::string& name : {absolute.lexically_normal().native(), absolute.native()}) {
         if (message.starts_with(name + ": ")) message.erase(0, name.size() + 2);

@@ -2,6 +2,10 @@
 
 #include <gmock/gmock.h>
 
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+
 using namespace tests;
 
 namespace {
@@ -36,6 +40,27 @@ TEST_F(BoxedOption, List_NamesThePlugins) {
     EXPECT_TRUE(isBoxed({}, "all")) << "by the environment";
     EXPECT_FALSE(isBoxed({"--boxed=none"}, "all")) << "the option precedes it";
     EXPECT_EQ(list(), (std::set<std::string>{"in.wav", "short.flac"})) << "nothing unfinished is left";
+}
+
+// A slave that dies ends the job with a reason in one line and without an output.
+TEST_F(BoxedOption, DeadSlave_IsAFailureOfTheFile) {
+    write("long.wav", makeTone(44100, 2, 16, 60));
+    CProcess job({kProgram, "--boxed=flac", "convert", "long.wav", "-o", "out.flac"}, folder.path());
+    for (int i = 0; i < 3000 && job.isRunning(); ++i) {
+        for (const auto& thread :
+             std::filesystem::directory_iterator("/proc/" + std::to_string(job.getId()) + "/task")) {
+            std::ifstream children(thread.path() / "children");
+            for (pid_t child; children >> child;)
+                if (readFile("/proc/" + std::to_string(child) + "/comm") == "sonora2_slave\n")
+                    ::kill(child, SIGKILL);
+        }
+        ::usleep(10'000);
+    }
+    const SProcessResult result = job.wait();
+    EXPECT_EQ(1, result.exitCode);
+    EXPECT_THAT(result.err, testing::StartsWith("tonewright: long.wav: "));
+    EXPECT_EQ(1, std::count(result.err.begin(), result.err.end(), '\n')) << result.err;
+    EXPECT_EQ(list(), (std::set<std::string>{"in.wav", "long.wav"}));
 }
 
 } // namespace
