@@ -68,7 +68,8 @@ std::set<std::string> findAddedPlugins() {
 }
 
 // TONEWRIGHT_BOXED lists further plug-ins that run in a process of their own, "all", or "none".
-// TONEWRIGHT_BOXED_DEADLINE is the number of milliseconds after which such a process counts as hanging.
+// TONEWRIGHT_BOXED_DEADLINE is the number of milliseconds after which such a process counts as hanging,
+// TONEWRIGHT_BOXED_MEMORY the number of MiB that it may use.
 void setBoxedPlugins(ISonoraContext& context) {
     using namespace sonora2::common;
     const auto set = [&](const char* parameter, const std::string& value) {
@@ -80,6 +81,7 @@ void setBoxedPlugins(ISonoraContext& context) {
         set(kBoxedPluginsParameter, list.empty() ? kBoxedPlugins : list + "," + kBoxedPlugins);
     if (const char* deadline = std::getenv("TONEWRIGHT_BOXED_DEADLINE"))
         set(kBoxedDeadlineParameter, deadline);
+    if (const char* memory = std::getenv("TONEWRIGHT_BOXED_MEMORY")) set(kBoxedMemoryParameter, memory);
 }
 
 bool fail(const char* text) {
