@@ -21,7 +21,6 @@
 #include <filesystem>
 #include <fstream>
 #include <functional>
-#include <sstream>
 #include <thread>
 
 namespace sonora2::common {
@@ -36,6 +35,7 @@ constexpr int kOpenTries = 10;
 constexpr uint32_t kOpenPause = 500;  // milliseconds between tries
 constexpr uint32_t kEndWait = 2'000;  // milliseconds for a process whose pipe is closed
 constexpr uint32_t kKillWait = 5'000; // milliseconds for one that was killed
+constexpr size_t kMostReport = 1 << 20;
 constexpr char kErrorStart[] = "Error: ";
 constexpr int kFirstSignal = 128; // exit codes above it are signals
 
@@ -199,12 +199,13 @@ P<IString> CSlaveHandler::readCrashLog() {
         if (i > 0) peru::getThreadManager()->sleep(kOpenPause);
         std::ifstream file(path);
         if (!file) continue;
-        std::ostringstream text;
-        text << file.rdbuf();
+        std::string text(kMostReport, '\0'); // the slave may have written without end
+        file.read(text.data(), static_cast<std::streamsize>(text.size()));
+        text.resize(static_cast<size_t>(file.gcount()));
         file.close();
         std::filesystem::remove(path, error);
         return CString::fromUTF8("CSonoraPluginBoxed::checkForSlaveError: Error in sonora2_slave:\n\n" +
-                                 text.str());
+                                 text);
     }
     return CString::fromUTF8(
         "CSonoraPluginBoxed::checkForSlaveError: crash in slave, but errorfile could not be opened!" + path);
