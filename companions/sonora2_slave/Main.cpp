@@ -15,6 +15,7 @@
 #include <fcntl.h>
 #include <poll.h>
 #include <sys/eventfd.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
@@ -80,7 +81,9 @@ private:
 
 // Opened now, since the crash handler should not depend on what the process may do later.
 int openCrashLog(const std::string& path) {
-    return ::open(path.c_str(), O_WRONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK);
+    const int file = ::open(path.c_str(), O_WRONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK);
+    if (file >= 0) ::flock(file, LOCK_EX | LOCK_NB); // the file is in use
+    return file;
 }
 
 void installCrashHandler([[maybe_unused]] int file) {

@@ -12,8 +12,12 @@ namespace sonora2::common {
 using peru::P;
 
 // Creates an empty file with a new name, "sonora2_slave_..._log", that only this user can access. Returns its
-// path, or an empty text if the folder cannot be written.
+// path, or an empty text if the folder cannot be written. The first call for a folder removes the empty files
+// there of hosts that were killed: their slaves ended without being able to remove anything.
 SONORA2_API std::string createCrashLog(const std::string& folder);
+// Removes this user's empty crash logs in the folder that are older than a minute and not locked. A slave
+// holds a lock on its own.
+SONORA2_API void removeStaleCrashLogs(const std::string& folder) noexcept;
 
 // The file that a format in a slave creates. If the slave dies, nobody else can remove it.
 class SONORA2_API CUnfinishedOutput {

@@ -5,7 +5,13 @@
 #include <cerrno>
 #include <climits>
 #include <cstdlib>
+#include <cstring>
+#include <ctime>
 #include <fcntl.h>
+#include <filesystem>
+#include <mutex>
+#include <set>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -13,6 +19,8 @@ namespace sonora2::common {
 
 namespace {
 
+constexpr const char* kPrefix = "sonora2_slave_";
+constexpr const char* kSuffix = "_log";
 constexpr int kMostLinks = 40;
 
 // The path at the end of symbolic links, which need not exist.
@@ -29,12 +37,36 @@ std::string followLinks(std::string path) {
 
 } // namespace
 
+void removeStaleCrashLogs(const std::string& folder) noexcept {
+    constexpr time_t kLongEnough = 60; // seconds until a slave has locked its file
+    std::error_code error;
+    // The increment of a range-based loop would throw.
+    for (std::filesystem::directory_iterator entry(folder, error), end; !error && entry != end;
+         entry.increment(error)) {
+        const std::string name = entry->path().filename().string();
+        if (!name.starts_with(kPrefix) || !name.ends_with(kSuffix)) continue;
+        const int file = ::open(entry->path().c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK);
+        if (file < 0) continue;
+        struct stat status {};
+        if (::fstat(file, &status) == 0 && S_ISREG(status.st_mode) && status.st_uid == ::geteuid() &&
+            status.st_size == 0 && std::time(nullptr) - status.st_mtime > kLongEnough &&
+            ::flock(file, LOCK_EX | LOCK_NB) == 0)
+            ::unlink(entry->path().c_str());
+        ::close(file);
+    }
+}
+
 std::string createCrashLog(const std::string& folder) {
-    constexpr char kSuffix[] = "_log";
+    {
+        static std::mutex s_mutex;
+        static std::set<std::string> s_cleaned;
+        const std::scoped_lock lock(s_mutex);
+        if (s_cleaned.insert(folder).second) removeStaleCrashLogs(folder);
+    }
     std::string path = folder;
     if (path.empty() || path.back() != '/') path += '/';
-    path.append("sonora2_slave_XXXXXX").append(kSuffix);
-    const int file = ::mkostemps(path.data(), sizeof kSuffix - 1, O_CLOEXEC);
+    path.append(kPrefix).append("XXXXXX").append(kSuffix);
+    const int file = ::mkostemps(path.data(), static_cast<int>(std::strlen(kSuffix)), O_CLOEXEC);
     if (file < 0) return {};
     ::close(file);
     return path;
