@@ -10,6 +10,7 @@
 namespace {
 
 using namespace tests;
+using testing::AnyOf;
 using testing::HasSubstr;
 using testing::Not;
 
@@ -83,8 +84,10 @@ TEST_F(Boxed, ExceptionsCrossWithTheirText) {
 
 TEST_F(Boxed, HangsEndAtTheDeadline) {
     setDeadline(1'000);
-    EXPECT_THAT(decode("hang@getNextAudioChunk.faulty"), HasSubstr("does not respond"));
-    EXPECT_THAT(encode(m_out / "hang@close.faulty"), HasSubstr("does not respond"));
+    // The second one if the machine is so busy that the slave has not even started.
+    const auto isTimeout = AnyOf(HasSubstr("does not respond"), HasSubstr("Client connection disappeared"));
+    EXPECT_THAT(decode("hang@getNextAudioChunk.faulty"), isTimeout);
+    EXPECT_THAT(encode(m_out / "hang@close.faulty"), isTimeout);
     EXPECT_EQ(countEntries(m_out.path()), 0u);
     setDeadline(30'000);
     expectHealthy();

@@ -3,7 +3,9 @@
 
 #include <atomic>
 #include <csignal>
+#include <fcntl.h>
 #include <random>
+#include <sys/file.h>
 #include <unistd.h>
 
 namespace {
@@ -32,7 +34,10 @@ private:
         std::mt19937 random(seed);
         while (!m_stop) {
             const std::vector<pid_t> children = listChildren(::getpid());
-            if (children.empty()) continue;
+            if (children.empty()) {
+                std::this_thread::sleep_for(std::chrono::milliseconds(1));
+                continue;
+            }
             std::this_thread::sleep_for(std::chrono::microseconds(random() % 40'000));
             for (const pid_t child : children) ::kill(child, SIGKILL);
             while (!m_stop && listChildren(::getpid()) == children) std::this_thread::yield();
@@ -89,4 +94,20 @@ TEST_F(Boxed, SlavesEndWithTheirHost) {
         const std::string name = readFile("/proc/" + std::to_string(slaves[0]) + "/comm");
         return name.find("sonora2_slave") == std::string::npos;
     }));
+}
+
+TEST_F(Boxed, CrashLogsOfKilledHostsAreRemovedByTheNext) {
+    namespace fs = std::filesystem;
+    const auto old = fs::file_time_type::clock::now() - std::chrono::hours(1);
+    const auto stale = m_temporary.write("sonora2_slave_aaaaaa_log", "");
+    const auto locked = m_temporary.write("sonora2_slave_bbbbbb_log", "");
+    const auto report = m_temporary.write("sonora2_slave_cccccc_log", "a crash");
+    const auto fresh = m_temporary.write("sonora2_slave_dddddd_log", "");
+    for (const auto& file : {stale, locked, report}) fs::last_write_time(file, old);
+    const int lock = ::open(locked.c_str(), O_WRONLY | O_CLOEXEC);
+    ASSERT_EQ(::flock(lock, LOCK_EX | LOCK_NB), 0);
+    EXPECT_EQ(decode("healthy.faulty"), "");
+    EXPECT_FALSE(fs::exists(stale));
+    EXPECT_TRUE(fs::exists(locked) && fs::exists(report) && fs::exists(fresh));
+    ::close(lock);
 }
