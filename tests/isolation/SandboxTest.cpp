@@ -11,10 +11,13 @@
 #include <fcntl.h>
 #include <functional>
 #include <iconv.h>
+#include <linux/filter.h>
+#include <linux/seccomp.h>
 #include <sched.h>
 #include <sys/ioctl.h>
 #include <sys/mman.h>
 #include <sys/mount.h>
+#include <sys/prctl.h>
 #include <sys/ptrace.h>
 #include <sys/resource.h>
 #include <sys/socket.h>
@@ -228,6 +231,34 @@ TEST_F(Sandbox, ConfinesThreadsThatAreRunning) {
     ::waitpid(child, &status, 0);
     EXPECT_TRUE(WIFEXITED(status));
     EXPECT_EQ(WEXITSTATUS(status), 6);
+}
+
+// As a kernel without Landlock and filters would.
+TEST_F(Sandbox, ReportsWhatTheKernelLacks) {
+    const pid_t child = ::fork();
+    if (child == 0) {
+        ::alarm(60);
+        sock_filter code[] = {BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
+                              BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_landlock_create_ruleset, 1, 0),
+                              BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_seccomp, 0, 1),
+                              BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS),
+                              BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW)};
+        const sock_fprog program{std::size(code), code};
+        ::prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0);
+        if (::prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) != 0) ::_exit(kEntryFailed);
+        try {
+            const std::vector<std::string> lacking = enterSandbox(reading());
+            rlimit limit{};
+            ::getrlimit(RLIMIT_CORE, &limit);
+            ::_exit(static_cast<int>(lacking.size()) + (limit.rlim_max == 0 ? 0 : 100));
+        } catch (const std::exception&) {
+            ::_exit(kEntryFailed);
+        }
+    }
+    int status = 0;
+    ::waitpid(child, &status, 0);
+    EXPECT_TRUE(WIFEXITED(status));
+    EXPECT_EQ(WEXITSTATUS(status), 2);
 }
 
 TEST_F(Sandbox, LimitsMemoryDescriptorsAndCoreDumps) {

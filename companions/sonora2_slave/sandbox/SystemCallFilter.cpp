@@ -60,7 +60,8 @@ public:
     CFilter() : m_context(::seccomp_init(SCMP_ACT_ALLOW), &::seccomp_release) {
         if (!m_context) throw std::bad_alloc();
         set(SCMP_FLTATR_ACT_BADARCH, SCMP_ACT_ERRNO(EPERM)); // calls with the numbers of another architecture
-        set(SCMP_FLTATR_CTL_TSYNC, 1);
+        set(SCMP_FLTATR_API_SYSRAWRC, 1);                    // the kernel's own error codes
+        m_hasThreads = ::seccomp_attr_set(m_context.get(), SCMP_FLTATR_CTL_TSYNC, 1) == 0;
         // A search tree instead of a list. Older versions of the library lack it.
         static_cast<void>(::seccomp_attr_set(m_context.get(), SCMP_FLTATR_CTL_OPTIMIZE, 2));
     }
@@ -74,7 +75,9 @@ public:
               name);
     }
 
+    // False if the kernel has no filters, or none for all threads at once.
     bool load() {
+        if (!m_hasThreads) return false;
         const int result = ::seccomp_load(m_context.get());
         if (result == -EINVAL || result == -ENOSYS || result == -EOPNOTSUPP) return false;
         check(result, "seccomp_load");
@@ -90,6 +93,7 @@ private:
     }
 
     std::unique_ptr<void, decltype(&::seccomp_release)> m_context;
+    bool m_hasThreads = false;
 };
 
 // Threads of this process are the only ones that may be made, and signals go to this process only.
