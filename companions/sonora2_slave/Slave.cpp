@@ -17,8 +17,10 @@
 
 #include <cstdlib>
 #include <cstring>
+#include <fcntl.h>
 #include <filesystem>
 #include <limits>
+#include <unistd.h>
 
 namespace slave {
 
@@ -30,6 +32,16 @@ namespace {
 
 constexpr const char* kSandboxVariable = "TONEWRIGHT_BOXED_SANDBOX"; // "none": for debugging
 constexpr int kPollInterval = 100; // milliseconds; data wakes the thread earlier
+
+// The host's input and output may carry media or keystrokes. What a plug-in prints is a message. A target may
+// be
+// "/dev/stdout".
+void redirectStandardFiles(bool isWritten) {
+    const int nothing = ::open("/dev/null", O_RDONLY | O_CLOEXEC);
+    if (nothing >= 0) ::dup2(nothing, STDIN_FILENO);
+    if (nothing >= 0) ::close(nothing);
+    if (!isWritten) ::dup2(STDERR_FILENO, STDOUT_FILENO);
+}
 
 std::string toPath(const P<peru::IURI>& file) {
     return CString::toStdString(peru::getPathes()->toPlatformPath(file));
@@ -119,6 +131,7 @@ void CSlave::beforeMedia(const P<peru::IURI>& medium, bool isWritten) {
 
 // For good: a slave that is asked for a second medium cannot open it.
 void CSlave::confine(const P<peru::IURI>& medium, bool isWritten) {
+    redirectStandardFiles(isWritten);
     const char* mode = std::getenv(kSandboxVariable);
     if (!mode || std::strcmp(mode, "none") != 0) {
         SSandbox sandbox = isWritten ? allowWriting(toPath(medium)) : allowReading(toPath(medium));
