@@ -36,7 +36,7 @@ public:
 private:
     void floodLog() const {
         const P<peru::IString> line = peru::CString::fromUTF8(std::string(1000, 'x'));
-        for (int i = 0; m_log && i < 100'000; ++i) m_log->log(sonora2::common::kSeverityError, line);
+        for (int i = 0; m_log && i < 20'000; ++i) m_log->log(sonora2::common::kSeverityError, line);
     }
 
     P<ILogManager> m_log;
