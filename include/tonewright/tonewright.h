@@ -107,8 +107,9 @@ static inline size_t TONEWRIGHT_GetTextLength(TONEWRIGHT_Handle handle) {
 
 /* --- Callbacks ----------------------------------------------------------------------------------- */
 
-/* A drive changed: the disc library's drive handle and the event (1 medium inserted, 2 medium did not become
- * ready, 3 medium ready, 4 medium removed). Called on the drive watcher's thread. */
+/* A drive changed: the disc library's drive handle (a DISCIO_Drive of tonewright/discio2.h, valid during the
+ * call) and the event (1 medium inserted, 2 medium did not become ready within 30 seconds, 3 medium ready, 4
+ * medium removed). Called on the drive watcher's thread. */
 typedef void (*TONEWRIGHT_DriveChangedCallback)(void* driveHandle, int32_t event);
 
 /* Progress of a player: duration and position in seconds (0.0 once stopped) and a TONEWRIGHT_PlayerState.
@@ -181,8 +182,8 @@ TONEWRIGHT_API void TONEWRIGHT_SetLanguageID(const char16_t* language);
  * `buffer` is ignored. */
 TONEWRIGHT_API void TONEWRIGHT_fillFeatures(void* buffer);
 
-/* Creates the disc library, once, and passes `flag` to it. Required before drives and discs are used. A build
- * without a disc library logs a line and does nothing. */
+/* Creates the disc library, once, instead of with the first use of a drive or disc. `flag` has no effect. Throws
+ * a C++ exception if the library is missing. */
 TONEWRIGHT_API void TONEWRIGHT_InitDiscio(uint8_t flag);
 
 /* Sets the suffix of the temporary names that a host gives to output files until they are complete, such as
@@ -191,7 +192,9 @@ TONEWRIGHT_API void TONEWRIGHT_InitDiscio(uint8_t flag);
  * while another thread creates formats or tags. */
 TONEWRIGHT_API void TONEWRIGHT_SetTempExtension(const char16_t* extension);
 
-/* Starts watching the optical drives; null stops it. The callback must stay valid until then. */
+/* Starts watching the optical drives and the folders in TONEWRIGHT_DRIVE_FOLDERS; null stops it. The callback
+ * must stay valid until then. A drive that is connected later is not found before the next start of the
+ * library. Call it on one thread at a time. */
 TONEWRIGHT_API void TONEWRIGHT_SetDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback);
 
 /* Adds the host's own log, a handle of a peru::ILogManager, which receives every message from now on. The

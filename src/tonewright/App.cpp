@@ -1,5 +1,6 @@
 #include "tonewright/App.h"
 
+#include "disciopp/LazyLibrary.h"
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
 #include "peru/log/ILog.h"
@@ -154,7 +155,30 @@ P<ISonoraContext> CApp::makeContext(uint64_t flags, std::span<const char* const>
     return context;
 }
 
+void CApp::setDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback) {
+    m_driveChanged = callback;
+    if (!m_driveManager) {
+        if (!callback) return;
+        m_driveManager = disciopp::getLibrary()->getDriveManager();
+    }
+    if (!callback) {
+        m_driveManager->removeListener(this);
+        return;
+    }
+    m_driveManager->start();
+    m_driveManager->addListener(this);
+}
+
+void CApp::driveChanged(const P<disciopp::IDrive>& drive, int event) {
+    if (const TONEWRIGHT_DriveChangedCallback callback = m_driveChanged) callback(drive->getHandle(), event);
+}
+
 void CApp::shutdown() {
+    if (m_driveManager) {
+        m_driveManager->removeListener(this);
+        m_driveManager->stop();
+        m_driveManager.reset();
+    }
     m_driveChanged = nullptr;
     sonora2::common::setMediaEnvironment({});
     m_readPluginHandler.reset();

@@ -1,6 +1,7 @@
 // The application object, the state that the exports share.
 #pragma once
 
+#include "disciopp/IDrive.h"
 #include "peru/threads/IMutex.h"
 #include "peru/uri/IURI.h"
 #include "sonora2/context/ISonoraContext.h"
@@ -25,7 +26,7 @@ static_assert(sizeof(SFeatures) == 9);
 
 // A singleton of the global object factory. init and shutdown must not run concurrently with anything else;
 // between them all operations are thread-safe unless stated otherwise.
-class CApp : public peru::CObject {
+class CApp : public peru::CObject, public disciopp::IDriveManagerListener {
 public:
     static P<CApp> get();
 
@@ -53,7 +54,9 @@ public:
     void setUserDataPath(const P<peru::IString>& path) { m_userDataPath = path; }
     P<peru::IString> getUserDataPath() const { return m_userDataPath; }
 
-    void setDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback) { m_driveChanged = callback; }
+    // Starts or, for null, ends the watching of the drives. Loads the disc library.
+    void setDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback);
+    void driveChanged(const P<disciopp::IDrive>& drive, int event) override;
 
 protected:
     CApp();
@@ -80,6 +83,7 @@ private:
     P<peru::IURI> m_programFolder;
     P<peru::IURI> m_productDataFolder;
     std::atomic<TONEWRIGHT_DriveChangedCallback> m_driveChanged{nullptr};
+    P<disciopp::IDriveManager> m_driveManager; // fetched on first need
     P<cap::CCancelAutoplay2> m_cancelAutoplay; // created last, so it marks a complete init
 };
 

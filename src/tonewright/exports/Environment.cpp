@@ -1,3 +1,4 @@
+#include "disciopp/LazyLibrary.h"
 #include "peru/log/ILog.h"
 #include "sonora2/plugins/PluginExtensions.h"
 #include "tonewright/exports/AppReference.h"
@@ -9,8 +10,9 @@ using namespace tonewright;
 using namespace tonewright::exports;
 using sonora2::common::IPluginExtensions;
 
+// Without a barrier: a host learns from the exception why there are no discs.
 void TONEWRIGHT_InitDiscio(uint8_t /*flag*/) {
-    logNotAvailable("TONEWRIGHT_InitDiscio");
+    disciopp::getLibrary()->createDiscio();
 }
 
 void TONEWRIGHT_SetTempExtension(const char16_t* extension) {
@@ -21,10 +23,7 @@ void TONEWRIGHT_SetTempExtension(const char16_t* extension) {
 }
 
 void TONEWRIGHT_SetDriveChangedCallback(TONEWRIGHT_DriveChangedCallback callback) {
-    barrier([&] {
-        requireApp()->setDriveChangedCallback(callback);
-        if (callback) logNotAvailable("TONEWRIGHT_SetDriveChangedCallback");
-    });
+    barrier([&] { requireApp()->setDriveChangedCallback(callback); });
 }
 
 void TONEWRIGHT_AddProxyLogManager(TONEWRIGHT_Handle log) {

@@ -1,0 +1,54 @@
+#include "sonora2_discio/TrackDecoder.h"
+
+#include "disciopp/LazyLibrary.h"
+
+namespace sonora2::plugins::discio {
+
+CTrackDecoder::~CTrackDecoder() {
+    close();
+}
+
+void CTrackDecoder::require(int32_t result) const {
+    if (result == 1) return;
+    try {
+        m_track->throwFailure();
+    } catch (const peru::CException& error) {
+        fail("could not read %s: %s", m_file.getDisplayName(), error.getDescription());
+    }
+}
+
+// The track is looked up each time: there may be another disc in the drive by now.
+SDecodedMedia CTrackDecoder::open(const SDecoderOptions&) {
+    close();
+    try {
+        m_track = disciopp::getLibrary()->openTrack(m_file.uri);
+    } catch (const peru::CException& error) {
+        fail("could not open %s: %s", m_file.getDisplayName(), error.getDescription());
+    }
+    const DISCIO_PCMAudioStream& stream = m_track->get();
+    require(stream.funcs->open(stream.user));
+    const SPcmFormat format{stream.funcs->getSampleRate(stream.user),
+                            stream.funcs->getChannelCount(stream.user), 2};
+    return {format, stream.funcs->getFrameCount(stream.user), "CD audio"};
+}
+
+void CTrackDecoder::close() {
+    if (!m_track) return;
+    const DISCIO_PCMAudioStream& stream = m_track->get();
+    stream.funcs->close(stream.user);
+    m_track.reset();
+}
+
+int CTrackDecoder::read(uint8_t* pcm, int frames) {
+    const DISCIO_PCMAudioStream& stream = m_track->get();
+    int32_t delivered = 0;
+    require(stream.funcs->read(stream.user, pcm, frames, &delivered));
+    return delivered;
+}
+
+void CTrackDecoder::seek(int64_t frame) {
+    const DISCIO_PCMAudioStream& stream = m_track->get();
+    require(stream.funcs->seek(stream.user, frame));
+}
+
+} // namespace sonora2::plugins::discio
