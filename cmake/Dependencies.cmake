@@ -16,6 +16,7 @@ pkg_check_modules(SECCOMP REQUIRED IMPORTED_TARGET libseccomp)
 pkg_check_modules(AV REQUIRED IMPORTED_TARGET libavformat libavcodec libswscale libswresample libavutil)
 pkg_check_modules(CDIO REQUIRED IMPORTED_TARGET libcdio libiso9660 libudf libcdio_paranoia libcdio_cdda)
 pkg_check_modules(UDEV REQUIRED IMPORTED_TARGET libudev)
+pkg_check_modules(EBUR128 REQUIRED IMPORTED_TARGET libebur128)
 
 find_path(LAME_INCLUDE_DIR lame/lame.h REQUIRED)
 find_library(LAME_LIBRARY mp3lame REQUIRED)

@@ -1,0 +1,198 @@
+#include "host/Wav.h"
+#include "support/Process.h"
+#include "support/TempFolder.h"
+
+#include <gtest/gtest.h>
+#include <tonewright/audiotools.h>
+
+#include <functional>
+#include <memory>
+
+namespace {
+
+using namespace tests;
+
+struct SEnd {
+    void operator()(TONEWRIGHT_Analysator* analysator) const { analysator->operations->destroy(analysator); }
+};
+using Analysator = std::unique_ptr<TONEWRIGHT_Analysator, SEnd>;
+
+// Adds the sound in pieces that end within frames.
+Analysator measure(const SSound& sound, int flags = TONEWRIGHT_ANALYSATOR_PEAKS) {
+    Analysator analysator(createLoudnessAnalysator(flags));
+    const auto* operations = analysator->operations;
+    operations->initialise(analysator.get(), sound.channels, sound.bits / 8, sound.rate);
+    for (size_t at = 0, piece = 1; at < sound.samples.size(); at += piece, piece = piece * 5 % 40009 + 1) {
+        const size_t size = std::min(piece, sound.samples.size() - at);
+        operations->analyse(analysator.get(), sound.samples.data() + at, static_cast<int64_t>(size));
+    }
+    return analysator;
+}
+
+double resultOf(const Analysator& analysator) {
+    return analysator->operations->result(analysator.get());
+}
+
+double truePeakOf(const Analysator& analysator) {
+    double peak = 0.0;
+    EXPECT_EQ(getAnalysatorPeaks(analysator.get(), nullptr, &peak), 1);
+    return 20 * std::log10(peak);
+}
+
+SSound make(int rate, int channels, int bits, double seconds,
+            const std::function<double(double time, int channel)>& curve) {
+    SSound sound{rate, channels, bits, {}};
+    const size_t width = static_cast<size_t>(bits / 8);
+    for (int frame = 0; frame < seconds * rate; ++frame)
+        for (int channel = 0; channel < channels; ++channel) {
+            const double level = std::clamp(curve(static_cast<double>(frame) / rate, channel), -1.0, 1.0);
+            auto value = static_cast<uint32_t>(static_cast<int32_t>(std::lround(level * 2147483583.0)));
+            if (bits == 8) value ^= 0x80000000;
+            sound.samples.append(reinterpret_cast<const char*>(&value) + 4 - width, width);
+        }
+    return sound;
+}
+
+double decibels(double level) {
+    return std::pow(10.0, level / 20);
+}
+
+double tone(double frequency, double time, double phase = 0) {
+    return std::sin(2 * M_PI * frequency * time + phase * M_PI / 180);
+}
+
+// Sums of tones that come and go as syllables do.
+double speech(double time) {
+    const double syllable = std::max(0.0, tone(2.3, time)) * (std::fmod(time, 3.0) < 2.2 ? 1.0 : 0.0);
+    double sum = 0;
+    for (int i = 1; i <= 8; ++i) sum += tone(140 * i + 20 * tone(0.7, time), time, 50.0 * i) / i;
+    return 0.3 * syllable * sum;
+}
+
+double lastNumber(const std::string& text, const std::string& key) {
+    const size_t at = text.rfind(key);
+    return at == std::string::npos ? NAN : std::atof(text.c_str() + at + key.size());
+}
+
+} // namespace
+
+TEST(Loudness, AgreesWithAnotherProgram) {
+    // Without what is near half the sample rate, where the meters' interpolations differ.
+    std::mt19937 random(1);
+    double first = 0, second = 0;
+    const auto noise = [&](double, int) {
+        first += 0.3 * (static_cast<double>(random()) / 2147483648.0 - 1.0 - first);
+        second += 0.3 * (first - second);
+        return second;
+    };
+    constexpr double kSeconds = 3;
+    // An abrupt end would be a click of all frequencies.
+    const auto faded = [](double time) {
+        return std::clamp(10 * std::min(time, kSeconds - 0.01 - time), 0.0, 1.0);
+    };
+    const std::pair<const char*, SSound> recordings[] = {
+        {"noise", make(44100, 2, 16, kSeconds, noise)},
+        {"noise, mono, 8 bits", make(32000, 1, 8, kSeconds, noise)},
+        {"tones", make(48000, 2, 24, kSeconds,
+                       [&](double t, int c) { return 0.2 * faded(t) * tone(c ? 5000 : 80, t); })},
+        {"high tone",
+         make(96000, 2, 32, kSeconds, [&](double t, int) { return 0.7 * faded(t) * tone(15000, t); })},
+        {"speech", make(44100, 1, 16, kSeconds, [](double t, int) { return speech(t); })},
+        {"speech, telephone", make(8000, 1, 16, kSeconds, [](double t, int) { return speech(t); })},
+        {"silence between",
+         make(44100, 2, 16, kSeconds, [&](double t, int c) { return t > 1 && t < 2 ? 0.0 : noise(t, c); })},
+        {"quiet passage below the gate",
+         make(48000, 2, 24, kSeconds, [&](double t, int c) { return noise(t, c) * (t < 1.5 ? 0.9 : 0.03); })},
+        {"5.1", make(48000, 6, 16, kSeconds,
+                     [&](double t, int c) { return (c == 3 ? 0.9 : 0.15 * (c + 1)) * noise(t, c); })},
+        {"peaks between the samples",
+         make(48000, 2, 16, kSeconds, [&](double t, int) { return 0.99 * faded(t) * tone(12000, t, 45); })},
+        {"clipped", make(44100, 2, 16, kSeconds, [&](double t, int) { return 2 * faded(t) * tone(499, t); })},
+    };
+    const CTempFolder folder;
+    for (const auto& [name, sound] : recordings) {
+        SCOPED_TRACE(name);
+        folder.write("in.wav", toWav(sound));
+        const SProcessResult judge = run(
+            {"ffmpeg", "-hide_banner", "-nostats", "-i", "in.wav", "-af",
+             "ebur128=peak=true:metadata=1,ametadata=mode=print:key=lavfi.r128.I:file=-", "-f", "null", "-"},
+            folder.path());
+        const Analysator analysator = measure(sound);
+        EXPECT_NEAR(resultOf(analysator), lastNumber(judge.out, "lavfi.r128.I="), 0.1);
+        EXPECT_NEAR(truePeakOf(analysator), lastNumber(judge.err, "Peak:"), 0.2);
+    }
+}
+
+// The test signals of EBU Tech 3341 that consist of tones, with its tolerances.
+TEST(Loudness, MeetsTheMinimumRequirements) {
+    struct SPart {
+        double seconds;
+        std::vector<double> levels; // dBFS of each channel
+    };
+    const auto stereo = [](double seconds, double level) { return SPart{seconds, {level, level}}; };
+    const std::vector<SPart> cases[] = {
+        {stereo(20, -23)},
+        {stereo(10, -36), stereo(60, -23), stereo(10, -36)},
+        {stereo(10, -72), stereo(10, -36), stereo(60, -23), stereo(10, -36), stereo(10, -72)},
+        {stereo(20, -26), stereo(20.1, -20), stereo(20, -26)},
+        {{20, {-28, -28, -24, -30, -30}}},
+    };
+    for (const std::vector<SPart>& parts : cases) {
+        SSound sound{48000, static_cast<int>(parts[0].levels.size()), 24, {}};
+        for (const SPart& part : parts) {
+            const std::string period =
+                make(48000, sound.channels, 24, 0.001, [&](double t, int c) {
+                    return decibels(part.levels[static_cast<size_t>(c)]) * tone(1000, t);
+                }).samples;
+            for (int i = 0; i < part.seconds * 1000; ++i) sound.samples += period;
+        }
+        EXPECT_NEAR(resultOf(measure(sound, 0)), -23.0, 0.1);
+    }
+    EXPECT_NEAR(
+        resultOf(measure(make(48000, 2, 24, 3, [](double t, int) { return decibels(-33) * tone(1000, t); }))),
+        -33.0, 0.1);
+
+    const std::vector<std::pair<double, double>> peaks = {{4, 0}, {4, 45}, {6, 60}, {8, 67.5}};
+    for (const auto& [divisor, phase] : peaks) {
+        const double peak = truePeakOf(measure(make(48000, 2, 24, 0.5, [&](double t, int) {
+            return 0.5 * std::min({1.0, t * 20, (0.5 - t) * 20}) * tone(48000 / divisor, t, phase);
+        })));
+        EXPECT_GE(peak, -6.4) << divisor;
+        EXPECT_LE(peak, -5.8) << divisor;
+    }
+}
+
+TEST(Loudness, AlbumsFloatsAndSoundThatCannotBeMeasured) {
+    const auto at = [](double level) {
+        return make(48000, 2, 32, 2, [=](double t, int) { return decibels(level) * tone(1000, t); });
+    };
+    const Analysator loud = measure(at(-20)), quiet = measure(at(-26));
+    TONEWRIGHT_Analysator* const album[] = {loud.get(), quiet.get()};
+    EXPECT_NEAR(getAnalysatorLoudness(album, 2), 10 * std::log10((1 + decibels(-12)) / 2) - 20, 0.1);
+
+    SSound wide = at(6), floats{48000, 2, 32, {}};
+    for (int i = 0; i < 96000; ++i) {
+        const float samples[] = {static_cast<float>(2 * tone(1000, i / 48000.0)), i == 9 ? NAN : 0.0f};
+        floats.samples.append(reinterpret_cast<const char*>(samples), sizeof samples);
+    }
+    const Analysator loudest = measure(floats, TONEWRIGHT_ANALYSATOR_PEAKS | TONEWRIGHT_ANALYSATOR_FLOAT);
+    EXPECT_NEAR(resultOf(loudest), 3.0, 0.1);
+    EXPECT_NEAR(truePeakOf(loudest), 6.02, 0.1);
+
+    EXPECT_EQ(resultOf(measure(make(44100, 2, 16, 1, [](double, int) { return 0.0; }))), -INFINITY);
+    EXPECT_EQ(resultOf(measure({})), -INFINITY);
+    const int formats[][3] = {{0, 2, 44100}, {-1, 2, 44100}, {2, 5, 44100},    {2, 0, 44100},
+                              {2, 2, 0},     {70, 2, 44100}, {2, 2, INT32_MAX}};
+    for (const auto& [channels, bytes, rate] : formats) {
+        const Analysator analysator(createNormalizeAnalysator());
+        analysator->operations->initialise(analysator.get(), channels, bytes, rate);
+        analysator->operations->analyse(analysator.get(), "12345678", 8);
+        EXPECT_TRUE(std::isnan(resultOf(analysator))) << channels << " " << bytes << " " << rate;
+        EXPECT_EQ(getAnalysatorPeaks(analysator.get(), nullptr, nullptr), 0);
+    }
+
+    EXPECT_DOUBLE_EQ(convertDeltaDBValue(0), 32767.0);
+    EXPECT_NEAR(convertDeltaDBValue(-6.0206), 16383.5, 0.1);
+    for (const double endless : {double{INFINITY}, -double{INFINITY}, std::nan(""), 1e9})
+        EXPECT_EQ(convertDeltaDBValue(endless), 32767.0);
+}
