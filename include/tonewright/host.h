@@ -183,6 +183,19 @@ typedef struct TONEWRIGHT_Capabilities {
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCapabilities(const char16_t* uri,
                                                        TONEWRIGHT_Capabilities* capabilities);
 
+/* The plug-in that is asked first for a type of file. */
+typedef struct TONEWRIGHT_PluginInfo {
+    size_t size;
+    int32_t isBoxed; /* nonzero if it runs in a process of its own */
+    char plugin[64]; /* its name, such as "sonora2_flac" */
+} TONEWRIGHT_PluginInfo;
+
+/* For files with that extension (without the point): which plug-in reads them (`type` is
+ * TONEWRIGHT_AUDIO_SOURCE, or 1 for video) or writes them (TONEWRIGHT_AUDIO_FORMAT). `info` may be
+ * null. No file is opened and no process started. 0 if there is none. Any thread. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetPlugin(const char16_t* extension, int32_t type,
+                                                 TONEWRIGHT_PluginInfo* info);
+
 /* Whether the file can hold exactly this format: 1 or 0. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_CanWrite(const char16_t* uri, int32_t sampleRate, int32_t channelCount,
                                                 int32_t bytesPerSample);

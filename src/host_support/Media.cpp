@@ -9,6 +9,7 @@
 #include "sonora2/media/ISalvage.h"
 #include "sonora2/plugins/MediaEnvironment.h"
 #include "sonora2/plugins/PluginExtensions.h"
+#include "sonora2/plugins/PluginModule.h"
 
 using namespace tonewright::host_support;
 using namespace sonora2::common;
@@ -173,6 +174,28 @@ char* TONEWRIGHT_Host_TakeWarnings(TONEWRIGHT_Handle source) {
         const std::string lines =
             description ? CString::toStdString(description->takeWarnings()) : std::string();
         return lines.empty() ? nullptr : ::strdup(lines.c_str());
+    });
+}
+
+int32_t TONEWRIGHT_Host_GetPlugin(const char16_t* extension, int32_t type, TONEWRIGHT_PluginInfo* info) {
+    return guard(0, [&] {
+        const SMediaEnvironment environment = getMediaEnvironment();
+        const bool isWriting = type & (kAudioFormat | kVideoFormat);
+        const P<IPluginHandler> handler =
+            requireHandler(isWriting ? environment.writeHandler : environment.readHandler);
+        const std::u16string file = std::u16string(u"file:///x.") + (extension ? extension : u"");
+        const P<peru::IURI> uri = tonewright::exports::toURI(file.c_str());
+        TONEWRIGHT_PluginInfo values = {};
+        const bool isFound = askPlugins(uri, handler, type, [&](ISonoraPlugin& plugin) {
+            copyText(values.plugin, CString::toStdString(plugin.getPluginName()));
+            values.isBoxed = dynamic_cast<CPluginModule*>(&plugin) == nullptr;
+            return true;
+        });
+        if (!isFound)
+            throw CSonoraError(CString::fromUTF8((isWriting ? "No plug-in writes " : "No plug-in reads ") +
+                                                 describeKind(uri, *handler)));
+        fillRecord(info, values);
+        return 1;
     });
 }
 

@@ -3,6 +3,7 @@
 
 _Static_assert(sizeof(TONEWRIGHT_MediaInfo) == 168, "the record is part of the binary interface");
 _Static_assert(sizeof(TONEWRIGHT_Capabilities) == 152, "the record is part of the binary interface");
+_Static_assert(sizeof(TONEWRIGHT_PluginInfo) == 80, "the record is part of the binary interface");
 _Static_assert(sizeof(TONEWRIGHT_TagPicture) == 56, "the record is part of the binary interface");
 
 /* Passes a record as a host that knows only its first two fields would. */

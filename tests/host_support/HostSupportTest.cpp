@@ -257,6 +257,26 @@ TEST_F(Host, CapabilitiesAreWhatTheEncoderTakes) {
     EXPECT_TRUE(std::filesystem::is_empty(folder.path()));
 }
 
+TEST_F(Host, PluginIsTheOneThatIsAskedFirst) {
+    const struct {
+        const char16_t* extension;
+        int32_t type;
+        const char* plugin; // empty: none
+    } cases[] = {{u"flac", TONEWRIGHT_AUDIO_SOURCE, "sonora2_flac"},
+                 {u"WMA", TONEWRIGHT_AUDIO_FORMAT, "sonora2_wmf"},
+                 {u"m4a", TONEWRIGHT_AUDIO_SOURCE, "sonora2_dsgraph"},
+                 {u"m4a", TONEWRIGHT_AUDIO_FORMAT, ""},
+                 {u"", TONEWRIGHT_AUDIO_SOURCE, ""}};
+    for (const auto& each : cases) {
+        TONEWRIGHT_PluginInfo info = {};
+        info.size = sizeof info;
+        EXPECT_EQ(TONEWRIGHT_Host_GetPlugin(each.extension, each.type, &info), *each.plugin ? 1 : 0);
+        EXPECT_STREQ(info.plugin, each.plugin);
+    }
+    EXPECT_STREQ(lastFailure().message, "No plug-in reads files without an extension");
+    EXPECT_EQ(TONEWRIGHT_Host_GetPlugin(nullptr, TONEWRIGHT_AUDIO_SOURCE, nullptr), 0);
+}
+
 // flac checks the sound that the encoder got from the host's functions.
 TEST_F(Host, CallbackSourceDeliversEverySample) {
     const SSound sound = makeNoise(44100, 2, 16, 30011);
