@@ -25,6 +25,29 @@ Names getExtensions(CLibrary& library, int32_t types) {
     return names;
 }
 
+// The plug-ins that are asked first, by whether they read or write.
+struct SPlugins {
+    std::string reader;
+    std::string writer;
+    bool isBoxed = false;
+};
+
+SPlugins getPlugins(const std::string& extension) {
+    SPlugins plugins;
+    const auto ask = [&](int32_t type, std::string& name) {
+        TONEWRIGHT_PluginInfo info = {};
+        info.size = sizeof info;
+        if (TONEWRIGHT_Host_GetPlugin(std::u16string(extension.begin(), extension.end()).c_str(), type,
+                                      &info) != 1)
+            return;
+        name = info.plugin;
+        plugins.isBoxed = plugins.isBoxed || info.isBoxed != 0;
+    };
+    ask(TONEWRIGHT_AUDIO_SOURCE, plugins.reader);
+    ask(TONEWRIGHT_AUDIO_FORMAT, plugins.writer);
+    return plugins;
+}
+
 } // namespace
 
 int listFormats(CLibrary& library, const SFormatsOptions& options) {
@@ -35,16 +58,32 @@ int listFormats(CLibrary& library, const SFormatsOptions& options) {
     for (const std::string& name : all)
         if (canHaveTag("x." + name)) tagged.insert(name);
     if (options.json) {
-        std::printf("%s\n", toLine({{"read", read}, {"write", written}, {"tag", tagged}}).c_str());
+        nlohmann::json plugins = nlohmann::json::object();
+        for (const std::string& name : all) {
+            const SPlugins each = getPlugins(name);
+            plugins[name] = {{"boxed", each.isBoxed}};
+            if (!each.reader.empty()) plugins[name]["read"] = each.reader;
+            if (!each.writer.empty()) plugins[name]["write"] = each.writer;
+        }
+        std::printf(
+            "%s\n",
+            toLine({{"read", read}, {"write", written}, {"tag", tagged}, {"plugins", plugins}}).c_str());
     } else if (options.table) {
-        std::printf("%s\n", tr("host.Formats.header", "extension  read  write tag").c_str());
+        std::printf("%s
+", tr("host.Formats.header", "extension  read  write tag   boxed  plug-ins").c_str());
         const std::string yes = tr("host.Formats.yes", "yes");
-        const auto mark = [&yes](const Names& names, const std::string& name) {
-            return names.count(name) ? yes : "-";
-        };
-        for (const std::string& name : all)
-            std::printf("%-10s %s %s %s\n", name.c_str(), fitColumns(mark(read, name), 5).c_str(),
-                        fitColumns(mark(written, name), 5).c_str(), mark(tagged, name).c_str());
+        const auto mark = [&yes](bool is, size_t columns) {
+            return fitColumns(is ? yes : "-", columns); };
+        for (const std::string& name : all) {
+            const SPlugins plugins = getPlugins(name);
+            std::string names = plugins.reader.empty() ? plugins.writer : plugins.reader;
+            if (!plugins.writer.empty() && plugins.writer != names) names += ", " + plugins.writer;
+            std::printf("%-10s %s %s %s %s %s
+                        ", name.c_str(), mark(read.count(name), 5).c_str(),
+                        mark(written.count(name), 5)
+                            .c_str(),
+                        mark(tagged.count(name), 5).c_str(), mark(plugins.isBoxed, 6).c_str(), names.c_str());
+        }
     } else {
         for (const std::string& name : read) std::printf("%s\n", name.c_str());
     }

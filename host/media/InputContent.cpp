@@ -102,11 +102,18 @@ std::string detectExtension(const fs::path& file) {
     };
     if ((has(0, "RIFF") || has(0, "RIFX") || has(0, "RF64")) && has(8, "WAVE")) return ".wav";
     if (has(0, "fLaC")) return ".flac";
-    if (has(0, "OggS")) return ".ogg";
+    if (has(0, "OggS")) return has(28, "OpusHead") ? ".opus" : has(28, "Speex") ? ".spx" : ".ogg";
     if (has(0, "FORM") && (has(8, "AIFF") || has(8, "AIFC"))) return ".aiff";
     if (has(0, ".snd")) return ".au";
     if (has(0, "caff")) return ".caf";
     if (has(0, "riff\x2e\x91\xcf\x11")) return ".w64";
+    if (has(4, "ftyp")) return ".m4a";
+    if (has(0, "\x30\x26\xb2\x75\x8e\x66\xcf\x11")) return ".wma";
+    if (has(0, "\x1a\x45\xdf\xa3")) return ".mka";
+    if (has(0, "wvpk")) return ".wv";
+    if (has(0, "MAC ")) return ".ape";
+    if (has(0, "TTA1")) return ".tta";
+    if (has(0, "MPCK") || has(0, "MP+")) return ".mpc";
     // A tag may be followed by padding before the first frame.
     return isMpegFrame(start) || hasTag ? ".mp3" : "";
 }

@@ -21,10 +21,13 @@ TEST_F(Formats, AreWrittenAndTaggedAsListed) {
         const SProcessResult result = tonewright({"convert", "in.wav", "-o", "out." + name});
         EXPECT_EQ(result.exitCode == 0, has("write")) << result.err;
         const auto mark = [&](const char* list) { return has(list) ? "yes" : "-"; };
-        std::array<char, 64> line;
-        std::snprintf(line.data(), line.size(), "\n%-10s %-5s %-5s %s\n", name.c_str(), "yes", mark("write"),
-                      mark("tag"));
+        const nlohmann::json plugins = listed["plugins"][name];
+        EXPECT_EQ(plugins.contains("write"), has("write"));
+        std::array<char, 128> line;
+        std::snprintf(line.data(), line.size(), "\n%-10s %-5s %-5s %-5s %-6s sonora2_", name.c_str(), "yes",
+                      mark("write"), mark("tag"), plugins["boxed"].get<bool>() ? "yes" : "-");
         EXPECT_NE(table.find(line.data()), std::string::npos) << line.data() << table;
+        EXPECT_NE(table.find(plugins["read"].get<std::string>()), std::string::npos);
         if (!has("write")) continue;
         EXPECT_EQ(tonewright({"tag", "set", "--title", "T", "out." + name}).exitCode == 0, has("tag"));
     }
