@@ -47,7 +47,6 @@ constexpr SExtension kExtensions[] = {
     {"ra", kSound, "RealAudio"},
     {"adx", kSound, "ADX"},
     {"gsm", kSound, "GSM full rate"},
-    {"g722", kSound, "G.722"},
     {"qcp", kSound, "QCELP"},
     {"sbc", kSound, "SBC"},
     {"xwma", kSound, "Windows Media Audio in RIFF"},

@@ -41,7 +41,6 @@ const SSoundCase kSoundCases[] = {
     {"x.asf", "-c:a wmav1", 2},
     {"x.adx", "", 2},
     {"x.gsm", "-c:a libgsm", 2, 0, 8000, 1},
-    {"x.g722", "", 2, 0, 16000, 1},
     {"x.mp4", "-c:a aac -aac_pns 0", 2, 60007},
     {"x.mov", "-c:a pcm_s24le", 3, 60007},
     {"x.3gp", "-c:a aac -aac_pns 0", 2, 60007},

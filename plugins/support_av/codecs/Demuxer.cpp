@@ -32,9 +32,8 @@ CDemuxer::CDemuxer(const SMediaFile& file, AVMediaType type) : m_file(file), m_i
     m_format->pb = m_io.get();
     m_format->io_open = &refuseOther;
     m_format->max_streams = 200;
-    // Some formats can only be told by the extension. The context is freed on failure.
-    const std::string name = peru::CString::toStdString(file.uri->getFileName()->toLower());
-    int result = avformat_open_input(&m_format, name.c_str(), nullptr, nullptr);
+    // Judged by its content, not by its name. The context is freed on failure.
+    int result = avformat_open_input(&m_format, nullptr, nullptr, nullptr);
     if (result >= 0) result = avformat_find_stream_info(m_format, nullptr);
     if (result >= 0) result = m_stream = av_find_best_stream(m_format, type, -1, -1, nullptr, 0);
     // Covers are pictures, not video.
