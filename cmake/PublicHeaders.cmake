@@ -62,6 +62,7 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     sonora2/pictures/RGBPicture.h
     sonora2/pictures/YUY2Picture.h
     sonora2/pictures/YV12Picture.h
+    sonora2/plugins/ILazyPlugin.h
     sonora2/plugins/ISonoraPlugin.h
     sonora2/samplerateconverter/SampleRateConverter.h
 

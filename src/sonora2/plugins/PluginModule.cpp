@@ -77,6 +77,10 @@ P<IPluginExtensions> CPluginModule::getValidExtensions(int nTypes) {
     return m_plugin->getValidExtensions(nTypes);
 }
 
+void CPluginModule::load() {
+    if (const P<ILazyPlugin> lazy = peru::tryCast<ILazyPlugin>(m_plugin)) lazy->load();
+}
+
 P<ISource> CPluginModule::tryCreateSource(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
                                           const SSourceParams* pParams) {
     return m_plugin->tryCreateSource(uri, nTypes, bDontCloseAfterTesting, pParams);
