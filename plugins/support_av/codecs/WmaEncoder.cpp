@@ -135,6 +135,10 @@ void CWmaEncoder::encode(AVFrame* frame) {
     }
 }
 
+void CWmaEncoder::update() {
+    avio_flush(m_io.get());
+}
+
 void CWmaEncoder::finish() {
     if (m_filled > 0 || m_written == m_codec->frame_size) sendBlock();
     encode(nullptr);

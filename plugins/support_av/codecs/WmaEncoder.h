@@ -19,6 +19,7 @@ public:
     }
     void open(COutputFile& file, const SEncoderSettings& settings) override;
     void write(const uint8_t* pcm, int frames) override;
+    void update() override; // what is in the file can be read, without a length
     void finish() override;
     int64_t estimateBytes(double seconds, const SEncoderSettings& settings) const override;
 
