@@ -3,6 +3,11 @@
 #include "peru/Errors.h"
 #include "peru/streams/DataStreams.h"
 #include "peru/streams/MemoryIOStream.h"
+#include "sonora2/boxed/AudioChunkRemote.h"
+#include "sonora2/boxed/AudioRun.h"
+#include "sonora2/boxed/RemoteFacets.h"
+#include "sonora2/boxed/RemoteLog.h"
+#include "sonora2/boxed/RemoteMediaState.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/media/AudioChunk.h"
 #include "sonora2/media/AudioStreamInfos.h"
@@ -33,6 +38,12 @@ template <class T> bool read(const P<T>& object, const P<IDataInStream>& stream)
     }
 }
 
+class CSilentLog : public CObject, public common::ILogManager {
+public:
+    void log(int32_t, const P<IString>&) override {}
+    void logException(const CException&) override {}
+};
+
 // The dimensions need not match the bytes: every use of the pixels must throw or stay within the block.
 void readPicture(const P<IDataInStream>& stream) {
     const auto carrier = make<common::CSonoraPictureRemote>(make<CMemoryManager>());
@@ -57,7 +68,7 @@ void readPicture(const P<IDataInStream>& stream) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     if (size == 0) return 0;
     const P<IDataInStream> stream = makeStream(data + 1, size - 1);
-    switch (data[0] % 5) {
+    switch (data[0] % 10) {
     case 0: {
         const auto context = make<audio::CSonoraContextAudio>();
         if (!read(context, stream) && context->getPluginNameCount() != 0) std::abort();
@@ -74,6 +85,22 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         break;
     case 4:
         readPicture(stream);
+        break;
+    case 5:
+        read(make<audio::CAudioRun>(make<CMemoryManager>()), stream);
+        break;
+    case 6:
+        read(make<common::CRemoteMediaState>(), stream);
+        break;
+    case 7:
+        read(make<common::CRemoteMediaDescription>(), stream);
+        break;
+    case 8:
+        read(make<audio::CAudioChunkRemote>(make<CMemoryManager>()), stream);
+        break;
+    case 9:
+        common::replayLog(CString::fromUTF8({reinterpret_cast<const char*>(data + 1), size - 1}),
+                          *make<CSilentLog>());
         break;
     }
     return 0;

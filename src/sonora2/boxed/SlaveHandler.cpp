@@ -250,14 +250,19 @@ P<IString> CSlaveHandler::describeEnd(const char* operation, const peru::CExcept
             "The process of the plug-in %PLUGIN% has ended in %OPERATION% (exit code %CODE%).",
             {{"%PLUGIN%", m_pluginName}, {"%OPERATION%", where}, {"%CODE%", peru::format("%d", exitCode)}});
     }
+    if (isLate)
+        return peru::localize("sonora2.CSlaveHandler.hanging",
+                              "The plug-in %PLUGIN% does not respond in %OPERATION%; it was ended after "
+                              "%SECONDS% s.",
+                              {{"%PLUGIN%", m_pluginName},
+                               {"%OPERATION%", where},
+                               {"%SECONDS%", peru::format("%g", m_deadline / 1000.0)}});
     const P<IString> description = exception.getDescription();
-    return peru::localize(
-        "sonora2.CSlaveHandler.noAnswer",
-        "The plug-in %PLUGIN% does not respond in %OPERATION% (%REASON%, after %SECONDS% s at the latest).",
-        {{"%PLUGIN%", m_pluginName},
-         {"%OPERATION%", where},
-         {"%REASON%", description->isEmpty() ? exception.getTitle() : description},
-         {"%SECONDS%", peru::format("%g", m_deadline / 1000.0)}});
+    return peru::localize("sonora2.CSlaveHandler.connectionFailed",
+                          "The connection to the plug-in %PLUGIN% has failed in %OPERATION% (%REASON%).",
+                          {{"%PLUGIN%", m_pluginName},
+                           {"%OPERATION%", where},
+                           {"%REASON%", description->isEmpty() ? exception.getTitle() : description}});
 }
 
 void CSlaveHandler::fetchLog() noexcept {
