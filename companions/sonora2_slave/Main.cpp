@@ -147,7 +147,10 @@ int main(int count, char** texts) {
     const P<CWork> work = peru::make<CWork>(slave, end);
     const P<peru::IThread> thread = peru::getThreadManager()->createThread(P<peru::IAction>(work));
     const bool hasParent = parent.waitFor(end);
-    if (!hasParent) removeEmpty(arguments.crashLog);
+    if (hasParent)
+        thread->wait(); // it has nothing left to do
+    else
+        removeEmpty(arguments.crashLog);
     // Threads of the plug-in may still run, so nothing is torn down.
     std::fflush(nullptr);
     ::_exit(hasParent && work->isDone() ? 0 : 1);
