@@ -1,13 +1,13 @@
 /*
  * Drives and discs: the interface of libdiscio2, C11 and C++.
  *
- * Conventions. Functions that return int32_t return 1 on success unless stated otherwise; pointers are null on
- * failure. The reason of a failure is then available from DISCIO_GetLastError on the same thread. A null or
- * wrong handle fails with DISCIO_ERROR_INVALID_PARAM. Texts are UTF-16, end with a zero and belong to the
+ * Conventions. Functions that return int32_t return 1 on success unless stated otherwise; pointers are null
+ * on failure. The reason of a failure is then available from DISCIO_GetLastError on the same thread. A null
+ * or wrong handle fails with DISCIO_ERROR_INVALID_PARAM. Texts are UTF-16, end with a zero and belong to the
  * handle they were read from: they stay valid until it is released, or until the same function is called with
- * it again. Every handle may be used by one thread at a time; different handles are independent of each other.
- * Handles may be released in any order. Indices count from 0. Blocks are CD sectors, 75 per second; for audio
- * each has 588 frames of 16-bit stereo at 44100 Hz.
+ * it again. Every handle may be used by one thread at a time; different handles are independent of each
+ * other. Handles may be released in any order. Indices count from 0. Blocks are CD sectors, 75 per second;
+ * for audio each has 588 frames of 16-bit stereo at 44100 Hz.
  */
 #ifndef TONEWRIGHT_DISCIO2_H
 #define TONEWRIGHT_DISCIO2_H
@@ -28,7 +28,8 @@ typedef struct DISCIO_Drive DISCIO_Drive;
 typedef struct DISCIO_Disc DISCIO_Disc;
 typedef struct DISCIO_DataCursor DISCIO_DataCursor;
 
-/* --- Library --------------------------------------------------------------------------------------------- */
+/* --- Library ---------------------------------------------------------------------------------------------
+ */
 
 enum { DISCIO_API_VERSION = 1 };
 
@@ -70,13 +71,15 @@ DISCIO_API DISCIO_Library* DISCIO_Create(void);
 DISCIO_API DISCIO_Library* DISCIO_CreateEx(uint32_t apiVersion, const DISCIO_Options* options);
 /* Releases a handle of any kind. */
 DISCIO_API int32_t DISCIO_Release(void* handle);
-/* The code of the last failure on this thread; a successful call leaves it unchanged. `library` may be null. */
+/* The code of the last failure on this thread; a successful call leaves it unchanged. `library` may be null.
+ */
 DISCIO_API int32_t DISCIO_GetLastError(DISCIO_Library* library);
 /* The English text of a code. For the last failure on this thread with its details. Valid until the next call
  * on this thread. */
 DISCIO_API const char16_t* DISCIO_GetErrorMessageW(DISCIO_Library* library, int32_t code);
 
-/* --- Drives ---------------------------------------------------------------------------------------------- */
+/* --- Drives ----------------------------------------------------------------------------------------------
+ */
 
 /* Searches the machine, once; later calls change nothing. */
 DISCIO_API int32_t DISCIO_EnumerateDrives(DISCIO_Library* library);
@@ -97,7 +100,8 @@ DISCIO_API const char16_t* DISCIO_DriveGetDriverDescriptionW(DISCIO_Drive* drive
 /* In multiples of the speed of playing, fastest first, ended by 0; null if unknown. */
 DISCIO_API const double* DISCIO_DriveGetReadSpeedList(DISCIO_Drive* drive);
 
-/* --- Discs ----------------------------------------------------------------------------------------------- */
+/* --- Discs -----------------------------------------------------------------------------------------------
+ */
 
 /* 0 none, 1 CD-ROM, 2 CD-R, 3 CD-RW, 4 DVD-ROM, 5 DVD-RAM, 6 DVD-R, 7 DVD-RW, 8 DVD+R, 9 DVD+RW, 10 DVD+R DL,
  * 11 DVD-R DL, 12 BD-ROM, 13 BD-R, 14 BD-RE, -1 unknown or a failure. */
@@ -127,7 +131,8 @@ DISCIO_API int32_t DISCIO_DiscGetTrackStartBlocks(DISCIO_Disc* disc, int32_t ind
  * track, and more than that are a hidden track. -1 for a failure. */
 DISCIO_API int32_t DISCIO_DiscGetTrackPregap(DISCIO_Disc* disc, int32_t index);
 
-/* --- Audio discs ----------------------------------------------------------------------------------------- */
+/* --- Audio discs -----------------------------------------------------------------------------------------
+ */
 
 /* Texts of CD-TEXT and of the subchannel. */
 enum {
@@ -183,7 +188,8 @@ DISCIO_API DISCIO_PCMAudioStream* DISCIO_DiscAudioCreatePCMAudioStreamFromSegmen
                                                                                   int32_t segment);
 DISCIO_API double DISCIO_PCMAudioStreamGetApproximateLengthSeconds(DISCIO_PCMAudioStream* stream);
 
-/* --- Data discs ------------------------------------------------------------------------------------------ */
+/* --- Data discs ------------------------------------------------------------------------------------------
+ */
 
 /* ISO 9660 with Joliet and Rock Ridge, or UDF. Paths have "\" between their names; the root is "" or "\". */
 DISCIO_API const char16_t* DISCIO_DiscDataGetTitleW(DISCIO_Disc* disc);

@@ -182,8 +182,8 @@ TONEWRIGHT_API void TONEWRIGHT_SetLanguageID(const char16_t* language);
  * `buffer` is ignored. */
 TONEWRIGHT_API void TONEWRIGHT_fillFeatures(void* buffer);
 
-/* Creates the disc library, once, instead of with the first use of a drive or disc. `flag` has no effect. Throws
- * a C++ exception if the library is missing. */
+/* Creates the disc library, once, instead of with the first use of a drive or disc. `flag` has no effect.
+ * Throws a C++ exception if the library is missing. */
 TONEWRIGHT_API void TONEWRIGHT_InitDiscio(uint8_t flag);
 
 /* Sets the suffix of the temporary names that a host gives to output files until they are complete, such as
