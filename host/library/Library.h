@@ -9,6 +9,7 @@ namespace host {
 #define HOST_FUNCTIONS(X)                                                                                    \
     X(InitStartup)                                                                                           \
     X(DeInitAll)                                                                                             \
+    X(SetDriveChangedCallback)                                                                               \
     X(SetTempExtension)                                                                                      \
     X(AddProxyLogManager)                                                                                    \
     X(RemoveProxyLogManager)                                                                                 \
