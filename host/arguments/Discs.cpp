@@ -1,0 +1,119 @@
+#include "arguments/Arguments.h"
+#include "commands/Drives.h"
+#include "commands/Rip.h"
+#include "commands/ShowDisc.h"
+
+#include <memory>
+
+namespace host {
+
+namespace {
+
+constexpr const char* kPlace = "A drive by its path in tonewright drives, or a disc image (.cue, .toc, .nrg, "
+                               ".iso); by default the first "
+                               "drive with a disc";
+
+// "1,3-5". Throws CLI::ValidationError.
+std::set<int> parseTracks(const std::string& text) {
+    std::set<int> tracks;
+    std::istringstream parts(text);
+    for (std::string part; std::getline(parts, part, ',');) {
+        std::istringstream in(part);
+        int first = 0, last = 0;
+        char dash = 0;
+        in >> first;
+        last = first;
+        if (in >> dash) in >> last;
+        if (in.fail() && !(in.eof() && dash == 0)) first = 0;
+        if (first < 1 || last < first || last > 99 || (dash != 0 && dash != '-'))
+            throw CLI::ValidationError("TRACKS",
+                                       part + " is not a track or a range of tracks, such as 1,3-5");
+        for (int track = first; track <= last; ++track) tracks.insert(track);
+    }
+    return tracks;
+}
+
+} // namespace
+
+void addDrives(CLI::App& app, Run& run) {
+    struct SOptions {
+        bool json = false;
+        bool watches = false;
+    };
+    const auto options = std::make_shared<SOptions>();
+    CLI::App* command = app.add_subcommand(
+        "drives", "List the drives for discs, and the folders of disc images in TONEWRIGHT_DRIVE_FOLDERS.");
+    command->add_flag("--json", options->json, "Print one JSON object per line");
+    command->add_flag("-w,--watch", options->watches,
+                      "Also print when a disc is put in or taken out, until Ctrl-C");
+    command->callback([options, &run] {
+        run = [options](CLibrary& library) {
+            return options->watches ? watchDrives(library, options->json) : listDrives(options->json);
+        };
+    });
+}
+
+void addDisc(CLI::App& app, Run& run) {
+    struct SOptions {
+        std::filesystem::path place;
+        bool json = false;
+    };
+    const auto options = std::make_shared<SOptions>();
+    CLI::App* command = app.add_subcommand("disc", "Show the tracks, texts and files of a disc.");
+    command->add_option("DISC", options->place, kPlace)->option_text(" ");
+    command->add_flag("--json", options->json, "Print one JSON object per line");
+    command->callback(
+        [options, &run] { run = [options](CLibrary&) { return showDisc(options->place, options->json); }; });
+}
+
+void addRip(CLI::App& app, Run& run) {
+    struct SOptions : SRipOptions {
+        std::string tracksText;
+        std::string pattern = "%track% %title%";
+    };
+    const auto options = std::make_shared<SOptions>();
+    CLI::App* command = app.add_subcommand(
+        "rip",
+        "Copy the audio tracks of a disc into sound files, exactly sample for sample, with a report of each\n"
+        "track's CRC-32, length, repaired places and peak.");
+    command->add_option("DISC", options->place, kPlace)->option_text(" ");
+    command->add_option("TRACKS", options->tracksText, "Tracks to copy, such as 1,3-5; by default all")
+        ->option_text(" ");
+    command->add_option("--to", options->extension, "Type of the files (default: flac)")->option_text("EXT");
+    command
+        ->add_option("-d,--directory", options->directory, "Folder for the files (default: the current one)")
+        ->option_text("FOLDER");
+    command
+        ->add_option("--pattern", options->pattern,
+                     "Names of the files (default: \"%track% %title%\"); fields: " +
+                         CNamePattern::describeFields())
+        ->option_text("TEXT");
+    command->add_flag("--verify", options->verify, "Read every track twice and compare");
+    command->add_flag("--cue", options->writeCue, "Also write a cue sheet");
+    command->add_flag("-f,--force", options->force, "Replace existing files");
+    addFormat(*command, *options, {16});
+    // The samples of the disc are copied as they are.
+    for (const char* name : {"--rate", "--channels", "--bits"})
+        command->remove_option(command->get_option(name));
+    addOutput(*command, options->show);
+    command->callback([options, &run] {
+        checkBitRates(*options);
+        // The disc may be left out.
+        const std::string place = options->place.native();
+        std::error_code none;
+        if (options->tracksText.empty() && !place.empty() && !std::filesystem::exists(place, none) &&
+            place.find_first_not_of("0123456789,-") == std::string::npos) {
+            options->tracksText = place;
+            options->place.clear();
+        }
+        options->tracks = parseTracks(options->tracksText);
+        try {
+            options->names.emplace(options->pattern);
+        } catch (const std::invalid_argument& error) {
+            throw CLI::ValidationError("--pattern", error.what());
+        }
+        run = [options](CLibrary& library) { return rip(library, *options); };
+    });
+}
+
+} // namespace host

@@ -1,0 +1,29 @@
+// tonewright rip
+#pragma once
+
+#include "library/Library.h"
+#include "media/FormatOptions.h"
+#include "media/NamePattern.h"
+#include "terminal/Progress.h"
+
+#include <optional>
+#include <set>
+
+namespace host {
+
+struct SRipOptions : SFormatOptions {
+    std::filesystem::path place; // a drive or disc image; empty: the first drive with a disc
+    std::set<int> tracks;        // empty: all
+    std::string extension = "flac";
+    std::filesystem::path directory;
+    std::optional<CNamePattern> names;
+    bool verify = false;
+    bool writeCue = false;
+    bool force = false;
+    EOutput show = EOutput::normal;
+};
+
+// Returns an exit code; throws std::runtime_error if the disc cannot be read.
+int rip(CLibrary& library, const SRipOptions& options);
+
+} // namespace host
