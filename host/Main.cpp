@@ -131,7 +131,7 @@ int main(int argc, char** argv) {
 
     Run run;
     for (const auto add : {addConvert, addInfo, addFormats, addWaveform, addDevices, addPlay, addMix,
-                           addRecord, addTag, addCddb, addGet})
+                           addRecord, addTag, addDrives, addDisc, addRip, addCddb, addGet})
         add(app, run);
     // The parser's own message would not name the unknown command.
     const auto isMeant = [&](const CLI::App* command) { return command->check_name(argv[1]); };

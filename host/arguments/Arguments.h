@@ -15,6 +15,9 @@ void addPlay(CLI::App& app, Run& run);
 void addMix(CLI::App& app, Run& run);
 void addRecord(CLI::App& app, Run& run);
 void addTag(CLI::App& app, Run& run);
+void addDrives(CLI::App& app, Run& run);
+void addDisc(CLI::App& app, Run& run);
+void addRip(CLI::App& app, Run& run);
 void addCddb(CLI::App& app, Run& run);
 void addGet(CLI::App& app, Run& run);
 

@@ -1,0 +1,75 @@
+#include "discio2/DiscSupport.h"
+#include "host/Program.h"
+#include "support/Environment.h"
+
+using namespace tests;
+
+namespace {
+
+class Rip : public CProgramTest {
+protected:
+    Rip() {
+        folder.write("a.bin", a + b);
+        folder.write(
+            "disc.cue",
+            "TITLE \"The disc\"\nPERFORMER Band\nFILE a.bin BINARY\n  TRACK 01 AUDIO\n    TITLE \"One/Two\"\n"
+            "    INDEX 01 00:00:00\n  TRACK 02 AUDIO\n    INDEX 00 00:00:30\n    INDEX 01 00:00:32\n");
+    }
+    // The samples of a file, decoded by another program.
+    std::string decode(const std::string& name) {
+        return peer({"sox", name, "-t", "raw", "-e", "signed", "-b", "16", "-L", "-"});
+    }
+
+    std::string a = makeSectors(32, 1), b = makeSectors(40, 2);
+};
+
+} // namespace
+
+TEST_F(Rip, FilesHoldTheExactSamplesTextsAndReports) {
+    const auto lines = parseLines(succeed({"rip", "disc.cue", "-d", "out", "--verify", "--cue", "--json"}));
+    EXPECT_TRUE(decode("out/01 One-Two.flac") == a.substr(0, 30 * kSectorBytes));
+    EXPECT_TRUE(decode("out/02 Track 2.flac") == b);
+    EXPECT_NE(peer({"metaflac", "--export-tags-to=-", "out/01 One-Two.flac"}).find("TITLE=One/Two\n"),
+              std::string::npos);
+    folder.write("b.raw", b);
+    const std::string crc = peer(
+        {"/usr/bin/python3", "-c", "import zlib; print('%08X' % zlib.crc32(open('b.raw','rb').read()))"});
+    bool isReported = false;
+    for (const auto& line : lines)
+        if (line.value("event", "") == "ripped" && line["track"] == 2) {
+            isReported = true;
+            EXPECT_EQ(line["crc32"].get<std::string>() + "\n", crc);
+            EXPECT_EQ(line["frames"], 40 * 588);
+            EXPECT_EQ(line["repairs"], 0);
+            EXPECT_EQ(line["verified"], true);
+        }
+    EXPECT_TRUE(isReported);
+    EXPECT_NE(readFile(folder / "out/The disc.cue").find("FILE \"01 One-Two.flac\" WAVE"), std::string::npos);
+}
+
+TEST_F(Rip, SomeTracksAsOtherTypesWithoutReplacing) {
+    succeed({"rip", "disc.cue", "2", "--to", "wav", "--pattern", "%album% %track%", "-q"});
+    EXPECT_TRUE(decode("The disc 02.wav") == b);
+    EXPECT_NE(fail({"rip", "disc.cue", "--to", "wav", "--pattern", "%album% %track%", "-q"}).find("exists"),
+              std::string::npos);
+    EXPECT_TRUE(std::filesystem::exists(folder / "The disc 01.wav"));
+    EXPECT_NE(fail({"rip", "disc.cue", "3"}).find("has no audio track 3"), std::string::npos);
+    EXPECT_NE(fail({"rip", "nothing.cue"}).find("nothing.cue"), std::string::npos);
+    EXPECT_EQ(tonewright({"rip", "disc.cue", "2-x"}).exitCode, 2);
+    EXPECT_EQ(list().count("The disc 02.wav.part"), 0u);
+}
+
+TEST_F(Rip, DrivesAndDiscsAreShown) {
+    const CEnvironment folders("TONEWRIGHT_DRIVE_FOLDERS", folder.path().string());
+    const auto drives = parseLines(succeed({"drives", "--json"}));
+    ASSERT_FALSE(drives.empty());
+    EXPECT_EQ(drives.back()["drive"], folder.path().string());
+    EXPECT_EQ(drives.back()["disc"], "CD-ROM");
+    const auto lines = parseLines(succeed({"disc", folder.path().string(), "--json"}));
+    ASSERT_EQ(lines.size(), 3u);
+    EXPECT_EQ(lines[0]["title"], "The disc");
+    EXPECT_EQ(lines[1]["title"], "One/Two");
+    EXPECT_EQ(lines[1]["blocks"], 30);
+    EXPECT_EQ(lines[2]["pregap"], 2);
+    EXPECT_NE(succeed({"disc", "disc.cue"}).find("One/Two"), std::string::npos);
+}
