@@ -55,6 +55,14 @@ constexpr const char* kRefusedWhereNothingIsMade[] = {"fchmod", "fchown", "fsetx
 // The kernel looks at the lower half of these arguments only.
 constexpr scmp_datum_t kInt = 0xffffffff;
 
+// The library's macros for these are C.
+scmp_arg_cmp differs(unsigned argument, scmp_datum_t value) {
+    return {argument, SCMP_CMP_NE, value, 0};
+}
+scmp_arg_cmp isEqual(unsigned argument, scmp_datum_t mask, scmp_datum_t value) {
+    return {argument, SCMP_CMP_MASKED_EQ, mask, value};
+}
+
 class CFilter {
 public:
     CFilter() : m_context(::seccomp_init(SCMP_ACT_ALLOW), &::seccomp_release) {
@@ -100,31 +108,31 @@ private:
 void refuseOtherProcesses(CFilter& filter) {
     const auto self = static_cast<scmp_datum_t>(::getpid());
     for (const char* call : {"kill", "tgkill", "rt_sigqueueinfo", "rt_tgsigqueueinfo", "process_vm_readv"})
-        filter.refuse(call, {SCMP_A0(SCMP_CMP_NE, self)});
-    filter.refuse("clone", {SCMP_A0(SCMP_CMP_MASKED_EQ, CLONE_THREAD, 0)});
+        filter.refuse(call, {differs(0, self)});
+    filter.refuse("clone", {isEqual(0, CLONE_THREAD, 0)});
     for (const scmp_datum_t flag : {CLONE_NEWNS, CLONE_NEWCGROUP, CLONE_NEWUTS, CLONE_NEWIPC, CLONE_NEWUSER,
                                     CLONE_NEWPID, CLONE_NEWNET})
-        filter.refuse("clone", {SCMP_A0(SCMP_CMP_MASKED_EQ, flag, flag)});
+        filter.refuse("clone", {isEqual(0, flag, flag)});
     // Its flags are in memory, where the filter cannot see them. The C library falls back to clone.
     filter.refuse("clone3", {}, ENOSYS);
-    filter.refuse("prlimit64", {SCMP_A2(SCMP_CMP_NE, 0)});
+    filter.refuse("prlimit64", {differs(2, 0)});
     // Signals that the kernel sends when data arrives.
     for (const scmp_datum_t command : {F_SETOWN, F_SETOWN_EX, F_SETSIG})
-        filter.refuse("fcntl", {SCMP_A1(SCMP_CMP_MASKED_EQ, kInt, command)});
+        filter.refuse("fcntl", {isEqual(1, kInt, command)});
 }
 
 void refuseRequests(CFilter& filter) {
     constexpr scmp_datum_t kTypeIntoTerminal = TIOCSTI, kTerminalMenu = TIOCLINUX, kOwner = FIOSETOWN,
                            kGroup = SIOCSPGRP, kFlags = FS_IOC_SETFLAGS, kExtended = FS_IOC_FSSETXATTR;
     for (const scmp_datum_t request : {kTypeIntoTerminal, kTerminalMenu, kOwner, kGroup, kFlags, kExtended})
-        filter.refuse("ioctl", {SCMP_A1(SCMP_CMP_MASKED_EQ, kInt, request)});
+        filter.refuse("ioctl", {isEqual(1, kInt, request)});
 }
 
 // Before version 3 Landlock does not check truncation, which does not need write access.
 void refuseTruncation(CFilter& filter) {
     const auto refuse = [&](scmp_datum_t mask, scmp_datum_t value) {
-        filter.refuse("open", {SCMP_A1(SCMP_CMP_MASKED_EQ, mask, value)});
-        filter.refuse("openat", {SCMP_A2(SCMP_CMP_MASKED_EQ, mask, value)});
+        filter.refuse("open", {isEqual(1, mask, value)});
+        filter.refuse("openat", {isEqual(2, mask, value)});
     };
     refuse(O_ACCMODE | O_TRUNC, O_RDONLY | O_TRUNC);
     refuse(O_ACCMODE, O_ACCMODE); // neither reading nor writing, for requests to devices
@@ -140,7 +148,7 @@ bool filterSystemCalls(bool makesFiles) {
     refuseRequests(filter);
     refuseTruncation(filter);
     if (makesFiles) {
-        filter.refuse("utimensat", {SCMP_A1(SCMP_CMP_NE, 0)}); // by path
+        filter.refuse("utimensat", {differs(1, 0)}); // by path
     } else {
         for (const char* call : kRefusedWhereNothingIsMade) filter.refuse(call);
         filter.refuse("utimensat");
