@@ -58,6 +58,10 @@ void translateHelp(CLI::App& app) {
     app.option_defaults()->group(tr("host.help.Options", "Options"));
     app.group(tr("host.help.Subcommands", "Subcommands"));
     app.set_help_flag("-h,--help", tr("host.help.help", "Print this help message and exit"));
+    app.failure_message([](const CLI::App*, const CLI::Error& error) {
+        return std::string(error.what()) + "\n" +
+               tr("host.moreHelp", "Run with --help for more information.") + "\n";
+    });
     const auto formatter = app.get_formatter();
     formatter->label("Usage", tr("host.help.Usage", "Usage"));
     formatter->label("Positionals", tr("host.help.Positionals", "Positionals"));

@@ -164,8 +164,12 @@ std::string toOneLine(const std::string& message) {
 std::string asReason(std::string message, const std::filesystem::path& about) {
     message = toOneLine(message);
     const std::filesystem::path absolute = std::filesystem::absolute(about);
+    bool isSentence = isEnglish(); // otherwise the first word may be the name of another file
     for (const std::string& name : {absolute.lexically_normal().native(), absolute.native()}) {
-        if (message.starts_with(name + ": ")) message.erase(0, name.size() + 2);
+        if (message.starts_with(name + ": ")) {
+            message.erase(0, name.size() + 2);
+            isSentence = true;
+        }
         replaceAll(message, " " + name + ":", ":");
         if (!isEnglish()) continue; // the name fits into every sentence
         for (const char* article : {"the ", "The ", ""})
@@ -174,7 +178,7 @@ std::string asReason(std::string message, const std::filesystem::path& about) {
     }
     for (const std::string_view stop : {".", "\u3002"})
         if (message.ends_with(stop)) message.resize(message.size() - stop.size());
-    if (!message.empty())
+    if (isSentence && !message.empty())
         message[0] = static_cast<char>(std::toupper(static_cast<unsigned char>(message[0])));
     return message;
 }

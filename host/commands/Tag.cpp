@@ -21,8 +21,8 @@ constexpr size_t kTitleColumns = 14;
 
 std::string formatLine(std::string title, const std::string& text) {
     title = toPrintable(title);
-    title.resize(std::max(kTitleColumns, title.size() + 1), ' ');
-    return "  " + title + toPrintable(text) + "\n";
+    const size_t columns = std::max(kTitleColumns, countColumns(title) + 1);
+    return "  " + fitColumns(std::move(title), columns) + toPrintable(text) + "\n";
 }
 
 void printLines(const fs::path& file, const std::string& lines) {
