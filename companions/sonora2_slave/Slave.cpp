@@ -9,6 +9,7 @@
 #include "sonora2/boxed/BoxedSettings.h"
 #include "sonora2/boxed/ISonoraPluginRemote.h"
 #include "sonora2/context/SonoraError.h"
+#include "sonora2/plugins/ILazyPlugin.h"
 #include "sonora2/plugins/PluginExtensions.h"
 #include "sonora2/plugins/PluginModule.h"
 #include "sonora2_slave/CrashDetails.h"
@@ -131,6 +132,8 @@ void CSlave::beforeMedia(const P<peru::IURI>& medium, bool isWritten) {
 
 // For good: a slave that is asked for a second medium cannot open it.
 void CSlave::confine(const P<peru::IURI>& medium, bool isWritten) {
+    // Libraries that are not loaded yet cannot be read later.
+    if (const auto lazy = peru::tryCast<ILazyPlugin>(m_plugin)) lazy->load();
     redirectStandardFiles(isWritten);
     const char* mode = std::getenv(kSandboxVariable);
     if (!mode || std::strcmp(mode, "none") != 0) {

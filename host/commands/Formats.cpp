@@ -69,20 +69,17 @@ int listFormats(CLibrary& library, const SFormatsOptions& options) {
             "%s\n",
             toLine({{"read", read}, {"write", written}, {"tag", tagged}, {"plugins", plugins}}).c_str());
     } else if (options.table) {
-        std::printf("%s
-", tr("host.Formats.header", "extension  read  write tag   boxed  plug-ins").c_str());
+        std::printf("%s\n",
+                    tr("host.Formats.header", "extension  read  write tag   boxed  plug-ins").c_str());
         const std::string yes = tr("host.Formats.yes", "yes");
-        const auto mark = [&yes](bool is, size_t columns) {
-            return fitColumns(is ? yes : "-", columns); };
+        const auto mark = [&yes](bool is, size_t columns) { return fitColumns(is ? yes : "-", columns); };
         for (const std::string& name : all) {
             const SPlugins plugins = getPlugins(name);
             std::string names = plugins.reader.empty() ? plugins.writer : plugins.reader;
             if (!plugins.writer.empty() && plugins.writer != names) names += ", " + plugins.writer;
-            std::printf("%-10s %s %s %s %s %s
-                        ", name.c_str(), mark(read.count(name), 5).c_str(),
-                        mark(written.count(name), 5)
-                            .c_str(),
-                        mark(tagged.count(name), 5).c_str(), mark(plugins.isBoxed, 6).c_str(), names.c_str());
+            std::printf("%-10s %s %s %s %s %s\n", name.c_str(), mark(read.count(name), 5).c_str(),
+                        mark(written.count(name), 5).c_str(), mark(tagged.count(name), 5).c_str(),
+                        mark(plugins.isBoxed, 6).c_str(), names.c_str());
         }
     } else {
         for (const std::string& name : read) std::printf("%s\n", name.c_str());

@@ -47,6 +47,18 @@ bool askPlugins(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int 
                                             : peru::format(byExtension, extension));
 }
 
+[[noreturn]] void failWithoutReader(const P<peru::IURI>& uri, IPluginHandler& handler) {
+    failWithoutPlugin(
+        uri, handler, {"tonewright.Media.noReader", "No plug-in reads .%s files"},
+        {"tonewright.Media.noReaderWithoutExtension", "No plug-in reads files without an extension"});
+}
+
+[[noreturn]] void failWithoutWriter(const P<peru::IURI>& uri, IPluginHandler& handler) {
+    failWithoutPlugin(
+        uri, handler, {"tonewright.Media.noWriter", "No plug-in writes .%s files"},
+        {"tonewright.Media.noWriterWithoutExtension", "No plug-in writes files without an extension"});
+}
+
 // An open source in the file's own format. Throws the reason of the first plug-in that failed.
 P<IAudioSource> openMedia(const P<peru::IURI>& uri) {
     const P<IPluginHandler> handler = requireHandler(getMediaEnvironment().readHandler);
@@ -65,9 +77,7 @@ P<IAudioSource> openMedia(const P<peru::IURI>& uri) {
     });
     if (isOpen) return source;
     if (reason) reason->raise();
-    failWithoutPlugin(
-        uri, *handler, {"tonewright.Media.noReader", "No plug-in reads .%s files"},
-        {"tonewright.Media.noReaderWithoutExtension", "No plug-in reads files without an extension"});
+    failWithoutReader(uri, *handler);
 }
 
 void fillInfo(const P<IAudioSource>& source, TONEWRIGHT_MediaInfo* info) {
@@ -191,9 +201,8 @@ int32_t TONEWRIGHT_Host_GetPlugin(const char16_t* extension, int32_t type, TONEW
             values.isBoxed = dynamic_cast<CPluginModule*>(&plugin) == nullptr;
             return true;
         });
-        if (!isFound)
-            throw CSonoraError(CString::fromUTF8((isWriting ? "No plug-in writes " : "No plug-in reads ") +
-                                                 describeKind(uri, *handler)));
+        if (!isFound && isWriting) failWithoutWriter(uri, *handler);
+        if (!isFound) failWithoutReader(uri, *handler);
         fillRecord(info, values);
         return 1;
     });
@@ -204,9 +213,7 @@ int32_t TONEWRIGHT_Host_GetCapabilities(const char16_t* uri, TONEWRIGHT_Capabili
         const P<peru::IURI> target = tonewright::exports::toURI(uri);
         const P<IPluginHandler> handler = requireHandler(getMediaEnvironment().writeHandler);
         if (!askPlugins(target, handler, kAudioFormat, [](ISonoraPlugin&) { return true; }))
-            failWithoutPlugin(target, *handler, {"tonewright.Media.noWriter", "No plug-in writes .%s files"},
-                              {"tonewright.Media.noWriterWithoutExtension",
-                               "No plug-in writes files without an extension"});
+            failWithoutWriter(target, *handler);
 
         // A codec's limits of rate, channels and width are taken as independent, so each is tested by varying
         // one format that is accepted.
