@@ -406,9 +406,10 @@ TONEWRIGHT_API int32_t TONEWRIGHT_DataDiscProject_AddFileFromAudioSource(TONEWRI
 
 /* --- Normalization ------------------------------------------------------------------------------- */
 
-/* Measures a source from its current position and returns the gain, as a factor, that brings it to
- * `targetLevel` decibels. Opens the source if necessary and leaves it open. If the callback returns false,
- * the measurement ends early with the gain of the part measured. Bad handle: 3.0. Failure: 0.0. */
+/* Measures the integrated loudness (EBU R 128) of a source from its current position and returns the gain, as
+ * a factor, that brings it to `targetLevel` LUFS; 1.0 for silence. Opens the source if necessary and leaves
+ * it open. If the callback, which may be null, returns false, the measurement ends early with the gain of the
+ * part measured. Bad handle: 3.0, also a possible gain. Failure: 0.0. */
 TONEWRIGHT_API double TONEWRIGHT_INORMALIZE_processAudioSource(TONEWRIGHT_Handle source, double targetLevel,
                                                                TONEWRIGHT_NormalizeCallback callback);
 

@@ -9,6 +9,7 @@
 #include "sonora2/boxed/BoxedSettings.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/plugins/MediaEnvironment.h"
+#include "tonewright/AudioToolsHandler.h"
 #include "tonewright/Quietly.h"
 #include "tonewright/SonoraLogManagerProxy.h"
 
@@ -40,8 +41,13 @@ constexpr const char* kBoxedPlugins = "sonora2_dsgraph,sonora2_wmf";
 
 constexpr const char* kProductFolder = "Zelvanor Tonewright 4/";
 
+// Also in the plug-ins' folder: a library that is loaded on demand, and sonora2_dsgraph under another name.
+constexpr std::string_view kOtherModules[] = {"audiotools", "sonora2_ffmpeg"};
+
 bool isStandardPlugin(std::string_view name) {
-    return std::ranges::count(kReadPlugins, name) + std::ranges::count(kWritePlugins, name) > 0;
+    return std::ranges::count(kOtherModules, name) + std::ranges::count(kReadPlugins, name) +
+               std::ranges::count(kWritePlugins, name) >
+           0;
 }
 
 // Names of the plug-ins that the user has added, in alphabetical order: every NAME.so in the folders of
@@ -137,6 +143,8 @@ bool CApp::init() {
     sonora2::common::setMediaEnvironment(
         {m_readContext, m_readPluginHandler, m_writeContext, m_writePluginHandler});
 
+    sonora2::audio::setAudioToolsHandlerFactory(audiotoolshandler::findAudioToolsHandler);
+
     m_serviceLock = peru::getMutexFactory()->createMutex();
     m_driveChanged = nullptr;
     m_cancelAutoplay = peru::make<cap::CCancelAutoplay2>();
@@ -173,6 +181,12 @@ void CApp::driveChanged(const P<disciopp::IDrive>& drive, int event) {
     if (const TONEWRIGHT_DriveChangedCallback callback = m_driveChanged) callback(drive->getHandle(), event);
 }
 
+P<CNormalizeHandler> CApp::getNormalizeHandler() {
+    std::scoped_lock lock(m_normalizeMutex);
+    if (!m_normalizeHandler) m_normalizeHandler = peru::make<CNormalizeHandler>();
+    return m_normalizeHandler;
+}
+
 void CApp::shutdown() {
     if (m_driveManager) {
         m_driveManager->removeListener(this);
@@ -180,6 +194,11 @@ void CApp::shutdown() {
         m_driveManager.reset();
     }
     m_driveChanged = nullptr;
+    sonora2::audio::setAudioToolsHandlerFactory(nullptr);
+    {
+        std::scoped_lock lock(m_normalizeMutex);
+        m_normalizeHandler.reset();
+    }
     sonora2::common::setMediaEnvironment({});
     m_readPluginHandler.reset();
     m_writePluginHandler.reset();

@@ -7,10 +7,12 @@
 #include "sonora2/context/ISonoraContext.h"
 #include "sonora2/plugins/PluginHandler.h"
 #include "tonewright/CancelAutoplay2.h"
+#include "tonewright/NormalizeHandler.h"
 #include "tonewright/tonewright.h"
 #include "zvr_lang_manager/LanguageId.h"
 
 #include <atomic>
+#include <mutex>
 #include <span>
 
 namespace tonewright {
@@ -43,6 +45,10 @@ public:
     P<sonora2::common::CPluginHandler> getWritePluginHandler() const { return require(m_writePluginHandler); }
     // Serialises opening and closing of plug-ins and sources.
     P<peru::IMutex> getServiceLock() const { return require(m_serviceLock); }
+
+    // Loads the library that measures loudness on the first call, so that a start does not wait for it.
+    // Throws CError if it is missing; the next call tries again.
+    P<CNormalizeHandler> getNormalizeHandler();
 
     P<peru::IURI> getProgramFolder() const { return m_programFolder; }
     P<peru::IURI> getProductDataFolder() const { return m_productDataFolder; }
@@ -84,6 +90,8 @@ private:
     P<peru::IURI> m_productDataFolder;
     std::atomic<TONEWRIGHT_DriveChangedCallback> m_driveChanged{nullptr};
     P<disciopp::IDriveManager> m_driveManager; // fetched on first need
+    std::mutex m_normalizeMutex;
+    P<CNormalizeHandler> m_normalizeHandler;   // guarded by the mutex; empty until it is needed
     P<cap::CCancelAutoplay2> m_cancelAutoplay; // created last, so it marks a complete init
 };
 

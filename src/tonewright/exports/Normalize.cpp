@@ -12,10 +12,14 @@ constexpr double kBadSource = 3.0;
 
 } // namespace
 
-double TONEWRIGHT_INORMALIZE_processAudioSource(TONEWRIGHT_Handle source, double,
-                                                TONEWRIGHT_NormalizeCallback) {
+double TONEWRIGHT_INORMALIZE_processAudioSource(TONEWRIGHT_Handle source, double targetLevel,
+                                                TONEWRIGHT_NormalizeCallback callback) {
     return barrier<double>(0.0, [&] {
-        if (!unwrap<sonora2::common::IAudioSource>(source)) return kBadSource;
-        return notAvailable("TONEWRIGHT_INORMALIZE_processAudioSource", 0.0);
+        const P<sonora2::common::IAudioSource> object = unwrap<sonora2::common::IAudioSource>(source);
+        if (!object) return kBadSource;
+        // Held until the end: the library must stay loaded if the application is shut down meanwhile.
+        const P<tonewright::CNormalizeHandler> handler = requireApp()->getNormalizeHandler();
+        return handler->findGain(*object, targetLevel,
+                                 [callback](double fraction) { return !callback || callback(fraction); });
     });
 }
