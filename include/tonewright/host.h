@@ -336,6 +336,42 @@ TONEWRIGHT_API int64_t TONEWRIGHT_Host_ReadFrames(TONEWRIGHT_Handle reader, void
 /* Reading continues with the frame at that time, or the first one after it. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_Seek(TONEWRIGHT_Handle reader, double seconds);
 
+/* --- Loudness and gain ---------------------------------------------------------------------------- */
+
+/* The loudness of sound. */
+typedef struct TONEWRIGHT_Loudness {
+    size_t size;
+    double integrated; /* LUFS, as in EBU R 128; negative infinity if nothing was louder than -70 LUFS for 400
+                          ms */
+    double truePeak;   /* the highest value of the curve through the samples (ITU-R BS.1770), as a factor of
+                          full scale; floating-point samples may exceed 1.0 */
+    double samplePeak; /* the highest sample */
+} TONEWRIGHT_Loudness;
+
+/* Progress of a measurement from 0.0 to 1.0. Returns a TONEWRIGHT_Answer: after TONEWRIGHT_STOP the part read
+ * so far counts, after TONEWRIGHT_DISCARD there is no result. */
+typedef int32_t (*TONEWRIGHT_LoudnessProgress)(double fraction, void* user);
+
+/* Reads a source to its end, from its current position if it is open, and closes it. Opened again, it starts
+ * at its beginning; one that can be read only once is used up. Floating-point samples of a file are measured
+ * unclipped. The callback may be null. Returns a handle to the measurement; null on failure and after
+ * TONEWRIGHT_DISCARD. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_MeasureLoudness(TONEWRIGHT_Handle source,
+                                                                 TONEWRIGHT_LoudnessProgress callback,
+                                                                 void* user);
+
+/* The result of a measurement, or of several together, such as the tracks of an album. */
+TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetLoudness(const TONEWRIGHT_Handle* measurements, int32_t count,
+                                                   TONEWRIGHT_Loudness* loudness);
+
+/* A source that delivers another one with its samples multiplied by `gain`, and with `bytesPerSample`; with 0
+ * it has the width of the other source, and passes floating-point samples on like
+ * TONEWRIGHT_Host_OpenMedia. Samples are calculated in double precision and rounded once; those beyond full
+ * scale clip unless they stay floating-point. The new source is as open as the other one, which it keeps
+ * alive and which must not be used otherwise. Null for a gain that is negative or not finite. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateGainSource(TONEWRIGHT_Handle source, double gain,
+                                                                  int32_t bytesPerSample);
+
 /* --- Sound devices ------------------------------------------------------------------------------- */
 
 /* What a device does. */
