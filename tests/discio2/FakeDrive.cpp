@@ -68,7 +68,7 @@ bool answer(const unsigned char* command, std::string& reply) {
         return true;
     }
     case 0x12: // INQUIRY
-        reply = std::string("\5\x80\2\2\x1f\0\0\0", 8) + "ACME    Disc reader     1.00";
+        reply.assign("\5\x80\2\2\x1f\0\0\0", 8).append("ACME    Disc reader     1.00");
         return true;
     default:
         return false;
