@@ -29,6 +29,8 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     peru/streams/StreamTools.h
     peru/strings/ICharEncoding.h
     peru/strings/IString.h
+    peru/strings/IStringLocalizer.h
+    peru/strings/LocalizedFormat.h
     peru/strings/String.h
     peru/strings/StringFormat.h
     peru/system/IPathes.h

@@ -57,4 +57,9 @@ void failSystem(const peru::SLocalizedText& text, const SMediaFile& file, int er
     fail(text, file.getDisplayName(), peru::CString::fromUTF8(std::generic_category().message(errorNumber)));
 }
 
+void failSystem(const char* doing, const SMediaFile& file, int errorNumber) {
+    fail("%s %s: %s", doing, file.getDisplayName(),
+         peru::CString::fromUTF8(std::generic_category().message(errorNumber)));
+}
+
 } // namespace sonora2::plugins

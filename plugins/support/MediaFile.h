@@ -57,5 +57,7 @@ template <class... Args> [[noreturn]] void fail(const char* text, const Args&...
 }
 // The same for a failed call of the system. The text's fields are the file and the reason.
 [[noreturn]] void failSystem(const peru::SLocalizedText& text, const SMediaFile& file, int errorNumber);
+// The same without a translation: `doing` is a phrase such as "could not open".
+[[noreturn]] void failSystem(const char* doing, const SMediaFile& file, int errorNumber);
 
 } // namespace sonora2::plugins

@@ -73,6 +73,14 @@ PLACEHOLDERS = {
     "%REQUIRED%": "the name of a package",
     "%SRC%": "the file or folder that is read",
     "%TYPE%": "a type of pictures, or what was given instead of a MIME type",
+    "%COUNT%": "a number of messages",
+    "%OPERATION%": "a function of a plug-in, with the file in parentheses",
+    "%PLUGIN%": "the name of a plug-in, such as sonora2_flac",
+    "%PROGRAM%": "the name of a program",
+    "%SECONDS%": "a number of seconds",
+    "%SIGNAL%": "the number of a signal of the operating system",
+    "%TIME%": "a time, such as 3:05.2",
+    "%TOTAL%": "a time, such as 3:05.2",
     "%URI%": "the location of a file or stream",
 }
 PLACEHOLDER = re.compile(r"%[A-Z]+%")
