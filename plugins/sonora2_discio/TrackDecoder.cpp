@@ -1,7 +1,5 @@
 #include "sonora2_discio/TrackDecoder.h"
 
-#include "disciopp/LazyLibrary.h"
-
 namespace sonora2::plugins::discio {
 
 CTrackDecoder::~CTrackDecoder() {
@@ -21,7 +19,9 @@ void CTrackDecoder::require(int32_t result) const {
 SDecodedMedia CTrackDecoder::open(const SDecoderOptions&) {
     close();
     try {
-        m_track = disciopp::getLibrary()->openTrack(m_file.uri);
+        // Not the instance that lasts for the process, which would be lost when this plug-in is unloaded.
+        if (!m_library.library) m_library = disciopp::loadLibrary();
+        m_track = m_library.library->openTrack(m_file.uri);
     } catch (const peru::CException& error) {
         fail("could not open %s: %s", m_file.getDisplayName(), error.getDescription());
     }

@@ -1,7 +1,7 @@
 // Reads an audio track.
 #pragma once
 
-#include "disciopp/ITrackStream.h"
+#include "disciopp/LazyLibrary.h"
 #include "support/Decoder.h"
 
 namespace sonora2::plugins::discio {
@@ -21,7 +21,8 @@ private:
     void require(int32_t result) const;
 
     SMediaFile m_file;
-    P<disciopp::ITrackStream> m_track; // while open
+    disciopp::SLoadedLibrary m_library; // with the first track
+    P<disciopp::ITrackStream> m_track;  // while open
 };
 
 } // namespace sonora2::plugins::discio
