@@ -16,7 +16,7 @@ get_property(internal_libraries GLOBAL PROPERTY TONEWRIGHT_INTERNAL_LIBRARIES)
 get_property(plugins GLOBAL PROPERTY TONEWRIGHT_PLUGINS)
 get_property(companions GLOBAL PROPERTY TONEWRIGHT_COMPANIONS)
 
-set(c_libraries tonewright tonewright_host_support)
+set(c_libraries tonewright tonewright_host_support discio2)
 list(REMOVE_ITEM libraries ${c_libraries})
 foreach(library ${libraries})
     target_include_directories(${library} INTERFACE $<INSTALL_INTERFACE:${include_dir}>)

@@ -58,7 +58,7 @@ if(TONEWRIGHT_PACKAGING)
     foreach(library ${libraries})
         string(APPEND shlibs "lib${library} ${PROJECT_VERSION_MAJOR} ${libraries_package} (= ${PROJECT_VERSION}-${CPACK_DEBIAN_PACKAGE_RELEASE})\n")
     endforeach()
-    foreach(library tonewright tonewright_host)
+    foreach(library tonewright tonewright_host discio2)
         string(APPEND shlibs "lib${library} ${PROJECT_VERSION_MAJOR} ${libraries_package} (>= ${PROJECT_VERSION})\n")
     endforeach()
     file(WRITE ${PROJECT_BINARY_DIR}/shlibs "${shlibs}")
@@ -67,7 +67,7 @@ if(TONEWRIGHT_PACKAGING)
     add_custom_command(
         OUTPUT ${symbols}
         COMMAND dpkg-gensymbols -p${libraries_package} -v${PROJECT_VERSION} -I${known_symbols} -O${symbols}
-                -e$<TARGET_FILE:tonewright> -e$<TARGET_FILE:tonewright_host_support>
+                -e$<TARGET_FILE:tonewright> -e$<TARGET_FILE:tonewright_host_support> -e$<TARGET_FILE:discio2>
         DEPENDS ${c_libraries} ${known_symbols}
         COMMENT "Versions of the exported functions"
         VERBATIM

@@ -54,7 +54,7 @@ CPicture::SRectangle CPicture::locate(const SPlane& plane, int x, int y, int wid
     const int64_t pitch = getPitch(plane);
     return {getPixels() + plane.offset + (y >> plane.shift) * pitch +
                 int64_t{x >> plane.shift} * plane.unitBytes,
-            pitch, int64_t{width >> plane.shift} * plane.unitBytes, height >> plane.shift};
+            pitch, int64_t{width >> plane.shift} * plane.unitBytes, width > 0 ? height >> plane.shift : 0};
 }
 
 P<peru::IMemoryBlock> CPicture::getImagePlane(int plane, int x, int y, int width, int height) {
@@ -110,7 +110,8 @@ P<ISonoraPicture> CPicture::getRGBPicture() {
     if (!m_rgb) {
         static_cast<void>(getPixels()); // before memory is taken for a size that another process has stated
         P<peru::IMemoryBlock> block = m_memory->getBlock(int64_t{m_width} * m_height * 4);
-        convertToRGB(reinterpret_cast<uint32_t*>(block->getData()));
+        // A picture without pixels may state any number of rows.
+        if (m_width > 0) convertToRGB(reinterpret_cast<uint32_t*>(block->getData()));
         m_rgb =
             peru::make<CRGBPicture>(m_memory, m_timestamp, m_width, m_height, m_flipped, std::move(block));
     }
@@ -129,7 +130,7 @@ void CPicture::copyRGBRect(uint8_t* destination, int pitch, int x, int y, int wi
     const SPlane layout = getPlane(0);
     const int64_t step = m_flipped ? -getPitch(layout) : getPitch(layout);
     const uint8_t* from = getPixels() + first * getPitch(layout) + int64_t{x} * layout.unitBytes;
-    for (int row = 0; row < height; ++row)
+    for (int row = 0; row < height && width > 0; ++row)
         std::memcpy(destination + int64_t{row} * pitch, from + row * step, static_cast<size_t>(width) * 4);
 }
 
@@ -143,7 +144,8 @@ P<ISonoraPicture> CPicture::createThumbnail() {
     for (int i = 0; i < getPlaneCount(); ++i) {
         const SPlane own = getPlane(i), reduced = thumbnail->getPlane(i);
         const int64_t unit = own.unitBytes;
-        const int columns = thumbnail->m_width >> reduced.shift, rows = thumbnail->m_height >> reduced.shift;
+        const int columns = thumbnail->m_width >> reduced.shift;
+        const int rows = columns > 0 ? thumbnail->m_height >> reduced.shift : 0;
         uint8_t* to = thumbnail->getPixels() + reduced.offset;
         for (int row = 0; row < rows; ++row) {
             const uint8_t* from = pixels + own.offset + int64_t{row} * kThumbnailStep * getPitch(own);
