@@ -30,8 +30,10 @@ extern "C" {
 
 /* --- Loudness ------------------------------------------------------------------------------------ */
 
+/* Measures loudness. For one thread at a time. */
 typedef struct TONEWRIGHT_Analysator TONEWRIGHT_Analysator;
 
+/* The operations of an analyser, each with the analyser as its first argument. */
 typedef struct TONEWRIGHT_AnalysatorOperations {
     void (*unused)(void);
     /* Starts a measurement; a previous one is discarded. */
@@ -46,6 +48,7 @@ typedef struct TONEWRIGHT_AnalysatorOperations {
     double (*result)(TONEWRIGHT_Analysator* self);
 } TONEWRIGHT_AnalysatorOperations;
 
+/* What createNormalizeAnalysator returns. */
 struct TONEWRIGHT_Analysator {
     const TONEWRIGHT_AnalysatorOperations* operations;
 };
@@ -79,8 +82,10 @@ AUDIOTOOLS_API double getAnalysatorLoudness(TONEWRIGHT_Analysator* const* analys
 
 /* --- Equalizer ----------------------------------------------------------------------------------- */
 
+/* Changes the level of ten bands. For one thread at a time. */
 typedef struct TONEWRIGHT_Equalizer TONEWRIGHT_Equalizer;
 
+/* The operations of an equalizer, each with the equalizer as its first argument. */
 typedef struct TONEWRIGHT_EqualizerOperations {
     void (*unused)(void);
     /* Sets the format of the samples and forgets those before. Formats that do not exist are accepted; their
@@ -94,6 +99,7 @@ typedef struct TONEWRIGHT_EqualizerOperations {
     void (*destroy)(TONEWRIGHT_Equalizer* self);
 } TONEWRIGHT_EqualizerOperations;
 
+/* What createEqualizer returns. */
 struct TONEWRIGHT_Equalizer {
     const TONEWRIGHT_EqualizerOperations* operations;
 };

@@ -23,16 +23,22 @@
 extern "C" {
 #endif
 
+/* The drives that were found. Like all handles, released with DISCIO_Release. */
 typedef struct DISCIO_Library DISCIO_Library;
+/* A drive, with or without a medium. */
 typedef struct DISCIO_Drive DISCIO_Drive;
+/* A medium, with the table of contents that was read when it was opened. */
 typedef struct DISCIO_Disc DISCIO_Disc;
+/* A position in the files of a data disc. */
 typedef struct DISCIO_DataCursor DISCIO_DataCursor;
 
 /* --- Library ---------------------------------------------------------------------------------------------
  */
 
+/* The version of this interface, for DISCIO_CreateEx. */
 enum { DISCIO_API_VERSION = 1 };
 
+/* The codes of failures. */
 enum {
     DISCIO_ERROR_NONE = 0,
     DISCIO_ERROR_INTERNAL = 1,
@@ -58,6 +64,7 @@ enum {
     DISCIO_ERROR_BROKEN_FILE_SYSTEM = 38
 };
 
+/* What DISCIO_CreateEx works on. */
 typedef struct DISCIO_Options {
     uint32_t size;         /* of this structure */
     uint32_t flags;        /* 0 */
@@ -176,6 +183,7 @@ typedef struct DISCIO_PCMAudioStreamFuncs {
     void (*end)(void* user);
 } DISCIO_PCMAudioStreamFuncs;
 
+/* A stream of samples: 16 bits, interleaved, in the byte order of the machine. */
 typedef struct DISCIO_PCMAudioStream {
     uint32_t kind; /* private */
     const DISCIO_PCMAudioStreamFuncs* funcs;

@@ -488,7 +488,7 @@ typedef struct TONEWRIGHT_CDDBSettings {
     const char* proxy;       /* "host", "host:port" or a URI, where the port is 80 unless stated; null: the
                                 proxy of the system; empty: none */
     const char* noProxy;     /* hosts that `proxy` does not serve, in the form of no_proxy; none */
-    int32_t connectTimeout;  /* milliseconds until the connection stands; 10000 */
+    int32_t connectTimeout;  /* milliseconds until the connection is made; 10000 */
     int32_t silenceTimeout;  /* milliseconds without a byte; 30000 */
     int32_t totalTimeout;    /* milliseconds for each request; unlimited */
     const char* codePage;    /* encoding of replies that are not UTF-8, by its name for iconv; the one that
@@ -527,7 +527,9 @@ typedef struct TONEWRIGHT_CDDBCandidate {
     const char* title; /* usually artist and album */
 } TONEWRIGHT_CDDBCandidate;
 
+/* The number of records that the last query has found; 0 for an invalid handle. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBCandidateCount(TONEWRIGHT_Handle cddb);
+/* Fills the record with that index, from 0: 1, or 0 for an invalid handle or index. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBCandidate(TONEWRIGHT_Handle cddb, int32_t index,
                                                         TONEWRIGHT_CDDBCandidate* candidate);
 
@@ -547,6 +549,7 @@ typedef struct TONEWRIGHT_CDDBRecord {
     int32_t trackCount;
 } TONEWRIGHT_CDDBRecord;
 
+/* A track of a record. The texts are valid until the record is destroyed. */
 typedef struct TONEWRIGHT_CDDBTrack {
     size_t size;
     const char* artist; /* empty unless the disc is a compilation */
@@ -554,7 +557,9 @@ typedef struct TONEWRIGHT_CDDBTrack {
     const char* notes;
 } TONEWRIGHT_CDDBTrack;
 
+/* Fills what a record says of the disc: 1, or 0 for an invalid handle. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBRecord(TONEWRIGHT_Handle record, TONEWRIGHT_CDDBRecord* disc);
+/* Fills what a record says of the track with that index, from 0: 1, or 0 for an invalid handle or index. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetCDDBTrack(TONEWRIGHT_Handle record, int32_t index,
                                                     TONEWRIGHT_CDDBTrack* track);
 
