@@ -113,7 +113,8 @@ function(tw_benchmark name)
 endfunction()
 
 # tw_fuzzer(NAME source... LIBRARIES lib... [RUNS count]): a libFuzzer target with seeds in fuzz/corpus/NAME. Its
-# test runs the seeds and a bounded number of mutations; new inputs are stored in the build directory.
+# test runs the seeds and a bounded number of mutations, the same ones in every fresh build tree; new inputs are stored in
+# the build directory, so a further run goes on from them.
 function(tw_fuzzer name)
     cmake_parse_arguments(arg "" "RUNS" "LIBRARIES" ${ARGN})
     if(NOT arg_RUNS)
@@ -125,7 +126,7 @@ function(tw_fuzzer name)
     target_link_options(${name} PRIVATE -fsanitize=fuzzer)
     set(found ${PROJECT_BINARY_DIR}/corpus/${name})
     file(MAKE_DIRECTORY ${found})
-    add_test(NAME ${name} COMMAND ${name} -runs=${arg_RUNS} -max_len=4096 -timeout=20 -rss_limit_mb=2048
+    add_test(NAME ${name} COMMAND ${name} -seed=1 -runs=${arg_RUNS} -max_len=4096 -timeout=20 -rss_limit_mb=2048
                                  ${found} ${PROJECT_SOURCE_DIR}/fuzz/corpus/${name})
     set_tests_properties(${name} PROPERTIES LABELS fuzz TIMEOUT 600)
 endfunction()

@@ -29,6 +29,7 @@ P<CPicture> CYUY2Picture::createSame(int width, int height, P<peru::IMemoryBlock
 P<ISonoraPicture> CYUY2Picture::createThumbnail() {
     const uint8_t* pixels = getPixels();
     P<CYUY2Picture> thumbnail(createEmptySame(getWidth() / 16 * 4, getHeight() / 4));
+    if (thumbnail->getWidth() == 0) return thumbnail; // it may state any number of rows
     uint8_t* to = thumbnail->getPixels();
     const int64_t pitch = getPitch(getPlane(0));
     for (int y = 0; y < thumbnail->getHeight(); ++y) {
