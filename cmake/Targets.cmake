@@ -37,6 +37,8 @@ endif()
 # Installed below lib and libexec.
 set(TONEWRIGHT_PLUGIN_FOLDER ${CMAKE_INSTALL_LIBDIR}/tonewright)
 set(TONEWRIGHT_COMPANION_FOLDER ${CMAKE_INSTALL_LIBEXECDIR}/tonewright)
+set(TONEWRIGHT_GENERATED_DIR ${PROJECT_BINARY_DIR}/generated)
+configure_file(${CMAKE_CURRENT_LIST_DIR}/InstallFolders.h.in ${TONEWRIGHT_GENERATED_DIR}/InstallFolders.h @ONLY)
 
 # tw_library(NAME [INTERNAL] [C_INTERFACE] FOLDERS folder... [PUBLIC lib...] [PRIVATE lib...]): a shared library with the
 # alias tw::NAME. An INTERNAL one is installed to the plug-in folder, since only other libraries of the project link it.

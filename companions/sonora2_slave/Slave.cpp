@@ -1,5 +1,6 @@
 #include "sonora2_slave/Slave.h"
 
+#include "InstallFolders.h"
 #include "peru/pipes/IPipeManager.h"
 #include "peru/streams/DataStreams.h"
 #include "peru/strings/StringFormat.h"

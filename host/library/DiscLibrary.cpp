@@ -1,5 +1,6 @@
 #include "library/DiscLibrary.h"
 
+#include "InstallFolders.h"
 #include "base/Text.h"
 
 #include <dlfcn.h>

@@ -1,5 +1,6 @@
 #include "library/Library.h"
 
+#include "InstallFolders.h"
 #include "base/Translation.h"
 
 #include <cstdlib>

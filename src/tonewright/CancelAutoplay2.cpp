@@ -1,5 +1,6 @@
 #include "tonewright/CancelAutoplay2.h"
 
+#include "InstallFolders.h"
 #include "peru/Errors.h"
 #include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"

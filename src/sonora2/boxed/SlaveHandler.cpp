@@ -1,5 +1,6 @@
 #include "sonora2/boxed/SlaveHandler.h"
 
+#include "InstallFolders.h"
 #include "peru/log/ILog.h"
 #include "peru/pipes/IPipeManager.h"
 #include "peru/remote/MessageOutStream.h"

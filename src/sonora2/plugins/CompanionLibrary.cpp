@@ -1,5 +1,6 @@
 #include "sonora2/plugins/CompanionLibrary.h"
 
+#include "InstallFolders.h"
 #include "peru/Errors.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/system/IPathes.h"

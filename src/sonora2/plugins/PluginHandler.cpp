@@ -1,5 +1,6 @@
 #include "sonora2/plugins/PluginHandler.h"
 
+#include "InstallFolders.h"
 #include "peru/IInterfaceQuery.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/system/IPathes.h"
