@@ -36,6 +36,7 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     peru/system/IPathes.h
     peru/threads/IMutex.h
     peru/threads/IThreadManager.h
+    peru/threads/ThreadBudget.h
     peru/uri/IURI.h
     peru/uri/URI.h
 

@@ -1,5 +1,6 @@
 #include "sonora2_flac/FlacEncoder.h"
 
+#include "peru/threads/ThreadBudget.h"
 #include "support/Pcm.h"
 
 #include <algorithm>
@@ -14,7 +15,6 @@ namespace {
 
 constexpr int kDefaultLevel = 5;
 constexpr int kHighestLevel = 8;
-constexpr int kBlockFrames = 4096; // per call of the library, so that they stay in the cache
 
 // Space for the seek table is reserved before the length is known. When a long file has filled it, every
 // second point is dropped and the spacing doubles.
@@ -22,6 +22,7 @@ constexpr int kSeekPoints = 240;
 constexpr int kSeekSeconds = 10;
 constexpr int kSeekPointBytes = 18;
 constexpr int kBlockHeaderBytes = 4;
+constexpr int64_t kStreamInfoStart = 4 + kBlockHeaderBytes;
 constexpr int kPaddingBytes = 8192;
 constexpr int kHeaderBytes =
     4 + kBlockHeaderBytes + 34 + 2 * kBlockHeaderBytes + kSeekPoints * kSeekPointBytes + kPaddingBytes + 48;
@@ -51,53 +52,61 @@ bool CFlacEncoder::accepts(const SPcmFormat& format) const {
 void CFlacEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
     m_file = &file;
     m_format = settings.format;
-    m_planes.resize(static_cast<size_t>(kBlockFrames) * m_format.channels);
     m_seekSpacing = int64_t{kSeekSeconds} * m_format.rate;
-    m_encoder.reset(FLAC__stream_encoder_new());
+    SStreamSettings stream{m_format, kDefaultLevel};
+    if (settings.quality) stream.level = static_cast<int>(std::lround(*settings.quality * kHighestLevel));
+    m_encoder = std::make_unique<CLibraryEncoder>(stream);
     m_seekTable.reset(FLAC__metadata_object_new(FLAC__METADATA_TYPE_SEEKTABLE));
     m_padding.reset(FLAC__metadata_object_new(FLAC__METADATA_TYPE_PADDING));
-    if (!m_encoder || !m_seekTable || !m_padding ||
+    if (!m_seekTable || !m_padding ||
         !FLAC__metadata_object_seektable_template_append_placeholders(m_seekTable.get(), kSeekPoints))
         throw std::bad_alloc();
     m_padding->length = kPaddingBytes;
     std::array<FLAC__StreamMetadata*, 2> blocks{m_seekTable.get(), m_padding.get()};
 
-    FLAC__StreamEncoder* encoder = m_encoder.get();
-    const uint32_t rate = static_cast<uint32_t>(m_format.rate);
-    const int level =
-        settings.quality ? static_cast<int>(std::lround(*settings.quality * kHighestLevel)) : kDefaultLevel;
-    FLAC__stream_encoder_set_channels(encoder, static_cast<uint32_t>(m_format.channels));
-    FLAC__stream_encoder_set_bits_per_sample(encoder, static_cast<uint32_t>(m_format.bytesPerSample * 8));
-    FLAC__stream_encoder_set_sample_rate(encoder, rate);
-    FLAC__stream_encoder_set_compression_level(encoder, static_cast<uint32_t>(level));
-    // Rates that a frame header cannot encode are still valid outside of the streamable subset.
-    if (!FLAC__format_sample_rate_is_subset(rate)) FLAC__stream_encoder_set_streamable_subset(encoder, false);
+    FLAC__StreamEncoder* encoder = m_encoder->get();
+    m_encoder->configure();
     FLAC__stream_encoder_set_metadata(encoder, blocks.data(), blocks.size());
     const FLAC__StreamEncoderInitStatus status =
         FLAC__stream_encoder_init_stream(encoder, onWrite, onSeek, onTell, nullptr, this);
-    if (status == FLAC__STREAM_ENCODER_INIT_STATUS_OK) return;
-    file.throwFailure();
-    fail({"sonora2.plugins.write", "could not write %s: %s"}, file.getFile().getDisplayName(),
-         FLAC__StreamEncoderInitStatusString[status]);
-}
-
-void CFlacEncoder::write(const uint8_t* pcm, int frames) {
-    std::array<FLAC__int32*, FLAC__MAX_CHANNELS> planes{};
-    for (int i = 0; i < m_format.channels; ++i) planes[i] = m_planes.data() + int64_t{i} * kBlockFrames;
-    for (int done = 0; done < frames; done += kBlockFrames) {
-        const int count = std::min(frames - done, kBlockFrames);
-        const uint8_t* from = pcm + int64_t{done} * m_format.frameBytes();
-        for (int i = 0; i < m_format.channels; ++i)
-            pcm::unpackChannel(from + i * m_format.bytesPerSample, m_format.bytesPerSample, m_format.channels,
-                               planes[i], static_cast<size_t>(count));
-        if (!FLAC__stream_encoder_process(m_encoder.get(), planes.data(), static_cast<uint32_t>(count)))
-            failEncoding();
+    if (status != FLAC__STREAM_ENCODER_INIT_STATUS_OK) {
+        file.throwFailure();
+        failEncoding(FLAC__StreamEncoderInitStatusString[status]);
+    }
+    if (peru::getThreadBudget().getLimit() > 1 && CFrameRunEncoder::canSplit(stream)) {
+        const int blockFrames = static_cast<int>(FLAC__stream_encoder_get_blocksize(encoder));
+        m_parallel = std::make_unique<CParallelEncoder>(stream, blockFrames, static_cast<IFrameSink&>(*this));
+        MD5Init(&m_hash);
     }
 }
 
+void CFlacEncoder::write(const uint8_t* pcm, int frames) {
+    if (m_parallel) {
+        addToHash(pcm, static_cast<size_t>(frames) * m_format.frameBytes());
+        m_parallel->write(pcm, frames);
+    } else if (!m_encoder->process(pcm, frames)) {
+        failEncoding(getState());
+    }
+}
+
+void CFlacEncoder::update() {
+    // What arrives slowly, from a recorder for example, is in the file all the same.
+    if (m_parallel && !m_parallel->takeProgress()) m_parallel->flush();
+}
+
 void CFlacEncoder::finish() {
-    // The library completes length, frame sizes and checksum; we write the table.
-    if (!FLAC__stream_encoder_finish(m_encoder.get())) failEncoding();
+    if (const std::vector<uint8_t>* whole = m_parallel ? m_parallel->getUncut() : nullptr) {
+        if (!m_encoder->process(whole->data(), static_cast<int>(whole->size()) / m_format.frameBytes()))
+            failEncoding(getState());
+        m_parallel.reset();
+    }
+    if (m_parallel) {
+        m_parallel->finish();
+        writeStreamInfo();
+    } else if (!FLAC__stream_encoder_finish(m_encoder->get())) {
+        // The library completes length, frame sizes and checksum.
+        failEncoding(getState());
+    }
     writeSeekTable();
     m_file = nullptr;
 }
@@ -118,6 +127,48 @@ void CFlacEncoder::addSeekPoint(int64_t offset, uint32_t frames) {
     m_seekPoints.push_back({m_encoded, offset, frames});
 }
 
+void CFlacEncoder::addFrame(const uint8_t* bytes, size_t size, uint32_t samples) {
+    const uint32_t frameBytes = static_cast<uint32_t>(size);
+    m_smallestFrame = m_smallestFrame == 0 ? frameBytes : std::min(m_smallestFrame, frameBytes);
+    m_largestFrame = std::max(m_largestFrame, frameBytes);
+    noteFrame(samples);
+    m_file->write(bytes, size);
+}
+
+void CFlacEncoder::noteFrame(uint32_t samples) {
+    if (m_soundStart < 0) m_soundStart = m_file->tell();
+    addSeekPoint(m_file->tell() - m_soundStart, samples);
+    m_encoded += samples;
+}
+
+void CFlacEncoder::addToHash(const uint8_t* pcm, size_t size) {
+    if (m_format.bytesPerSample == 1) { // the checksum is of signed samples
+        m_signed.assign(pcm, pcm + size);
+        pcm::flipSign8(m_signed.data(), size);
+        pcm = m_signed.data();
+    }
+    MD5Update(&m_hash, pcm, size);
+}
+
+// What the library writes at the end of a stream that it has encoded itself. Source: RFC 9639, section 8.2.
+void CFlacEncoder::writeStreamInfo() {
+    std::array<uint8_t, 6> frameSizes;
+    putBigEndian(frameSizes.data(), m_smallestFrame, 3);
+    putBigEndian(frameSizes.data() + 3, m_largestFrame, 3);
+    m_file->seek(kStreamInfoStart + 4);
+    m_file->write(frameSizes.data(), frameSizes.size());
+
+    // Rate, channels, width of the samples, length.
+    const uint64_t length = m_encoded < int64_t{1} << 36 ? static_cast<uint64_t>(m_encoded) : 0;
+    std::array<uint8_t, 8 + MD5_DIGEST_LENGTH> rest;
+    putBigEndian(rest.data(),
+                 uint64_t(m_format.rate) << 44 | uint64_t(m_format.channels - 1) << 41 |
+                     uint64_t(m_format.bytesPerSample * 8 - 1) << 36 | length,
+                 8);
+    MD5Final(rest.data() + 8, &m_hash);
+    m_file->write(rest.data(), rest.size());
+}
+
 void CFlacEncoder::writeSeekTable() {
     if (m_seekTableStart < 0 || m_seekPoints.empty()) return;
     std::vector<uint8_t> table(m_seekPoints.size() * kSeekPointBytes);
@@ -132,11 +183,14 @@ void CFlacEncoder::writeSeekTable() {
     m_file->write(table.data(), table.size());
 }
 
-void CFlacEncoder::failEncoding() {
+const char* CFlacEncoder::getState() const {
+    return FLAC__stream_encoder_get_resolved_state_string(m_encoder->get());
+}
+
+void CFlacEncoder::failEncoding(const char* reason) {
     COutputFile* file = std::exchange(m_file, nullptr);
     file->throwFailure();
-    fail({"sonora2.plugins.write", "could not write %s: %s"}, file->getFile().getDisplayName(),
-         FLAC__stream_encoder_get_resolved_state_string(m_encoder.get()));
+    fail({"sonora2.plugins.write", "could not write %s: %s"}, file->getFile().getDisplayName(), reason);
 }
 
 FLAC__StreamEncoderWriteStatus CFlacEncoder::onWrite(const FLAC__StreamEncoder*, const FLAC__byte data[],
@@ -145,9 +199,7 @@ FLAC__StreamEncoderWriteStatus CFlacEncoder::onWrite(const FLAC__StreamEncoder*,
     COutputFile* file = encoder->m_file;
     if (!file) return FLAC__STREAM_ENCODER_WRITE_STATUS_FATAL_ERROR;
     if (samples > 0) {
-        if (encoder->m_soundStart < 0) encoder->m_soundStart = file->tell();
-        encoder->addSeekPoint(file->tell() - encoder->m_soundStart, samples);
-        encoder->m_encoded += samples;
+        encoder->noteFrame(samples);
     } else if (encoder->m_seekTableStart < 0 && size == kBlockHeaderBytes + kSeekPoints * kSeekPointBytes &&
                (data[0] & 0x7F) == FLAC__METADATA_TYPE_SEEKTABLE) {
         // The header arrives one metadata block per call.

@@ -40,6 +40,7 @@ void CEncoderFormat::open() {
         m_settings.format = m_integerFormat;
         throw;
     }
+    m_share = std::make_unique<peru::CThreadShare>();
     m_output = std::move(output);
     m_encoder = std::move(encoder);
     m_updated = std::chrono::steady_clock::now();
@@ -47,6 +48,7 @@ void CEncoderFormat::open() {
 }
 
 void CEncoderFormat::close() {
+    const std::unique_ptr<peru::CThreadShare> share = std::move(m_share);
     const std::unique_ptr<COutputFile> output = std::move(m_output);
     const std::unique_ptr<IEncoder> encoder = std::move(m_encoder);
     m_settings.format = m_integerFormat;
@@ -65,6 +67,7 @@ void CEncoderFormat::discard() noexcept {
     m_encoder.reset();
     if (m_output) m_output->discard();
     m_output.reset();
+    m_share.reset();
     m_settings.format = m_integerFormat;
 }
 

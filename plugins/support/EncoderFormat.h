@@ -1,6 +1,7 @@
 // An audio format that writes through an encoder.
 #pragma once
 
+#include "peru/threads/ThreadBudget.h"
 #include "sonora2/context/ISonoraContext.h"
 #include "sonora2/media/IAudioFormat.h"
 #include "sonora2/media/IDiscardable.h"
@@ -56,6 +57,7 @@ private:
     std::unique_ptr<IEncoder> m_estimator; // used for estimates only, never opened
     const SPcmFormat m_integerFormat;      // unless floating point is used
     SEncoderSettings m_settings;
+    std::unique_ptr<peru::CThreadShare> m_share;     // while open
     std::unique_ptr<COutputFile> m_output;           // while open
     std::unique_ptr<IEncoder> m_encoder;             // writes to the output
     std::chrono::steady_clock::time_point m_updated; // when the file was last complete on disk
