@@ -19,8 +19,6 @@ using Server = ISourceServer;
 
 namespace {
 
-constexpr size_t kMostChunks = 64; // in a run
-
 // The error of a call as text; empty if there was none.
 template <class Call> P<peru::IString> getFailure(const Call& call) {
     const auto failures = peru::make<CFailures>();
@@ -113,7 +111,7 @@ void serveAudio(IRemote& remote, const P<IAudioSource>& audio, const P<CFailures
             const auto run = peru::make<sonora2::audio::CAudioRun>(memory);
             run->failure = getFailure([&] {
                 int64_t bytes = 0;
-                while (bytes < proc.nMaxBytes->getValue() && run->chunks.size() < kMostChunks) {
+                while (bytes < proc.nMaxBytes->getValue() && run->chunks.size() < run->kMostChunks) {
                     if (!run->chunks.empty() && audio->isEOF()) break;
                     run->chunks.push_back(audio->getNextAudioChunk());
                     if (!run->chunks.back()) break;

@@ -3,6 +3,7 @@
 #include "peru/Errors.h"
 #include "peru/log/ILog.h"
 #include "peru/pipes/IPipeStreams.h"
+#include "peru/remote/MessageInStream.h"
 #include "peru/remote/MessageOutStream.h"
 #include "peru/remote/RemoteException.h"
 #include "peru/streams/DataStreams.h"
@@ -107,7 +108,7 @@ private:
 CRemoteStreamClient::CRemoteStreamClient(const P<IInStream>& in, const P<IOutStream>& out)
     : m_inSource(in), m_outSource(out), m_inPipe(tryCast<IPipeInStream>(in)),
       m_outPipe(tryCast<IPipeOutStream>(out)), m_message(make<CMessageOutStream>(out)),
-      m_in(make<CDataInStream>(in)), m_out(make<CDataOutStream>(m_message)),
+      m_in(make<CMessageInStream>(in)), m_out(make<CDataOutStream>(m_message)),
       m_outMutex(getMutexFactory()->createMutex()), m_inMutex(getMutexFactory()->createMutex()),
       m_threadMutex(getMutexFactory()->createMutex()), m_stop(getSignalFactory()->createSignal()),
       m_ended(getSignalFactory()->createSignal()), m_servingMutex(getMutexFactory()->createMutex()),
@@ -133,6 +134,12 @@ P<CRemoteProc> CRemoteStreamClient::findProc(const P<IString>& name) const {
     const CMutexLock lock(m_procMutex);
     const auto found = m_procs.find(CString::toStdString(name));
     return found == m_procs.end() ? nullptr : found->second;
+}
+
+void CRemoteStreamClient::setLimits(int64_t messageBytes, int32_t textBytes) {
+    const CMutexLock outLock(m_outMutex);
+    const CMutexLock inLock(m_inMutex);
+    m_in->setLimits(messageBytes, textBytes);
 }
 
 void CRemoteStreamClient::setTempBlock(const P<IMemoryManager>& manager) {
@@ -168,6 +175,7 @@ void CRemoteStreamClient::writeRequest(CRemoteProc& proc) {
 void CRemoteStreamClient::readAnswer(CRemoteFunction& function) {
     bool isAnswered = false;
     try {
+        m_in->startMessage();
         const P<IString> line = m_in->readString();
         // An answer starts with some text. Reading once more tells a closed pipe from an empty line.
         if (line->isEmpty() && m_inPipe && m_inPipe->isAtEnd()) m_in->readUInt8();
@@ -244,6 +252,7 @@ bool CRemoteStreamClient::processOne() {
     CDeadlineScope deadline(*this);
     m_stage = EStage::reading;
     m_isFunction = false;
+    m_in->startMessage();
     const P<IString> kind = m_in->readString();
     m_isFunction = kind->equals(kFunction);
     if (!m_isFunction && !kind->equals(kVoid)) {

@@ -13,6 +13,7 @@
 
 namespace peru {
 
+class CMessageInStream;
 class CMessageOutStream;
 class IPipeInStream;
 class IPipeOutStream;
@@ -65,6 +66,10 @@ public:
     // to arrive and its answer to be sent. Without a limit by default (0). Needs pipe streams. A call that
     // fails by it closes the connection, since its answer could still arrive.
     void setDeadline(uint32_t milliseconds) { m_deadline = milliseconds; }
+    // What one message of the other end may take in bytes, and a single text in it; 0, the default, means
+    // without limit. Beyond it reading throws CRemoteException and the connection is closed. Set before the
+    // first message.
+    void setLimits(int64_t messageBytes, int32_t textBytes);
     // Gathers messages in a block of 1 MiB of the manager instead of a small buffer.
     void setTempBlock(const P<IMemoryManager>& manager);
     // Held without a reference; null removes it. Set while the thread does not run.
@@ -94,7 +99,7 @@ private:
     P<IPipeInStream> m_inPipe; // the sources, if they are pipes
     P<IPipeOutStream> m_outPipe;
     P<CMessageOutStream> m_message;
-    P<IDataInStream> m_in;
+    P<CMessageInStream> m_in;
     P<IDataOutStream> m_out;
     // Always taken in this order and held for a whole call or served message. Guard the streams and the two
     // members below.

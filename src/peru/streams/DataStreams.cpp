@@ -51,7 +51,7 @@ void writeURI(IDataOutStream& stream, const P<IURI>& uri) {
     if (uri) writeString(stream, uri->getAsString());
 }
 
-P<IString> readString(IInStream& stream) {
+P<IString> readString(IInStream& stream, int32_t most) {
     int32_t size = 0;
     int64_t known = 0;
     while (known < 4) {
@@ -61,6 +61,7 @@ P<IString> readString(IInStream& stream) {
     }
     if (size == 0) return CString::empty();
     if (size < 0) throw CEndOfStreamError(stream.getURI());
+    if (size > most) return nullptr;
 
     // The size is a claim: memory is taken only as the bytes arrive.
     constexpr int64_t kFirstStep = 64 * 1024;

@@ -6,6 +6,7 @@
 #include "peru/uri/IURI.h"
 
 #include <bit>
+#include <limits>
 
 namespace peru {
 
@@ -17,7 +18,8 @@ static_assert(std::endian::native == std::endian::little);
 PERU_API void writeString(IDataOutStream& stream, const P<IString>& value);
 PERU_API void writeObject(IDataOutStream& stream, const P<ISerializable>& object);
 PERU_API void writeURI(IDataOutStream& stream, const P<IURI>& uri);
-PERU_API P<IString> readString(IInStream& stream);
+// Returns an empty handle, with only the size read, if that is above `most`.
+PERU_API P<IString> readString(IInStream& stream, int32_t most = std::numeric_limits<int32_t>::max());
 PERU_API P<ISerializable> readObject(IDataInStream& stream, const P<ISerializable>& object);
 PERU_API P<IURI> readURI(IDataInStream& stream);
 

@@ -1,6 +1,8 @@
 #include "sonora2/boxed/AudioRun.h"
 
+#include "peru/remote/RemoteException.h"
 #include "peru/strings/String.h"
+#include "peru/strings/StringFormat.h"
 #include "sonora2/boxed/AudioChunkRemote.h"
 
 namespace sonora2::audio {
@@ -22,7 +24,10 @@ void CAudioRun::writeTo(const P<peru::IDataOutStream>& stream) const {
 void CAudioRun::readFrom(const P<peru::IDataInStream>& stream) {
     chunks.clear();
     const P<CAudioChunkRemote> reader = peru::make<CAudioChunkRemote>(m_memoryManager);
-    for (int32_t left = stream->readInt32(); left > 0; --left) {
+    const int32_t count = stream->readInt32();
+    if (count < 0 || static_cast<size_t>(count) > kMostChunks)
+        throw peru::CRemoteException(peru::format("a run of %d chunks of sound is too long", count));
+    for (int32_t left = count; left > 0; --left) {
         reader->readFrom(stream);
         chunks.push_back(reader->getChunk());
     }

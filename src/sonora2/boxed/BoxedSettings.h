@@ -15,9 +15,14 @@ constexpr const char* kBoxedPluginsParameter = "plugins";
 // without limit; if empty, the default.
 constexpr const char* kBoxedDeadlineParameter = "deadline";
 constexpr uint32_t kBoxedDeadline = 30'000;
+// So many times as long may closing a format take, which waits for its file to reach the disk.
+constexpr uint32_t kCloseDeadlineFactor = 10;
 // MiB that a slave may use in addition to its libraries; 0 means without limit; if empty, the default.
 constexpr const char* kBoxedMemoryParameter = "memory";
 constexpr uint32_t kBoxedMemory = 1024;
+// Bytes that one answer of a slave may have, and one text in it. The largest legitimate ones are pictures.
+constexpr int64_t kLargestAnswer = int64_t{512} << 20;
+constexpr int32_t kLongestAnswerText = 16 << 20;
 // Set once a slave has had the opportunity to log what the kernel lacks for its sandbox.
 constexpr const char* kBoxedWarnedParameter = "warned";
 // Followed by a plug-in's name: the URI of its library. The slave searches for the library without it.

@@ -1,6 +1,7 @@
 #include "sonora2/boxed/FormatClient.h"
 
 #include "sonora2/boxed/AudioChunkRemote.h"
+#include "sonora2/boxed/BoxedSettings.h"
 #include "sonora2/pictures/SonoraPictureRemote.h"
 
 namespace sonora2::common {
@@ -9,6 +10,7 @@ CFormatClient::CFormatClient(const P<peru::IInStream>& in, const P<peru::IOutStr
                              const P<ISonoraContext>& context, uint32_t deadline)
     : CRemoteStreamClient(in, out), m_context(context) {
     setDeadline(deadline);
+    setLimits(kLargestAnswer, kLongestAnswerText);
 }
 
 CFormatClient::~CFormatClient() = default;

@@ -1,5 +1,6 @@
 #include "sonora2/boxed/PluginClient.h"
 
+#include "sonora2/boxed/BoxedSettings.h"
 #include "sonora2/boxed/FormatClient.h"
 #include "sonora2/boxed/SourceClient.h"
 #include "sonora2/plugins/ParameterRecord.h"
@@ -12,6 +13,7 @@ CSonoraPluginClient::CSonoraPluginClient(const P<peru::IInStream>& in, const P<p
     : CRemoteStreamClient(in, out), m_inStream(in), m_outStream(out), m_context(context),
       m_callDeadline(deadline) {
     setDeadline(deadline);
+    setLimits(kLargestAnswer, kLongestAnswerText);
 }
 
 CSonoraPluginClient::~CSonoraPluginClient() = default;

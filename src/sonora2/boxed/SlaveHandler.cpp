@@ -237,9 +237,11 @@ void CSlaveHandler::fail(const char* operation, const peru::CException& exceptio
 P<IString> CSlaveHandler::describeEnd(const char* operation, const peru::CException& exception, bool isLate) {
     const P<IString> where =
         m_medium ? peru::format("%s (%s)", operation, m_medium) : peru::newString(operation);
+    // Such an answer closes the connection, upon which the slave ends in order.
+    const bool isNonsense = dynamic_cast<const peru::CRemoteException*>(&exception) != nullptr;
     int exitCode = 0;
     // The pipe closes a moment before the process ends.
-    if (m_process && m_process->wait(isLate ? 0 : kEndWait, exitCode)) {
+    if (m_process && m_process->wait(isLate ? 0 : kEndWait, exitCode) && !(isNonsense && exitCode == 0)) {
         if (exitCode > kFirstSignal)
             return peru::localize("sonora2.CSlaveHandler.killed",
                                   "The plug-in %PLUGIN% has crashed in %OPERATION% (signal %SIGNAL%).",

@@ -1,6 +1,7 @@
 // Starts a slave process for one job and connects to it.
 #pragma once
 
+#include "peru/Errors.h"
 #include "peru/Object.h"
 #include "peru/pipes/IPipeServer.h"
 #include "peru/system/IDynamicLibrary.h"
@@ -46,8 +47,13 @@ public:
             throw; // not of a remote call
         } catch (const peru::CException& exception) {
             fail(operation, exception, std::chrono::steady_clock::now() - start);
+        } catch (const std::exception& exception) { // such as an answer for which there is no memory
+            fail(operation, peru::CError(exception.what()), std::chrono::steady_clock::now() - start);
         }
     }
+    // What call() counts as late; the deadline of the context by default. 0 means never.
+    uint32_t getDeadline() const { return m_deadline; }
+    void setDeadline(uint32_t milliseconds) { m_deadline = milliseconds; }
     bool hasFailed() const;
     // Passes what the slave has logged on to the context's log. Does nothing if the slave has failed.
     void fetchLog() noexcept;

@@ -1,6 +1,7 @@
 #include "sonora2/boxed/SourceClient.h"
 
 #include "sonora2/boxed/AudioChunkRemote.h"
+#include "sonora2/boxed/BoxedSettings.h"
 #include "sonora2/media/AudioStreamInfos.h"
 #include "sonora2/pictures/SonoraPictureRemote.h"
 
@@ -10,6 +11,7 @@ CSourceClient::CSourceClient(const P<peru::IInStream>& in, const P<peru::IOutStr
                              const P<ISonoraContext>& context, uint32_t deadline)
     : CRemoteStreamClient(in, out), m_context(context) {
     setDeadline(deadline);
+    setLimits(kLargestAnswer, kLongestAnswerText);
 }
 
 CSourceClient::~CSourceClient() = default;

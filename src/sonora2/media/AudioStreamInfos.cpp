@@ -1,10 +1,13 @@
 #include "sonora2/media/AudioStreamInfos.h"
 
 #include "peru/Errors.h"
+#include "peru/strings/StringFormat.h"
 
 namespace sonora2::audio {
 
 namespace {
+
+constexpr int32_t kMostStreams = 65'536; // no container numbers more
 
 P<peru::IString> orEmpty(const P<peru::IString>& text) {
     return text ? text : peru::CString::empty();
@@ -50,8 +53,10 @@ void CAudioStreamInfos::writeTo(const P<peru::IDataOutStream>& stream) const {
 
 void CAudioStreamInfos::readFrom(const P<peru::IDataInStream>& stream) {
     m_infos.clear();
+    // An entry takes much more memory than bytes in the stream.
     const int32_t count = stream->readInt32();
-    // Nothing is reserved: the count is untrusted, and a short stream throws when it ends.
+    if (count > kMostStreams)
+        throw peru::CException(peru::format("a list of %d audio streams is not possible", count), nullptr);
     for (int32_t i = 0; i < count; ++i) {
         P<IAudioInfo> info = peru::make<CAudioInfo>();
         info->readFrom(stream);

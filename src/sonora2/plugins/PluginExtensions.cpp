@@ -13,6 +13,9 @@ using peru::IString;
 
 namespace {
 
+// What is read from another process. Every one is compared with all before it.
+constexpr int32_t kMostExtensions = 10'000;
+
 std::string toLowerAscii(std::string text) {
     for (char& c : text)
         if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
@@ -48,6 +51,9 @@ void CPluginExtensions::readFrom(const P<peru::IDataInStream>& stream) {
     if (count < 0)
         throw CSonoraError(peru::localize("sonora2.CPluginExtensions.negative",
                                           "the list of file extensions has a negative count"));
+    if (count > kMostExtensions)
+        throw CSonoraError(
+            peru::localize("sonora2.CPluginExtensions.tooMany", "the list of file extensions is too long"));
     for (int32_t i = 0; i < count; ++i) {
         P<IString> extension = stream->readString();
         // At its end the stream delivers empty texts.

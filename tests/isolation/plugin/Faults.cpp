@@ -50,14 +50,20 @@ void allocate() {
     for (std::vector<std::vector<char>> blocks;;) blocks.emplace_back(kStep, 'x');
 }
 
-// Bytes that nobody expects into everything that is open, such as the connection to the host.
-void writeGarbage() {
-    const std::string garbage(100'000, '\xff');
+// Writes into everything that is open, such as the connection to the host.
+void writeToSockets(const std::string& bytes) {
     for (int file = 3; file < 64; ++file) {
         struct stat status {};
         if (::fstat(file, &status) == 0 && S_ISSOCK(status.st_mode))
-            static_cast<void>(::send(file, garbage.data(), garbage.size(), MSG_NOSIGNAL | MSG_DONTWAIT));
+            static_cast<void>(::send(file, bytes.data(), bytes.size(), MSG_NOSIGNAL | MSG_DONTWAIT));
     }
+}
+
+// The answer to a request for sound, with a text in it that is said to be very long.
+std::string makeLongAnswer() {
+    using namespace std::string_literals;
+    return "\6\0\0\0return\6\0\0\0Result\0"s + "\0\0\0\0\0"s + std::string(8, '\0') + "\xff\xff\xff\x7f" +
+           std::string(100'000, 'x');
 }
 
 void closeAll() {
@@ -98,8 +104,10 @@ const std::map<std::string, std::function<void()>> kFaults = {
      [] {
          for (;;) ::pause();
      }},
+    {"pause", [] { ::usleep(600'000); }},
     {"allocate", allocate},
-    {"garbage", writeGarbage},
+    {"garbage", [] { writeToSockets(std::string(100'000, '\xff')); }},
+    {"long-answer", [] { writeToSockets(makeLongAnswer()); }},
     {"close-all", closeAll},
     {"read-outside", [] { report("read", ::open(getVictim(kVictimFile).c_str(), O_RDONLY) < 0); }},
     {"write-outside",

@@ -428,6 +428,30 @@ TEST_F(RemotePeer, SizesThatLieTakeNoMemory) {
     EXPECT_LT(block->getCapacity(), 1 << 20);
 }
 
+// Of a size above the limit nothing is read and nothing allocated, even if all of it would arrive.
+TEST_F(RemotePeer, MessagesAreLimited) {
+    m_remote->setLimits(300, 100);
+    m_remote->startWorkInThread(10);
+    for (int i = 0; i < 10; ++i) { // each below the limit, and together above it
+        m_peer->send(addRequest());
+        EXPECT_EQ(m_peer->receive(), addAnswer());
+    }
+    m_remote->stopWorkInThread();
+    m_peer->send(wire("return") + wire("Result") + hex("00FFFFFF7F"));
+    const P<CMemoryBlock> block = make<CMemoryBlock>();
+    const P<CEchoFunction> echo = make<CEchoFunction>();
+    EXPECT_EQ(titleOf([&] { m_remote->callReturningObject(echo, block); }),
+              "The other process has sent more than the 300 bytes that are allowed.");
+    EXPECT_EQ(titleOf([&] { m_remote->call(make<CAddFunction>()); }), "Invalid pipe handle");
+}
+
+TEST_F(RemotePeer, TextsAreLimited) {
+    m_remote->setLimits(0, 100);
+    m_peer->send(hex("65000000")); // the first word of an answer
+    EXPECT_EQ(titleOf([&] { m_remote->call(make<CAddFunction>()); }),
+              "The other process has sent more than the 100 bytes that are allowed.");
+}
+
 TEST_F(RemotePeer, ADeadPeerIsReportedAsSuch) {
     m_peer->send(wire("return") + wire("Res"));
     m_peer = nullptr;
