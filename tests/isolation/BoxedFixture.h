@@ -3,12 +3,15 @@
 
 #include "peru/IInterfaceQuery.h"
 #include "sonora2/boxed/BoxedSettings.h"
+#include "sonora2/boxed/EncapsulatedFormat.h"
+#include "sonora2/boxed/EncapsulatedSource.h"
 #include "sonora2/context/LastFailure.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/IDiscardable.h"
 #include "sonora2/plugins/PluginHandler.h"
 #include "support/Environment.h"
+#include "support/FakeMedia.h"
 #include "support/Files.h"
 #include "support/MediaBase.h"
 #include "support/TempFolder.h"
@@ -94,6 +97,54 @@ protected:
         return message;
     }
 
+    // Call every operation of a source or format that the host can call, and return the message of the error.
+    std::string watch(const std::string& name) {
+        return messageOf([&] {
+            const auto source = peru::make<sonora2::common::CEncapsulatedSource>(
+                m_context, m_name, toURI(m_media.write(name, "1000")),
+                sonora2::common::kAudioSource | sonora2::common::kVideoSource, nullptr);
+            source->setStartTime(0.001); // is applied by opening
+            source->open();
+            source->getBufferStatus();
+            source->setMaxSize(100, 100);
+            source->getWidth();
+            source->getHeight();
+            source->peekNextPictureTimestamp();
+            source->getNextPicture();
+            source->getPixelAspectNum();
+            source->getPixelAspectDen();
+            source->getFrameDuration();
+            source->getFrameRateNum();
+            source->getFrameRateDen();
+            source->getAudioStreamInfos();
+            source->setAudioStream(0);
+            source->skipToTime(0.5);
+            readAll(source);
+            source->close();
+        });
+    }
+    std::string produce(const std::filesystem::path& target) {
+        auto params = CFakeFormat::takes(1000, 2, 2);
+        const auto format = peru::make<sonora2::common::CEncapsulatedFormat>(
+            m_context, m_name, toURI(target), sonora2::common::kAudioFormat | sonora2::common::kVideoFormat,
+            &params);
+        const std::string message = messageOf([&] {
+            format->open();
+            format->setAudioQuality(0.5);
+            format->setAudioBitRate(128'000, 0, 0);
+            format->getEstimatedSizeBytes(1.0);
+            format->getVideoParameter();
+            format->getWantedImageType();
+            format->writeFrame(nullptr);
+            format->writeAudioChunk(m_chunk);
+            format->close();
+        });
+        const auto discardable =
+            peru::interfaceCast<sonora2::common::IDiscardable>(P<sonora2::common::IFormat>(format));
+        if (!message.empty() && discardable) discardable->discard();
+        return message;
+    }
+
     // The next job works, and nothing is left of those before it.
     void expectHealthy() {
         std::string samples;
@@ -132,6 +183,7 @@ protected:
     P<sonora2::common::CPluginHandler> m_handler =
         peru::make<sonora2::common::CPluginHandler>(m_context, true);
     const P<sonora2::audio::IAudioChunk> m_chunk = makeChunk();
+    const P<peru::IString> m_name = peru::newString("sonora2_faulty");
     int m_frames = 20'000; // of what is decoded
 
 private:

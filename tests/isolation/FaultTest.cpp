@@ -3,6 +3,7 @@
 
 #include <gmock/gmock.h>
 
+#include <cstdlib>
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <unistd.h>
@@ -42,9 +43,94 @@ constexpr const char* kReading[] = {
 constexpr const char* kWriting[] = {
     "create", "setAudioQuality", "open", "getEstimatedSizeBytes", "writeAudioChunk", "close"};
 
-std::string nameOf(const SFault& fault, const char* operation) {
-    return std::string(fault.name) + "@" + operation + ".faulty";
+constexpr const char* kSourceOperations[] = {"create",
+                                             "isOpened",
+                                             "open",
+                                             "close",
+                                             "skipToTime",
+                                             "getDuration",
+                                             "isEOF",
+                                             "getBufferStatus",
+                                             "setStartTime",
+                                             "getStartTime",
+                                             "setMaxSize",
+                                             "getWidth",
+                                             "getHeight",
+                                             "getNextPicture",
+                                             "getFrameRateNum",
+                                             "peekNextPictureTimestamp",
+                                             "getPixelAspectNum",
+                                             "getPixelAspectDen",
+                                             "getFrameRateDen",
+                                             "getFrameDuration",
+                                             "getAudioStreamInfos",
+                                             "setAudioStream",
+                                             "getNextAudioChunk",
+                                             "getSampleRate",
+                                             "getChannelCount",
+                                             "getBytesPerSample"};
+constexpr const char* kFormatOperations[] = {"create",
+                                             "isOpened",
+                                             "open",
+                                             "close",
+                                             "getEstimatedSizeBytes",
+                                             "getVideoParameter",
+                                             "writeFrame",
+                                             "getWantedImageType",
+                                             "getSampleRate",
+                                             "getChannelCount",
+                                             "getBytesPerSample",
+                                             "setAudioQuality",
+                                             "setAudioBitRate",
+                                             "writeAudioChunk"};
+const SFault kFaults[] = {
+    {"null-write", kSegmentation},
+    {"throw-int", "exception"},
+    {"abort", kAbort},
+    {"exit", "exit code 3"},
+    {"hang", "does not respond"},
+    {"throw-std", "a mistake of the plug-in"},
+    {"kill", "signal 9"},
+    {"stack-overflow", kSegmentation},
+    {"flood-log", ""},
+    {"throw-own", "an error of the plug-in"},
+    {"terminate", kAbort},
+#ifndef TONEWRIGHT_SANITIZED // which reserve more memory than any limit
+    {"allocate", "bad_alloc"},
+#endif
+};
+
+// Each operation with one of the faults, so that all of both occur; with all of them if the variable is set.
+template <size_t N, class Check> void forEachFault(const char* const (&operations)[N], const Check& check) {
+    const bool isFull = std::getenv("TONEWRIGHT_TEST_ALL_FAULTS") != nullptr;
+    size_t next = 0;
+    for (const char* operation : operations)
+        for (size_t i = 0; i < (isFull ? std::size(kFaults) : 1); ++i)
+            check(kFaults[next++ % std::size(kFaults)], operation);
 }
+
+std::string nameOf(const SFault& fault, const char* operation, const char* extension = ".faulty") {
+    return std::string(fault.name) + "@" + operation + extension;
+}
+
+// The second one if the machine is so busy that the slave has not even started.
+const auto kIsTimeout = AnyOf(HasSubstr("does not respond"), HasSubstr("Client connection disappeared"));
+
+class Faults : public Boxed {
+protected:
+    // Returns the message of the job.
+    template <class Job> std::string expectError(const SFault& fault, const Job& job) {
+        const bool isHang = fault.name == std::string("hang");
+        setDeadline(isHang ? 500 : 30'000);
+        const std::string message = job();
+        if (isHang)
+            EXPECT_THAT(message, kIsTimeout);
+        else
+            EXPECT_THAT(message, HasSubstr(fault.message));
+        setDeadline(30'000);
+        return message;
+    }
+};
 
 } // namespace
 
@@ -84,12 +170,46 @@ TEST_F(Boxed, ExceptionsCrossWithTheirText) {
 
 TEST_F(Boxed, HangsEndAtTheDeadline) {
     setDeadline(1'000);
-    // The second one if the machine is so busy that the slave has not even started.
-    const auto isTimeout = AnyOf(HasSubstr("does not respond"), HasSubstr("Client connection disappeared"));
-    EXPECT_THAT(decode("hang@getNextAudioChunk.faulty"), isTimeout);
-    EXPECT_THAT(encode(m_out / "hang@close.faulty"), isTimeout);
+    EXPECT_THAT(decode("hang@getNextAudioChunk.faulty"), kIsTimeout);
+    setDeadline(200); // of which closing has ten
+    EXPECT_THAT(encode(m_out / "hang@close.faulty"), kIsTimeout);
     EXPECT_EQ(countEntries(m_out.path()), 0u);
+    EXPECT_THAT(encode(m_out / "pause@close.faulty"), AnyOf("", kIsTimeout)); // as for a slow disk
     setDeadline(30'000);
+    expectHealthy();
+}
+
+TEST_F(Faults, EveryOperationOfASourceMayFail) {
+    setMemory(128);
+    forEachFault(kSourceOperations, [this](const SFault& fault, const char* operation) {
+        expectError(fault, [&] { return watch(nameOf(fault, operation, ".movie.faulty")); });
+    });
+    setMemory(1024);
+    expectHealthy();
+}
+
+TEST_F(Faults, EveryOperationOfAFormatMayFail) {
+    setMemory(128);
+    forEachFault(kFormatOperations, [this](const SFault& fault, const char* operation) {
+        const auto target = m_out / nameOf(fault, operation);
+        const bool isWritten = expectError(fault, [&] { return produce(target); }).empty();
+        EXPECT_EQ(std::filesystem::exists(target), isWritten) << target;
+    });
+    setMemory(1024);
+    expectHealthy();
+}
+
+// Nobody can be told about these.
+TEST_F(Faults, FaultsOfDestructorsStayInTheSlave) {
+    setMemory(128);
+    setDeadline(500);
+    for (const SFault& fault : kFaults) {
+        const std::string name = nameOf(fault, "destroy");
+        EXPECT_THAT(watch(name), AnyOf("", kIsTimeout)) << fault.name;
+        EXPECT_THAT(produce(m_out / name), AnyOf("", kIsTimeout)) << fault.name;
+    }
+    setDeadline(30'000);
+    setMemory(1024);
     expectHealthy();
 }
 
@@ -98,6 +218,7 @@ TEST_F(Boxed, NonsenseOnTheWireIsAnError) {
     for (const char* order :
          {"garbage@create.faulty", "garbage@getNextAudioChunk.faulty", "close-all@open.faulty"})
         EXPECT_THAT(decode(order), Not("")) << order;
+    EXPECT_THAT(decode("long-answer@getNextAudioChunk.faulty"), HasSubstr("more than the 16777216 bytes"));
     expectHealthy();
     EXPECT_TRUE(waitUntil([&] { return countDescriptors() <= before + 1; })); // the random numbers' device
 }
