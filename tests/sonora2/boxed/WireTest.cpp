@@ -1,11 +1,10 @@
 // What crosses the pipe, byte for byte, and pictures that are fetched ahead.
 #include "peru/Errors.h"
+#include "peru/remote/RemoteException.h"
 #include "peru/streams/DataStreams.h"
 #include "peru/streams/MemoryIOStream.h"
 #include "sonora2/boxed/AudioChunkRemote.h"
-#include "sonora2/boxed/IFormatServer.h"
-#include "sonora2/boxed/ISonoraPluginRemote.h"
-#include "sonora2/boxed/ISourceServer.h"
+#include "sonora2/boxed/AudioRun.h"
 #include "sonora2/boxed/PicturePrefetch.h"
 #include "sonora2/boxed/RemoteLog.h"
 #include "sonora2/media/AudioChunk.h"
@@ -73,37 +72,8 @@ TEST(BoxedWire, Run_CrossesWithItsEnd) {
     EXPECT_TRUE(read->isEOF);
     EXPECT_EQ(0.75, read->duration);
     EXPECT_TRUE(read->failure->equals("broken"));
-}
-
-// Name, kind and parameters, which both ends check on every call.
-template <class Proc> std::string describe() {
-    const P<Proc> proc = make<Proc>();
-    std::string text = (proc->isVoid() ? "void " : "function ") + CString::toStdString(proc->getName());
-    for (const P<peru::CRemoteVar>& param : proc->getParams())
-        text += " " + CString::toStdString(param->getName());
-    return text;
-}
-
-TEST(BoxedWire, Procedures_AreThoseOfTheTables) {
-    using Plugin = ISonoraPluginRemote;
-    using Source = ISourceServer;
-    using Format = IFormatServer;
-    EXPECT_EQ("function getLog", describe<Plugin::getLogFunction>());
-    EXPECT_EQ("function getValidExtensions nTypes", describe<Plugin::getValidExtensionsFunction>());
-    EXPECT_EQ("function tryCreateSource uri nTypes bDontCloseAfterTesting pParams",
-              describe<Plugin::tryCreateSourceFunction>());
-    EXPECT_EQ("function tryCreateFormat uri nTypes bDontCloseAfterTesting pParams",
-              describe<Plugin::tryCreateFormatFunction>());
-    EXPECT_EQ("void open", describe<Source::openProc>());
-    EXPECT_EQ("void skipToTime fTimestamp", describe<Source::skipToTimeProc>());
-    EXPECT_EQ("void setStartTime fStartTime", describe<Source::setStartTimeProc>());
-    EXPECT_EQ("void setMaxSize nWidth nHeight", describe<Source::setMaxSizeProc>());
-    EXPECT_EQ("void setAudioStream nAudioIndex", describe<Source::setAudioStreamProc>());
-    EXPECT_EQ("function getNextPicture", describe<Source::getNextPictureFunction>());
-    EXPECT_EQ("function getEstimatedSizeBytes fDuration", describe<Format::getEstimatedSizeBytesFunction>());
-    EXPECT_EQ("void writeFrame pPicture", describe<Format::writeFrameProc>());
-    EXPECT_EQ("void setAudioBitRate nNominal nMin nMax", describe<Format::setAudioBitRateProc>());
-    EXPECT_EQ("void writeAudioChunk pAudioChunk", describe<Format::writeAudioChunkProc>());
+    // More chunks than a run has, each of one byte.
+    EXPECT_THROW(deserialise(read, "\x41\0\0\0"s + std::string(100, '\0')), peru::CRemoteException);
 }
 
 TEST(BoxedWire, LogEntries_KeepSeverityAndText) {
