@@ -4,6 +4,9 @@
 #include "sonora2/context/ILogManager.h"
 #include "support/MediaFile.h"
 
+#include <string>
+#include <vector>
+
 namespace sonora2::plugins {
 
 struct SDecodedMedia {
@@ -12,6 +15,12 @@ struct SDecodedMedia {
     std::string codec = {};  // to show to users, such as "FLAC" or "PCM signed 24 bit"; empty when unknown
     int floatBytes = 0;      // size of the file's floating-point samples if deliverFloat() is supported
     bool isEstimate = false; // the length is not exact: the sound ends where read() returns 0
+};
+
+// One of several soundtracks in a file.
+struct SSoundtrack {
+    std::string name;
+    std::string language;
 };
 
 struct SDecoderOptions {
@@ -52,6 +61,10 @@ public:
     // From the next seek() until close(), reads deliver the file's floating-point samples instead of
     // integers. Only called if open() has stated their size.
     virtual void deliverFloat() {}
+    // The soundtracks of the file, the one that is decoded by default first. Known once it has been opened.
+    virtual std::vector<SSoundtrack> getSoundtracks() { return {{}}; }
+    // Selects one of them for the next open(). Only called while closed.
+    virtual void selectSoundtrack(int index) {}
 };
 
 } // namespace sonora2::plugins

@@ -100,14 +100,29 @@ void CDecoderSource::setStartTime(double fStartTime) {
 
 P<audio::IAudioStreamInfos> CDecoderSource::getAudioStreamInfos() {
     auto infos = peru::make<audio::CAudioStreamInfos>();
-    infos->add(peru::make<audio::CAudioInfo>(0));
+    int index = 0;
+    for (const SSoundtrack& track : m_decoder->getSoundtracks())
+        infos->add(peru::make<audio::CAudioInfo>(index++, peru::CString::fromUTF8(track.name),
+                                                 peru::CString::fromUTF8(track.language)));
     return infos;
 }
 
 void CDecoderSource::setAudioStream(int nAudioIndex) {
-    if (nAudioIndex != 0)
+    if (nAudioIndex == m_soundtrack) return;
+    const bool wasOpened = isOpened();
+    if (!wasOpened) open(); // which soundtracks there are is unknown until then
+    const bool exists =
+        nAudioIndex >= 0 && nAudioIndex < static_cast<int>(m_decoder->getSoundtracks().size());
+    const double time = static_cast<double>(m_delivering) / m_delivered.rate;
+    if (exists || !wasOpened) close();
+    if (!exists)
         fail({"sonora2.CDecoderSource.noSuchStream", "%s has no audio stream %d"}, m_file.getDisplayName(),
              nAudioIndex);
+    m_decoder->selectSoundtrack(nAudioIndex);
+    m_soundtrack = nAudioIndex;
+    if (!wasOpened) return;
+    open();
+    restartAt(toFrame(time));
 }
 
 void CDecoderSource::setSalvage(bool salvage) {

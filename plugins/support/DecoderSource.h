@@ -42,7 +42,8 @@ public:
     P<peru::IString> getPluginName() override { return m_pluginName; }
 
     P<audio::IAudioStreamInfos> getAudioStreamInfos() override;
-    void setAudioStream(int nAudioIndex) override; // 0 only
+    // An open source continues at the same time, with the format of that stream where none is wanted.
+    void setAudioStream(int nAudioIndex) override;
     P<audio::IAudioChunk> getNextAudioChunk() override;
     int getSampleRate() override { return m_delivered.rate; }
     int getChannelCount() override { return m_delivered.channels; }
@@ -85,6 +86,7 @@ private:
     double m_startTime = 0.0;
     bool m_salvage = false;
     bool m_preventClipping = false;
+    int m_soundtrack = 0;
     std::unique_ptr<IDecoder> m_decoder;
     P<CWarningLog> m_log;
     SDecodedMedia m_media;                      // known once opened

@@ -25,6 +25,20 @@ protected:
     void encode(const std::string& options, const std::string& name) {
         run("ffmpeg -v error -y -i in.wav " + options + " " + name);
     }
+    // One bit per sample and channel: the form of the signal is of no importance.
+    void writeDsf(const std::string& name) {
+        const auto number = [](uint64_t value, int bytes) {
+            return std::string(reinterpret_cast<const char*>(&value), static_cast<size_t>(bytes));
+        };
+        constexpr uint64_t kBlocks = 20, kBlockBytes = 4096, kBytes = kBlocks * kBlockBytes * 2;
+        std::string file = "DSD " + number(28, 8) + number(28 + 52 + 12 + kBytes, 8) + number(0, 8);
+        file += "fmt " + number(52, 8) + number(1, 4) + number(0, 4) + number(2, 4) + number(2, 4) +
+                number(2'822'400, 4) + number(1, 4) + number(kBlocks * kBlockBytes * 8, 8) +
+                number(kBlockBytes, 4) + number(0, 4);
+        file += "data" + number(12 + kBytes, 8);
+        for (uint64_t i = 0; i < kBytes; ++i) file += static_cast<char>(i * i >> 7);
+        folder.write(name, file);
+    }
     // The plug-in's source in the file's own format; throws the plug-in's error.
     P<IAudioSource> openAv(const std::string& name) {
         const std::string extension = name.substr(name.rfind('.') + 1);

@@ -101,6 +101,55 @@ INSTANTIATE_TEST_SUITE_P(Types, AvSound, testing::ValuesIn(kSoundCases), [](cons
 
 class AvFile : public CAvTest {};
 
+// The default one is delivered unless another is selected, which may have another format.
+TEST_F(AvFile, Soundtracks_AreListedAndSelected) {
+    makeInput();
+    run("ffmpeg -v error -i in.wav -i in.wav -i in.wav -map 0 -map 1 -map 2 -filter:a:1 areverse "
+        "-filter:a:2 volume=0.5 -c:a flac -sample_fmt s16 -ac:a:2 1 -disposition:a:0 0 -disposition:a:1 "
+        "default "
+        "-metadata:s:a:1 language=ger -metadata:s:a:1 title=Kommentar -metadata:s:a:2 language=fre x.mkv");
+    const auto peer = [this](int track) {
+        return run("ffmpeg -v error -i x.mkv -map 0:a:" + std::to_string(track) + " -f s16le -");
+    };
+    const P<IAudioSource> source = openAv("x.mkv");
+    const auto infos = source->getAudioStreamInfos();
+    ASSERT_EQ(3, infos->getStreamCount());
+    for (const auto& [index, language] : {std::pair{0, "ger"}, {1, ""}, {2, "fre"}})
+        EXPECT_EQ(language, text(infos->getStreamInfo(index)->getStreamLanguage()));
+    EXPECT_EQ("Kommentar", text(infos->getStreamInfo(0)->getStreamName()));
+    EXPECT_TRUE(peer(1) == readAll(source));
+    source->skipToTime(0.5);
+    source->setAudioStream(2); // one channel
+    EXPECT_TRUE(peer(2).substr(22050 * 2) == readAll(source));
+    EXPECT_EQ(1, source->getChannelCount());
+    EXPECT_ANY_THROW(source->setAudioStream(3));
+    source->close();
+    source->setAudioStream(1);
+    EXPECT_FALSE(source->isOpened());
+    source->open();
+    EXPECT_TRUE(peer(0) == readAll(source));
+}
+
+// Files that ffmpeg cannot write.
+TEST_F(AvFile, OtherEncodersFiles_AreReadAsAnotherProgramReadsThem) {
+    makeInput();
+    run("ffmpeg -v error -i in.wav -c:a pcm_s16le cd.wav");
+    run("sox in.wav -r 8000 -c 1 x.amr-nb && mv x.amr-nb x.amr");
+    std::vector<std::string> names{"x.amr", "x.dsf"};
+    if (!run("command -v mpcenc || true").empty()) {
+        run("mpcenc --silent cd.wav x.mpc");
+        names.push_back("x.mpc");
+    }
+    writeDsf("x.dsf");
+    for (const std::string& name : names) {
+        SCOPED_TRACE(name);
+        const P<IAudioSource> source = openAv(name);
+        const std::string all = readAll(source);
+        EXPECT_LT(4000u, all.size());
+        EXPECT_TRUE(decodeByPeer(name) == all);
+    }
+}
+
 TEST_F(AvFile, LongFile_IsSkippedInByItsTimestampsOrItsPackets) {
     const std::string pcm = makeMusic({}, 44100 * 9);
     folder.write("in.raw", pcm);

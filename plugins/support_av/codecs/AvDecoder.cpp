@@ -20,8 +20,6 @@ namespace sonora2::plugins::av {
 namespace {
 
 constexpr int kMaxChannels = 64;
-constexpr double kPreroll = 0.25;    // seconds that a lossy codec needs to settle after a seek
-constexpr double kNearby = 2.0;      // seconds that are decoded rather than skipped
 constexpr int kMaxSilence = 10;      // seconds for a damaged packet
 constexpr int kTolerated = 32;       // packets at a start that refer to what precedes them
 constexpr double kMissing = 0.25;    // seconds by which containers misstate the length
@@ -70,18 +68,6 @@ bool isMp4(const AVFormatContext& format) {
     return std::string_view(format.iformat->name).find("mp4") != std::string_view::npos;
 }
 
-// Whether a decoder can start at any packet and soon delivers the same samples, at the time of that packet.
-bool canStartAnywhere(AVCodecID codec) {
-    return codec != AV_CODEC_ID_TRUEHD && codec != AV_CODEC_ID_MLP && codec != AV_CODEC_ID_SPEEX &&
-           codec != AV_CODEC_ID_GSM;
-}
-
-// Whether a time base tells frames apart.
-bool isExact(AVRational timeBase, int rate) {
-    const int64_t framesPerTick = int64_t{timeBase.num} * rate;
-    return framesPerTick > 0 && timeBase.den % framesPerTick == 0;
-}
-
 } // namespace
 
 SDecodedMedia CAvDecoder::open(const SDecoderOptions& options) {
@@ -92,6 +78,7 @@ SDecodedMedia CAvDecoder::open(const SDecoderOptions& options) {
     m_packets = {};
     m_format = {};
     start();
+    m_soundtracks = m_demuxer->getSoundtracks();
     if (!readFrame()) failToOpen(m_file, peru::localize("sonora2.av.NoSound", "there is no sound in it"));
     chooseFormat();
     m_firstTime = m_frame->pts;
@@ -127,8 +114,12 @@ void CAvDecoder::close() {
     m_pendingStart = 0;
 }
 
+void CAvDecoder::selectSoundtrack(int index) {
+    m_soundtrack = index;
+}
+
 void CAvDecoder::start() {
-    m_demuxer = std::make_unique<CDemuxer>(m_file, AVMEDIA_TYPE_AUDIO);
+    m_demuxer = std::make_unique<CDemuxer>(m_file, AVMEDIA_TYPE_AUDIO, m_soundtrack);
     m_packet.reset(av_packet_alloc());
     m_frame.reset(av_frame_alloc());
     if (!m_packet || !m_frame) throw std::bad_alloc();
@@ -180,7 +171,7 @@ void CAvDecoder::estimateLength() {
     } else if (stream.duration > 0 || format.nb_streams == 1) {
         m_stated = m_estimate;
     }
-    m_isMp4 = isMp4(format) && isExact(stream.time_base, m_format.rate);
+    m_isMp4 = isMp4(format) && isExact(stream.time_base);
     if (m_isMp4) findStatedEnd();
     m_estimate = std::max(m_estimate, countPending());
 }
@@ -204,7 +195,7 @@ void CAvDecoder::findStatedEnd() {
 // Files without a length and without timestamps: AAC, AC-3 and other plain streams.
 void CAvDecoder::scanPackets() {
     m_hasScanned = true;
-    CDemuxer scanned(m_file, AVMEDIA_TYPE_AUDIO);
+    CDemuxer scanned(m_file, AVMEDIA_TYPE_AUDIO, m_soundtrack);
     int64_t duration = 0, sum = 0;
     bool isUniform = m_packetFrames > 0 && m_firstCount == m_packetFrames;
     while (scanned.read(*m_packet)) {
@@ -368,6 +359,11 @@ void CAvDecoder::convertFrame() {
     m_pending.resize(at + samples * 3);
 }
 
+bool CAvDecoder::isExact(AVRational timeBase) const {
+    const int64_t framesPerTick = int64_t{timeBase.num} * m_format.rate;
+    return framesPerTick > 0 && timeBase.den % framesPerTick == 0;
+}
+
 double CAvDecoder::toSeconds(int64_t frame) const {
     return m_format.rate > 0 ? static_cast<double>(frame) / m_format.rate : 0.0;
 }
@@ -414,78 +410,6 @@ void CAvDecoder::deliverFloat() {
     m_format.bytesPerSample = m_floatBytes;
     m_mustRestart = true;
     m_converter.reset();
-}
-
-void CAvDecoder::seek(int64_t frame) {
-    const CAvLog log(m_options.log);
-    const int64_t ahead = frame - m_position;
-    const bool isNear = ahead >= 0 && ahead <= std::llround(kNearby * m_format.rate);
-    if (!m_mustRestart && isNear) return drop(ahead);
-    const bool canJump = !m_mustRestart && frame > m_format.rate && canStartAnywhere(m_codec->codec_id);
-    if (canJump && (seekByPlace(frame) || seekByTime(frame))) return;
-    start();
-    drop(frame);
-}
-
-void CAvDecoder::drop(int64_t frames) {
-    const int64_t end = m_position + frames;
-    while (m_position < end) {
-        if (countPending() == 0) {
-            if (readFrame()) convertFrame();
-            if (countPending() == 0) return; // the end
-        }
-        const int64_t count = std::min(end - m_position, countPending());
-        m_pendingStart += static_cast<size_t>(count * m_format.frameBytes());
-        m_position += count;
-    }
-}
-
-int64_t CAvDecoder::findFrame(int64_t timestamp) const {
-    const AVRational timeBase = m_demuxer->getStream().time_base;
-    if (isExact(timeBase, m_format.rate))
-        return av_rescale_q(timestamp - m_firstTime, timeBase, {1, m_format.rate});
-    const double frames = static_cast<double>(timestamp - m_firstTime) * av_q2d(timeBase) * m_format.rate;
-    const int64_t packets = std::llround((frames - m_firstCount) / m_packetFrames);
-    return packets < 0 ? -1 : m_firstCount + packets * m_packetFrames;
-}
-
-// Decodes the first frame after a seek.
-bool CAvDecoder::continueAfterSeek() {
-    avcodec_flush_buffers(m_codec.get());
-    m_pending.clear();
-    m_pendingStart = 0;
-    m_hasDecoded = m_flushed = false;
-    m_failures = 0;
-    m_damage = nullptr;
-    return readFrame();
-}
-
-bool CAvDecoder::seekByTime(int64_t frame) {
-    if (m_firstTime == AV_NOPTS_VALUE || m_hasScanned) return false;
-    const AVRational timeBase = m_demuxer->getStream().time_base;
-    if (!isExact(timeBase, m_format.rate) && m_packetFrames == 0) return false;
-    const int64_t from = frame - std::llround(kPreroll * m_format.rate);
-    const int64_t time = m_firstTime + av_rescale_q(from, {1, m_format.rate}, timeBase);
-    if (!m_demuxer->seek(time, AVSEEK_FLAG_BACKWARD) || !continueAfterSeek()) return false;
-    if (m_frame->pts == AV_NOPTS_VALUE) return false;
-    const int64_t at = findFrame(m_frame->pts);
-    if (at < 0 || at > frame) return false;
-    m_position = at;
-    convertFrame();
-    drop(frame - at);
-    return true;
-}
-
-bool CAvDecoder::seekByPlace(int64_t frame) {
-    if (m_packets.framesPerPacket == 0) return false;
-    const int64_t packet = (frame - std::llround(kPreroll * m_format.rate)) / m_packets.framesPerPacket;
-    if (packet < 0 || packet >= static_cast<int64_t>(m_packets.places.size())) return false;
-    const int64_t place = m_packets.places[static_cast<size_t>(packet)];
-    if (!m_demuxer->seek(place, AVSEEK_FLAG_BYTE) || !continueAfterSeek() || m_place != place) return false;
-    m_position = packet * m_packets.framesPerPacket;
-    convertFrame();
-    drop(frame - m_position);
-    return true;
 }
 
 } // namespace sonora2::plugins::av

@@ -25,6 +25,8 @@ public:
     int read(uint8_t* pcm, int frames) override;
     void seek(int64_t frame) override;
     void deliverFloat() override;
+    std::vector<SSoundtrack> getSoundtracks() override { return m_soundtracks; }
+    void selectSoundtrack(int index) override;
 
 private:
     // Packets of a file without timestamps, all of which hold the same number of frames.
@@ -53,10 +55,13 @@ private:
     bool continueAfterSeek();
     int64_t findFrame(int64_t timestamp) const;
     void drop(int64_t frames);
+    bool isExact(AVRational timeBase) const; // whether it tells frames apart
     int64_t countPending() const;
     double toSeconds(int64_t frame) const;
 
     SMediaFile m_file;
+    int m_soundtrack = 0;
+    std::vector<SSoundtrack> m_soundtracks{{}};
     SDecoderOptions m_options;
     SPcmFormat m_format;
     bool m_isFloat = false;

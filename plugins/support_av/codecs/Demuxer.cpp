@@ -22,7 +22,8 @@ int refuseOther(AVFormatContext*, AVIOContext**, const char*, int, AVDictionary*
 
 } // namespace
 
-CDemuxer::CDemuxer(const SMediaFile& file, AVMediaType type) : m_file(file), m_input(openForReading(file)) {
+CDemuxer::CDemuxer(const SMediaFile& file, AVMediaType type, int index)
+    : m_file(file), m_input(openForReading(file)) {
     av_max_alloc(kMostBytesAtOnce);
     auto* const buffer = static_cast<uint8_t*>(av_malloc(kBufferBytes));
     if (buffer)
@@ -35,7 +36,7 @@ CDemuxer::CDemuxer(const SMediaFile& file, AVMediaType type) : m_file(file), m_i
     // Judged by its content, not by its name. The context is freed on failure.
     int result = avformat_open_input(&m_format, nullptr, nullptr, nullptr);
     if (result >= 0) result = avformat_find_stream_info(m_format, nullptr);
-    if (result >= 0) result = m_stream = av_find_best_stream(m_format, type, -1, -1, nullptr, 0);
+    if (result >= 0) result = m_best = m_stream = av_find_best_stream(m_format, type, -1, -1, nullptr, 0);
     // Covers are pictures, not video.
     const bool isCover =
         result >= 0 && type == AVMEDIA_TYPE_VIDEO &&
@@ -50,12 +51,35 @@ CDemuxer::CDemuxer(const SMediaFile& file, AVMediaType type) : m_file(file), m_i
         avformat_close_input(&m_format);
         failToOpen(file, describe(result));
     }
+    // A file that has changed since its streams were listed may have fewer.
+    const std::vector<int> streams = listStreams(type);
+    if (index > 0 && index < static_cast<int>(streams.size())) m_stream = streams[static_cast<size_t>(index)];
     for (unsigned i = 0; i < m_format->nb_streams; ++i)
         if (static_cast<int>(i) != m_stream) m_format->streams[i]->discard = AVDISCARD_ALL;
 }
 
 CDemuxer::~CDemuxer() {
     avformat_close_input(&m_format);
+}
+
+std::vector<int> CDemuxer::listStreams(AVMediaType type) const {
+    std::vector<int> streams{m_best};
+    for (int i = 0; i < static_cast<int>(m_format->nb_streams); ++i)
+        if (i != m_best && m_format->streams[i]->codecpar->codec_type == type) streams.push_back(i);
+    return streams;
+}
+
+std::vector<SSoundtrack> CDemuxer::getSoundtracks() const {
+    std::vector<SSoundtrack> tracks;
+    for (const int stream : listStreams(AVMEDIA_TYPE_AUDIO)) {
+        const auto get = [&](const char* key) {
+            const AVDictionaryEntry* const entry =
+                av_dict_get(m_format->streams[stream]->metadata, key, nullptr, 0);
+            return std::string(entry ? entry->value : "");
+        };
+        tracks.push_back({get("title"), get("language")});
+    }
+    return tracks;
 }
 
 int CDemuxer::readBytes(void* self, uint8_t* buffer, int size) {
