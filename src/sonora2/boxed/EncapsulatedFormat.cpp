@@ -1,11 +1,15 @@
 #include "sonora2/boxed/EncapsulatedFormat.h"
 
 #include "peru/strings/StringFormat.h"
+#include "sonora2/boxed/BoxedSettings.h"
 #include "sonora2/context/LoggedCall.h"
 #include "sonora2/media/IDiscardable.h"
 #include "sonora2/media/IFloatSamples.h"
 #include "sonora2/media/IFormatSettings.h"
 #include "sonora2/plugins/ParameterRecord.h"
+
+#include <algorithm>
+#include <limits>
 
 namespace sonora2::common {
 
@@ -14,6 +18,29 @@ namespace {
 // How long an error of writing may stay unnoticed. Asking more often would make the two processes wait for
 // each other instead of working at the same time.
 constexpr std::chrono::milliseconds kCheckInterval{250};
+
+// Extends the deadline while a file is completed.
+class CPatience {
+public:
+    CPatience(const P<CSlaveHandler>& slave, const P<CFormatClient>& client)
+        : m_slave(slave), m_client(client), m_deadline(slave->getDeadline()) {
+        constexpr uint64_t kMost = std::numeric_limits<int32_t>::max();
+        set(static_cast<uint32_t>(std::min(kMost, uint64_t{m_deadline} * kCloseDeadlineFactor)));
+    }
+    ~CPatience() { set(m_deadline); }
+    CPatience(const CPatience&) = delete;
+    CPatience& operator=(const CPatience&) = delete;
+
+private:
+    void set(uint32_t milliseconds) {
+        m_slave->setDeadline(milliseconds);
+        m_client->setDeadline(milliseconds);
+    }
+
+    P<CSlaveHandler> m_slave;
+    P<CFormatClient> m_client;
+    uint32_t m_deadline;
+};
 
 } // namespace
 
@@ -82,6 +109,7 @@ void CEncapsulatedFormat::close() {
         if (wasOpened) slave->checkForSlaveError();
         return;
     }
+    const CPatience patience(m_slave, m_client);
     changeLocked("close", [](CFormatClient& client) { client.close(); });
     m_output.forget();
 }
