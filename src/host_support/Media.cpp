@@ -1,5 +1,6 @@
 // Queries the plug-ins for the properties of files and the capabilities of targets.
 #include "host_support/Guard.h"
+#include "host_support/WriterQuestions.h"
 #include "peru/strings/LocalizedFormat.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
@@ -98,36 +99,19 @@ void fillInfo(const P<IAudioSource>& source, TONEWRIGHT_MediaInfo* info) {
     fillRecord(info, values);
 }
 
-// The format of the first plug-in for the file that accepts these numbers, or an empty handle. The reasons of
-// those that do not are ignored.
-P<IFormat> findFormat(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int rate, int channels,
-                      int bytes) {
-    ISonoraPlugin::SFormatParams params;
-    params.nSampleRate = rate;
-    params.nChannelCount = channels;
-    params.nBytesPerSample = bytes;
-    P<IFormat> format;
-    askPlugins(uri, handler, kAudioFormat, [&](ISonoraPlugin& plugin) {
-        try {
-            format = plugin.tryCreateFormat(uri, kAudioFormat, false, &params);
-            return format != nullptr;
-        } catch (const peru::CException&) {
-            return false;
-        }
-    });
-    return format;
-}
-
-bool canWrite(const P<peru::IURI>& uri, const P<IPluginHandler>& handler, int rate, int channels, int bytes) {
-    return findFormat(uri, handler, rate, channels, bytes) != nullptr;
-}
-
-uint32_t getUsedSettings(const P<IFormat>& format) {
+// The settings that are used by the format of the first plug-in for the file that accepts these numbers;
+// empty if there is none. The reasons of those that do not are ignored.
+std::optional<uint32_t> findFormat(CWriterQuestions& questions, const P<peru::IURI>& uri,
+                                   const P<IPluginHandler>& handler, int rate, int channels, int bytes) {
     static_assert(static_cast<int>(TONEWRIGHT_SETTING_QUALITY) == IFormatSettings::kQuality &&
                   static_cast<int>(TONEWRIGHT_SETTING_BIT_RATE) == IFormatSettings::kBitRate &&
                   static_cast<int>(TONEWRIGHT_SETTING_WIDTH) == IFormatSettings::kSampleWidth);
-    const auto settings = peru::interfaceCast<IFormatSettings>(format);
-    return settings ? settings->getUsedSettings() : IFormatSettings::kAllSettings;
+    std::optional<uint32_t> settings;
+    askPlugins(uri, handler, kAudioFormat, [&](ISonoraPlugin& plugin) {
+        settings = questions.ask(plugin, rate, channels, bytes);
+        return settings.has_value();
+    });
+    return settings;
 }
 
 } // namespace
@@ -219,22 +203,26 @@ int32_t TONEWRIGHT_Host_GetCapabilities(const char16_t* uri, TONEWRIGHT_Capabili
         // one format that is accepted.
         static constexpr int kRates[] = {8000,  11025, 12000, 16000, 22050,  24000,  32000,  44100,
                                          48000, 64000, 88200, 96000, 176400, 192000, 352800, 384000};
+        CWriterQuestions questions(target, handler);
+        const auto canWrite = [&](int ofRate, int ofChannels, int ofBytes) {
+            return findFormat(questions, target, handler, ofRate, ofChannels, ofBytes).has_value();
+        };
         TONEWRIGHT_Capabilities values = {};
         int rate = 0, channels = 0, bytes = 0;
         for (const int width : {2, 3, 4, 1})
             for (const int count : {2, 1})
                 for (const int candidate : {44100, 48000, 16000, 8000})
-                    if (rate == 0 && canWrite(target, handler, candidate, count, width))
+                    if (rate == 0 && canWrite(candidate, count, width))
                         rate = candidate, channels = count, bytes = width;
         if (rate > 0) {
-            values.settings = getUsedSettings(findFormat(target, handler, rate, channels, bytes));
+            values.settings = findFormat(questions, target, handler, rate, channels, bytes)
+                                  .value_or(IFormatSettings::kAllSettings);
             for (const int candidate : kRates)
-                if (canWrite(target, handler, candidate, channels, bytes))
-                    values.rates[values.rateCount++] = candidate;
+                if (canWrite(candidate, channels, bytes)) values.rates[values.rateCount++] = candidate;
             for (int count = 1; count <= 32; ++count)
-                if (canWrite(target, handler, rate, count, bytes)) values.channelCounts |= 1u << (count - 1);
+                if (canWrite(rate, count, bytes)) values.channelCounts |= 1u << (count - 1);
             for (int width = 1; width <= 4; ++width)
-                if (canWrite(target, handler, rate, channels, width)) values.widths |= 1u << (width - 1);
+                if (canWrite(rate, channels, width)) values.widths |= 1u << (width - 1);
         }
         fillRecord(capabilities, values);
         return 1;
@@ -245,8 +233,8 @@ int32_t TONEWRIGHT_Host_CanWrite(const char16_t* uri, int32_t sampleRate, int32_
                                  int32_t bytesPerSample) {
     return guard(0, [&] {
         const P<IPluginHandler> handler = requireHandler(getMediaEnvironment().writeHandler);
-        return canWrite(tonewright::exports::toURI(uri), handler, sampleRate, channelCount, bytesPerSample)
-                   ? 1
-                   : 0;
+        const P<peru::IURI> target = tonewright::exports::toURI(uri);
+        CWriterQuestions questions(target, handler);
+        return findFormat(questions, target, handler, sampleRate, channelCount, bytesPerSample) ? 1 : 0;
     });
 }

@@ -8,6 +8,7 @@
 #include <tonewright/host.h>
 
 #include <atomic>
+#include <cstring>
 #include <fcntl.h>
 #include <fstream>
 #include <random>
@@ -255,6 +256,28 @@ TEST_F(Host, CapabilitiesAreWhatTheEncoderTakes) {
     EXPECT_EQ(TONEWRIGHT_Host_GetCapabilities(uriOf(folder / "x.xyz").c_str(), &can), 0);
     EXPECT_STREQ(lastFailure().message, "No plug-in writes .xyz files");
     EXPECT_TRUE(std::filesystem::is_empty(folder.path()));
+}
+
+TEST_F(Host, CapabilitiesOfABoxedPluginTakeOneProcess) {
+    std::filesystem::create_directory(folder / "companions");
+    const auto program =
+        folder.write("companions/sonora2_slave", "#!/bin/sh\necho >> '" + (folder / "starts").string() +
+                                                     "'\nexec " SLAVE_PROGRAM " \"$@\"\n");
+    std::filesystem::permissions(program, std::filesystem::perms(0700));
+    const CEnvironment companions("TONEWRIGHT_COMPANION_PATH", program.parent_path().string());
+    const std::u16string uri = uriOf(folder / "x.wma");
+    TONEWRIGHT_Capabilities boxed = {}, plain = {};
+    boxed.size = plain.size = sizeof plain;
+    ASSERT_EQ(TONEWRIGHT_Host_GetCapabilities(uri.c_str(), &boxed), 1);
+    EXPECT_EQ(std::filesystem::file_size(folder / "starts"), 1u);
+    EXPECT_EQ(TONEWRIGHT_Host_CanWrite(uri.c_str(), 44100, 2, 2), 1); // is known
+    EXPECT_EQ(TONEWRIGHT_Host_CanWrite(uri.c_str(), 44100, 9, 2), 0);
+    EXPECT_EQ(std::filesystem::file_size(folder / "starts"), 1u);
+    TONEWRIGHT_DeInitAll();
+    const CEnvironment none("TONEWRIGHT_BOXED", "none");
+    ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK);
+    ASSERT_EQ(TONEWRIGHT_Host_GetCapabilities(uri.c_str(), &plain), 1);
+    EXPECT_EQ(std::memcmp(&boxed, &plain, sizeof plain), 0);
 }
 
 TEST_F(Host, PluginIsTheOneThatIsAskedFirst) {

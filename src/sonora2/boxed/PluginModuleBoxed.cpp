@@ -2,6 +2,7 @@
 
 #include "sonora2/boxed/EncapsulatedFormat.h"
 #include "sonora2/boxed/EncapsulatedSource.h"
+#include "sonora2/boxed/FormatProbe.h"
 #include "sonora2/boxed/SonoraPluginBoxed.h"
 
 namespace sonora2::common {
@@ -34,6 +35,10 @@ P<IFormat> CPluginModuleBoxed::tryCreateFormat(const P<peru::IURI>& uri, int nTy
     const auto format = peru::make<CEncapsulatedFormat>(m_context, m_name, uri, nTypes, pParams);
     if (!format->prepare()) return nullptr;
     return format;
+}
+
+P<CFormatProbe> CPluginModuleBoxed::createFormatProbe(const P<peru::IURI>& uri) {
+    return peru::make<CFormatProbe>(m_context, m_name, uri);
 }
 
 } // namespace sonora2::common

@@ -7,6 +7,8 @@
 
 namespace sonora2::common {
 
+class CFormatProbe;
+
 // Has no process of its own: each query starts one, and so does each source and format, which has it until it
 // is destroyed.
 class SONORA2_API CPluginModuleBoxed : public peru::CObject, public ISonoraPlugin {
@@ -23,6 +25,8 @@ public:
                                const SSourceParams* pParams) override;
     P<IFormat> tryCreateFormat(const P<peru::IURI>& uri, int nTypes, bool bDontCloseAfterTesting,
                                const SFormatParams* pParams) override;
+    // For many questions of whether the plug-in writes to that target.
+    P<CFormatProbe> createFormatProbe(const P<peru::IURI>& uri);
     P<peru::IBase> tryCreateObject(const P<peru::IURI>&, const SObjectParams*) override { return nullptr; }
 
 private:
