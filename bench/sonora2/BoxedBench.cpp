@@ -10,6 +10,7 @@
 #include <cmath>
 #include <cstdlib>
 #include <filesystem>
+#include <stdexcept>
 #include <string>
 #include <sys/resource.h>
 
@@ -37,11 +38,16 @@ public:
     CMedia() {
         std::string name = std::filesystem::temp_directory_path() / "boxed-bench-XXXXXX";
         m_folder = ::mkdtemp(name.data());
-        for (const char* plugin : {"sonora2_flac", "sonora2_decmpa", "sonora2_l3codec"})
+        for (const char* plugin :
+             {"sonora2_flac", "sonora2_decmpa", "sonora2_l3codec", "sonora2_wav", "sonora2_dsgraph"})
             m_context->addPluginName(plugin);
         plain = peru::make<CPluginHandler>(m_context, false);
         boxed = peru::make<CPluginHandler>(m_context, true);
-        for (const char* extension : {"flac", "mp3"}) write(extension);
+        for (const char* extension : {"flac", "mp3", "wav"}) write(extension);
+        m_context->setSwitchB(true); // pictures are fetched ahead
+        runPeer("-i x.wav -c:a aac -b:a 192k x.m4a");
+        runPeer("-f lavfi -i testsrc2=size=1920x1080:rate=25:duration=8 -pix_fmt yuv420p -c:v libx264 "
+                "-preset veryfast x.mkv");
     }
     ~CMedia() { std::filesystem::remove_all(m_folder); }
 
@@ -54,6 +60,10 @@ public:
     P<CPluginHandler> boxed;
 
 private:
+    void runPeer(const std::string& arguments) const {
+        const std::string command = "cd '" + m_folder.string() + "' && ffmpeg -v error " + arguments;
+        if (std::system(command.c_str()) != 0) throw std::runtime_error("failed: " + command);
+    }
     // Tones with noise, which compress about as well as music.
     void write(const std::string& extension) {
         const P<IAudioFormat> format = plain->createAudioFormat(getURI(extension), kRate, 2, 2);
@@ -77,24 +87,53 @@ private:
     P<sonora2::audio::CSonoraContextAudio> m_context = peru::make<sonora2::audio::CSonoraContextAudio>();
 };
 
-void decode(benchmark::State& state, const char* extension, bool isBoxed) {
+CMedia& getMedia() {
     static CMedia s_media;
+    return s_media;
+}
+
+void countProcessorTime(benchmark::State& state, double start) {
+    state.counters["processors"] =
+        benchmark::Counter((getProcessorTime() - start) * 1e3, benchmark::Counter::kAvgIterations);
+}
+
+void decode(benchmark::State& state, const char* extension, bool isBoxed) {
+    CMedia& media = getMedia();
     const double start = getProcessorTime();
     int64_t bytes = 0;
     for (auto _ : state) {
-        const P<IAudioSource> source = (isBoxed ? s_media.boxed : s_media.plain)
-                                           ->createAudioSource(s_media.getURI(extension), kRate, 2, 2, true);
+        const P<IAudioSource> source = (isBoxed ? media.boxed : media.plain)
+                                           ->createAudioSource(media.getURI(extension), kRate, 2, 2, true);
         while (!source->isEOF())
             if (const auto chunk = source->getNextAudioChunk()) bytes += chunk->getSize();
     }
     state.SetBytesProcessed(bytes);
-    state.counters["processors"] =
-        benchmark::Counter((getProcessorTime() - start) * 1e3, benchmark::Counter::kAvgIterations);
+    countProcessorTime(state, start);
+}
+
+// 200 pictures of 1920 by 1080.
+void decodeVideo(benchmark::State& state, bool isBoxed) {
+    CMedia& media = getMedia();
+    const double start = getProcessorTime();
+    int64_t pictures = 0;
+    for (auto _ : state) {
+        const P<IVideoSource> source =
+            (isBoxed ? media.boxed : media.plain)->createVideoSource(media.getURI("mkv"), nullptr);
+        source->open();
+        while (!source->isEOF())
+            if (source->getNextPicture()) ++pictures;
+    }
+    state.SetItemsProcessed(pictures);
+    countProcessorTime(state, start);
 }
 
 BENCHMARK_CAPTURE(decode, flac_plain, "flac", false)->UseRealTime()->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(decode, flac_boxed, "flac", true)->UseRealTime()->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(decode, mp3_plain, "mp3", false)->UseRealTime()->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(decode, mp3_boxed, "mp3", true)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(decode, aac_plain, "m4a", false)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(decode, aac_boxed, "m4a", true)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(decodeVideo, plain, false)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(decodeVideo, boxed, true)->UseRealTime()->Unit(benchmark::kMillisecond);
 
 } // namespace
