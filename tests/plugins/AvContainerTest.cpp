@@ -33,9 +33,9 @@ protected:
 };
 
 // Ends in an error or in sound, and the next file is read. Cut off at 20 places and with 100 random changes
-// by scripts/isolation.sh, and a tenth of both otherwise.
+// by scripts/isolation.sh, and by a fiftieth of them otherwise.
 TEST_P(AvContainer, Damage_DoesNotReachTheHost) {
-    const size_t share = std::getenv("TONEWRIGHT_TEST_DAMAGE") ? 1 : 10;
+    const size_t share = std::getenv("TONEWRIGHT_TEST_DAMAGE") ? 1 : 50;
     const std::string name = GetParam().name;
     makeInput();
     encode(std::string("-t 0.3 ") + GetParam().options, name);
