@@ -111,23 +111,27 @@ TEST_F(AvFile, Soundtracks_AreListedAndSelected) {
     const auto peer = [this](int track) {
         return run("ffmpeg -v error -i x.mkv -map 0:a:" + std::to_string(track) + " -f s16le -");
     };
-    const P<IAudioSource> source = openAv("x.mkv");
-    const auto infos = source->getAudioStreamInfos();
-    ASSERT_EQ(3, infos->getStreamCount());
-    for (const auto& [index, language] : {std::pair{0, "ger"}, {1, ""}, {2, "fre"}})
-        EXPECT_EQ(language, text(infos->getStreamInfo(index)->getStreamLanguage()));
-    EXPECT_EQ("Kommentar", text(infos->getStreamInfo(0)->getStreamName()));
-    EXPECT_TRUE(peer(1) == readAll(source));
-    source->skipToTime(0.5);
-    source->setAudioStream(2); // one channel
-    EXPECT_TRUE(peer(2).substr(22050 * 2) == readAll(source));
-    EXPECT_EQ(1, source->getChannelCount());
-    EXPECT_ANY_THROW(source->setAudioStream(3));
-    source->close();
-    source->setAudioStream(1);
-    EXPECT_FALSE(source->isOpened());
-    source->open();
-    EXPECT_TRUE(peer(0) == readAll(source));
+    for (const bool isBoxed : {false, true}) {
+        SCOPED_TRACE(isBoxed);
+        handler = peru::make<sonora2::common::CPluginHandler>(context, isBoxed);
+        const P<IAudioSource> source = openAv("x.mkv");
+        const auto infos = source->getAudioStreamInfos();
+        ASSERT_EQ(3, infos->getStreamCount());
+        for (const auto& [index, language] : {std::pair{0, "ger"}, {1, ""}, {2, "fre"}})
+            EXPECT_EQ(language, text(infos->getStreamInfo(index)->getStreamLanguage()));
+        EXPECT_EQ("Kommentar", text(infos->getStreamInfo(0)->getStreamName()));
+        EXPECT_TRUE(peer(1) == readAll(source));
+        source->skipToTime(0.5);
+        source->setAudioStream(2); // one channel
+        EXPECT_TRUE(peer(2).substr(22050 * 2) == readAll(source));
+        EXPECT_EQ(1, source->getChannelCount());
+        EXPECT_ANY_THROW(source->setAudioStream(3));
+        source->close();
+        source->setAudioStream(1);
+        EXPECT_FALSE(source->isOpened());
+        source->open();
+        EXPECT_TRUE(peer(0) == readAll(source));
+    }
 }
 
 // Files that ffmpeg cannot write.
