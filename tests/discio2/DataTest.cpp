@@ -58,17 +58,32 @@ TEST(Data, AMixedDiscHasBothComponents) {
     ASSERT_EQ(run({"genisoimage", "-quiet", "-J", "-o", "data.iso", "file"}, folder.path()).exitCode, 0);
     const std::string audio = makeSectors(10, 7);
     folder.write("audio.bin", audio);
-    const auto blocks = std::filesystem::file_size(folder / "data.iso") / 2048;
-    const SOpenDisc open(folder.write(
-        "mixed.cue", "FILE data.iso BINARY\nTRACK 01 MODE1/2048\nINDEX 01 00:00:00\n"
-                     "FILE audio.bin BINARY\nTRACK 02 AUDIO\nPREGAP 00:02:00\nINDEX 01 00:00:00\n"));
-    ASSERT_TRUE(open.disc) << open.getError();
-    EXPECT_EQ(open.describe(), "0+" + std::to_string(blocks) + "-150 " + std::to_string(blocks + 150) +
-                                   "+10-150 | " + std::to_string(blocks + 160));
-    EXPECT_EQ(DISCIO_DiscGetComponentCount(open.disc.get()), 2);
-    EXPECT_EQ(DISCIO_DiscGetComponentType(open.disc.get(), 0), 2);
-    EXPECT_EQ(DISCIO_DiscGetComponentType(open.disc.get(), 1), 1);
-    EXPECT_TRUE(open.readSegment(0) == audio);
-    const Discio<DISCIO_DataCursor> cursor(DISCIO_DiscDataCreateCursorW(open.disc.get(), u""));
-    EXPECT_EQ(listAll(cursor.get()), std::vector<std::string>{"\\file 5"}) << open.getError();
+    const std::string iso = readFile(folder / "data.iso");
+    const size_t blocks = iso.size() / 2048;
+    std::string raw; // with sync pattern, address and mode in front, and check bytes behind
+    for (size_t i = 0; i < blocks; ++i)
+        raw += '\0' + std::string(10, '\xFF') + '\0' + big(i, 3) + '\1' + iso.substr(i * 2048, 2048) +
+               std::string(288, '\0');
+    folder.write("data.raw", raw);
+    const std::string audioFile =
+        "FILE audio.bin BINARY\nTRACK 02 AUDIO\nPREGAP 00:02:00\nINDEX 01 00:00:00\n";
+    const std::pair<const char*, std::string> sheets[] = {
+        {"mixed.cue", "FILE data.iso BINARY\nTRACK 01 MODE1/2048\nINDEX 01 00:00:00\n" + audioFile},
+        {"raw.cue", "FILE data.raw BINARY\nTRACK 01 MODE1/2352\nINDEX 01 00:00:00\n" + audioFile},
+        {"mixed.toc", "CD_ROM\nTRACK MODE1\nDATAFILE \"data.iso\"\nTRACK AUDIO\nPREGAP 00:02:00\n"
+                      "FILE \"audio.bin\" SWAP 0\n"},
+    };
+    for (const auto& [name, sheet] : sheets) {
+        SCOPED_TRACE(name);
+        const SOpenDisc open(folder.write(name, sheet));
+        ASSERT_TRUE(open.disc) << open.getError();
+        EXPECT_EQ(open.describe(), "0+" + std::to_string(blocks) + "-150 " + std::to_string(blocks + 150) +
+                                       "+10-150 | " + std::to_string(blocks + 160));
+        EXPECT_EQ(DISCIO_DiscGetComponentCount(open.disc.get()), 2);
+        EXPECT_EQ(DISCIO_DiscGetComponentType(open.disc.get(), 0), 2);
+        EXPECT_EQ(DISCIO_DiscGetComponentType(open.disc.get(), 1), 1);
+        EXPECT_TRUE(open.readSegment(0) == audio);
+        const Discio<DISCIO_DataCursor> cursor(DISCIO_DiscDataCreateCursorW(open.disc.get(), u""));
+        EXPECT_EQ(listAll(cursor.get()), std::vector<std::string>{"\\file 5"}) << open.getError();
+    }
 }

@@ -76,18 +76,29 @@ TEST_F(SImage, OtherSheetsDeliverTheSamplesOfTheirFiles) {
     EXPECT_EQ(narrow(DISCIO_DiscAudioGetMetaDataStringW(toc.disc.get(), DISCIO_TEXT_CODE)), "1234567890123");
     EXPECT_EQ(narrow(DISCIO_DiscAudioGetSegmentMetaDataStringW(toc.disc.get(), 0, DISCIO_TEXT_CODE)),
               "DEXXX0100001");
-    // Sectors first: the pause before track 1, two tracks with a gap, then the chunks.
+    // Sectors first: the pause before track 1, two tracks with a gap, then the chunks, in all versions.
     const std::string sectors = silence(150) + a + b;
-    std::string entries = big(0, 4) + "1234567890123" + std::string(5, '\0');
     const size_t cut[] = {0, 150, 170, 175, 200};
-    for (const size_t from : {size_t{0}, size_t{2}})
-        entries += "DEXXX0100001" + big(kSectorBytes, 2) + '\7' + std::string(3, '\0') +
-                   big(cut[from] * kSectorBytes, 8) + big(cut[from + 1] * kSectorBytes, 8) +
-                   big(cut[from + 2] * kSectorBytes, 8);
-    expect("disc.nrg",
-           sectors + "DAOX" + big(entries.size(), 4) + entries + "END!" + big(0, 4) + "NER5" +
-               big(sectors.size(), 8),
-           "0+20-150 25+25-5 | 50", {a, b.substr(5 * kSectorBytes)});
+    for (const int width : {8, 4}) {
+        const std::string trailer =
+            "END!" + big(0, 4) + (width == 8 ? "NER5" : "NERO") + big(sectors.size(), width);
+        std::string entries = big(0, 4) + "1234567890123" + std::string(5, '\0');
+        for (const size_t from : {size_t{0}, size_t{2}})
+            entries += "DEXXX0100001" + big(kSectorBytes, 2) + '\7' + std::string(3, '\0') +
+                       big(cut[from] * kSectorBytes, width) + big(cut[from + 1] * kSectorBytes, width) +
+                       big(cut[from + 2] * kSectorBytes, width);
+        expect("once.nrg",
+               sectors + (width == 8 ? "DAOX" : "DAOI") + big(entries.size(), 4) + entries + trailer,
+               "0+20-150 25+25-5 | 50", {a, b.substr(5 * kSectorBytes)});
+        entries.clear();
+        for (const size_t from : {size_t{1}, size_t{2}})
+            entries += big(cut[from] * kSectorBytes, width) +
+                       big((from == 1 ? 20 : 30) * kSectorBytes, width) + big(7, 4) + big(0, 4) +
+                       std::string(static_cast<size_t>(width), '\0');
+        expect("each.nrg",
+               sectors + (width == 8 ? "ETN2" : "ETNF") + big(entries.size(), 4) + entries + trailer,
+               "0+20-150 20+30-0 | 50", {a, b});
+    }
 }
 
 // Another program reads the same sheets.
