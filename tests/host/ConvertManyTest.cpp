@@ -36,12 +36,15 @@ TEST_F(ConvertMany, KeepsTheStructureOfFolders) {
     dry.insert(dry.end(), {"--dry-run", "--json"});
     std::set<std::string> planned;
     for (const nlohmann::json& event : parseLines(succeed(dry)))
-        if (event["event"] == "planned") planned.insert(event["output"]);
+        if (event["event"] == "planned" && event["replaces"] == false) planned.insert(event["output"]);
     EXPECT_EQ(list(), before);
     succeed(command);
     EXPECT_EQ(listBelow("out/"),
               (std::set<std::string>{"out/a.flac", "out/sub/a.flac", "out/sub/deep/C.flac"}));
     EXPECT_EQ(listBelow("out/"), planned);
+    dry.push_back("-f");
+    for (const nlohmann::json& event : parseLines(succeed(dry)))
+        EXPECT_EQ(event.value("replaces", false), event["event"] == "planned") << event;
     // Outputs among the inputs are not converted again.
     for (const char* extension : {"aiff", "flac"})
         succeed({"convert", "-r", "in", "-o", "in/out/", "--to", extension});

@@ -6,7 +6,10 @@
 #include "sonora2/encoding/AudioEncoder.h"
 #include "sonora2/media/IDiscardable.h"
 #include "sonora2/media/IFormatSettings.h"
+#include "sonora2/media/ISalvage.h"
 
+#include <csignal>
+#include <fstream>
 #include <thread>
 
 namespace tests {
@@ -136,6 +139,25 @@ protected:
 
     P<CPluginHandler> boxed;
 };
+
+TEST_F(BoxedJobs, Settings_OutliveTheirProcess) {
+    writeFile(folder / "x.flac", makeMusic({}, 50'000));
+    const P<IAudioSource> source = boxed->createAudioSource(toURI(folder / "x.flac"), 44100, 2, 2, true);
+    peru::interfaceCast<IMediaDescription>(source)->setDeliveredFormat(22050, 1, 3);
+    peru::interfaceCast<ISalvage>(source)->setSalvage(true);
+    source->setStartTime(0.25);
+    const std::string expected = readAll(source);
+    EXPECT_NEAR(static_cast<double>(expected.size()), (25'000 - 0.25 * 22'050) * 3, 2 * 3);
+    for (const auto& thread : std::filesystem::directory_iterator("/proc/self/task")) {
+        std::ifstream children(thread.path() / "children");
+        for (pid_t child; children >> child;) ::kill(child, SIGKILL);
+    }
+    EXPECT_THROW(source->skipToTime(0.0), CSonoraError);
+    source->close();
+    source->open();
+    EXPECT_TRUE(readAll(source) == expected);
+    EXPECT_TRUE(peru::interfaceCast<ISalvage>(source)->getSalvage());
+}
 
 TEST_F(BoxedJobs, ManyAtOnce_AllSucceed) {
     const std::string pcm = makeMusic({}, 50'000);

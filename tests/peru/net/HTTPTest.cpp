@@ -113,6 +113,7 @@ const SResponseCase kResponses[] = {
     {"chunk without a size", kOK + "Transfer-Encoding: chunked\r\n\r\n\r\nhello", kIllegal},
     {"chunk longer than its size", kOK + "Transfer-Encoding: chunked\r\n\r\n4\r\nhello\r\n0\r\n\r\n",
      kIllegal},
+    {"largest chunk size", kOK + "Transfer-Encoding: chunked\r\n\r\n7fffffffffffffff\r\nhello", kEarlyEnd},
     {"chunk size too large", kOK + "Transfer-Encoding: chunked\r\n\r\n80000000000000000\r\nhello", kIllegal},
     {"endless extension", kOK + "Transfer-Encoding: chunked\r\n\r\n5;" + std::string(70'000, 'x'), kIllegal},
     {"endless trailers", kOK + "Transfer-Encoding: chunked\r\n\r\n0\r\n" + std::string(70'000, 'x'),
