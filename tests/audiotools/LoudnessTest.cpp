@@ -162,6 +162,23 @@ TEST(Loudness, MeetsTheMinimumRequirements) {
     }
 }
 
+// Channels at the sides count more; those behind the listener do not, and low frequencies not at all.
+TEST(Loudness, EachChannelHasTheWeightOfItsPlace) {
+    const std::vector<double> layouts[] = {{0, 0, 0, -INFINITY, 1.5, 1.5},
+                                           {0, 0, 0, -INFINITY, 0, 1.5, 1.5},
+                                           {0, 0, 0, -INFINITY, 0, 0, 1.5, 1.5},
+                                           std::vector<double>(9)};
+    for (const std::vector<double>& gains : layouts)
+        for (size_t only = 0; only < gains.size(); ++only) {
+            const auto sound = make(8000, static_cast<int>(gains.size()), 16, 0.5, [=](double t, int c) {
+                return static_cast<size_t>(c) == only ? decibels(-20) * tone(1000, t) : 0.0;
+            });
+            const double loudness = resultOf(measure(sound, 0)), expected = gains[only] - 23.0;
+            EXPECT_TRUE(loudness == expected || std::fabs(loudness - expected) < 0.1)
+                << loudness << " for channel " << only << " of " << gains.size();
+        }
+}
+
 TEST(Loudness, AlbumsFloatsAndSoundThatCannotBeMeasured) {
     const auto at = [](double level) {
         return make(48000, 2, 32, 2, [=](double t, int) { return decibels(level) * tone(1000, t); });
@@ -170,14 +187,18 @@ TEST(Loudness, AlbumsFloatsAndSoundThatCannotBeMeasured) {
     TONEWRIGHT_Analysator* const album[] = {loud.get(), quiet.get()};
     EXPECT_NEAR(getAnalysatorLoudness(album, 2), 10 * std::log10((1 + decibels(-12)) / 2) - 20, 0.1);
 
-    SSound wide = at(6), floats{48000, 2, 32, {}};
+    SSound floats{48000, 2, 32, {}}, doubles{48000, 2, 64, {}};
     for (int i = 0; i < 96000; ++i) {
-        const float samples[] = {static_cast<float>(2 * tone(1000, i / 48000.0)), i == 9 ? NAN : 0.0f};
-        floats.samples.append(reinterpret_cast<const char*>(samples), sizeof samples);
+        const double samples[] = {2 * tone(1000, i / 48000.0), i == 9 ? NAN : 0.0};
+        const float narrow[] = {static_cast<float>(samples[0]), static_cast<float>(samples[1])};
+        floats.samples.append(reinterpret_cast<const char*>(narrow), sizeof narrow);
+        doubles.samples.append(reinterpret_cast<const char*>(samples), sizeof samples);
     }
-    const Analysator loudest = measure(floats, TONEWRIGHT_ANALYSATOR_PEAKS | TONEWRIGHT_ANALYSATOR_FLOAT);
-    EXPECT_NEAR(resultOf(loudest), 3.0, 0.1);
-    EXPECT_NEAR(truePeakOf(loudest), 6.02, 0.1);
+    for (const SSound& sound : {floats, doubles}) {
+        const Analysator loudest = measure(sound, TONEWRIGHT_ANALYSATOR_PEAKS | TONEWRIGHT_ANALYSATOR_FLOAT);
+        EXPECT_NEAR(resultOf(loudest), 3.0, 0.1);
+        EXPECT_NEAR(truePeakOf(loudest), 6.02, 0.1);
+    }
 
     EXPECT_EQ(resultOf(measure(make(44100, 2, 16, 1, [](double, int) { return 0.0; }))), -INFINITY);
     EXPECT_EQ(resultOf(measure({})), -INFINITY);
