@@ -77,6 +77,7 @@ protected:
         for (const SFormatCase& format : kFormatCases)
             if (names.insert(format.plugin).second) context->addPluginName(format.plugin);
         context->addPluginName("sonora2_decmpa"); // reads what sonora2_l3codec writes
+        context->setSwitchB(true);                // pictures of a slave are fetched ahead, as in hosts
         // All tests also hold for plug-ins in slave processes.
         handler = peru::make<sonora2::common::CPluginHandler>(context, std::getenv("TEST_BOXED") != nullptr);
     }

@@ -114,7 +114,7 @@ int CEncapsulatedSource::getBufferStatus() {
 }
 
 bool CEncapsulatedSource::isEOF() {
-    if (m_prefetch.isRunning() && !m_prefetch.isEmpty()) return false;
+    if (m_prefetch.isRunning() && !m_prefetch.isAtEnd()) return false;
     const peru::CMutexLock lock(m_guard);
     if (!m_client || !m_chunks.empty() || m_chunkFailure) return false;
     if (!has(kFacetVideo)) return m_state->isEOF;

@@ -60,22 +60,24 @@ void CPicturePrefetch::clear() {
     m_moreWanted->set();
 }
 
-bool CPicturePrefetch::isEmpty() const {
+bool CPicturePrefetch::isAtEnd() const {
+    if (isPending()) return false;
     const peru::CMutexLock lock(m_mutex);
-    return m_pictures.empty();
+    return m_pictures.empty() && m_isAtEnd;
 }
 
 void CPicturePrefetch::work() {
     while (m_running && !m_stop->wait(0)) {
-        const bool isWanted = m_moreWanted->wait(kIdleWait);
+        m_moreWanted->wait(kIdleWait);
         if (m_stop->wait(0)) return;
         bool isFull;
         {
             const peru::CMutexLock lock(m_mutex);
             isFull = m_pictures.size() >= kMostPictures || m_isAtEnd || m_failure;
-            if (!isWanted || isFull) m_moreWanted->reset();
+            // Otherwise a request that arrives just as the wait ends would be lost.
+            if (isFull) m_moreWanted->reset();
         }
-        if (!isWanted || isFull) continue;
+        if (isFull) continue;
         P<peru::CException> failure;
         try {
             uint64_t generation = 0;
@@ -107,17 +109,21 @@ void CPicturePrefetch::append(const P<ISonoraPicture>& picture, uint64_t generat
     if (m_pictures.size() >= kMostPictures) m_moreWanted->reset();
 }
 
-void CPicturePrefetch::waitForPicture() {
+bool CPicturePrefetch::isPending() const {
     for (uint32_t waited = 0;; ++waited) {
         {
             const peru::CMutexLock lock(m_mutex);
-            if (!m_pictures.empty() || m_isAtEnd) return;
-            if (m_failure) m_failure->raise();
+            if (!m_pictures.empty() || m_isAtEnd || m_failure) return false;
         }
-        if (waited == kPictureWait)
-            throw peru::CError("CEncapsulatedSource: timeout while prefetching image");
+        if (waited == kPictureWait) return true;
         peru::getThreadManager()->sleep(1);
     }
+}
+
+void CPicturePrefetch::waitForPicture() {
+    if (isPending()) throw peru::CError("CEncapsulatedSource: timeout while prefetching image");
+    const peru::CMutexLock lock(m_mutex);
+    if (m_pictures.empty() && m_failure) m_failure->raise();
 }
 
 P<ISonoraPicture> CPicturePrefetch::take() {

@@ -32,7 +32,9 @@ public:
     bool isRunning() const { return m_running; }
     // Drops what was fetched; called under the lock when the position changes.
     void clear();
-    bool isEmpty() const;
+    // Whether the source has no picture left. Waits for a picture that is on its way: it has left the slave,
+    // which is at its end then. False after an error, which take() throws.
+    bool isAtEnd() const;
 
     // The next picture; empty as the source has returned it, and at the end. Throws an error of the thread,
     // or CError if nothing arrives in time.
@@ -43,6 +45,7 @@ public:
 private:
     void work();
     void append(const P<ISonoraPicture>& picture, uint64_t generation, bool isEnd);
+    bool isPending() const; // neither a picture nor the end nor an error has arrived in time
     void waitForPicture();
 
     Fetch m_fetch;

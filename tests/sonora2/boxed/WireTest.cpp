@@ -99,16 +99,22 @@ TEST(PicturePrefetch, Pictures_ArriveInOrderUntilTheEndAndFromANewPosition) {
         const int number = next++;
         if (number == 27) throw 27;
         if (number == 6) return CPicturePrefetch::EFetched::end;
+        std::this_thread::sleep_for(std::chrono::milliseconds(2)); // on its way
         picture = make<CRGBPicture>(memory(), number);
         return CPicturePrefetch::EFetched::picture;
     });
     prefetch.start();
     EXPECT_EQ(0.0, prefetch.peek()->getTimestamp());
-    for (int i = 0; i < 6; ++i) EXPECT_EQ(i, prefetch.take()->getTimestamp());
+    for (int i = 0; i < 6; ++i) {
+        EXPECT_FALSE(prefetch.isAtEnd());
+        EXPECT_EQ(i, prefetch.take()->getTimestamp());
+    }
+    EXPECT_TRUE(prefetch.isAtEnd());
     EXPECT_FALSE(prefetch.take()) << "the end does not wait";
     next = 20;
     prefetch.clear();
     for (int i = 20; i < 27; ++i) EXPECT_EQ(i, prefetch.take()->getTimestamp());
+    EXPECT_FALSE(prefetch.isAtEnd());
     EXPECT_THROW(prefetch.take(), peru::CError);
     prefetch.stop();
     EXPECT_FALSE(prefetch.isRunning());
