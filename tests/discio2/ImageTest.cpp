@@ -132,16 +132,28 @@ TEST_F(SImage, PlacesAgreeWithARecordersProgram) {
 
 TEST_F(SImage, TextsComeFromTheSheet) {
     folder.write("a.bin", a);
-    const SOpenDisc open(folder.write(
-        "a.cue", "REM x\nCATALOG 0000000000001\nTITLE \"Disc \xE9\"\nPERFORMER Band\nFILE a.bin BINARY\n"
-                 "TRACK 01 AUDIO\nTITLE \"First one\"\nISRC DEXXX0100001\nINDEX 01 00:00:00\n"));
+    const SOpenDisc open(
+        folder.write("a.cue", "REM x\nCATALOG 0000000000001\nPERFORMER Band\nFILE a.bin BINARY\n"
+                              "TRACK 01 AUDIO\nTITLE \"First one\"\nISRC DEXXX0100001\nINDEX 01 00:00:00\n"));
     ASSERT_TRUE(open.disc) << open.getError();
-    EXPECT_EQ(std::u16string(DISCIO_DiscAudioGetMetaDataStringW(open.disc.get(), DISCIO_TEXT_TITLE)),
-              u"Disc \u00E9");
     EXPECT_EQ(narrow(DISCIO_DiscAudioGetSegmentMetaDataStringW(open.disc.get(), 0, DISCIO_TEXT_TITLE)),
               "First one");
     EXPECT_EQ(DISCIO_DiscAudioGetSegmentMetaDataStringW(open.disc.get(), 1, DISCIO_TEXT_TITLE), nullptr);
     EXPECT_EQ(DISCIO_GetLastError(nullptr), DISCIO_ERROR_NO_SUCH_OBJECT);
+    const std::pair<const char*, const char16_t*> titles[] = {{"Disc \xE9", u"Disc \u00E9"},
+                                                              {"\xC4rzte", u"\u00C4rzte"},
+                                                              {"\xC3\x84rzte", u"\u00C4rzte"},
+                                                              {"\xE2\x80x", u"\u00E2\u0080x"},
+                                                              {"\xE2\x80\x94", u"\u2014"},
+                                                              {"\xF0\x9D\x84\x9E", u"\U0001D11E"},
+                                                              {"\xF0\x9D\x84", u"\u00F0\u009D\u0084"}};
+    for (const auto& [bytes, expected] : titles) {
+        const SOpenDisc titled(folder.write("b.cue", std::string("TITLE \"") + bytes +
+                                                         "\"\nFILE a.bin BINARY\nTRACK 01 AUDIO\n"
+                                                         "INDEX 01 00:00:00\n"));
+        EXPECT_EQ(std::u16string(DISCIO_DiscAudioGetMetaDataStringW(titled.disc.get(), DISCIO_TEXT_TITLE)),
+                  expected);
+    }
 }
 
 TEST_F(SImage, SeekingReachesEveryFrame) {
