@@ -38,19 +38,23 @@ struct SDiscs : testing::Test {
 TEST_F(SDiscs, AudioTracksAreFiles) {
     const std::string samples = makeSectors(24, 5);
     folder.write("a.bin", samples);
-    std::string sheet = "FILE a.bin BINARY\n";
+    std::string sheet = "PERFORMER Band\nFILE a.bin BINARY\n";
     std::vector<std::string> names;
     for (int i = 1; i <= 12; ++i) {
         const std::string number = (i < 10 ? "0" : "") + std::to_string(i);
-        sheet += "TRACK " + number + " AUDIO\nINDEX 01 00:00:" + (2 * i - 2 < 10 ? "0" : "") +
-                 std::to_string(2 * i - 2) + "\n";
+        sheet += "TRACK " + number + " AUDIO\nTITLE T" + number +
+                 "\nINDEX 01 00:00:" + (2 * i - 2 < 10 ? "0" : "") + std::to_string(2 * i - 2) + "\n";
         names.push_back("Track" + number + ".cda");
     }
     folder.write("a.cue", sheet);
     const P<IDrive> drive = getDrive();
     const P<IDisc> disc = drive->getDisc();
     ASSERT_TRUE(disc);
-    EXPECT_TRUE(peru::tryCast<IAudioCDDisc>(disc));
+    const P<IAudioCDDisc> audio = peru::tryCast<IAudioCDDisc>(disc);
+    ASSERT_TRUE(audio);
+    EXPECT_EQ(audio->getSegmentCount(), 12);
+    EXPECT_EQ(text(audio->getText(11, DISCIO_TEXT_TITLE)), "T12");
+    EXPECT_EQ(text(audio->getText(-1, DISCIO_TEXT_PERFORMER)), "Band");
     EXPECT_EQ(text(disc->getDisplayName()), "(" + folder.path().string() + ") Audio CD");
     EXPECT_EQ(list(drive->getFileSystem()->getRoot()), names);
     const P<peru::IURI> uri = drive->getPath()->appendPath("Track10.cda");
@@ -70,10 +74,11 @@ TEST_F(SDiscs, AudioTracksAreFiles) {
         EXPECT_EQ(pcm.funcs->read(pcm.user, block.data(), 2 * 588, &delivered), 1);
         EXPECT_TRUE(block == samples.substr(18 * 2352, 2 * 2352));
     }
-    for (const char* bad :
-         {"http://x/Track01.cda", "discioppvirtualdisc:///Track01.cda", "file:///dev/null/Track01.cda",
-          "file:///x/Track1.cda", "discioppdiscimage:///none.cue/Track01.cda"})
-        EXPECT_THROW(openTrack(peru::make<peru::CURI>(bad)), peru::CException) << bad;
+    for (const char* bad : {"discioppvirtualdisc:///Track01.cda", "discioppvirtualdiscaudiocd:///Track01.cda",
+                            "file:///dev/null/Track01.cda", "file:///x/Track1.cda"})
+        EXPECT_THROW(openTrack(peru::make<peru::CURI>(bad)), peru::CFileNotFoundError) << bad;
+    EXPECT_THROW(openTrack(peru::make<peru::CURI>("discioppdiscimage:///none.cue/Track01.cda")),
+                 CDISCIOPPException);
     EXPECT_THROW(openTrack(peru::make<peru::CURI>("http://x/Track01.cda")), CUnknownURIScheme);
     EXPECT_EQ(errorOf([&] { openTrack(drive->getPath()->appendPath("Track13.cda")); }),
               "The specified object does not exist. (track 13)");
