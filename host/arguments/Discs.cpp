@@ -20,12 +20,12 @@ std::set<int> parseTracks(const std::string& text) {
     for (std::string part; std::getline(parts, part, ',');) {
         std::istringstream in(part);
         int first = 0, last = 0;
-        char dash = 0;
+        char dash = 0, rest = 0;
         in >> first;
         last = first;
         if (in >> dash) in >> last;
         if (in.fail() && !(in.eof() && dash == 0)) first = 0;
-        if (first < 1 || last < first || last > 99 || (dash != 0 && dash != '-'))
+        if (first < 1 || last < first || last > 99 || (dash != 0 && dash != '-') || in >> rest)
             throw CLI::ValidationError("TRACKS",
                                        part + " is not a track or a range of tracks, such as 1,3-5");
         for (int track = first; track <= last; ++track) tracks.insert(track);

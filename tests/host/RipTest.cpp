@@ -29,8 +29,11 @@ TEST_F(Rip, FilesHoldTheExactSamplesTextsAndReports) {
     const auto lines = parseLines(succeed({"rip", "disc.cue", "-d", "out", "--verify", "--cue", "--json"}));
     EXPECT_TRUE(decode("out/01 One-Two.flac") == a.substr(0, 30 * kSectorBytes));
     EXPECT_TRUE(decode("out/02 Track 2.flac") == b);
-    EXPECT_NE(peer({"metaflac", "--export-tags-to=-", "out/01 One-Two.flac"}).find("TITLE=One/Two\n"),
-              std::string::npos);
+    for (const char* field : {"TITLE=One/Two\n", "ALBUM=The disc\n", "ARTIST=Band\n", "TRACKNUMBER=1\n"})
+        EXPECT_NE(peer({"metaflac", "--export-tags-to=-", "out/01 One-Two.flac"}).find(field),
+                  std::string::npos)
+            << field;
+    EXPECT_EQ(peer({"metaflac", "--show-tag=TITLE", "out/02 Track 2.flac"}), "") << "none is made up";
     folder.write("b.raw", b);
     const std::string crc = peer(
         {"/usr/bin/python3", "-c", "import zlib; print('%08X' % zlib.crc32(open('b.raw','rb').read()))"});
@@ -44,7 +47,11 @@ TEST_F(Rip, FilesHoldTheExactSamplesTextsAndReports) {
             EXPECT_EQ(line["verified"], true);
         }
     EXPECT_TRUE(isReported);
-    EXPECT_NE(readFile(folder / "out/The disc.cue").find("FILE \"01 One-Two.flac\" WAVE"), std::string::npos);
+    EXPECT_EQ(
+        readFile(folder / "out/The disc.cue"),
+        "TITLE \"The disc\"\nPERFORMER \"Band\"\n"
+        "FILE \"01 One-Two.flac\" WAVE\n  TRACK 01 AUDIO\n    TITLE \"One/Two\"\n    INDEX 01 00:00:00\n"
+        "FILE \"02 Track 2.flac\" WAVE\n  TRACK 02 AUDIO\n    INDEX 01 00:00:00\n");
 }
 
 TEST_F(Rip, SomeTracksAsOtherTypesWithoutReplacing) {
@@ -55,7 +62,11 @@ TEST_F(Rip, SomeTracksAsOtherTypesWithoutReplacing) {
     EXPECT_TRUE(std::filesystem::exists(folder / "The disc 01.wav"));
     EXPECT_NE(fail({"rip", "disc.cue", "3"}).find("has no audio track 3"), std::string::npos);
     EXPECT_NE(fail({"rip", "nothing.cue"}).find("nothing.cue"), std::string::npos);
-    EXPECT_EQ(tonewright({"rip", "disc.cue", "2-x"}).exitCode, 2);
+    for (const char* tracks : {"2-x", "2-", "2-1", "0", "1,,2", "99-100", "1-2-2", "1-2x", "2x"})
+        EXPECT_EQ(tonewright({"rip", "disc.cue", tracks}).exitCode, 2) << tracks;
+    succeed({"rip", "disc.cue", "2,1-2", "--to", "au", "-q"});
+    EXPECT_TRUE(decode("01 One-Two.au") == a.substr(0, 30 * kSectorBytes));
+    EXPECT_TRUE(decode("02 Track 2.au") == b);
     EXPECT_EQ(list().count("The disc 02.wav.part"), 0u);
 }
 
