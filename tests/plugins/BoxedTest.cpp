@@ -150,7 +150,10 @@ TEST_F(BoxedJobs, Settings_OutliveTheirProcess) {
     EXPECT_NEAR(static_cast<double>(expected.size()), (25'000 - 0.25 * 22'050) * 3, 2 * 3);
     for (const auto& thread : std::filesystem::directory_iterator("/proc/self/task")) {
         std::ifstream children(thread.path() / "children");
-        for (pid_t child; children >> child;) ::kill(child, SIGKILL);
+        for (pid_t child; children >> child;) {
+            ::kill(child, SIGKILL);
+            for (int i = 0; i < 5000 && ::kill(child, 0) == 0; ++i) ::usleep(1000); // until it has ended
+        }
     }
     EXPECT_THROW(source->skipToTime(0.0), CSonoraError);
     source->close();
