@@ -201,6 +201,35 @@ TEST_F(Convert, NeverGivesUpWhatWasAskedFor) {
     EXPECT_EQ(list(), std::set<std::string>{"in.wav"});
 }
 
+TEST_F(Convert, SalvagesAndPreventsClippingOnRequest) {
+    const SSound noise = makeNoise(44100, 1, 16, 100'000);
+    write("damaged.wav", noise);
+    peer({"flac", "-s", "-0", "damaged.wav"});
+    std::string bytes = readFile(folder / "damaged.flac");
+    std::fill_n(bytes.begin() + static_cast<ptrdiff_t>(bytes.size() / 2), 3000, '\0');
+    folder.write("damaged.flac", bytes);
+    EXPECT_NE(fail({"convert", "damaged.flac", "-o", "out.wav"}).find("is damaged at"), std::string::npos);
+    SProcessResult result = tonewright({"convert", "damaged.flac", "-o", "out.wav", "--salvage"});
+    EXPECT_EQ(result.exitCode, 0);
+    EXPECT_NE(result.err.find("is damaged: "), std::string::npos) << result.err;
+    const SSound salvaged = readWav("out.wav");
+    ASSERT_EQ(salvaged.frames(), noise.frames());
+    for (const size_t frame : {0u, 40'000u, 60'000u, 99'999u})
+        EXPECT_EQ(salvaged.at(frame, 0), noise.at(frame, 0));
+
+    // 6 dB above full scale, then half of full scale.
+    peer({"ffmpeg", "-v", "error", "-f", "lavfi", "-i", "aevalsrc=exprs=if(lt(t\\,0.5)\\,2\\,0.5):s=8000:d=1",
+          "-c:a", "pcm_f32le", "loud.wav"});
+    for (const auto& [option, warning, second] : {std::tuple{"--no-tags", "Clipped 4000 samples", 0.5},
+                                                  {"--prevent-clipping", "Reduced by 6.0 dB", 0.25}}) {
+        result = tonewright({"convert", "-f", "loud.wav", "-o", "out.wav", "--bits", "16", option});
+        EXPECT_EQ(result.exitCode, 0);
+        EXPECT_NE(result.err.find(warning), std::string::npos) << result.err;
+        EXPECT_NEAR(readWav("out.wav").at(100, 0), 1.0, 1e-4);
+        EXPECT_NEAR(readWav("out.wav").at(6000, 0), second, 1e-4);
+    }
+}
+
 TEST_F(Convert, ObeysQualityAndBitRate) {
     write("in.wav", makeNoise(44100, 2, 16, 44100));
     const auto size = [&](const char* extension, const char* option, const char* value) {
