@@ -31,6 +31,8 @@ typedef struct DISCIO_Drive DISCIO_Drive;
 typedef struct DISCIO_Disc DISCIO_Disc;
 /* A position in the files of a data disc. */
 typedef struct DISCIO_DataCursor DISCIO_DataCursor;
+/* A disc that is composed in memory and then written. */
+typedef struct DISCIO_Project DISCIO_Project;
 
 /* --- Library ---------------------------------------------------------------------------------------------
  */
@@ -48,18 +50,29 @@ enum {
     DISCIO_ERROR_NO_SUCH_OBJECT = 5,
     DISCIO_ERROR_NOT_FOUND = 6,
     DISCIO_ERROR_NOT_SUPPORTED = 7,
+    DISCIO_ERROR_ABORTED = 8,
+    DISCIO_ERROR_ALREADY_EXISTS = 9,
     DISCIO_ERROR_NOT_A_FILE = 10,
     DISCIO_ERROR_NOT_A_FOLDER = 11,
     DISCIO_ERROR_UNSUPPORTED_FORMAT = 12,
     DISCIO_ERROR_NOT_PREPARED = 13,
     DISCIO_ERROR_DEVICE = 15,
+    DISCIO_ERROR_CANNOT_WRITE = 16,
+    DISCIO_ERROR_BUFFER_UNDERRUN = 17,
     DISCIO_ERROR_NO_DISC = 18,
     DISCIO_ERROR_DISC_NOT_VIRTUAL = 19,
+    DISCIO_ERROR_DISC_NOT_WRITABLE = 20,
+    DISCIO_ERROR_DISC_NOT_ERASABLE = 21,
     DISCIO_ERROR_DISC_LOST = 22,
+    DISCIO_ERROR_DISC_CONTENTS_IN_USE = 23,
     DISCIO_ERROR_DISC_EMPTY = 24,
+    DISCIO_ERROR_DISC_NOT_EMPTY = 25,
     DISCIO_ERROR_NO_DATA = 26,
     DISCIO_ERROR_NO_AUDIO = 27,
+    DISCIO_ERROR_UNSUPPORTED_DISC_TYPE = 29,
+    DISCIO_ERROR_NOT_ENOUGH_SPACE = 32,
     DISCIO_ERROR_READ_INPUT = 34,
+    DISCIO_ERROR_STREAM_ALREADY_OPEN = 35,
     DISCIO_ERROR_STREAM_NOT_OPEN = 36,
     DISCIO_ERROR_BROKEN_FILE_SYSTEM = 38
 };
@@ -222,6 +235,106 @@ DISCIO_API const char16_t* DISCIO_DataCursorGetFileSourceURIW(DISCIO_DataCursor*
 DISCIO_API int64_t DISCIO_DataCursorGetCreatedTime(DISCIO_DataCursor* cursor);
 DISCIO_API int64_t DISCIO_DataCursorGetLastModifiedTime(DISCIO_DataCursor* cursor);
 DISCIO_API int64_t DISCIO_DataCursorGetLastAccessedTime(DISCIO_DataCursor* cursor);
+
+/* --- Projects --------------------------------------------------------------------------------------------
+ */
+
+/* An audio CD without tracks, or a data disc without files, to be filled and written. A project, the handles
+ * of its disc and their cursors count as one handle: one thread at a time. Released with DISCIO_Release. */
+DISCIO_API DISCIO_Project* DISCIO_CreateAudioCDProject(DISCIO_Library* library);
+DISCIO_API DISCIO_Project* DISCIO_CreateDataDiscProject(DISCIO_Library* library);
+/* The disc of a project, for all functions of discs. Every call returns a new handle to the same disc, which
+ * is released with DISCIO_Release and stays usable without the project. DISCIO_DiscIsVirtual is 1 for it; it
+ * shows every change at once. The functions below change it; they fail with DISCIO_ERROR_DISC_NOT_VIRTUAL for
+ * other discs, and with DISCIO_ERROR_DISC_CONTENTS_IN_USE while the project is being written. */
+DISCIO_API DISCIO_Disc* DISCIO_ProjectGetVirtualDisc(DISCIO_Project* project);
+
+/* A stream of samples from functions. The record is copied; its functions are called on the thread that uses
+ * the stream or writes the project. They may fail with 0, or with a negative length or count. `end` is called
+ * once, when neither the handle nor a disc uses the stream any more, and `user` has to stay valid until then.
+ * Released with DISCIO_Release, also right after it has been inserted into a disc. */
+DISCIO_API DISCIO_PCMAudioStream*
+DISCIO_CreatePCMAudioStreamFromFuncs(DISCIO_Library* library, const DISCIO_PCMAudioStreamFuncs* funcs,
+                                     void* user);
+/* The same from a WAV file: 16-bit stereo PCM at 44100 Hz, otherwise DISCIO_ERROR_UNSUPPORTED_FORMAT. `file`
+ * is an absolute path or a file URI. Fails with DISCIO_ERROR_DISC_LOST when the file is changed later. */
+DISCIO_API DISCIO_PCMAudioStream* DISCIO_CreatePCMAudioStreamFromFileW(DISCIO_Library* library,
+                                                                       const char16_t* file);
+
+/* Inserts a track before the one at `place`; a place equal to the number of tracks, or -1, appends it. The
+ * stream may come from any of the functions that create one, including a track of another disc. It is opened
+ * once to learn its length: 16-bit stereo at 44100 Hz of at least one frame, otherwise
+ * DISCIO_ERROR_UNSUPPORTED_FORMAT. A stream that ends before its length is continued with silence. Each
+ * stream can be inserted once. A disc has up to 99 tracks. */
+DISCIO_API int32_t DISCIO_DiscAudioInsertSegmentPCMAudioStream(DISCIO_Disc* disc,
+                                                               DISCIO_PCMAudioStream* stream, int32_t place);
+DISCIO_API int32_t DISCIO_DiscAudioRemoveSegment(DISCIO_Disc* disc, int32_t segment);
+/* The silence before a track, in blocks from 0 to 22500; 150 by default. Before the first track it is always
+ * 150, which are not part of an image. */
+DISCIO_API int32_t DISCIO_DiscAudioSetSegmentPregap(DISCIO_Disc* disc, int32_t segment, int32_t blocks);
+/* Texts without control characters, up to 160 of them; empty removes one. DISCIO_TEXT_CODE takes 13 digits
+ * for the disc, and an ISRC such as "DEABC2600001" for a track. */
+DISCIO_API int32_t DISCIO_DiscAudioSetMetaDataStringW(DISCIO_Disc* disc, int32_t text, const char16_t* value);
+DISCIO_API int32_t DISCIO_DiscAudioSetSegmentMetaDataStringW(DISCIO_Disc* disc, int32_t segment, int32_t text,
+                                                             const char16_t* value);
+
+/* Adds a file to a folder that exists. `source` is an absolute path or a file URI; an absolute path may also
+ * be in the form of a disc's paths, with "\" for every "/". It is read when the project is written, and must
+ * not have changed its size until then. Names on a disc have up to 255 bytes in UTF-8 and none of "/", "\"
+ * and control characters; Joliet shortens those of more than 103 characters. */
+DISCIO_API int32_t DISCIO_DiscDataAddFileW(DISCIO_Disc* disc, const char16_t* path, const char16_t* source);
+/* In a folder that exists; DISCIO_ERROR_ALREADY_EXISTS if there is such an entry. */
+DISCIO_API int32_t DISCIO_DiscDataCreateFolderW(DISCIO_Disc* disc, const char16_t* path);
+/* A file, or a folder with everything in it. */
+DISCIO_API int32_t DISCIO_DiscDataRemoveW(DISCIO_Disc* disc, const char16_t* path);
+
+/* --- Writing ---------------------------------------------------------------------------------------------
+ */
+
+/* How a project is written; combined with "|". */
+enum {
+    DISCIO_WRITE_DUMMY = 1,  /* with the laser off; drives only */
+    DISCIO_WRITE_BLANK = 2,  /* a rewritable medium that is not empty is blanked first; drives only */
+    DISCIO_WRITE_VERIFY = 4, /* reads a medium back and compares it; images are always compared */
+    DISCIO_WRITE_CD_TEXT = 8 /* writes the texts of an audio CD */
+};
+
+/* What is being done, for DISCIO_WriteOptions. */
+enum {
+    DISCIO_PHASE_PREPARE = 0,
+    DISCIO_PHASE_BLANK = 1,
+    DISCIO_PHASE_WRITE = 2,
+    DISCIO_PHASE_FINISH = 3, /* the drive writes the lead-out; the file is flushed to its disk */
+    DISCIO_PHASE_VERIFY = 4
+};
+
+/* How to write, and who is informed. Without it: DISCIO_WRITE_VERIFY | DISCIO_WRITE_CD_TEXT at full speed. */
+typedef struct DISCIO_WriteOptions {
+    uint32_t size;  /* of this structure */
+    uint32_t flags; /* DISCIO_WRITE_ values */
+    double speed;   /* in multiples of the speed of playing, which the drive rounds; 0 for the fastest */
+    /* Called often, on the thread that writes, with a DISCIO_PHASE_ value and from 0.0 to 1.0 within it. The
+     * result 0 cancels with DISCIO_ERROR_ABORTED. Null if not wanted. */
+    int32_t (*onProgress)(void* user, int32_t phase, double fraction);
+    void* user;
+} DISCIO_WriteOptions;
+
+/* Writes a project to the file `path`: an audio CD to a ".cue" with the samples in a ".bin" of the same name
+ * beside it, and with its CD-TEXT in a ".cdt" if all texts are Latin-1; a data disc to an ".iso". Returns
+ * when everything has been written, flushed, read back and compared. Existing files are replaced at the end;
+ * after a failure they are unchanged and nothing of the new ones is left. `options` may be null. */
+DISCIO_API int32_t DISCIO_ProjectWriteImageW(DISCIO_Project* project, const char16_t* path,
+                                             const DISCIO_WriteOptions* options);
+/* Writes a project to the medium in an optical drive, in one session that is closed. Returns when the drive
+ * has finished. Fails with DISCIO_ERROR_DISC_NOT_EMPTY, DISCIO_ERROR_DISC_NOT_WRITABLE or
+ * DISCIO_ERROR_NOT_ENOUGH_SPACE before anything is written; a later failure spoils a medium that can be
+ * written once. `options` may be null. */
+DISCIO_API int32_t DISCIO_ProjectWriteDisc(DISCIO_Project* project, DISCIO_Drive* drive,
+                                           const DISCIO_WriteOptions* options);
+/* Blanks a CD-RW or another rewritable medium; with `whole` not 0 all of it, which takes long, otherwise its
+ * table of contents. Cannot be cancelled: the result of onProgress is ignored. `options` may be null. */
+DISCIO_API int32_t DISCIO_DriveBlankDisc(DISCIO_Drive* drive, int32_t whole,
+                                         const DISCIO_WriteOptions* options);
 
 #ifdef __cplusplus
 }
