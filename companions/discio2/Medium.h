@@ -3,6 +3,7 @@
 
 #include "Error.h"
 
+#include <algorithm>
 #include <array>
 #include <cstdint>
 #include <memory>
@@ -65,6 +66,14 @@ public:
     virtual ~IMedium() = default;
     virtual const STableOfContents& getContents() const = 0;
     virtual SMediumState getState() const = 0;
+    // The disc of a project.
+    virtual bool isVirtual() const { return false; }
+    // Whether there are tracks of that kind. A project has its component before it has tracks.
+    virtual bool hasComponent(bool isAudio) const {
+        const auto& tracks = getContents().tracks;
+        return std::any_of(tracks.begin(), tracks.end(),
+                           [&](const STrack& track) { return track.isAudio == isAudio; });
+    }
     // For the blocks of one track. Throws CDiscError.
     virtual std::unique_ptr<IAudioReader> createAudioReader(const STrack& track) const = 0;
     // The file or device with the file system of the first data track, which has to start there.
@@ -83,6 +92,8 @@ public:
     virtual bool checkMedium(int milliseconds) = 0;
     virtual std::shared_ptr<IMedium> openMedium() = 0; // throws CDiscError
     virtual void moveTray(bool open) = 0;              // throws CDiscError
+    // Its path is a device that may be able to write.
+    virtual bool isOptical() const { return false; }
 };
 
 } // namespace discio

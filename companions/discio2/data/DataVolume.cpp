@@ -127,6 +127,12 @@ std::shared_ptr<IDataVolume> openDataVolume(const std::string& path) {
     throw CDiscError(DISCIO_ERROR_BROKEN_FILE_SYSTEM, path + " has no file system that can be read");
 }
 
+std::optional<SDataEntry> IDataVolume::find(const DataPath& folder, const std::string& name) {
+    for (SDataEntry& entry : list(folder))
+        if (entry.name == name) return std::move(entry);
+    return std::nullopt;
+}
+
 DataPath findFolder(IDataVolume& volume, const std::string& path) {
     DataPath found;
     for (size_t i = 0; i < path.size();) {
@@ -134,10 +140,8 @@ DataPath findFolder(IDataVolume& volume, const std::string& path) {
         const std::string part = path.substr(i, end - i);
         i = end + 1;
         if (part.empty()) continue;
-        const std::vector<SDataEntry> entries = volume.list(found);
-        const auto entry = std::find_if(entries.begin(), entries.end(),
-                                        [&](const SDataEntry& each) { return each.name == part; });
-        if (entry == entries.end()) throw CDiscError(DISCIO_ERROR_NOT_FOUND, part + " does not exist");
+        const std::optional<SDataEntry> entry = volume.find(found, part);
+        if (!entry) throw CDiscError(DISCIO_ERROR_NOT_FOUND, part + " does not exist");
         if (!entry->isFolder) throw CDiscError(DISCIO_ERROR_NOT_A_FOLDER, part + " is not a folder");
         found.push_back(entry->stored);
     }

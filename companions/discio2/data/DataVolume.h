@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -15,7 +16,11 @@ struct SDataEntry {
     std::string stored; // the name in the form that the file system looks up
     bool isFolder = false;
     int64_t size = 0;
-    int64_t modified = -1; // seconds since 1970
+    // Seconds since 1970, -1 if unknown. The file systems of pressed discs record the last change only.
+    int64_t created = -1;
+    int64_t modified = -1;
+    int64_t accessed = -1;
+    std::string source; // the path of a file that is going to be written
 };
 
 // Names of the folders from the root, in their stored form.
@@ -27,6 +32,8 @@ public:
     virtual ~IDataVolume() = default;
     virtual std::string getTitle() = 0;
     virtual std::vector<SDataEntry> list(const DataPath& folder) = 0; // throws CDiscError
+    // By its name as it is shown. Throws CDiscError.
+    virtual std::optional<SDataEntry> find(const DataPath& folder, const std::string& name);
 };
 
 // ISO 9660 if there is one, otherwise UDF. Throws CDiscError.

@@ -48,6 +48,7 @@ public:
     std::string getPath() const override { return m_path; }
     std::string getRevision() const override { return m_revision; }
     std::string getDriverDescription() const override { return "optical drive"; }
+    bool isOptical() const override { return true; }
 
     // The kernel knows the fastest speed only.
     std::vector<double> getReadSpeeds() const override {

@@ -12,30 +12,33 @@ constexpr int kChannels = 2;
 constexpr int kRate = kFramesPerSector * kSectorsPerSecond;
 
 // Delivers a track at any frame from whole sectors.
-class CTrackStream {
+class CTrackStream : public IPcmStream {
 public:
     CTrackStream(std::shared_ptr<IMedium> medium, const STrack& track)
         : m_medium(std::move(medium)), m_track(track) {}
 
-    int64_t getFrameCount() const { return int64_t{m_track.length} * kFramesPerSector; }
-    int64_t getPosition() const { return m_position; }
-    int64_t getRepairs() const { return m_reader ? m_reader->getRepairs() : -1; }
+    int32_t getChannelCount() override { return kChannels; }
+    int32_t getSampleRate() override { return kRate; }
+    int64_t getFrameCount() override { return int64_t{m_track.length} * kFramesPerSector; }
+    int64_t getPosition() override { return m_position; }
+    int64_t getRepairs() override { return m_reader ? m_reader->getRepairs() : -1; }
+    bool isInsertable() const override { return !m_medium->isVirtual(); }
 
-    void open() {
+    void open() override {
         if (!m_reader) m_reader = m_medium->createAudioReader(m_track);
         m_position = 0;
         m_buffered = -1;
     }
-    void close() { m_reader.reset(); }
+    void close() noexcept override { m_reader.reset(); }
 
-    void seek(int64_t frame) {
+    void seek(int64_t frame) override {
         requireOpen();
         if (frame < 0 || frame > getFrameCount())
             throw CDiscError(DISCIO_ERROR_INVALID_PARAM, "frame " + std::to_string(frame));
         m_position = frame;
     }
 
-    int32_t read(int16_t* samples, int32_t frames) {
+    int32_t read(int16_t* samples, int32_t frames) override {
         requireOpen();
         const auto wanted = static_cast<int32_t>(std::min<int64_t>(frames, getFrameCount() - m_position));
         int32_t done = 0;
@@ -73,9 +76,9 @@ private:
     std::array<int16_t, kAudioSectorBytes / 2> m_sector{};
 };
 
-CTrackStream& get(void* user) {
+IPcmStream& get(void* user) {
     if (!user) throw CDiscError(DISCIO_ERROR_INVALID_PARAM, "");
-    return *static_cast<CTrackStream*>(user);
+    return *static_cast<IPcmStream*>(user);
 }
 
 template <class Body> int32_t succeed(Body body) {
@@ -85,7 +88,9 @@ template <class Body> int32_t succeed(Body body) {
     });
 }
 
-const DISCIO_PCMAudioStreamFuncs kTrackFuncs{
+} // namespace
+
+const DISCIO_PCMAudioStreamFuncs discio::kStreamFuncs{
     [](void* user) {
         return barrier(-1.0, [&] { return static_cast<double>(get(user).getFrameCount()) / kRate; });
     },
@@ -111,21 +116,7 @@ const DISCIO_PCMAudioStreamFuncs kTrackFuncs{
     [](void*) {},
 };
 
-struct STrackHandle : DISCIO_PCMAudioStream {
-    STrackHandle(const std::shared_ptr<IMedium>& medium, const STrack& track)
-        : DISCIO_PCMAudioStream{static_cast<uint32_t>(EKind::stream), &kTrackFuncs, nullptr},
-          stream(medium, track) {
-        user = &stream;
-    }
-    CTrackStream stream;
-};
-
-const STrack& requireSegment(const SDisc& disc, int32_t segment) {
-    if (disc.segments.empty()) throw CDiscError(DISCIO_ERROR_NO_AUDIO, "");
-    if (segment < 0 || segment >= static_cast<int32_t>(disc.segments.size()))
-        throw CDiscError(DISCIO_ERROR_NO_SUCH_OBJECT, "track " + std::to_string(segment + 1));
-    return disc.segments[static_cast<size_t>(segment)];
-}
+namespace {
 
 const std::string& requireText(const Texts& texts, int32_t text) {
     if (text < 0 || text >= static_cast<int32_t>(texts.size()))
@@ -137,15 +128,29 @@ const std::string& requireText(const Texts& texts, int32_t text) {
 
 namespace discio {
 
+int32_t SDisc::countSegments() const {
+    const auto& tracks = medium->getContents().tracks;
+    return static_cast<int32_t>(
+        std::count_if(tracks.begin(), tracks.end(), [](const STrack& track) { return track.isAudio; }));
+}
+
+const STrack& SDisc::requireSegment(int32_t segment) const {
+    if (!medium->hasComponent(true)) throw CDiscError(DISCIO_ERROR_NO_AUDIO, "");
+    int32_t index = 0;
+    for (const STrack& track : medium->getContents().tracks)
+        if (track.isAudio && index++ == segment) return track;
+    throw CDiscError(DISCIO_ERROR_NO_SUCH_OBJECT, "track " + std::to_string(segment + 1));
+}
+
 void releaseStream(DISCIO_PCMAudioStream* stream) {
     stream->kind = static_cast<uint32_t>(EKind::released);
-    delete static_cast<STrackHandle*>(stream);
+    delete static_cast<SStreamHandle*>(stream);
 }
 
 } // namespace discio
 
 int32_t DISCIO_DiscAudioGetSegmentCount(DISCIO_Disc* disc) {
-    return barrier<int32_t>(-1, [&] { return require(disc).disc->segments.size(); });
+    return barrier<int32_t>(-1, [&] { return require(disc).disc->countSegments(); });
 }
 
 const char16_t* DISCIO_DiscAudioGetMetaDataStringW(DISCIO_Disc* disc, int32_t text) {
@@ -159,14 +164,14 @@ const char16_t* DISCIO_DiscAudioGetMetaDataStringW(DISCIO_Disc* disc, int32_t te
 const char16_t* DISCIO_DiscAudioGetSegmentMetaDataStringW(DISCIO_Disc* disc, int32_t segment, int32_t text) {
     return barrier<const char16_t*>(nullptr, [&] {
         DISCIO_Disc& own = require(disc);
-        return own.texts.hold(&own.texts, requireText(requireSegment(*own.disc, segment).texts, text));
+        return own.texts.hold(&own.texts, requireText(own.disc->requireSegment(segment).texts, text));
     });
 }
 
 DISCIO_PCMAudioStream* DISCIO_DiscAudioCreatePCMAudioStreamFromSegment(DISCIO_Disc* disc, int32_t segment) {
     return barrier<DISCIO_PCMAudioStream*>(nullptr, [&]() -> DISCIO_PCMAudioStream* {
         const SDisc& own = *require(disc).disc;
-        return new STrackHandle(own.medium, requireSegment(own, segment));
+        return new SStreamHandle(std::make_shared<CTrackStream>(own.medium, own.requireSegment(segment)));
     });
 }
 

@@ -1,4 +1,5 @@
 #include "exports/Handles.h"
+#include "projects/SourcePath.h"
 
 #include <algorithm>
 
@@ -62,13 +63,6 @@ const char16_t* DISCIO_DiscDataGetTitleW(DISCIO_Disc* disc) {
     return barrier<const char16_t*>(nullptr, [&] {
         DISCIO_Disc& own = require(disc);
         return own.texts.hold(&own.disc, own.disc->getVolume().getTitle());
-    });
-}
-
-int32_t DISCIO_DiscDataSetTitleW(DISCIO_Disc* disc, const char16_t*) {
-    return barrier<int32_t>(0, [&]() -> int32_t {
-        require(disc);
-        throw CDiscError(DISCIO_ERROR_DISC_NOT_VIRTUAL, "");
     });
 }
 
@@ -140,17 +134,13 @@ const char16_t* DISCIO_DataCursorGetDiscPathW(DISCIO_DataCursor* cursor) {
 
 const char16_t* DISCIO_DataCursorGetFileSourceURIW(DISCIO_DataCursor* cursor) {
     return barrier<const char16_t*>(nullptr, [&] {
-        requireEntry(cursor);
-        return u"";
+        const std::string& source = requireEntry(cursor).source;
+        return cursor->texts.hold(&cursor->entries, source.empty() ? source : toFileURI(source));
     });
 }
 
-// The file systems of pressed discs record one time, that of the last change.
 int64_t DISCIO_DataCursorGetCreatedTime(DISCIO_DataCursor* cursor) {
-    return barrier<int64_t>(-1, [&] {
-        requireEntry(cursor);
-        return -1;
-    });
+    return barrier<int64_t>(-1, [&] { return requireEntry(cursor).created; });
 }
 
 int64_t DISCIO_DataCursorGetLastModifiedTime(DISCIO_DataCursor* cursor) {
@@ -158,8 +148,5 @@ int64_t DISCIO_DataCursorGetLastModifiedTime(DISCIO_DataCursor* cursor) {
 }
 
 int64_t DISCIO_DataCursorGetLastAccessedTime(DISCIO_DataCursor* cursor) {
-    return barrier<int64_t>(-1, [&] {
-        requireEntry(cursor);
-        return -1;
-    });
+    return barrier<int64_t>(-1, [&] { return requireEntry(cursor).accessed; });
 }

@@ -1,19 +1,11 @@
 #include "exports/Handles.h"
 
-#include <algorithm>
-
 using namespace discio;
 
 namespace {
 
 template <class R, class Get> R ask(DISCIO_Disc* disc, R failure, Get get) {
     return barrier<R>(failure, [&] { return static_cast<R>(get(*require(disc).disc->medium)); });
-}
-
-bool hasTrack(const IMedium& medium, bool audio) {
-    const auto& tracks = medium.getContents().tracks;
-    return std::any_of(tracks.begin(), tracks.end(),
-                       [&](const STrack& track) { return track.isAudio == audio; });
 }
 
 const STrack& requireTrack(const IMedium& medium, int32_t index) {
@@ -38,7 +30,7 @@ int32_t DISCIO_DiscIsErasable(DISCIO_Disc* disc) {
 }
 
 int32_t DISCIO_DiscIsVirtual(DISCIO_Disc* disc) {
-    return ask(disc, 0, [](const IMedium&) { return 0; });
+    return ask(disc, 0, [](const IMedium& medium) { return medium.isVirtual(); });
 }
 
 int32_t DISCIO_DiscIsWritable(DISCIO_Disc* disc) {
@@ -46,11 +38,11 @@ int32_t DISCIO_DiscIsWritable(DISCIO_Disc* disc) {
 }
 
 int32_t DISCIO_DiscHasAudioComponent(DISCIO_Disc* disc) {
-    return ask(disc, 0, [](const IMedium& medium) { return hasTrack(medium, true); });
+    return ask(disc, 0, [](const IMedium& medium) { return medium.hasComponent(true); });
 }
 
 int32_t DISCIO_DiscHasDataComponent(DISCIO_Disc* disc) {
-    return ask(disc, 0, [](const IMedium& medium) { return hasTrack(medium, false); });
+    return ask(disc, 0, [](const IMedium& medium) { return medium.hasComponent(false); });
 }
 
 int64_t DISCIO_DiscGetCapacityBytes(DISCIO_Disc* disc) {

@@ -34,8 +34,6 @@ DISCIO_Disc* DISCIO_DriveOpenDisc(DISCIO_Drive* drive) {
     return barrier<DISCIO_Disc*>(nullptr, [&] {
         auto disc = std::make_shared<SDisc>();
         disc->medium = require(drive).drive->openMedium();
-        for (const STrack& track : disc->medium->getContents().tracks)
-            if (track.isAudio) disc->segments.push_back(track);
         DISCIO_Disc* handle = makeHandle<DISCIO_Disc>(EKind::disc);
         handle->disc = std::move(disc);
         return handle;

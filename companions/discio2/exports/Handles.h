@@ -2,9 +2,11 @@
 #pragma once
 
 #include "Medium.h"
+#include "PcmStream.h"
 #include "Text.h"
 #include "data/DataVolume.h"
 #include "drives/Drives.h"
+#include "projects/VirtualDisc.h"
 
 #include <map>
 #include <mutex>
@@ -18,6 +20,7 @@ enum class EKind : uint32_t {
     disc = 0x53434944,
     stream = 0x50434944,
     cursor = 0x43434944,
+    project = 0x4A434944,
     released = 0,
 };
 
@@ -39,11 +42,13 @@ private:
 
 struct SDisc {
     std::shared_ptr<IMedium> medium;
-    std::vector<STrack> segments;
     std::mutex mutex; // guards the volume
     std::shared_ptr<IDataVolume> volume;
 
-    IDataVolume& getVolume(); // throws CDiscError
+    // The audio tracks. These throw CDiscError.
+    int32_t countSegments() const;
+    const STrack& requireSegment(int32_t segment) const;
+    IDataVolume& getVolume();
 };
 
 } // namespace discio
@@ -69,8 +74,25 @@ struct DISCIO_DataCursor : discio::SHandle {
     size_t next = 0;
     discio::CReturnedTexts texts;
 };
+struct DISCIO_Project : discio::SHandle {
+    std::shared_ptr<discio::CVirtualDisc> disc;
+};
 
 namespace discio {
+
+// The streams of the library, as opposed to those from a host's functions, share these. Their user data is an
+// IPcmStream.
+extern const DISCIO_PCMAudioStreamFuncs kStreamFuncs;
+
+struct SStreamHandle : DISCIO_PCMAudioStream {
+    // A null record stands for the library's own.
+    explicit SStreamHandle(std::shared_ptr<IPcmStream> shared,
+                           const DISCIO_PCMAudioStreamFuncs* functions = nullptr, void* data = nullptr)
+        : DISCIO_PCMAudioStream{static_cast<uint32_t>(EKind::stream), functions ? functions : &kStreamFuncs,
+                                functions ? data : shared.get()},
+          stream(std::move(shared)) {}
+    std::shared_ptr<IPcmStream> stream;
+};
 
 // Records a failure for DISCIO_GetLastError.
 void setLastError(int32_t code, const char* detail) noexcept;
@@ -99,6 +121,9 @@ inline DISCIO_Drive& require(DISCIO_Drive* handle) {
 }
 inline DISCIO_Disc& require(DISCIO_Disc* handle) {
     return require(handle, EKind::disc);
+}
+inline DISCIO_Project& require(DISCIO_Project* handle) {
+    return require(handle, EKind::project);
 }
 inline DISCIO_DataCursor& require(DISCIO_DataCursor* handle) {
     return require(handle, EKind::cursor);

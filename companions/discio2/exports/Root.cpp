@@ -80,6 +80,9 @@ int32_t DISCIO_Release(void* handle) {
         case EKind::cursor:
             destroy<DISCIO_DataCursor>(handle);
             break;
+        case EKind::project:
+            destroy<DISCIO_Project>(handle);
+            break;
         case EKind::stream:
             releaseStream(static_cast<DISCIO_PCMAudioStream*>(handle));
             break;
