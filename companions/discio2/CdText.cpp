@@ -2,6 +2,7 @@
 
 #include <cdio/cdtext.h>
 #include <cdio/logging.h>
+#include <cstring>
 #include <memory>
 
 namespace discio {
@@ -25,7 +26,8 @@ void addCdText(const cdtext_s* texts, STableOfContents& contents) {
     const auto add = [&](Texts& to, int number) {
         for (const auto& [field, index] : kFields)
             if (const char* text = cdtext_get_const(texts, field, static_cast<track_t>(number)))
-                if (*text) to[static_cast<size_t>(index)] = text;
+                if (text[std::strspn(text, " ")]) // writers put a space where a text is missing
+                    to[static_cast<size_t>(index)] = text;
     };
     add(contents.texts, 0);
     for (STrack& track : contents.tracks) add(track.texts, track.number);
