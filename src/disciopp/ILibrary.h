@@ -2,6 +2,7 @@
 #pragma once
 
 #include "disciopp/IDrive.h"
+#include "disciopp/IProject.h"
 #include "disciopp/ITrackStream.h"
 
 namespace disciopp {
@@ -13,6 +14,9 @@ public:
     // The functions of the same names.
     virtual P<IDriveManager> getDriveManager() = 0;
     virtual P<ITrackStream> openTrack(const P<peru::IURI>& uri) = 0;
+    // Empty projects. Throw CDISCIOPPException.
+    virtual P<IAudioCDProject> createAudioCDProject() = 0;
+    virtual P<IDataDiscProject> createDataDiscProject() = 0;
 };
 
 // The function "disciopp_getLibrary" that the library exports.

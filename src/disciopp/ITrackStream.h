@@ -13,9 +13,10 @@ public:
     [[noreturn]] virtual void throwFailure() const = 0;
 };
 
-// Opens the track that a URI names: "file:///dev/sr0/Track01.cda" in a drive, or
-// "discioppdiscimage:///folder/disc.cue/Track01.cda" in an image. Throws CDISCIOPPException,
-// CUnknownURIScheme and peru::CFileNotFoundError.
+// Opens the track that a URI names: "file:///dev/sr0/Track01.cda" in a drive,
+// "discioppdiscimage:///folder/disc.cue/Track01.cda" in an image, or
+// "discioppvirtualdiscaudiocd:///1/Track01.cda" in a project (see IProject::getRootURI). Throws
+// CDISCIOPPException, CUnknownURIScheme and peru::CFileNotFoundError.
 DISCIOPP_API P<ITrackStream> openTrack(const P<peru::IURI>& uri);
 
 } // namespace disciopp

@@ -1,3 +1,5 @@
+#include "disciopp/AudioCDDiscProject.h"
+#include "disciopp/DataDiscProject.h"
 #include "disciopp/ILibrary.h"
 
 namespace disciopp {
@@ -12,6 +14,8 @@ public:
     void createDiscio() override { getDiscio(); }
     P<IDriveManager> getDriveManager() override { return disciopp::getDriveManager(); }
     P<ITrackStream> openTrack(const P<peru::IURI>& uri) override { return disciopp::openTrack(uri); }
+    P<IAudioCDProject> createAudioCDProject() override { return peru::make<CAudioCDDiscProject>(); }
+    P<IDataDiscProject> createDataDiscProject() override { return peru::make<CDataDiscProject>(); }
 };
 
 } // namespace

@@ -1,3 +1,5 @@
+#include "disciopp/AudioCDDiscProject.h"
+#include "disciopp/DataDiscProject.h"
 #include "disciopp/Errors.h"
 #include "disciopp/FileSystems.h"
 #include "disciopp/ITrackStream.h"
@@ -9,8 +11,6 @@ namespace disciopp {
 namespace {
 
 constexpr const char* kImageScheme = "discioppdiscimage";
-constexpr const char* kVirtualDataScheme = "discioppvirtualdisc";
-constexpr const char* kVirtualAudioScheme = "discioppvirtualdiscaudiocd";
 
 class CTrackStream : public CBase, public ITrackStream {
 public:
@@ -42,8 +42,8 @@ Handle<DISCIO_Disc> openDisc(const P<peru::IURI>& uri) {
         const P<IDrive> drive = getDriveManager()->findDrive(folder);
         if (!drive) throw peru::CFileNotFoundError(uri);
         disc.reset(DISCIO_DriveOpenDisc(drive->getHandle()));
-    } else if (scheme->equals(kVirtualDataScheme) || scheme->equals(kVirtualAudioScheme)) {
-        throw peru::CFileNotFoundError(uri);
+    } else if (scheme->equals(kVirtualDataScheme)) {
+        throw peru::CFileNotFoundError(uri); // has no tracks
     } else {
         throw CUnknownURIScheme();
     }
@@ -57,6 +57,11 @@ P<ITrackStream> openTrack(const P<peru::IURI>& uri) {
     const int32_t number =
         parseTrackFileName(peru::CString::toStdString(peru::CURI::unescape(uri->getFileName())));
     if (number == 0) throw peru::CFileNotFoundError(uri);
+    if (uri->getScheme()->equals(kVirtualAudioScheme)) {
+        const P<IAudioCDDisc> project = CAudioCDDiscProject::findDisc(uri->getParent());
+        if (!project) throw peru::CFileNotFoundError(uri);
+        return peru::make<CTrackStream>(project->createStream(number - 1));
+    }
     const Handle<DISCIO_Disc> disc = openDisc(uri);
     Handle<DISCIO_PCMAudioStream> stream(
         DISCIO_DiscAudioCreatePCMAudioStreamFromSegment(disc.get(), number - 1));
