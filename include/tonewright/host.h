@@ -4,8 +4,8 @@
  * The library works on the same handles as libtonewright and offers text in other encodings, log callbacks,
  * the reasons of failures, the properties of files, the capabilities of targets, sources that read from
  * memory or from callbacks, reading samples, sound devices, callbacks with user data, all fields of a tag,
- * look-ups of discs, and downloads. Unless documented otherwise, a function requires the started library
- * (TONEWRIGHT_InitStartup), and its handles must be destroyed before TONEWRIGHT_DeInitAll.
+ * disc projects, look-ups of discs, and downloads. Unless documented otherwise, a function requires the
+ * started library (TONEWRIGHT_InitStartup), and its handles must be destroyed before TONEWRIGHT_DeInitAll.
  *
  * Text is UTF-8 here, except for URIs, which are UTF-16 as in tonewright.h. Paths are bytes and need not be
  * UTF-8. Pointers in a record that a function fills stay valid for the time documented there; other text that
@@ -461,6 +461,22 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetPlayerSourceIndex(TONEWRIGHT_Handle pl
 /* Reads an editor's XML for TONEWRIGHT_CreateAudioSourceFromEditorXml from a file and resolves relative URIs
  * against the file's folder. Null if the file is not XML, has no tracks, or a track has no URI. */
 TONEWRIGHT_API char16_t* TONEWRIGHT_Host_ReadArrangement(const char* path);
+
+/* --- Disc projects -------------------------------------------------------------------------------- */
+
+/* An empty project, for TONEWRIGHT_AudioCDProject_AddTrackFromAudioSource or
+ * TONEWRIGHT_DataDiscProject_AddFileFromAudioSource. Loads the disc library; no drive is touched. Null on
+ * failure. One thread at a time for a project. Destroying the handle releases the project and the sources of
+ * its tracks, unless a handle of discio2.h to its disc still exists. */
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateAudioCDProject(void);
+TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateDataDiscProject(void);
+
+/* See discio2.h. */
+struct DISCIO_Project;
+/* The same project for the functions of discio2.h, which set its texts and pauses, list its contents and
+ * write it. It belongs to the handle: valid until that is destroyed, and not to be released. Null for another
+ * handle. */
+TONEWRIGHT_API struct DISCIO_Project* TONEWRIGHT_Host_GetDiscProject(TONEWRIGHT_Handle project);
 
 /* --- Look-up of discs (CDDB) --------------------------------------------------------------------- */
 

@@ -391,15 +391,22 @@ TONEWRIGHT_API void TONEWRIGHT_FileTag_SetComment(TONEWRIGHT_Handle tag, const c
 
 /* --- Disc projects ------------------------------------------------------------------------------- */
 
-/* Adds a source as the track at `place` of an audio CD project, a handle of a disciopp::CAudioCDDiscProject,
- * which keeps the source alive. Result: 0; 3 for a bad source; 4 for a bad project or if the project refuses.
- * Also 0 after an exception, which is only visible in the log. */
+/* Projects are created with TONEWRIGHT_Host_CreateAudioCDProject and ..._CreateDataDiscProject (host.h), and
+ * written with the functions of discio2.h. One thread at a time for a project. */
+
+/* Inserts a source before the track at `place` of an audio CD project, counted from 0; -1 appends it. The
+ * source must deliver 16-bit stereo at 44100 Hz. The project keeps it alive and reads it, from its beginning,
+ * whenever the project is written or the track is read; it must not be used otherwise. A source that ends
+ * before its duration is continued with silence. Result: 0; 3 for a bad source; 4 for a bad project or if the
+ * project refuses the track. Also 0, without a track, if the source cannot be opened: that is only visible in
+ * the log and the last failure. */
 TONEWRIGHT_API int32_t TONEWRIGHT_AudioCDProject_AddTrackFromAudioSource(TONEWRIGHT_Handle project,
                                                                          TONEWRIGHT_Handle source,
                                                                          int32_t place);
 
-/* Adds the file with that URI under a path of a data disc project, a handle of a disciopp::CDataDiscProject;
- * missing folders of the path are created. Result: 0 or 7. */
+/* Adds the file with that URI to a data disc project. `discPath` is its path on the disc, such as
+ * u"Music/Song.flac", as URI text: "%", "?" and "#" in names are escaped. Missing folders of the path are
+ * created. The file is read when the project is written. Result: 0 or 7. */
 TONEWRIGHT_API int32_t TONEWRIGHT_DataDiscProject_AddFileFromAudioSource(TONEWRIGHT_Handle project,
                                                                          const char16_t* discPath,
                                                                          const char16_t* sourceUri);

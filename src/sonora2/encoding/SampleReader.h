@@ -23,6 +23,8 @@ public:
     void reset(); // closes the source and restarts the time line
     int64_t getPosition() const { return m_position; }
 
+    const P<IAudioSource>& getSource() const { return m_source; }
+
 private:
     int m_frameBytes = 0;
     P<IAudioSource> m_source;
