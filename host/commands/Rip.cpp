@@ -132,8 +132,15 @@ bool CRipper::ripTrack(const SDiscTrack& track, const fs::path& target, CProgres
     CHandle source = reader.createSource();
     CHandle format =
         requireFormat(m_library, place.getTemporary(), kCdSamples, m_options, target, "The file");
-    const bool done = encode(m_library, source, format, m_progress, job,
-                             {m_disc.getPlace(), place.getTemporary(), target}, m_temporaryEnding);
+    bool done = false;
+    try {
+        done = encode(m_library, source, format, m_progress, job,
+                      {m_disc.getPlace(), place.getTemporary(), target}, m_temporaryEnding);
+    } catch (const std::runtime_error&) {
+        // The encoder knows only that there are no samples.
+        if (!reader.getFailure().empty()) throw std::runtime_error(reader.getFailure());
+        throw;
+    }
     source.reset();
     format.reset();
     if (!done) return false;

@@ -34,6 +34,13 @@ std::vector<SDrive> openDrives(DISCIO_Library* library) {
     return drives;
 }
 
+// fs::equivalent is not defined for devices.
+bool isSame(const fs::path& place, const std::string& drive) {
+    std::error_code none;
+    const fs::path resolved = fs::canonical(place, none);
+    return place == drive || (!resolved.empty() && resolved == fs::canonical(drive, none));
+}
+
 } // namespace
 
 std::vector<SDrive> findDrives() {
@@ -66,7 +73,7 @@ CDisc::CDisc(const fs::path& place) {
         if (!chosen) throw std::runtime_error("There is no disc in any drive");
     } else {
         for (const SDrive& drive : drives)
-            if (fs::equivalent(place, drive.path, none)) chosen = &drive;
+            if (isSame(place, drive.path)) chosen = &drive;
         if (!chosen) throw std::runtime_error(place.string() + " is neither a drive nor a disc image");
     }
     m_place = chosen->path;

@@ -22,6 +22,8 @@ public:
     double getPeak() const { return m_peak / 32768.0; }
     int64_t getRepairs() const { return m_stream->funcs->getRepairs(m_stream->user); } // -1: unknown
 
+    // Why the last read failed; empty if it did not.
+    const std::string& getFailure() const { return m_reason; }
     // Throws std::runtime_error with the reason if not the whole track was read.
     void requireComplete() const;
     // Reads the track again. False if `stops` ended it; throws std::runtime_error if the samples differ.

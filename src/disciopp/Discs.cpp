@@ -34,7 +34,9 @@ P<peru::IString> CDiscBase::getDisplayName() {
 }
 
 P<peru::IString> CDataDisc::getTitle() {
-    const P<peru::IString> title = peru::newString(DISCIO_DiscDataGetTitleW(m_handle.get()));
+    const char16_t* found = DISCIO_DiscDataGetTitleW(m_handle.get());
+    if (!found) throw CDISCIOPPException();
+    const P<peru::IString> title = peru::newString(found);
     return title->isEmpty() ? peru::localize("disciopp.disc.no_title", "[No Title]") : title;
 }
 

@@ -1,79 +1,14 @@
 #include "discio2/FakeDrive.h"
 
-#include <algorithm>
 #include <cerrno>
 #include <cstddef>
+#include <cstring>
+#include <fstream>
+#include <linux/cdrom.h>
 
 namespace tests {
 
-SFakeDisc& fakeDisc() {
-    static SFakeDisc s_disc;
-    return s_disc;
-}
-
 namespace {
-
-constexpr int kSectorBytes = 2352;
-
-std::string toBig(unsigned value, int bytes) {
-    std::string text;
-    for (int i = bytes; i-- > 0;) text += static_cast<char>(value >> 8 * i);
-    return text;
-}
-
-// One descriptor of a table of contents; track 0xAA is the lead-out.
-std::string describeTrack(int number, int block) {
-    return std::string("\0\x10", 2) + static_cast<char>(number) + '\0' +
-           toBig(static_cast<unsigned>(block), 4);
-}
-
-// The answer to a command of the drive; false if the drive refuses it.
-bool answer(const unsigned char* command, std::string& reply) {
-    SFakeDisc& disc = fakeDisc();
-    const auto count = static_cast<int>(disc.starts.size()) - 1;
-    switch (command[0]) {
-    case 0x46: // GET CONFIGURATION: the profile of a pressed or a recordable CD
-        reply = toBig(4, 4) + std::string(2, '\0') + toBig(disc.isBlank ? 9 : 8, 2);
-        return true;
-    case 0x51: // READ DISC INFORMATION
-        reply = toBig(32, 2) + (disc.isBlank ? '\0' : '\2') + std::string(29, '\0');
-        reply[21] = 79;
-        reply[22] = 59;
-        reply[23] = 74;
-        return true;
-    case 0x43: { // READ TOC
-        const int format = command[2] & 0xF ? command[2] & 0xF : command[9] >> 6;
-        if (disc.isBlank) return false;
-        if (format == 5 && disc.textPacks.empty()) return false;
-        std::string list;
-        if (format == 5) list = disc.textPacks;
-        if (format == 0)
-            for (int i = 0; i <= count; ++i)
-                list += describeTrack(i < count ? i + 1 : 0xAA, disc.starts[static_cast<size_t>(i)]);
-        reply = toBig(static_cast<unsigned>(list.size()) + 2, 2) + std::string("\1") +
-                static_cast<char>(count) + list;
-        return format == 0 || format == 5;
-    }
-    case 0xBE: { // READ CD
-        const int block = command[2] << 24 | command[3] << 16 | command[4] << 8 | command[5];
-        const int blocks = command[6] << 16 | command[7] << 8 | command[8];
-        if (block < 0 || block + blocks > disc.starts.back()) return false;
-        if (disc.badBlock >= block && disc.badBlock < block + blocks) return false;
-        reply = disc.samples.substr(static_cast<size_t>(block) * kSectorBytes,
-                                    static_cast<size_t>(blocks) * kSectorBytes);
-        if (disc.shakyReads > 0 && blocks > 1) { // a drive that does not find its place
-            --disc.shakyReads;
-            std::rotate(reply.begin(), reply.begin() + 400, reply.end());
-        }
-        return true;
-    }
-    case 0x12: // INQUIRY
-        reply.assign("\5\x80\2\2\x1f\0\0\0", 8).append("ACME    Disc reader     1.00");
-        return true;
-    default:
-        return false;
-    }
-}
 
 void put(UMockdevIoctlData* data, gsize offset, const std::string& bytes) {
     umockdev_ioctl_data_update(data, offset,
@@ -142,7 +77,7 @@ int handle(gulong request, UMockdevIoctlData* arg, int& result) {
         }
         const int block = disc.starts[static_cast<size_t>(index)];
         entry.cdte_adr = 1;
-        entry.cdte_ctrl = 0;
+        entry.cdte_ctrl = disc.dataTracks.contains(static_cast<size_t>(index)) ? CDROM_DATA_TRACK : 0;
         if (entry.cdte_format == CDROM_MSF) {
             const int frames = block + 150;
             entry.cdte_addr.msf = {static_cast<__u8>(frames / 4500), static_cast<__u8>(frames / 75 % 60),
@@ -151,6 +86,17 @@ int handle(gulong request, UMockdevIoctlData* arg, int& result) {
             entry.cdte_addr.lba = block;
         }
         set(data, entry);
+        g_object_unref(data);
+        return 0;
+    }
+    case CDROMMULTISESSION: {
+        if (!disc.isPresent || disc.isBlank) return ENOMEDIUM;
+        UMockdevIoctlData* data = umockdev_ioctl_data_resolve(arg, 0, sizeof(cdrom_multisession), nullptr);
+        auto session = get<cdrom_multisession>(data);
+        session.addr.lba = disc.sessionStart;
+        session.addr_format = CDROM_LBA;
+        session.xa_flag = disc.sessionStart > 0;
+        set(data, session);
         g_object_unref(data);
         return 0;
     }
@@ -195,8 +141,11 @@ CFakeDrive::CFakeDrive()
         "E: ID_CDROM=1\nE: ID_VENDOR=ACME\nE: ID_MODEL=Disc_reader\n"
         "E: ID_REVISION=1.00\n",
         nullptr);
-    m_device = "/sys/devices/sr0";
-    // The contents of the node do not matter, its presence does.
+    umockdev_testbed_add_from_string(
+        m_testbed,
+        "P: /devices/sdb\nN: sdb\nA: dev=8:16\\n\nE: SUBSYSTEM=block\nE: DEVTYPE=disk\nE: DEVNAME=/dev/sdb\n"
+        "E: ID_BUS=usb\n",
+        nullptr);
     umockdev_testbed_attach_ioctl(m_testbed, "/dev/sr0", m_handler, nullptr);
 }
 
@@ -205,9 +154,17 @@ CFakeDrive::~CFakeDrive() {
     g_object_unref(m_testbed);
 }
 
-void CFakeDrive::announce(bool hasMedium) {
-    umockdev_testbed_set_property(m_testbed, m_device.c_str(), "ID_CDROM_MEDIA", hasMedium ? "1" : "0");
-    umockdev_testbed_uevent(m_testbed, m_device.c_str(), "change");
+void CFakeDrive::announce(const std::string& name, bool hasMedium, bool isChanged) {
+    const std::string device = "/sys/devices/" + name;
+    umockdev_testbed_set_property(m_testbed, device.c_str(), "ID_CDROM_MEDIA", hasMedium ? "1" : "0");
+    umockdev_testbed_set_property(m_testbed, device.c_str(), "DISK_MEDIA_CHANGE", isChanged ? "1" : "0");
+    umockdev_testbed_uevent(m_testbed, device.c_str(), "change");
+}
+
+void CFakeDrive::setData(const std::string& bytes) {
+    gchar* root = umockdev_testbed_get_root_dir(m_testbed);
+    std::ofstream(std::string(root) + "/dev/sr0", std::ios::binary) << bytes;
+    g_free(root);
 }
 
 } // namespace tests

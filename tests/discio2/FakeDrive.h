@@ -1,27 +1,15 @@
 // A drive without hardware, for processes that run under umockdev-wrapper.
 #pragma once
 
-#include <cstring>
-#include <linux/cdrom.h>
-#include <string>
+#include "discio2/FakeDisc.h"
+#include "support/Process.h"
+
+#include <filesystem>
 #include <umockdev.h>
-#include <vector>
 
 namespace tests {
 
-// What is in the drive: audio tracks in a row. Guarded by the tests' order: it changes only between calls.
-struct SFakeDisc {
-    bool isPresent = true;
-    bool isBlank = false;
-    bool hasChanged = false; // since the drive was last asked
-    std::vector<int> starts; // blocks of the tracks, then of the lead-out
-    std::string samples;     // from block 0
-    std::string textPacks;
-    int badBlock = -1;  // cannot be read
-    int shakyReads = 0; // that many reads deliver samples of the wrong place
-};
-SFakeDisc& fakeDisc();
-
+// /dev/sr0, and /dev/sdb, which is a USB stick.
 class CFakeDrive {
 public:
     CFakeDrive();
@@ -29,13 +17,21 @@ public:
     CFakeDrive(const CFakeDrive&) = delete;
     CFakeDrive& operator=(const CFakeDrive&) = delete;
 
-    // The event of the kernel when a medium is put in or taken out.
-    void announce(bool hasMedium);
+    // The event of the kernel about the medium of a device, "sr0" or "sdb".
+    void announce(const std::string& name, bool hasMedium, bool isChanged = true);
+    // The sectors of a data track at the start of the disc, 2048 bytes each.
+    void setData(const std::string& bytes);
 
 private:
     UMockdevTestbed* m_testbed;
     UMockdevIoctlBase* m_handler;
-    std::string m_device; // in sysfs
 };
+
+// Runs disabled cases of this program in a process under umockdev-wrapper, the only place for a faked drive.
+inline SProcessResult runWithFakeDrive(const std::string& filter) {
+    const std::string self = std::filesystem::read_symlink("/proc/self/exe");
+    return run({"env", "ASAN_OPTIONS=verify_asan_link_order=0", "timeout", "100", "umockdev-wrapper", self,
+                "--gtest_filter=" + filter, "--gtest_also_run_disabled_tests", "--gtest_brief=1"});
+}
 
 } // namespace tests

@@ -1,12 +1,12 @@
 // Optical drives.
 #include "drives/DeviceMedium.h"
+#include "drives/DeviceStatus.h"
 #include "drives/Drives.h"
 
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <cstdio>
-#include <fcntl.h>
 #include <fstream>
 #include <libudev.h>
 #include <linux/cdrom.h>
@@ -14,30 +14,12 @@
 #include <sys/ioctl.h>
 #include <system_error>
 #include <thread>
-#include <unistd.h>
 
 namespace discio {
 
 namespace {
 
 constexpr auto kPollInterval = std::chrono::milliseconds(50);
-
-class CDescriptor {
-public:
-    // Succeeds without a medium.
-    explicit CDescriptor(const std::string& path)
-        : m_file(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC)) {
-        if (m_file < 0)
-            throw CDiscError(DISCIO_ERROR_DEVICE, path + ": " + std::generic_category().message(errno));
-    }
-    ~CDescriptor() { ::close(m_file); }
-    CDescriptor(const CDescriptor&) = delete;
-    CDescriptor& operator=(const CDescriptor&) = delete;
-    int get() const { return m_file; }
-
-private:
-    int m_file;
-};
 
 class CDeviceDrive : public IDrive {
 public:
@@ -71,8 +53,7 @@ public:
     bool checkMedium(int milliseconds) override {
         const auto due = std::chrono::steady_clock::now() + std::chrono::milliseconds(milliseconds);
         while (true) {
-            const CDescriptor device(m_path);
-            const int status = ::ioctl(device.get(), CDROM_DRIVE_STATUS, CDSL_CURRENT);
+            const int status = getDeviceStatus(m_path);
             if (status == CDS_DISC_OK) return true;
             if (status != CDS_DRIVE_NOT_READY || std::chrono::steady_clock::now() >= due) return false;
             std::this_thread::sleep_for(kPollInterval);
@@ -82,7 +63,7 @@ public:
     std::shared_ptr<IMedium> openMedium() override { return openDeviceMedium(m_path); }
 
     void moveTray(bool open) override {
-        const CDescriptor device(m_path);
+        const CDeviceDescriptor device(m_path);
         if (::ioctl(device.get(), open ? CDROMEJECT : CDROMCLOSETRAY, 0) == 0) return;
         throw CDiscError(errno == ENOSYS || errno == EOPNOTSUPP ? DISCIO_ERROR_NOT_SUPPORTED
                                                                 : DISCIO_ERROR_DEVICE,

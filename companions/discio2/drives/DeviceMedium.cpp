@@ -1,14 +1,19 @@
 #include "drives/DeviceMedium.h"
 #include "CdText.h"
+#include "drives/DeviceStatus.h"
+#include "drives/Pregaps.h"
 
 #include <algorithm>
+#include <array>
 #include <cdio/cdio.h>
 #include <cdio/logging.h>
 #include <cdio/mmc.h>
 #include <cdio/mmc_ll_cmds.h>
 #include <cdio/paranoia/cdda.h>
 #include <cdio/paranoia/paranoia.h>
+#include <cerrno>
 #include <cstring>
+#include <linux/cdrom.h>
 #include <utility>
 
 namespace discio {
@@ -17,7 +22,10 @@ namespace {
 
 using Device = std::unique_ptr<CdIo_t, void (*)(CdIo_t*)>;
 
-constexpr int kMaxRetries = 20; // of one sector
+constexpr int kMaxRetries = 20; // of one sector whose samples are in doubt
+constexpr int kMaxReads = 8;    // of one sector that the drive cannot read
+// Between two sessions: lead-out, lead-in and pregap.
+constexpr int32_t kSessionGap = 6750 + 4500 + 150;
 
 Device openDevice(const std::string& path) {
     cdio_log_set_handler([](cdio_log_level_t, const char*) {}); // it would print to standard output
@@ -64,6 +72,32 @@ SMediumState readState(CdIo_t* device) {
     return state;
 }
 
+std::optional<SBlockPlace> readPlace(CdIo_t* device, int32_t block) {
+    std::array<uint8_t, kAudioSectorBytes + 16> bytes = {};
+    constexpr uint8_t kAllHeaders = 3, kPosition = 2;
+    if (mmc_read_cd(device, bytes.data(), block, 0, false, true, kAllHeaders, true, true, 0, kPosition,
+                    bytes.size(), 1) != DRIVER_OP_SUCCESS)
+        return std::nullopt;
+    const uint8_t* position = bytes.data() + kAudioSectorBytes;
+    if ((position[0] & 0xF) != 1) return std::nullopt;
+    return SBlockPlace{position[1], position[2]};
+}
+
+// Sets the pregaps of audio tracks, unless the drive cannot read the subchannel. One block for each track
+// is read where there are none.
+void readPregaps(CdIo_t* device, std::vector<STrack>& tracks) {
+    if (tracks.empty()) return;
+    tracks[0].pregap = tracks[0].start + kLeadInSectors;
+    for (size_t i = 1; i < tracks.size(); ++i) {
+        if (!tracks[i].isAudio) continue;
+        const std::optional<int32_t> pregap =
+            findPregap(tracks[i].number, tracks[i].start, tracks[i - 1].start,
+                       [&](int32_t block) { return readPlace(device, block); });
+        if (!pregap) return;
+        tracks[i].pregap = *pregap;
+    }
+}
+
 STableOfContents readContents(CdIo_t* device) {
     STableOfContents contents;
     const track_t first = cdio_get_first_track_num(device), last = cdio_get_last_track_num(device);
@@ -74,12 +108,6 @@ STableOfContents readContents(CdIo_t* device) {
         track.number = number;
         track.isAudio = cdio_get_track_format(device, id) == TRACK_FORMAT_AUDIO;
         track.start = cdio_get_track_lsn(device, id);
-        const lsn_t pregap = cdio_get_track_pregap_lsn(device, id);
-        const int32_t end = contents.tracks.empty() ? -kLeadInSectors : contents.tracks.back().start + 1;
-        track.pregap = number == first ? track.start + kLeadInSectors
-                       : pregap != CDIO_INVALID_LSN && pregap >= end && pregap < track.start
-                           ? track.start - pregap
-                           : 0;
         if (track.isAudio)
             if (char* code = cdio_get_track_isrc(device, id)) {
                 track.texts[DISCIO_TEXT_CODE] = code;
@@ -87,12 +115,18 @@ STableOfContents readContents(CdIo_t* device) {
             }
         contents.tracks.push_back(track);
     }
+    readPregaps(device, contents.tracks);
     contents.leadOut = cdio_get_track_lsn(device, CDIO_CDROM_LEADOUT_TRACK);
+    lsn_t session = 0; // start of the last one
+    if (cdio_get_last_session(device, &session) != DRIVER_OP_SUCCESS) session = 0;
     for (size_t i = 0; i < contents.tracks.size(); ++i) {
-        const bool isLast = i + 1 == contents.tracks.size();
         STrack& track = contents.tracks[i];
-        const int32_t end =
-            isLast ? contents.leadOut : contents.tracks[i + 1].start - contents.tracks[i + 1].pregap;
+        int32_t end = contents.leadOut;
+        if (i + 1 < contents.tracks.size()) {
+            const STrack& next = contents.tracks[i + 1];
+            end = next.start - next.pregap;
+            if (next.start == session) end -= kSessionGap;
+        }
         track.length = end - track.start;
     }
     if (char* code = cdio_get_mcn(device)) {
@@ -111,7 +145,10 @@ bool areSame(const STableOfContents& one, const STableOfContents& other) {
                [](const STrack& a, const STrack& b) { return a.start == b.start && a.isAudio == b.isAudio; });
 }
 
-// The callback of the reader has no user data.
+class CDeviceAudioReader;
+
+// The library's callbacks have no user data.
+thread_local CDeviceAudioReader* t_reader = nullptr;
 thread_local int64_t t_repairs = 0;
 thread_local int64_t t_skipped = 0;
 
@@ -122,7 +159,6 @@ void onRead(long, paranoia_cb_mode_t mode) {
     case PARANOIA_CB_FIXUP_DROPPED:
     case PARANOIA_CB_FIXUP_DUPED:
     case PARANOIA_CB_REPAIR:
-    case PARANOIA_CB_READERR:
         ++t_repairs;
         break;
     case PARANOIA_CB_SKIP:
@@ -142,6 +178,9 @@ public:
         m_drive.reset(cdio_cddap_identify_cdio(m_device.get(), CDDA_MESSAGE_FORGETIT, nullptr));
         if (!m_drive || cdio_cddap_open(m_drive.get()) != 0)
             throw CDiscError(DISCIO_ERROR_DEVICE, path + " cannot read audio");
+        m_drive->read_audio = [](cdrom_drive_t*, void* to, lsn_t block, long count) {
+            return t_reader->readSectors(to, block, count);
+        };
         m_drive->bigendianp = 0; // as READ CD delivers; the library's guess from the sound errs with noise
         m_paranoia.reset(cdio_paranoia_init(m_drive.get()));
         cdio_paranoia_modeset(m_paranoia.get(), PARANOIA_MODE_FULL ^ PARANOIA_MODE_NEVERSKIP);
@@ -149,7 +188,8 @@ public:
     }
 
     void read(int32_t block, int32_t count, int16_t* samples) override {
-        if (cdio_get_media_changed(m_device.get()) == 1) throwLost();
+        if (checkLost(false)) throwLost();
+        t_reader = this;
         if (block != m_next) {
             if (cdio_paranoia_seek(m_paranoia.get(), block, SEEK_SET) < 0) throwUnreadable(block);
             m_next = block;
@@ -187,11 +227,46 @@ private:
         contents.leadOut = cdio_get_track_lsn(m_device.get(), CDIO_CDROM_LEADOUT_TRACK);
         return contents;
     }
-    [[noreturn]] void throwLost() const {
-        throw CDiscError(DISCIO_ERROR_DISC_LOST, "the disc in " + m_path + " has been exchanged");
+    // Instead of the library's function: counts the failures, and ends at once when the disc has gone. A
+    // drive that gets another disc fails once, and reads that one from then on.
+    long readSectors(void* to, lsn_t block, long count) {
+        if (!to) { // moves the head, so that the drive forgets what it has read ahead
+            std::array<int16_t, kAudioSectorBytes / 2> ignored;
+            return cdio_read_audio_sectors(m_device.get(), ignored.data(), block, 1) == DRIVER_OP_SUCCESS;
+        }
+        count = std::min<long>(count, m_drive->nsectors);
+        for (int tries = 0; tries < kMaxReads;) {
+            if (cdio_read_audio_sectors(m_device.get(), to, block, static_cast<uint32_t>(count)) ==
+                DRIVER_OP_SUCCESS)
+                return count;
+            ++t_repairs;
+            if (checkLost(true)) {
+                errno = ENOMEDIUM;
+                return -1;
+            }
+            if (count == 1) ++tries;
+            count = std::max(count / 2, 1L);
+        }
+        m_unreadable = block;
+        errno = EIO;
+        return -1;
     }
-    [[noreturn]] void throwUnreadable(int32_t block) const {
-        if (cdio_get_media_changed(m_device.get()) == 1) throwLost();
+    // The drive reports a change only once. Asks it only after a failure whether there is a disc at all.
+    bool checkLost(bool afterFailure) {
+        if (cdio_get_media_changed(m_device.get()) == 1) m_isLost = true;
+        if (afterFailure && !m_isLost) {
+            const int status = getDeviceStatus(m_path);
+            m_isLost = status == CDS_NO_DISC || status == CDS_TRAY_OPEN;
+        }
+        return m_isLost;
+    }
+    [[noreturn]] void throwLost() const {
+        throw CDiscError(DISCIO_ERROR_DISC_LOST,
+                         "the disc in " + m_path + " has been taken out or exchanged");
+    }
+    [[noreturn]] void throwUnreadable(int32_t block) {
+        if (checkLost(true)) throwLost();
+        if (m_unreadable >= 0) block = std::exchange(m_unreadable, -1);
         throw CDiscError(DISCIO_ERROR_DEVICE, m_path + ": block " + std::to_string(block) + " of track " +
                                                   std::to_string(m_track.number) + " cannot be read");
     }
@@ -203,6 +278,8 @@ private:
     std::unique_ptr<cdrom_paranoia_t, SFreeParanoia> m_paranoia;
     int32_t m_next = -1;
     int64_t m_repairs = 0;
+    bool m_isLost = false;
+    int32_t m_unreadable = -1; // the block that the drive could not read; usually ahead of the position
 };
 
 class CDeviceMedium : public IMedium {
@@ -222,7 +299,16 @@ public:
     std::unique_ptr<IAudioReader> createAudioReader(const STrack& track) const override {
         return std::make_unique<CDeviceAudioReader>(m_path, m_contents, track);
     }
-    std::string getDataPath() const override { return m_path; }
+    // The library for file systems does not know about sessions.
+    std::string getDataPath() const override {
+        for (const STrack& track : m_contents.tracks)
+            if (!track.isAudio && track.start != 0)
+                throw CDiscError(DISCIO_ERROR_NOT_SUPPORTED,
+                                 m_path + ": the data track does not start at the beginning of the disc");
+            else if (!track.isAudio)
+                break;
+        return m_path;
+    }
 
 private:
     std::string m_path;

@@ -128,7 +128,10 @@ private:
             const char* action = udev_device_get_action(device.get());
             if (!node || !action) continue;
             const bool isGone = std::string_view(action) == "remove";
-            change(events, node, !isGone && hasProperty(device.get(), "ID_CDROM_MEDIA"));
+            const bool hasMediumNow = !isGone && hasProperty(device.get(), "ID_CDROM_MEDIA");
+            // The kernel looks every few seconds, and misses the time between two discs.
+            if (hasMediumNow && hasProperty(device.get(), "DISK_MEDIA_CHANGE")) change(events, node, false);
+            change(events, node, hasMediumNow);
         }
     }
 
