@@ -228,6 +228,10 @@ DISCIO_API int32_t DISCIO_DataCursorIsFile(DISCIO_DataCursor* cursor);
 DISCIO_API int32_t DISCIO_DataCursorIsFolder(DISCIO_DataCursor* cursor);
 DISCIO_API const char16_t* DISCIO_DataCursorGetNameW(DISCIO_DataCursor* cursor);
 DISCIO_API int64_t DISCIO_DataCursorGetSize(DISCIO_DataCursor* cursor); /* bytes; -1 for a failure */
+/* Copies bytes of the file at the cursor, from that offset on. Returns how many: fewer than wanted only at
+ * the end of the file; -1 for a failure. The cursor stays where it is. */
+DISCIO_API int64_t DISCIO_DataCursorRead(DISCIO_DataCursor* cursor, int64_t offset, void* buffer,
+                                         int64_t bytes);
 DISCIO_API const char16_t* DISCIO_DataCursorGetDiscPathW(DISCIO_DataCursor* cursor);
 /* Where a file of a virtual disc comes from; empty for other discs. */
 DISCIO_API const char16_t* DISCIO_DataCursorGetFileSourceURIW(DISCIO_DataCursor* cursor);

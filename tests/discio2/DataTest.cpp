@@ -52,6 +52,68 @@ TEST(Data, FilesAreListedInEveryFileSystem) {
     }
 }
 
+// In small and large parts, at random places.
+TEST(Data, FilesAreReadFromEveryFileSystem) {
+    const CTempFolder folder;
+    std::filesystem::create_directories(folder / "in/sub");
+    const std::string large = makeSectors(300, 6);
+    for (const auto& [name, size] :
+         {std::pair("empty", 0), {"one", 1}, {"block", 2048}, {"sub/large", 700001}})
+        folder.write("in/" + std::string(name), large.substr(0, static_cast<size_t>(size)));
+    for (const std::vector<std::string>& options :
+         {std::vector<std::string>{"-J"}, {"-R"}, {"-udf", "-R"}, {"raw"}}) {
+        const bool isRaw = options[0] == "raw";
+        std::vector<std::string> command{"genisoimage", "-quiet", "-R", "-o", "disc.iso"};
+        if (!isRaw) command.insert(command.end(), options.begin(), options.end());
+        command.push_back("in");
+        ASSERT_EQ(run(command, folder.path()).exitCode, 0);
+        std::string image = "disc.iso";
+        if (isRaw) {
+            const std::string plain = readFile(folder / "disc.iso");
+            std::string sectors;
+            for (size_t i = 0; i < plain.size(); i += 2048)
+                sectors += std::string(1, '\0') + std::string(10, '\xFF') + std::string(1, '\0') +
+                           std::string(3, '\0') + "\1" + plain.substr(i, 2048) + std::string(288, '\0');
+            folder.write("disc.bin", sectors);
+            image = "disc.cue";
+            folder.write(image, "FILE disc.bin BINARY\nTRACK 01 MODE1/2352\nINDEX 01 00:00:00\n");
+        }
+        // The library prefers ISO 9660: without its descriptors, only UDF is left.
+        if (options[0] == "-udf") {
+            std::string bytes = readFile(folder / image);
+            bytes.replace(16 * 2048, 3 * 2048, std::string(3 * 2048, '\0'));
+            folder.write(image, bytes);
+        }
+        const SOpenDisc open(folder / image);
+        std::minstd_rand random(1);
+        for (const char16_t* place : {u"", u"sub"}) {
+            const Discio<DISCIO_DataCursor> cursor(DISCIO_DiscDataCreateCursorW(open.disc.get(), place));
+            ASSERT_TRUE(cursor) << open.getError() << options[0];
+            while (DISCIO_DataCursorNext(cursor.get()) == 1) {
+                std::string bytes(800000, '\0');
+                if (DISCIO_DataCursorIsFolder(cursor.get()) == 1) {
+                    EXPECT_EQ(DISCIO_DataCursorRead(cursor.get(), 0, bytes.data(), 1), -1);
+                    EXPECT_EQ(DISCIO_GetLastError(nullptr), DISCIO_ERROR_NOT_A_FILE);
+                    continue;
+                }
+                const int64_t size = DISCIO_DataCursorGetSize(cursor.get());
+                ASSERT_EQ(DISCIO_DataCursorRead(cursor.get(), 0, bytes.data(), 800000), size)
+                    << open.getError();
+                EXPECT_EQ(bytes.compare(0, static_cast<size_t>(size), large, 0, static_cast<size_t>(size)),
+                          0);
+                for (int i = 0; i < 20; ++i) {
+                    const int64_t offset = random() % (size + 1), wanted = random() % 5000;
+                    const int64_t got = DISCIO_DataCursorRead(cursor.get(), offset, bytes.data(), wanted);
+                    ASSERT_EQ(got, std::min(wanted, size - offset));
+                    EXPECT_EQ(bytes.compare(0, static_cast<size_t>(got), large, static_cast<size_t>(offset),
+                                            static_cast<size_t>(got)),
+                              0);
+                }
+            }
+        }
+    }
+}
+
 TEST(Data, AMixedDiscHasBothComponents) {
     const CTempFolder folder;
     folder.write("file", "12345");

@@ -1,4 +1,5 @@
 #include "data/DataVolume.h"
+#include "data/DataFile.h"
 
 #include <algorithm>
 #include <cdio/iso9660.h>
@@ -16,7 +17,9 @@ public:
     explicit CIsoVolume(const std::string& path)
         : m_path(path), m_iso(iso9660_open_ext(path.c_str(), ISO_EXTENSION_ALL), iso9660_close) {
         // Sectors with headers have to be found first.
-        if (!m_iso) m_iso.reset(iso9660_open_fuzzy_ext(path.c_str(), ISO_EXTENSION_ALL, 16));
+        if (m_iso) return;
+        m_hasHeaders = true;
+        m_iso.reset(iso9660_open_fuzzy_ext(path.c_str(), ISO_EXTENSION_ALL, 16));
     }
     explicit operator bool() const { return m_iso != nullptr; }
 
@@ -52,16 +55,37 @@ public:
                 iso9660_name_translate_ext(entry.stored.c_str(), shown.data(), joliet);
                 entry.name = shown.c_str();
             }
-            if (entry.name != "." && entry.name != "..") entries.push_back(entry);
+            if (!entry.isFolder) entry.extents.push_back({file->lsn, entry.size});
+            if (entry.name == "." || entry.name == "..") continue;
+            // Every 4 GB of a large file have a record of their own.
+            if (!entry.isFolder && !entries.empty() && entries.back().stored == entry.stored) {
+                entries.back().size += entry.size;
+                entries.back().extents.push_back(entry.extents[0]);
+            } else {
+                entries.push_back(entry);
+            }
         }
         iso9660_filelist_free(found);
         return entries;
+    }
+
+    void readBlocks(int64_t block, int64_t count, void* to) override {
+        std::lock_guard lock(m_mutex);
+        // The library reads blocks in a row as if there were nothing between them.
+        const int64_t step = m_hasHeaders ? 1 : count;
+        for (int64_t i = 0; i < count; i += step)
+            if (iso9660_iso_seek_read(m_iso.get(), static_cast<char*>(to) + i * ISO_BLOCKSIZE,
+                                      static_cast<lsn_t>(block + i),
+                                      static_cast<long>(step)) != step * ISO_BLOCKSIZE)
+                throw CDiscError(DISCIO_ERROR_READ_INPUT,
+                                 m_path + ": block " + std::to_string(block + i) + " cannot be read");
     }
 
 private:
     std::string m_path;
     std::mutex m_mutex; // guards the library's object, which has one position in the file
     std::unique_ptr<iso9660_t, bool (*)(iso9660_t*)> m_iso;
+    bool m_hasHeaders = false; // the sectors
 };
 
 class CUdfVolume : public IDataVolume {
@@ -103,9 +127,20 @@ public:
             entry.isFolder = each->b_dir;
             entry.size = entry.isFolder ? 0 : static_cast<int64_t>(udf_get_file_length(each));
             entry.modified = udf_get_modification_time(each);
+            if (!entry.isFolder)
+                setUdfExtents(entry, {reinterpret_cast<const char*>(&each->fe), sizeof each->fe},
+                              each->i_part_start);
             entries.push_back(entry);
         }
         return entries;
+    }
+
+    void readBlocks(int64_t block, int64_t count, void* to) override {
+        std::lock_guard lock(m_mutex);
+        if (udf_read_sectors(m_udf.get(), to, static_cast<lsn_t>(block), static_cast<long>(count)) !=
+            DRIVER_OP_SUCCESS)
+            throw CDiscError(DISCIO_ERROR_READ_INPUT,
+                             m_path + ": block " + std::to_string(block) + " cannot be read");
     }
 
 private:

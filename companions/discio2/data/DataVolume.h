@@ -11,6 +11,12 @@
 
 namespace discio {
 
+// Consecutive blocks of 2048 bytes.
+struct SDataExtent {
+    int64_t block = -1; // -1: zeros that are not recorded
+    int64_t bytes = 0;
+};
+
 struct SDataEntry {
     std::string name;   // UTF-8
     std::string stored; // the name in the form that the file system looks up
@@ -21,6 +27,10 @@ struct SDataEntry {
     int64_t modified = -1;
     int64_t accessed = -1;
     std::string source; // the path of a file that is going to be written
+    // The content of a file is in its extents, in their order; without them, in the entry itself.
+    std::vector<SDataExtent> extents;
+    std::string content;
+    bool isReadable = true;
 };
 
 // Names of the folders from the root, in their stored form.
@@ -34,6 +44,8 @@ public:
     virtual std::vector<SDataEntry> list(const DataPath& folder) = 0; // throws CDiscError
     // By its name as it is shown. Throws CDiscError.
     virtual std::optional<SDataEntry> find(const DataPath& folder, const std::string& name);
+    // Throws CDiscError.
+    virtual void readBlocks(int64_t block, int64_t count, void* to);
 };
 
 // ISO 9660 if there is one, otherwise UDF. Throws CDiscError.
