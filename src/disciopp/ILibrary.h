@@ -1,6 +1,7 @@
 // The library as modules use it that load it on first use.
 #pragma once
 
+#include "disciopp/DataFileStream.h"
 #include "disciopp/IDrive.h"
 #include "disciopp/IProject.h"
 #include "disciopp/ITrackStream.h"
@@ -17,6 +18,7 @@ public:
     // Empty projects. Throw CDISCIOPPException.
     virtual P<IAudioCDProject> createAudioCDProject() = 0;
     virtual P<IDataDiscProject> createDataDiscProject() = 0;
+    virtual P<peru::ISeekableInStream> tryOpenFile(const P<peru::IURI>& uri) = 0;
 };
 
 // The function "disciopp_getLibrary" that the library exports.

@@ -16,6 +16,9 @@ public:
     P<ITrackStream> openTrack(const P<peru::IURI>& uri) override { return disciopp::openTrack(uri); }
     P<IAudioCDProject> createAudioCDProject() override { return peru::make<CAudioCDDiscProject>(); }
     P<IDataDiscProject> createDataDiscProject() override { return peru::make<CDataDiscProject>(); }
+    P<peru::ISeekableInStream> tryOpenFile(const P<peru::IURI>& uri) override {
+        return disciopp::tryOpenFile(uri);
+    }
 };
 
 } // namespace

@@ -10,6 +10,7 @@
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/plugins/MediaEnvironment.h"
 #include "tonewright/AudioToolsHandler.h"
+#include "tonewright/DiscStreamFactory.h"
 #include "tonewright/Quietly.h"
 #include "tonewright/SonoraLogManagerProxy.h"
 
@@ -147,6 +148,8 @@ bool CApp::init() {
 
     m_serviceLock = peru::getMutexFactory()->createMutex();
     m_driveChanged = nullptr;
+    m_discStreams = peru::make<CDiscStreamFactory>();
+    peru::getStreamManager()->addFactory(m_discStreams);
     m_cancelAutoplay = peru::make<cap::CCancelAutoplay2>();
     return true;
 }
@@ -188,6 +191,8 @@ P<CNormalizeHandler> CApp::getNormalizeHandler() {
 }
 
 void CApp::shutdown() {
+    if (m_discStreams) peru::getStreamManager()->removeFactory(m_discStreams);
+    m_discStreams.reset();
     if (m_driveManager) {
         m_driveManager->removeListener(this);
         m_driveManager->stop();

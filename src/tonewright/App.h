@@ -2,6 +2,7 @@
 #pragma once
 
 #include "disciopp/IDrive.h"
+#include "peru/streams/IStreamManager.h"
 #include "peru/threads/IMutex.h"
 #include "peru/uri/IURI.h"
 #include "sonora2/context/ISonoraContext.h"
@@ -89,6 +90,7 @@ private:
     P<peru::IURI> m_programFolder;
     P<peru::IURI> m_productDataFolder;
     std::atomic<TONEWRIGHT_DriveChangedCallback> m_driveChanged{nullptr};
+    P<peru::IStreamFactory> m_discStreams;
     P<disciopp::IDriveManager> m_driveManager; // fetched on first need
     std::mutex m_normalizeMutex;
     P<CNormalizeHandler> m_normalizeHandler;   // guarded by the mutex; empty until it is needed

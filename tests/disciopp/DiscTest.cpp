@@ -1,10 +1,12 @@
 #include "discio2/DiscSupport.h"
+#include "disciopp/DataFileStream.h"
 #include "disciopp/Errors.h"
 #include "disciopp/FileSystems.h"
 #include "disciopp/IDrive.h"
 #include "disciopp/ITrackStream.h"
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
+#include "peru/streams/StreamTools.h"
 #include "peru/uri/URI.h"
 #include "support/Environment.h"
 #include "support/Files.h"
@@ -88,6 +90,8 @@ TEST_F(SDiscs, FilesOfADataDiscAreFoundByTheirPath) {
     const CTempFolder content;
     std::filesystem::create_directories(content / "Some folder/inner");
     content.write("Some folder/inner/file one", "12345");
+    const std::string large = makeSectors(40, 1);
+    content.write("Some folder/inner/large", large);
     ASSERT_EQ(run({"genisoimage", "-quiet", "-J", "-V", "", "-o", (folder / "d.iso").string(),
                    content.path().string()})
                   .exitCode,
@@ -104,6 +108,25 @@ TEST_F(SDiscs, FilesOfADataDiscAreFoundByTheirPath) {
     ASSERT_TRUE(file);
     EXPECT_EQ(file->getSize(), 5);
     EXPECT_TRUE(file->getAttributes().readOnly);
+    const P<peru::IURI> image = peru::make<peru::CURI>(
+        ("discioppdiscimage://" + (folder / "d.iso").string() + "/Some%20folder/inner/large").c_str());
+    for (const P<peru::IURI>& each : {image, drive->getPath()->appendPath("Some folder/inner/large")}) {
+        const P<peru::ISeekableInStream> stream = tryOpenFile(each);
+        ASSERT_TRUE(stream);
+        EXPECT_TRUE(peru::readAll(*stream) == large);
+        std::string part(1000, '\0');
+        for (const int64_t at : {69999, 0, 40000, 32768 - 500}) {
+            stream->seek(at);
+            stream->read(part.data(), 1000);
+            EXPECT_EQ(large.compare(static_cast<size_t>(at), 1000, part), 0) << at;
+        }
+        EXPECT_THROW(stream->skip(1 << 30), peru::CEndOfStreamError);
+        stream->close();
+        EXPECT_THROW(stream->isAtEnd(), peru::CStreamClosedError);
+    }
+    EXPECT_FALSE(tryOpenFile(uri->appendPath("below a file")));
+    EXPECT_FALSE(tryOpenFile(drive->getPath()->appendPath("Some folder")));
+    EXPECT_FALSE(tryOpenFile(toURI("/elsewhere")));
     EXPECT_FALSE(files->getFileObject(uri->appendPath("below a file")));
     EXPECT_FALSE(files->getFileObject(toURI("/elsewhere")));
     EXPECT_THROW(files->deleteFile(uri), peru::CException);
