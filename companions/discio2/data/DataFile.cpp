@@ -50,6 +50,8 @@ void IDataVolume::readBlocks(int64_t, int64_t, void*) {
 
 int64_t readFile(IDataVolume& volume, const SDataEntry& entry, int64_t offset, void* buffer, int64_t bytes) {
     if (entry.isFolder) throw CDiscError(DISCIO_ERROR_NOT_A_FILE, entry.name);
+    if (!entry.source.empty())
+        throw CDiscError(DISCIO_ERROR_NOT_SUPPORTED, entry.name + " has not been written to a disc");
     if (!entry.isReadable)
         throw CDiscError(DISCIO_ERROR_NOT_SUPPORTED, entry.name + " is stored in parts elsewhere");
     const int64_t wanted = std::clamp<int64_t>(entry.size - offset, 0, bytes);
