@@ -140,13 +140,11 @@ TEST_F(SImage, TextsComeFromTheSheet) {
               "First one");
     EXPECT_EQ(DISCIO_DiscAudioGetSegmentMetaDataStringW(open.disc.get(), 1, DISCIO_TEXT_TITLE), nullptr);
     EXPECT_EQ(DISCIO_GetLastError(nullptr), DISCIO_ERROR_NO_SUCH_OBJECT);
-    const std::pair<const char*, const char16_t*> titles[] = {{"Disc \xE9", u"Disc \u00E9"},
-                                                              {"\xC4rzte", u"\u00C4rzte"},
-                                                              {"\xC3\x84rzte", u"\u00C4rzte"},
-                                                              {"\xE2\x80x", u"\u00E2\u0080x"},
-                                                              {"\xE2\x80\x94", u"\u2014"},
-                                                              {"\xF0\x9D\x84\x9E", u"\U0001D11E"},
-                                                              {"\xF0\x9D\x84", u"\u00F0\u009D\u0084"}};
+    const std::pair<const char*, const char16_t*> titles[] = {
+        {"Disc \xE9", u"Disc \u00E9"},       {"\xC4rzte", u"\u00C4rzte"},
+        {"\xC3\x84rzte", u"\u00C4rzte"},     {"\xE2\x80x", u"\u00E2\u0080x"},
+        {"\xE2\x80\x94", u"\u2014"},         {"\xED\x9F\xBF\xEE\x80\x80", u"\uD7FF\uE000"},
+        {"\xF0\x9D\x84\x9E", u"\U0001D11E"}, {"\xF0\x9D\x84", u"\u00F0\u009D\u0084"}};
     for (const auto& [bytes, expected] : titles) {
         const SOpenDisc titled(folder.write("b.cue", std::string("TITLE \"") + bytes +
                                                          "\"\nFILE a.bin BINARY\nTRACK 01 AUDIO\n"
