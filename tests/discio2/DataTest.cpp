@@ -28,12 +28,14 @@ TEST(Data, FilesAreListedInEveryFileSystem) {
     const CTempFolder folder;
     std::filesystem::create_directories(folder / "in/Sub folder/deep");
     folder.write("in/a rather long name.text", "12345");
+    ASSERT_EQ(run({"touch", "-d", "@1000000000", "in/a rather long name.text"}, folder.path()).exitCode, 0);
     folder.write("in/Sub folder/deep/x.bin", std::string(5000, 'x'));
     const std::vector<std::string> expected{"\\Sub folder\\", "\\Sub folder\\deep\\",
                                             "\\Sub folder\\deep\\x.bin 5000", "\\a rather long name.text 5"};
     for (const std::vector<std::string>& options :
          {std::vector<std::string>{"-J"}, {"-R"}, {"-J", "-R"}, {"-udf", "-R"}}) {
-        std::vector<std::string> command{"genisoimage", "-quiet", "-V", "My disc", "-o", "disc.iso"};
+        std::vector<std::string> command{"env", "TZ=XXX-5:30", "genisoimage", "-quiet",
+                                         "-V",  "My disc",     "-o",          "disc.iso"};
         command.insert(command.end(), options.begin(), options.end());
         command.push_back("in");
         ASSERT_EQ(run(command, folder.path()).exitCode, 0);
@@ -45,6 +47,17 @@ TEST(Data, FilesAreListedInEveryFileSystem) {
         const Discio<DISCIO_DataCursor> cursor(DISCIO_DiscDataCreateCursorW(open.disc.get(), u"\\"));
         ASSERT_TRUE(cursor) << open.getError();
         EXPECT_EQ(listAll(cursor.get()), expected) << options[0];
+        EXPECT_EQ(DISCIO_DataCursorReset(cursor.get()), 1);
+        while (DISCIO_DataCursorNext(cursor.get()) == 1) {
+            const bool isFile = DISCIO_DataCursorIsFile(cursor.get()) == 1;
+            EXPECT_EQ(isFile, narrow(DISCIO_DataCursorGetNameW(cursor.get())) == "a rather long name.text");
+            EXPECT_EQ(DISCIO_DataCursorGetLastModifiedTime(cursor.get()) == 1'000'000'000, isFile)
+                << options[0] << DISCIO_DataCursorGetLastModifiedTime(cursor.get());
+        }
+        const auto blocks = static_cast<int64_t>(std::filesystem::file_size(folder / "disc.iso")) / 2048;
+        EXPECT_EQ(DISCIO_DiscGetCapacityBytes(open.disc.get()), blocks * 2048);
+        EXPECT_EQ(DISCIO_DiscGetFreeSpaceFraction(open.disc.get()), 0.0);
+        EXPECT_EQ(DISCIO_DiscIsWritable(open.disc.get()) + DISCIO_DiscIsErasable(open.disc.get()), 0);
         EXPECT_EQ(DISCIO_DiscDataFolderExistsW(open.disc.get(), u"Sub folder\\deep\\"), 1);
         EXPECT_EQ(DISCIO_DiscDataFolderExistsW(open.disc.get(), u"Sub folder\\none"), 0);
         EXPECT_EQ(DISCIO_DiscDataFolderExistsW(open.disc.get(), u"a rather long name.text"), 0);
