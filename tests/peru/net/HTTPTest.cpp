@@ -207,6 +207,7 @@ TEST(Http, RequestsOnTheWire) {
     EXPECT_THROW(headers.add("A b", "c"), CInvalidArgError);
     EXPECT_THROW(make<CHTTPRequest>("GET /", toURI("http://a/")), CInvalidArgError);
     EXPECT_THROW(make<CHTTPRequest>("GET", toURI("https://a/")), CURITypeNotSupportedError);
+    EXPECT_THROW(make<CHTTPRequest>("GET", toURI("http://a%0D%0AC:d/")), CException);
 }
 
 // --- Redirections ---

@@ -3,6 +3,7 @@
 #include "peru/net/IPAddress.h"
 #include "peru/net/ProxyRules.h"
 #include "peru/net/SocketError.h"
+#include "peru/net/posix/AddressText.h"
 #include "peru/uri/URI.h"
 #include "support/Files.h"
 
@@ -40,6 +41,23 @@ TEST(Net, IPAddresses) {
          {"", "1.2.3", "1.2.3.256", "1.2.3.4 ", "::1::", "[1.2.3.4]", "[::1", "fe80::1%none", "a.b"})
         EXPECT_EQ(errorOf<CParseError>([&] { CIPAddress address(bad); }), "Error parsing IP address.") << bad;
     EXPECT_EQ(text(CTCPAddress(make<CIPAddress>("::1"), 80).getAsString()), "[::1]:80");
+}
+
+TEST(Net, HostsOfURIs) {
+    const std::pair<const char*, const char*> cases[] = {
+        {"http://a-b%2Dc:80/", "a-b-c"},
+        {"http://[::1]:80/", "::1"},
+        {"http://b\xC3\xBC"
+         "cher.example/",
+         "xn--bcher-kva.example"},
+        {"http://a%0D%0Ab/", ""}, // would begin another line of a request's head
+        {"http://a%20b/", ""},
+        {"http://a%7Fb/", ""},
+        {"http://a%FFb/", ""},
+        {"file:///a", ""},
+    };
+    for (const auto& [uri, host] : cases)
+        EXPECT_EQ(posix::getNetworkHost(make<CURI>(CString::fromUTF8(uri))), host) << uri;
 }
 
 TEST(Net, ProxyTexts) {
