@@ -59,6 +59,14 @@ TEST_F(SImage, CueSheetsDeliverTheSamplesOfTheirFiles) {
            "00:00:12\n"
            "FILE b.wav WAVE\nINDEX 01 00:00:00\nPOSTGAP 00:00:03\n",
            "4+8-154 20+33-8 | 53", {a.substr(4 * kSectorBytes, 8 * kSectorBytes), b + silence(3)});
+    // Sectors with their sub-channels.
+    std::string graphics;
+    for (size_t at = 0; at < all.size(); at += kSectorBytes)
+        graphics += all.substr(at, kSectorBytes) + std::string(96, 'g');
+    folder.write("all.cdg", graphics);
+    expect("graphics.cue",
+           "FILE all.cdg BINARY\nTRACK 01 CDG\nINDEX 01 00:00:00\nTRACK 02 CDG\nINDEX 01 00:00:20\n",
+           "0+20-150 20+70-0 | 90", {a, b + c});
 }
 
 TEST_F(SImage, OtherSheetsDeliverTheSamplesOfTheirFiles) {
