@@ -254,9 +254,10 @@ DISCIO_API DISCIO_Project* DISCIO_CreateDataDiscProject(DISCIO_Library* library)
 DISCIO_API DISCIO_Disc* DISCIO_ProjectGetVirtualDisc(DISCIO_Project* project);
 
 /* A stream of samples from functions. The record is copied; its functions are called on the thread that uses
- * the stream or writes the project. They may fail with 0, or with a negative length or count. `end` is called
- * once, when neither the handle nor a disc uses the stream any more, and `user` has to stay valid until then.
- * Released with DISCIO_Release, also right after it has been inserted into a disc. */
+ * the stream or writes the project, and on one of the library while a drive is writing. They may fail with 0,
+ * or with a negative length or count. `end` is called once, when neither the handle nor a disc uses the
+ * stream any more, and `user` has to stay valid until then. Released with DISCIO_Release, also right after it
+ * has been inserted into a disc. */
 DISCIO_API DISCIO_PCMAudioStream*
 DISCIO_CreatePCMAudioStreamFromFuncs(DISCIO_Library* library, const DISCIO_PCMAudioStreamFuncs* funcs,
                                      void* user);
@@ -330,9 +331,9 @@ typedef struct DISCIO_WriteOptions {
 DISCIO_API int32_t DISCIO_ProjectWriteImageW(DISCIO_Project* project, const char16_t* path,
                                              const DISCIO_WriteOptions* options);
 /* Writes a project to the medium in an optical drive, in one session that is closed. Returns when the drive
- * has finished. Fails with DISCIO_ERROR_DISC_NOT_EMPTY, DISCIO_ERROR_DISC_NOT_WRITABLE or
- * DISCIO_ERROR_NOT_ENOUGH_SPACE before anything is written; a later failure spoils a medium that can be
- * written once. `options` may be null. */
+ * has finished. Tracks of audio CDs have at least 4 seconds. Fails with DISCIO_ERROR_DISC_NOT_EMPTY,
+ * DISCIO_ERROR_DISC_NOT_WRITABLE or DISCIO_ERROR_NOT_ENOUGH_SPACE before anything is written; a later failure
+ * spoils a medium that can be written once. `options` may be null. */
 DISCIO_API int32_t DISCIO_ProjectWriteDisc(DISCIO_Project* project, DISCIO_Drive* drive,
                                            const DISCIO_WriteOptions* options);
 /* Blanks a CD-RW or another rewritable medium; with `whole` not 0 all of it, which takes long, otherwise its

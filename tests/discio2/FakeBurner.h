@@ -1,0 +1,36 @@
+// A drive that writes, without hardware: what is written becomes the disc of the fake drive.
+#pragma once
+
+#include "discio2/FakeDrive.h"
+
+#include <cstdint>
+#include <map>
+
+namespace tests {
+
+struct SFakeBurner {
+    bool isRewritable = false;
+    int failsAt = INT32_MIN; // the block whose writing fails
+    bool wasBlanked = false;
+    bool isDummy = false;
+    std::string node;     // the file behind the device
+    std::string cueSheet; // entries of 8 bytes
+    std::map<int, std::string> blocks;
+    std::string leadIn;  // CD-TEXT packs as they are repeated there
+    std::string unknown; // commands that were refused
+};
+SFakeBurner& fakeBurner();
+
+class CFakeBurner {
+public:
+    CFakeBurner();
+    ~CFakeBurner();
+    CFakeBurner(const CFakeBurner&) = delete;
+    CFakeBurner& operator=(const CFakeBurner&) = delete;
+
+private:
+    UMockdevTestbed* m_testbed;
+    UMockdevIoctlBase* m_handler;
+};
+
+} // namespace tests
