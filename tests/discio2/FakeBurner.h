@@ -13,7 +13,6 @@ struct SFakeBurner {
     int failsAt = INT32_MIN; // the block whose writing fails
     bool wasBlanked = false;
     bool isDummy = false;
-    std::string node;     // the file behind the device
     std::string cueSheet; // entries of 8 bytes
     std::map<int, std::string> blocks;
     std::string leadIn;  // CD-TEXT packs as they are repeated there

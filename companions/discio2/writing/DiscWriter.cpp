@@ -9,6 +9,8 @@
 #include <cerrno>
 #include <cstring>
 #include <fcntl.h>
+#include <scsi/sg.h>
+#include <sys/ioctl.h>
 #include <system_error>
 #include <unistd.h>
 #include <zlib.h>
@@ -21,7 +23,7 @@ constexpr int32_t kBlocksAtOnce = kSectorsPerSecond;
 constexpr int32_t kShortestTrack = 4 * kSectorsPerSecond; // the standard of audio CDs
 // Drives read ahead over the end of a data track, and may fail there.
 constexpr uint32_t kTailBlocks = 150;
-constexpr size_t kPortion = 128 << 10;
+constexpr uint16_t kReadBlocks = 16; // every drive and driver accepts 32 kB
 
 // The samples of a track as the drive wants them: whole sectors, little-endian.
 class CTrackFeed {
@@ -68,29 +70,60 @@ SBurnSettings toBurnSettings(const SDiscSettings& settings) {
     return own;
 }
 
-// The sum of the first bytes on a data disc.
-uLong readSum(const std::string& device, int64_t size, const CProgress& progress) {
-    const int file = ::open(device.c_str(), O_RDONLY | O_CLOEXEC);
-    const auto fail = [&] {
-        throw CDiscError(DISCIO_ERROR_DEVICE,
-                         device + " cannot be read back: " + std::generic_category().message(errno));
-    };
-    if (file < 0) fail();
-    const struct SClose {
-        int file;
-        ~SClose() { ::close(file); }
-    } close{file};
-    std::vector<Bytef> portion(kPortion);
+// Reads data from the drive by commands: the kernel may still have the size of the blank medium.
+class CDeviceReader {
+public:
+    explicit CDeviceReader(const std::string& device)
+        : m_device(device), m_file(::open(device.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC)) {
+        if (m_file < 0) fail(std::generic_category().message(errno));
+    }
+    ~CDeviceReader() { ::close(m_file); }
+    CDeviceReader(const CDeviceReader&) = delete;
+    CDeviceReader& operator=(const CDeviceReader&) = delete;
+
+    void read(uint32_t block, uint16_t count, uint8_t* data) const {
+        uint8_t command[10] = {kRead10};
+        for (int i = 0; i < 4; ++i) command[2 + i] = static_cast<uint8_t>(block >> (24 - 8 * i));
+        command[7] = static_cast<uint8_t>(count >> 8);
+        command[8] = static_cast<uint8_t>(count);
+        uint8_t sense[32] = {};
+        sg_io_hdr_t header{};
+        header.interface_id = 'S';
+        header.dxfer_direction = SG_DXFER_FROM_DEV;
+        header.cmd_len = sizeof command;
+        header.cmdp = command;
+        header.mx_sb_len = sizeof sense;
+        header.sbp = sense;
+        header.dxfer_len = count * kDataSectorBytes;
+        header.dxferp = data;
+        header.timeout = 60'000; // milliseconds
+        if (::ioctl(m_file, SG_IO, &header) != 0) fail(std::generic_category().message(errno));
+        if (header.status != 0 || header.host_status != 0)
+            fail("block " + std::to_string(block) + " cannot be read");
+    }
+
+private:
+    static constexpr uint8_t kRead10 = 0x28;
+
+    [[noreturn]] void fail(const std::string& reason) const {
+        throw CDiscError(DISCIO_ERROR_DEVICE, m_device + " cannot be read back: " + reason);
+    }
+
+    std::string m_device;
+    int m_file;
+};
+
+// The sum of the first blocks on a data disc.
+uLong readSum(const std::string& device, int64_t blocks, const CProgress& progress) {
+    const CDeviceReader reader(device);
+    std::vector<uint8_t> portion(size_t{kReadBlocks} * kDataSectorBytes);
     uLong sum = 0;
-    for (int64_t done = 0; done < size;) {
-        const auto wanted =
-            static_cast<size_t>(std::min<int64_t>(static_cast<int64_t>(kPortion), size - done));
-        const ssize_t count = ::pread(file, portion.data(), wanted, static_cast<off_t>(done));
-        if (count < 0 && errno == EINTR) continue;
-        if (count <= 0) fail();
-        sum = crc32(sum, portion.data(), static_cast<uInt>(count));
+    for (int64_t done = 0; done < blocks;) {
+        const auto count = static_cast<uint16_t>(std::min<int64_t>(kReadBlocks, blocks - done));
+        reader.read(static_cast<uint32_t>(done), count, portion.data());
+        sum = crc32(sum, portion.data(), static_cast<uInt>(count) * kDataSectorBytes);
         done += count;
-        progress.report(DISCIO_PHASE_VERIFY, done, size);
+        progress.report(DISCIO_PHASE_VERIFY, done, blocks);
     }
     return sum;
 }
@@ -143,7 +176,8 @@ void writeDataDisc(const CVirtualDataDisc& disc, const std::string& device, cons
                               source->getSize()});
         burner.write(session, false, toBurnSettings(settings), progress);
     }
-    if (settings.isVerified && !settings.isDummy && readSum(device, source->getSize(), progress) != *sum)
+    if (settings.isVerified && !settings.isDummy &&
+        readSum(device, source->getSize() / kDataSectorBytes, progress) != *sum)
         throw CDiscError(DISCIO_ERROR_DEVICE, device + ": the disc differs from what was written");
 }
 
