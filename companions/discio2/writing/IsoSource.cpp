@@ -15,6 +15,7 @@ namespace {
 
 constexpr mode_t kFolderMode = 0555; // everyone may read what is on a disc
 constexpr mode_t kFileMode = 0444;
+constexpr int64_t kBufferBytes = 256 << 10;
 
 // A file that fails the write if it cannot be read, or is not what was added. The library's own would be
 // filled up with zeros.
@@ -45,25 +46,42 @@ public:
     void close() {
         if (m_file >= 0) ::close(m_file);
         m_file = -1;
+        m_buffer = {};
+        m_used = 0;
     }
+    // The library asks for one block at a time.
     int read(void* data, size_t size) {
         return attempt(ISO_FILE_READ_ERROR, [&] {
             size_t done = 0;
-            const auto wanted =
-                static_cast<size_t>(std::min<int64_t>(static_cast<int64_t>(size), m_size - m_position));
-            while (done < wanted) {
-                const ssize_t count = ::read(m_file, static_cast<char*>(data) + done, wanted - done);
-                if (count < 0 && errno == EINTR) continue;
-                if (count < 0) fail();
-                if (count == 0) throw CDiscError(DISCIO_ERROR_READ_INPUT, m_path + " has become shorter");
-                done += static_cast<size_t>(count);
+            while (done < size) {
+                if (m_used == m_buffer.size() && !fill()) break;
+                const size_t count = std::min(size - done, m_buffer.size() - m_used);
+                std::memcpy(static_cast<char*>(data) + done, m_buffer.data() + m_used, count);
+                done += count;
+                m_used += count;
             }
-            m_position += static_cast<int64_t>(done);
             return static_cast<int>(done);
         });
     }
 
 private:
+    // False at the end.
+    bool fill() {
+        const auto wanted = static_cast<size_t>(std::min<int64_t>(kBufferBytes, m_size - m_position));
+        m_buffer.resize(wanted);
+        m_used = wanted; // nothing, until it is read
+        if (wanted == 0) return false;
+        ssize_t count = 0;
+        do {
+            count = ::read(m_file, m_buffer.data(), wanted);
+        } while (count < 0 && errno == EINTR);
+        if (count < 0) fail();
+        if (count == 0) throw CDiscError(DISCIO_ERROR_READ_INPUT, m_path + " has become shorter");
+        m_buffer.resize(static_cast<size_t>(count));
+        m_used = 0;
+        m_position += count;
+        return true;
+    }
     [[noreturn]] void fail() const {
         throw CDiscError(DISCIO_ERROR_READ_INPUT, m_path + ": " + std::generic_category().message(errno));
     }
@@ -85,7 +103,9 @@ private:
     ino_t m_number;
     std::shared_ptr<CFirstFailure> m_failure;
     int m_file = -1;
-    int64_t m_position = 0;
+    int64_t m_position = 0; // behind the buffer
+    std::vector<char> m_buffer;
+    size_t m_used = 0;
 };
 
 // The library's iso_stream, which its header hides from C++.

@@ -57,6 +57,7 @@ private:
     std::string m_path;
     int m_file;
     int64_t m_size = 0;
+    int64_t m_started = 0; // the kernel is writing what is before
 };
 
 } // namespace discio
