@@ -25,14 +25,17 @@ void reportSpeed(benchmark::State& state) {
         static_cast<double>(kChunkFrames) * kChunks / kRate, benchmark::Counter::kIsIterationInvariantRate);
 }
 
-void measureDirectly(benchmark::State& state) {
+void measureDirectly(benchmark::State& state, int mode) {
     const std::vector<short> chunk = makeChunk();
     for (auto _ : state) {
-        ebur128_state* meter = ebur128_init(2, kRate, EBUR128_MODE_I);
+        ebur128_state* meter = ebur128_init(2, kRate, mode);
         for (int i = 0; i < kChunks; ++i) ebur128_add_frames_short(meter, chunk.data(), kChunkFrames);
         double loudness = 0;
         ebur128_loudness_global(meter, &loudness);
-        benchmark::DoNotOptimize(loudness);
+        double peak = 0, range = 0;
+        ebur128_true_peak(meter, 0, &peak);
+        ebur128_loudness_range(meter, &range);
+        benchmark::DoNotOptimize(loudness + peak + range);
         ebur128_destroy(&meter);
     }
     reportSpeed(state);
@@ -65,10 +68,13 @@ void equalize(benchmark::State& state) {
     reportSpeed(state);
 }
 
-BENCHMARK(measureDirectly)->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(measureDirectly, loudness, EBUR128_MODE_I)->Unit(benchmark::kMillisecond);
 BENCHMARK_CAPTURE(measureWith, loudness, createNormalizeAnalysator)->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(measureWith, loudnessAndPeaks, [] {
-    return createLoudnessAnalysator(TONEWRIGHT_ANALYSATOR_PEAKS);
+BENCHMARK_CAPTURE(measureDirectly, all,
+                  EBUR128_MODE_I | EBUR128_MODE_LRA | EBUR128_MODE_SAMPLE_PEAK | EBUR128_MODE_TRUE_PEAK)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(measureWith, all, [] {
+    return createLoudnessAnalysator(TONEWRIGHT_ANALYSATOR_PEAKS | TONEWRIGHT_ANALYSATOR_RANGE);
 })->Unit(benchmark::kMillisecond);
 BENCHMARK(equalize)->Unit(benchmark::kMillisecond);
 

@@ -13,6 +13,7 @@ namespace {
 
 constexpr size_t kBlockFrames = 1024;
 constexpr size_t kKnownLayouts = 8; // channels
+constexpr double kNone = std::numeric_limits<double>::quiet_NaN();
 
 int addFramesOf(ebur128_state* state, const short* samples, size_t frames) {
     return ebur128_add_frames_short(state, samples, frames);
@@ -58,11 +59,13 @@ int read24(const uint8_t* bytes) {
 
 CAnalysator::CAnalysator(int flags)
     : TONEWRIGHT_Analysator(), m_hasPeaks((flags & TONEWRIGHT_ANALYSATOR_PEAKS) != 0),
-      m_isFloat((flags & TONEWRIGHT_ANALYSATOR_FLOAT) != 0) {}
+      m_isFloat((flags & TONEWRIGHT_ANALYSATOR_FLOAT) != 0),
+      m_hasRange((flags & TONEWRIGHT_ANALYSATOR_RANGE) != 0) {}
 
 void CAnalysator::initialise(int channelCount, int bytesPerSample, int sampleRate) {
     m_state.reset();
     m_partial.clear();
+    m_isFinished = false;
     const bool isValid =
         m_isFloat ? bytesPerSample == 4 || bytesPerSample == 8 : bytesPerSample >= 1 && bytesPerSample <= 4;
     if (!isValid || channelCount < 1 || sampleRate < 1) return;
@@ -72,7 +75,8 @@ void CAnalysator::initialise(int channelCount, int bytesPerSample, int sampleRat
 }
 
 CAnalysator::State CAnalysator::makeState(int channelCount, int sampleRate) const {
-    const int mode = EBUR128_MODE_I | (m_hasPeaks ? EBUR128_MODE_TRUE_PEAK | EBUR128_MODE_SAMPLE_PEAK : 0);
+    const int mode = EBUR128_MODE_I | (m_hasPeaks ? EBUR128_MODE_TRUE_PEAK | EBUR128_MODE_SAMPLE_PEAK : 0) |
+                     (m_hasRange ? EBUR128_MODE_LRA : 0);
     State state(
         ebur128_init(static_cast<unsigned>(channelCount), static_cast<unsigned long>(sampleRate), mode));
     if (state) setLayout(state.get(), m_channels);
@@ -80,7 +84,7 @@ CAnalysator::State CAnalysator::makeState(int channelCount, int sampleRate) cons
 }
 
 void CAnalysator::analyse(const uint8_t* bytes, size_t count) {
-    if (!m_state) return;
+    if (!m_state || m_isFinished) return;
     const size_t frameBytes = m_channels * m_bytesPerSample;
     if (!m_partial.empty()) {
         const size_t taken = std::min(count, frameBytes - m_partial.size());
@@ -136,8 +140,29 @@ void CAnalysator::addAligned(std::vector<Sample>& block, const uint8_t* bytes, s
     });
 }
 
+// The library has no such operation, but a change of the format releases all buffers and keeps what has been
+// measured, except for the peaks.
+void CAnalysator::finish() {
+    if (!m_state || m_isFinished) return;
+    getPeaks(m_samplePeak, m_truePeak);
+    m_isFinished = true;
+    m_partial = {};
+    m_shorts = {};
+    m_integers = {};
+    m_floats = {};
+    m_doubles = {};
+    constexpr unsigned kLeastChannels = 1, kLeastRate = 16;
+    if (ebur128_change_parameters(m_state.get(), kLeastChannels, kLeastRate) == EBUR128_ERROR_NOMEM)
+        throw std::bad_alloc();
+}
+
 bool CAnalysator::getPeaks(double& samplePeak, double& truePeak) const {
     if (!m_hasPeaks || !m_state) return false;
+    if (m_isFinished) {
+        samplePeak = m_samplePeak;
+        truePeak = m_truePeak;
+        return true;
+    }
     samplePeak = truePeak = 0.0;
     for (unsigned channel = 0; channel < m_channels; ++channel) {
         double peak = 0.0;
@@ -150,18 +175,31 @@ bool CAnalysator::getPeaks(double& samplePeak, double& truePeak) const {
     return true;
 }
 
-double CAnalysator::measure(std::span<const CAnalysator* const> analysators) {
-    constexpr double kNone = std::numeric_limits<double>::quiet_NaN();
+std::vector<ebur128_state*> CAnalysator::listStates(std::span<const CAnalysator* const> analysators) {
     std::vector<ebur128_state*> states;
     for (const CAnalysator* analysator : analysators) {
-        if (!analysator->m_state) return kNone;
+        if (!analysator->m_state) return {};
         states.push_back(analysator->m_state.get());
     }
+    return states;
+}
+
+double CAnalysator::measure(std::span<const CAnalysator* const> analysators) {
+    std::vector<ebur128_state*> states = listStates(analysators);
     double loudness = kNone;
     if (states.empty() ||
         ebur128_loudness_global_multiple(states.data(), states.size(), &loudness) != EBUR128_SUCCESS)
         return kNone;
     return loudness;
+}
+
+double CAnalysator::measureRange(std::span<const CAnalysator* const> analysators) {
+    std::vector<ebur128_state*> states = listStates(analysators);
+    double range = kNone;
+    if (states.empty() ||
+        ebur128_loudness_range_multiple(states.data(), states.size(), &range) != EBUR128_SUCCESS)
+        return kNone;
+    return range;
 }
 
 } // namespace audiotools

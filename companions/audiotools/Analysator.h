@@ -18,6 +18,8 @@ public:
 
     void initialise(int channelCount, int bytesPerSample, int sampleRate);
     void analyse(const uint8_t* bytes, size_t count);
+    // No more samples follow: releases what only they would need. The results stay.
+    void finish();
     // Results from now on are those of a format that cannot be measured.
     void invalidate() { m_state.reset(); }
     // False without peaks.
@@ -25,6 +27,8 @@ public:
 
     // The loudness of all together, in LUFS.
     static double measure(std::span<const CAnalysator* const> analysators);
+    // The loudness range of all together, in LU. NaN unless all measure it.
+    static double measureRange(std::span<const CAnalysator* const> analysators);
 
 private:
     struct SEnd {
@@ -33,6 +37,8 @@ private:
     using State = std::unique_ptr<ebur128_state, SEnd>;
 
     State makeState(int channelCount, int sampleRate) const;
+    // Empty if one of them has none.
+    static std::vector<ebur128_state*> listStates(std::span<const CAnalysator* const> analysators);
     void addFrames(const uint8_t* bytes, size_t frames);
     template <class Sample, class Convert>
     void addConverted(std::vector<Sample>& block, const uint8_t* bytes, size_t frames, Convert convert);
@@ -40,7 +46,10 @@ private:
 
     const bool m_hasPeaks;
     const bool m_isFloat;
+    const bool m_hasRange;
     State m_state;
+    bool m_isFinished = false;
+    double m_samplePeak = 0.0, m_truePeak = 0.0; // once finished
     size_t m_channels = 0;
     size_t m_bytesPerSample = 0;
     std::vector<uint8_t> m_partial; // the beginning of a frame

@@ -32,11 +32,13 @@ template <class Body> void callAnalysator(TONEWRIGHT_Analysator* self, Body body
     }
 }
 
-double measure(TONEWRIGHT_Analysator* const* analysators, size_t count) noexcept {
+using Measure = double (*)(std::span<const CAnalysator* const>);
+
+double measure(TONEWRIGHT_Analysator* const* analysators, size_t count, Measure result) noexcept {
     try {
         std::vector<const CAnalysator*> objects;
         for (size_t i = 0; i < count; ++i) objects.push_back(&toObject(analysators[i]));
-        return CAnalysator::measure(objects);
+        return result(objects);
     } catch (const std::bad_alloc&) {
         return kNotMeasured;
     }
@@ -55,7 +57,7 @@ const TONEWRIGHT_AnalysatorOperations kAnalysatorOperations = {
             object.analyse(static_cast<const uint8_t*>(samples), static_cast<size_t>(byteCount));
         });
     },
-    [](TONEWRIGHT_Analysator* self) { return measure(&self, 1); },
+    [](TONEWRIGHT_Analysator* self) { return measure(&self, 1, CAnalysator::measure); },
 };
 
 const TONEWRIGHT_EqualizerOperations kEqualizerOperations = {
@@ -107,7 +109,17 @@ int32_t getAnalysatorPeaks(TONEWRIGHT_Analysator* analysator, double* samplePeak
 }
 
 double getAnalysatorLoudness(TONEWRIGHT_Analysator* const* analysators, int32_t count) {
-    return analysators && count > 0 ? measure(analysators, static_cast<size_t>(count)) : kNotMeasured;
+    if (!analysators || count < 1) return kNotMeasured;
+    return measure(analysators, static_cast<size_t>(count), CAnalysator::measure);
+}
+
+double getAnalysatorRange(TONEWRIGHT_Analysator* const* analysators, int32_t count) {
+    if (!analysators || count < 1) return kNotMeasured;
+    return measure(analysators, static_cast<size_t>(count), CAnalysator::measureRange);
+}
+
+void finishAnalysator(TONEWRIGHT_Analysator* analysator) {
+    if (analysator) callAnalysator(analysator, [](CAnalysator& object) { object.finish(); });
 }
 
 TONEWRIGHT_Equalizer* createEqualizer() {

@@ -64,8 +64,9 @@ AUDIOTOOLS_API double convertDeltaDBValue(double decibels);
 /* What an analyser measures beside the loudness. */
 typedef enum TONEWRIGHT_AnalysatorFlags {
     TONEWRIGHT_ANALYSATOR_PEAKS = 1, /* takes several times as long */
-    TONEWRIGHT_ANALYSATOR_FLOAT = 2  /* samples are IEEE numbers of 4 or 8 bytes with full scale 1.0; infinite
+    TONEWRIGHT_ANALYSATOR_FLOAT = 2, /* samples are IEEE numbers of 4 or 8 bytes with full scale 1.0; infinite
                                         ones and NaN count as 0 */
+    TONEWRIGHT_ANALYSATOR_RANGE = 4  /* the loudness range, too */
 } TONEWRIGHT_AnalysatorFlags;
 
 /* An analyser as above, with TONEWRIGHT_AnalysatorFlags. */
@@ -79,6 +80,13 @@ AUDIOTOOLS_API int32_t getAnalysatorPeaks(TONEWRIGHT_Analysator* analysator, dou
 /* The integrated loudness of several recordings as one, such as the tracks of an album. The values are those
  * of the operation "result". */
 AUDIOTOOLS_API double getAnalysatorLoudness(TONEWRIGHT_Analysator* const* analysators, int32_t count);
+
+/* The loudness range (EBU Tech 3342) of one or several recordings, in LU: 0 for sound shorter than 3 seconds.
+ * NaN unless all analysers have TONEWRIGHT_ANALYSATOR_RANGE. */
+AUDIOTOOLS_API double getAnalysatorRange(TONEWRIGHT_Analysator* const* analysators, int32_t count);
+
+/* No more samples follow: releases memory that only they would need. The results stay. */
+AUDIOTOOLS_API void finishAnalysator(TONEWRIGHT_Analysator* analysator);
 
 /* --- Equalizer ----------------------------------------------------------------------------------- */
 

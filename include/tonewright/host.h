@@ -346,6 +346,7 @@ typedef struct TONEWRIGHT_Loudness {
     double truePeak;   /* the highest value of the curve through the samples (ITU-R BS.1770), as a factor of
                           full scale; floating-point samples may exceed 1.0 */
     double samplePeak; /* the highest sample */
+    double range;      /* loudness range in LU, as in EBU Tech 3342; 0 for less than 3 seconds */
 } TONEWRIGHT_Loudness;
 
 /* Progress of a measurement from 0.0 to 1.0. Returns a TONEWRIGHT_Answer: after TONEWRIGHT_STOP the part read

@@ -1,6 +1,7 @@
 #include "host_support/GainSource.h"
 
 #include "peru/IInterfaceQuery.h"
+#include "peru/strings/IStringLocalizer.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/AudioChunk.h"
 
@@ -95,7 +96,8 @@ void CGainSource::prepare() {
             m_floatBytes = bytes;
         }
     if (m_floatBytes == 0 && (m_ownWidth < 1 || m_ownWidth > 4))
-        throw sonora2::common::CSonoraError("The source has no gain: its width of samples is unknown");
+        throw sonora2::common::CSonoraError(peru::localize(
+            "tonewright.Loudness.unknownWidth", "The source has no gain: its width of samples is unknown"));
 }
 
 void CGainSource::close() {
@@ -116,7 +118,8 @@ bool CGainSource::canUseFloat(int bytesPerSample) {
 
 void CGainSource::useFloat(int bytesPerSample) {
     if (!canUseFloat(bytesPerSample))
-        throw sonora2::common::CSonoraError("The source has no floating-point samples of that width");
+        throw sonora2::common::CSonoraError(peru::localize(
+            "tonewright.Loudness.noFloat", "The source has no floating-point samples of that width"));
     m_passesFloat = true;
 }
 

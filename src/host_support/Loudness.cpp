@@ -1,6 +1,7 @@
 // Measures loudness and applies gains.
 #include "host_support/GainSource.h"
 #include "host_support/Guard.h"
+#include "peru/strings/IStringLocalizer.h"
 #include "peru/strings/StringFormat.h"
 #include "sonora2/media/CloseGuard.h"
 #include "sonora2/plugins/CompanionLibrary.h"
@@ -23,7 +24,9 @@ public:
         : m_library(sonora2::common::loadCompanionLibrary("audiotools")),
           create(find<decltype(createLoudnessAnalysator)>("createLoudnessAnalysator")),
           getPeaks(find<decltype(getAnalysatorPeaks)>("getAnalysatorPeaks")),
-          getLoudness(find<decltype(getAnalysatorLoudness)>("getAnalysatorLoudness")) {}
+          getLoudness(find<decltype(getAnalysatorLoudness)>("getAnalysatorLoudness")),
+          getRange(find<decltype(getAnalysatorRange)>("getAnalysatorRange")),
+          finish(find<decltype(finishAnalysator)>("finishAnalysator")) {}
     ~CAudioTools() override = default;
 
 private:
@@ -36,20 +39,24 @@ public:
     decltype(createLoudnessAnalysator)* const create;
     decltype(getAnalysatorPeaks)* const getPeaks;
     decltype(getAnalysatorLoudness)* const getLoudness;
+    decltype(getAnalysatorRange)* const getRange;
+    decltype(finishAnalysator)* const finish;
 };
 
 class CMeasurement : public peru::CObject {
 public:
     CMeasurement(bool isFloat, int channels, int bytesPerSample, int rate)
         : tools(peru::make<CAudioTools>()),
-          analysator(
-              tools->create(TONEWRIGHT_ANALYSATOR_PEAKS | (isFloat ? TONEWRIGHT_ANALYSATOR_FLOAT : 0))) {
+          analysator(tools->create(TONEWRIGHT_ANALYSATOR_PEAKS | TONEWRIGHT_ANALYSATOR_RANGE |
+                                   (isFloat ? TONEWRIGHT_ANALYSATOR_FLOAT : 0))) {
         if (!analysator) throw std::bad_alloc();
         analysator->operations->initialise(analysator, channels, bytesPerSample, rate);
         if (std::isnan(analysator->operations->result(analysator))) {
             analysator->operations->destroy(analysator);
-            throw peru::CError(
-                peru::format("The loudness of %d channels at %d Hz cannot be measured", channels, rate));
+            throw peru::CError(peru::localize(
+                "tonewright.Loudness.format",
+                "The loudness of %CHANNELS% channels at %RATE% Hz cannot be measured",
+                {{"%CHANNELS%", peru::format("%d", channels)}, {"%RATE%", peru::format("%d", rate)}}));
         }
     }
     ~CMeasurement() override { analysator->operations->destroy(analysator); }
@@ -92,6 +99,7 @@ P<CMeasurement> measure(const P<IAudioSource>& source, TONEWRIGHT_LoudnessProgre
         measurement->add(*chunk);
     }
     source->close();
+    measurement->tools->finish(measurement->analysator);
     return measurement;
 }
 
@@ -107,7 +115,9 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_MeasureLoudness(TONEWRIGHT_Handle source,
 int32_t TONEWRIGHT_Host_GetLoudness(const TONEWRIGHT_Handle* measurements, int32_t count,
                                     TONEWRIGHT_Loudness* loudness) {
     return guard(0, [&] {
-        if (!measurements || count < 1) throw peru::CError("There are no measurements");
+        if (!measurements || count < 1)
+            throw peru::CError(
+                peru::localize("tonewright.Loudness.noMeasurements", "There are no measurements"));
         TONEWRIGHT_Loudness values = {};
         std::vector<P<CMeasurement>> objects;
         std::vector<TONEWRIGHT_Analysator*> analysators;
@@ -121,7 +131,8 @@ int32_t TONEWRIGHT_Host_GetLoudness(const TONEWRIGHT_Handle* measurements, int32
             objects.push_back(object);
         }
         values.integrated = objects.front()->tools->getLoudness(analysators.data(), count);
-        if (std::isnan(values.integrated)) throw std::bad_alloc();
+        values.range = objects.front()->tools->getRange(analysators.data(), count);
+        if (std::isnan(values.integrated) || std::isnan(values.range)) throw std::bad_alloc();
         fillRecord(loudness, values);
         return 1;
     });
@@ -131,7 +142,8 @@ TONEWRIGHT_Handle TONEWRIGHT_Host_CreateGainSource(TONEWRIGHT_Handle source, dou
                                                    int32_t bytesPerSample) {
     return guard<TONEWRIGHT_Handle>(nullptr, [&] {
         if (!std::isfinite(gain) || gain < 0.0 || bytesPerSample < 0 || bytesPerSample > 4)
-            throw peru::CError("The gain or the width of the samples is invalid");
+            throw peru::CError(peru::localize("tonewright.Loudness.gain",
+                                              "The gain or the width of the samples is invalid"));
         return wrap(peru::make<CGainSource>(require<IAudioSource>(source, "an audio source"), gain,
                                             static_cast<int>(bytesPerSample)));
     });

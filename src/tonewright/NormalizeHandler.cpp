@@ -1,6 +1,7 @@
 #include "tonewright/NormalizeHandler.h"
 
 #include "peru/Errors.h"
+#include "peru/strings/IStringLocalizer.h"
 #include "peru/strings/StringFormat.h"
 #include "sonora2/plugins/CompanionLibrary.h"
 
@@ -49,9 +50,12 @@ double CNormalizeHandler::findGain(sonora2::common::IAudioSource& source, double
     }
     const double level = operations.result(analysator.get());
     if (std::isnan(level))
-        throw peru::CError(
-            peru::format("The loudness of %d channels with %d bytes per sample at %d Hz cannot be measured",
-                         channels, bytes, rate));
+        throw peru::CError(peru::localize("tonewright.Normalize.format",
+                                          "The loudness of %CHANNELS% channels with %BYTES% bytes per sample "
+                                          "at %RATE% Hz cannot be measured",
+                                          {{"%CHANNELS%", peru::format("%d", channels)},
+                                           {"%BYTES%", peru::format("%d", bytes)},
+                                           {"%RATE%", peru::format("%d", rate)}}));
     return m_convert(targetLevel - level) / kFullScale;
 }
 
