@@ -134,8 +134,8 @@ int main(int argc, char** argv) {
            "cannot be loaded or started, 130 stopped by Ctrl-C."));
 
     Run run;
-    for (const auto add : {addConvert, addInfo, addFormats, addWaveform, addDevices, addPlay, addMix,
-                           addRecord, addTag, addDrives, addDisc, addRip, addCddb, addGet})
+    for (const auto add : {addConvert, addInfo, addFormats, addWaveform, addLoudness, addDevices, addPlay,
+                           addMix, addRecord, addTag, addDrives, addDisc, addRip, addCddb, addGet})
         add(app, run);
     // The parser's own message would not name the unknown command.
     const auto isMeant = [&](const CLI::App* command) { return command->check_name(argv[1]); };

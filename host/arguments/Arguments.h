@@ -12,6 +12,7 @@ void addFormats(CLI::App& app, Run& run);
 void addWaveform(CLI::App& app, Run& run);
 void addDevices(CLI::App& app, Run& run);
 void addPlay(CLI::App& app, Run& run);
+void addLoudness(CLI::App& app, Run& run);
 void addMix(CLI::App& app, Run& run);
 void addRecord(CLI::App& app, Run& run);
 void addTag(CLI::App& app, Run& run);

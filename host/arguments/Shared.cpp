@@ -2,8 +2,10 @@
 
 #include "base/Translation.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstdlib>
+#include <thread>
 
 namespace host {
 
@@ -103,6 +105,20 @@ void checkBitRates(const SFormatOptions& options) {
     if (options.maxBitRate > 0 && options.maxBitRate < options.bitRate)
         throw CLI::ValidationError("--max-bitrate",
                                    tr("host.arguments.belowBitrate", "is less than --bitrate"));
+}
+
+std::string isLoudness(const std::string& text) {
+    char* end = nullptr;
+    const double level = std::strtod(text.c_str(), &end);
+    return end != text.c_str() && *end == '\0' && level >= -70.0 && level <= 0.0
+               ? ""
+               : tr("host.arguments.loudness", "%TEXT% is not a loudness from -70 to 0 LUFS",
+                    {{"%TEXT%", text}});
+}
+
+void addJobs(CLI::App& command, int& jobs, const std::string& help) {
+    jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
+    command.add_option("-j,--jobs", jobs, help)->option_text("N")->check(CLI::Range(1, 256));
 }
 
 void addBoxed(CLI::App& app, std::string& plugins) {

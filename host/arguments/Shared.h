@@ -26,6 +26,12 @@ std::string toWholeNumber(std::string& text, const std::string& unit);
 // Throws CLI::ValidationError if the bit rates contradict each other.
 void checkBitRates(const SFormatOptions& options);
 
+// A check for a loudness in LUFS.
+std::string isLoudness(const std::string& text);
+
+// "-j", with the number of processor cores as the default.
+void addJobs(CLI::App& command, int& jobs, const std::string& help);
+
 // "--boxed" with or without a list of plug-ins, which is left empty without the option.
 void addBoxed(CLI::App& app, std::string& plugins);
 

@@ -6,6 +6,7 @@
 #include "media/Devices.h"
 #include "media/Download.h"
 #include "media/InputContent.h"
+#include "media/InputFiles.h"
 #include "media/PlaySession.h"
 #include "media/PlaySource.h"
 #include "media/Playlist.h"
@@ -420,16 +421,6 @@ void CJukebox::show() {
         details);
 }
 
-std::set<std::string> readExtensions(CLibrary& library) {
-    const CHandle extensions(library.getValidCodecExtensions(TONEWRIGHT_AUDIO_SOURCE));
-    std::set<std::string> names;
-    for (int32_t i = 0; i < library.getExtensionCount(extensions.get()); ++i) {
-        const CHandle text(library.getExtension(extensions.get(), i));
-        if (text) names.insert(toUTF8(TONEWRIGHT_GetText(text.get())));
-    }
-    return names;
-}
-
 // Copies what is on web servers before anything plays: the player reads every item several times. The copies
 // live as long as the result.
 std::vector<std::unique_ptr<CInputContent>> fetchItems(std::vector<SPlayItem>& items) {
@@ -450,7 +441,8 @@ std::vector<std::unique_ptr<CInputContent>> fetchItems(std::vector<SPlayItem>& i
 
 int play(CLibrary& library, const SPlayOptions& options) {
     requireOutDevice();
-    std::vector<SPlayItem> items = listItems(options.inputs, readExtensions(library), options.isRecursive);
+    std::vector<SPlayItem> items =
+        listItems(options.inputs, listReadExtensions(library), options.isRecursive);
     const std::vector<std::unique_ptr<CInputContent>> copies = fetchItems(items);
     if (isCancelled()) return kExitCancelled;
     if (options.isShuffled) std::shuffle(items.begin(), items.end(), std::mt19937(std::random_device()()));

@@ -4,7 +4,6 @@
 #include "base/Translation.h"
 
 #include <algorithm>
-#include <set>
 #include <sys/stat.h>
 #include <utility>
 
@@ -17,16 +16,6 @@ namespace {
 std::string toLower(std::string text) {
     std::transform(text.begin(), text.end(), text.begin(), [](unsigned char c) { return std::tolower(c); });
     return text;
-}
-
-std::set<std::string> listReadExtensions(CLibrary& library) {
-    std::set<std::string> extensions;
-    const CHandle list(library.getValidCodecExtensions(TONEWRIGHT_AUDIO_SOURCE));
-    for (int32_t i = 0; i < library.getExtensionCount(list.get()); ++i) {
-        const CHandle text(library.getExtension(list.get(), i));
-        if (text) extensions.insert("." + toLower(toUTF8(TONEWRIGHT_GetText(text.get()))));
-    }
-    return extensions;
 }
 
 class CFolderWalk {
@@ -49,12 +38,16 @@ public:
             std::error_code none;
             if (fs::is_directory(entry, none))
                 visit(entry, below / entry.filename());
-            else if (fs::is_regular_file(entry, none) && m_extensions.count(toLower(entry.extension())) > 0)
+            else if (fs::is_regular_file(entry, none) && hasExtension(entry))
                 m_found.push_back({entry, below, ""});
         }
     }
 
 private:
+    bool hasExtension(const fs::path& file) const {
+        const std::string extension = toLower(file.extension());
+        return !extension.empty() && m_extensions.count(extension.substr(1)) > 0;
+    }
     // False if the folder has been visited before, under any name.
     bool enter(const fs::path& folder) {
         struct stat status;
@@ -73,6 +66,16 @@ bool isSame(const fs::path& a, const fs::path& b) {
 }
 
 } // namespace
+
+std::set<std::string> listReadExtensions(CLibrary& library) {
+    std::set<std::string> extensions;
+    const CHandle list(library.getValidCodecExtensions(TONEWRIGHT_AUDIO_SOURCE));
+    for (int32_t i = 0; i < library.getExtensionCount(list.get()); ++i) {
+        const CHandle text(library.getExtension(list.get(), i));
+        if (text) extensions.insert(toLower(toUTF8(TONEWRIGHT_GetText(text.get()))));
+    }
+    return extensions;
+}
 
 std::vector<SInputFile> listInputs(CLibrary& library, const std::vector<fs::path>& inputs, bool recursive,
                                    const fs::path& excluded) {

@@ -4,6 +4,7 @@
 #include "library/Library.h"
 
 #include <filesystem>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -14,6 +15,9 @@ struct SInputFile {
     std::filesystem::path below; // its folder, relative to the folder that was named; empty for a named file
     std::string problem;         // why it cannot be used; normally empty
 };
+
+// The extensions of what the library reads, in lower case without points.
+std::set<std::string> listReadExtensions(CLibrary& library);
 
 // Named files come first to last as they are. With `recursive`, folders are replaced by the files in and
 // below them that the library reads, judged by their extensions and in the order of their names; without it,

@@ -52,7 +52,8 @@ CProgress::~CProgress() {
     eraseBars();
 }
 
-CProgress::Job CProgress::start(const std::filesystem::path& input, const std::filesystem::path& output,
+CProgress::Job CProgress::start(const std::filesystem::path& input,
+                                const std::optional<std::filesystem::path>& output,
                                 const nlohmann::json& details) {
     std::lock_guard lock(m_mutex);
     const auto now = Clock::now();
@@ -65,6 +66,7 @@ void CProgress::advance(Job job, double fraction) {
     std::lock_guard lock(m_mutex);
     SJob& entry = m_jobs[job];
     entry.fraction = fraction;
+    entry.running = true;
     const auto now = Clock::now();
     if (m_bars) {
         if (now - m_lastDrawn < kRedraw) return;
@@ -75,7 +77,7 @@ void CProgress::advance(Job job, double fraction) {
         if (now - entry.told < kRedraw) return;
         entry.told = now;
         emit(job, "progress", {{"fraction", fraction}});
-    } else if (m_output == EOutput::normal && now - entry.told >= kPlainLine) {
+    } else if (m_output == EOutput::normal && m_results && now - entry.told >= kPlainLine) {
         entry.told = now;
         std::fprintf(m_results, "%s: %.0f %%\n", name(entry.input).c_str(), fraction * 100);
         flushEvents();
@@ -86,19 +88,57 @@ void CProgress::finish(Job job, const SJobResult& result) {
     std::lock_guard lock(m_mutex);
     m_jobs[job].running = false;
     eraseBars();
-    emit(job, "done",
-         {{"codec", result.codec},
-          {"duration", result.duration},
-          {"seconds", result.elapsed},
-          {"bytes", result.bytes}});
-    char speed[32];
+    nlohmann::json details{{"codec", result.codec},
+                           {"duration", result.duration},
+                           {"seconds", result.elapsed},
+                           {"bytes", result.bytes}};
+    if (result.gain) details["gain"] = *result.gain;
+    emit(job, "done", details);
+    char speed[32], gain[32];
     std::snprintf(speed, sizeof speed, "%.0f", result.duration / std::max(result.elapsed, 1e-6));
-    say(tr("host.Progress.done", "%FILE%: %CODEC%, %DURATION%, %SIZE%, %SPEED% times real time",
-           {{"%FILE%", name(m_jobs[job].output)},
-            {"%CODEC%", result.codec},
-            {"%DURATION%", formatDuration(result.duration)},
-            {"%SIZE%", formatSize(result.bytes)},
-            {"%SPEED%", speed}}));
+    std::snprintf(gain, sizeof gain, "%+.1f", result.gain.value_or(0.0));
+    const std::initializer_list<STextValue> values{{"%FILE%", nameOutput(job)},
+                                                   {"%CODEC%", result.codec},
+                                                   {"%DURATION%", formatDuration(result.duration)},
+                                                   {"%SIZE%", formatSize(result.bytes)},
+                                                   {"%GAIN%", gain},
+                                                   {"%SPEED%", speed}};
+    say(result.gain ? tr("host.Progress.doneWithGain",
+                         "%FILE%: %CODEC%, %DURATION%, %SIZE%, %GAIN% dB, %SPEED% times real time", values)
+                    : tr("host.Progress.done", "%FILE%: %CODEC%, %DURATION%, %SIZE%, %SPEED% times real time",
+                         values));
+    drawBars();
+}
+
+void CProgress::finishWith(Job job, const nlohmann::json& details) {
+    std::lock_guard lock(m_mutex);
+    m_jobs[job].running = false;
+    eraseBars();
+    emit(job, "done", details);
+    drawBars();
+}
+
+void CProgress::pause(Job job) {
+    std::lock_guard lock(m_mutex);
+    m_jobs[job].running = false;
+    eraseBars();
+    drawBars();
+}
+
+void CProgress::announce(const char* event, nlohmann::json details) {
+    std::lock_guard lock(m_mutex);
+    if (m_output != EOutput::json) return;
+    details["event"] = event;
+    std::printf("%s\n", toLine(details).c_str());
+    flushEvents();
+}
+
+void CProgress::print(const std::string& line) {
+    std::lock_guard lock(m_mutex);
+    if (m_output == EOutput::json) return;
+    eraseBars();
+    std::printf("%s\n", line.c_str());
+    flushEvents();
     drawBars();
 }
 
@@ -135,7 +175,7 @@ void CProgress::skip(Job job) {
     m_jobs[job].running = false;
     eraseBars();
     emit(job, "skipped", nlohmann::json::object());
-    say(tr("host.Progress.skipped", "%FILE%: skipped, it exists", {{"%FILE%", name(m_jobs[job].output)}}));
+    say(tr("host.Progress.skipped", "%FILE%: skipped, it exists", {{"%FILE%", nameOutput(job)}}));
     drawBars();
 }
 
@@ -143,12 +183,16 @@ void CProgress::plan(Job job, bool replaces) {
     std::lock_guard lock(m_mutex);
     m_jobs[job].running = false;
     emit(job, "planned", {{"replaces", replaces}});
-    say(name(m_jobs[job].input) + " -> " + name(m_jobs[job].output) +
+    say(name(m_jobs[job].input) + " -> " + nameOutput(job) +
         (replaces ? " " + tr("host.Progress.replaced", "(replaced)") : ""));
 }
 
+std::string CProgress::nameOutput(Job job) const {
+    return name(m_jobs[job].output.value_or(""));
+}
+
 void CProgress::say(const std::string& line) {
-    if (m_output != EOutput::normal) return;
+    if (m_output != EOutput::normal || !m_results) return;
     std::fprintf(m_results, "%s\n", line.c_str());
     flushEvents();
 }
@@ -157,7 +201,7 @@ void CProgress::emit(Job job, const char* event, nlohmann::json details) {
     if (m_output != EOutput::json) return;
     details["event"] = event;
     details["input"] = m_jobs[job].input.native();
-    details["output"] = m_jobs[job].output.native();
+    if (m_jobs[job].output) details["output"] = m_jobs[job].output->native();
     std::printf("%s\n", toLine(details).c_str());
     flushEvents();
 }

@@ -6,6 +6,7 @@
 #include <filesystem>
 #include <mutex>
 #include <nlohmann/json.hpp>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -22,21 +23,31 @@ struct SJobResult {
     double elapsed = 0;  // seconds of processing
     uint64_t bytes = 0;
     std::string codec;
+    std::optional<double> gain = {}; // decibels
 };
 
 // Thread-safe. Results go to standard output; bars, failures and warnings go to standard error. With JSON
 // everything goes to standard output.
 class CProgress {
 public:
-    // `results` receives what would otherwise go to standard output, except for JSON.
+    // `results` receives what would otherwise go to standard output, except for JSON and print(). Null: it is
+    // dropped.
     explicit CProgress(EOutput output, std::FILE* results = stdout);
     ~CProgress();
 
     using Job = size_t;
-    Job start(const std::filesystem::path& input, const std::filesystem::path& output,
+    Job start(const std::filesystem::path& input, const std::optional<std::filesystem::path>& output,
               const nlohmann::json& details);
     void advance(Job job, double fraction);
     void finish(Job job, const SJobResult& result);
+    // Of a job whose result is not a file. The caller prints it.
+    void finishWith(Job job, const nlohmann::json& details);
+    // Hides the job's bar until the next progress.
+    void pause(Job job);
+    // An event that belongs to no job. For JSON only.
+    void announce(const char* event, nlohmann::json details);
+    // A line on standard output; not with JSON.
+    void print(const std::string& line);
     // Reports a problem that does not end the job.
     void warn(Job job, const std::string& reason);
     void fail(Job job, const std::string& reason);
@@ -51,13 +62,14 @@ private:
 
     struct SJob {
         std::filesystem::path input;
-        std::filesystem::path output;
+        std::optional<std::filesystem::path> output;
         double fraction = 0;
         Clock::time_point started;
         Clock::time_point told;
         bool running = true;
     };
 
+    std::string nameOutput(Job job) const;
     void say(const std::string& line);
     void tell(Job job, const char* event, const std::string& reason);
     void emit(Job job, const char* event, nlohmann::json details);
