@@ -5,9 +5,9 @@
 #include "media/InputContent.h"
 
 #include <algorithm>
+#include <cstdlib>
 #include <memory>
 #include <stdexcept>
-#include <thread>
 #include <unistd.h>
 #include <utility>
 
@@ -83,6 +83,22 @@ void addCare(CLI::App& command, SConvertOptions& options) {
     command.add_flag("--prevent-clipping", options.preventClipping,
                      tr("host.help.convert.preventClipping",
                         "Make floating-point sound that exceeds full scale quieter instead of clipping it"));
+    auto* normalize =
+        command.add_flag("--normalize{-18}")
+            ->description(tr("host.help.convert.normalize",
+                             "Bring each output to a loudness of -18 LUFS, or that of --normalize=LUFS;\nthe "
+                             "gain is limited where peaks would exceed -1 dBTP"))
+            ->check(CLI::Validator(isLoudness, ""))
+            ->each([&](const std::string& text) { options.loudness = std::strtod(text.c_str(), nullptr); });
+    command
+        .add_flag("--album", options.oneGain,
+                  tr("host.help.convert.album",
+                     "Give all files the same gain, which brings them to that loudness together"))
+        ->needs(normalize);
+    command
+        .add_flag("--allow-clipping", options.allowClipping,
+                  tr("host.help.convert.allowClipping", "Apply the gain of --normalize without a limit"))
+        ->needs(normalize);
     command.add_flag_callback(
         "--no-tags", [&] { options.carryTags = false; },
         tr("host.help.convert.noTags", "Do not copy title, artist and the other fields of tags"));
@@ -160,13 +176,8 @@ void addConvert(CLI::App& app, Run& run) {
         ->check(CLI::IsMember({"default", "best"}).description(""));
     addExisting(*command, *options);
     addCare(*command, *options);
-    options->jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
-    command
-        ->add_option(
-            "-j,--jobs", options->jobs,
-            tr("host.help.convert.jobs", "Files converted at a time (default: number of processor cores)"))
-        ->option_text("N")
-        ->check(CLI::Range(1, 256));
+    addJobs(*command, options->jobs,
+            tr("host.help.convert.jobs", "Files converted at a time (default: number of processor cores)"));
     addOutput(*command, options->show);
     command->callback([options, command, &run] {
         applyPreset(*command);

@@ -1,27 +1,31 @@
 #include "commands/Convert.h"
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
+#include "base/Parallel.h"
 #include "base/Text.h"
 #include "base/Translation.h"
 #include "commands/ConversionPlan.h"
+#include "commands/ConversionSource.h"
 #include "library/Failure.h"
 #include "media/EncodeJob.h"
+#include "media/GainTags.h"
 #include "media/InputContent.h"
+#include "media/Loudness.h"
 #include "media/Output.h"
 #include "media/SoundFile.h"
+#include "media/Warnings.h"
 
-#include <algorithm>
 #include <atomic>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <fcntl.h>
+#include <memory>
 #include <optional>
-#include <sstream>
 #include <stdexcept>
 #include <sys/stat.h>
 #include <system_error>
-#include <thread>
+#include <utility>
 
 namespace host {
 
@@ -39,87 +43,124 @@ void copyTimes(const fs::path& from, const fs::path& to) {
                                     {{"%REASON%", std::strerror(errno)}}));
 }
 
+// The part of a job's progress that measuring the input takes.
+constexpr double kMeasuring = 0.5;
+
 class CConverter {
 public:
-    CConverter(CLibrary& library, const SConvertOptions& options, CProgress& progress)
-        : m_library(library), m_options(options), m_progress(progress),
-          m_temporaryEnding(setTemporaryEnding(library)) {}
+    CConverter(CLibrary& library, const SConvertOptions& options, const std::vector<SConversion>& plan,
+               CProgress& progress)
+        : m_library(library), m_options(options), m_plan(plan), m_progress(progress),
+          m_temporaryEnding(setTemporaryEnding(library)), m_prepared(plan.size()) {}
 
-    // True if the file was written or may be skipped. Thread-safe.
-    bool run(const SConversion& conversion);
+    // Finds the gain that brings all inputs together to the loudness, if they are to have the same one.
+    void prepareAll();
+    // True if the file was written or may be skipped. Thread-safe for different indices.
+    bool run(size_t index);
     // Prints what run() would do; creates nothing.
-    bool show(const SConversion& conversion);
+    bool show(size_t index);
 
 private:
-    struct SEnds {
-        CHandle source;
-        CHandle format;
+    // What is known of a conversion before it starts.
+    struct SPrepared {
+        std::optional<CProgress::Job> job;
+        std::unique_ptr<CInputContent> content;
+        CHandle measurement;
+        std::string problem;
+    };
+    struct SWritten {
+        double duration;
+        std::optional<double> gain;
     };
 
-    bool convert(const SConversion& conversion, CProgress::Job job);
+    void prepare(size_t index);
+    CProgress::Job start(size_t index);
+    bool convert(size_t index, CProgress::Job job);
+    std::optional<SWritten> write(const SEncodeFiles& files, CProgress::Job job);
     bool isSkipped(const SConversion& conversion) const;
+    CHandle measure(const CConversionSource& source, CProgress::Job job);
+    double chooseGain(const TONEWRIGHT_Loudness& loudness, CProgress::Job job);
     void carryTag(const fs::path& input, const fs::path& temporary, const fs::path& output,
                   CProgress::Job job);
-    void warn(const CHandle& source, const fs::path& input, CProgress::Job job);
-    SEnds openEnds(const fs::path& input, const fs::path& temporary, const fs::path& output);
-    std::vector<SSampleFormat> listCandidates(const SSampleFormat& own) const;
 
     CLibrary& m_library;
     const SConvertOptions& m_options;
+    const std::vector<SConversion>& m_plan;
     CProgress& m_progress;
-    std::string m_temporaryEnding;
+    const std::string m_temporaryEnding;
+    std::vector<SPrepared> m_prepared; // one for each conversion
+    std::optional<double> m_gain;      // of all outputs, in decibels
 };
 
-// The preferred format first, then those that most targets can hold. Values set by the user never change.
-std::vector<SSampleFormat> CConverter::listCandidates(const SSampleFormat& own) const {
-    std::vector<SSampleFormat> candidates;
-    const auto add = [&](int rate, int channels, int bytes) {
-        const SSampleFormat candidate{m_options.rate.value_or(rate), m_options.channels.value_or(channels),
-                                      m_options.bits ? *m_options.bits / 8 : bytes};
-        if (std::find(candidates.begin(), candidates.end(), candidate) == candidates.end())
-            candidates.push_back(candidate);
-    };
-    // Rates that a limited codec may accept: the next higher ones first, a lower one only if there are none.
-    std::vector<int> rates{own.rate};
-    for (int rate : {8000, 11025, 16000, 22050, 32000, 44100, 48000})
-        if (rate > own.rate) rates.push_back(rate);
-    if (rates.size() == 1) rates.push_back(own.rate % 11025 == 0 ? 44100 : 48000);
-    for (int rate : rates)
-        for (int channels : {own.channels, 2, 1})
-            for (int bytes : {own.bytesPerSample, 3, 2})
-                if (channels <= own.channels && bytes <= std::max(own.bytesPerSample, 2))
-                    add(rate, channels, bytes);
-    return candidates;
+CProgress::Job CConverter::start(size_t index) {
+    const SConversion& conversion = m_plan[index];
+    return m_progress.start(conversion.input, conversion.output, nlohmann::json::object());
 }
 
-// Creates a format that the target can hold, and a source that delivers it. The input is opened only once.
-CConverter::SEnds CConverter::openEnds(const fs::path& input, const fs::path& temporary,
-                                       const fs::path& output) {
-    SSoundFile sound = openSoundFile(input);
-    const std::u16string target = toURI(temporary);
-    const std::vector<SSampleFormat> candidates = listCandidates(sound.samples);
-    const auto fits = [&](const SSampleFormat& samples) {
-        return TONEWRIGHT_Host_CanWrite(target.c_str(), samples.rate, samples.channels,
-                                        samples.bytesPerSample) == 1;
-    };
-    const auto found = std::find_if(candidates.begin(), candidates.end(), fits);
-    const SSampleFormat samples = found == candidates.end() ? candidates.front() : *found;
+CHandle CConverter::measure(const CConversionSource& source, CProgress::Job job) {
+    CHandle measurement =
+        source.measure([&](double fraction) { m_progress.advance(job, fraction * kMeasuring); });
+    dropWarnings(source.getSource()); // encoding repeats them
+    return measurement;
+}
 
-    SEnds ends;
-    ends.format = requireFormat(m_library, temporary, samples, m_options, output, output.string());
-    clearFailure();
-    // A width that the user asks for means integers, also where the target could hold floating point.
-    if ((samples != sound.samples || m_options.bits) &&
-        TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels,
-                                        samples.bytesPerSample) != 1)
-        throw std::runtime_error(
-            takeFailure(tr("host.inconvertible", "Cannot be converted from %FROM% to %TO%",
-                           {{"%FROM%", describe(sound.samples)}, {"%TO%", describe(samples)}}),
-                        input));
-    ends.source = std::move(sound.source);
-    if (m_options.salvage) TONEWRIGHT_Host_SetSalvage(ends.source.get(), 1);
-    if (m_options.preventClipping) TONEWRIGHT_Host_SetClippingPrevention(ends.source.get(), 1);
-    return ends;
+void CConverter::prepare(size_t index) {
+    const SConversion& conversion = m_plan[index];
+    SPrepared& prepared = m_prepared[index];
+    if (!conversion.problem.empty()) return;
+    prepared.job = start(index);
+    try {
+        prepared.content = std::make_unique<CInputContent>(conversion.input);
+        if (isCancelled()) return;
+        fs::path target = conversion.output;
+        if (isStandardStream(target)) target = fs::path("output").replace_extension(m_options.extension);
+        CConversionSource source(prepared.content->getPath(), target, m_options);
+        source.deliver();
+        prepared.measurement = measure(source, *prepared.job);
+    } catch (const std::exception& error) {
+        prepared.problem = error.what();
+    }
+    m_progress.pause(*prepared.job);
+}
+
+// Inputs whose outputs are skipped count as well, so that a repeated run finds the same gain.
+void CConverter::prepareAll() {
+    if (!m_options.oneGain || m_options.dryRun) return;
+    runParallel(m_plan.size(), m_options.jobs, [&](size_t index) { prepare(index); });
+    if (isCancelled()) {
+        for (const SPrepared& prepared : m_prepared)
+            if (prepared.job) m_progress.cancel(*prepared.job);
+        return;
+    }
+    std::vector<TONEWRIGHT_Handle> measurements;
+    CProgress::Job loudest = 0;
+    double peak = -1.0;
+    for (SPrepared& prepared : m_prepared) {
+        if (!prepared.measurement) continue;
+        measurements.push_back(prepared.measurement.get());
+        if (const double own = getLoudness({measurements.back()}).truePeak; own > peak) {
+            peak = own;
+            loudest = *prepared.job;
+        }
+    }
+    if (!measurements.empty()) m_gain = chooseGain(getLoudness(measurements), loudest);
+}
+
+double CConverter::chooseGain(const TONEWRIGHT_Loudness& loudness, CProgress::Job job) {
+    if (!isMeasurable(loudness))
+        m_progress.warn(job, tr("host.Convert.notMeasurable",
+                                "The sound is too quiet or too short for its loudness to be measured; its "
+                                "level is not changed"));
+    const SGain gain = findGain(loudness, *m_options.loudness);
+    if (m_options.allowClipping) return gain.wanted;
+    const std::string wanted = formatDecibels(gain.wanted, true),
+                      limited = formatDecibels(gain.limited, true);
+    if (wanted != limited)
+        m_progress.warn(job, tr("host.Convert.limited",
+                                "The gain is limited to %LIMITED% dB instead of %WANTED% dB to prevent "
+                                "clipping (--allow-clipping applies all of it)",
+                                {{"%LIMITED%", limited}, {"%WANTED%", wanted}}));
+    return gain.limited;
 }
 
 // Fields that the output's format cannot hold are omitted with a warning. A tag that cannot be read does not
@@ -147,26 +188,42 @@ void CConverter::carryTag(const fs::path& input, const fs::path& temporary, cons
     TONEWRIGHT_Host_Free(lost);
 }
 
-// Reports the decoder's warnings.
-void CConverter::warn(const CHandle& source, const fs::path& input, CProgress::Job job) {
-    char* const lines = TONEWRIGHT_Host_TakeWarnings(source.get());
-    if (!lines) return;
-    std::istringstream text(lines);
-    TONEWRIGHT_Host_Free(lines);
-    for (std::string line; std::getline(text, line);) m_progress.warn(job, asReason(withPaths(line), input));
-}
-
 bool CConverter::isSkipped(const SConversion& conversion) const {
     std::error_code none;
     return m_options.existing == EExisting::skip && conversion.problem.empty() &&
            !isStandardStream(conversion.output) && fs::is_regular_file(conversion.output, none);
 }
 
+// Empty if Ctrl-C ended it.
+std::optional<CConverter::SWritten> CConverter::write(const SEncodeFiles& files, CProgress::Job job) {
+    CConversionSource source(files.input, files.temporary, m_options);
+    const CHandle format = requireFormat(m_library, files.temporary, source.getSamples(), m_options,
+                                         files.output, files.output.string());
+    source.deliver();
+    SWritten written{m_library.AudioSource_GetDuration(source.getSource().get()), m_gain};
+    if (m_options.loudness && !m_gain) {
+        const CHandle measurement = measure(source, job);
+        if (!measurement) return std::nullopt;
+        written.gain = chooseGain(getLoudness({measurement.get()}), job);
+    }
+    CHandle gained;
+    if (written.gain) gained = source.createGainSource(*written.gain);
+    const bool done = encode(m_library, gained ? gained : source.getSource(), format, m_progress, job, files,
+                             m_temporaryEnding, written.gain ? kMeasuring : 0.0);
+    reportWarnings(source.getSource(), files.input, m_progress, job);
+    if (!done) return std::nullopt;
+    return written;
+}
+
 // False if it did not end with a result, without a reason to report.
-bool CConverter::convert(const SConversion& conversion, CProgress::Job job) {
+bool CConverter::convert(size_t index, CProgress::Job job) {
+    const SConversion& conversion = m_plan[index];
+    const SPrepared prepared = std::exchange(m_prepared[index], {});
     const auto started = std::chrono::steady_clock::now();
-    if (!conversion.problem.empty()) throw std::runtime_error(conversion.problem);
-    const CInputContent content(conversion.input);
+    for (const std::string& problem : {conversion.problem, prepared.problem})
+        if (!problem.empty()) throw std::runtime_error(problem);
+    std::optional<CInputContent> own;
+    const CInputContent& content = prepared.content ? *prepared.content : own.emplace(conversion.input);
     if (isCancelled()) return false;
     const fs::path& input = content.getPath();
 
@@ -188,30 +245,27 @@ bool CConverter::convert(const SConversion& conversion, CProgress::Job job) {
     const fs::path& temporary = place.getTemporary();
     const fs::path& output = conversion.output;
 
-    SEnds ends = openEnds(input, temporary, output);
-    const double duration = m_library.AudioSource_GetDuration(ends.source.get());
-    const bool done = encode(m_library, ends.source, ends.format, m_progress, job, {input, temporary, output},
-                             m_temporaryEnding);
-    warn(ends.source, input, job);
-    ends = {};
-    if (!done) return false;
-    if (m_options.carryTags) carryTag(input, temporary, output, job);
+    const std::optional<SWritten> written = write({input, temporary, output}, job);
+    if (!written) return false;
+    if (m_options.carryTags) {
+        carryTag(input, temporary, output, job);
+        if (written->gain && *written->gain != 0.0) removeGainTags(temporary);
+    }
     const uint64_t bytes = fs::file_size(temporary);
     if (m_options.carryTimes && !isStandardStream(conversion.input)) copyTimes(conversion.input, temporary);
     place.commit();
     if (spool && !copyToStandardOutput(target)) return false;
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
-    m_progress.finish(job, {duration, elapsed.count(), bytes, codecName(target)});
+    m_progress.finish(job, {written->duration, elapsed.count(), bytes, codecName(target), written->gain});
     return true;
 }
 
-bool CConverter::run(const SConversion& conversion) {
-    const CProgress::Job job =
-        m_progress.start(conversion.input, conversion.output, nlohmann::json::object());
+bool CConverter::run(size_t index) {
+    const CProgress::Job job = m_prepared[index].job ? *m_prepared[index].job : start(index);
     try {
-        if (isSkipped(conversion)) {
+        if (isSkipped(m_plan[index])) {
             m_progress.skip(job);
-        } else if (!convert(conversion, job)) {
+        } else if (!convert(index, job)) {
             m_progress.cancel(job);
             return false;
         }
@@ -222,9 +276,9 @@ bool CConverter::run(const SConversion& conversion) {
     }
 }
 
-bool CConverter::show(const SConversion& conversion) {
-    const CProgress::Job job =
-        m_progress.start(conversion.input, conversion.output, nlohmann::json::object());
+bool CConverter::show(size_t index) {
+    const SConversion& conversion = m_plan[index];
+    const CProgress::Job job = start(index);
     try {
         if (isSkipped(conversion)) {
             m_progress.skip(job);
@@ -251,24 +305,13 @@ int convert(CLibrary& library, const SConvertOptions& options) {
     if (!options.resampler.empty()) ::setenv("TONEWRIGHT_RESAMPLER", options.resampler.c_str(), 1);
     const std::vector<SConversion> plan = planConversions(library, options);
     CProgress progress(options.show, isStandardStream(options.output) ? stderr : stdout);
-    CConverter converter(library, options, progress);
+    CConverter converter(library, options, plan, progress);
+    converter.prepareAll();
 
-    std::atomic<size_t> next{0};
     std::atomic<bool> failed{false};
-    const auto work = [&] {
-        for (size_t i; !isCancelled() && (i = next++) < plan.size();)
-            if (!(options.dryRun ? converter.show(plan[i]) : converter.run(plan[i]))) failed = true;
-    };
-    std::vector<std::thread> others;
-    const size_t threads =
-        options.dryRun ? 1 : std::min<size_t>(static_cast<size_t>(options.jobs), plan.size());
-    try {
-        for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
-    } catch (const std::system_error&) {
-        // No more threads available: the existing ones do all the work.
-    }
-    work();
-    for (std::thread& thread : others) thread.join();
+    runParallel(plan.size(), options.dryRun ? 1 : options.jobs, [&](size_t index) {
+        if (!(options.dryRun ? converter.show(index) : converter.run(index))) failed = true;
+    });
     return isCancelled() ? kExitCancelled : failed ? kExitFailure : kExitSuccess;
 }
 

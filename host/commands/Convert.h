@@ -30,7 +30,10 @@ struct SConvertOptions : SFormatOptions {
     bool carryTimes = false;
     bool salvage = false;
     bool preventClipping = false;
-    std::string resampler; // "default" or "best"; empty: as the environment says
+    std::optional<double> loudness; // of the outputs, in LUFS
+    bool oneGain = false;           // ... of all together
+    bool allowClipping = false;     // by the gain for it
+    std::string resampler;          // "default" or "best"; empty: as the environment says
     EOutput show = EOutput::normal;
 };
 

@@ -19,12 +19,14 @@ namespace {
 struct SRunning {
     CProgress& progress;
     CProgress::Job job;
+    double begin;
     bool stopped = false;
 };
 
 int32_t onProgress(double fraction, void* user) {
     auto& running = *static_cast<SRunning*>(user);
-    running.progress.advance(running.job, std::clamp(fraction, 0.0, 1.0));
+    const double done = std::clamp(fraction, 0.0, 1.0);
+    running.progress.advance(running.job, running.begin + done * (1.0 - running.begin));
     running.stopped = isCancelled();
     return running.stopped ? TONEWRIGHT_DISCARD : TONEWRIGHT_CONTINUE;
 }
@@ -69,9 +71,9 @@ CHandle requireFormat(CLibrary& library, const fs::path& temporary, const SSampl
 }
 
 bool encode(CLibrary& library, const CHandle& source, const CHandle& format, CProgress& progress,
-            CProgress::Job job, const SEncodeFiles& files, const std::string& temporaryEnding) {
+            CProgress::Job job, const SEncodeFiles& files, const std::string& temporaryEnding, double begin) {
     clearFailure();
-    SRunning running{progress, job};
+    SRunning running{progress, job, begin};
     int32_t result = TONEWRIGHT_ENCODER_FAILED;
     {
         // Creating the encoder opens the source briefly, which may already fail.

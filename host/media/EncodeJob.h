@@ -25,9 +25,10 @@ struct SEncodeFiles {
     const std::filesystem::path& output;
 };
 
-// Encodes the whole source and reports progress. False if Ctrl-C ended it. Throws std::runtime_error with the
-// reason, in which files have the names that the user gave.
+// Encodes the whole source and reports progress from the fraction `begin` on. False if Ctrl-C ended it.
+// Throws std::runtime_error with the reason, in which files have the names that the user gave.
 bool encode(CLibrary& library, const CHandle& source, const CHandle& format, CProgress& progress,
-            CProgress::Job job, const SEncodeFiles& files, const std::string& temporaryEnding);
+            CProgress::Job job, const SEncodeFiles& files, const std::string& temporaryEnding,
+            double begin = 0.0);
 
 } // namespace host
