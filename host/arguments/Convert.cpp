@@ -146,6 +146,15 @@ void placeOutput(SConvertOptions& options) {
                                    tr("host.Convert.oneInput", "takes one input; use --to for several"));
 }
 
+// "--normalize -14" is an option without a value and an input.
+void checkLoudness(const SConvertOptions& options) {
+    for (const fs::path& input : options.inputs)
+        if (options.loudness && input.native().starts_with('-') && isLoudness(input).empty())
+            throw CLI::ValidationError("--normalize",
+                                       tr("host.Convert.normalizeValue", "takes its value as in %OPTION%",
+                                          {{"%OPTION%", "--normalize=" + input.native()}}));
+}
+
 void checkStandardInput(const SConvertOptions& options) {
     if (std::none_of(options.inputs.begin(), options.inputs.end(), isStandardStream)) return;
     if (options.inputs.size() > 1 || options.output.empty())
@@ -181,6 +190,7 @@ void addConvert(CLI::App& app, Run& run) {
     addOutput(*command, options->show);
     command->callback([options, command, &run] {
         applyPreset(*command);
+        checkLoudness(*options);
         placeOutput(*options);
         checkStandardInput(*options);
         checkBitRates(*options);

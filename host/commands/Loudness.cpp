@@ -21,6 +21,7 @@
 #include <mutex>
 #include <optional>
 #include <stdexcept>
+#include <utility>
 
 namespace host {
 
@@ -85,6 +86,7 @@ private:
 
     CHandle measureItem(const SPlayItem& item, CProgress::Job job);
     void printRow(size_t index, std::string row);
+    void printLine(const std::string& row);
 
     CLibrary& m_library;
     const SLoudnessOptions& m_options;
@@ -97,6 +99,7 @@ private:
     std::mutex m_mutex;                             // guards the members below
     std::vector<std::optional<std::string>> m_rows; // of what is done; empty after a failure
     size_t m_printed = 0;
+    bool m_hasHeader = false;
 };
 
 std::string describeItem(const SPlayItem& item) {
@@ -111,7 +114,13 @@ void CMeter::printRow(size_t index, std::string row) {
     std::lock_guard lock(m_mutex);
     m_rows[index] = std::move(row);
     for (; m_printed < m_rows.size() && m_rows[m_printed]; m_rows[m_printed++]->clear())
-        if (!m_rows[m_printed]->empty()) m_progress.print(*m_rows[m_printed]);
+        if (!m_rows[m_printed]->empty()) printLine(*m_rows[m_printed]);
+}
+
+void CMeter::printLine(const std::string& row) {
+    if (!std::exchange(m_hasHeader, true))
+        m_progress.print(tr("host.Loudness.header", "   LUFS     LU   dBTP    gain  limited  file"));
+    m_progress.print(row);
 }
 
 CHandle CMeter::measureItem(const SPlayItem& item, CProgress::Job job) {
@@ -173,7 +182,7 @@ void CMeter::measureAlbum() {
     nlohmann::json details = toJson(loudness, gain);
     details["files"] = handles.size();
     m_progress.announce("album", details);
-    m_progress.print(formatRow(
+    printLine(formatRow(
         loudness, gain,
         tr("host.Loudness.album", "(all %COUNT% together)", {{"%COUNT%", std::to_string(handles.size())}})));
 }
@@ -201,9 +210,6 @@ int showLoudness(CLibrary& library, const SLoudnessOptions& options) {
     const std::vector<SPlayItem> items =
         listItems(options.inputs, listReadExtensions(library), options.recursive);
     CMeter meter(library, options, items);
-    if (!options.json)
-        std::printf("%s\n",
-                    tr("host.Loudness.header", "   LUFS     LU   dBTP    gain  limited  file").c_str());
     runParallel(items.size(), options.jobs, [&](size_t index) { meter.measure(index); });
     if (isCancelled()) return kExitCancelled;
     if (options.album) meter.measureAlbum();

@@ -84,8 +84,11 @@ TEST_F(Normalize, PeaksLimitTheGainUnlessClippingIsAllowed) {
     write("short.wav", makeTone(8000, 1, 16, 0.3));
     EXPECT_THAT(convert({"short.wav", "-o", "same.wav", "--normalize"}), HasSubstr("too short"));
     EXPECT_TRUE(readWav("same.wav") == readWav("short.wav"));
-    for (const std::vector<std::string>& options :
-         {std::vector<std::string>{"--album"}, {"--allow-clipping"}, {"--normalize=1"}, {"--normalize=x"}}) {
+    for (const std::vector<std::string>& options : {std::vector<std::string>{"--album"},
+                                                    {"--allow-clipping"},
+                                                    {"--normalize=1"},
+                                                    {"--normalize=x"},
+                                                    {"--normalize", "-14"}}) {
         std::vector<std::string> command{"convert", "in.wav", "-o", "never.wav"};
         command.insert(command.end(), options.begin(), options.end());
         EXPECT_EQ(tonewright(command).exitCode, 2);
