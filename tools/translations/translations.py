@@ -28,6 +28,7 @@ COMMON = "common"
 PLACEHOLDERS = {
     "%ARGUMENT%": "what is wrong with an argument of a function",
     "%BITS%": "the number of bits per sample",
+    "%BYTES%": "the number of bytes per sample",
     "%CHANNELS%": "the number of channels",
     "%CODEC%": "the name of a codec, such as FLAC",
     "%DETAIL%": "what is wrong",
@@ -51,6 +52,9 @@ PLACEHOLDERS = {
     "%SPEED%": "a number",
     "%TARGET%": "the name of a class",
     "%TEXT%": "a text that the user has given",
+    "%GAIN%": "a change of the level in decibels, such as +3.2",
+    "%LIMITED%": "a change of the level in decibels, such as +3.2",
+    "%WANTED%": "a change of the level in decibels, such as +3.2",
     "%TITLE%": "the title of a track",
     "%TO%": "a format of sound, such as '44100 Hz, 2 channels and 16 bits'",
     "%CODE%": "the code of a character, such as 0x2A",
