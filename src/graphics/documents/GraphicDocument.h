@@ -1,0 +1,29 @@
+// A design.
+#pragma once
+
+#include "graphics/documents/GraphicContainer.h"
+
+#include <unordered_map>
+
+namespace graphics {
+
+class GRAPHICS_API CGraphicDocument : public CGraphicContainer {
+public:
+    CGraphicDocument() = default;
+    ~CGraphicDocument() override = default;
+
+    // From an original element to its clone.
+    using CloneMap = std::unordered_map<const CGraphicElement*, P<CGraphicElement>>;
+
+    // Clones all elements. A mirror that shows elements of this document shows their clones in the new one.
+    P<CGraphicDocument> Clone() const;
+};
+
+// A document that masks painting.
+class GRAPHICS_API CGraphicDocumentMask : public CGraphicContainer {
+public:
+    CGraphicDocumentMask() = default;
+    ~CGraphicDocumentMask() override = default;
+};
+
+} // namespace graphics

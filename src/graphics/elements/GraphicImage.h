@@ -1,0 +1,39 @@
+// A picture.
+#pragma once
+
+#include "graphics/elements/Bitmap.h"
+#include "graphics/elements/GraphicElement.h"
+#include "graphics/elements/ScaleMargins.h"
+
+namespace graphics {
+
+class GRAPHICS_API CGraphicImage : public CGraphicElement {
+public:
+    CGraphicImage();
+    ~CGraphicImage() override = default;
+
+    bool HasResource() const override { return true; }
+    P<CGraphicElement> Clone() const override; // shares the bitmap
+    void Assign(const CGraphicElement& other) override;
+    GraphicElementType GetType() const override { return GraphicElementType::image; }
+    void Reset() override;
+
+    const P<CBitmap>& GetBitmap() const { return m_bitmap; } // may be empty
+    void SetBitmap(const P<CBitmap>& bitmap);
+    // A path, or empty for an image that does not come from a file.
+    const std::string& GetFileName() const { return m_fileName; }
+    void SetFileName(const std::string& fileName) { m_fileName = fileName; }
+    const SScaleMargins& GetScaleMargins() const { return m_scaleMargins; }
+    void SetScaleMargins(const SScaleMargins& margins);
+    // Paints the bitmap centered at 96 dpi instead of filling the box.
+    bool IsNoScale() const { return m_isNoScale; }
+    void SetNoScale(bool isNoScale);
+
+private:
+    P<CBitmap> m_bitmap;
+    std::string m_fileName;
+    SScaleMargins m_scaleMargins;
+    bool m_isNoScale = false;
+};
+
+} // namespace graphics

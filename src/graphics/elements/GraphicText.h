@@ -1,0 +1,62 @@
+// Rich text in a box and on a circle.
+#pragma once
+
+#include "graphics/elements/GraphicElement.h"
+#include "graphics/elements/RichText.h"
+
+namespace graphics {
+
+enum class EVerticalPlacement { top = 0, center = 1, bottom = 2 };
+
+class GRAPHICS_API CGraphicText : public CGraphicElement {
+public:
+    CGraphicText();
+    ~CGraphicText() override = default;
+
+    bool HasResource() const override { return true; }
+    std::string GetHint() const override;
+    P<CGraphicElement> Clone() const override;
+    void Assign(const CGraphicElement& other) override;
+    GraphicElementType GetType() const override { return GraphicElementType::text; }
+    void Reset() override { SetText(nullptr); }
+
+    // Empty if there is no text.
+    const P<CRichText>& GetText() const { return m_text; }
+    void SetText(const P<CRichText>& text);
+    EVerticalPlacement GetVerticalPlacement() const { return m_placement; }
+    void SetVerticalPlacement(EVerticalPlacement placement);
+
+private:
+    P<CRichText> m_text;
+    EVerticalPlacement m_placement = EVerticalPlacement::top;
+};
+
+enum class ECircleType { concav, convex };
+
+// Throws CError for an unknown value.
+GRAPHICS_API std::string CircleTypeToXml(ECircleType type);
+// Throws CError for an unknown text.
+GRAPHICS_API ECircleType CircleTypeFromXml(std::string_view text);
+
+// Text on the largest circle in its box. Width and height are equal: the smaller value of what is set.
+class GRAPHICS_API CGraphicTextCircle : public CGraphicText {
+public:
+    CGraphicTextCircle() = default;
+    ~CGraphicTextCircle() override = default;
+
+    void SetSize(double width, double height) override;
+    void SetBoundingSize(double width, double height) override;
+    // The circle's box, which does not depend on the rotation.
+    SSize GetBoundingSize() const override;
+    P<CGraphicElement> Clone() const override;
+    void Assign(const CGraphicElement& other) override;
+    GraphicElementType GetType() const override { return GraphicElementType::textCircle; }
+
+    ECircleType GetCircleType() const { return m_circleType; }
+    void SetCircleType(ECircleType type);
+
+private:
+    ECircleType m_circleType = ECircleType::convex;
+};
+
+} // namespace graphics
