@@ -21,6 +21,7 @@ pkg_check_modules(LIBBURN REQUIRED libburn-1)
 pkg_check_modules(LIBISOFS REQUIRED libisofs-1)
 pkg_check_modules(ZLIB REQUIRED IMPORTED_TARGET zlib)
 pkg_check_modules(EBUR128 REQUIRED IMPORTED_TARGET libebur128)
+pkg_check_modules(CAIRO REQUIRED IMPORTED_TARGET cairo cairo-pdf cairo-svg)
 
 find_path(LAME_INCLUDE_DIR lame/lame.h REQUIRED)
 find_library(LAME_LIBRARY mp3lame REQUIRED)

@@ -41,8 +41,12 @@ void CGraphicContainer::Clear() {
 }
 
 void CGraphicContainer::PaintElements(CPaintContext& context) const {
+    PaintElements(context, {});
+}
+
+void CGraphicContainer::PaintElements(CPaintContext& context, const GraphicFilter& filter) const {
     for (const auto& element : m_elements)
-        if (element->IsVisible()) element->Paint(context);
+        if (element->IsVisible() && (!filter || filter(*element))) element->Paint(context);
 }
 
 const SRect& CGraphicContainer::GetBoundingBox() {

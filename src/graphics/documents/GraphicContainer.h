@@ -9,6 +9,9 @@
 
 namespace graphics {
 
+// Selects the elements that take part in an operation.
+using GraphicFilter = std::function<bool(const CGraphicElement&)>;
+
 // The first element is painted first, at the bottom. Interface thread only.
 class GRAPHICS_API CGraphicContainer : public IGraphicListener {
 public:
@@ -25,8 +28,9 @@ public:
     virtual void UpdateBoundingBox();
     // Removes all elements and the content box.
     virtual void Clear();
-    // Paints the visible elements.
+    // Paints the visible elements, first to last. The second form leaves out those that the filter rejects.
     virtual void PaintElements(CPaintContext& context) const;
+    void PaintElements(CPaintContext& context, const GraphicFilter& filter) const;
 
     int GetUpdateCount() const { return m_updateCount; }
     // Recomputed if an element has changed, unless an update is in progress. Empty without elements.

@@ -1,6 +1,7 @@
 #include "graphics/documents/GraphicDocument.h"
 
 #include "graphics/elements/GraphicMirror.h"
+#include "graphics/painting/PaintContext.h"
 
 namespace graphics {
 
@@ -30,6 +31,25 @@ P<CGraphicDocument> CGraphicDocument::Clone() const {
     }
     copy->EndUpdate();
     return copy;
+}
+
+SRect CGraphicDocument::GetSourceBox() {
+    return GetContentBox() ? *GetContentBox() : GetBoundingBox();
+}
+
+void CGraphicDocument::Paint(CPaintContext& context, const SRect& target) {
+    Paint(context, target, {});
+}
+
+void CGraphicDocument::Paint(CPaintContext& context, const SRect& target, const GraphicFilter& filter) {
+    const SRect source = GetSourceBox();
+    if (source.width == 0 || source.height == 0) return;
+    const SPoint from = source.getCenter(), to = target.getCenter();
+    const CPaintContext::CScope scope(
+        context, CMatrix::translation(to.x, to.y) *
+                     CMatrix::scaling(target.width / source.width, target.height / source.height) *
+                     CMatrix::translation(-from.x, -from.y));
+    PaintElements(context, filter);
 }
 
 } // namespace graphics

@@ -17,6 +17,12 @@ public:
 
     // Clones all elements. A mirror that shows elements of this document shows their clones in the new one.
     P<CGraphicDocument> Clone() const;
+
+    // The content box, or the bounding box of a document without one.
+    SRect GetSourceBox();
+    // Stretches the source box to the target, in the coordinates of the context's matrix.
+    void Paint(CPaintContext& context, const SRect& target);
+    void Paint(CPaintContext& context, const SRect& target, const GraphicFilter& filter);
 };
 
 // A document that masks painting.

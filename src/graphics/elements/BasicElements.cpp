@@ -2,6 +2,7 @@
 
 #include "graphics/elements/CloneAs.h"
 
+#include "graphics/painting/PaintContext.h"
 #include <cmath>
 
 namespace graphics {
@@ -36,10 +37,12 @@ double CGraphicFilled::GetOverhang() const {
 
 void CGraphicFilled::SetBrush(const SBrush& brush) {
     m_brush = brush;
+    DropHitMask();
 }
 
 void CGraphicFilled::SetPen(const SPen& pen) {
     m_pen = pen;
+    DropHitMask();
 }
 
 bool CGraphicCircle::ContainsPoint(double x, double y) const {
@@ -88,6 +91,32 @@ void CGraphicLabel::Assign(const CGraphicElement& other) {
         m_colour = same->m_colour;
     }
     CGraphicElement::Assign(other);
+}
+
+void CGraphicPaper::PaintContent(CPaintContext& context) const {
+    if (context.GetOutputKind() != EOutputKind::screen) return;
+    const SRect rect = GetLocalRect();
+    const double pixel = 1 / context.GetMatrix().getMeanScale();
+    SPen shadow{{100, 100, 100, 255}, kStyleSolid, pixel};
+    const SFill fill{{{240, 240, 240, 255}}, {}, {}};
+    context.GetGraphics().DrawPath(CPath::rectangle(rect), &fill, &shadow);
+    for (const double offset : {pixel, 2 * pixel}) {
+        CPath line;
+        line.MoveTo({rect.getRight() + offset, rect.top + offset});
+        line.LineTo({rect.getRight() + offset, rect.getBottom() + offset});
+        line.LineTo({rect.left + offset, rect.getBottom() + offset});
+        context.GetGraphics().DrawPath(line, nullptr, &shadow);
+    }
+}
+
+void CGraphicCircle::PaintContent(CPaintContext& context) const {
+    const SFill fill{GetBrush(), {}, {}};
+    context.GetGraphics().DrawPath(CPath::ellipse(GetCircleRect()), &fill, &GetPen());
+}
+
+void CGraphicRectangle::PaintContent(CPaintContext& context) const {
+    const SFill fill{GetBrush(), {}, {}};
+    context.GetGraphics().DrawPath(CPath::rectangle(GetLocalRect()), &fill, &GetPen());
 }
 
 } // namespace graphics

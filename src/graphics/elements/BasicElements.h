@@ -14,6 +14,9 @@ public:
 
     P<CGraphicElement> Clone() const override;
     GraphicElementType GetType() const override { return GraphicElementType::paper; }
+
+protected:
+    void PaintContent(CPaintContext& context) const override;
 };
 
 // One vertex of a free form; paints nothing.
@@ -67,6 +70,9 @@ public:
     GraphicElementType GetType() const override { return GraphicElementType::circle; }
     Polygon GetOutline() const override;
 
+protected:
+    void PaintContent(CPaintContext& context) const override;
+
 private:
     SRect GetCircleRect() const;
 };
@@ -78,6 +84,9 @@ public:
 
     P<CGraphicElement> Clone() const override;
     GraphicElementType GetType() const override { return GraphicElementType::rectangle; }
+
+protected:
+    void PaintContent(CPaintContext& context) const override;
 };
 
 class GRAPHICS_API CGraphicStateButton : public CGraphicElement {

@@ -88,7 +88,7 @@ public:
     bool HasListener(const IGraphicListener* listener) const;
 
 protected:
-    void NotifyChanged();
+    virtual void NotifyChanged();
     // Everything but the listeners. Notifies.
     void AssignBase(const CGraphicBase& other);
 

@@ -1,6 +1,9 @@
 #include "graphics/elements/GraphicElement.h"
 
 #include "graphics/elements/IdGenerator.h"
+#include "graphics/painting/OffScreen.h"
+#include "graphics/painting/PaintContext.h"
+#include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
 
 #include <cmath>
@@ -14,6 +17,12 @@ int64_t makeUnique() {
     // In files, 0 marks an element that is not shared.
     const int64_t id = s_ids.GetNext();
     return id > 0 ? id : s_ids.GetNext();
+}
+
+bool isNear(const SRect& a, const SRect& b) {
+    constexpr double kTolerance = 0.001;
+    return std::abs(a.left - b.left) <= kTolerance && std::abs(a.top - b.top) <= kTolerance &&
+           std::abs(a.width - b.width) <= kTolerance && std::abs(a.height - b.height) <= kTolerance;
 }
 
 bool isOutlined(GraphicElementType type) {
@@ -34,6 +43,49 @@ CGraphicElement::~CGraphicElement() = default;
 std::string CGraphicElement::GetDisplayName() const {
     const std::string name = GetName();
     return name.empty() ? GetGraphicTypeName(GetType()) : name;
+}
+
+void CGraphicElement::SetMirrored(EAxis axis, bool isMirrored) {
+    CGraphicBase::SetMirrored(axis, isMirrored);
+    DropHitMask();
+}
+
+void CGraphicElement::NotifyChanged() {
+    DropHitMask();
+    CGraphicBase::NotifyChanged();
+}
+
+void CGraphicElement::Paint(CPaintContext& context) const {
+    const CPaintContext::CScope scope(context, GetContentMatrix(), m_isColoured);
+    if (context.CanSee(GetLocalRect().inflated(GetOverhang()))) PaintContent(context);
+}
+
+void CGraphicElement::PaintContent(CPaintContext&) const {}
+
+void CGraphicElement::UpdateHitMask(const CMatrix& matrix) {
+    const SRect box = (matrix * GetContentMatrix()).getBounds(GetLocalRect().inflated(GetOverhang()));
+    if (m_hitMask && isNear(m_hitMask->box, box)) return;
+    const double left = std::floor(box.left), top = std::floor(box.top);
+    const double width = std::ceil(box.getRight()) - left, height = std::ceil(box.getBottom()) - top;
+    // Far from the limits of int, and false for NaN.
+    if (!(std::abs(left) < 1e9 && std::abs(top) < 1e9 && width < 1e9 && height < 1e9))
+        throw peru::CInvalidArgError("matrix", "UpdateHitMask", P<peru::IBase>::share(this));
+    COffScreen picture(std::max(int64_t{1}, static_cast<int64_t>(width)),
+                       std::max(int64_t{1}, static_cast<int64_t>(height)));
+    CPaintContext context(picture.GetGraphics(), CMatrix::translation(-left, -top) * matrix);
+    Paint(context);
+    auto mask = std::make_unique<SHitMask>();
+    mask->box = box;
+    mask->left = static_cast<int>(left);
+    mask->top = static_cast<int>(top);
+    mask->width = picture.GetWidth();
+    mask->height = picture.GetHeight();
+    mask->alpha.reserve(static_cast<size_t>(mask->width) * static_cast<size_t>(mask->height));
+    for (int y = 0; y < mask->height; ++y) {
+        const uint32_t* const row = picture.GetRow(y);
+        for (int x = 0; x < mask->width; ++x) mask->alpha.push_back(static_cast<uint8_t>(row[x] >> 24));
+    }
+    m_hitMask = std::move(mask);
 }
 
 std::string CGraphicElement::GetHint() const {
@@ -58,11 +110,12 @@ void CGraphicElement::Assign(const CGraphicElement& other) {
     m_contentIndex = other.m_contentIndex;
     m_textId = other.m_textId;
     m_hintText = other.m_hintText;
+    m_typeName = other.m_typeName;
     AssignBase(other);
 }
 
 std::string CGraphicElement::GetTypeName() const {
-    return {};
+    return m_typeName;
 }
 
 void CGraphicElement::SetColoured(bool isColoured) {

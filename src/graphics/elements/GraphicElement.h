@@ -3,8 +3,10 @@
 
 #include "graphics/elements/GraphicBase.h"
 #include "graphics/elements/GraphicElementType.h"
+#include "graphics/elements/HitMask.h"
 #include "graphics/geometry/Polygon.h"
 
+#include <memory>
 #include <set>
 
 namespace graphics {
@@ -22,15 +24,24 @@ public:
     // Above 0, different for each element of the process.
     int64_t GetUnique() const { return m_unique; }
 
+    void SetMirrored(EAxis axis, bool isMirrored) override;
+    // Applies placement, mirrors and colour, then paints the content. Elements that cannot be seen cost
+    // little.
+    void Paint(CPaintContext& context) const override;
+
     virtual std::string GetHint() const;
     // Whether a point of model space lies in the rotated rectangle; the edges belong to it.
     virtual bool ContainsPoint(double x, double y) const;
+    // Paints the element's alpha for a transform from model space to pixels, unless the mask at hand was made
+    // for the same box. Throws CError if the box has more than 100 million pixels.
+    virtual void UpdateHitMask(const CMatrix& matrix);
     // A deep copy with a unique value of its own and without listeners.
     virtual P<CGraphicElement> Clone() const = 0;
     // Copies the common fields; each class adds its own, provided that the other element has its class.
     virtual void Assign(const CGraphicElement& other);
     virtual GraphicElementType GetType() const = 0;
-    // The name that an IGraphicElementFactory knows; empty for the classes of this module.
+    // The name that an IGraphicElementFactory knows; by default empty, or the name that a file has for an
+    // element of a class that this program does not know.
     virtual std::string GetTypeName() const;
     virtual void SetColoured(bool isColoured);
     virtual bool IsColoured() const;
@@ -64,11 +75,19 @@ public:
     void SetContentId(const std::string& id) { m_contentId = id; }
     int32_t GetContentIndex() const { return m_contentIndex; }
     void SetContentIndex(int32_t index) { m_contentIndex = index; }
+    void SetTypeName(const std::string& name) { m_typeName = name; }
     const std::string& GetTextId() const { return m_textId; }
     void SetTextId(const std::string& id) { m_textId = id; }
     const std::string& GetHintText() const { return m_hintText; }
 
+    // Null before UpdateHitMask().
+    const SHitMask* GetHitMask() const { return m_hitMask.get(); }
+    void DropHitMask() { m_hitMask.reset(); }
+
 protected:
+    void NotifyChanged() override;
+    // In local coordinates: the origin is the center.
+    virtual void PaintContent(CPaintContext& context) const;
     // From local coordinates to model space, mirrors included.
     CMatrix GetContentMatrix() const;
     // The rectangle in local coordinates, around the origin.
@@ -83,6 +102,8 @@ private:
     int32_t m_contentIndex = 0;
     std::string m_textId;
     std::string m_hintText;
+    std::string m_typeName;
+    std::unique_ptr<SHitMask> m_hitMask;
     const int64_t m_unique;
 };
 

@@ -1,6 +1,9 @@
 #include "graphics/elements/GraphicImage.h"
 
 #include "graphics/elements/CloneAs.h"
+#include "graphics/painting/PaintContext.h"
+
+#include <cmath>
 
 namespace graphics {
 
@@ -29,14 +32,78 @@ void CGraphicImage::Reset() {
 
 void CGraphicImage::SetBitmap(const P<CBitmap>& bitmap) {
     m_bitmap = bitmap;
+    DropHitMask();
 }
 
 void CGraphicImage::SetScaleMargins(const SScaleMargins& margins) {
     m_scaleMargins = margins;
+    DropHitMask();
 }
 
 void CGraphicImage::SetNoScale(bool isNoScale) {
     m_isNoScale = isNoScale;
+    DropHitMask();
+}
+
+namespace {
+
+constexpr double kMillimetresPerPixel = 25.4 / 96; // of a bitmap at its own size
+
+// The borders of three strips of one axis, in pixels of the bitmap and in millimetres of the target.
+struct SStrips {
+    double source[4];
+    double target[4];
+};
+
+// The outer strips have the size of the margins times their factors; the inner one gets the rest. Margins
+// that do not fit are reduced in proportion.
+SStrips divide(int pixels, double begin, double length, double low, double high, double lowFactor,
+               double highFactor) {
+    const auto fit = [](double& first, double& second, double room) {
+        first = std::max(0.0, first);
+        second = std::max(0.0, second);
+        const double sum = first + second;
+        if (sum > room) {
+            first *= room / sum;
+            second *= room / sum;
+        }
+    };
+    double lowPixels = low / kMillimetresPerPixel, highPixels = high / kMillimetresPerPixel;
+    double lowTarget = low * lowFactor, highTarget = high * highFactor;
+    fit(lowPixels, highPixels, pixels);
+    lowPixels = std::round(lowPixels);
+    highPixels = std::min(std::round(highPixels), pixels - lowPixels);
+    fit(lowTarget, highTarget, length);
+    return {{0, lowPixels, pixels - highPixels, static_cast<double>(pixels)},
+            {begin, begin + lowTarget, begin + length - highTarget, begin + length}};
+}
+
+} // namespace
+
+void CGraphicImage::PaintContent(CPaintContext& context) const {
+    if (!m_bitmap) return;
+    const SRect box = GetLocalRect();
+    const double width = m_bitmap->GetWidth(), height = m_bitmap->GetHeight();
+    IGraphicsContext& graphics = context.GetGraphics();
+    if (m_isNoScale) {
+        graphics.PushClip(box);
+        graphics.DrawBitmap(
+            *m_bitmap, {0, 0, width, height},
+            SRect::fromCenter({}, {width * kMillimetresPerPixel, height * kMillimetresPerPixel}));
+        graphics.PopClip();
+        return;
+    }
+    const SScaleMargins& margins = m_scaleMargins;
+    const SStrips x = divide(m_bitmap->GetWidth(), box.left, box.width, margins.left, margins.right,
+                             margins.leftFactor, margins.rightFactor);
+    const SStrips y = divide(m_bitmap->GetHeight(), box.top, box.height, margins.top, margins.bottom,
+                             margins.topFactor, margins.bottomFactor);
+    for (int row = 0; row < 3; ++row)
+        for (int col = 0; col < 3; ++col)
+            graphics.DrawBitmap(
+                *m_bitmap,
+                SRect::fromEdges(x.source[col], y.source[row], x.source[col + 1], y.source[row + 1]),
+                SRect::fromEdges(x.target[col], y.target[row], x.target[col + 1], y.target[row + 1]));
 }
 
 } // namespace graphics

@@ -29,6 +29,9 @@ public:
     bool IsNoScale() const { return m_isNoScale; }
     void SetNoScale(bool isNoScale);
 
+protected:
+    void PaintContent(CPaintContext& context) const override;
+
 private:
     P<CBitmap> m_bitmap;
     std::string m_fileName;

@@ -2,6 +2,7 @@
 
 #include "graphics/elements/CloneAs.h"
 
+#include "graphics/painting/PaintContext.h"
 #include <cmath>
 
 namespace graphics {
@@ -63,6 +64,7 @@ void CGraphicLine::SetLine(SPoint start, SPoint end) {
 
 void CGraphicLine::SetPen(const SPen& pen) {
     m_pen = pen;
+    DropHitMask();
 }
 
 SPoint CGraphicLine::GetLocalStart() const {
@@ -103,6 +105,39 @@ P<CGraphicElement> CGraphicDimension::Clone() const {
 
 double CGraphicDimension::GetOverhang() const {
     return kHalfBar + CGraphicLine::GetOverhang();
+}
+
+void CGraphicLine::PaintContent(CPaintContext& context) const {
+    CPath path;
+    path.MoveTo(GetLocalStart());
+    path.LineTo(GetLocalEnd());
+    context.GetGraphics().DrawPath(path, nullptr, &m_pen);
+}
+
+void CGraphicArrow::PaintContent(CPaintContext& context) const {
+    const Polygon head = GetHead();
+    if (head.empty()) return;
+    // The line ends inside the head, so that its blunt end does not cover the tip.
+    CPath line;
+    line.MoveTo(GetLocalStart());
+    line.LineTo({(head[1].x + head[2].x) * 0.5, (head[1].y + head[2].y) * 0.5});
+    context.GetGraphics().DrawPath(line, nullptr, &GetPen());
+    const SFill fill{{GetPen().colour, GetPen().isVisible() ? kStyleSolid : kStyleTransparent}, {}, {}};
+    context.GetGraphics().DrawPath(CPath::polygon(head), &fill, nullptr);
+}
+
+void CGraphicDimension::PaintContent(CPaintContext& context) const {
+    CGraphicLine::PaintContent(context);
+    const SPoint start = GetLocalStart(), end = GetLocalEnd();
+    const double length = std::hypot(end.x - start.x, end.y - start.y);
+    if (!(length > 0)) return;
+    const SPoint across{-(end.y - start.y) / length * kHalfBar, (end.x - start.x) / length * kHalfBar};
+    for (const SPoint& point : {start, end}) {
+        CPath bar;
+        bar.MoveTo({point.x - across.x, point.y - across.y});
+        bar.LineTo({point.x + across.x, point.y + across.y});
+        context.GetGraphics().DrawPath(bar, nullptr, &GetPen());
+    }
 }
 
 } // namespace graphics

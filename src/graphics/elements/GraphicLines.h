@@ -28,6 +28,7 @@ public:
     void SetPen(const SPen& pen);
 
 protected:
+    void PaintContent(CPaintContext& context) const override;
     // In local coordinates.
     SPoint GetLocalStart() const;
     SPoint GetLocalEnd() const;
@@ -51,6 +52,9 @@ public:
     // Tip and two corners, in local coordinates; empty for an arrow without length.
     Polygon GetHead() const;
 
+protected:
+    void PaintContent(CPaintContext& context) const override;
+
 private:
     double GetHeadLength() const;
 };
@@ -64,6 +68,9 @@ public:
     P<CGraphicElement> Clone() const override;
     GraphicElementType GetType() const override { return GraphicElementType::dimension; }
     double GetOverhang() const override;
+
+protected:
+    void PaintContent(CPaintContext& context) const override;
 };
 
 } // namespace graphics

@@ -21,6 +21,9 @@ public:
     const P<CGraphicDocument>& GetDocument() const { return m_document; } // may be empty
     void SetDocument(const P<CGraphicDocument>& document);
 
+protected:
+    void PaintContent(CPaintContext& context) const override;
+
 private:
     P<CGraphicDocument> m_document;
 };

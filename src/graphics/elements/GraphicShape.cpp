@@ -2,6 +2,7 @@
 
 #include "graphics/documents/FreeForm.h"
 #include "graphics/elements/CloneAs.h"
+#include "graphics/painting/PaintContext.h"
 
 namespace graphics {
 
@@ -47,18 +48,43 @@ double CGraphicShape::GetOverhang() const {
 
 void CGraphicShape::SetShapeType(EShapeType type) {
     m_type = type;
+    DropHitMask();
 }
 
 void CGraphicShape::SetGradient(const SGradient& gradient) {
     m_gradient = gradient;
+    DropHitMask();
 }
 
 void CGraphicShape::SetCornerRadius(double radius) {
     m_cornerRadius = radius;
+    DropHitMask();
 }
 
 void CGraphicShape::SetFreeForm(const P<CFreeForm>& freeForm) {
     m_freeForm = freeForm;
+    DropHitMask();
+}
+
+void CGraphicShape::PaintContent(CPaintContext& context) const {
+    const SRect rect = GetLocalRect();
+    CPath path;
+    switch (m_type) {
+    case EShapeType::rectangle:
+        path = CPath::rectangle(rect);
+        break;
+    case EShapeType::ellipse:
+        path = CPath::ellipse(rect);
+        break;
+    case EShapeType::roundedRectangle:
+        path = CPath::roundedRectangle(rect, m_cornerRadius);
+        break;
+    case EShapeType::freeForm:
+        if (m_freeForm) path = CPath::polygon(m_freeForm->GetPolygon(rect));
+        break;
+    }
+    const SFill fill{GetBrush(), m_gradient, rect};
+    context.GetGraphics().DrawPath(path, &fill, &GetPen());
 }
 
 } // namespace graphics

@@ -30,6 +30,9 @@ public:
     const P<CFreeForm>& GetFreeForm() const { return m_freeForm; } // may be empty
     void SetFreeForm(const P<CFreeForm>& freeForm);
 
+protected:
+    void PaintContent(CPaintContext& context) const override;
+
 private:
     EShapeType m_type = EShapeType::rectangle;
     SGradient m_gradient;

@@ -133,6 +133,7 @@ void CGraphicTable::InsertRows(int row, int count) {
     }
     m_rows.insert(m_rows.begin() + row, rows.begin(), rows.end());
     m_cells.insert(m_cells.begin() + row, cells.begin(), cells.end());
+    DropHitMask();
 }
 
 void CGraphicTable::InsertCols(int col, int count) {
@@ -153,18 +154,21 @@ void CGraphicTable::InsertCols(int col, int count) {
         line.insert(line.begin() + col, cells.begin(), cells.end());
     }
     m_cols.insert(m_cols.begin() + col, cols.begin(), cols.end());
+    DropHitMask();
 }
 
 void CGraphicTable::DeleteRows(int row, int count) {
     checkRange("DeleteRows", row, count, GetRowCount());
     m_rows.erase(m_rows.begin() + row, m_rows.begin() + row + count);
     m_cells.erase(m_cells.begin() + row, m_cells.begin() + row + count);
+    DropHitMask();
 }
 
 void CGraphicTable::DeleteCols(int col, int count) {
     checkRange("DeleteCols", col, count, GetColCount());
     m_cols.erase(m_cols.begin() + col, m_cols.begin() + col + count);
     for (auto& line : m_cells) line.erase(line.begin() + col, line.begin() + col + count);
+    DropHitMask();
 }
 
 void CGraphicTable::ExchangeRows(int first, int second) {
@@ -172,6 +176,7 @@ void CGraphicTable::ExchangeRows(int first, int second) {
     checkRange("ExchangeRows", second, 1, GetRowCount());
     std::swap(m_rows[static_cast<size_t>(first)], m_rows[static_cast<size_t>(second)]);
     std::swap(m_cells[static_cast<size_t>(first)], m_cells[static_cast<size_t>(second)]);
+    DropHitMask();
 }
 
 void CGraphicTable::ExchangeCols(int first, int second) {
@@ -179,21 +184,25 @@ void CGraphicTable::ExchangeCols(int first, int second) {
     checkRange("ExchangeCols", second, 1, GetColCount());
     std::swap(m_cols[static_cast<size_t>(first)], m_cols[static_cast<size_t>(second)]);
     for (auto& line : m_cells) std::swap(line[static_cast<size_t>(first)], line[static_cast<size_t>(second)]);
+    DropHitMask();
 }
 
 void CGraphicTable::SetColWidth(int col, double width) {
     GetCol(col).width = width;
     for (auto& line : m_cells) line[static_cast<size_t>(col)]->InvalidateLayout();
+    DropHitMask();
 }
 
 void CGraphicTable::SetRowHeight(int row, double height) {
     GetRow(row).height = height;
+    DropHitMask();
 }
 
 void CGraphicTable::SetCellText(int row, int col, const P<CRichText>& text) {
     CCell& cell = GetCell(row, col);
     cell.text = text;
     cell.InvalidateLayout();
+    DropHitMask();
 }
 
 void CGraphicTable::ClearCells() {
@@ -202,6 +211,7 @@ void CGraphicTable::ClearCells() {
             cell->text.reset();
             cell->InvalidateLayout();
         }
+    DropHitMask();
 }
 
 double CGraphicTable::GetTotalWidth() const {

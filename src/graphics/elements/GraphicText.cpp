@@ -30,10 +30,12 @@ void CGraphicText::Assign(const CGraphicElement& other) {
 
 void CGraphicText::SetText(const P<CRichText>& text) {
     m_text = text;
+    DropHitMask();
 }
 
 void CGraphicText::SetVerticalPlacement(EVerticalPlacement placement) {
     m_placement = placement;
+    DropHitMask();
 }
 
 std::string CircleTypeToXml(ECircleType type) {
@@ -72,6 +74,7 @@ void CGraphicTextCircle::Assign(const CGraphicElement& other) {
 
 void CGraphicTextCircle::SetCircleType(ECircleType type) {
     m_circleType = type;
+    DropHitMask();
 }
 
 } // namespace graphics

@@ -1,0 +1,156 @@
+#include "graphics/painting/CairoContext.h"
+
+#include <cmath>
+#include <memory>
+
+namespace graphics {
+
+namespace {
+
+using Pattern = std::unique_ptr<cairo_pattern_t, decltype(&cairo_pattern_destroy)>;
+using Surface = std::unique_ptr<cairo_surface_t, decltype(&cairo_surface_destroy)>;
+
+void setColour(cairo_t* cairo, const SColour& colour) {
+    cairo_set_source_rgba(cairo, colour.red / 255.0, colour.green / 255.0, colour.blue / 255.0,
+                          colour.alpha / 255.0);
+}
+
+void addStop(cairo_pattern_t* pattern, double offset, const SColour& colour) {
+    cairo_pattern_add_color_stop_rgba(pattern, offset, colour.red / 255.0, colour.green / 255.0,
+                                      colour.blue / 255.0, colour.alpha / 255.0);
+}
+
+void setDashes(cairo_t* cairo, const SPen& pen) {
+    const double w = pen.width;
+    const double dot[] = {w, 2 * w}, longDash[] = {6 * w, 3 * w}, shortDash[] = {3 * w, 3 * w},
+                 dotDash[] = {3 * w, 3 * w, w, 3 * w};
+    switch (pen.style) {
+    case kStyleDot:
+        return cairo_set_dash(cairo, dot, 2, 0);
+    case kStyleLongDash:
+        return cairo_set_dash(cairo, longDash, 2, 0);
+    case kStyleShortDash:
+        return cairo_set_dash(cairo, shortDash, 2, 0);
+    case kStyleDotDash:
+        return cairo_set_dash(cairo, dotDash, 4, 0);
+    default:
+        return cairo_set_dash(cairo, nullptr, 0, 0);
+    }
+}
+
+} // namespace
+
+CCairoContext::CCairoContext(cairo_t* cairo, double resolution)
+    : m_cairo(cairo_reference(cairo)), m_resolution(resolution) {}
+
+CCairoContext::~CCairoContext() {
+    cairo_destroy(m_cairo);
+}
+
+void CCairoContext::SetMatrix(const CMatrix& matrix) {
+    m_matrix = matrix;
+}
+
+void CCairoContext::addPath(const CPath& path) {
+    cairo_new_path(m_cairo);
+    for (const CPath::SSegment& segment : path.GetSegments()) switch (segment.verb) {
+        case CPath::EVerb::move:
+            cairo_move_to(m_cairo, segment.end.x, segment.end.y);
+            break;
+        case CPath::EVerb::line:
+            cairo_line_to(m_cairo, segment.end.x, segment.end.y);
+            break;
+        case CPath::EVerb::curve:
+            cairo_curve_to(m_cairo, segment.control1.x, segment.control1.y, segment.control2.x,
+                           segment.control2.y, segment.end.x, segment.end.y);
+            break;
+        case CPath::EVerb::close:
+            cairo_close_path(m_cairo);
+            break;
+        }
+}
+
+void CCairoContext::DrawPath(const CPath& path, const SFill* fill, const SPen* pen) {
+    // A matrix without an inverse would put the cairo context into an error state for good.
+    if (path.IsEmpty() || !m_matrix.getInverse()) return;
+    const bool hasGradient = fill && fill->gradient.isVisible();
+    const bool hasFill = hasGradient || (fill && fill->brush.isVisible());
+    const bool hasLine = pen && pen->isVisible();
+    if (!hasFill && !hasLine) return;
+    cairo_save(m_cairo);
+    const cairo_matrix_t matrix{m_matrix.xx, m_matrix.yx, m_matrix.xy, m_matrix.yy, m_matrix.x0, m_matrix.y0};
+    cairo_transform(m_cairo, &matrix);
+    addPath(path);
+    if (hasGradient) {
+        const SRect& box = fill->gradientBox;
+        const Pattern pattern(cairo_pattern_create_linear(0, box.top, 0, box.getBottom()),
+                              cairo_pattern_destroy);
+        addStop(pattern.get(), 0, fill->gradient.start);
+        addStop(pattern.get(), 1, fill->gradient.end);
+        cairo_set_source(m_cairo, pattern.get());
+        cairo_fill_preserve(m_cairo);
+    } else if (hasFill) {
+        setColour(m_cairo, fill->brush.colour);
+        cairo_fill_preserve(m_cairo);
+    }
+    if (hasLine) {
+        setColour(m_cairo, pen->colour);
+        cairo_set_line_width(m_cairo, pen->width);
+        setDashes(m_cairo, *pen);
+        cairo_stroke_preserve(m_cairo);
+    }
+    cairo_new_path(m_cairo);
+    cairo_restore(m_cairo);
+}
+
+void CCairoContext::DrawBitmap(const CBitmap& bitmap, const SRect& source, const SRect& target) {
+    if (!m_matrix.getInverse() || source.width <= 0 || source.height <= 0 || target.width <= 0 ||
+        target.height <= 0)
+        return;
+    // A surface over the part only: interpolation must not mix in pixels beside it. cairo only reads them.
+    const int left = std::clamp(static_cast<int>(std::lround(source.left)), 0, bitmap.GetWidth() - 1);
+    const int top = std::clamp(static_cast<int>(std::lround(source.top)), 0, bitmap.GetHeight() - 1);
+    const int width = std::clamp(static_cast<int>(std::lround(source.width)), 1, bitmap.GetWidth() - left);
+    const int height = std::clamp(static_cast<int>(std::lround(source.height)), 1, bitmap.GetHeight() - top);
+    auto* const pixels = const_cast<uint32_t*>(bitmap.GetPixels().data()) +
+                         static_cast<size_t>(top) * static_cast<size_t>(bitmap.GetWidth()) + left;
+    const Surface surface(cairo_image_surface_create_for_data(reinterpret_cast<unsigned char*>(pixels),
+                                                              CAIRO_FORMAT_ARGB32, width, height,
+                                                              bitmap.GetWidth() * 4),
+                          cairo_surface_destroy);
+    cairo_save(m_cairo);
+    const cairo_matrix_t matrix{m_matrix.xx, m_matrix.yx, m_matrix.xy, m_matrix.yy, m_matrix.x0, m_matrix.y0};
+    cairo_transform(m_cairo, &matrix);
+    cairo_rectangle(m_cairo, target.left, target.top, target.width, target.height);
+    cairo_translate(m_cairo, target.left, target.top);
+    cairo_scale(m_cairo, target.width / width, target.height / height);
+    cairo_set_source_surface(m_cairo, surface.get(), 0, 0);
+    // Without the padding, pixels at the edge of an enlarged bitmap fade into transparency.
+    cairo_pattern_set_extend(cairo_get_source(m_cairo), CAIRO_EXTEND_PAD);
+    cairo_pattern_set_filter(cairo_get_source(m_cairo), CAIRO_FILTER_GOOD);
+    cairo_fill(m_cairo);
+    cairo_restore(m_cairo);
+    // A recording device must not refer to pixels that the bitmap may free before the page is written.
+    cairo_surface_finish(surface.get());
+}
+
+void CCairoContext::PushClip(const SRect& rect) {
+    cairo_save(m_cairo);
+    const auto corners = m_matrix.getCorners(rect);
+    cairo_new_path(m_cairo);
+    for (const SPoint& corner : corners) cairo_line_to(m_cairo, corner.x, corner.y);
+    cairo_close_path(m_cairo);
+    cairo_clip(m_cairo);
+}
+
+void CCairoContext::PopClip() {
+    cairo_restore(m_cairo);
+}
+
+SRect CCairoContext::GetClipBox() const {
+    double left = 0, top = 0, right = 0, bottom = 0;
+    cairo_clip_extents(m_cairo, &left, &top, &right, &bottom);
+    return SRect::fromEdges(left, top, right, bottom);
+}
+
+} // namespace graphics

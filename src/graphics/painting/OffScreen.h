@@ -1,0 +1,36 @@
+// A bitmap that is painted on, without a display.
+#pragma once
+
+#include "graphics/painting/CairoContext.h"
+
+namespace graphics {
+
+// The limit on the pixels of one picture, checked before memory is allocated.
+inline constexpr int64_t kMaximalPixels = 100'000'000;
+
+// Transparent at first. Throws CError if the size is above the limit or memory is short.
+class GRAPHICS_API COffScreen {
+public:
+    COffScreen(int64_t width, int64_t height);
+    ~COffScreen();
+    COffScreen(const COffScreen&) = delete;
+    COffScreen& operator=(const COffScreen&) = delete;
+
+    IGraphicsContext& GetGraphics() const { return *m_graphics; }
+    int GetWidth() const { return m_width; }
+    int GetHeight() const { return m_height; }
+    // The pixels of a row, premultiplied ARGB. Valid until the next painting.
+    uint32_t* GetRow(int y);
+    // A copy of the pixels.
+    P<CBitmap> GetBitmap();
+    // As a PNG file. Throws CError.
+    std::string GetPng();
+
+private:
+    int m_width;
+    int m_height;
+    cairo_surface_t* m_surface;
+    P<IGraphicsContext> m_graphics;
+};
+
+} // namespace graphics
