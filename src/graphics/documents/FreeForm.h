@@ -13,7 +13,11 @@ public:
 
     // Localised, or the id of a form that this program does not know.
     virtual std::string GetDisplayName() const;
+    // Name and vertices.
+    virtual void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const;
     virtual P<CFreeForm> Clone() const;
+    // A form of the program by its name, otherwise one with the vertices of the node.
+    static P<CFreeForm> Load(const P<peru::IXmlNode>& node, IResourceInputStore& store);
 
     const std::string& GetId() const { return m_id; }
     const P<CGraphicDocument>& GetDocument() const { return m_document; }

@@ -48,6 +48,8 @@ protected:
 public:
     void Assign(const CGraphicElement& other) override;
     double GetOverhang() const override;
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
 
     const SBrush& GetBrush() const { return m_brush; }
     void SetBrush(const SBrush& brush);
@@ -97,6 +99,8 @@ public:
     P<CGraphicElement> Clone() const override;
     void Assign(const CGraphicElement& other) override;
     GraphicElementType GetType() const override { return GraphicElementType::stateButton; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
 
     const std::string& GetLabel() const { return m_label; }
     void SetLabel(const std::string& label) { m_label = label; }
@@ -118,6 +122,8 @@ public:
     P<CGraphicElement> Clone() const override;
     void Assign(const CGraphicElement& other) override;
     GraphicElementType GetType() const override { return GraphicElementType::label; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
     void Reset() override { m_text.clear(); }
 
     const std::string& GetText() const { return m_text; }

@@ -9,6 +9,29 @@
 
 namespace graphics {
 
+namespace {
+
+P<IGraphicElementFactory>& getFactory() {
+    static P<IGraphicElementFactory> s_factory;
+    return s_factory;
+}
+
+} // namespace
+
+void setElementFactory(const P<IGraphicElementFactory>& factory) {
+    getFactory() = factory;
+}
+
+P<CGraphicElement> CreateElement(GraphicElementType type, const std::string& typeName) {
+    if (typeName.empty()) return CreateElement(type);
+    if (getFactory())
+        if (const auto element = getFactory()->CreateElement(typeName)) return element;
+    const auto element = CreateElement(type);
+    // The name is preserved for a program that knows the class.
+    if (element) element->SetTypeName(typeName);
+    return element;
+}
+
 P<CGraphicElement> CreateElement(GraphicElementType type) {
     switch (type) {
     case GraphicElementType::paper:

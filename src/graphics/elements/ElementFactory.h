@@ -15,6 +15,11 @@ public:
     virtual P<CGraphicElement> CreateElement(const std::string& typeName) = 0;
 };
 
+// The factory that documents use for elements with a type name. Empty for none.
+GRAPHICS_API void setElementFactory(const P<IGraphicElementFactory>& factory);
+// Asks the factory if there is a type name; otherwise, or if the factory does not know the name, creates the
+// class of the type. Empty for types without a class.
+GRAPHICS_API P<CGraphicElement> CreateElement(GraphicElementType type, const std::string& typeName);
 // Empty for types without a class in this module: base, custom and animation.
 GRAPHICS_API P<CGraphicElement> CreateElement(GraphicElementType type);
 

@@ -5,6 +5,7 @@
 #include "graphics/elements/GraphicElementType.h"
 #include "graphics/elements/HitMask.h"
 #include "graphics/geometry/Polygon.h"
+#include "graphics/storage/IReusableResource.h"
 
 #include <memory>
 #include <set>
@@ -12,7 +13,7 @@
 namespace graphics {
 
 // Elements are shared by reference; a document listens to each of its elements.
-class GRAPHICS_API CGraphicElement : public CGraphicBase {
+class GRAPHICS_API CGraphicElement : public CGraphicBase, public virtual IReusableResource {
 protected:
     CGraphicElement();
     ~CGraphicElement() override;
@@ -21,8 +22,10 @@ public:
     // The name, or the localised name of the type.
     std::string GetDisplayName() const override;
 
-    // Above 0, different for each element of the process.
-    int64_t GetUnique() const { return m_unique; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    // Attributes that the node lacks leave their fields unchanged; tags and groups are replaced.
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
+    int64_t GetUnique() const override { return m_unique; }
 
     void SetMirrored(EAxis axis, bool isMirrored) override;
     // Applies placement, mirrors and colour, then paints the content. Elements that cannot be seen cost

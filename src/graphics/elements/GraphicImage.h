@@ -1,9 +1,9 @@
 // A picture.
 #pragma once
 
-#include "graphics/elements/Bitmap.h"
 #include "graphics/elements/GraphicElement.h"
 #include "graphics/elements/ScaleMargins.h"
+#include "graphics/images/Bitmap.h"
 
 namespace graphics {
 
@@ -16,6 +16,8 @@ public:
     P<CGraphicElement> Clone() const override; // shares the bitmap
     void Assign(const CGraphicElement& other) override;
     GraphicElementType GetType() const override { return GraphicElementType::image; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
     void Reset() override;
 
     const P<CBitmap>& GetBitmap() const { return m_bitmap; } // may be empty

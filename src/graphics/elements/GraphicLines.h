@@ -18,6 +18,8 @@ public:
     P<CGraphicElement> Clone() const override;
     void Assign(const CGraphicElement& other) override;
     GraphicElementType GetType() const override { return GraphicElementType::line; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
     double GetOverhang() const override;
 
     SPoint GetStart() const { return m_start; }

@@ -17,6 +17,8 @@ public:
     // Clones the inner document.
     void Assign(const CGraphicElement& other) override;
     GraphicElementType GetType() const override { return GraphicElementType::mirror; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
 
     const P<CGraphicDocument>& GetDocument() const { return m_document; } // may be empty
     void SetDocument(const P<CGraphicDocument>& document);

@@ -16,6 +16,8 @@ public:
     P<CGraphicElement> Clone() const override;
     void Assign(const CGraphicElement& other) override;
     GraphicElementType GetType() const override { return GraphicElementType::shape; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
     // Empty for a free form that is not set.
     Polygon GetOutline() const override;
     double GetOverhang() const override;

@@ -80,6 +80,8 @@ public:
     P<CGraphicElement> Clone() const override;
     void Assign(const CGraphicElement& other) override; // deep
     GraphicElementType GetType() const override { return GraphicElementType::table; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
     void Reset() override { ClearCells(); }
 
     int GetRowCount() const { return static_cast<int>(m_rows.size()); }

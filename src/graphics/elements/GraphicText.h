@@ -18,6 +18,8 @@ public:
     P<CGraphicElement> Clone() const override;
     void Assign(const CGraphicElement& other) override;
     GraphicElementType GetType() const override { return GraphicElementType::text; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
     void Reset() override { SetText(nullptr); }
 
     // Empty if there is no text.
@@ -51,6 +53,8 @@ public:
     P<CGraphicElement> Clone() const override;
     void Assign(const CGraphicElement& other) override;
     GraphicElementType GetType() const override { return GraphicElementType::textCircle; }
+    void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
+    void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
 
     ECircleType GetCircleType() const { return m_circleType; }
     void SetCircleType(ECircleType type);

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "graphics/elements/Appearance.h"
-#include "graphics/elements/Bitmap.h"
+#include "graphics/images/Bitmap.h"
 #include "graphics/painting/Path.h"
 
 namespace graphics {

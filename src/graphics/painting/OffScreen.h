@@ -5,9 +5,6 @@
 
 namespace graphics {
 
-// The limit on the pixels of one picture, checked before memory is allocated.
-inline constexpr int64_t kMaximalPixels = 100'000'000;
-
 // Transparent at first. Throws CError if the size is above the limit or memory is short.
 class GRAPHICS_API COffScreen {
 public:

@@ -145,7 +145,7 @@ TEST(Painting, GivesTheSameShapesOnPdfPages) {
 TEST(HitMask, AgreesWithThePaintedAlpha) {
     std::mt19937 random(3);
     for (const auto& shape : makeShapes())
-        for (int i = 0; i < 8; ++i) {
+        for (int i = 0; i < 4; ++i) {
             if (!shape->IsDefinedByPoints())
                 shape->SetSize(tests::between(random, 2, 30), tests::between(random, 2, 30));
             shape->SetCenter(tests::between(random, 20, 40), tests::between(random, 15, 25));

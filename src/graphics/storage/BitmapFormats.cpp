@@ -1,0 +1,33 @@
+#include "graphics/storage/BitmapFormats.h"
+
+#include "peru/Errors.h"
+#include "peru/log/LogManager.h"
+#include "peru/strings/IStringLocalizer.h"
+
+namespace graphics {
+
+EBitmapFormat chooseFormat(const CBitmap& bitmap, const std::string& sourceFileName, bool isLossless) {
+    // The toolkit writes icons of up to 255 pixels only.
+    const bool fitsIcon = bitmap.GetWidth() <= 255 && bitmap.GetHeight() <= 255;
+    if (getFormatOfFile(sourceFileName) == EBitmapFormat::ico && fitsIcon) return EBitmapFormat::ico;
+    if (isLossless) return EBitmapFormat::png;
+    return bitmap.HasAlpha() ? EBitmapFormat::jng : EBitmapFormat::jpg;
+}
+
+P<CBitmap> tryLoadBitmap(EBitmapFormat format, std::string bytes, const std::string& source) {
+    try {
+        return peru::make<CBitmap>(format, std::move(bytes));
+    } catch (const peru::CException& error) {
+        logAttachment(source, error);
+        return {};
+    }
+}
+
+void logAttachment(const std::string& source, const peru::CException& error) {
+    peru::getLogManager()->warning(
+        peru::CString::fromUTF8("graphics"),
+        peru::localize("graphics.Attachment.LeftOut", "The attachment \"%NAME%\" is left out: %DETAILS%",
+                       {{"%NAME%", peru::CString::fromUTF8(source)}, {"%DETAILS%", error.getDescription()}}));
+}
+
+} // namespace graphics

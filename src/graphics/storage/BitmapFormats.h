@@ -1,0 +1,15 @@
+// How stores choose the format of a bitmap.
+#pragma once
+
+#include "graphics/images/ImageCodec.h"
+
+namespace graphics {
+
+// Icons remain icons; otherwise PNG without loss, JNG for transparency and JPEG for the rest.
+EBitmapFormat chooseFormat(const CBitmap& bitmap, const std::string& sourceFileName, bool isLossless);
+// Empty, with a line in the log that names the source, if the bytes are not a picture.
+P<CBitmap> tryLoadBitmap(EBitmapFormat format, std::string bytes, const std::string& source);
+// Reports an attachment that is left out.
+void logAttachment(const std::string& source, const peru::CException& error);
+
+} // namespace graphics

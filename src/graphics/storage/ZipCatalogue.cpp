@@ -1,0 +1,120 @@
+#include "graphics/storage/ZipCatalogue.h"
+
+#include "graphics/storage/BitmapFormats.h"
+#include "graphics/storage/XmlValues.h"
+#include "peru/Errors.h"
+#include "peru/strings/IStringLocalizer.h"
+
+#include <cstring>
+#include <wx/log.h>
+#include <wx/mstream.h>
+#include <wx/zipstrm.h>
+
+namespace graphics {
+
+namespace {
+
+[[noreturn]] void fail(const char* key, const char* text, const std::string& name) {
+    throw peru::CError(peru::localize(key, text, {{"%NAME%", peru::CString::fromUTF8(name)}}));
+}
+
+} // namespace
+
+CZipCatalogue::CZipCatalogue(std::string archive) : m_archive(std::move(archive)) {}
+
+CZipCatalogue::~CZipCatalogue() = default;
+
+void CZipCatalogue::readCatalogue() {
+    if (m_isRead) return;
+    m_isRead = true;
+    const wxLogNull quiet;
+    m_stream = std::make_unique<wxMemoryInputStream>(m_archive.data(), m_archive.size());
+    m_zip = std::make_unique<wxZipInputStream>(*m_stream, wxConvUTF8);
+    while (auto entry = std::unique_ptr<wxZipEntry>(m_zip->GetNextEntry()))
+        m_entries.emplace(entry->GetInternalName().utf8_string(), std::move(entry));
+}
+
+bool CZipCatalogue::HasEntry(const std::string& name) {
+    readCatalogue();
+    return m_entries.count(name) != 0;
+}
+
+std::string CZipCatalogue::ReadEntry(const std::string& name) {
+    if (!HasEntry(name)) fail("graphics.CZipCatalogue.Missing", "The archive has no entry \"%NAME%\".", name);
+    const wxLogNull quiet;
+    const auto damaged = [&] {
+        fail("graphics.CZipCatalogue.Damaged", "The entry \"%NAME%\" of the archive is damaged.", name);
+    };
+    if (!m_zip->OpenEntry(*m_entries.at(name))) damaged();
+    // In pieces: the size that the archive announces may be wrong.
+    std::string bytes;
+    std::vector<char> buffer(64 * 1024);
+    for (;;) {
+        m_zip->Read(buffer.data(), buffer.size());
+        const size_t count = m_zip->LastRead();
+        bytes.append(buffer.data(), count);
+        m_total += static_cast<int64_t>(count);
+        if (static_cast<int64_t>(bytes.size()) > kMaximalEntry || m_total > kMaximalTotal)
+            fail("graphics.CZipCatalogue.TooLarge", "The entry \"%NAME%\" of the archive is too large.",
+                 name);
+        if (m_zip->Eof()) break;
+        if (!m_zip->IsOk() || count == 0) damaged();
+    }
+    if (m_zip->GetLastError() == wxSTREAM_READ_ERROR) damaged();
+    return bytes;
+}
+
+bool CZipCatalogue::readAttachment(const Node& node, const std::string& key, std::string& name,
+                                   std::string& bytes) {
+    const Node child = node->getChildNode(key.c_str());
+    if (!child || !readAttribute(child, "name", name)) return false;
+    try {
+        bytes = ReadEntry(name);
+        return true;
+    } catch (const peru::CException& error) {
+        logAttachment(name, error);
+        return false;
+    }
+}
+
+P<CRichText> CZipCatalogue::LoadRichText(const Node& node, const std::string& key) {
+    std::string name, bytes;
+    if (!readAttachment(node, key, name, bytes)) return {};
+    return peru::make<CRichText>(std::move(bytes));
+}
+
+P<CBitmap> CZipCatalogue::LoadBitmap(const Node& node, const std::string& key, std::string& fileName) {
+    const Node child = node->getChildNode(key.c_str());
+    if (!child || !readAttribute(child, "name", fileName)) return {};
+    return LoadBitmap(node, key, getFormatOfFile(fileName));
+}
+
+P<CBitmap> CZipCatalogue::LoadBitmap(const Node& node, const std::string& key, EBitmapFormat format) {
+    const Node child = node->getChildNode(key.c_str());
+    std::string name, bytes;
+    if (!child || !readAttribute(child, "name", name)) return {};
+    if (const auto known = m_bitmaps.find(name); known != m_bitmaps.end()) return known->second;
+    if (!readAttachment(node, key, name, bytes)) return {};
+    return m_bitmaps[name] = tryLoadBitmap(format, std::move(bytes), name);
+}
+
+P<peru::IMemoryBlock> CZipCatalogue::LoadMemory(const Node& node, const std::string& key) {
+    std::string name, bytes;
+    if (!readAttachment(node, key, name, bytes)) return {};
+    auto block = peru::make<peru::CMemoryBlock>(static_cast<int64_t>(bytes.size()));
+    std::memcpy(block->getData(), bytes.data(), bytes.size());
+    return block;
+}
+
+std::string CZipCatalogue::LoadType(const Node& node) {
+    std::string type;
+    readAttribute(node, "type", type);
+    return type;
+}
+
+P<IReusableResource> CZipCatalogue::LoadReusable(const Node& node, const std::string& type,
+                                                 const P<IReusableResource>& instance) {
+    return m_resources.Load(node, type, instance, *this);
+}
+
+} // namespace graphics

@@ -1,0 +1,57 @@
+// The entries of a ZIP archive.
+#pragma once
+
+#include "graphics/storage/Reusables.h"
+
+#include <memory>
+
+class wxZipEntry;
+class wxZipInputStream;
+class wxMemoryInputStream;
+
+namespace graphics {
+
+// Reads an archive that is in memory. Entries are only ever read by name, never extracted to files.
+class GRAPHICS_API CZipCatalogue : public peru::CObject, public IResourceInputStore {
+public:
+    // Limits on what is unpacked, against archives that expand without end.
+    static constexpr int64_t kMaximalEntry = 256 << 20; // bytes
+    static constexpr int64_t kMaximalTotal = 2048ll << 20;
+
+    // An archive that cannot be read has no entries.
+    explicit CZipCatalogue(std::string archive);
+    ~CZipCatalogue() override;
+    CZipCatalogue(const CZipCatalogue&) = delete;
+    CZipCatalogue& operator=(const CZipCatalogue&) = delete;
+
+    P<CRichText> LoadRichText(const P<peru::IXmlNode>& node, const std::string& key) override;
+    P<CBitmap> LoadBitmap(const P<peru::IXmlNode>& node, const std::string& key,
+                          std::string& fileName) override;
+    P<CBitmap> LoadBitmap(const P<peru::IXmlNode>& node, const std::string& key,
+                          EBitmapFormat format) override;
+    P<peru::IMemoryBlock> LoadMemory(const P<peru::IXmlNode>& node, const std::string& key) override;
+    std::string LoadType(const P<peru::IXmlNode>& node) override;
+    P<IReusableResource> LoadReusable(const P<peru::IXmlNode>& node, const std::string& type,
+                                      const P<IReusableResource>& instance) override;
+
+    bool HasEntry(const std::string& name);
+    // Throws CError, which names the entry, if it is missing, damaged or above a limit.
+    std::string ReadEntry(const std::string& name);
+
+private:
+    void readCatalogue();
+    // The name and the bytes of an attachment; empty if it is missing or damaged.
+    bool readAttachment(const P<peru::IXmlNode>& node, const std::string& key, std::string& name,
+                        std::string& bytes);
+
+    const std::string m_archive;
+    std::unique_ptr<wxMemoryInputStream> m_stream;
+    std::unique_ptr<wxZipInputStream> m_zip;
+    std::map<std::string, std::unique_ptr<wxZipEntry>> m_entries;
+    std::map<std::string, P<CBitmap>> m_bitmaps; // by entry, so that elements share them
+    CLoadedResources m_resources;
+    int64_t m_total = 0; // bytes unpacked
+    bool m_isRead = false;
+};
+
+} // namespace graphics

@@ -1,0 +1,58 @@
+#include "graphics/storage/ZipResources.h"
+
+#include "graphics/storage/BitmapFormats.h"
+#include "graphics/storage/XmlValues.h"
+#include "peru/Errors.h"
+#include "peru/strings/IStringLocalizer.h"
+
+#include <wx/datetime.h>
+#include <wx/zipstrm.h>
+
+namespace graphics {
+
+void CZipResources::WriteEntry(const std::string& name, std::string_view bytes) {
+    const wxDateTime date(1, wxDateTime::Jan, 1990);
+    if (m_archive.PutNextEntry(wxString::FromUTF8(name), date) &&
+        m_archive.WriteAll(bytes.data(), bytes.size()) && m_archive.CloseEntry())
+        return;
+    throw peru::CError(peru::localize("graphics.CZipResources.NotWritten",
+                                      "The entry \"%NAME%\" could not be written to the archive.",
+                                      {{"%NAME%", peru::CString::fromUTF8(name)}}));
+}
+
+void CZipResources::SaveRichText(const Node& node, const std::string& key, const P<CRichText>& text) {
+    if (!text) return;
+    const std::string name = "text" + std::to_string(m_entryNumbers.GetNext()) + ".xml";
+    WriteEntry(name, text->GetXml());
+    writeAttribute(addChild(node, key.c_str()), "name", name);
+}
+
+void CZipResources::SaveBitmap(const Node& node, const std::string& key, const P<CBitmap>& bitmap,
+                               const std::string& sourceFileName) {
+    if (!bitmap) return;
+    const EBitmapFormat format = chooseFormat(*bitmap, sourceFileName, m_isLossless);
+    std::string& name = m_bitmapEntries[bitmap.get()];
+    if (name.empty() || getFormatOfFile(name) != format) {
+        const std::string bytes = bitmap->Encode(format);
+        name = "image" + std::to_string(m_entryNumbers.GetNext()) + "." + getExtension(format);
+        WriteEntry(name, bytes);
+    }
+    writeAttribute(addChild(node, key.c_str()), "name", name);
+}
+
+void CZipResources::SaveReusable(const Node& node, const std::string& type,
+                                 const P<IReusableResource>& resource) {
+    m_resources.Save(node, type, resource, *this);
+}
+
+void CZipResources::SaveMemory(const Node& node, const std::string& key, const P<peru::IMemoryBlock>& block) {
+    if (!block) return;
+    const std::string name = "memory" + std::to_string(m_entryNumbers.GetNext());
+    WriteEntry(name,
+               {reinterpret_cast<const char*>(block->getData()), static_cast<size_t>(block->getSize())});
+    const Node child = addChild(node, key.c_str());
+    writeAttribute(child, "name", name);
+    writeInteger(child, "size", block->getSize());
+}
+
+} // namespace graphics

@@ -1,0 +1,39 @@
+// Attachments in a ZIP archive that is being written.
+#pragma once
+
+#include "graphics/storage/Reusables.h"
+
+class wxZipOutputStream;
+
+namespace graphics {
+
+// Does not own the archive. Throws CError if the archive cannot take an entry.
+class GRAPHICS_API CZipResources : public peru::CObject, public IResourceOutputStore {
+public:
+    explicit CZipResources(wxZipOutputStream& archive) : m_archive(archive) {}
+    ~CZipResources() override = default;
+
+    void SaveRichText(const P<peru::IXmlNode>& node, const std::string& key,
+                      const P<CRichText>& text) override;
+    void SaveBitmap(const P<peru::IXmlNode>& node, const std::string& key, const P<CBitmap>& bitmap,
+                    const std::string& sourceFileName) override;
+    void SaveReusable(const P<peru::IXmlNode>& node, const std::string& type,
+                      const P<IReusableResource>& resource) override;
+    void SaveMemory(const P<peru::IXmlNode>& node, const std::string& key,
+                    const P<peru::IMemoryBlock>& block) override;
+    void SetLossless(bool isLossless) override { m_isLossless = isLossless; }
+    bool IsLossless() const override { return m_isLossless; }
+
+    // Compressed, with a fixed date: the same content gives the same archive.
+    void WriteEntry(const std::string& name, std::string_view bytes);
+
+private:
+    wxZipOutputStream& m_archive;
+    CIdGenerator m_entryNumbers;
+    CSavedResources m_resources;
+    std::map<const CBitmap*, std::string>
+        m_bitmapEntries; // so that elements that share a bitmap share its entry
+    bool m_isLossless = false;
+};
+
+} // namespace graphics
