@@ -107,6 +107,9 @@ public:
     const std::string& GetButtonHint() const { return m_buttonHint; }
     void SetButtonHint(const std::string& hint) { m_buttonHint = hint; }
 
+protected:
+    void PaintContent(CPaintContext& context) const override;
+
 private:
     std::string m_label;
     std::string m_buttonHint;
@@ -132,6 +135,9 @@ public:
     void SetFont(const SFont& font) { m_font = font; }
     const SColour& GetColour() const { return m_colour; }
     void SetColour(const SColour& colour) { m_colour = colour; }
+
+protected:
+    void PaintContent(CPaintContext& context) const override;
 
 private:
     std::string m_text;

@@ -108,6 +108,9 @@ public:
     double GetTotalWidth() const;
     double GetTotalHeight() const;
 
+protected:
+    void PaintContent(CPaintContext& context) const override;
+
 private:
     void checkRange(const char* method, int index, int count, int size) const;
 

@@ -28,6 +28,9 @@ public:
     EVerticalPlacement GetVerticalPlacement() const { return m_placement; }
     void SetVerticalPlacement(EVerticalPlacement placement);
 
+protected:
+    void PaintContent(CPaintContext& context) const override;
+
 private:
     P<CRichText> m_text;
     EVerticalPlacement m_placement = EVerticalPlacement::top;
@@ -58,6 +61,9 @@ public:
 
     ECircleType GetCircleType() const { return m_circleType; }
     void SetCircleType(ECircleType type);
+
+protected:
+    void PaintContent(CPaintContext& context) const override;
 
 private:
     ECircleType m_circleType = ECircleType::convex;

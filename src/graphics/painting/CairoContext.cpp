@@ -1,5 +1,7 @@
 #include "graphics/painting/CairoContext.h"
 
+#include "graphics/text/PangoLayouts.h"
+
 #include <cmath>
 #include <memory>
 
@@ -132,6 +134,20 @@ void CCairoContext::DrawBitmap(const CBitmap& bitmap, const SRect& source, const
     cairo_restore(m_cairo);
     // A recording device must not refer to pixels that the bitmap may free before the page is written.
     cairo_surface_finish(surface.get());
+}
+
+void CCairoContext::DrawLayout(const CTextLayout& layout, SPoint origin) {
+    if (!m_matrix.getInverse()) return;
+    cairo_save(m_cairo);
+    const cairo_matrix_t matrix{m_matrix.xx, m_matrix.yx, m_matrix.xy, m_matrix.yy, m_matrix.x0, m_matrix.y0};
+    cairo_transform(m_cairo, &matrix);
+    cairo_translate(m_cairo, origin.x, origin.y);
+    cairo_scale(m_cairo, 1 / kUnitsPerMillimetre, 1 / kUnitsPerMillimetre);
+    for (const auto& block : layout.GetImpl().blocks) {
+        cairo_move_to(m_cairo, 0, block.top);
+        pango_cairo_show_layout(m_cairo, block.layout.get());
+    }
+    cairo_restore(m_cairo);
 }
 
 void CCairoContext::PushClip(const SRect& rect) {

@@ -19,6 +19,7 @@ public:
     void SetMatrix(const CMatrix& matrix) override;
     void DrawPath(const CPath& path, const SFill* fill, const SPen* pen) override;
     void DrawBitmap(const CBitmap& bitmap, const SRect& source, const SRect& target) override;
+    void DrawLayout(const CTextLayout& layout, SPoint origin) override;
     void PushClip(const SRect& rect) override;
     void PopClip() override;
     SRect GetClipBox() const override;

@@ -7,6 +7,8 @@
 
 namespace graphics {
 
+class CTextLayout;
+
 // What becomes of colours before they are painted.
 enum class EEffect {
     none,
@@ -36,6 +38,8 @@ public:
     virtual void DrawPath(const CPath& path, const SFill* fill, const SPen* pen) = 0;
     // Stretches a part of the bitmap, in whole pixels, to the target.
     virtual void DrawBitmap(const CBitmap& bitmap, const SRect& source, const SRect& target) = 0;
+    // The origin is the layout's top left corner. The layout's colours are painted as they are.
+    virtual void DrawLayout(const CTextLayout& layout, SPoint origin) = 0;
     // Restricts painting to a rectangle, until the matching PopClip().
     virtual void PushClip(const SRect& rect) = 0;
     virtual void PopClip() = 0;

@@ -1,0 +1,153 @@
+// How the elements with text are painted.
+#include "graphics/elements/BasicElements.h"
+#include "graphics/elements/GraphicTable.h"
+#include "graphics/elements/GraphicText.h"
+#include "graphics/painting/PaintContext.h"
+#include "graphics/text/TextLayout.h"
+#include "peru/strings/IStringLocalizer.h"
+
+#include <cmath>
+#include <numbers>
+
+namespace graphics {
+
+namespace {
+
+constexpr SColour kHintColour{128, 128, 128, 255};
+
+std::vector<SParagraph> makeLine(const std::string& text, const SFont& font, const SColour& colour,
+                                 ETextAlignment alignment = ETextAlignment::left) {
+    return {{{{text, font, colour}}, alignment, font}};
+}
+
+// Aligned within the height of the box, and clipped to the box.
+void paintInBox(CPaintContext& context, const std::vector<SParagraph>& paragraphs, const SRect& box,
+                int placement) {
+    if (!(box.width > 0 && box.height > 0) || paragraphs.empty()) return;
+    IGraphicsContext& graphics = context.GetGraphics();
+    const CTextLayout layout(paragraphs, box.width, graphics.GetEffect());
+    const double room = box.height - layout.GetHeight();
+    graphics.PushClip(box);
+    graphics.DrawLayout(layout, {box.left, box.top + room * 0.5 * placement});
+    graphics.PopClip();
+}
+
+void paintHint(CPaintContext& context, const SRect& box, const char* key, const char* text) {
+    if (context.GetOutputKind() != EOutputKind::screen) return;
+    paintInBox(context, makeLine(peru::CString::toStdString(peru::localize(key, text)), SFont(), kHintColour),
+               box, 0);
+}
+
+// A character with the marks that belong to it, in its style.
+struct SGlyph {
+    std::unique_ptr<CTextLayout> layout;
+    double width;
+};
+
+bool isContinuation(const std::string& text, size_t at) {
+    const auto byte = static_cast<uint8_t>(text[at]);
+    if ((byte & 0xC0) == 0x80) return true;
+    // Combining diacritical marks: U+0300 to U+036F.
+    const auto next = at + 1 < text.size() ? static_cast<uint8_t>(text[at + 1]) : 0;
+    return byte == 0xCC || (byte == 0xCD && next < 0xB0);
+}
+
+std::vector<SGlyph> splitGlyphs(const std::vector<SParagraph>& paragraphs, EEffect effect) {
+    std::vector<SGlyph> glyphs;
+    const auto add = [&](const std::string& text, const STextRun& run) {
+        auto layout = std::make_unique<CTextLayout>(makeLine(text, run.font, run.colour), 0, effect);
+        const double width = layout->GetWidth();
+        glyphs.push_back({std::move(layout), width});
+    };
+    for (const SParagraph& paragraph : paragraphs) {
+        // Paragraphs follow each other on the circle.
+        if (!glyphs.empty() && !paragraph.runs.empty()) add(" ", paragraph.runs[0]);
+        for (const STextRun& run : paragraph.runs)
+            for (size_t begin = 0; begin < run.text.size();) {
+                size_t end = begin + 1;
+                while (end < run.text.size() && isContinuation(run.text, end)) ++end;
+                const std::string text = run.text.substr(begin, end - begin);
+                add(text == "\n" || text == "\t" ? " " : text, run);
+                begin = end;
+            }
+    }
+    return glyphs;
+}
+
+} // namespace
+
+void CGraphicLabel::PaintContent(CPaintContext& context) const {
+    if (!m_text.empty()) paintInBox(context, makeLine(m_text, m_font, m_colour), GetLocalRect(), 1);
+}
+
+// Buttons are an aid for editing.
+void CGraphicStateButton::PaintContent(CPaintContext& context) const {
+    if (context.GetOutputKind() != EOutputKind::screen) return;
+    const SRect box = GetLocalRect();
+    const SFill fill{{{225, 225, 225, 255}}, {}, {}};
+    const SPen pen{kHintColour};
+    context.GetGraphics().DrawPath(CPath::roundedRectangle(box, 1), &fill, &pen);
+    paintInBox(context, makeLine(m_label, SFont(), SColour(), ETextAlignment::center), box, 1);
+}
+
+void CGraphicText::PaintContent(CPaintContext& context) const {
+    if (!m_text)
+        paintHint(context, GetLocalRect(), "graphics.Text.ClickToEdit", "Double click to edit!");
+    else
+        paintInBox(context, parseRichText(*m_text), GetLocalRect(), static_cast<int>(m_placement));
+}
+
+void CGraphicTextCircle::PaintContent(CPaintContext& context) const {
+    const SRect box = GetLocalRect();
+    if (!GetText())
+        return paintHint(context, box, "graphics.GraphicTextCircle.ClickToEdit", "Double click to edit!");
+    const std::vector<SGlyph> glyphs =
+        splitGlyphs(parseRichText(*GetText()), context.GetGraphics().GetEffect());
+    double length = 0, ascent = 0, descent = 0;
+    for (const SGlyph& glyph : glyphs) {
+        length += glyph.width;
+        ascent = std::max(ascent, glyph.layout->GetAscent());
+        descent = std::max(descent, glyph.layout->GetHeight() - glyph.layout->GetAscent());
+    }
+    // The text touches the circle from inside, with its top if it stands on the circle, otherwise with its
+    // foot.
+    const bool isConvex = m_circleType == ECircleType::convex;
+    const double radius = 0.5 * std::min(box.width, box.height) - (isConvex ? ascent : descent);
+    if (!(radius > 0)) return;
+    const double direction = isConvex ? 1 : -1;
+    double along = -0.5 * length; // of the middle of the text, which is at the top
+    for (const SGlyph& glyph : glyphs) {
+        const double angle = direction * (along + glyph.width * 0.5) / radius * 180 / std::numbers::pi;
+        along += glyph.width;
+        // Not CMatrix::rotation of whole degrees: glyphs stand at any angle.
+        const CPaintContext::CScope scope(context, CMatrix::rotation(angle) *
+                                                       CMatrix::translation(0, -radius) *
+                                                       CMatrix::rotation(isConvex ? 0 : 180));
+        context.GetGraphics().DrawLayout(*glyph.layout, {glyph.width * -0.5, -glyph.layout->GetAscent()});
+    }
+}
+
+void CGraphicTable::PaintContent(CPaintContext& context) const {
+    const SRect box = GetLocalRect();
+    const double totalWidth = GetTotalWidth(), totalHeight = GetTotalHeight();
+    if (!(totalWidth > 0 && totalHeight > 0))
+        return paintHint(context, box, "graphics.GraphicTable.ClickToEdit", "Double click to edit!");
+    double top = box.top;
+    for (size_t row = 0; row < m_rows.size(); ++row) {
+        const double height = m_rows[row]->height * box.height / totalHeight;
+        double left = box.left;
+        for (size_t col = 0; col < m_cols.size(); ++col) {
+            if (!m_cols[col]->isShown()) continue;
+            const double width = m_cols[col]->width * box.width / totalWidth;
+            const CCell& cell = *m_cells[row][col];
+            if (cell.text)
+                paintInBox(context, parseRichText(*cell.text),
+                           SRect{left, top, width, height}.inflated(-cell.margin),
+                           static_cast<int>(cell.verticalAlign));
+            left += width;
+        }
+        top += height;
+    }
+}
+
+} // namespace graphics
