@@ -1,4 +1,5 @@
 // Arbitrary text as rich text, broken into lines.
+#include "../../tests/support/FontLeaks.h"
 #include "graphics/text/TextLayout.h"
 
 using namespace graphics;

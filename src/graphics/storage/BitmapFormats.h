@@ -2,6 +2,7 @@
 #pragma once
 
 #include "graphics/images/ImageCodec.h"
+#include "peru/Exception.h"
 
 namespace graphics {
 

@@ -2,6 +2,7 @@
 #include "graphics/painting/DocumentRenderer.h"
 #include "graphics/text/TextLayout.h"
 #include "graphics/text/TextWrapper.h"
+#include "support/FontLeaks.h"
 #include "support/Process.h"
 #include "support/TempFolder.h"
 
