@@ -1,5 +1,7 @@
-#include "commands/Cddb.h"
+#include "arguments/Cddb.h"
 #include "arguments/Arguments.h"
+#include "base/Translation.h"
+#include "commands/Cddb.h"
 
 #include <charconv>
 #include <cstdlib>
@@ -13,7 +15,8 @@ namespace {
 // HOST[:PORT][/PATH], optionally with "http://" in front.
 SCddbServer parseServer(std::string text) {
     const auto refuse = [&text] {
-        throw CLI::ValidationError("--server", text + " is not HOST[:PORT][/PATH]");
+        throw CLI::ValidationError(
+            "--server", tr("host.Cddb.server", "%TEXT% is not HOST[:PORT][/PATH]", {{"%TEXT%", text}}));
     };
     SCddbServer server;
     std::string authority = text.starts_with("http://") ? text.substr(7) : text;
@@ -35,11 +38,13 @@ SCddbServer parseServer(std::string text) {
     return server;
 }
 
-void addServer(CLI::App& command, SCddbOptions& options) {
+} // namespace
+
+void addCddbAccess(CLI::App& command, SCddbAccess& access) {
     command
         .add_option_function<std::string>(
-            "--server", [&](const std::string& text) { options.server = parseServer(text); },
-            "The CDDB server (default: $TONEWRIGHT_CDDB_SERVER)")
+            "--server", [&](const std::string& text) { access.server = parseServer(text); },
+            tr("host.help.cddb.server", "CDDB server (default: $TONEWRIGHT_CDDB_SERVER)"))
         ->option_text("HOST[:PORT][/PATH]");
     command
         .add_option_function<std::string>(
@@ -47,41 +52,64 @@ void addServer(CLI::App& command, SCddbOptions& options) {
             [&](const std::string& text) {
                 const size_t at = text.rfind('@');
                 if (at == 0 || at == std::string::npos || at + 1 == text.size())
-                    throw CLI::ValidationError("--user", "must be NAME@HOST");
-                options.user = text.substr(0, at);
-                options.userHost = text.substr(at + 1);
+                    throw CLI::ValidationError("--user", tr("host.Cddb.user", "must be NAME@HOST"));
+                access.user = text.substr(0, at);
+                access.userHost = text.substr(at + 1);
             },
-            "What the server is told about the user (default: anon@anon)")
+            tr("host.help.cddb.user", "What the server is told about the user (default: anon@anon)"))
         ->option_text("NAME@HOST");
     command
         .add_option_function<std::string>(
-            "--proxy", [&](const std::string& text) { options.proxy = text; },
-            "Proxy to use, or none if empty (default: that of the system)")
+            "--proxy", [&](const std::string& text) { access.proxy = text; },
+            tr("host.help.cddb.proxy", "Proxy to use, or none if empty (default: that of the system)"))
         ->option_text("HOST[:PORT]");
-    command.add_option("--timeout", options.timeout, "Seconds that each request may take")
+    command
+        .add_option("--timeout", access.timeout,
+                    tr("host.help.cddb.timeout", "Seconds that each request may take"))
         ->option_text("SECONDS")
         ->check(CLI::Range(0.001, 1e6))
         ->check(isNumber);
     command
-        .add_option("--code-page", options.codePage,
-                    "Encoding of replies that are not UTF-8, such as SHIFT_JIS (default: Windows-1252)")
+        .add_option("--code-page", access.codePage,
+                    tr("host.help.cddb.codePage", "Encoding of replies that are not UTF-8, such as SHIFT_JIS "
+                                                  "(default: Windows-1252)"))
         ->option_text("NAME");
     auto* noCache = command.add_flag_callback(
-        "--no-cache", [&] { options.useCache = false; },
-        "Neither read nor write the answers stored in $XDG_CACHE_HOME/tonewright");
-    command.add_flag("--refresh", options.refresh, "Ask the server even if its answer is stored")
+        "--no-cache", [&] { access.useCache = false; },
+        tr("host.help.cddb.noCache",
+           "Neither read nor write the answers stored in $XDG_CACHE_HOME/tonewright"));
+    command
+        .add_flag("--refresh", access.refresh,
+                  tr("host.help.cddb.refresh", "Ask the server even if its answer is stored"))
         ->excludes(noCache);
 }
 
-} // namespace
+void addCddbPick(CLI::App& command, int& pick) {
+    command
+        .add_option("--pick", pick,
+                    tr("host.help.cddb.pick", "Read the record with this number where several fit"))
+        ->option_text("N")
+        ->check(CLI::Range(1, 10000));
+}
+
+void requireCddbServer(SCddbAccess& access) {
+    const char* const usual = std::getenv("TONEWRIGHT_CDDB_SERVER");
+    if (access.server.host.empty() && usual && *usual) access.server = parseServer(usual);
+    if (access.server.host.empty()) throw CLI::RequiredError("--server");
+}
 
 void addCddb(CLI::App& app, Run& run) {
     const auto options = std::make_shared<SCddbOptions>();
     CLI::App* command = app.add_subcommand(
-        "cddb",
-        "Look up an audio CD on a CDDB server: artist, album, titles. Answers are stored, so a disc is\n"
-        "looked up only once.");
-    auto* input = command->add_option("CUE", options->input, "Cue sheet of the disc")->option_text(" ");
+        "cddb", tr("host.help.cddb", "Look up an audio CD on a CDDB server: artist, album, titles. Answers "
+                                     "are stored, so a disc is\nlooked up only once."));
+    auto* input = command
+                      ->add_option("DISC", options->input,
+                                   tr("host.help.cddb.DISC",
+                                      "A drive by its path in tonewright drives, a disc image (.cue, .toc, "
+                                      ".nrg) or the cue sheet of\nsound files; by default the first drive "
+                                      "with a disc"))
+                      ->option_text(" ");
     command
         ->add_option_function<std::string>(
             "--toc",
@@ -92,21 +120,16 @@ void addCddb(CLI::App& app, Run& run) {
                     throw CLI::ValidationError("--toc", error.what());
                 }
             },
-            "Offsets of the tracks and of the lead-out in frames of 1/75 second, such as\n"
-            "'150 17827 33215 50640'")
+            tr("host.help.cddb.toc", "Offsets of the tracks and of the lead-out in frames of 1/75 second, "
+                                     "such as\n'150 17827 33215 50640'"))
         ->option_text("FRAMES")
         ->excludes(input);
-    addServer(*command, *options);
-    command->add_option("--pick", options->pick, "Read the record with this number where several fit")
-        ->option_text("N")
-        ->check(CLI::Range(1, 10000));
-    command->add_flag("--list", options->list, "Only list the records that fit");
-    command->add_flag("--json", options->json, "Print a JSON object");
+    addCddbAccess(*command, *options);
+    addCddbPick(*command, options->pick);
+    command->add_flag("--list", options->list, tr("host.help.cddb.list", "Only list the records that fit"));
+    command->add_flag("--json", options->json, tr("host.help.cddb.json", "Print a JSON object"));
     command->callback([options, &run] {
-        if (!options->toc && options->input.empty()) throw CLI::RequiredError("A cue sheet or --toc");
-        const char* const usual = std::getenv("TONEWRIGHT_CDDB_SERVER");
-        if (options->server.host.empty() && usual && *usual) options->server = parseServer(usual);
-        if (options->server.host.empty()) throw CLI::RequiredError("--server");
+        requireCddbServer(*options);
         run = [options](CLibrary&) { return lookUpDisc(*options); };
     });
 }

@@ -1,8 +1,11 @@
 #include "arguments/Arguments.h"
+#include "arguments/Cddb.h"
+#include "base/Translation.h"
 #include "commands/Drives.h"
 #include "commands/Rip.h"
 #include "commands/ShowDisc.h"
 
+#include <algorithm>
 #include <memory>
 
 namespace host {
@@ -31,6 +34,18 @@ std::set<int> parseTracks(const std::string& text) {
         for (int track = first; track <= last; ++track) tracks.insert(track);
     }
     return tracks;
+}
+
+// "--cddb" and the options that only apply with it.
+void addLookup(CLI::App& command, bool& looksUp, SCddbAccess& access, int& pick) {
+    auto* const flag = command.add_flag(
+        "--cddb", looksUp,
+        tr("host.help.rip.cddb", "Take names and tags from a CDDB server; as in tonewright cddb:"));
+    const std::vector<CLI::Option*> before = command.get_options();
+    addCddbAccess(command, access);
+    addCddbPick(command, pick);
+    for (CLI::Option* const option : command.get_options())
+        if (std::find(before.begin(), before.end(), option) == before.end()) option->needs(flag);
 }
 
 } // namespace
@@ -70,6 +85,8 @@ void addRip(CLI::App& app, Run& run) {
     struct SOptions : SRipOptions {
         std::string tracksText;
         std::string pattern = "%track% %title%";
+        bool looksUp = false;
+        SCddbAccess access;
     };
     const auto options = std::make_shared<SOptions>();
     CLI::App* command = app.add_subcommand(
@@ -91,6 +108,7 @@ void addRip(CLI::App& app, Run& run) {
     command->add_flag("--verify", options->verify, "Read every track twice and compare");
     command->add_flag("--cue", options->writeCue, "Also write a cue sheet");
     command->add_flag("-f,--force", options->force, "Replace existing files");
+    addLookup(*command, options->looksUp, options->access, options->pick);
     addFormat(*command, *options, {16});
     // The samples of the disc are copied as they are.
     for (const char* name : {"--rate", "--channels", "--bits"})
@@ -98,6 +116,10 @@ void addRip(CLI::App& app, Run& run) {
     addOutput(*command, options->show);
     command->callback([options, &run] {
         checkBitRates(*options);
+        if (options->looksUp) {
+            requireCddbServer(options->access);
+            options->cddb = options->access;
+        }
         // The disc may be left out.
         const std::string place = options->place.native();
         std::error_code none;

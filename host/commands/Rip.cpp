@@ -4,6 +4,7 @@
 #include "base/Text.h"
 #include "library/Failure.h"
 #include "media/Disc.h"
+#include "media/DiscNames.h"
 #include "media/EncodeJob.h"
 #include "media/Output.h"
 #include "media/TrackReader.h"
@@ -38,8 +39,8 @@ std::string quote(std::string text) {
 
 class CRipper {
 public:
-    CRipper(CLibrary& library, const SRipOptions& options)
-        : m_library(library), m_options(options), m_disc(options.place), m_progress(options.show),
+    CRipper(CLibrary& library, const SRipOptions& options, CDisc disc)
+        : m_library(library), m_options(options), m_disc(std::move(disc)), m_progress(options.show),
           m_temporaryEnding(setTemporaryEnding(library)) {
         for (const SDiscTrack& track : m_disc.getTracks())
             if (track.number > 0 && (options.tracks.empty() || options.tracks.contains(track.number)))
@@ -84,6 +85,8 @@ CNamePattern::Fields CRipper::getFields(const SDiscTrack& track) const {
             {"artist", track.performer.empty() ? albumArtist : track.performer},
             {"title", title},
             {"track", std::to_string(track.number)},
+            {"year", m_disc.getYear()},
+            {"genre", m_disc.getGenre()},
             {"name", title}};
 }
 
@@ -211,7 +214,10 @@ int CRipper::run() {
 int rip(CLibrary& library, const SRipOptions& options) {
     const fs::path example = "x." + options.extension;
     requireEffect(options, example);
-    return CRipper(library, options).run();
+    CDisc disc(options.place);
+    if (options.cddb)
+        if (const int code = nameDisc(disc, *options.cddb, options.pick); code != kExitSuccess) return code;
+    return CRipper(library, options, std::move(disc)).run();
 }
 
 } // namespace host

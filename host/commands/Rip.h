@@ -2,6 +2,7 @@
 #pragma once
 
 #include "library/Library.h"
+#include "media/CddbLookup.h"
 #include "media/FormatOptions.h"
 #include "media/NamePattern.h"
 #include "terminal/Progress.h"
@@ -17,6 +18,8 @@ struct SRipOptions : SFormatOptions {
     std::string extension = "flac";
     std::filesystem::path directory;
     std::optional<CNamePattern> names;
+    std::optional<SCddbAccess> cddb; // where to look up the names
+    int pick = 0;                    // of the records, from 1 on; 0 asks
     bool verify = false;
     bool writeCue = false;
     bool force = false;

@@ -2,6 +2,7 @@
 
 #include "base/Text.h"
 
+#include <algorithm>
 #include <iterator>
 #include <optional>
 
@@ -106,7 +107,23 @@ void CDisc::readTracks() {
     }
 }
 
+void CDisc::setTexts(const SDiscTexts& texts) {
+    m_texts = texts;
+    for (size_t i = 0; i < std::min(m_tracks.size(), texts.tracks.size()); ++i) {
+        const auto& [title, performer] = texts.tracks[i];
+        if (title.empty()) continue;
+        m_tracks[i].title = title;
+        m_tracks[i].performer = performer;
+    }
+}
+
+int32_t CDisc::getLeadOut() const {
+    return getDiscFunctions().DiscGetTrackStartBlocks(m_disc.get(), static_cast<int32_t>(m_tracks.size()));
+}
+
 std::string CDisc::getText(int32_t text) const {
+    if (text == DISCIO_TEXT_TITLE && !m_texts.title.empty()) return m_texts.title;
+    if (text == DISCIO_TEXT_PERFORMER && !m_texts.performer.empty()) return m_texts.performer;
     return toUTF8(getDiscFunctions().DiscAudioGetMetaDataStringW(m_disc.get(), text));
 }
 

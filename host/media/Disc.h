@@ -4,6 +4,8 @@
 #include "library/DiscLibrary.h"
 
 #include <filesystem>
+#include <string>
+#include <utility>
 #include <vector>
 
 namespace host {
@@ -37,6 +39,16 @@ struct SDiscTrack {
     double getSeconds() const { return static_cast<double>(length) / kBlocksPerSecond; }
 };
 
+// Texts for a disc that are not its own. Those of the disc apply where a title, or the performer of the disc,
+// is empty.
+struct SDiscTexts {
+    std::string title;
+    std::string performer;
+    std::string year;
+    std::string genre;
+    std::vector<std::pair<std::string, std::string>> tracks; // titles and performers, of tracks of all kinds
+};
+
 class CDisc {
 public:
     // The medium in a drive, named by its path, or a disc image; without a name, the first drive with a
@@ -47,6 +59,10 @@ public:
     DISCIO_Disc* getHandle() const { return m_disc.get(); }
     const std::vector<SDiscTrack>& getTracks() const { return m_tracks; }
     std::string getText(int32_t text) const; // DISCIO_TEXT_TITLE and so on, of the disc
+    void setTexts(const SDiscTexts& texts);
+    const std::string& getYear() const { return m_texts.year; } // of setTexts()
+    const std::string& getGenre() const { return m_texts.genre; }
+    int32_t getLeadOut() const; // its start, as that of tracks
     DiscHandle<DISCIO_PCMAudioStream> openTrack(int number) const;
 
 private:
@@ -56,6 +72,7 @@ private:
     std::string m_place;
     DiscHandle<DISCIO_Disc> m_disc;
     std::vector<SDiscTrack> m_tracks;
+    SDiscTexts m_texts;
 };
 
 } // namespace host
