@@ -67,6 +67,7 @@ private:
         Turn turn;
         double duration;
         std::shared_ptr<CPlayResult> result;
+        std::shared_ptr<CWebStream> stream;
     };
     struct SMissing {
         Turn turn;
@@ -80,6 +81,7 @@ private:
     std::optional<SPlaySource> openNext(const SSampleFormat& format);
     void enqueueAhead();
     void run();
+    void stopStreams();
     void handleKey(int key);
     void hear(size_t index);
     std::optional<Turn> conclude();
@@ -174,7 +176,7 @@ std::optional<SPlaySource> CJukebox::openNext(const SSampleFormat& format) {
         try {
             SPlaySource opened = openPlaySource(m_library, itemOf(turn), format);
             m_barren = 0;
-            m_playing.push_back({turn, opened.duration, opened.result});
+            m_playing.push_back({turn, opened.duration, opened.result, opened.stream});
             return opened;
         } catch (const std::exception& failure) {
             ++m_barren;
@@ -205,7 +207,7 @@ bool CJukebox::openSession(double seconds) {
         m_format = format;
         m_session->setVolume(getVolume());
         // A time that was meant for an item which cannot be played does not apply to the next one.
-        m_from = m_playing.front().turn == first ? seconds : 0;
+        m_from = m_playing.front().turn == first && !opened->stream ? seconds : 0;
         enqueueAhead();
         m_session->start(m_from);
         return true;
@@ -215,6 +217,11 @@ bool CJukebox::openSession(double seconds) {
 }
 
 void CJukebox::enqueueAhead() {
+    // What follows a stream waits for its end.
+    const auto isOpenEnded = [](const SPlaying& playing) {
+        return playing.stream && playing.result->getLength() < 0;
+    };
+    if (isOpenEnded(m_playing.back())) return;
     double left = m_playing[m_heard].duration - m_session->getState().position;
     for (size_t i = m_heard + 1; i < m_playing.size(); ++i) left += m_playing[i].duration;
     while (left < kAhead && m_playing.size() - m_heard < kMostAhead) {
@@ -225,6 +232,7 @@ void CJukebox::enqueueAhead() {
             m_playing.pop_back();
             return;
         }
+        if (isOpenEnded(m_playing.back())) return;
         left += opened->duration;
     }
 }
@@ -235,6 +243,10 @@ void CJukebox::handleKey(int key) {
         m_volume = std::clamp(m_volume + step, 0, kMostVolume);
         m_isMuted = false;
         m_session->setVolume(getVolume());
+    };
+    // Streams cannot seek.
+    const auto seek = [this](double seconds) {
+        if (!m_playing[m_heard].stream) m_session->seek(std::max(seconds, 0.0));
     };
     switch (key) {
     case ' ':
@@ -252,15 +264,15 @@ void CJukebox::handleKey(int key) {
         m_request = ERequest::previous;
         return;
     case kKeyLeft:
-        return m_session->seek(std::max(position - kShortStep, 0.0));
+        return seek(position - kShortStep);
     case kKeyRight:
-        return m_session->seek(position + kShortStep);
+        return seek(position + kShortStep);
     case kKeyDown:
     case kKeyShiftLeft:
-        return m_session->seek(std::max(position - kLongStep, 0.0));
+        return seek(position - kLongStep);
     case kKeyUp:
     case kKeyShiftRight:
-        return m_session->seek(position + kLongStep);
+        return seek(position + kLongStep);
     case '+':
     case '=':
     case '0':
@@ -290,6 +302,7 @@ void CJukebox::run() {
         hear(static_cast<size_t>(m_session->getIndex()));
         if (m_request != ERequest::none) {
             m_session->stop();
+            stopStreams();
             continue;
         }
         enqueueAhead();
@@ -299,6 +312,12 @@ void CJukebox::run() {
             m_request = ERequest::next;
         if (m_session->hasBegun() && m_line.isDue()) show();
     }
+}
+
+// The player's thread may be waiting for one of them.
+void CJukebox::stopStreams() {
+    for (const SPlaying& playing : m_playing)
+        if (playing.stream) playing.stream->stop();
 }
 
 // Reports what has ended and what has begun since.
@@ -334,14 +353,15 @@ void CJukebox::begin() {
 void CJukebox::end(bool isWhole) {
     const SPlaying& playing = m_playing[m_heard];
     const std::string track = describeTrack(itemOf(playing.turn));
+    const double duration = playing.stream ? playing.result->getLength() : playing.duration;
     if (isWhole && playing.result->getLength() >= 0 && !playing.result->getFailure().empty()) {
         m_line.fail(track + playing.result->getFailure());
         m_hasFailed = true;
     } else if (isWhole) {
         const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - m_begun;
-        m_line.finish(track + tr("host.Play.played", "%DURATION% played",
-                                 {{"%DURATION%", formatDuration(playing.duration)}}),
-                      {{"duration", playing.duration}, {"seconds", elapsed.count()}});
+        m_line.finish(
+            track + tr("host.Play.played", "%DURATION% played", {{"%DURATION%", formatDuration(duration)}}),
+            {{"duration", duration}, {"seconds", elapsed.count()}});
     } else {
         m_line.cancel({{"position", m_session->getState().position}});
     }
@@ -401,7 +421,7 @@ void CJukebox::show() {
     const double position =
         playing.duration > 0 ? std::min(state.position, playing.duration) : state.position;
     const std::string at = formatDuration(position), all = formatDuration(playing.duration);
-    std::string live = describeTrack(itemOf(playing.turn)) + at + " / " + all;
+    std::string live = describeTrack(itemOf(playing.turn)) + at + (playing.stream ? "" : " / " + all);
     if (m_items.size() > 1)
         live +=
             "  " + std::to_string(playing.turn % m_items.size() + 1) + "/" + std::to_string(m_items.size());
@@ -415,19 +435,22 @@ void CJukebox::show() {
                               {"state", state.isPaused ? "paused" : "playing"},
                               {"volume", m_volume}};
     if (m_isMuted) details["muted"] = true;
-    m_line.update(
-        live + (state.isPaused ? "  " + tr("host.Play.paused", "paused") : ""),
-        tr("host.Play.position", "%POSITION% of %DURATION%", {{"%POSITION%", at}, {"%DURATION%", all}}),
-        details);
+    m_line.update(live + (state.isPaused ? "  " + tr("host.Play.paused", "paused") : ""),
+                  playing.stream ? at
+                                 : tr("host.Play.position", "%POSITION% of %DURATION%",
+                                      {{"%POSITION%", at}, {"%DURATION%", all}}),
+                  details);
 }
 
-// Copies what is on web servers before anything plays: the player reads every item several times. The copies
-// live as long as the result.
+// Copies files on web servers before anything plays: the player reads every item several times. The copies
+// live as long as the result. What has no stated length is read while it plays.
 std::vector<std::unique_ptr<CInputContent>> fetchItems(std::vector<SPlayItem>& items) {
     std::vector<std::unique_ptr<CInputContent>> copies;
     for (SPlayItem& item : items) {
         if (!item.failure.empty() || !isWebAddress(item.file) || isCancelled()) continue;
         try {
+            item.isStream = isEndless(item.file);
+            if (item.isStream) continue;
             copies.push_back(std::make_unique<CInputContent>(item.file));
             item.file = copies.back()->getPath();
         } catch (const std::exception& failure) {

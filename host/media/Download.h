@@ -1,6 +1,8 @@
 // Files on web servers.
 #pragma once
 
+#include "library/Library.h"
+
 #include <cstdint>
 #include <filesystem>
 #include <functional>
@@ -16,6 +18,9 @@ std::filesystem::path getWebName(const std::filesystem::path& address);
 
 // Bytes so far, and in total or -1.
 using DownloadProgress = std::function<void(int64_t received, int64_t total)>;
+
+// A handle for the functions of downloads in the library. Throws std::runtime_error.
+CHandle createDownload(const std::filesystem::path& address);
 
 // Writes the content of an address to a file, which is created or overwritten. False if Ctrl-C ended it; the
 // file is then incomplete, as it is after a failure. Throws std::runtime_error.

@@ -17,15 +17,19 @@ namespace {
 
 // An arrangement is mixed in steps of this length, and its last step may extend beyond its end.
 constexpr int64_t kStepFrames = 4000;
+// A player ends with the stated duration of its source, and a stream has none.
+constexpr int64_t kEndlessSeconds = 1'000'000'000;
 
 } // namespace
 
 // Reads a part of a source.
 class CItemReader {
 public:
-    CItemReader(const SPlayItem& item, const SSampleFormat& samples, CHandle source, bool isPadded)
+    CItemReader(const SPlayItem& item, const SSampleFormat& samples, CHandle source, bool isPadded,
+                std::shared_ptr<CWebStream> stream)
         : m_file(item.file), m_samples(samples), m_first(toFrames(item.begin)), m_isPadded(isPadded),
-          m_source(std::move(source)), m_reader(TONEWRIGHT_Host_CreateReader(m_source.get())) {
+          m_stream(std::move(stream)), m_source(std::move(source)),
+          m_reader(TONEWRIGHT_Host_CreateReader(m_source.get())) {
         if (!m_reader)
             throw std::runtime_error(takeFailure(tr("host.unreadable", "The file cannot be read"), m_file));
     }
@@ -56,10 +60,11 @@ public:
             count = frames;
         }
         m_position += count;
-        if (count == 0) end({});
+        if (count == 0) end(m_stream ? m_stream->getFailure() : "");
         return count;
     }
     bool seek(int64_t frame) {
+        if (m_stream && frame != m_position) return false;
         if (TONEWRIGHT_Host_Seek(m_reader.get(), static_cast<double>(m_first + frame) / m_samples.rate) != 1)
             return false;
         m_position = frame;
@@ -79,6 +84,7 @@ private:
     const SSampleFormat m_samples;
     const int64_t m_first;
     const bool m_isPadded; // with silence, to the length of the source
+    const std::shared_ptr<CWebStream> m_stream;
     CHandle m_source;
     CHandle m_reader;
     int64_t m_position = 0; // frames from the beginning of the item
@@ -87,9 +93,20 @@ private:
 
 namespace {
 
-CHandle openInFormat(CLibrary& library, const SPlayItem& item, const SSampleFormat& samples) {
-    if (isArrangement(item.file)) return openArrangement(library, item.file, samples);
-    SSoundFile sound = openSoundFile(item.file);
+// The reason of the stream comes before that of its decoder.
+SSoundFile openStream(CWebStream& stream) {
+    try {
+        return openSoundPipe(stream.getPath());
+    } catch (const std::runtime_error& failure) {
+        const std::string reason = stream.getFailure();
+        throw std::runtime_error(reason.empty() ? failure.what() : reason);
+    }
+}
+
+CHandle openInFormat(CLibrary& library, const SPlayItem& item, const SSampleFormat& samples,
+                     CWebStream* stream) {
+    if (!stream && isArrangement(item.file)) return openArrangement(library, item.file, samples);
+    SSoundFile sound = stream ? openStream(*stream) : openSoundFile(item.file);
     if (sound.samples != samples &&
         TONEWRIGHT_Host_SetSourceFormat(sound.source.get(), samples.rate, samples.channels,
                                         samples.bytesPerSample) != 1)
@@ -104,12 +121,16 @@ CHandle openInFormat(CLibrary& library, const SPlayItem& item, const SSampleForm
 
 SPlaySource openPlaySource(CLibrary& library, const SPlayItem& item, const SSampleFormat& samples) {
     if (!item.failure.empty()) throw std::runtime_error(item.failure);
-    CHandle opened = openInFormat(library, item, samples);
-    const double duration = library.AudioSource_GetDuration(opened.get());
-    auto reader = std::make_unique<CItemReader>(item, samples, std::move(opened), isArrangement(item.file));
     SPlaySource made;
+    if (item.isStream) made.stream = std::make_shared<CWebStream>(item.file);
+    CHandle opened = openInFormat(library, item, samples, made.stream.get());
+    const double duration = item.isStream ? 0 : library.AudioSource_GetDuration(opened.get());
+    auto reader = std::make_unique<CItemReader>(item, samples, std::move(opened),
+                                                !item.isStream && isArrangement(item.file), made.stream);
     made.result = reader->getResult();
-    const int64_t frames = duration > 0 ? reader->measure(item, duration) : -1;
+    const int64_t frames = item.isStream  ? kEndlessSeconds * samples.rate
+                           : duration > 0 ? reader->measure(item, duration)
+                                          : -1;
     if (item.begin > 0 && !reader->seek(0))
         throw std::runtime_error(
             takeFailure(tr("host.Play.seek", "The file cannot be read from that time on"), item.file));

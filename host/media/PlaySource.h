@@ -4,6 +4,7 @@
 #include "library/Library.h"
 #include "media/Playlist.h"
 #include "media/SoundFile.h"
+#include "media/WebStream.h"
 
 #include <atomic>
 #include <memory>
@@ -30,6 +31,7 @@ struct SPlaySource {
     CHandle source;
     double duration = 0;
     std::shared_ptr<CPlayResult> result;
+    std::shared_ptr<CWebStream> stream; // of an item that is one; reading may wait for it until it is stopped
 };
 
 // A source of the item's sound in that format. A failure while it is read ends it early instead of ending the

@@ -2,6 +2,7 @@
 
 #include "base/Text.h"
 #include "base/Translation.h"
+#include "media/Download.h"
 
 #include <algorithm>
 #include <cctype>
@@ -256,8 +257,9 @@ fs::path resolve(const fs::path& playlist, std::string_view location) {
         TONEWRIGHT_Host_Free(path);
         return file;
     }
+    if (isWebAddress(bytes)) return bytes;
     if (colon != std::string::npos && bytes.compare(colon, 3, "://") == 0)
-        throw std::runtime_error(tr("host.Playlist.onlyFiles", "Only files can be played"));
+        throw std::runtime_error(tr("host.Playlist.onlyHttp", "Only files and http addresses can be played"));
     const fs::path folder = playlist.parent_path();
     const std::string text = toText(bytes);
     std::error_code none;
@@ -297,6 +299,7 @@ template <class List> void CLister::enter(const fs::path& place, List list) {
 }
 
 void CLister::add(const fs::path& input, const std::string& title) {
+    if (isWebAddress(input)) return addFile(input, title);
     std::error_code none;
     const std::string extension = extensionOf(input);
     if (fs::is_directory(input, none))

@@ -1,4 +1,4 @@
-// What there is to play: files, folders, playlists and cue sheets as a list of items.
+// What there is to play: files, http addresses, folders, playlists and cue sheets as a list of items.
 #pragma once
 
 #include <filesystem>
@@ -16,6 +16,7 @@ struct SPlayItem {
     int64_t begin = 0;          // in frames of a cue sheet, kCueFrames per second
     std::optional<int64_t> end; // empty: to the end of the file
     std::string title;          // from the playlist; may be empty
+    bool isStream = false;      // an address that is read while it plays
     std::string failure;        // why there is nothing to play, if that is known already
 };
 

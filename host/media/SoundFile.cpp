@@ -25,6 +25,10 @@ namespace {
 
 SSoundFile openSoundFile(const fs::path& file) {
     checkInput(file);
+    return openSoundPipe(file);
+}
+
+SSoundFile openSoundPipe(const fs::path& file) {
     SSoundFile sound;
     sound.info.size = sizeof sound.info;
     clearFailure();

@@ -30,6 +30,9 @@ struct SSoundFile {
 // Throws std::runtime_error with the reason.
 SSoundFile openSoundFile(const std::filesystem::path& file);
 
+// The same for a named pipe. Its source has no known duration and cannot seek.
+SSoundFile openSoundPipe(const std::filesystem::path& pipe);
+
 // Throws std::runtime_error with the reason unless this is a readable regular file that is not empty.
 void checkInput(const std::filesystem::path& file);
 

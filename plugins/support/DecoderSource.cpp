@@ -92,7 +92,7 @@ bool CDecoderSource::isEOF() {
 
 void CDecoderSource::setStartTime(double fStartTime) {
     if (!(fStartTime >= 0.0))
-        fail({"sonora2.CDecoderSource.startTime", "%g is no start time for %s"}, fStartTime,
+        fail({"sonora2.CDecoderSource.startTime", "%g is not a start time for %s"}, fStartTime,
              m_file.getDisplayName());
     m_startTime = fStartTime;
     if (isOpened()) restartAt(toFrame(m_startTime));
@@ -222,7 +222,7 @@ void CDecoderSource::openDecoder() {
     const bool sound = own.rate > 0 && own.channels > 0 && own.bytesPerSample >= 1 &&
                        own.bytesPerSample <= 4 && m_media.frames >= 0;
     if (!sound)
-        fail({"sonora2.CDecoderSource.noSound", "%s: %d channels at %d Hz are no sound"},
+        fail({"sonora2.CDecoderSource.noSound", "%s: %d channels at %d Hz are not a sound format"},
              m_file.getDisplayName(), own.channels, own.rate);
     chooseFormat(m_wanted);
 }

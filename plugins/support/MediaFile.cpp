@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <fcntl.h>
 #include <filesystem>
 #include <system_error>
 
@@ -47,8 +48,22 @@ InputFile openForReading(const SMediaFile& file) {
     if (error) failSystem(kOpenFailed, file, error.value());
     if (std::filesystem::is_directory(status)) failSystem(kOpenFailed, file, EISDIR);
     if (!std::filesystem::is_regular_file(status))
-        fail({"sonora2.plugins.noFile", "%s is no file"}, file.getDisplayName());
+        fail({"sonora2.plugins.noFile", "%s is not a file"}, file.getDisplayName());
     InputFile input(std::fopen(file.path.c_str(), "rbe")); // closed in programs that are started meanwhile
+    if (!input) failSystem(kOpenFailed, file, errno);
+    return input;
+}
+
+bool isPipe(const SMediaFile& file) {
+    std::error_code none;
+    return std::filesystem::is_fifo(file.path, none);
+}
+
+InputFile openPipe(const SMediaFile& file) {
+    // Waits for nobody if the other end has gone.
+    const int descriptor = ::open(file.path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    if (descriptor < 0 || ::fcntl(descriptor, F_SETFL, 0) != 0) failSystem(kOpenFailed, file, errno);
+    InputFile input(::fdopen(descriptor, "rb"));
     if (!input) failSystem(kOpenFailed, file, errno);
     return input;
 }

@@ -46,6 +46,9 @@ struct SFileCloser {
 using InputFile = std::unique_ptr<std::FILE, SFileCloser>;
 // Opens a regular file for a codec library, which uses the stream or its descriptor. Throws CSonoraError.
 InputFile openForReading(const SMediaFile& file);
+bool isPipe(const SMediaFile& file);
+// Opens a named pipe whose other end is open already; otherwise it has no content.
+InputFile openPipe(const SMediaFile& file);
 
 // Throws CSonoraError; `text` is a format of CStringFormat.
 template <class... Args> [[noreturn]] void fail(const peru::SLocalizedText& text, const Args&... args) {

@@ -46,7 +46,7 @@ TEST_F(Playlist, InputsAreListedInOrder) {
     folder.write("disc/up.pls",
                  "[playlist]\nNumberOfEntries=2\nFile2=../9.wav\nfile1=../10.wav\nTitle1=Ten\n");
     folder.write("self.m3u", "9.wav\nself.m3u\ndisc/up.pls\n");
-    folder.write("web.m3u", "http://example.org/a.mp3\nmissing.wav\n");
+    folder.write("web.m3u", "https://example.org/a.mp3\nmissing.wav\n");
     folder.write("odd.cue",
                  "FILE 9.wav WAVE\nTRACK 1 AUDIO\nINDEX 01 0:0:2\nTRACK 2 AUDIO\nINDEX 01 0:0:1\n"
                  "TRACK 3 AUDIO\nTRACK 4 AUDIO\nINDEX 01 9:0:0\nFILE disc/a.wav WAVE\nTRACK 5 AUDIO\n"
@@ -66,7 +66,8 @@ TEST_F(Playlist, InputsAreListedInOrder) {
         {{"disc/up.pls"}, "disc/../10.wav disc/../9.wav"},
         {{"self.m3u"}, "9.wav self.m3u(Contains itself) disc/../10.wav disc/../9.wav"},
         {{"web.m3u"},
-         "http://example.org/a.mp3(Only files can be played) missing.wav(No such file or directory)"},
+         "https://example.org/a.mp3(Only files and http addresses can be played) missing.wav(No such file or "
+         "directory)"},
         {{"odd.cue"},
          "odd.cue#1(Track 1 ends before it begins) odd.cue#2 odd.cue#3(Track 3 has no beginning) "
          "odd.cue#4(Track 4 begins after the end of 9.wav) odd.cue#5"},

@@ -119,6 +119,8 @@ void CAvDecoder::selectSoundtrack(int index) {
 }
 
 void CAvDecoder::start() {
+    if (m_demuxer && m_demuxer->isPipe())
+        failToOpen(m_file, peru::localize("sonora2.av.OnlyOnce", "a stream can be read only once"));
     m_demuxer = std::make_unique<CDemuxer>(m_file, AVMEDIA_TYPE_AUDIO, m_soundtrack);
     m_packet.reset(av_packet_alloc());
     m_frame.reset(av_frame_alloc());
@@ -165,6 +167,10 @@ void CAvDecoder::estimateLength() {
     m_estimate = duration > 0 ? std::llround(std::min(duration, 1e8) * m_format.rate) : 0;
     m_stated = m_statedEnd = 0;
     m_hasExactEnd = false;
+    if (m_demuxer->isPipe()) {
+        m_estimate = countPending(); // until the end is reached
+        return;
+    }
     if (format.duration_estimation_method == AVFMT_DURATION_FROM_BITRATE || duration < 0) {
         scanPackets();
         if (m_packets.frames > 0) m_estimate = m_packets.frames;

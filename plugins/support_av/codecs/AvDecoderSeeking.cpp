@@ -25,6 +25,7 @@ void CAvDecoder::seek(int64_t frame) {
     const int64_t ahead = frame - m_position;
     const bool isNear = ahead >= 0 && ahead <= std::llround(kNearby * m_format.rate);
     if (!m_mustRestart && isNear) return drop(ahead);
+    if (m_demuxer->isPipe() && !m_mustRestart && ahead >= 0) return drop(ahead);
     const bool canJump = !m_mustRestart && frame > m_format.rate && canStartAnywhere(m_codec->codec_id);
     if (canJump && (seekByPlace(frame) || seekByTime(frame))) return;
     start();

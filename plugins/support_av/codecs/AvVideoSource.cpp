@@ -123,7 +123,8 @@ void CAvVideoSource::setMaxSize(int nWidth, int nHeight) {
 }
 
 void CAvVideoSource::requireOpened() const {
-    if (!m_demuxer) fail("%s is not opened for reading", m_file.getDisplayName());
+    if (!m_demuxer)
+        fail({"sonora2.CDecoderSource.notOpened", "%s is not opened for reading"}, m_file.getDisplayName());
 }
 
 double CAvVideoSource::getDuration() {
@@ -131,7 +132,9 @@ double CAvVideoSource::getDuration() {
 }
 
 void CAvVideoSource::setStartTime(double fStartTime) {
-    if (!(fStartTime >= 0.0)) fail("%g is no start time for %s", fStartTime, m_file.getDisplayName());
+    if (!(fStartTime >= 0.0))
+        fail({"sonora2.CDecoderSource.startTime", "%g is not a start time for %s"}, fStartTime,
+             m_file.getDisplayName());
     m_startTime = fStartTime;
     if (isOpened()) skipToTime(0.0);
 }

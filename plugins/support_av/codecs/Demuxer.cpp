@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <cstdio>
 #include <new>
+#include <unistd.h>
 
 namespace sonora2::plugins::av {
 
@@ -23,11 +24,13 @@ int refuseOther(AVFormatContext*, AVIOContext**, const char*, int, AVDictionary*
 } // namespace
 
 CDemuxer::CDemuxer(const SMediaFile& file, AVMediaType type, int index)
-    : m_file(file), m_input(openForReading(file)) {
+    : m_file(file), m_isPipe(plugins::isPipe(file)),
+      m_input(m_isPipe ? openPipe(file) : openForReading(file)) {
     av_max_alloc(kMostBytesAtOnce);
     auto* const buffer = static_cast<uint8_t*>(av_malloc(kBufferBytes));
     if (buffer)
-        m_io.reset(avio_alloc_context(buffer, kBufferBytes, 0, this, &readBytes, nullptr, &seekBytes));
+        m_io.reset(avio_alloc_context(buffer, kBufferBytes, 0, this, m_isPipe ? &readPipe : &readBytes,
+                                      nullptr, m_isPipe ? nullptr : &seekBytes));
     m_format = avformat_alloc_context();
     if (!m_io || !m_format) throw std::bad_alloc();
     m_format->pb = m_io.get();
@@ -87,6 +90,15 @@ int CDemuxer::readBytes(void* self, uint8_t* buffer, int size) {
     const size_t got = std::fread(buffer, 1, static_cast<size_t>(size), file);
     if (got > 0) return static_cast<int>(got);
     return std::ferror(file) ? AVERROR(EIO) : AVERROR_EOF;
+}
+
+// Whatever has arrived; a stream would wait for a full buffer.
+int CDemuxer::readPipe(void* self, uint8_t* buffer, int size) {
+    const int pipe = ::fileno(static_cast<CDemuxer*>(self)->m_input.get());
+    ssize_t got;
+    do got = ::read(pipe, buffer, static_cast<size_t>(size));
+    while (got < 0 && errno == EINTR);
+    return got > 0 ? static_cast<int>(got) : got == 0 ? AVERROR_EOF : AVERROR(EIO);
 }
 
 int64_t CDemuxer::seekBytes(void* self, int64_t offset, int whence) {

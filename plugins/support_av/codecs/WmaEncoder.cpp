@@ -35,8 +35,9 @@ CWmaEncoder::~CWmaEncoder() {
 
 bool CWmaEncoder::accepts(const SPcmFormat& format) const {
     if (format.channels <= kMaxChannels && kRates.contains(format.rate)) return true;
-    fail("WMA files hold 1 or 2 channels at %d to %d Hz, not %d channels at %d Hz", kRates.lowest,
-         kRates.highest, format.channels, format.rate);
+    fail({"sonora2.CWmaEncoder.format",
+          "WMA files hold 1 or 2 channels at %d to %d Hz, not %d channels at %d Hz"},
+         kRates.lowest, kRates.highest, format.channels, format.rate);
 }
 
 int CWmaEncoder::writeBytes(void* self, uint8_t* bytes, int size) {
