@@ -1,6 +1,7 @@
 // tonewright: converts, plays, mixes and records sound files, shows their properties, draws their waveforms
 // and changes their tags.
 #include "arguments/Arguments.h"
+#include "arguments/ParserErrors.h"
 #include "arguments/Shared.h"
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
@@ -59,7 +60,7 @@ void translateHelp(CLI::App& app) {
     app.group(tr("host.help.Subcommands", "Subcommands"));
     app.set_help_flag("-h,--help", tr("host.help.help", "Print this help message and exit"));
     app.failure_message([](const CLI::App*, const CLI::Error& error) {
-        return std::string(error.what()) + "\n" +
+        return translateParserMessage(error.what()) + "\n" +
                tr("host.moreHelp", "Run with --help for more information.") + "\n";
     });
     const auto formatter = app.get_formatter();

@@ -127,7 +127,7 @@ void addCddb(CLI::App& app, Run& run) {
     addCddbAccess(*command, *options);
     addCddbPick(*command, options->pick);
     command->add_flag("--list", options->list, tr("host.help.cddb.list", "Only list the records that fit"));
-    command->add_flag("--json", options->json, tr("host.help.cddb.json", "Print a JSON object"));
+    command->add_flag("--json", options->json, tr("host.help.jsonObject", "Print a JSON object"));
     command->callback([options, &run] {
         requireCddbServer(*options);
         run = [options](CLibrary&) { return lookUpDisc(*options); };

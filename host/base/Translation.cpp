@@ -46,6 +46,10 @@ bool isEnglish() {
 }
 
 std::string tr(const char* key, const char* text, std::initializer_list<STextValue> values) {
+    return tr(key, text, std::span(values.begin(), values.size()));
+}
+
+std::string tr(const char* key, const char* text, std::span<const STextValue> values) {
     std::vector<const char*> placeholders;
     placeholders.reserve(values.size() * 2 + 1);
     for (const STextValue& each : values)

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <initializer_list>
+#include <span>
 #include <string>
 
 namespace host {
@@ -20,5 +21,6 @@ struct STextValue {
 // The text of a key, such as "host.Convert.sameFile", in the user's language. The default text must be a
 // literal that follows the key, so that the translators' tool finds it.
 std::string tr(const char* key, const char* text, std::initializer_list<STextValue> values = {});
+std::string tr(const char* key, const char* text, std::span<const STextValue> values);
 
 } // namespace host

@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "media/Download.h"
 #include "media/Output.h"
 #include "terminal/LiveLine.h"
@@ -20,22 +21,25 @@ namespace {
 fs::path chooseOutput(const SGetOptions& options) {
     if (!options.output.empty()) return options.output;
     fs::path name = getWebName(options.address);
-    if (name.empty()) throw std::runtime_error("The address has no file name; --output is needed");
+    if (name.empty())
+        throw std::runtime_error(tr("host.Get.noName", "The address has no file name; --output is needed"));
     return name;
 }
 
 std::string describe(int64_t received, int64_t total) {
-    std::string text = formatSize(static_cast<uint64_t>(received));
-    if (total > 0)
-        text += " of " + formatSize(static_cast<uint64_t>(total)) + ", " +
-                std::to_string(received * 100 / total) + " %";
-    return text;
+    const std::string size = formatSize(static_cast<uint64_t>(received));
+    if (total <= 0) return size;
+    return tr("host.Get.progress", "%SIZE% of %TOTALSIZE%, %PERCENT% %",
+              {{"%SIZE%", size},
+               {"%TOTALSIZE%", formatSize(static_cast<uint64_t>(total))},
+               {"%PERCENT%", std::to_string(received * 100 / total)}});
 }
 
 // False if Ctrl-C ended it.
 bool fetch(const SGetOptions& options, CLiveLine& line) {
     line.start(options.address, nlohmann::json::object());
-    if (!isWebAddress(options.address)) throw std::runtime_error("Only http addresses can be read");
+    if (!isWebAddress(options.address))
+        throw std::runtime_error(tr("host.Get.onlyHttp", "Only http addresses can be read"));
     const fs::path output = chooseOutput(options);
     COutput place(output, ".part" + std::to_string(::getpid()), options.force);
     const auto started = std::chrono::steady_clock::now();
@@ -53,8 +57,10 @@ bool fetch(const SGetOptions& options, CLiveLine& line) {
     place.commit();
     const std::chrono::duration<double> seconds = std::chrono::steady_clock::now() - started;
     const double rate = static_cast<double>(bytes) / std::max(seconds.count(), 1e-6);
-    line.finish(toPrintable(output.native()) + ", " + formatSize(bytes) + ", " +
-                    formatSize(static_cast<uint64_t>(rate)) + " per second",
+    line.finish(tr("host.Get.done", "%FILE%, %SIZE%, %SPEED% per second",
+                   {{"%FILE%", toPrintable(output.native())},
+                    {"%SIZE%", formatSize(bytes)},
+                    {"%SPEED%", formatSize(static_cast<uint64_t>(rate))}}),
                 {{"output", output.native()}, {"bytes", bytes}, {"seconds", seconds.count()}});
     return true;
 }

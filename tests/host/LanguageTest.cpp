@@ -68,3 +68,31 @@ TEST_F(Language, AppliesToAllTextsButNotToWhatProgramsRead) {
     EXPECT_EQ(events.back()["event"], "error");
     EXPECT_EQ(events.back()["message"], "Eingabe und Ausgabe sind dieselbe Datei");
 }
+
+TEST_F(Language, IsThatOfThePartsOfTheParser) {
+    const struct {
+        std::vector<std::string> arguments;
+        const char* german;
+        const char* english;
+    } cases[] = {
+        {{"get"}, "ADDRESS ist erforderlich", "ADDRESS is required"},
+        {{"info", "--nonsense", "x"},
+         "Das folgende Argument wurde nicht erwartet: --nonsense",
+         "The following argument was not expected: --nonsense"},
+        {{"convert", "x", "--to", "wav", "--rate", "0"},
+         "--rate: der Wert 0 liegt nicht zwischen 1 und 768000",
+         "--rate: the value 0 is not in the range 1 to 768000"},
+        {{"convert", "x", "--to", "wav", "--bits", "9"},
+         "--bits: 9 ist keines von",
+         "--bits: 9 is not one of"},
+        {{"get", "x", "-o"}, "--output: der Wert fehlt", "--output: the value is missing"},
+        {{"rip", "--pick", "1"}, "--pick erfordert --cddb", "--pick requires --cddb"},
+        {{"cddb", "--no-cache", "--refresh", "--toc", "1 2", "--server", "x"}, "schließt", "excludes"},
+    };
+    for (const auto& each : cases) {
+        const SProcessResult german = inLocale("de_DE", each.arguments);
+        EXPECT_EQ(german.exitCode, 2);
+        EXPECT_THAT(german.err, HasSubstr(each.german));
+        EXPECT_THAT(inLocale("C", each.arguments).err, HasSubstr(each.english));
+    }
+}

@@ -37,7 +37,7 @@ PLACEHOLDERS = {
     "%FIELDS%": "a list of placeholders for the fields of tags, such as %artist%",
     "%FORMAT%": "a format of sound, such as '44100 Hz, 2 channels and 16 bits'",
     "%FROM%": "a format of sound, such as '44100 Hz, 2 channels and 16 bits'",
-    "%ID%": "the identifier of a volume",
+    "%ID%": "the identifier of a volume or a disc",
     "%KIND%": "a type of files, such as '.flac files'",
     "%LIST%": "a list of names, separated by commas",
     "%METHOD%": "the name of a function",
@@ -49,7 +49,7 @@ PLACEHOLDERS = {
     "%REASON%": "a sentence with the reason, without a full stop",
     "%SIZE%": "the size of a file, such as 1.2 MB",
     "%SOURCE%": "the name of a class",
-    "%SPEED%": "a number",
+    "%SPEED%": "a number, or a size such as 1.2 MB",
     "%TARGET%": "the name of a class",
     "%TEXT%": "a text that the user has given",
     "%GAIN%": "a change of the level in decibels, such as +3.2",
@@ -85,6 +85,10 @@ PLACEHOLDERS = {
     "%SIGNAL%": "the number of a signal of the operating system",
     "%TIME%": "a time, such as 3:05.2",
     "%TOTAL%": "a time, such as 3:05.2",
+    "%TOTALSIZE%": "the size of a file, such as 1.2 MB",
+    "%LOWEST%": "a number",
+    "%HIGHEST%": "a number",
+    "%GIVEN%": "a number",
     "%URI%": "the location of a file or stream",
 }
 PLACEHOLDER = re.compile(r"%[A-Z]+%")

@@ -2,6 +2,7 @@
 
 #include "InstallFolders.h"
 #include "peru/IInterfaceQuery.h"
+#include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "peru/system/IPathes.h"
 #include "peru/system/ISystem.h"
@@ -67,13 +68,23 @@ SFailure makeFailure(SFailure failure, const P<IString>& fileName, const P<IURI>
 }
 
 P<IString> describe(int rate, int channels, int bytesPerSample) {
-    return peru::format("%d Hz, %d channels, %d bytes per sample", rate, channels, bytesPerSample);
+    return peru::format({"sonora2.CPluginHandler.format", "%d Hz, %d channels, %d bytes per sample"}, rate,
+                        channels, bytesPerSample);
 }
 
 // Without a candidate there is nothing else to report.
-P<IString> explainExtension(const P<IString>& key, const char* doing) {
-    return key->isEmpty() ? peru::format("No plug-in %s files without an extension", doing)
-                          : peru::format("No plug-in %s .%s files", doing, key);
+P<IString> explainReading(const P<IString>& extension) {
+    if (extension->isEmpty())
+        return peru::format(
+            {"tonewright.Media.noReaderWithoutExtension", "No plug-in reads files without an extension"});
+    return peru::format({"tonewright.Media.noReader", "No plug-in reads .%s files"}, extension);
+}
+
+P<IString> explainWriting(const P<IString>& extension) {
+    if (extension->isEmpty())
+        return peru::format(
+            {"tonewright.Media.noWriterWithoutExtension", "No plug-in writes files without an extension"});
+    return peru::format({"tonewright.Media.noWriter", "No plug-in writes .%s files"}, extension);
 }
 
 bool contains(IPluginExtensions& extensions, const P<IString>& key) {
@@ -310,7 +321,7 @@ SFailure CPluginHandler::explainSource(const P<IURI>& uri, int mask, const SAtte
                                        const SSourceParams& wanted) const {
     const P<IString> name = getShownName(uri);
     if (!attempts.failure.isEmpty()) return makeFailure(attempts.failure, name, uri);
-    if (!attempts.declined) return makeFailure(explainExtension(attempts.key, "reads"), uri);
+    if (!attempts.declined) return makeFailure(explainReading(attempts.key), uri);
     try {
         const SSourceParams own{}; // zero: the file's own format
         const P<ISource> opened = attempts.declined->tryCreateSource(uri, mask, true, &own);
@@ -320,12 +331,13 @@ SFailure CPluginHandler::explainSource(const P<IURI>& uri, int mask, const SAtte
             const int channels = source->getChannelCount();
             if ((mask & kAudioSource) && channels != wanted.nChannelCount &&
                 !samplerateconverter::CSampleRateConverter::canConvert(channels, wanted.nChannelCount))
-                return makeFailure(peru::format("%s has %d channels, which cannot be converted to %d", name,
-                                                channels, wanted.nChannelCount),
+                return makeFailure(peru::format({"sonora2.CPluginHandler.channels",
+                                                 "%s has %d channels, which cannot be converted to %d"},
+                                                name, channels, wanted.nChannelCount),
                                    uri);
             return makeFailure(
-                peru::format("%s (%s) cannot be converted to %s", name,
-                             describe(source->getSampleRate(), channels, source->getBytesPerSample()),
+                peru::format({"sonora2.CPluginHandler.inconvertible", "%s (%s) cannot be converted to %s"},
+                             name, describe(source->getSampleRate(), channels, source->getBytesPerSample()),
                              describe(wanted.nSampleRate, wanted.nChannelCount, wanted.nBytesPerSample)),
                 uri);
         }
@@ -335,7 +347,7 @@ SFailure CPluginHandler::explainSource(const P<IURI>& uri, int mask, const SAtte
         // The refusal itself is all that is known.
     }
     return makeFailure(
-        peru::format("%s cannot be read as %s", name,
+        peru::format({"sonora2.CPluginHandler.unreadable", "%s cannot be read as %s"}, name,
                      describe(wanted.nSampleRate, wanted.nChannelCount, wanted.nBytesPerSample)),
         uri);
 }
@@ -353,10 +365,11 @@ P<IFormat> CPluginHandler::findFormat(const P<IURI>& uri, int mask, const SForma
     if (!attempts.failure.isEmpty())
         setLastFailure(makeFailure(attempts.failure, getShownName(uri), uri));
     else if (!attempts.declined)
-        setLastFailure(makeFailure(explainExtension(attempts.key, "writes"), uri));
+        setLastFailure(makeFailure(explainWriting(attempts.key), uri));
     else
         setLastFailure(makeFailure(
-            peru::format("No plug-in writes %s with %s", getShownName(uri),
+            peru::format({"sonora2.CPluginHandler.unwritable", "No plug-in writes %s with %s"},
+                         getShownName(uri),
                          describe(record.nSampleRate, record.nChannelCount, record.nBytesPerSample)),
             uri));
     return found;

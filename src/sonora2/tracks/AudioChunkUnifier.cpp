@@ -64,10 +64,10 @@ bool CAudioChunkUnifier::advance() {
 P<IAudioChunk> CAudioChunkUnifier::getChunk(int frames) {
     const int64_t frameBytes = m_format.frameBytes();
     if (m_format.rate <= 0 || m_format.channels <= 0 || m_format.bytes <= 0)
-        throw common::CSonoraError(
-            peru::format({"sonora2.CAudioChunkUnifier.format",
-                          "CAudioChunkUnifier: %d frames per second of %d channels of %d bytes are no sound"},
-                         m_format.rate, m_format.channels, m_format.bytes));
+        throw common::CSonoraError(peru::format(
+            {"sonora2.CAudioChunkUnifier.format",
+             "CAudioChunkUnifier: %d frames per second of %d channels of %d bytes are not a sound format"},
+            m_format.rate, m_format.channels, m_format.bytes));
     if (frames < 0) throw peru::CInvalidArgError("frames", "CAudioChunkUnifier::getChunk");
     if (!m_chunk && !advance()) return nullptr;
 

@@ -41,8 +41,8 @@ CAudioTracklist::CAudioTracklist(bool openInThread, const P<common::ISonoraConte
                          sampleRate <= kMostBytes / (channelCount * bytesPerSample);
     if (!isSound)
         throw common::CSonoraError(peru::format(
-            {"sonora2.CAudioTracklist.format",
-             "CAudioTracklist: %d frames per second of %d channels of %d bytes, %d at a time, are no sound"},
+            {"sonora2.CAudioTracklist.format", "CAudioTracklist: %d frames per second of %d channels of %d "
+                                               "bytes, %d at a time, are not a sound format"},
             sampleRate, channelCount, bytesPerSample, framesPerStep));
 }
 

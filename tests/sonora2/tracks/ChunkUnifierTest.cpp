@@ -58,7 +58,7 @@ TEST_F(ChunkUnifier, BadInput_EndsInsteadOfHanging) {
     source->channels = 0;
     const auto shapeless = peru::make<CAudioChunkUnifier>(context, P<sonora2::common::IAudioSource>(source));
     EXPECT_EQ(errorOf([&] { shapeless->getChunk(100); }),
-              "CAudioChunkUnifier: 44100 frames per second of 0 channels of 2 bytes are no sound");
+              "CAudioChunkUnifier: 44100 frames per second of 0 channels of 2 bytes are not a sound format");
 }
 
 TEST_F(ChunkUnifier, ForeignFormat_IsConverted) {
