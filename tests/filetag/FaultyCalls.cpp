@@ -9,6 +9,7 @@
 #include <linux/filter.h>
 #include <linux/seccomp.h>
 #include <poll.h>
+#include <span>
 #include <sys/ioctl.h>
 #include <sys/prctl.h>
 #include <sys/socket.h>
@@ -31,10 +32,17 @@ constexpr int kFileCalls[] = {
     SYS_renameat,  SYS_renameat2, SYS_ftruncate, SYS_fallocate, SYS_copy_file_range,
     SYS_fsetxattr, SYS_setxattr,  SYS_utimensat};
 
+constexpr int kNetworkCalls[] = {
+#ifdef SYS_open
+    SYS_open,     SYS_poll,
+#endif
+    SYS_openat,   SYS_read,       SYS_write,      SYS_socket,   SYS_connect, SYS_sendto,
+    SYS_recvfrom, SYS_getsockopt, SYS_setsockopt, SYS_eventfd2, SYS_ppoll};
+
 // Returns the descriptor on which the kernel notifies about each of these calls; -1 if unsupported.
-int watchFileCalls() {
+int watchCalls(std::span<const int> calls) {
     std::vector<sock_filter> filter = {BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr))};
-    for (const int call : kFileCalls) {
+    for (const int call : calls) {
         filter.push_back(BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, static_cast<uint32_t>(call), 0, 1));
         filter.push_back(BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_USER_NOTIF));
     }
@@ -45,14 +53,33 @@ int watchFileCalls() {
         ::syscall(SYS_seccomp, SECCOMP_SET_MODE_FILTER, SECCOMP_FILTER_FLAG_NEW_LISTENER, &program));
 }
 
-// send and recv are not among the intercepted calls.
-[[noreturn]] void runChild(int channel, const std::function<std::function<std::string()>()>& prepare) {
-    const std::function<std::string()> operation = prepare();
-    const int listener = watchFileCalls();
+// sendmsg and recvmsg are not among the intercepted calls.
+void report(int channel, const void* data, size_t size) {
+    iovec part{const_cast<void*>(data), size};
+    msghdr message{};
+    message.msg_iov = &part;
+    message.msg_iovlen = 1;
+    ::sendmsg(channel, &message, 0);
+}
+
+bool awaitGo(int channel) {
     char go = 0;
-    if (::send(channel, &listener, sizeof listener, 0) < 0 || ::recv(channel, &go, 1, 0) != 1) ::_exit(1);
-    const std::string report = operation();
-    ::send(channel, report.data(), report.size(), 0);
+    iovec part{&go, 1};
+    msghdr message{};
+    message.msg_iov = &part;
+    message.msg_iovlen = 1;
+    return ::recvmsg(channel, &message, 0) == 1;
+}
+
+[[noreturn]] void runChild(int channel, ECalls calls,
+                           const std::function<std::function<std::string()>()>& prepare) {
+    const std::function<std::string()> operation = prepare();
+    const int listener =
+        watchCalls(calls == ECalls::files ? std::span<const int>(kFileCalls) : kNetworkCalls);
+    report(channel, &listener, sizeof listener);
+    if (!awaitGo(channel)) ::_exit(1);
+    const std::string result = operation();
+    report(channel, result.data(), result.size());
     ::_exit(0);
 }
 
@@ -116,7 +143,7 @@ SFaultyRun runWithFault(const SFault& fault, const std::function<std::function<s
     const pid_t child = ::fork();
     if (child == 0) {
         ::close(channel[0]);
-        runChild(channel[1], prepare);
+        runChild(channel[1], fault.calls, prepare);
     }
     ::close(channel[1]);
 

@@ -1,4 +1,4 @@
-// Runs an operation and makes selected file system calls of it fail.
+// Runs an operation and makes selected system calls of it fail.
 #pragma once
 
 #include <functional>
@@ -6,10 +6,18 @@
 
 namespace tests {
 
+enum class ECalls {
+    files, // opening, reading, writing, copying, syncing, renaming and truncating files, changing their owner
+           // and mode
+    network, // opening files, reading and writing; sockets, their options, connecting, sending, receiving,
+             // waiting
+};
+
 struct SFault {
-    int call = 0;         // the first file call that fails, counted from 1; 0 for none
+    int call = 0;         // the first of these calls that fails, counted from 1; 0 for none
     int error = 0;        // the errno it fails with; 0 kills the process instead
     bool forGood = false; // all later calls fail as well
+    ECalls calls = ECalls::files;
 };
 
 struct SFaultyRun {
@@ -20,10 +28,9 @@ struct SFaultyRun {
     std::string report;    // what the operation returned; empty if it did not finish
 };
 
-// Runs the operation in a child process. Calls are intercepted in the kernel, whichever library makes them:
-// opening, reading, writing, copying, syncing, renaming and truncating files and changing their owner and
-// mode. Closing and removing always work, as they do on a full or broken disk. `prepare` runs before the
-// counting starts.
+// Runs the operation in a child process. Calls are intercepted in the kernel, whichever library makes them.
+// Closing and removing always work, as they do on a full or broken disk. `prepare` runs before the counting
+// starts.
 SFaultyRun runWithFault(const SFault& fault, const std::function<std::function<std::string()>()>& prepare);
 
 } // namespace tests
