@@ -1,5 +1,6 @@
 #include "media/PlaySource.h"
 
+#include "base/CancelWatch.h"
 #include "base/Text.h"
 #include "base/Translation.h"
 #include "library/Failure.h"
@@ -93,8 +94,9 @@ private:
 
 namespace {
 
-// The reason of the stream comes before that of its decoder.
+// Waits for sound; Ctrl-C ends that. The reason of the stream comes before that of its decoder.
 SSoundFile openStream(CWebStream& stream) {
+    const CCancelWatch watch([&stream] { stream.stop(); });
     try {
         return openSoundPipe(stream.getPath());
     } catch (const std::runtime_error& failure) {

@@ -1,6 +1,8 @@
 // Playing what web servers send without an end in sight.
 #include "host/Sound.h"
 
+#include <algorithm>
+
 using namespace tests;
 
 namespace {
@@ -20,6 +22,10 @@ constexpr const char* kServer = "import http.server as h, sys\n"
                                 "        self.send_header('Transfer-Encoding', 'chunked')\n"
                                 "        self.end_headers()\n"
                                 "        try:\n"
+                                "            if self.path == '/silent':\n"
+                                "                self.send_chunk(b'RIFF')\n"
+                                "                print('silent')\n"
+                                "                return self.rfile.read()\n"
                                 "            self.send_chunk(sound)\n"
                                 "            while self.path == '/endless':\n"
                                 "                self.send_chunk(sound[-44100 * 4:])\n"
@@ -42,10 +48,14 @@ protected:
         wav.replace(wav.find("data") + 4, 4, "\xFF\xFF\xFF\xFF");
         folder.write("sound", wav);
         m_server.emplace(std::vector<std::string>{"python3", "-u", "-c", kServer}, folder.path());
-        const auto end = Clock::now() + std::chrono::seconds(30);
-        while (m_server->readOut().find('\n') == std::string::npos && Clock::now() < end)
-            std::this_thread::sleep_for(std::chrono::milliseconds(10));
+        waitForLines(1);
         base = "http://127.0.0.1:" + std::to_string(std::atoi(m_server->readOut().c_str()));
+    }
+    // That many lines of the server: its port, then one for each request that it leaves waiting.
+    void waitForLines(ptrdiff_t lines) {
+        const auto end = Clock::now() + std::chrono::seconds(30);
+        while (std::ranges::count(m_server->readOut(), '\n') < lines && Clock::now() < end)
+            std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
     // Nothing was copied, and the pipes are gone.
     void TearDown() override {
@@ -90,4 +100,12 @@ TEST_F(PlayStream, EndlessOnesPlayUntilTheUserStops) {
         terminal->type(key);
         EXPECT_EQ(terminal->getProcess().wait().exitCode, key == 'q' ? 0 : 130);
     }
+}
+
+// While the decoder waits for the first sound.
+TEST_F(PlayStream, CtrlCEndsTheWaitForOne) {
+    const auto terminal = start({"play", base + "/silent"});
+    waitForLines(3); // the first request finds out whether there is an end
+    terminal->getProcess().signal(SIGINT);
+    EXPECT_EQ(terminal->getProcess().wait().exitCode, 130);
 }
