@@ -73,6 +73,14 @@ void translateHelp(CLI::App& app) {
     formatter->label("Excludes", tr("host.help.Excludes", "Excludes"));
 }
 
+// Commands get "--help" before the defaults of options.
+void groupHelp(CLI::App& app) {
+    for (CLI::App* const command : app.get_subcommands({})) {
+        command->get_help_ptr()->group(tr("host.help.Options", "Options"));
+        groupHelp(*command);
+    }
+}
+
 // Exceptions that the commands do not catch are failures of the job, not of loading the library.
 int runCommand(const Run& run, CLibrary& library) {
     try {
@@ -138,6 +146,7 @@ int main(int argc, char** argv) {
     for (const auto add : {addConvert, addInfo, addFormats, addWaveform, addLoudness, addDevices, addPlay,
                            addMix, addRecord, addTag, addDrives, addDisc, addRip, addCddb, addGet})
         add(app, run);
+    groupHelp(app);
     // The parser's own message would not name the unknown command.
     const auto isMeant = [&](const CLI::App* command) { return command->check_name(argv[1]); };
     if (argc > 1 && argv[1][0] != '-' && app.get_subcommands(isMeant).empty()) {

@@ -40,10 +40,10 @@ CAudioTracklist::CAudioTracklist(bool openInThread, const P<common::ISonoraConte
                          framesPerStep <= kMostBytes / (channelCount * bytesPerSample) &&
                          sampleRate <= kMostBytes / (channelCount * bytesPerSample);
     if (!isSound)
-        throw common::CSonoraError(peru::format(
-            {"sonora2.CAudioTracklist.format", "CAudioTracklist: %d frames per second of %d channels of %d "
-                                               "bytes, %d at a time, are not a sound format"},
-            sampleRate, channelCount, bytesPerSample, framesPerStep));
+        throw common::CSonoraError(peru::format({"sonora2.CAudioTracklist.format",
+                                                 "CAudioTracklist: %d frames per second of %d channels of %d "
+                                                 "bytes, %d at a time, are not a sound format"},
+                                                sampleRate, channelCount, bytesPerSample, framesPerStep));
 }
 
 CAudioTracklist::~CAudioTracklist() = default;
