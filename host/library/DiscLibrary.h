@@ -40,11 +40,22 @@ namespace host {
     X(DataCursorIsFolder)                                                                                    \
     X(DataCursorGetDiscPathW)                                                                                \
     X(DataCursorGetSize)                                                                                     \
-    X(DataCursorCreateSubCursor)
+    X(DataCursorCreateSubCursor)                                                                             \
+    X(ProjectGetVirtualDisc)                                                                                 \
+    X(DiscAudioSetSegmentPregap)                                                                             \
+    X(DiscAudioSetMetaDataStringW)                                                                           \
+    X(DiscAudioSetSegmentMetaDataStringW)                                                                    \
+    X(DiscDataSetTitleW)                                                                                     \
+    X(DiscDataCreateFolderW)                                                                                 \
+    X(DiscDataAddFileW)                                                                                      \
+    X(ProjectWriteImageW)
+// A library without support for burners lacks these: null.
+#define HOST_BURNER_FUNCTIONS(X) X(ProjectWriteDisc)
 
 struct SDiscFunctions {
 #define HOST_DECLARE(name) decltype(&::DISCIO_##name) name = nullptr;
     HOST_DISC_FUNCTIONS(HOST_DECLARE)
+    HOST_BURNER_FUNCTIONS(HOST_DECLARE)
 #undef HOST_DECLARE
 };
 

@@ -22,6 +22,7 @@ namespace host {
     X(AudioSource_FetchStreamSamples)                                                                        \
     X(CreateAudioSoureFromAudioInDevice)                                                                     \
     X(AudioSource_Open)                                                                                      \
+    X(AudioSource_Close)                                                                                     \
     X(AudioSource_SetRecordingCallback)                                                                      \
     X(AudioSource_SetRecordingVolumeCallback)                                                                \
     X(CreateAudioFormatFromURI)                                                                              \
@@ -51,7 +52,8 @@ namespace host {
     X(FileTag_SetTrackNumber)                                                                                \
     X(FileTag_SetYear)                                                                                       \
     X(FileTag_SetGenre)                                                                                      \
-    X(FileTag_SetComment)
+    X(FileTag_SetComment)                                                                                    \
+    X(AudioCDProject_AddTrackFromAudioSource)
 
 // Only one object at a time.
 class CLibrary {

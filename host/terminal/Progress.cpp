@@ -85,28 +85,39 @@ void CProgress::advance(Job job, double fraction) {
 }
 
 void CProgress::finish(Job job, const SJobResult& result) {
-    std::lock_guard lock(m_mutex);
-    m_jobs[job].running = false;
-    eraseBars();
+    std::string file;
+    {
+        std::lock_guard lock(m_mutex);
+        file = nameOutput(job);
+    }
     nlohmann::json details{{"codec", result.codec},
                            {"duration", result.duration},
                            {"seconds", result.elapsed},
                            {"bytes", result.bytes}};
     if (result.gain) details["gain"] = *result.gain;
-    emit(job, "done", details);
     char speed[32], gain[32];
     std::snprintf(speed, sizeof speed, "%.0f", result.duration / std::max(result.elapsed, 1e-6));
     std::snprintf(gain, sizeof gain, "%+.1f", result.gain.value_or(0.0));
-    const std::initializer_list<STextValue> values{{"%FILE%", nameOutput(job)},
+    const std::initializer_list<STextValue> values{{"%FILE%", file},
                                                    {"%CODEC%", result.codec},
                                                    {"%DURATION%", formatDuration(result.duration)},
                                                    {"%SIZE%", formatSize(result.bytes)},
                                                    {"%GAIN%", gain},
                                                    {"%SPEED%", speed}};
-    say(result.gain ? tr("host.Progress.doneWithGain",
-                         "%FILE%: %CODEC%, %DURATION%, %SIZE%, %GAIN% dB, %SPEED% times real time", values)
-                    : tr("host.Progress.done", "%FILE%: %CODEC%, %DURATION%, %SIZE%, %SPEED% times real time",
-                         values));
+    finish(job,
+           result.gain ? tr("host.Progress.doneWithGain",
+                            "%FILE%: %CODEC%, %DURATION%, %SIZE%, %GAIN% dB, %SPEED% times real time", values)
+                       : tr("host.Progress.done",
+                            "%FILE%: %CODEC%, %DURATION%, %SIZE%, %SPEED% times real time", values),
+           details);
+}
+
+void CProgress::finish(Job job, const std::string& line, const nlohmann::json& details) {
+    std::lock_guard lock(m_mutex);
+    m_jobs[job].running = false;
+    eraseBars();
+    emit(job, "done", details);
+    say(line);
     drawBars();
 }
 

@@ -40,6 +40,8 @@ public:
               const nlohmann::json& details);
     void advance(Job job, double fraction);
     void finish(Job job, const SJobResult& result);
+    // The same for a job with another kind of result: a line for the user, and its parts for JSON.
+    void finish(Job job, const std::string& line, const nlohmann::json& details);
     // Of a job whose result is not a file. The caller prints it.
     void finishWith(Job job, const nlohmann::json& details);
     // Hides the job's bar until the next progress.
