@@ -144,7 +144,7 @@ int main(int argc, char** argv) {
 
     Run run;
     for (const auto add : {addConvert, addInfo, addFormats, addWaveform, addLoudness, addDevices, addPlay,
-                           addMix, addRecord, addTag, addDrives, addDisc, addRip, addCddb, addGet})
+                           addMix, addRecord, addTag, addDrives, addDisc, addRip, addBurn, addCddb, addGet})
         add(app, run);
     groupHelp(app);
     // The parser's own message would not name the unknown command.

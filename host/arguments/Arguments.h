@@ -19,6 +19,7 @@ void addTag(CLI::App& app, Run& run);
 void addDrives(CLI::App& app, Run& run);
 void addDisc(CLI::App& app, Run& run);
 void addRip(CLI::App& app, Run& run);
+void addBurn(CLI::App& app, Run& run);
 void addCddb(CLI::App& app, Run& run);
 void addGet(CLI::App& app, Run& run);
 
