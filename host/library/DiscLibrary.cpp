@@ -23,13 +23,9 @@ SDiscFunctions load() {
     if (!module) throw std::runtime_error(std::string("The disc library cannot be loaded: ") + ::dlerror());
     SDiscFunctions functions;
 #define HOST_RESOLVE(name)                                                                                   \
-    functions.name = reinterpret_cast<decltype(functions.name)>(::dlsym(module, "DISCIO_" #name));
-#define HOST_REQUIRE(name)                                                                                   \
-    HOST_RESOLVE(name)                                                                                       \
+    functions.name = reinterpret_cast<decltype(functions.name)>(::dlsym(module, "DISCIO_" #name));           \
     if (!functions.name) throw std::runtime_error("The disc library has no function DISCIO_" #name);
-    HOST_DISC_FUNCTIONS(HOST_REQUIRE)
-    HOST_BURNER_FUNCTIONS(HOST_RESOLVE)
-#undef HOST_REQUIRE
+    HOST_DISC_FUNCTIONS(HOST_RESOLVE)
 #undef HOST_RESOLVE
     return functions;
 }

@@ -48,14 +48,12 @@ namespace host {
     X(DiscDataSetTitleW)                                                                                     \
     X(DiscDataCreateFolderW)                                                                                 \
     X(DiscDataAddFileW)                                                                                      \
-    X(ProjectWriteImageW)
-// A library without support for burners lacks these: null.
-#define HOST_BURNER_FUNCTIONS(X) X(ProjectWriteDisc)
+    X(ProjectWriteImageW)                                                                                    \
+    X(ProjectWriteDisc)
 
 struct SDiscFunctions {
 #define HOST_DECLARE(name) decltype(&::DISCIO_##name) name = nullptr;
     HOST_DISC_FUNCTIONS(HOST_DECLARE)
-    HOST_BURNER_FUNCTIONS(HOST_DECLARE)
 #undef HOST_DECLARE
 };
 

@@ -140,8 +140,6 @@ bool CDiscProject::writeImage(const std::filesystem::path& image, const SWriteSe
 }
 
 bool CDiscProject::writeDisc(DISCIO_Drive* drive, const SWriteSettings& settings, const Progress& progress) {
-    if (!getDiscFunctions().ProjectWriteDisc)
-        throw std::runtime_error(tr("host.Burn.noBurner", "The disc library has no support for burners"));
     return write(settings, progress,
                  [&](const SDiscFunctions& functions, const DISCIO_WriteOptions& options) {
                      return functions.ProjectWriteDisc(m_project, drive, &options);
