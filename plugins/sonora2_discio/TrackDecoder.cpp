@@ -29,7 +29,10 @@ SDecodedMedia CTrackDecoder::open(const SDecoderOptions&) {
     require(stream.funcs->open(stream.user));
     const SPcmFormat format{stream.funcs->getSampleRate(stream.user),
                             stream.funcs->getChannelCount(stream.user), 2};
-    return {format, stream.funcs->getFrameCount(stream.user), "CD audio"};
+    SDecodedMedia media{format, stream.funcs->getFrameCount(stream.user), "CD audio"};
+    // Reading a track of a project reads a source of this process, under the application's lock.
+    media.isDirect = m_file.uri->getScheme()->equals("discioppvirtualdiscaudiocd");
+    return media;
 }
 
 void CTrackDecoder::close() {

@@ -15,6 +15,7 @@ struct SDecodedMedia {
     std::string codec = {};  // to show to users, such as "FLAC" or "PCM signed 24 bit"; empty when unknown
     int floatBytes = 0;      // size of the file's floating-point samples if deliverFloat() is supported
     bool isEstimate = false; // the length is not exact: the sound ends where read() returns 0
+    bool isDirect = false;   // read() takes locks of the caller, so another thread must not decode ahead
 };
 
 // One of several soundtracks in a file.

@@ -210,7 +210,8 @@ void CDecoderSource::peekChunk() {
 P<audio::IAudioChunk> CDecoderSource::pullChunk() {
     if (!m_readAhead) {
         m_readAhead = std::make_unique<CReadAhead>(
-            *m_producer, getReadAheadChunks(m_delivered, m_producer->getChunkFrames()));
+            *m_producer,
+            m_media.isDirect ? 0 : getReadAheadChunks(m_delivered, m_producer->getChunkFrames()));
     }
     return m_readAhead->next();
 }

@@ -7,7 +7,7 @@
 namespace sonora2::plugins {
 
 CReadAhead::CReadAhead(CChunkProducer& producer, size_t limit)
-    : m_producer(producer), m_limit(std::max<size_t>(limit, 2)) {}
+    : m_producer(producer), m_limit(limit == 0 ? 0 : std::max<size_t>(limit, 2)) {}
 
 CReadAhead::~CReadAhead() {
     if (!m_thread) return;
@@ -21,12 +21,13 @@ CReadAhead::~CReadAhead() {
 
 P<audio::IAudioChunk> CReadAhead::next() {
     if (!m_thread) {
-        // No thread is running yet. If none can be created, decoding continues on the caller's thread.
+        // No thread is running yet. If none is wanted or can be created, decoding continues on the caller's
+        // thread.
         P<audio::IAudioChunk> chunk;
-        if (!m_ended && produce(chunk, m_error))
-            startThread();
-        else
+        if (m_ended || !produce(chunk, m_error))
             m_ended = true;
+        else if (m_limit > 0)
+            startThread();
         if (!chunk && m_error) std::exchange(m_error, nullptr)->raise();
         return chunk;
     }
@@ -57,7 +58,8 @@ bool CReadAhead::isEnded() const {
 
 int CReadAhead::getFill() const {
     std::lock_guard lock(m_mutex);
-    return m_ended ? 100 : static_cast<int>(100 * std::min(m_chunks.size(), m_limit) / m_limit);
+    return m_ended || m_limit == 0 ? 100
+                                   : static_cast<int>(100 * std::min(m_chunks.size(), m_limit) / m_limit);
 }
 
 void CReadAhead::startThread() {

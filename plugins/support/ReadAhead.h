@@ -14,7 +14,8 @@ namespace sonora2::plugins {
 // so a source that is only opened as a test, or is shorter than a chunk, never starts one.
 class CReadAhead {
 public:
-    // The producer must outlive this object and must not be used by anyone else meanwhile.
+    // The producer must outlive this object and must not be used by anyone else meanwhile. Without a limit in
+    // chunks, 0, every chunk is decoded on the caller's thread when it is asked for.
     CReadAhead(CChunkProducer& producer, size_t limit);
     ~CReadAhead(); // stops the thread after the chunk that it is decoding
 
