@@ -479,6 +479,10 @@ struct DISCIO_Project;
  * handle. */
 TONEWRIGHT_API struct DISCIO_Project* TONEWRIGHT_Host_GetDiscProject(TONEWRIGHT_Handle project);
 
+/* The URI of a project's disc. With "Track01.cda" and so on appended, it is the URI of a track for
+ * TONEWRIGHT_CreateAudioSourceFromURI, as long as the project exists. Null for another handle. */
+TONEWRIGHT_API char16_t* TONEWRIGHT_Host_GetDiscProjectURI(TONEWRIGHT_Handle project);
+
 /* --- Look-up of discs (CDDB) --------------------------------------------------------------------- */
 
 /* Album and track titles of an audio CD from a server that speaks the CDDB protocol over HTTP. No server is

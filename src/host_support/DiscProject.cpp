@@ -18,3 +18,10 @@ DISCIO_Project* TONEWRIGHT_Host_GetDiscProject(TONEWRIGHT_Handle project) {
     return guard<DISCIO_Project*>(
         nullptr, [&] { return require<disciopp::IProject>(project, "a disc project")->getProjectHandle(); });
 }
+
+char16_t* TONEWRIGHT_Host_GetDiscProjectURI(TONEWRIGHT_Handle project) {
+    return guard<char16_t*>(nullptr, [&] {
+        const P<peru::IURI> root = require<disciopp::IProject>(project, "a disc project")->getRootURI();
+        return TONEWRIGHT_Host_ToUTF16(peru::CString::toStdString(root->getAsString()).c_str());
+    });
+}

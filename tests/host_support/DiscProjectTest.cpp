@@ -88,6 +88,30 @@ TEST_F(DiscProject, TracksHoldTheSourcesAndSilenceUpToTheirLengths) {
     for (const SScript& script : scripts) EXPECT_EQ(script.released, 1);
 }
 
+TEST_F(DiscProject, TracksAreSourcesOfOtherProjects) {
+    SScript script{makeSectors(200, 3), 200 * 588};
+    const CHandle first(TONEWRIGHT_Host_CreateAudioCDProject()),
+        second(TONEWRIGHT_Host_CreateAudioCDProject());
+    ASSERT_EQ(TONEWRIGHT_AudioCDProject_AddTrackFromAudioSource(first.get(), createSource(script).get(), -1),
+              TONEWRIGHT_OK);
+    char16_t* const root = TONEWRIGHT_Host_GetDiscProjectURI(first.get());
+    const std::u16string uri = std::u16string(root) + u"Track01.cda";
+    TONEWRIGHT_Host_Free(root);
+    const CHandle track(TONEWRIGHT_CreateAudioSourceFromURI(uri.c_str(), 44100, 2, 2, 0));
+    ASSERT_TRUE(track);
+    // Opening, reading in part and closing takes the lock that reading takes.
+    ASSERT_EQ(TONEWRIGHT_AudioSource_Open(track.get()), TONEWRIGHT_OK);
+    const CHandle reader(TONEWRIGHT_Host_CreateReader(track.get()));
+    std::string frames(4 * 5000, '\0');
+    EXPECT_EQ(TONEWRIGHT_Host_ReadFrames(reader.get(), frames.data(), 5000), 5000);
+    EXPECT_TRUE(frames == script.pcm.substr(0, frames.size()));
+    EXPECT_EQ(TONEWRIGHT_AudioSource_Close(track.get()), TONEWRIGHT_OK);
+    ASSERT_EQ(TONEWRIGHT_AudioCDProject_AddTrackFromAudioSource(second.get(), track.get(), -1),
+              TONEWRIGHT_OK);
+    ASSERT_EQ(write(second, "a.cue"), 1);
+    EXPECT_TRUE(SOpenDisc((folder / "a.cue").string()).readSegment(0) == script.pcm);
+}
+
 TEST_F(DiscProject, ASourceThatFailsLeavesNoImage) {
     SScript script{makeSectors(5, 1), 9 * 588, true};
     const CHandle project(TONEWRIGHT_Host_CreateAudioCDProject());
