@@ -31,6 +31,8 @@ struct STrack {
     Texts texts = {};
 
     int32_t end() const { return start + length; }
+    // Nobody can read the pause before block 0.
+    int32_t getReadablePregap() const { return std::clamp(pregap, 0, std::max(start, 0)); }
 };
 
 struct STableOfContents {

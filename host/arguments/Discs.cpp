@@ -7,14 +7,17 @@
 
 #include <algorithm>
 #include <memory>
+#include <thread>
 
 namespace host {
 
 namespace {
 
-constexpr const char* kPlace = "A drive by its path in tonewright drives, or a disc image (.cue, .toc, .nrg, "
-                               ".iso); by default the first "
-                               "drive with a disc";
+std::string describePlace() {
+    return tr("host.help.disc.place",
+              "A drive by its path in tonewright drives, or a disc image (.cue, .toc, .nrg, "
+              ".iso); by default the first drive with a disc");
+}
 
 // "1,3-5". Throws CLI::ValidationError.
 std::set<int> parseTracks(const std::string& text) {
@@ -22,15 +25,17 @@ std::set<int> parseTracks(const std::string& text) {
     std::istringstream parts(text);
     for (std::string part; std::getline(parts, part, ',');) {
         std::istringstream in(part);
-        int first = 0, last = 0;
+        int first = -1, last = 0;
         char dash = 0, rest = 0;
         in >> first;
         last = first;
         if (in >> dash) in >> last;
-        if (in.fail() && !(in.eof() && dash == 0)) first = 0;
-        if (first < 1 || last < first || last > 99 || (dash != 0 && dash != '-') || in >> rest)
+        if (in.fail() && !(in.eof() && dash == 0)) first = -1;
+        if (first < 0 || last < first || last > 99 || (dash != 0 && dash != '-') || in >> rest)
             throw CLI::ValidationError("TRACKS",
-                                       part + " is not a track or a range of tracks, such as 1,3-5");
+                                       tr("host.Rip.badTracks",
+                                          "%TEXT% is not a track or a range of tracks, such as 1,3-5",
+                                          {{"%TEXT%", part}}));
         for (int track = first; track <= last; ++track) tracks.insert(track);
     }
     return tracks;
@@ -57,10 +62,13 @@ void addDrives(CLI::App& app, Run& run) {
     };
     const auto options = std::make_shared<SOptions>();
     CLI::App* command = app.add_subcommand(
-        "drives", "List the drives for discs, and the folders of disc images in TONEWRIGHT_DRIVE_FOLDERS.");
-    command->add_flag("--json", options->json, "Print one JSON object per line");
-    command->add_flag("-w,--watch", options->watches,
-                      "Also print when a disc is put in or taken out, until Ctrl-C");
+        "drives",
+        tr("host.help.drives",
+           "List the drives for discs, and the folders of disc images in TONEWRIGHT_DRIVE_FOLDERS."));
+    command->add_flag("--json", options->json, tr("host.help.jsonLines", "Print one JSON object per line"));
+    command->add_flag(
+        "-w,--watch", options->watches,
+        tr("host.help.drives.watch", "Also print when a disc is put in or taken out, until Ctrl-C"));
     command->callback([options, &run] {
         run = [options](CLibrary& library) {
             return options->watches ? watchDrives(library, options->json) : listDrives(options->json);
@@ -74,9 +82,10 @@ void addDisc(CLI::App& app, Run& run) {
         bool json = false;
     };
     const auto options = std::make_shared<SOptions>();
-    CLI::App* command = app.add_subcommand("disc", "Show the tracks, texts and files of a disc.");
-    command->add_option("DISC", options->place, kPlace)->option_text(" ");
-    command->add_flag("--json", options->json, "Print one JSON object per line");
+    CLI::App* command =
+        app.add_subcommand("disc", tr("host.help.disc", "Show the tracks, texts and files of a disc."));
+    command->add_option("DISC", options->place, describePlace())->option_text(" ");
+    command->add_flag("--json", options->json, tr("host.help.jsonLines", "Print one JSON object per line"));
     command->callback(
         [options, &run] { run = [options](CLibrary&) { return showDisc(options->place, options->json); }; });
 }
@@ -89,26 +98,45 @@ void addRip(CLI::App& app, Run& run) {
         SCddbAccess access;
     };
     const auto options = std::make_shared<SOptions>();
-    CLI::App* command = app.add_subcommand(
-        "rip",
-        "Copy the audio tracks of a disc into sound files, exactly sample for sample, with a report of each\n"
-        "track's CRC-32, length, repaired places and peak.");
-    command->add_option("DISC", options->place, kPlace)->option_text(" ");
-    command->add_option("TRACKS", options->tracksText, "Tracks to copy, such as 1,3-5; by default all")
-        ->option_text(" ");
-    command->add_option("--to", options->extension, "Type of the files (default: flac)")->option_text("EXT");
+    CLI::App* command =
+        app.add_subcommand("rip", tr("host.help.rip", "Copy the audio tracks of a disc into sound files, "
+                                                      "exactly sample for sample, with a report of each\n"
+                                                      "track's CRC-32, length, repaired places and peak."));
+    command->add_option("DISC", options->place, describePlace())->option_text(" ");
     command
-        ->add_option("-d,--directory", options->directory, "Folder for the files (default: the current one)")
+        ->add_option(
+            "TRACKS", options->tracksText,
+            tr("host.help.rip.tracks",
+               "Tracks to copy, such as 1,3-5, and 0 for the sound before track 1; by default all tracks"))
+        ->option_text(" ");
+    command
+        ->add_option("--to", options->extension, tr("host.help.rip.to", "Type of the files (default: flac)"))
+        ->option_text("EXT");
+    command
+        ->add_option("-d,--directory", options->directory,
+                     tr("host.help.rip.directory", "Folder for the files (default: the current one)"))
         ->option_text("FOLDER");
     command
         ->add_option("--pattern", options->pattern,
-                     "Names of the files (default: \"%track% %title%\"); fields: " +
-                         CNamePattern::describeFields())
+                     tr("host.help.rip.pattern",
+                        "Names of the files (default: \"%track% %title%\"); fields: %FIELDS%",
+                        {{"%FIELDS%", CNamePattern::describeFields()}}))
         ->option_text("TEXT");
-    command->add_flag("--verify", options->verify, "Read every track twice and compare");
-    command->add_flag("--cue", options->writeCue, "Also write a cue sheet");
-    command->add_flag("-f,--force", options->force, "Replace existing files");
+    command->add_flag("--verify", options->verify,
+                      tr("host.help.rip.verify", "Read every track twice and compare"));
+    command->add_flag(
+        "--cue", options->writeCue,
+        tr("host.help.rip.cue",
+           "Also write a cue sheet; the files then hold the pregaps and the sound before track 1 as well"));
+    command->add_flag("-f,--force", options->force, tr("host.help.rip.force", "Replace existing files"));
     addLookup(*command, options->looksUp, options->access, options->pick);
+    options->jobs = static_cast<int>(std::max(std::thread::hardware_concurrency(), 1u));
+    command
+        ->add_option("-j,--jobs", options->jobs,
+                     tr("host.help.rip.jobs",
+                        "Tracks of a disc image copied at a time (default: number of processor cores)"))
+        ->option_text("N")
+        ->check(CLI::Range(1, 256));
     addFormat(*command, *options, {16});
     // The samples of the disc are copied as they are.
     for (const char* name : {"--rate", "--channels", "--bits"})

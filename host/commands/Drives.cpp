@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "media/Disc.h"
 #include "terminal/Progress.h"
 
@@ -34,7 +35,8 @@ void onDriveChanged(void* drive, int32_t event) {
     s_arrived.notify_one();
 }
 
-const char* describe(int32_t event) {
+// The names of the events for programs.
+const char* getName(int32_t event) {
     switch (event) {
     case 1:
         return "arrived";
@@ -49,6 +51,21 @@ const char* describe(int32_t event) {
     }
 }
 
+std::string describe(int32_t event) {
+    switch (event) {
+    case 1:
+        return tr("host.Drives.arrived", "arrived");
+    case 2:
+        return tr("host.Drives.notReady", "not ready");
+    case 3:
+        return tr("host.Drives.ready", "ready");
+    case 4:
+        return tr("host.Drives.removed", "removed");
+    default:
+        return tr("host.Drives.unknown", "unknown");
+    }
+}
+
 std::string describeState(const SDrive& drive) {
     const SDiscFunctions& functions = getDiscFunctions();
     if (functions.DriveCheckDisc(drive.handle.get(), 1000, 0) != 1) return "";
@@ -60,8 +77,12 @@ std::string describeState(const SDrive& drive) {
 
 int listDrives(bool json) {
     const std::vector<SDrive> drives = findDrives();
-    if (drives.empty() && !json) std::fprintf(stderr, "tonewright: There is no drive\n");
-    if (!drives.empty() && !json) std::printf("%-24s %-10s %-10s  %s\n", "drive", "disc", "revision", "name");
+    if (drives.empty() && !json)
+        std::fprintf(stderr, "tonewright: %s\n", tr("host.Disc.noDrive", "There is no drive").c_str());
+    if (!drives.empty() && !json)
+        std::printf("%-24s %-10s %-10s  %s\n", tr("host.Drives.drive", "drive").c_str(),
+                    tr("host.Drives.disc", "disc").c_str(), tr("host.Drives.revision", "revision").c_str(),
+                    tr("host.Drives.name", "name").c_str());
     for (const SDrive& drive : drives) {
         const std::string medium = describeState(drive);
         if (json)
@@ -92,10 +113,9 @@ int watchDrives(CLibrary& library, bool json) {
         }
         for (const SEvent& event : events) {
             if (json)
-                std::printf("%s\n",
-                            toLine({{"event", describe(event.event)}, {"drive", event.path}}).c_str());
+                std::printf("%s\n", toLine({{"event", getName(event.event)}, {"drive", event.path}}).c_str());
             else
-                std::printf("%-10s %s\n", describe(event.event), toPrintable(event.path).c_str());
+                std::printf("%-10s %s\n", describe(event.event).c_str(), toPrintable(event.path).c_str());
         }
         if (!events.empty()) isRead = flushOutput();
     }

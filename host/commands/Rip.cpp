@@ -2,6 +2,7 @@
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "library/Failure.h"
 #include "media/Disc.h"
 #include "media/DiscNames.h"
@@ -11,10 +12,14 @@
 #include "media/WholeTag.h"
 
 #include <algorithm>
-#include <cmath>
+#include <atomic>
+#include <chrono>
 #include <cstdio>
 #include <fstream>
+#include <mutex>
 #include <stdexcept>
+#include <system_error>
+#include <thread>
 
 namespace host {
 
@@ -37,34 +42,44 @@ std::string quote(std::string text) {
     return "\"" + text + "\"";
 }
 
+// What becomes one file.
+struct SPart {
+    SDiscTrack track; // 0 is the sound before track 1
+    int64_t gap = 0;  // frames of the next track's pregap at the end
+    fs::path file = {};
+    std::string report = {};
+
+    int64_t getFrames() const { return int64_t{track.length} * kBlockFrames + gap; }
+};
+
+// "MM:SS:FF"
+std::string formatPlace(int32_t blocks) {
+    char text[32];
+    std::snprintf(text, sizeof text, "%02d:%02d:%02d", blocks / kBlocksPerSecond / 60,
+                  blocks / kBlocksPerSecond % 60, blocks % kBlocksPerSecond);
+    return text;
+}
+
 class CRipper {
 public:
     CRipper(CLibrary& library, const SRipOptions& options, CDisc disc)
         : m_library(library), m_options(options), m_disc(std::move(disc)), m_progress(options.show),
-          m_temporaryEnding(setTemporaryEnding(library)) {
-        for (const SDiscTrack& track : m_disc.getTracks())
-            if (track.number > 0 && (options.tracks.empty() || options.tracks.contains(track.number)))
-                m_tracks.push_back(track);
-        for (const int number : options.tracks)
-            if (std::none_of(m_tracks.begin(), m_tracks.end(),
-                             [&](const SDiscTrack& track) { return track.number == number; }))
-                throw std::runtime_error(m_disc.getPlace() + " has no audio track " + std::to_string(number));
-        if (m_tracks.empty()) throw std::runtime_error(m_disc.getPlace() + " has no audio tracks");
+          m_temporaryEnding(setTemporaryEnding(library)), m_album(m_disc.getText(DISCIO_TEXT_TITLE)),
+          m_albumArtist(m_disc.getText(DISCIO_TEXT_PERFORMER)) {
+        findParts();
     }
 
     int run();
 
 private:
-    struct SDone {
-        SDiscTrack track;
-        fs::path file;
-    };
-
+    void findParts();
     fs::path getTarget(const SDiscTrack& track) const;
     CNamePattern::Fields getFields(const SDiscTrack& track) const;
-    bool ripTrack(const SDiscTrack& track, const fs::path& target, CProgress::Job job);
+    std::unique_ptr<CTrackReader> openPart(const SPart& part);
+    bool ripPart(SPart& part);
+    bool copyPart(SPart& part, CProgress::Job job);
     void setTags(const SDiscTrack& track, const fs::path& temporary) const;
-    void report(const SDiscTrack& track, const fs::path& target, const CTrackReader& reader) const;
+    void report(SPart& part, const CTrackReader& reader);
     void writeCue() const;
 
     CLibrary& m_library;
@@ -72,17 +87,55 @@ private:
     CDisc m_disc;
     CProgress m_progress;
     std::string m_temporaryEnding;
-    std::vector<SDiscTrack> m_tracks;
-    std::vector<SDone> m_done;
+    std::string m_album;
+    std::string m_albumArtist;
+    std::vector<SPart> m_parts;
+    std::mutex m_mutex; // guards the disc, and standard output for the reports
 };
 
+// With a cue sheet, the files together hold every sample of the disc: a pregap is at the end of the track
+// before, and the sound before track 1 has a file of its own.
+void CRipper::findParts() {
+    const std::string place = m_disc.getPlace();
+    std::set<int> wanted = m_options.tracks;
+    const bool isAll = wanted.empty();
+    const auto throwMissing = [&](int number) {
+        throw std::runtime_error(tr("host.Rip.noTrack", "%DISC% has no audio track %TRACK%",
+                                    {{"%DISC%", place}, {"%TRACK%", std::to_string(number)}}));
+    };
+    if (m_disc.getHiddenBlocks() > 0 && (wanted.contains(0) || (isAll && m_options.writeCue))) {
+        SPart part;
+        part.track.title = tr("host.Rip.hidden", "Hidden track");
+        part.track.length = m_disc.getHiddenBlocks();
+        m_parts.push_back(part);
+    } else if (wanted.contains(0)) {
+        throw std::runtime_error(
+            tr("host.Rip.noHidden", "%DISC% has no sound before track 1", {{"%DISC%", place}}));
+    }
+    wanted.erase(0);
+    const std::vector<SDiscTrack>& tracks = m_disc.getTracks();
+    for (size_t i = 0; i < tracks.size(); ++i) {
+        const SDiscTrack& track = tracks[i];
+        if (track.number == 0 || !(isAll || wanted.erase(track.number) > 0)) continue;
+        SPart part;
+        part.track = track;
+        const bool hasNext = i + 1 < tracks.size() && (isAll || wanted.contains(tracks[i + 1].number));
+        if (m_options.writeCue && hasNext) part.gap = int64_t{tracks[i + 1].readable} * kBlockFrames;
+        m_parts.push_back(part);
+    }
+    if (!wanted.empty()) throwMissing(*wanted.begin());
+    if (m_parts.empty())
+        throw std::runtime_error(tr("host.Rip.noTracks", "%DISC% has no audio tracks", {{"%DISC%", place}}));
+    for (SPart& part : m_parts) part.file = getTarget(part.track);
+}
+
 CNamePattern::Fields CRipper::getFields(const SDiscTrack& track) const {
-    const std::string album = m_disc.getText(DISCIO_TEXT_TITLE);
-    const std::string albumArtist = m_disc.getText(DISCIO_TEXT_PERFORMER);
-    const std::string title = track.title.empty() ? "Track " + std::to_string(track.number) : track.title;
-    return {{"album", album},
-            {"album-artist", albumArtist},
-            {"artist", track.performer.empty() ? albumArtist : track.performer},
+    const std::string title = track.title.empty() ? tr("host.Rip.untitled", "Track %NUMBER%",
+                                                       {{"%NUMBER%", std::to_string(track.number)}})
+                                                  : track.title;
+    return {{"album", m_album},
+            {"album-artist", m_albumArtist},
+            {"artist", track.performer.empty() ? m_albumArtist : track.performer},
             {"title", title},
             {"track", std::to_string(track.number)},
             {"year", m_disc.getYear()},
@@ -105,57 +158,94 @@ void CRipper::setTags(const SDiscTrack& track, const fs::path& temporary) const 
     change.apply(temporary);
 }
 
-void CRipper::report(const SDiscTrack& track, const fs::path& target, const CTrackReader& reader) const {
+// A line for each track: at once for programs, and in order behind the progress bars otherwise.
+void CRipper::report(SPart& part, const CTrackReader& reader) {
     const double peak = reader.getPeak();
-    if (m_options.show == EOutput::json)
+    const double seconds = static_cast<double>(part.getFrames()) / kDiscRate;
+    if (m_options.show == EOutput::json) {
+        std::scoped_lock lock(m_mutex);
         std::printf("%s\n", toLine({{"event", "ripped"},
-                                    {"track", track.number},
-                                    {"output", target.native()},
+                                    {"track", part.track.number},
+                                    {"output", part.file.native()},
                                     {"crc32", formatCrc(reader.getCrc())},
                                     {"frames", reader.getFrames()},
-                                    {"duration", track.getSeconds()},
+                                    {"duration", seconds},
                                     {"repairs", reader.getRepairs()},
                                     {"peak", peak},
                                     {"verified", m_options.verify}})
                                 .c_str());
-    else if (m_options.show == EOutput::normal)
-        std::printf("track %2d  CRC-32 %s  %s  %lld repaired  peak %.1f %%%s\n", track.number,
-                    formatCrc(reader.getCrc()).c_str(), formatDuration(track.getSeconds()).c_str(),
-                    static_cast<long long>(std::max<int64_t>(reader.getRepairs(), 0)), peak * 100,
-                    m_options.verify ? "  verified" : "");
-    flushEvents();
+        flushEvents();
+    } else if (m_options.show == EOutput::normal) {
+        char number[16], percent[16];
+        std::snprintf(number, sizeof number, "%2d", part.track.number);
+        std::snprintf(percent, sizeof percent, "%.1f", peak * 100);
+        part.report = tr("host.Rip.report",
+                         "track %TRACK%  CRC-32 %CRC%  %DURATION%  %REPAIRS% repaired  peak %PEAK% %",
+                         {{"%TRACK%", number},
+                          {"%CRC%", formatCrc(reader.getCrc())},
+                          {"%DURATION%", formatDuration(seconds)},
+                          {"%REPAIRS%", std::to_string(std::max<int64_t>(reader.getRepairs(), 0))},
+                          {"%PEAK%", percent}});
+        if (m_options.verify) part.report += "  " + tr("host.Rip.verified", "verified");
+    }
+}
+
+std::unique_ptr<CTrackReader> CRipper::openPart(const SPart& part) {
+    std::scoped_lock lock(m_mutex);
+    const int number = part.track.number;
+    const int64_t frames = int64_t{part.track.length} * kBlockFrames;
+    std::vector<CTrackReader::SSection> sections;
+    sections.push_back({m_disc.openTrack(std::max(number, 1)), number == 0 ? -frames : 0, frames});
+    if (part.gap > 0) sections.push_back({m_disc.openTrack(number + 1), -part.gap, part.gap});
+    return std::make_unique<CTrackReader>(std::move(sections));
 }
 
 // False if Ctrl-C ended it.
-bool CRipper::ripTrack(const SDiscTrack& track, const fs::path& target, CProgress::Job job) {
+bool CRipper::copyPart(SPart& part, CProgress::Job job) {
     const auto started = std::chrono::steady_clock::now();
+    const fs::path& target = part.file;
     if (target.has_parent_path()) fs::create_directories(target.parent_path());
     COutput place(target, m_temporaryEnding, m_options.force);
-    CTrackReader reader(m_disc.openTrack(track.number));
-    CHandle source = reader.createSource();
-    CHandle format =
-        requireFormat(m_library, place.getTemporary(), kCdSamples, m_options, target, "The file");
+    const std::unique_ptr<CTrackReader> reader = openPart(part);
+    CHandle source = reader->createSource();
+    CHandle format = requireFormat(m_library, place.getTemporary(), kCdSamples, m_options, target,
+                                   tr("host.Rip.file", "The file"));
     bool done = false;
     try {
         done = encode(m_library, source, format, m_progress, job,
                       {m_disc.getPlace(), place.getTemporary(), target}, m_temporaryEnding);
     } catch (const std::runtime_error&) {
         // The encoder knows only that there are no samples.
-        if (!reader.getFailure().empty()) throw std::runtime_error(reader.getFailure());
+        if (!reader->getFailure().empty()) throw std::runtime_error(reader->getFailure());
         throw;
     }
     source.reset();
     format.reset();
     if (!done) return false;
-    reader.requireComplete();
-    if (m_options.verify && !reader.verify([] { return isCancelled(); })) return false;
-    if (canHaveTag(target)) setTags(track, place.getTemporary());
+    reader->requireComplete();
+    if (m_options.verify && !reader->verify([] { return isCancelled(); })) return false;
+    if (canHaveTag(target)) setTags(part.track, place.getTemporary());
     const uint64_t bytes = fs::file_size(place.getTemporary());
     place.commit();
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - started;
-    m_progress.finish(job, {track.getSeconds(), elapsed.count(), bytes, codecName(target)});
-    report(track, target, reader);
+    m_progress.finish(
+        job, {static_cast<double>(part.getFrames()) / kDiscRate, elapsed.count(), bytes, codecName(target)});
+    report(part, *reader);
     return true;
+}
+
+// False for a failure, which has been reported.
+bool CRipper::ripPart(SPart& part) {
+    const CProgress::Job job = m_progress.start(m_disc.getPlace(), part.file, {{"track", part.track.number}});
+    try {
+        if (!copyPart(part, job)) m_progress.cancel(job);
+        return true;
+    } catch (const std::exception& failure) {
+        m_progress.fail(job,
+                        tr("host.Rip.failed", "track %TRACK%: %REASON%",
+                           {{"%TRACK%", std::to_string(part.track.number)}, {"%REASON%", failure.what()}}));
+        return false;
+    }
 }
 
 void CRipper::writeCue() const {
@@ -163,48 +253,67 @@ void CRipper::writeCue() const {
     const auto add = [&](const char* command, const std::string& text) {
         if (!text.empty()) sheet += std::string(command) + " " + quote(text) + "\n";
     };
-    add("TITLE", m_disc.getText(DISCIO_TEXT_TITLE));
-    add("PERFORMER", m_disc.getText(DISCIO_TEXT_PERFORMER));
+    add("TITLE", m_album);
+    add("PERFORMER", m_albumArtist);
     if (const std::string code = m_disc.getText(DISCIO_TEXT_CODE); !code.empty())
         sheet += "CATALOG " + code + "\n";
-    const std::string album = m_disc.getText(DISCIO_TEXT_TITLE);
-    const fs::path target = m_options.directory /
-                            CNamePattern("%name%").expand({{"name", album.empty() ? "disc" : album}}, ".cue");
-    for (const SDone& done : m_done) {
-        const fs::path name = done.file.lexically_relative(target.parent_path());
+    const fs::path target = m_options.directory / CNamePattern("%name%").expand(
+                                                      {{"name", m_album.empty() ? "disc" : m_album}}, ".cue");
+    const auto addTrack = [&](const SDiscTrack& track) {
+        sheet += "  TRACK " + std::string(track.number < 10 ? "0" : "") + std::to_string(track.number) +
+                 " AUDIO\n";
+        add("    TITLE", track.title);
+        add("    PERFORMER", track.performer);
+        if (!track.code.empty()) sheet += "    ISRC " + track.code + "\n";
+    };
+    bool isStarted = false; // the next track, by its pregap in the file of the one before
+    for (size_t i = 0; i < m_parts.size(); ++i) {
+        const SPart& part = m_parts[i];
+        const fs::path name = part.file.lexically_relative(target.parent_path());
         sheet += "FILE " + quote(name.native()) + " WAVE\n";
-        sheet += "  TRACK " + std::string(done.track.number < 10 ? "0" : "") +
-                 std::to_string(done.track.number) + " AUDIO\n";
-        add("    TITLE", done.track.title);
-        add("    PERFORMER", done.track.performer);
-        if (!done.track.code.empty()) sheet += "    ISRC " + done.track.code + "\n";
-        sheet += "    INDEX 01 00:00:00\n";
+        if (part.track.number > 0) {
+            if (!isStarted) addTrack(part.track);
+            sheet += "    INDEX 01 00:00:00\n";
+        }
+        const bool isHidden = part.track.number == 0;
+        const bool hasNext = i + 1 < m_parts.size() && m_parts[i + 1].track.number == part.track.number + 1;
+        isStarted = hasNext && (isHidden || part.gap > 0);
+        if (!isStarted) continue;
+        addTrack(m_parts[i + 1].track);
+        sheet += "    INDEX 00 " + formatPlace(isHidden ? 0 : part.track.length) + "\n";
     }
     COutput place(target, m_temporaryEnding, m_options.force);
     std::ofstream out(place.getTemporary(), std::ios::binary);
     out << sheet;
     out.close();
-    if (!out) throw std::runtime_error(target.string() + " could not be written");
+    if (!out)
+        throw std::runtime_error(
+            tr("host.Rip.notWritten", "%FILE% could not be written", {{"%FILE%", target.string()}}));
     place.commit();
 }
 
 int CRipper::run() {
-    bool failed = false;
-    for (const SDiscTrack& track : m_tracks) {
-        if (isCancelled()) return kExitCancelled;
-        const fs::path target = getTarget(track);
-        const CProgress::Job job = m_progress.start(m_disc.getPlace(), target, {{"track", track.number}});
-        try {
-            if (!ripTrack(track, target, job)) {
-                m_progress.cancel(job);
-                return kExitCancelled;
-            }
-            m_done.push_back({track, target});
-        } catch (const std::exception& failure) {
-            m_progress.fail(job, "track " + std::to_string(track.number) + ": " + failure.what());
-            failed = true;
-        }
+    std::atomic<size_t> next{0};
+    std::atomic<bool> failed{false};
+    const auto work = [&] {
+        for (size_t i; !isCancelled() && (i = next++) < m_parts.size();)
+            if (!ripPart(m_parts[i])) failed = true;
+    };
+    // The head of a drive should not have to move between tracks.
+    const size_t threads =
+        m_disc.isDevice() ? 1 : std::min<size_t>(static_cast<size_t>(m_options.jobs), m_parts.size());
+    std::vector<std::thread> others;
+    try {
+        for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
+    } catch (const std::system_error&) {
+        // No more threads available: the existing ones do all the work.
     }
+    work();
+    for (std::thread& thread : others) thread.join();
+    for (const SPart& part : m_parts)
+        if (!part.report.empty()) std::printf("%s\n", part.report.c_str());
+    flushEvents();
+    if (isCancelled()) return kExitCancelled;
     if (!failed && m_options.writeCue) writeCue();
     return failed ? kExitFailure : kExitSuccess;
 }

@@ -14,7 +14,7 @@ namespace host {
 
 struct SRipOptions : SFormatOptions {
     std::filesystem::path place; // a drive or disc image; empty: the first drive with a disc
-    std::set<int> tracks;        // empty: all
+    std::set<int> tracks;        // empty: all; 0: the sound before track 1
     std::string extension = "flac";
     std::filesystem::path directory;
     std::optional<CNamePattern> names;
@@ -22,6 +22,7 @@ struct SRipOptions : SFormatOptions {
     int pick = 0;                    // of the records, from 1 on; 0 asks
     bool verify = false;
     bool writeCue = false;
+    int jobs = 1; // for disc images
     bool force = false;
     EOutput show = EOutput::normal;
 };

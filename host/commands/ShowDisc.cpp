@@ -1,6 +1,7 @@
 #include "commands/ShowDisc.h"
 #include "base/ExitCodes.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 #include "media/Disc.h"
 #include "terminal/Progress.h"
 
@@ -9,8 +10,6 @@
 namespace host {
 
 namespace {
-
-constexpr int kNormalPregap = 150; // before the first track
 
 // Prints the files of a folder and below.
 void showFiles(DISCIO_DataCursor* cursor, bool json) {
@@ -46,7 +45,7 @@ void showTrack(const SDiscTrack& track, int position, bool json) {
                                 .c_str());
         return;
     }
-    std::string text = track.number > 0 ? track.title : "(data)";
+    std::string text = track.number > 0 ? track.title : tr("host.Disc.data", "(data)");
     if (!track.performer.empty()) text += " / " + track.performer;
     if (!track.code.empty()) text += "  " + track.code;
     std::printf("%5d %11s %8d %8d %7d  %s\n", position, formatDuration(track.getSeconds()).c_str(),
@@ -78,20 +77,28 @@ int showDisc(const std::filesystem::path& place, bool json) {
                                     {"catalogue", catalogue}})
                                 .c_str());
     } else {
-        std::printf("%s: %s%s, %s\n", toPrintable(disc.getPlace()).c_str(), isEmpty ? "blank " : "",
-                    medium.c_str(), formatSize(static_cast<uint64_t>(capacity)).c_str());
-        for (const auto& [name, text] :
-             {std::pair("Title", title), {"Performer", performer}, {"Catalogue", catalogue}})
-            if (!text.empty()) std::printf("%s: %s\n", name, toPrintable(text).c_str());
+        std::printf("%s: %s%s, %s\n", toPrintable(disc.getPlace()).c_str(),
+                    isEmpty ? (tr("host.Disc.blank", "blank") + " ").c_str() : "", medium.c_str(),
+                    formatSize(static_cast<uint64_t>(capacity)).c_str());
+        for (const auto& [name, text] : {std::pair(tr("host.Disc.title", "Title"), title),
+                                         {tr("host.Disc.performer", "Performer"), performer},
+                                         {tr("host.Disc.catalogue", "Catalogue"), catalogue}})
+            if (!text.empty()) std::printf("%s: %s\n", name.c_str(), toPrintable(text).c_str());
         if (!disc.getTracks().empty())
-            std::printf("%5s %11s %8s %8s %7s  %s\n", "track", "duration", "start", "blocks", "pregap",
-                        "title");
+            std::printf("%5s %11s %8s %8s %7s  %s\n", tr("host.Disc.track", "track").c_str(),
+                        tr("host.Disc.duration", "duration").c_str(), tr("host.Disc.start", "start").c_str(),
+                        tr("host.Disc.blocks", "blocks").c_str(), tr("host.Disc.pregap", "pregap").c_str(),
+                        tr("host.Disc.trackTitle", "title").c_str());
     }
     int position = 0;
     for (const SDiscTrack& track : disc.getTracks()) showTrack(track, ++position, json);
-    if (!json && !disc.getTracks().empty() && disc.getTracks().front().pregap > kNormalPregap)
-        std::printf("There are %.1f seconds of sound before track 1\n",
-                    static_cast<double>(disc.getTracks().front().pregap - kNormalPregap) / kBlocksPerSecond);
+    if (const int32_t hidden = disc.getHiddenBlocks(); hidden > 0 && !json) {
+        char seconds[32];
+        std::snprintf(seconds, sizeof seconds, "%.1f", static_cast<double>(hidden) / kBlocksPerSecond);
+        std::printf("%s\n", tr("host.Disc.hidden", "There are %SECONDS% seconds of sound before track 1",
+                               {{"%SECONDS%", seconds}})
+                                .c_str());
+    }
     if (hasData) {
         const DiscHandle<DISCIO_DataCursor> root(functions.DiscDataCreateCursorW(handle, u""));
         if (!root) throw makeDiscError();

@@ -1,6 +1,7 @@
 #include "media/Disc.h"
 
 #include "base/Text.h"
+#include "base/Translation.h"
 
 #include <algorithm>
 #include <iterator>
@@ -61,21 +62,25 @@ CDisc::CDisc(const fs::path& place) {
     const bool isImage = fs::is_regular_file(place, none);
     std::optional<std::u16string> image;
     if (isImage && !(image = toUTF16(fs::absolute(place).native())))
-        throw std::runtime_error(place.string() + ": the name is not valid UTF-8");
+        throw std::runtime_error(
+            tr("host.Disc.badName", "%FILE%: the name is not valid UTF-8", {{"%FILE%", place.string()}}));
     m_library = createLibrary(image.value_or(u""));
     std::vector<SDrive> drives = openDrives(m_library.get());
-    if (drives.empty() && place.empty()) throw std::runtime_error("There is no drive");
+    if (drives.empty() && place.empty())
+        throw std::runtime_error(tr("host.Disc.noDrive", "There is no drive"));
     const SDrive* chosen = nullptr;
     if (isImage) {
         chosen = &drives.front();
     } else if (place.empty()) {
         for (const SDrive& drive : drives)
             if (!chosen && functions.DriveCheckDisc(drive.handle.get(), 1000, 0) == 1) chosen = &drive;
-        if (!chosen) throw std::runtime_error("There is no disc in any drive");
+        if (!chosen) throw std::runtime_error(tr("host.Disc.noDisc", "There is no disc in any drive"));
     } else {
         for (const SDrive& drive : drives)
             if (isSame(place, drive.path)) chosen = &drive;
-        if (!chosen) throw std::runtime_error(place.string() + " is neither a drive nor a disc image");
+        if (!chosen)
+            throw std::runtime_error(tr("host.Disc.notADisc", "%FILE% is neither a drive nor a disc image",
+                                        {{"%FILE%", place.string()}}));
     }
     m_place = chosen->path;
     m_disc.reset(functions.DriveOpenDisc(chosen->handle.get()));
@@ -102,6 +107,9 @@ void CDisc::readTracks() {
             track.performer = getText(DISCIO_TEXT_PERFORMER);
             track.code = getText(DISCIO_TEXT_CODE);
             track.number = ++segment;
+            // Before block 0 nothing can be read, and a pregap behind data is not sound.
+            if (i == 0 || m_tracks.back().number > 0)
+                track.readable = std::clamp(track.pregap, 0, std::max(track.start, 0));
         }
         m_tracks.push_back(std::move(track));
     }
@@ -119,6 +127,15 @@ void CDisc::setTexts(const SDiscTexts& texts) {
 
 int32_t CDisc::getLeadOut() const {
     return getDiscFunctions().DiscGetTrackStartBlocks(m_disc.get(), static_cast<int32_t>(m_tracks.size()));
+}
+
+bool CDisc::isDevice() const {
+    std::error_code none;
+    return fs::is_block_file(m_place, none);
+}
+
+int32_t CDisc::getHiddenBlocks() const {
+    return m_tracks.empty() || m_tracks.front().number == 0 ? 0 : m_tracks.front().readable;
 }
 
 std::string CDisc::getText(int32_t text) const {

@@ -28,13 +28,14 @@ std::vector<SDrive> findDrives();
 std::string describeMedium(int32_t type);
 
 struct SDiscTrack {
-    int number = 0;    // of the audio track, as in file names; 0 for data
+    int number = 0;    // of the audio track, as in file names; 0 for data and for the sound before track 1
     int32_t start = 0; // blocks
     int32_t length = 0;
     int32_t pregap = 0;
     std::string title;
     std::string performer;
-    std::string code; // ISRC
+    std::string code;     // ISRC
+    int32_t readable = 0; // blocks of the pregap that have sound
 
     double getSeconds() const { return static_cast<double>(length) / kBlocksPerSecond; }
 };
@@ -57,7 +58,11 @@ public:
 
     const std::string& getPlace() const { return m_place; }
     DISCIO_Disc* getHandle() const { return m_disc.get(); }
+    // A drive that moves a head, unlike an image.
+    bool isDevice() const;
     const std::vector<SDiscTrack>& getTracks() const { return m_tracks; }
+    // Of the sound before track 1; 0 for none.
+    int32_t getHiddenBlocks() const;
     std::string getText(int32_t text) const; // DISCIO_TEXT_TITLE and so on, of the disc
     void setTexts(const SDiscTexts& texts);
     const std::string& getYear() const { return m_texts.year; } // of setTexts()

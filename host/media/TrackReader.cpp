@@ -1,5 +1,7 @@
 #include "media/TrackReader.h"
 
+#include "base/Translation.h"
+
 #include <algorithm>
 #include <array>
 #include <cstdlib>
@@ -39,7 +41,20 @@ uint32_t updateCrc32(uint32_t crc, const void* data, size_t size) {
     return ~crc;
 }
 
-CTrackReader::CTrackReader(DiscHandle<DISCIO_PCMAudioStream> stream) : m_stream(std::move(stream)) {}
+CTrackReader::CTrackReader(std::vector<SSection> sections) : m_sections(std::move(sections)) {
+    for (const SSection& section : m_sections) m_count += section.count;
+    if (!seek(0)) throw makeDiscError();
+}
+
+int64_t CTrackReader::getRepairs() const {
+    int64_t repairs = 0;
+    for (const SSection& section : m_sections) {
+        const int64_t own = section.stream->funcs->getRepairs(section.stream->user);
+        if (own < 0) return -1;
+        repairs += own;
+    }
+    return repairs;
+}
 
 CHandle CTrackReader::createSource() {
     TONEWRIGHT_SourceCallbacks callbacks = {};
@@ -50,14 +65,24 @@ CHandle CTrackReader::createSource() {
     callbacks.seek = [](void* user, int64_t frame) {
         return int32_t{static_cast<CTrackReader*>(user)->seek(frame) ? 1 : 0};
     };
-    return CHandle(TONEWRIGHT_Host_CreateSourceFromCallbacks(
-        kDiscRate, 2, 2, m_stream->funcs->getFrameCount(m_stream->user), &callbacks, this));
+    return CHandle(TONEWRIGHT_Host_CreateSourceFromCallbacks(kDiscRate, 2, 2, m_count, &callbacks, this));
+}
+
+const CTrackReader::SSection& CTrackReader::findSection(int64_t frame, int64_t& inside) const {
+    size_t index = 0;
+    for (inside = frame; index + 1 < m_sections.size() && inside >= m_sections[index].count; ++index)
+        inside -= m_sections[index].count;
+    return m_sections[index];
 }
 
 int64_t CTrackReader::read(void* samples, int64_t frames) {
     int32_t delivered = 0;
-    const auto wanted = static_cast<int32_t>(std::min<int64_t>(frames, 1 << 20));
-    if (m_stream->funcs->read(m_stream->user, samples, wanted, &delivered) != 1) {
+    int64_t inside = 0;
+    const SSection& section = findSection(m_frames, inside);
+    const DISCIO_PCMAudioStream& stream = *section.stream;
+    const auto wanted = static_cast<int32_t>(std::min({frames, section.count - inside, int64_t{1} << 20}));
+    if ((inside == 0 && stream.funcs->seek(stream.user, section.first) != 1) ||
+        stream.funcs->read(stream.user, samples, wanted, &delivered) != 1) {
         m_reason = makeDiscError().what();
         return -1;
     }
@@ -80,13 +105,15 @@ void CTrackReader::restart() {
 // An encoder goes back to the start after it has looked at the source.
 bool CTrackReader::seek(int64_t frame) {
     restart();
-    return m_stream->funcs->seek(m_stream->user, frame) == 1;
+    m_frames = frame; // a checksum of anything but the whole is worth nothing
+    int64_t inside = 0;
+    const SSection& section = findSection(frame, inside);
+    return section.stream->funcs->seek(section.stream->user, section.first + inside) == 1;
 }
 
 void CTrackReader::requireComplete() const {
     if (!m_reason.empty()) throw std::runtime_error(m_reason);
-    if (m_frames != m_stream->funcs->getFrameCount(m_stream->user))
-        throw std::runtime_error("The track ended early");
+    if (m_frames != m_count) throw std::runtime_error(tr("host.Rip.short", "The track ended early"));
 }
 
 bool CTrackReader::verify(const std::function<bool()>& stops) {
@@ -98,7 +125,8 @@ bool CTrackReader::verify(const std::function<bool()>& stops) {
         count = read(block.data(), kBlockFrames * kBlocksPerSecond);
     }
     requireComplete();
-    if (m_crc != crc) throw std::runtime_error("Reading the track again gave other samples");
+    if (m_crc != crc)
+        throw std::runtime_error(tr("host.Rip.differs", "Reading the track again gave other samples"));
     return true;
 }
 

@@ -190,7 +190,8 @@ typedef struct DISCIO_PCMAudioStreamFuncs {
     int32_t (*read)(void* user, void* pcm, int32_t frames, int32_t* delivered);
     /* Places read more than once since open because the drive's data were in doubt; -1 if unknown. */
     int64_t (*getRepairs)(void* user);
-    /* The next read starts at that frame. */
+    /* The next read starts at that frame. Those of a track's pregap are negative; they can be read on audio
+     * discs unless they are before block 0 or in a track of data. */
     int32_t (*seek)(void* user, int64_t frame);
     int64_t (*getPosition)(void* user); /* the frame of the next read; -1 for a failure */
     void (*end)(void* user);

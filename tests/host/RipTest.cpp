@@ -27,7 +27,7 @@ protected:
 
 TEST_F(Rip, FilesHoldTheExactSamplesTextsAndReports) {
     const auto lines = parseLines(succeed({"rip", "disc.cue", "-d", "out", "--verify", "--cue", "--json"}));
-    EXPECT_TRUE(decode("out/01 One-Two.flac") == a.substr(0, 30 * kSectorBytes));
+    EXPECT_TRUE(decode("out/01 One-Two.flac") == a) << "with the pregap of track 2";
     EXPECT_TRUE(decode("out/02 Track 2.flac") == b);
     for (const char* field : {"TITLE=One/Two\n", "ALBUM=The disc\n", "ARTIST=Band\n", "TRACKNUMBER=1\n"})
         EXPECT_NE(peer({"metaflac", "--export-tags-to=-", "out/01 One-Two.flac"}).find(field),
@@ -52,6 +52,28 @@ TEST_F(Rip, FilesHoldTheExactSamplesTextsAndReports) {
         "TITLE \"The disc\"\nPERFORMER \"Band\"\n"
         "FILE \"01 One-Two.flac\" WAVE\n  TRACK 01 AUDIO\n    TITLE \"One/Two\"\n    INDEX 01 00:00:00\n"
         "FILE \"02 Track 2.flac\" WAVE\n  TRACK 02 AUDIO\n    INDEX 01 00:00:00\n");
+}
+
+// The files and the cue sheet describe the same disc again.
+TEST_F(Rip, ACueSheetKeepsPregapsAndTheSoundBeforeTrack1) {
+    folder.write("b.bin", makeSectors(300, 4));
+    folder.write("gaps.cue",
+                 "TITLE gaps\nFILE b.bin BINARY\nTRACK 01 AUDIO\nINDEX 00 00:00:00\nINDEX 01 00:02:20\n"
+                 "TRACK 02 AUDIO\nINDEX 01 00:02:70\nTRACK 03 AUDIO\nINDEX 00 00:03:00\nINDEX 01 00:03:10\n");
+    succeed({"rip", "gaps.cue", "--to", "wav", "--cue", "-q", "-j", "3", "-d", "out"});
+    std::string all;
+    for (const char* name :
+         {"out/00 Hidden track.wav", "out/01 Track 1.wav", "out/02 Track 2.wav", "out/03 Track 3.wav"})
+        all += decode(name);
+    const std::string disc = readFile(folder / "b.bin");
+    EXPECT_TRUE(all == disc) << all.size() / kSectorBytes;
+    const auto before = parseLines(succeed({"disc", "gaps.cue", "--json"}));
+    const auto behind = parseLines(succeed({"disc", "out/gaps.cue", "--json"}));
+    ASSERT_EQ(before.size(), behind.size());
+    for (size_t i = 1; i < before.size(); ++i) EXPECT_EQ(before[i], behind[i]);
+    succeed({"rip", "gaps.cue", "0", "--to", "wav", "-q"});
+    EXPECT_TRUE(decode("00 Hidden track.wav") == decode("out/00 Hidden track.wav"));
+    EXPECT_NE(fail({"rip", "disc.cue", "0"}).find("no sound before track 1"), std::string::npos);
 }
 
 TEST_F(Rip, SomeTracksAsOtherTypesWithoutReplacing) {

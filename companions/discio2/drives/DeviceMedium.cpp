@@ -184,7 +184,7 @@ public:
         m_drive->bigendianp = 0; // as READ CD delivers; the library's guess from the sound errs with noise
         m_paranoia.reset(cdio_paranoia_init(m_drive.get()));
         cdio_paranoia_modeset(m_paranoia.get(), PARANOIA_MODE_FULL ^ PARANOIA_MODE_NEVERSKIP);
-        cdio_paranoia_set_range(m_paranoia.get(), track.start, track.end() - 1);
+        cdio_paranoia_set_range(m_paranoia.get(), track.start - track.getReadablePregap(), track.end() - 1);
     }
 
     void read(int32_t block, int32_t count, int16_t* samples) override {

@@ -27,13 +27,13 @@ public:
     void open() override {
         if (!m_reader) m_reader = m_medium->createAudioReader(m_track);
         m_position = 0;
-        m_buffered = -1;
+        m_buffered = kNoSector;
     }
     void close() noexcept override { m_reader.reset(); }
 
     void seek(int64_t frame) override {
         requireOpen();
-        if (frame < 0 || frame > getFrameCount())
+        if (frame < -int64_t{getPregap()} * kFramesPerSector || frame > getFrameCount())
             throw CDiscError(DISCIO_ERROR_INVALID_PARAM, "frame " + std::to_string(frame));
         m_position = frame;
     }
@@ -43,8 +43,9 @@ public:
         const auto wanted = static_cast<int32_t>(std::min<int64_t>(frames, getFrameCount() - m_position));
         int32_t done = 0;
         while (done < wanted) {
-            const auto sector = static_cast<int32_t>(m_position / kFramesPerSector);
-            const auto inside = static_cast<int32_t>(m_position % kFramesPerSector);
+            const int64_t behind = m_position + int64_t{getPregap()} * kFramesPerSector; // not negative
+            const auto sector = static_cast<int32_t>(behind / kFramesPerSector) - getPregap();
+            const auto inside = static_cast<int32_t>(behind % kFramesPerSector);
             int16_t* const to = samples + size_t{kChannels} * static_cast<size_t>(done);
             int32_t count = (wanted - done) / kFramesPerSector;
             if (inside == 0 && count > 0) {
@@ -64,6 +65,9 @@ public:
     }
 
 private:
+    static constexpr int32_t kNoSector = INT32_MIN;
+
+    int32_t getPregap() const { return m_track.getReadablePregap(); }
     void requireOpen() const {
         if (!m_reader) throw CDiscError(DISCIO_ERROR_STREAM_NOT_OPEN, "");
     }
@@ -72,7 +76,7 @@ private:
     STrack m_track;
     std::unique_ptr<IAudioReader> m_reader; // while open
     int64_t m_position = 0;
-    int32_t m_buffered = -1; // the sector in the buffer
+    int32_t m_buffered = kNoSector; // the sector in the buffer
     std::array<int16_t, kAudioSectorBytes / 2> m_sector{};
 };
 
