@@ -89,6 +89,17 @@ PLACEHOLDERS = {
     "%LOWEST%": "a number",
     "%HIGHEST%": "a number",
     "%GIVEN%": "a number",
+    "%CAPACITY%": "a duration, such as 3:05.2",
+    "%CRC%": "a checksum in hexadecimal digits",
+    "%DISC%": "the path of a drive or a disc image",
+    "%FILES%": "a number of files",
+    "%LENGTH%": "a duration, such as 3:05.2",
+    "%LIMIT%": "a number of bytes",
+    "%MINUTES%": "a number of minutes",
+    "%PEAK%": "a number in percent",
+    "%REPAIRS%": "a number of places",
+    "%TRACK%": "the number of a track",
+    "%TRACKS%": "a number of tracks",
     "%URI%": "the location of a file or stream",
 }
 PLACEHOLDER = re.compile(r"%[A-Z]+%")
