@@ -21,7 +21,6 @@ pkg_check_modules(LIBBURN REQUIRED libburn-1)
 pkg_check_modules(LIBISOFS REQUIRED libisofs-1)
 pkg_check_modules(ZLIB REQUIRED IMPORTED_TARGET zlib)
 pkg_check_modules(EBUR128 REQUIRED IMPORTED_TARGET libebur128)
-pkg_check_modules(ZLIB REQUIRED IMPORTED_TARGET zlib)
 pkg_check_modules(CAIRO REQUIRED IMPORTED_TARGET cairo cairo-pdf cairo-svg)
 pkg_check_modules(PANGOCAIRO REQUIRED IMPORTED_TARGET pangocairo)
 

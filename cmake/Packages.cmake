@@ -27,7 +27,8 @@ foreach(component libraries program development)
     set(CPACK_DEBIAN_${key}_PACKAGE_SHLIBDEPS ON)
 endforeach()
 set(CPACK_DEBIAN_LIBRARIES_PACKAGE_SECTION libs)
-set(CPACK_DEBIAN_LIBRARIES_PACKAGE_DEPENDS "libportaudio2") # loaded at the first use of a device, so not linked
+# Loaded at the first use of a device and at the first write of a disc, so not linked.
+set(CPACK_DEBIAN_LIBRARIES_PACKAGE_DEPENDS "libportaudio2, libburn4, libisofs6")
 set(CPACK_DEBIAN_PROGRAM_PACKAGE_SECTION sound)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SHLIBDEPS OFF)
