@@ -51,7 +51,7 @@ TEST_F(Rip, FilesHoldTheExactSamplesTextsAndReports) {
         readFile(folder / "out/The disc.cue"),
         "TITLE \"The disc\"\nPERFORMER \"Band\"\n"
         "FILE \"01 One-Two.flac\" WAVE\n  TRACK 01 AUDIO\n    TITLE \"One/Two\"\n    INDEX 01 00:00:00\n"
-        "FILE \"02 Track 2.flac\" WAVE\n  TRACK 02 AUDIO\n    INDEX 01 00:00:00\n");
+        "  TRACK 02 AUDIO\n    INDEX 00 00:00:30\nFILE \"02 Track 2.flac\" WAVE\n    INDEX 01 00:00:00\n");
 }
 
 // The files and the cue sheet describe the same disc again.
@@ -84,7 +84,7 @@ TEST_F(Rip, SomeTracksAsOtherTypesWithoutReplacing) {
     EXPECT_TRUE(std::filesystem::exists(folder / "The disc 01.wav"));
     EXPECT_NE(fail({"rip", "disc.cue", "3"}).find("has no audio track 3"), std::string::npos);
     EXPECT_NE(fail({"rip", "nothing.cue"}).find("nothing.cue"), std::string::npos);
-    for (const char* tracks : {"2-x", "2-", "2-1", "0", "1,,2", "99-100", "1-2-2", "1-2x", "2x"})
+    for (const char* tracks : {"2-x", "2-", "2-1", "-1", "1,,2", "99-100", "1-2-2", "1-2x", "2x"})
         EXPECT_EQ(tonewright({"rip", "disc.cue", tracks}).exitCode, 2) << tracks;
     succeed({"rip", "disc.cue", "2,1-2", "--to", "au", "-q"});
     EXPECT_TRUE(decode("01 One-Two.au") == a.substr(0, 30 * kSectorBytes));
