@@ -2,19 +2,13 @@
 #pragma once
 
 #include "library/Library.h"
+#include "media/WebAddress.h"
 
 #include <cstdint>
 #include <filesystem>
 #include <functional>
 
 namespace host {
-
-// "http://..."; a file whose name begins like that is "./http:...".
-bool isWebAddress(const std::filesystem::path& file);
-
-// The name at the end of an address, unescaped, such as "x.flac"; empty if it has none that a file could
-// have.
-std::filesystem::path getWebName(const std::filesystem::path& address);
 
 // Bytes so far, and in total or -1.
 using DownloadProgress = std::function<void(int64_t received, int64_t total)>;

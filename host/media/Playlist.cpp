@@ -2,7 +2,7 @@
 
 #include "base/Text.h"
 #include "base/Translation.h"
-#include "media/Download.h"
+#include "media/WebAddress.h"
 
 #include <algorithm>
 #include <cctype>
