@@ -3,6 +3,8 @@
 
 #include <cstring>
 #include <map>
+#include <regex>
+#include <sstream>
 #include <sys/stat.h>
 
 namespace {
@@ -64,8 +66,14 @@ TEST(CrashHandler, LeavesReportAndDumpForEveryKindOfCrash) {
         const std::string report = readFile(folder / "report.txt");
         EXPECT_EQ(report.find("Crashing 1.0\n"), 0u);
         EXPECT_NE(report.find(test.inReport), std::string::npos) << report;
-        EXPECT_NE(report.find("/crashing+0x"), std::string::npos) << report; // a frame of the program itself
-        EXPECT_NE(report.find("[stack]"), std::string::npos) << report;      // near the end of the modules
+        std::istringstream frames(report.substr(report.find("innermost first:\n") + 17));
+        std::string ofProgram;
+        for (std::string line; std::getline(frames, line) && !line.empty();) {
+            EXPECT_TRUE(std::regex_match(line, std::regex("0x[0-9a-f]+( [^ ]+\\+0x[0-9a-f]+)?"))) << line;
+            if (line.find("/crashing+0x") != std::string::npos) ofProgram = line;
+        }
+        EXPECT_NE(ofProgram, "") << report;
+        EXPECT_NE(report.find("[stack]"), std::string::npos) << report; // near the end of the modules
 
         const CDump dump(readFile(folder / "dump.dmp"));
         for (uint32_t stream : {kThreads, kModules, kMemory, kException, kSystem, kMaps})

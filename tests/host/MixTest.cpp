@@ -131,8 +131,9 @@ TEST_F(Mix, TellsWhatIsWrong) {
     write("a.wav", makeTone(44100, 2, 16, 1));
     folder.write("text.wav", "no sound");
     const std::string good = makeTrack("a.wav", 0, 0, 0.9);
-    expectRefused(makeArrangement(good + makeTrack("gone.wav", 0, 0, 1)),
-                  "Could not open " + (folder / "gone.wav").string() + ": No such file or directory");
+    expectRefused(makeArrangement(good + makeTrack("./it's,%20gone:now%205%25.wav", 0, 0, 1)),
+                  "Could not open " + (folder / "it's, gone:now 5%.wav").string() +
+                      ": No such file or directory");
     expectRefused(makeArrangement(good + makeTrack("gone.wav", 60, 0, 1)),
                   "gone.wav"); // when due
     expectRefused(makeArrangement(makeTrack("text.wav", 0, 0, 1)), "text.wav");
