@@ -26,7 +26,7 @@ Node saveBytes(const Node& node, const std::string& key, const void* data, size_
 }
 
 // Empty if there is no such child, or if its text is damaged.
-std::optional<std::string> loadBytes(const Node& node, const std::string& key) {
+std::optional<std::string> loadBytes(const Node& node, const std::string& key, IResourceInputStore& store) {
     const Node child = node->getChildNode(key.c_str());
     const Node data = child ? child->getChildNode("base64") : Node();
     if (!data) return std::nullopt;
@@ -35,8 +35,9 @@ std::optional<std::string> loadBytes(const Node& node, const std::string& key) {
     const size_t size =
         wxBase64Decode(bytes.data(), bytes.size(), text.data(), text.size(), wxBase64DecodeMode_SkipWS);
     if (size == wxCONV_FAILED) {
-        logAttachment(key, peru::CParseError(peru::localize("graphics.CBase64Resources.Damaged",
-                                                            "The base64 text is damaged.")));
+        reportAttachment(store, key,
+                         peru::CParseError(peru::localize("graphics.CBase64Resources.Damaged",
+                                                          "The base64 text is damaged.")));
         return std::nullopt;
     }
     bytes.resize(size);
@@ -96,7 +97,7 @@ void CBase64Resources::SaveMemory(const Node& node, const std::string& key,
 }
 
 P<CRichText> CBase64Resources::LoadRichText(const Node& node, const std::string& key) {
-    auto bytes = loadBytes(node, key);
+    auto bytes = loadBytes(node, key, *this);
     return bytes ? peru::make<CRichText>(std::move(*bytes)) : P<CRichText>();
 }
 
@@ -111,12 +112,12 @@ P<CBitmap> CBase64Resources::LoadBitmap(const Node& node, const std::string& key
 }
 
 P<CBitmap> CBase64Resources::LoadBitmap(const Node& node, const std::string& key, EBitmapFormat format) {
-    auto bytes = loadBytes(node, key);
-    return bytes ? tryLoadBitmap(format, std::move(*bytes), key) : P<CBitmap>();
+    auto bytes = loadBytes(node, key, *this);
+    return bytes ? tryLoadBitmap(format, std::move(*bytes), key, *this) : P<CBitmap>();
 }
 
 P<peru::IMemoryBlock> CBase64Resources::LoadMemory(const Node& node, const std::string& key) {
-    const auto bytes = loadBytes(node, key);
+    const auto bytes = loadBytes(node, key, *this);
     if (!bytes) return {};
     auto block = peru::make<peru::CMemoryBlock>(static_cast<int64_t>(bytes->size()));
     std::memcpy(block->getData(), bytes->data(), bytes->size());

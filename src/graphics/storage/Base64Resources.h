@@ -1,6 +1,7 @@
 // Attachments inside the XML.
 #pragma once
 
+#include "graphics/storage/LoadReports.h"
 #include "graphics/storage/Reusables.h"
 
 namespace graphics {
@@ -39,12 +40,15 @@ public:
     std::string LoadType(const P<peru::IXmlNode>& node) override;
     P<IReusableResource> LoadReusable(const P<peru::IXmlNode>& node, const std::string& type,
                                       const P<IReusableResource>& instance) override;
+    void Report(const P<peru::IString>& text) override { m_reports.Add(text); }
+    const std::vector<std::string>& GetReports() const override { return m_reports.Get(); }
 
 private:
     const EMode m_mode;
     bool m_isLossless = false;
     CSavedResources m_saved;
     CLoadedResources m_loaded;
+    CLoadReports m_reports;
 };
 
 } // namespace graphics

@@ -1,7 +1,6 @@
 #include "graphics/storage/BitmapFormats.h"
 
 #include "peru/Errors.h"
-#include "peru/log/LogManager.h"
 #include "peru/strings/IStringLocalizer.h"
 
 namespace graphics {
@@ -14,18 +13,18 @@ EBitmapFormat chooseFormat(const CBitmap& bitmap, const std::string& sourceFileN
     return bitmap.HasAlpha() ? EBitmapFormat::jng : EBitmapFormat::jpg;
 }
 
-P<CBitmap> tryLoadBitmap(EBitmapFormat format, std::string bytes, const std::string& source) {
+P<CBitmap> tryLoadBitmap(EBitmapFormat format, std::string bytes, const std::string& source,
+                         IResourceInputStore& store) {
     try {
         return peru::make<CBitmap>(format, std::move(bytes));
     } catch (const peru::CException& error) {
-        logAttachment(source, error);
+        reportAttachment(store, source, error);
         return {};
     }
 }
 
-void logAttachment(const std::string& source, const peru::CException& error) {
-    peru::getLogManager()->warning(
-        peru::CString::fromUTF8("graphics"),
+void reportAttachment(IResourceInputStore& store, const std::string& source, const peru::CException& error) {
+    store.Report(
         peru::localize("graphics.Attachment.LeftOut", "The attachment \"%NAME%\" is left out: %DETAILS%",
                        {{"%NAME%", peru::CString::fromUTF8(source)}, {"%DETAILS%", error.getDescription()}}));
 }

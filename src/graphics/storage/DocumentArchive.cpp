@@ -1,6 +1,5 @@
 #include "graphics/storage/DocumentArchive.h"
 
-#include "graphics/storage/ZipCatalogue.h"
 #include "peru/Errors.h"
 #include "peru/streams/MemoryIOStream.h"
 #include "peru/strings/IStringLocalizer.h"
@@ -47,13 +46,15 @@ P<peru::CXmlDocument> parse(const char* root, const std::string& bytes, size_t l
 
 } // namespace
 
-std::string WriteArchive(const SArchiveForm& form, const SaveContent& save, bool isLossless) {
+std::string WriteArchive(const SArchiveForm& form, const SaveContent& save, bool isLossless,
+                         const std::vector<SArchiveEntry>& entries) {
     const wxLogNull quiet;
     wxMemoryOutputStream memory;
     {
         wxZipOutputStream archive(memory, kCompressionLevel, wxConvUTF8);
         const auto resources = peru::make<CZipResources>(archive);
         resources->SetLossless(isLossless);
+        for (const SArchiveEntry& entry : entries) resources->WriteEntry(entry.name, entry.bytes);
         const auto document = peru::make<peru::CXmlDocument>();
         save(document->addChildNode(form.root), *resources);
         resources->WriteEntry(form.entry, peru::CString::toStdString(document->printToString()));
@@ -67,9 +68,12 @@ std::string WriteArchive(const SArchiveForm& form, const SaveContent& save, bool
 }
 
 void ReadArchive(const SArchiveForm& form, std::string bytes, const LoadContent& load) {
-    const auto catalogue = peru::make<CZipCatalogue>(std::move(bytes));
-    const auto document = parse(form.root, catalogue->ReadEntry(form.entry), kMaximalXml, form.entry);
-    load(document->getRootNode(), *catalogue);
+    ReadArchive(form, *peru::make<CZipCatalogue>(std::move(bytes)), load);
+}
+
+void ReadArchive(const SArchiveForm& form, CZipCatalogue& catalogue, const LoadContent& load) {
+    const auto document = parse(form.root, catalogue.ReadEntry(form.entry), kMaximalXml, form.entry);
+    load(document->getRootNode(), catalogue);
 }
 
 std::string WriteXml(const char* root, const SaveContent& save, CBase64Resources::EMode mode) {

@@ -4,7 +4,6 @@
 #include "graphics/storage/IResourceStores.h"
 #include "graphics/storage/XmlValues.h"
 #include "peru/Errors.h"
-#include "peru/log/LogManager.h"
 #include "peru/strings/IStringLocalizer.h"
 
 namespace graphics {
@@ -37,7 +36,7 @@ P<CXDatas> loadXDatas(const Node& node) {
 }
 
 // The element of a node, not yet loaded; empty if the node is not one, or of a class that this program lacks.
-P<CGraphicElement> createElement(const Node& node) {
+P<CGraphicElement> createElement(const Node& node, IResourceInputStore& store) {
     // A tag of old files.
     static constexpr const char* kTableContent = "table-content";
     const std::string tag = getName(node);
@@ -48,12 +47,10 @@ P<CGraphicElement> createElement(const Node& node) {
     const auto element =
         CreateElement(isTableContent ? GraphicElementType::table : GraphicTypeFromXml(tag), typeName);
     if (!element)
-        peru::getLogManager()->warning(
-            peru::CString::fromUTF8("graphics"),
-            peru::localize(
-                "graphics.CGraphicDocument.UnknownElement",
-                "An element \"%TAG%\" of the unknown class \"%CLASS%\" is left out.",
-                {{"%TAG%", peru::CString::fromUTF8(tag)}, {"%CLASS%", peru::CString::fromUTF8(typeName)}}));
+        store.Report(peru::localize(
+            "graphics.CGraphicDocument.UnknownElement",
+            "An element \"%TAG%\" of the unknown class \"%CLASS%\" is left out.",
+            {{"%TAG%", peru::CString::fromUTF8(tag)}, {"%CLASS%", peru::CString::fromUTF8(typeName)}}));
     return element;
 }
 
@@ -89,7 +86,7 @@ void CGraphicDocument::Load(const Node& node, IResourceInputStore& store) {
     if (SRect box; read(node, "content-box", box)) SetContentBox(box);
     for (auto children = node->getChildNodes(); children.hasMore();) {
         const Node child = children.getNext();
-        const auto created = createElement(child);
+        const auto created = createElement(child, store);
         if (!created) continue;
         const auto element = P<CGraphicElement>(store.LoadReusable(child, created->GetTypeName(), created));
         // A document that names an element twice shows it once.

@@ -7,6 +7,7 @@
 #include "peru/MemoryManager.h"
 
 #include <string>
+#include <vector>
 
 namespace graphics {
 
@@ -50,6 +51,9 @@ public:
     // node. Throws CError if the types differ, or if a resource contains itself.
     virtual P<IReusableResource> LoadReusable(const P<peru::IXmlNode>& node, const std::string& type,
                                               const P<IReusableResource>& instance) = 0;
+    // Logs and remembers what the reader leaves out, as a sentence for the user.
+    virtual void Report(const P<peru::IString>& text) = 0;
+    virtual const std::vector<std::string>& GetReports() const = 0;
 };
 
 } // namespace graphics

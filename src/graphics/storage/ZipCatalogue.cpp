@@ -41,6 +41,7 @@ bool CZipCatalogue::HasEntry(const std::string& name) {
 
 std::string CZipCatalogue::ReadEntry(const std::string& name) {
     if (!HasEntry(name)) fail("graphics.CZipCatalogue.Missing", "The archive has no entry \"%NAME%\".", name);
+    m_readEntries.insert(name);
     const wxLogNull quiet;
     const auto damaged = [&] {
         fail("graphics.CZipCatalogue.Damaged", "The entry \"%NAME%\" of the archive is damaged.", name);
@@ -72,7 +73,7 @@ bool CZipCatalogue::readAttachment(const Node& node, const std::string& key, std
         bytes = ReadEntry(name);
         return true;
     } catch (const peru::CException& error) {
-        logAttachment(name, error);
+        reportAttachment(*this, name, error);
         return false;
     }
 }
@@ -91,11 +92,27 @@ P<CBitmap> CZipCatalogue::LoadBitmap(const Node& node, const std::string& key, s
 
 P<CBitmap> CZipCatalogue::LoadBitmap(const Node& node, const std::string& key, EBitmapFormat format) {
     const Node child = node->getChildNode(key.c_str());
-    std::string name, bytes;
+    std::string name;
     if (!child || !readAttribute(child, "name", name)) return {};
+    return LoadBitmapEntry(name, format);
+}
+
+P<CBitmap> CZipCatalogue::LoadBitmapEntry(const std::string& name, EBitmapFormat format) {
     if (const auto known = m_bitmaps.find(name); known != m_bitmaps.end()) return known->second;
-    if (!readAttachment(node, key, name, bytes)) return {};
-    return m_bitmaps[name] = tryLoadBitmap(format, std::move(bytes), name);
+    try {
+        return m_bitmaps[name] = tryLoadBitmap(format, ReadEntry(name), name, *this);
+    } catch (const peru::CException& error) {
+        reportAttachment(*this, name, error);
+        return {};
+    }
+}
+
+std::vector<std::string> CZipCatalogue::GetUnreadEntries() {
+    readCatalogue();
+    std::vector<std::string> names;
+    for (const auto& [name, entry] : m_entries)
+        if (!entry->IsDir() && m_readEntries.count(name) == 0) names.push_back(name);
+    return names;
 }
 
 P<peru::IMemoryBlock> CZipCatalogue::LoadMemory(const Node& node, const std::string& key) {

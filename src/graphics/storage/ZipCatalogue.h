@@ -1,9 +1,11 @@
 // The entries of a ZIP archive.
 #pragma once
 
+#include "graphics/storage/LoadReports.h"
 #include "graphics/storage/Reusables.h"
 
 #include <memory>
+#include <set>
 
 class wxZipEntry;
 class wxZipInputStream;
@@ -33,10 +35,16 @@ public:
     std::string LoadType(const P<peru::IXmlNode>& node) override;
     P<IReusableResource> LoadReusable(const P<peru::IXmlNode>& node, const std::string& type,
                                       const P<IReusableResource>& instance) override;
+    void Report(const P<peru::IString>& text) override { m_reports.Add(text); }
+    const std::vector<std::string>& GetReports() const override { return m_reports.Get(); }
 
     bool HasEntry(const std::string& name);
     // Throws CError, which names the entry, if it is missing, damaged or above a limit.
     std::string ReadEntry(const std::string& name);
+    // The picture of an entry; empty if it is missing or damaged.
+    P<CBitmap> LoadBitmapEntry(const std::string& name, EBitmapFormat format);
+    // Files that nobody has asked for, in the order of their names.
+    std::vector<std::string> GetUnreadEntries();
 
 private:
     void readCatalogue();
@@ -48,8 +56,10 @@ private:
     std::unique_ptr<wxMemoryInputStream> m_stream;
     std::unique_ptr<wxZipInputStream> m_zip;
     std::map<std::string, std::unique_ptr<wxZipEntry>> m_entries;
+    std::set<std::string> m_readEntries;
     std::map<std::string, P<CBitmap>> m_bitmaps; // by entry, so that elements share them
     CLoadedResources m_resources;
+    CLoadReports m_reports;
     int64_t m_total = 0; // bytes unpacked
     bool m_isRead = false;
 };

@@ -11,6 +11,7 @@
 namespace graphics {
 
 void CZipResources::WriteEntry(const std::string& name, std::string_view bytes) {
+    m_names.insert(name);
     const wxDateTime date(1, wxDateTime::Jan, 1990);
     if (m_archive.PutNextEntry(wxString::FromUTF8(name), date) &&
         m_archive.WriteAll(bytes.data(), bytes.size()) && m_archive.CloseEntry())
@@ -20,9 +21,16 @@ void CZipResources::WriteEntry(const std::string& name, std::string_view bytes) 
                                       {{"%NAME%", peru::CString::fromUTF8(name)}}));
 }
 
+std::string CZipResources::makeName(const char* word, const std::string& ending) {
+    for (;;) {
+        const std::string name = word + std::to_string(m_entryNumbers.GetNext()) + ending;
+        if (m_names.count(name) == 0) return name;
+    }
+}
+
 void CZipResources::SaveRichText(const Node& node, const std::string& key, const P<CRichText>& text) {
     if (!text) return;
-    const std::string name = "text" + std::to_string(m_entryNumbers.GetNext()) + ".xml";
+    const std::string name = makeName("text", ".xml");
     WriteEntry(name, text->GetXml());
     writeAttribute(addChild(node, key.c_str()), "name", name);
 }
@@ -34,7 +42,7 @@ void CZipResources::SaveBitmap(const Node& node, const std::string& key, const P
     std::string& name = m_bitmapEntries[bitmap.get()];
     if (name.empty() || getFormatOfFile(name) != format) {
         const std::string bytes = bitmap->Encode(format);
-        name = "image" + std::to_string(m_entryNumbers.GetNext()) + "." + getExtension(format);
+        name = makeName("image", "." + getExtension(format));
         WriteEntry(name, bytes);
     }
     writeAttribute(addChild(node, key.c_str()), "name", name);
@@ -47,7 +55,7 @@ void CZipResources::SaveReusable(const Node& node, const std::string& type,
 
 void CZipResources::SaveMemory(const Node& node, const std::string& key, const P<peru::IMemoryBlock>& block) {
     if (!block) return;
-    const std::string name = "memory" + std::to_string(m_entryNumbers.GetNext());
+    const std::string name = makeName("memory");
     WriteEntry(name,
                {reinterpret_cast<const char*>(block->getData()), static_cast<size_t>(block->getSize())});
     const Node child = addChild(node, key.c_str());

@@ -3,6 +3,8 @@
 
 #include "graphics/storage/Reusables.h"
 
+#include <set>
+
 class wxZipOutputStream;
 
 namespace graphics {
@@ -28,8 +30,12 @@ public:
     void WriteEntry(const std::string& name, std::string_view bytes);
 
 private:
+    // An unused name: the word, a number and the ending.
+    std::string makeName(const char* word, const std::string& ending = {});
+
     wxZipOutputStream& m_archive;
     CIdGenerator m_entryNumbers;
+    std::set<std::string> m_names;
     CSavedResources m_resources;
     std::map<const CBitmap*, std::string>
         m_bitmapEntries; // so that elements that share a bitmap share its entry
