@@ -30,11 +30,16 @@ SXmlFragment loadOthers(const Node& node, graphics::IResourceInputStore& store, 
 } // namespace
 
 P<CItem> CItem::Load(const Node& node, graphics::IResourceInputStore& store) {
-    const auto item = peru::make<CItem>(peru::make<graphics::CGraphicDocument>());
-    if (const Node design = node->getChildNode(kDesign)) item->m_document->Load(design, store);
+    const auto item = LoadDesign(node->getChildNode(kDesign), store);
     graphics::readAttribute(node, kThemeName, item->m_themeName);
     item->m_others = loadOthers(node, store, kThemeName,
                                 [](const Node& child) { return graphics::getName(child) == kDesign; });
+    return item;
+}
+
+P<CItem> CItem::LoadDesign(const Node& node, graphics::IResourceInputStore& store) {
+    const auto item = peru::make<CItem>(peru::make<graphics::CGraphicDocument>());
+    item->m_document->Load(node, store);
     return item;
 }
 
@@ -59,10 +64,8 @@ P<CDocument> CDocument::Load(const Node& node, graphics::IResourceInputStore& st
         std::string themeName;
         graphics::readAttribute(node, kThemeName, themeName);
         for (auto designs = node->getChildNodesByName(kDesign); designs.hasMore();) {
-            const auto item = peru::make<CItem>(peru::make<graphics::CGraphicDocument>());
-            item->GetDocument()->Load(designs.getNext(), store);
-            item->SetThemeName(themeName);
-            document->m_items.push_back(item);
+            document->m_items.push_back(CItem::LoadDesign(designs.getNext(), store));
+            document->m_items.back()->SetThemeName(themeName);
         }
     }
     for (auto children = node->getChildNodes(); children.hasMore();) {

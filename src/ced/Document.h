@@ -12,8 +12,10 @@ public:
     explicit CItem(const P<graphics::CGraphicDocument>& document) : m_document(document) {}
     ~CItem() override = default;
 
-    // `node` is the element of the item.
+    // `node` is the element of the item, which has a design.
     static P<CItem> Load(const P<peru::IXmlNode>& node, graphics::IResourceInputStore& store);
+    // `node` is the element of the design alone.
+    static P<CItem> LoadDesign(const P<peru::IXmlNode>& node, graphics::IResourceInputStore& store);
     void Save(const P<peru::IXmlNode>& node, graphics::IResourceOutputStore& store) const;
 
     const P<graphics::CGraphicDocument>& GetDocument() const { return m_document; } // never empty

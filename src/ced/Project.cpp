@@ -3,6 +3,7 @@
 #include "graphics/storage/XmlValues.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
+#include "peru/strings/StringFormat.h"
 #include "peru/system/ISystem.h"
 
 #include <algorithm>
@@ -14,6 +15,8 @@ using graphics::Node;
 namespace {
 
 constexpr const char* kRoot = "project";
+constexpr const char* kDesign = "graphic-document";
+constexpr auto kNoTarget = static_cast<TargetType>(kTargetTypeCount);
 constexpr const char* kContent = "content";
 constexpr const char* kFormats = "formats";
 constexpr const char* kVersionName = "version";
@@ -75,11 +78,11 @@ void CProject::LoadContent(const Node& root, graphics::IResourceInputStore& stor
     graphics::readBool(root, kCutMarks, m_hasCutMarks);
     graphics::readBool(root, kColoured, m_isColoured);
     if (IsFromLaterVersion())
-        store.Report(peru::localize("ced.CProject.LaterVersion",
-                                    "The file is of version %VERSION%, which is later than %KNOWN%. What is "
-                                    "unknown of it is preserved as far as possible.",
-                                    {{"%VERSION%", peru::CString::fromUTF8(std::to_string(m_version))},
-                                     {"%KNOWN%", peru::CString::fromUTF8(std::to_string(kVersion))}}));
+        store.Report(peru::localize(
+            "ced.CProject.LaterVersion",
+            "The file is of version %VERSION%, which is later than %KNOWN%. What is "
+            "unknown of it is preserved as far as possible.",
+            {{"%VERSION%", peru::format("%d", m_version)}, {"%KNOWN%", peru::format("%d", kVersion)}}));
     if (const Node content = root->getChildNode(kContent)) m_content = SXmlFragment::Load(content, store);
     if (const Node formats = root->getChildNode(kFormats)) m_formats = SXmlFragment::Load(formats, store);
     m_others = SXmlFragment::LoadAttributes(root);
@@ -93,6 +96,12 @@ void CProject::LoadContent(const Node& root, graphics::IResourceInputStore& stor
         const auto type = TargetTypeFromXml(name);
         if (type && !GetTarget(*type)) {
             SetTarget(*type, CDocument::Load(child, store));
+            return true;
+        }
+        if (name == kDesign) { // the clipboard
+            const auto document = peru::make<CDocument>();
+            document->AddItem(CItem::LoadDesign(child, store));
+            m_otherTargets.emplace_back(TargetTypeToXml(kNoTarget), document);
             return true;
         }
         if (!CDocument::IsDocument(child)) return false;

@@ -64,8 +64,54 @@ TEST(Project, CarriesAlongWhatItDoesNotKnow) {
                              "corner=\"round\"", "<weight value=\"2\" />", "<cassette>", "sound1.ogg"})
         EXPECT_NE(xml.find(part), std::string::npos) << part << " in\n" << xml;
     folder.write("b.cedprj", archive);
+    folder.write("b.xml", xml);
+    EXPECT_EQ(tests::CProcess({"xmllint", "--noout", "b.xml"}, folder.path().string()).wait().exitCode, 0);
     for (const std::string entry : {"image0.jpg", "sound1.ogg"}) {
         const auto unzip = tests::CProcess({"unzip", "-p", "b.cedprj", entry}, folder.path().string()).wait();
         EXPECT_EQ(unzip.out, entry == "image0.jpg" ? "not referred to" : "OggS") << unzip.err;
     }
+}
+
+TEST(Project, ReadsEveryKindOfFile) {
+    std::mt19937 random(2);
+    const std::string picture = tests::makeBitmap(random, false)->Encode(graphics::EBitmapFormat::jpg);
+    const auto makeArchive = [](const std::vector<graphics::SArchiveEntry>& entries) {
+        return graphics::WriteArchive(
+            {"unused.xml", "unused"}, [](const auto&, auto&) {}, false, entries);
+    };
+    const std::string items =
+        "<disc><item><attachment-thumbnail name=\"image0.jpg\"/><format type=\"disc\" width=\"116\"/>"
+        "<graphic-document><label text=\"a\"/></graphic-document></item></disc>";
+    const struct {
+        std::string bytes;
+        EProjectFile kind;
+        size_t count; // of designs
+    } files[] = {
+        {makeArchive(
+             {{"template.xml", "<template version=\"2\">" + items + "</template>"}, {"image0.jpg", picture}}),
+         EProjectFile::designs, 1},
+        {makeArchive({{"theme.xml", "<theme version=\"2\">" + items + "</theme>"}, {"image0.jpg", picture}}),
+         EProjectFile::theme, 1},
+        {"<project>" + items + "</project>", EProjectFile::exported, 1},
+        {makeArchive(
+             {{"graphic-document.xml", "<project><graphic-document><label/></graphic-document></project>"}}),
+         EProjectFile::clipboard, 1},
+        {makeArchive({{"jewel-case-back.jpg", picture},
+                      {"jewel-case-front,folded.jpg", picture},
+                      {"disc,folded.jpg", picture},
+                      {"slim-case.jpg", "no picture"}}),
+         EProjectFile::coverPages, 2},
+    };
+    for (const auto& file : files) {
+        const auto project = CProject::FromBytes(file.bytes);
+        EXPECT_EQ(project->GetFileKind(), file.kind);
+        size_t count = 0;
+        for (const auto& [name, document] : project->GetDocuments()) count += document->GetItems().size();
+        EXPECT_EQ(count, file.count) << static_cast<int>(file.kind);
+        EXPECT_EQ(CProject::FromBytes(project->ToArchive())->GetDocuments().size(), 1u);
+    }
+    const auto folded =
+        CProject::FromBytes(files[4].bytes)->GetTarget(TargetType::jewelCase)->GetItems()[0]->GetDocument();
+    EXPECT_EQ(folded->GetSourceBox(), (graphics::SRect{0, 0, 242, 121}));
+    EXPECT_EQ(folded->GetBoundingBox(), folded->GetSourceBox());
 }

@@ -19,6 +19,12 @@ constexpr int kCompressionLevel = 9;
 // The tree of a document takes several times the memory of its text.
 constexpr size_t kMaximalXml = 64 << 20; // bytes, without attachments
 constexpr size_t kMaximalXmlWithAttachments = 512 << 20;
+constexpr int64_t kMaximalMarkup = 4'000'000; // tags and attributes
+
+bool hasTooMuchMarkup(const std::string& xml) {
+    return std::count_if(xml.begin(), xml.end(), [](char ch) { return ch == '<' || ch == '='; }) >
+           kMaximalMarkup;
+}
 
 P<peru::CXmlDocument> parse(const char* root, const std::string& bytes, size_t limit,
                             const std::string& name) {
@@ -27,7 +33,7 @@ P<peru::CXmlDocument> parse(const char* root, const std::string& bytes, size_t l
             key, text,
             {{"%NAME%", peru::CString::fromUTF8(name)}, {"%ROOT%", root}, {"%DETAILS%", details}}));
     };
-    if (bytes.size() > limit)
+    if (bytes.size() > limit || hasTooMuchMarkup(bytes))
         fail("graphics.DocumentArchive.TooLarge", "The XML \"%NAME%\" is too large.", peru::CString::empty());
     auto document = peru::make<peru::CXmlDocument>();
     try {
@@ -72,7 +78,8 @@ void ReadArchive(const SArchiveForm& form, std::string bytes, const LoadContent&
 }
 
 void ReadArchive(const SArchiveForm& form, CZipCatalogue& catalogue, const LoadContent& load) {
-    const auto document = parse(form.root, catalogue.ReadEntry(form.entry), kMaximalXml, form.entry);
+    const auto document =
+        parse(form.root, catalogue.ReadEntry(form.entry, kMaximalXml), kMaximalXml, form.entry);
     load(document->getRootNode(), catalogue);
 }
 

@@ -2,9 +2,11 @@
 #include "graphics/documents/FreeForm.h"
 #include "graphics/elements/ElementFactory.h"
 #include "graphics/storage/IResourceStores.h"
+#include "graphics/storage/XmlNames.h"
 #include "graphics/storage/XmlValues.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
+#include "peru/strings/StringFormat.h"
 
 namespace graphics {
 
@@ -15,24 +17,35 @@ constexpr int kDocumentVersion = 1;
 void saveXDatas(const Node& node, const CXDatas& datas) {
     const Node children = addChild(node, "xdata");
     for (const auto& [name, data] : datas.GetAll()) {
-        const Node child = children->addChildNode(peru::CString::fromUTF8(name));
+        const Node child = children->addChildNode(peru::CString::fromUTF8(encodeName(name)));
         writeAttribute(child, "type", data->GetTypeName());
         writeAttribute(child, "value", data->Save());
     }
 }
 
-P<CXDatas> loadXDatas(const Node& node) {
+P<CXDatas> loadXDatas(const Node& node, IResourceInputStore& store) {
     auto datas = peru::make<CXDatas>();
     for (auto children = node->getChildNodes(); children.hasMore();) {
         const Node child = children.getNext();
         std::string type, value;
         readAttribute(child, "type", type);
         const auto data = CXDatas::Create(type);
-        if (!data) continue;
+        if (!data) {
+            store.Report(
+                peru::localize("graphics.CXDatas.UnknownType",
+                               "The value \"%NAME%\" of the unknown type \"%TYPE%\" is left out.",
+                               {{"%NAME%", child->getName()}, {"%TYPE%", peru::CString::fromUTF8(type)}}));
+            continue;
+        }
         if (readAttribute(child, "value", value)) data->Load(value);
-        datas->Set(getName(child), data);
+        datas->Set(decodeName(getName(child)), data);
     }
     return datas;
+}
+
+// The children of a document that are not elements.
+bool isPartOfDocument(std::string_view tag) {
+    return tag == "bounding-box" || tag == "content-box" || tag == "xdata";
 }
 
 // The element of a node, not yet loaded; empty if the node is not one, or of a class that this program lacks.
@@ -41,7 +54,13 @@ P<CGraphicElement> createElement(const Node& node, IResourceInputStore& store) {
     static constexpr const char* kTableContent = "table-content";
     const std::string tag = getName(node);
     const bool isTableContent = tag == kTableContent;
-    if (!isTableContent && !IsGraphicTypeTag(tag)) return {};
+    if (!isTableContent && !IsGraphicTypeTag(tag)) {
+        if (!isPartOfDocument(tag))
+            store.Report(peru::localize("graphics.CGraphicDocument.UnknownTag",
+                                        "An unknown element \"%TAG%\" is left out.",
+                                        {{"%TAG%", peru::CString::fromUTF8(tag)}}));
+        return {};
+    }
     std::string typeName = isTableContent ? kTableContent : "";
     readAttribute(node, "type-name", typeName);
     const auto element =
@@ -83,6 +102,13 @@ void CGraphicDocument::Save(const Node& node, IResourceOutputStore& store) {
 void CGraphicDocument::Load(const Node& node, IResourceInputStore& store) {
     const CUpdate update(*this);
     Clear();
+    int64_t version = kDocumentVersion;
+    if (readInteger(node, "version", version) && version > kDocumentVersion)
+        store.Report(peru::localize(
+            "graphics.CGraphicDocument.LaterVersion",
+            "A design is of version %VERSION%, which is later than %KNOWN%. What is "
+            "unknown of it is lost when it is saved.",
+            {{"%VERSION%", peru::format("%d", version)}, {"%KNOWN%", peru::format("%d", kDocumentVersion)}}));
     if (SRect box; read(node, "content-box", box)) SetContentBox(box);
     for (auto children = node->getChildNodes(); children.hasMore();) {
         const Node child = children.getNext();
@@ -93,7 +119,7 @@ void CGraphicDocument::Load(const Node& node, IResourceInputStore& store) {
         if (!element->HasListener(this)) Add(element);
     }
     const Node datas = node->getChildNode("xdata");
-    SetXDatas(datas ? loadXDatas(datas) : nullptr);
+    SetXDatas(datas ? loadXDatas(datas, store) : nullptr);
 }
 
 void CFreeForm::Save(const Node& node, IResourceOutputStore& store) const {

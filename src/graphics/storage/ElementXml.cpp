@@ -6,6 +6,7 @@
 #include "graphics/elements/GraphicShape.h"
 #include "graphics/elements/GraphicText.h"
 #include "graphics/storage/IResourceStores.h"
+#include "graphics/storage/XmlNames.h"
 #include "graphics/storage/XmlValues.h"
 #include "peru/Errors.h"
 
@@ -26,7 +27,7 @@ void CGraphicElement::Save(const Node& node, IResourceOutputStore&) const {
     writeAttribute(node, "text-id", m_textId);
     if (!m_tags.empty()) {
         const Node tags = addChild(node, "tags");
-        for (const std::string& tag : m_tags) tags->addChildNode(peru::CString::fromUTF8(tag));
+        for (const std::string& tag : m_tags) tags->addChildNode(peru::CString::fromUTF8(encodeName(tag)));
     }
     if (!m_groups.empty()) {
         const Node groups = addChild(node, "groups");
@@ -50,7 +51,7 @@ void CGraphicElement::Load(const Node& node, IResourceInputStore&) {
     ClearTags();
     if (const Node tags = node->getChildNode("tags"))
         for (auto children = tags->getChildNodes(); children.hasMore();)
-            AddTag(graphics::getName(children.getNext()));
+            AddTag(decodeName(graphics::getName(children.getNext())));
     ClearGroups();
     if (const Node groups = node->getChildNode("groups"))
         for (auto children = groups->getChildNodesByName("group"); children.hasMore();) {

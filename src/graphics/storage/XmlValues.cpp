@@ -4,6 +4,7 @@
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/strings/String.h"
+#include "peru/xml/XmlText.h"
 
 #include <limits>
 
@@ -32,6 +33,19 @@ constexpr SPart<SScaleMargins> kMargins[] = {
     {"bottom-factor", &SScaleMargins::bottomFactor},
 };
 
+// Without the control characters and malformed bytes that XML cannot hold; a text that was pasted with one
+// would otherwise make its document impossible to save.
+std::string removeInvalid(std::string_view text) {
+    std::string valid;
+    valid.reserve(text.size());
+    while (!text.empty()) {
+        const size_t size = peru::measureXmlCharacter(text.substr(0, 4));
+        valid.append(text.substr(0, size));
+        text.remove_prefix(std::max<size_t>(1, size));
+    }
+    return valid;
+}
+
 template <class T, size_t N>
 void writeParts(const Node& node, const char* key, const T& value, const SPart<T> (&parts)[N]) {
     const Node child = addChild(node, key);
@@ -57,10 +71,11 @@ void throwInvalid(const Node& node, const char* attribute, const std::string& va
 }
 
 void writeAttribute(const Node& node, const char* name, const std::string& value) {
-    if (value.empty())
+    const std::string text = removeInvalid(value);
+    if (text.empty())
         node->removeProperty(name);
     else
-        node->setProperty(name, peru::CString::fromUTF8(value));
+        node->setProperty(name, peru::CString::fromUTF8(text));
 }
 
 void writeNumber(const Node& node, const char* name, double value) {

@@ -15,7 +15,7 @@ namespace graphics {
 using peru::P;
 using Node = P<peru::IXmlNode>;
 
-// An empty value writes nothing.
+// An empty value writes nothing. Characters that XML cannot hold are dropped.
 void writeAttribute(const Node& node, const char* name, const std::string& value);
 void writeNumber(const Node& node, const char* name, double value);
 void writeInteger(const Node& node, const char* name, int64_t value);

@@ -20,7 +20,10 @@ namespace {
 
 } // namespace
 
-CZipCatalogue::CZipCatalogue(std::string archive) : m_archive(std::move(archive)) {}
+CZipCatalogue::CZipCatalogue(std::string archive)
+    : m_archive(std::move(archive)),
+      m_maximalTotal(std::clamp(static_cast<int64_t>(m_archive.size()) * kMaximalExpansion, kMinimalTotal,
+                                kMaximalTotal)) {}
 
 CZipCatalogue::~CZipCatalogue() = default;
 
@@ -39,7 +42,7 @@ bool CZipCatalogue::HasEntry(const std::string& name) {
     return m_entries.count(name) != 0;
 }
 
-std::string CZipCatalogue::ReadEntry(const std::string& name) {
+std::string CZipCatalogue::ReadEntry(const std::string& name, int64_t maximalSize) {
     if (!HasEntry(name)) fail("graphics.CZipCatalogue.Missing", "The archive has no entry \"%NAME%\".", name);
     m_readEntries.insert(name);
     const wxLogNull quiet;
@@ -49,13 +52,14 @@ std::string CZipCatalogue::ReadEntry(const std::string& name) {
     if (!m_zip->OpenEntry(*m_entries.at(name))) damaged();
     // In pieces: the size that the archive announces may be wrong.
     std::string bytes;
+    bytes.reserve(static_cast<size_t>(std::clamp<int64_t>(m_entries.at(name)->GetSize(), 0, maximalSize)));
     std::vector<char> buffer(64 * 1024);
     for (;;) {
         m_zip->Read(buffer.data(), buffer.size());
         const size_t count = m_zip->LastRead();
         bytes.append(buffer.data(), count);
         m_total += static_cast<int64_t>(count);
-        if (static_cast<int64_t>(bytes.size()) > kMaximalEntry || m_total > kMaximalTotal)
+        if (static_cast<int64_t>(bytes.size()) > maximalSize || m_total > m_maximalTotal)
             fail("graphics.CZipCatalogue.TooLarge", "The entry \"%NAME%\" of the archive is too large.",
                  name);
         if (m_zip->Eof()) break;

@@ -17,8 +17,10 @@ namespace graphics {
 class GRAPHICS_API CZipCatalogue : public peru::CObject, public IResourceInputStore {
 public:
     // Limits on what is unpacked, against archives that expand without end.
-    static constexpr int64_t kMaximalEntry = 256 << 20; // bytes
-    static constexpr int64_t kMaximalTotal = 2048ll << 20;
+    static constexpr int64_t kMaximalEntry = 256 << 20;    // bytes
+    static constexpr int64_t kMinimalTotal = 256 << 20;    // small archives may expand to this size,
+    static constexpr int64_t kMaximalExpansion = 20;       // larger ones by this factor,
+    static constexpr int64_t kMaximalTotal = 2048ll << 20; // but no archive further than this
 
     // An archive that cannot be read has no entries.
     explicit CZipCatalogue(std::string archive);
@@ -40,7 +42,7 @@ public:
 
     bool HasEntry(const std::string& name);
     // Throws CError, which names the entry, if it is missing, damaged or above a limit.
-    std::string ReadEntry(const std::string& name);
+    std::string ReadEntry(const std::string& name, int64_t maximalSize = kMaximalEntry);
     // The picture of an entry; empty if it is missing or damaged.
     P<CBitmap> LoadBitmapEntry(const std::string& name, EBitmapFormat format);
     // Files that nobody has asked for, in the order of their names.
@@ -61,6 +63,7 @@ private:
     CLoadedResources m_resources;
     CLoadReports m_reports;
     int64_t m_total = 0; // bytes unpacked
+    const int64_t m_maximalTotal;
     bool m_isRead = false;
 };
 

@@ -10,11 +10,21 @@
 
 namespace graphics {
 
+namespace {
+
+bool isCompressed(EBitmapFormat format) {
+    return format == EBitmapFormat::jpg || format == EBitmapFormat::jng || format == EBitmapFormat::png;
+}
+
+} // namespace
+
 void CZipResources::WriteEntry(const std::string& name, std::string_view bytes) {
     m_names.insert(name);
-    const wxDateTime date(1, wxDateTime::Jan, 1990);
-    if (m_archive.PutNextEntry(wxString::FromUTF8(name), date) &&
-        m_archive.WriteAll(bytes.data(), bytes.size()) && m_archive.CloseEntry())
+    auto entry = std::make_unique<wxZipEntry>(wxString::FromUTF8(name), wxDateTime(1, wxDateTime::Jan, 1990));
+    // Deflating a compressed picture again takes time and saves nothing.
+    if (isCompressed(getFormatOfFile(name))) entry->SetMethod(wxZIP_METHOD_STORE);
+    if (m_archive.PutNextEntry(entry.release()) && m_archive.WriteAll(bytes.data(), bytes.size()) &&
+        m_archive.CloseEntry())
         return;
     throw peru::CError(peru::localize("graphics.CZipResources.NotWritten",
                                       "The entry \"%NAME%\" could not be written to the archive.",

@@ -26,7 +26,7 @@ public:
     void SetLossless(bool isLossless) override { m_isLossless = isLossless; }
     bool IsLossless() const override { return m_isLossless; }
 
-    // Compressed, with a fixed date: the same content gives the same archive.
+    // With a fixed date: the same content gives the same archive.
     void WriteEntry(const std::string& name, std::string_view bytes);
 
 private:

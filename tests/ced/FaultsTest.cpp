@@ -1,0 +1,191 @@
+// Projects on disks that fail, and projects that are damaged.
+#include "ced/Project.h"
+#include "filetag/FaultyCalls.h"
+#include "graphics/Elements.h"
+#include "support/Files.h"
+#include "support/TempFolder.h"
+
+#include <gmock/gmock.h>
+
+#include <csignal>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+using namespace ced;
+using testing::HasSubstr;
+using tests::P;
+
+namespace {
+
+P<CProject> makeProject(unsigned seed) {
+    std::mt19937 random(seed);
+    const auto project = peru::make<CProject>();
+    for (const TargetType target : {TargetType::disc, TargetType::booklet}) {
+        const auto design = tests::makeDocument(random);
+        const auto image = peru::make<graphics::CGraphicImage>();
+        image->SetBitmap(tests::makeBitmap(random, target == TargetType::disc));
+        design->Add(image);
+        const auto document = peru::make<CDocument>();
+        document->AddItem(peru::make<CItem>(design));
+        project->SetTarget(target, document);
+    }
+    return project;
+}
+
+// "done", or the error of the operation; errors of other kinds say so.
+std::string report(const std::function<void()>& operation) {
+    try {
+        operation();
+        return "done";
+    } catch (const peru::CFileError& error) {
+        return tests::text(error.getDescription());
+    } catch (const std::exception& error) {
+        return std::string("not an error of a file: ") + error.what();
+    }
+}
+
+std::string openBytes(const std::string& bytes, P<CProject>* project = nullptr) {
+    try {
+        const auto opened = CProject::FromBytes(bytes);
+        if (project) *project = opened;
+        return "done";
+    } catch (const peru::CError& error) {
+        return tests::text(error.getDescription());
+    }
+}
+
+std::string makeArchive(const std::vector<graphics::SArchiveEntry>& entries) {
+    return graphics::WriteArchive(
+        {"unused.xml", "unused"}, [](const auto&, auto&) {}, false, entries);
+}
+
+} // namespace
+
+TEST(ProjectFaults, EveryFailingCallLeavesTheOldFileOrTheNewOne) {
+    const tests::CTempFolder folder;
+    const std::string before = makeProject(1)->ToArchive(), after = makeProject(2)->ToArchive();
+    const auto project = CProject::FromBytes(after);
+    const auto file = tests::toURI(folder / "a.cedprj");
+    const auto save = [&] { return [&] { return report([&] { project->Save(file); }); }; };
+    const auto open = [&] { return [&] { return report([&] { CProject::Open(file); }); }; };
+    for (const auto& [error, forGood] : {std::pair(EIO, false), {EOPNOTSUPP, false}, {ENOSPC, true}})
+        for (const bool isSave : {true, false})
+            for (int call = 1;; ++call) {
+                SCOPED_TRACE(std::to_string(error) + (isSave ? ", save, " : ", open, ") +
+                             std::to_string(call));
+                ASSERT_LT(call, 500);
+                folder.write("a.cedprj", before);
+                const auto run = isSave ? tests::runWithFault({call, error, forGood}, save)
+                                        : tests::runWithFault({call, error, forGood}, open);
+                if (!run.supported) GTEST_SKIP() << "calls cannot be intercepted";
+                ASSERT_TRUE(WIFEXITED(run.status));
+                ASSERT_THAT(run.report, testing::AnyOf("done", HasSubstr("a.cedprj")));
+                ASSERT_EQ(tests::readFile(folder / "a.cedprj"),
+                          isSave && run.report == "done" ? after : before);
+                ASSERT_EQ(tests::countEntries(folder.path()), 1u);
+                if (!run.struck) {
+                    ASSERT_EQ(run.report, "done");
+                    break;
+                }
+            }
+}
+
+TEST(ProjectFaults, PlacesThatCannotBeWritten) {
+    const tests::CTempFolder folder;
+    const auto project = makeProject(3);
+    folder.write("a.cedprj", "old");
+    std::filesystem::create_symlink("a.cedprj", folder / "link.cedprj");
+    std::filesystem::permissions(folder / "a.cedprj", std::filesystem::perms(0640));
+    // The rest runs in a process of its own, which gives up its rights.
+    const auto expectOld = [&](const char* name, const std::function<void()>& prepare) {
+        const auto run = tests::runWithFault({}, [&]() -> std::function<std::string()> {
+            prepare();
+            return [&project, file = tests::toURI(folder / name)] {
+                return report([&] { project->Save(file); }) + report([&] { project->Export(file); });
+            };
+        });
+        if (!run.supported) return;
+        EXPECT_THAT(run.report, testing::ContainsRegex(std::string(name) + ".*" + name));
+        EXPECT_EQ(tests::readFile(folder / "a.cedprj"), "old");
+    };
+    const auto becomeUser = [] {
+        if (::getuid() == 0 && ::setuid(65534) != 0) ::_exit(1);
+    };
+    expectOld("a.cedprj", [] {
+        ::signal(SIGXFSZ, SIG_IGN);
+        const rlimit limit{100, 100};
+        ::setrlimit(RLIMIT_FSIZE, &limit);
+    });
+    std::filesystem::permissions(folder.path(), std::filesystem::perms(0555));
+    expectOld("a.cedprj", becomeUser);
+    expectOld("b.cedprj", becomeUser);
+    std::filesystem::permissions(folder.path(), std::filesystem::perms(0755));
+    project->Save(tests::toURI(folder / "link.cedprj"));
+    EXPECT_TRUE(std::filesystem::is_symlink(folder / "link.cedprj"));
+    EXPECT_EQ(tests::readFile(folder / "a.cedprj"), project->ToArchive());
+    EXPECT_EQ(std::filesystem::status(folder / "a.cedprj").permissions(), std::filesystem::perms(0640));
+}
+
+TEST(ProjectFaults, DamagedFilesAreReported) {
+    std::mt19937 random(4);
+    const std::string archive = makeProject(5)->ToArchive(), xml = makeProject(5)->ToXml();
+    ASSERT_EQ(openBytes(archive), "done");
+    ASSERT_EQ(openBytes(xml), "done");
+    for (size_t i = 0; i < 200; ++i) {
+        EXPECT_NE(openBytes(archive.substr(0, archive.size() * i / 200)), "done") << i;
+        EXPECT_NE(openBytes(xml.substr(0, xml.size() * i / 200)), "done") << i;
+    }
+    for (int i = 0; i < 2000; ++i) {
+        std::string flipped = i % 4 ? archive : xml;
+        flipped[random() % flipped.size()] ^= static_cast<char>(1 << random() % 8);
+        P<CProject> project;
+        // What opens can be saved.
+        openBytes(flipped, &project);
+        if (project && i % 20 == 0) project->ToArchive();
+    }
+}
+
+TEST(ProjectFaults, ErrorsNameTheEntryOrElement) {
+    std::mt19937 random(6);
+    std::string large = tests::makeBitmap(random, false)->Encode(graphics::EBitmapFormat::png);
+    large[16] = large[20] = 0x7F; // the size in the header
+    const auto withXml = [](const std::string& xml) { return makeArchive({{"project.xml", xml}}); };
+    const auto image = [](const std::string& content) {
+        return "<project><disc><item><graphic-document><image>" + content +
+               "</image></graphic-document></item></disc></project>";
+    };
+    const std::string attached = image("<attachment-bitmap name=\"image3.png\"/>");
+    const struct {
+        std::string file;
+        const char* expected; // parts of the error, or of the report of a file that opens
+    } cases[] = {
+        {"", "XML"},
+        {"PK", "project.xml"},
+        {withXml("<theme/>"), "project.xml.*project"},
+        {withXml("<project><disc>"), "project.xml.*line"},
+        {withXml("<project>" + std::string(65 << 20, ' ')), "project.xml.* too large"},
+        {withXml(image("<size width=\"1,5\"/>")), "1,5.*width.*size"},
+        {"<project version=\"two\"/>", "two.*version.*project"},
+        {withXml(attached), "image3.png"},
+        {makeArchive({{"project.xml", attached}, {"image3.png", "no picture"}}), "image3.png.*header"},
+        {makeArchive({{"project.xml", attached}, {"image3.png", large}}), "image3.png.*too large"},
+        {image("<attachment-bitmap extension=\"jpg\"><base64>?</base64></attachment-bitmap>"),
+         "attachment-bitmap.*base64"},
+    };
+    for (const auto& [file, expected] : cases) {
+        P<CProject> project;
+        std::string text = openBytes(file, &project);
+        if (project) {
+            ASSERT_EQ(project->GetReports().size(), 1u) << expected;
+            text = project->GetReports()[0];
+            const auto& element =
+                project->GetTarget(TargetType::disc)->GetItems()[0]->GetDocument()->GetElement(0);
+            EXPECT_FALSE(P<graphics::CGraphicImage>(element)->GetBitmap());
+        }
+        EXPECT_THAT(text, testing::ContainsRegex(expected));
+    }
+    std::string many = "<a b=\"\"/>";
+    while (many.size() < 100 << 20) many += many; // twice as long each time
+    EXPECT_THAT(openBytes(many), HasSubstr("too large"));
+}
