@@ -24,7 +24,7 @@ pkg_check_modules(EBUR128 REQUIRED IMPORTED_TARGET libebur128)
 pkg_check_modules(CAIRO REQUIRED IMPORTED_TARGET cairo cairo-pdf cairo-svg)
 pkg_check_modules(PANGOCAIRO REQUIRED IMPORTED_TARGET pangocairo)
 
-find_package(wxWidgets 3.2 REQUIRED COMPONENTS core base)
+find_package(wxWidgets 3.2 REQUIRED COMPONENTS richtext html xml core base)
 add_library(wx INTERFACE)
 add_library(wx::wx ALIAS wx)
 target_include_directories(wx SYSTEM INTERFACE ${wxWidgets_INCLUDE_DIRS})
