@@ -1,9 +1,13 @@
 #include "graphics/elements/GraphicTable.h"
 
 #include "graphics/elements/CloneAs.h"
+#include "graphics/text/LayoutCache.h"
+#include "graphics/text/RichTextParser.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/strings/StringFormat.h"
+
+#include <cmath>
 
 namespace graphics {
 
@@ -49,9 +53,14 @@ std::string CGraphicTable::CCol::getLabel(int number) const {
                        {{"%INDEX%", peru::format("%d", number)}, {"%NAME%", peru::CString::fromUTF8(name)}}));
 }
 
+CGraphicTable::CCell::CCell() = default;
+
+CGraphicTable::CCell::~CCell() = default;
+
 P<CGraphicTable::CTableObject> CGraphicTable::CCell::Clone() const {
     auto copy = peru::make<CCell>();
-    copy->copyFormat(*this);
+    copy->margin = margin;
+    copy->verticalAlign = verticalAlign;
     copy->text = text;
     copy->contentId = contentId;
     return copy;
@@ -60,6 +69,7 @@ P<CGraphicTable::CTableObject> CGraphicTable::CCell::Clone() const {
 void CGraphicTable::CCell::copyFormat(const CCell& other) {
     margin = other.margin;
     verticalAlign = other.verticalAlign;
+    text = other.text ? makeRichTextLike(other.text, {}) : nullptr;
     InvalidateLayout();
 }
 
@@ -70,7 +80,7 @@ CGraphicTable::CGraphicTable() {
 std::string CGraphicTable::GetHint() const {
     if (!GetHintText().empty()) return GetHintText();
     return peru::CString::toStdString(
-        m_rows.empty() || m_cols.empty()
+        !HasText()
             ? peru::localize("graphics.GraphicTable.ClickToEdit", "Double click to edit!")
             : peru::localize("graphics.CGraphicElement.ClickToEditTable", "Double click to edit table"));
 }
@@ -187,14 +197,35 @@ void CGraphicTable::ExchangeCols(int first, int second) {
     DropHitMask();
 }
 
+namespace {
+
+void checkSize(const char* method, double size) {
+    if (!(size >= 0 && std::isfinite(size)))
+        throw peru::CInvalidArgError(peru::format("size %f", size), method);
+}
+
+} // namespace
+
 void CGraphicTable::SetColWidth(int col, double width) {
+    checkSize("SetColWidth", width);
     GetCol(col).width = width;
     for (auto& line : m_cells) line[static_cast<size_t>(col)]->InvalidateLayout();
     DropHitMask();
 }
 
 void CGraphicTable::SetRowHeight(int row, double height) {
+    checkSize("SetRowHeight", height);
     GetRow(row).height = height;
+    DropHitMask();
+}
+
+void CGraphicTable::SetColVisible(int col, bool isVisible) {
+    GetCol(col).isVisible = isVisible;
+    DropHitMask();
+}
+
+void CGraphicTable::SetColHiddenByTheme(int col, bool isHidden) {
+    GetCol(col).isHiddenByTheme = isHidden;
     DropHitMask();
 }
 
@@ -212,6 +243,46 @@ void CGraphicTable::ClearCells() {
             cell->InvalidateLayout();
         }
     DropHitMask();
+}
+
+std::vector<int> CGraphicTable::resizeItemRows(int count) {
+    std::vector<int> rows;
+    for (int row = 0; row < GetRowCount(); ++row)
+        if (GetRow(row).contentId.empty()) rows.push_back(row);
+    while (static_cast<int>(rows.size()) > count) {
+        DeleteRows(rows.back(), 1);
+        rows.pop_back();
+    }
+    while (static_cast<int>(rows.size()) < count) {
+        const int row = rows.empty() ? GetRowCount() : rows.back() + 1;
+        InsertRows(row, 1);
+        // The row before it is the model, not a row with headings behind it.
+        if (!rows.empty()) {
+            GetRow(row).height = GetRow(row - 1).height;
+            for (int col = 0; col < GetColCount(); ++col) GetCell(row, col).copyFormat(GetCell(row - 1, col));
+        }
+        rows.push_back(row);
+    }
+    return rows;
+}
+
+void CGraphicTable::FillFromContent(int itemCount, const GetContentValue& getValue) {
+    const std::vector<int> rows = resizeItemRows(std::max(1, itemCount));
+    for (int item = 0; item < static_cast<int>(rows.size()); ++item)
+        for (int col = 0; col < GetColCount(); ++col) {
+            const std::string& id = GetCol(col).contentId;
+            if (id.empty()) continue;
+            const int row = rows[static_cast<size_t>(item)];
+            SetCellText(row, col,
+                        makeRichTextLike(GetCell(row, col).text, item < itemCount ? getValue(id, item) : ""));
+        }
+}
+
+bool CGraphicTable::HasText() const {
+    return std::any_of(m_cells.begin(), m_cells.end(), [](const auto& line) {
+        return std::any_of(line.begin(), line.end(),
+                           [](const auto& cell) { return cell->text && hasText(*cell->text); });
+    });
 }
 
 double CGraphicTable::GetTotalWidth() const {

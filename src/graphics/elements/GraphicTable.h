@@ -4,7 +4,11 @@
 #include "graphics/elements/GraphicElement.h"
 #include "graphics/elements/RichText.h"
 
+#include <functional>
+
 namespace graphics {
+
+class CLayoutCache;
 
 enum class EVerticalAlign { top = 0, center = 1, bottom = 2 };
 
@@ -58,11 +62,11 @@ public:
 
     class GRAPHICS_API CCell : public CTableObject {
     public:
-        CCell() = default;
-        ~CCell() override = default;
+        CCell();
+        ~CCell() override;
         void InvalidateLayout() override { isLayoutStale = true; }
         P<CTableObject> Clone() const override;
-        // Everything but the text.
+        // Everything but the content: margin, alignment, and the style of the text.
         void copyFormat(const CCell& other);
 
         P<CRichText> text;   // may be empty
@@ -70,6 +74,7 @@ public:
         EVerticalAlign verticalAlign = EVerticalAlign::top;
         std::string contentId;
         bool isLayoutStale = true;
+        std::unique_ptr<CLayoutCache> layout; // of the last painting; may be null
     };
 
     CGraphicTable();
@@ -91,19 +96,33 @@ public:
     CCell& GetCell(int row, int col) const;
 
     // Before the row at the index, or at the end. New rows have the height and format of the row that was
-    // there, otherwise of the last one.
+    // there, otherwise of the last one. Columns likewise.
     void InsertRows(int row, int count);
     void InsertCols(int col, int count);
     void DeleteRows(int row, int count);
     void DeleteCols(int col, int count);
     void ExchangeRows(int first, int second);
     void ExchangeCols(int first, int second);
+    // Sizes below 0 throw CInvalidArgError.
     void SetColWidth(int col, double width);
     void SetRowHeight(int row, double height);
+    void SetColVisible(int col, bool isVisible);
+    // A column that a theme hides keeps its width and its own visibility.
+    void SetColHiddenByTheme(int col, bool isHidden);
     void SetCellText(int row, int col, const P<CRichText>& text);
     // Drops the texts; the format remains.
     void ClearCells();
 
+    // A value of an item, by the content id of a column.
+    using GetContentValue = std::function<std::string(const std::string& contentId, int item)>;
+    // Fills the columns that have a content id, one row for each item. Rows with a content id of their own,
+    // such as the one with the headings, stay as they are. Missing rows are added with the format of the last
+    // one, and those beyond the items are removed; without items, one empty row remains, so the format is not
+    // lost.
+    void FillFromContent(int itemCount, const GetContentValue& getValue);
+
+    // Whether a cell has a character or an image.
+    bool HasText() const;
     // Of the visible columns and of the rows, in millimetres, before they are scaled to the box.
     double GetTotalWidth() const;
     double GetTotalHeight() const;
@@ -113,6 +132,8 @@ protected:
 
 private:
     void checkRange(const char* method, int index, int count, int size) const;
+    // Removes or adds rows at the end of the item rows; returns the indices of the item rows.
+    std::vector<int> resizeItemRows(int count);
 
     std::vector<P<CRow>> m_rows;
     std::vector<P<CCol>> m_cols;

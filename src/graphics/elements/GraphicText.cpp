@@ -1,6 +1,8 @@
 #include "graphics/elements/GraphicText.h"
 
 #include "graphics/elements/CloneAs.h"
+#include "graphics/text/LayoutCache.h"
+#include "graphics/text/RichTextParser.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
 
@@ -10,8 +12,10 @@ CGraphicText::CGraphicText() {
     SetFlags(GetFlags() | kFlagEditable);
 }
 
+CGraphicText::~CGraphicText() = default;
+
 std::string CGraphicText::GetHint() const {
-    if (!GetHintText().empty() || !m_text) return CGraphicElement::GetHint();
+    if (!GetHintText().empty() || !m_text || !hasText(*m_text)) return CGraphicElement::GetHint();
     return peru::CString::toStdString(
         peru::localize("graphics.CGraphicText.ClickToEditText", "Double click to edit text"));
 }

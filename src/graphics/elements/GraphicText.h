@@ -8,10 +8,14 @@ namespace graphics {
 
 enum class EVerticalPlacement { top = 0, center = 1, bottom = 2 };
 
+class CLayoutCache;
+
+// Rich text in a box. It is the toolkit's rich text buffer in its stored form: see text/RichTextBuffer.h for
+// buffers to edit.
 class GRAPHICS_API CGraphicText : public CGraphicElement {
 public:
     CGraphicText();
-    ~CGraphicText() override = default;
+    ~CGraphicText() override;
 
     bool HasResource() const override { return true; }
     std::string GetHint() const override;
@@ -22,7 +26,7 @@ public:
     void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
     void Reset() override { SetText(nullptr); }
 
-    // Empty if there is no text.
+    // Empty, or without a character, if there is no text.
     const P<CRichText>& GetText() const { return m_text; }
     void SetText(const P<CRichText>& text);
     EVerticalPlacement GetVerticalPlacement() const { return m_placement; }
@@ -33,6 +37,7 @@ protected:
 
 private:
     P<CRichText> m_text;
+    mutable std::unique_ptr<CLayoutCache> m_layout; // null before the first painting
     EVerticalPlacement m_placement = EVerticalPlacement::top;
 };
 

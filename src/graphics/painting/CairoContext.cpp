@@ -1,5 +1,6 @@
 #include "graphics/painting/CairoContext.h"
 
+#include "graphics/painting/CairoBitmap.h"
 #include "graphics/text/PangoLayouts.h"
 
 #include <cmath>
@@ -10,7 +11,6 @@ namespace graphics {
 namespace {
 
 using Pattern = std::unique_ptr<cairo_pattern_t, decltype(&cairo_pattern_destroy)>;
-using Surface = std::unique_ptr<cairo_surface_t, decltype(&cairo_surface_destroy)>;
 
 void setColour(cairo_t* cairo, const SColour& colour) {
     cairo_set_source_rgba(cairo, colour.red / 255.0, colour.green / 255.0, colour.blue / 255.0,
@@ -106,34 +106,12 @@ void CCairoContext::DrawPath(const CPath& path, const SFill* fill, const SPen* p
 }
 
 void CCairoContext::DrawBitmap(const CBitmap& bitmap, const SRect& source, const SRect& target) {
-    if (!m_matrix.getInverse() || source.width <= 0 || source.height <= 0 || target.width <= 0 ||
-        target.height <= 0)
-        return;
-    // A surface over the part only: interpolation must not mix in pixels beside it. cairo only reads them.
-    const int left = std::clamp(static_cast<int>(std::lround(source.left)), 0, bitmap.GetWidth() - 1);
-    const int top = std::clamp(static_cast<int>(std::lround(source.top)), 0, bitmap.GetHeight() - 1);
-    const int width = std::clamp(static_cast<int>(std::lround(source.width)), 1, bitmap.GetWidth() - left);
-    const int height = std::clamp(static_cast<int>(std::lround(source.height)), 1, bitmap.GetHeight() - top);
-    auto* const pixels = const_cast<uint32_t*>(bitmap.GetPixels().data()) +
-                         static_cast<size_t>(top) * static_cast<size_t>(bitmap.GetWidth()) + left;
-    const Surface surface(cairo_image_surface_create_for_data(reinterpret_cast<unsigned char*>(pixels),
-                                                              CAIRO_FORMAT_ARGB32, width, height,
-                                                              bitmap.GetWidth() * 4),
-                          cairo_surface_destroy);
+    if (!m_matrix.getInverse()) return;
     cairo_save(m_cairo);
     const cairo_matrix_t matrix{m_matrix.xx, m_matrix.yx, m_matrix.xy, m_matrix.yy, m_matrix.x0, m_matrix.y0};
     cairo_transform(m_cairo, &matrix);
-    cairo_rectangle(m_cairo, target.left, target.top, target.width, target.height);
-    cairo_translate(m_cairo, target.left, target.top);
-    cairo_scale(m_cairo, target.width / width, target.height / height);
-    cairo_set_source_surface(m_cairo, surface.get(), 0, 0);
-    // Without the padding, pixels at the edge of an enlarged bitmap fade into transparency.
-    cairo_pattern_set_extend(cairo_get_source(m_cairo), CAIRO_EXTEND_PAD);
-    cairo_pattern_set_filter(cairo_get_source(m_cairo), CAIRO_FILTER_GOOD);
-    cairo_fill(m_cairo);
+    paintBitmap(m_cairo, bitmap, source, target);
     cairo_restore(m_cairo);
-    // A recording device must not refer to pixels that the bitmap may free before the page is written.
-    cairo_surface_finish(surface.get());
 }
 
 void CCairoContext::DrawLayout(const CTextLayout& layout, SPoint origin) {
@@ -144,7 +122,7 @@ void CCairoContext::DrawLayout(const CTextLayout& layout, SPoint origin) {
     cairo_translate(m_cairo, origin.x, origin.y);
     cairo_scale(m_cairo, 1 / kUnitsPerMillimetre, 1 / kUnitsPerMillimetre);
     for (const auto& block : layout.GetImpl().blocks) {
-        cairo_move_to(m_cairo, 0, block.top);
+        cairo_move_to(m_cairo, block.left, block.top);
         pango_cairo_show_layout(m_cairo, block.layout.get());
     }
     cairo_restore(m_cairo);

@@ -11,18 +11,46 @@ namespace graphics {
 // unit.
 inline constexpr double kUnitsPerMillimetre = 100;
 
+struct SUnref {
+    void operator()(void* object) const { g_object_unref(object); }
+};
+using Context = std::unique_ptr<PangoContext, SUnref>;
+using Layout = std::unique_ptr<PangoLayout, SUnref>;
+
+// An image that stands in the text as one character. Layouts refer to it.
+struct SInlineImage {
+    P<CBitmap> bitmap;
+    double width; // units
+    double height;
+};
+
 struct CTextLayout::SImpl {
-    struct SUnref {
-        void operator()(void* object) const { g_object_unref(object); }
-    };
     struct SBlock {
-        std::unique_ptr<PangoLayout, SUnref> layout;
-        double top; // units
+        Layout layout;
+        double left; // units
+        double top;
+        bool isBullet = false;
     };
 
-    std::vector<SBlock> blocks; // one for each paragraph
+    std::vector<std::unique_ptr<SInlineImage>> images;
+    std::vector<SBlock> blocks; // lines and bullets
     double width = 0;           // units, as the height
     double height = 0;
 };
+
+// For layouts without hinting, so that extents do not vary with the scale.
+Context makePangoContext();
+// A font's ascent and descent, in units.
+struct SFontHeight {
+    double ascent;
+    double descent;
+};
+SFontHeight getFontHeight(PangoContext* context, const SFont& font, double scale);
+// Replaces the text by what is laid out: capitals, and the character that stands for an image. Invalid bytes
+// are replaced as well, since a layout would drop the whole text.
+void prepareText(STextRun& run);
+// One line of text that was prepared. The images are added to the list.
+Layout makePangoLayout(PangoContext* context, const SParagraph& paragraph, const std::vector<STextRun>& runs,
+                       EEffect effect, std::vector<std::unique_ptr<SInlineImage>>& images);
 
 } // namespace graphics

@@ -2,17 +2,27 @@
 #pragma once
 
 #include "graphics/painting/IGraphicsContext.h"
-#include "graphics/text/RichTextParser.h"
+#include "graphics/text/Paragraph.h"
 
 #include <memory>
 
 namespace graphics {
 
+// One line, in millimetres from the layout's top left corner. Bullets are not part of it.
+struct STextLine {
+    double left;
+    double top;
+    double width;
+    double height;
+    std::string text; // with U+FFFC for each image
+};
+
 // Lines are broken in millimetres, with metrics that do not depend on any device, so they are the same on
-// every screen and on paper. Text beyond the width of a word's line is not cut.
+// every screen and on paper. A word that is wider than the line is broken between characters.
 class GRAPHICS_API CTextLayout {
 public:
-    // `width` 0: one line for each paragraph. Colours pass through the effect.
+    // `width` 0: one line for each paragraph, without its indents. Colours and images pass through the
+    // effect.
     CTextLayout(const std::vector<SParagraph>& paragraphs, double width, EEffect effect = EEffect::none);
     ~CTextLayout();
     CTextLayout(const CTextLayout&) = delete;
@@ -23,7 +33,10 @@ public:
     double GetHeight() const;
     // From the top to the first line's baseline.
     double GetAscent() const;
+    // Whether there is neither a character nor an image.
+    bool IsEmpty() const;
     int GetLineCount() const;
+    std::vector<STextLine> GetLines() const;
 
     struct SImpl;
     const SImpl& GetImpl() const { return *m_impl; }

@@ -3,8 +3,11 @@
 #include "graphics/elements/GraphicTable.h"
 #include "graphics/elements/GraphicText.h"
 #include "graphics/painting/PaintContext.h"
-#include "graphics/text/TextLayout.h"
+#include "graphics/text/LayoutCache.h"
+#include "graphics/text/RichTextParser.h"
 #include "peru/strings/IStringLocalizer.h"
+
+#include <pango/pango.h>
 
 #include <cmath>
 #include <numbers>
@@ -21,15 +24,19 @@ std::vector<SParagraph> makeLine(const std::string& text, const SFont& font, con
 }
 
 // Aligned within the height of the box, and clipped to the box.
-void paintInBox(CPaintContext& context, const std::vector<SParagraph>& paragraphs, const SRect& box,
-                int placement) {
-    if (!(box.width > 0 && box.height > 0) || paragraphs.empty()) return;
+void paintInBox(CPaintContext& context, const CTextLayout& layout, const SRect& box, int placement) {
     IGraphicsContext& graphics = context.GetGraphics();
-    const CTextLayout layout(paragraphs, box.width, graphics.GetEffect());
     const double room = box.height - layout.GetHeight();
     graphics.PushClip(box);
     graphics.DrawLayout(layout, {box.left, box.top + room * 0.5 * placement});
     graphics.PopClip();
+}
+
+void paintInBox(CPaintContext& context, const std::vector<SParagraph>& paragraphs, const SRect& box,
+                int placement) {
+    if (!(box.width > 0 && box.height > 0)) return;
+    paintInBox(context, CTextLayout(paragraphs, box.width, context.GetGraphics().GetEffect()), box,
+               placement);
 }
 
 void paintHint(CPaintContext& context, const SRect& box, const char* key, const char* text) {
@@ -44,18 +51,32 @@ struct SGlyph {
     double width;
 };
 
-bool isContinuation(const std::string& text, size_t at) {
-    const auto byte = static_cast<uint8_t>(text[at]);
-    if ((byte & 0xC0) == 0x80) return true;
-    // Combining diacritical marks: U+0300 to U+036F.
-    const auto next = at + 1 < text.size() ? static_cast<uint8_t>(text[at + 1]) : 0;
-    return byte == 0xCC || (byte == 0xCD && next < 0xB0);
+// The text cut where a cursor could stand.
+std::vector<std::string> splitCharacters(const std::string& text) {
+    gchar* const valid = g_utf8_make_valid(text.data(), static_cast<gssize>(text.size()));
+    const auto count = static_cast<size_t>(g_utf8_strlen(valid, -1));
+    std::vector<PangoLogAttr> attributes(count + 1);
+    pango_get_log_attrs(valid, -1, -1, pango_language_get_default(), attributes.data(),
+                        static_cast<int>(attributes.size()));
+    std::vector<std::string> characters;
+    const gchar* at = valid;
+    for (size_t i = 0; i < count; ++i) {
+        const gchar* const next = g_utf8_next_char(at);
+        if (characters.empty() || attributes[i].is_cursor_position) characters.emplace_back();
+        characters.back().append(at, next);
+        at = next;
+    }
+    g_free(valid);
+    return characters;
 }
 
 std::vector<SGlyph> splitGlyphs(const std::vector<SParagraph>& paragraphs, EEffect effect) {
     std::vector<SGlyph> glyphs;
     const auto add = [&](const std::string& text, const STextRun& run) {
-        auto layout = std::make_unique<CTextLayout>(makeLine(text, run.font, run.colour), 0, effect);
+        STextRun glyph = run;
+        glyph.text = text;
+        auto layout = std::make_unique<CTextLayout>(
+            std::vector<SParagraph>{{{glyph}, ETextAlignment::left, run.font, run.scale}}, 0, effect);
         const double width = layout->GetWidth();
         glyphs.push_back({std::move(layout), width});
     };
@@ -63,13 +84,8 @@ std::vector<SGlyph> splitGlyphs(const std::vector<SParagraph>& paragraphs, EEffe
         // Paragraphs follow each other on the circle.
         if (!glyphs.empty() && !paragraph.runs.empty()) add(" ", paragraph.runs[0]);
         for (const STextRun& run : paragraph.runs)
-            for (size_t begin = 0; begin < run.text.size();) {
-                size_t end = begin + 1;
-                while (end < run.text.size() && isContinuation(run.text, end)) ++end;
-                const std::string text = run.text.substr(begin, end - begin);
+            for (const std::string& text : splitCharacters(run.text))
                 add(text == "\n" || text == "\t" ? " " : text, run);
-                begin = end;
-            }
     }
     return glyphs;
 }
@@ -91,18 +107,23 @@ void CGraphicStateButton::PaintContent(CPaintContext& context) const {
 }
 
 void CGraphicText::PaintContent(CPaintContext& context) const {
-    if (!m_text)
-        paintHint(context, GetLocalRect(), "graphics.Text.ClickToEdit", "Double click to edit!");
+    const SRect box = GetLocalRect();
+    if (!(box.width > 0 && box.height > 0)) return;
+    if (!m_layout) m_layout = std::make_unique<CLayoutCache>();
+    const CTextLayout* const layout =
+        m_text ? &m_layout->Get(m_text, box.width, context.GetGraphics().GetEffect()) : nullptr;
+    if (!layout || layout->IsEmpty())
+        paintHint(context, box, "graphics.Text.ClickToEdit", "Double click to edit!");
     else
-        paintInBox(context, parseRichText(*m_text), GetLocalRect(), static_cast<int>(m_placement));
+        paintInBox(context, *layout, box, static_cast<int>(m_placement));
 }
 
 void CGraphicTextCircle::PaintContent(CPaintContext& context) const {
     const SRect box = GetLocalRect();
-    if (!GetText())
+    std::vector<SGlyph> glyphs;
+    if (GetText()) glyphs = splitGlyphs(parseRichText(*GetText()), context.GetGraphics().GetEffect());
+    if (glyphs.empty())
         return paintHint(context, box, "graphics.GraphicTextCircle.ClickToEdit", "Double click to edit!");
-    const std::vector<SGlyph> glyphs =
-        splitGlyphs(parseRichText(*GetText()), context.GetGraphics().GetEffect());
     double length = 0, ascent = 0, descent = 0;
     for (const SGlyph& glyph : glyphs) {
         length += glyph.width;
@@ -130,7 +151,7 @@ void CGraphicTextCircle::PaintContent(CPaintContext& context) const {
 void CGraphicTable::PaintContent(CPaintContext& context) const {
     const SRect box = GetLocalRect();
     const double totalWidth = GetTotalWidth(), totalHeight = GetTotalHeight();
-    if (!(totalWidth > 0 && totalHeight > 0))
+    if (!HasText() || !(totalWidth > 0 && totalHeight > 0))
         return paintHint(context, box, "graphics.GraphicTable.ClickToEdit", "Double click to edit!");
     double top = box.top;
     for (size_t row = 0; row < m_rows.size(); ++row) {
@@ -139,12 +160,14 @@ void CGraphicTable::PaintContent(CPaintContext& context) const {
         for (size_t col = 0; col < m_cols.size(); ++col) {
             if (!m_cols[col]->isShown()) continue;
             const double width = m_cols[col]->width * box.width / totalWidth;
-            const CCell& cell = *m_cells[row][col];
-            if (cell.text)
-                paintInBox(context, parseRichText(*cell.text),
-                           SRect{left, top, width, height}.inflated(-cell.margin),
-                           static_cast<int>(cell.verticalAlign));
+            CCell& cell = *m_cells[row][col];
+            const SRect inner = SRect{left, top, width, height}.inflated(-cell.margin);
             left += width;
+            if (!cell.text || !(inner.width > 0 && inner.height > 0) || !context.CanSee(inner)) continue;
+            if (!cell.layout || cell.isLayoutStale) cell.layout = std::make_unique<CLayoutCache>();
+            cell.isLayoutStale = false;
+            paintInBox(context, cell.layout->Get(cell.text, inner.width, context.GetGraphics().GetEffect()),
+                       inner, static_cast<int>(cell.verticalAlign));
         }
         top += height;
     }

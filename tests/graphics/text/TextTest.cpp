@@ -1,7 +1,9 @@
 #include "graphics/Elements.h"
 #include "graphics/painting/DocumentRenderer.h"
+#include "graphics/text/RichTextParser.h"
 #include "graphics/text/TextLayout.h"
 #include "graphics/text/TextWrapper.h"
+#include "peru/Errors.h"
 #include "support/FontLeaks.h"
 #include "support/Process.h"
 #include "support/TempFolder.h"
@@ -72,6 +74,65 @@ TEST(RichText, ReadsStylesAndText) {
     EXPECT_EQ(lines[2].alignment, ETextAlignment::right);
 }
 
+// How each style changes what is painted.
+TEST(RichText, PaintsItsStyles) {
+    const auto area = [](const std::string& attributes, const std::string& content = "word word word") {
+        const auto text = peru::make<CGraphicText>();
+        text->SetText(peru::make<CRichText>(
+            "<richtext><paragraphlayout fontface='DejaVu Sans' fontpointsize='12'><paragraph " + attributes +
+            "><text>" + content + "</text></paragraph></paragraphlayout></richtext>"));
+        text->SetSize(50, 36);
+        return paint(text);
+    };
+    const SInk plain = area("");
+    struct SCase {
+        const char* attributes;
+        double low, high; // the area in proportion to that of plain text
+    };
+    for (const SCase& c : {SCase{"fontweight='700'", 1.2, 2},
+                           {"fontunderlined='1'", 1.1, 1.8},
+                           {"texteffects='4' texteffectflags='4'", 1.1, 1.8},
+                           {"texteffects='1' texteffectflags='1'", 1.2, 2},
+                           {"texteffects='2' texteffectflags='2'", 0.7, 1.2},
+                           {"texteffects='256' texteffectflags='256'", 0.35, 0.55},
+                           {"texteffects='512' texteffectflags='512'", 0.35, 0.55},
+                           {"fontpixelsize='32'", 3.2, 4.8},
+                           {"bgcolor='#FF0000'", 3, 12}}) {
+        const double share = area(c.attributes).area / plain.area;
+        EXPECT_GT(share, c.low) << c.attributes;
+        EXPECT_LT(share, c.high) << c.attributes;
+    }
+    const auto behind = [&](int effect) {
+        const std::string value = "='" + std::to_string(effect) + "' ";
+        return area("", "x</text><text texteffects" + value + "texteffectflags" + value + ">pp").bottom;
+    };
+    EXPECT_GT(behind(512), behind(256) + 0.7);
+    EXPECT_NEAR(area("leftindent='75'").left - plain.left, 7.5, 0.15);
+    EXPECT_NEAR(area("parspacingbefore='75'").top - plain.top, 7.5, 0.15);
+    EXPECT_NEAR(area("bulletstyle='512' leftsubindent='80'").right - plain.right, 8, 0.15);
+    EXPECT_NEAR(area("bulletstyle='512' leftsubindent='80'").left, plain.left, 1);
+    const std::string lines = "the quick brown fox jumps over the lazy dog";
+    EXPECT_NEAR(area("alignment='4'", lines).right, 55, 0.3);
+    EXPECT_LT(area("", lines).right, 54);
+}
+
+TEST(RichText, TakesTheStyleOfAnother) {
+    const auto model = peru::make<CRichText>("<richtext><paragraphlayout fontface='Sans'><paragraph "
+                                             "alignment='3'><text fontweight='700'>old</text>"
+                                             "</paragraph><paragraph/></paragraphlayout></richtext>");
+    const auto paragraphs = parseRichText(*makeRichTextLike(model, "\"new\"\n  text"));
+    ASSERT_EQ(paragraphs.size(), 2u);
+    for (const SParagraph& paragraph : paragraphs) {
+        EXPECT_EQ(paragraph.alignment, ETextAlignment::right);
+        EXPECT_EQ(paragraph.runs[0].font, (SFont{"Sans", 10, 90, 700, false}));
+    }
+    EXPECT_EQ(paragraphs[0].runs[0].text, "\"new\"");
+    EXPECT_EQ(paragraphs[1].runs[0].text, "  text");
+    EXPECT_FALSE(hasText(*makeRichTextLike(model, "")));
+    EXPECT_TRUE(hasText(*makeRichTextLike(nullptr, "x")));
+    EXPECT_TRUE(hasText(*makeRichTextLike(peru::make<CRichText>("<damaged"), "x")));
+}
+
 TEST(RichText, IsPaintedInItsBox) {
     const auto text = peru::make<CGraphicText>();
     text->SetText(makeRichText("one two three four five", kFont));
@@ -136,6 +197,48 @@ TEST(GraphicTable, IsPaintedWithoutHiddenColumns) {
     label->SetFont(kFont);
     label->SetSize(50, 20);
     EXPECT_GT(paint(label).area, 5);
+}
+
+TEST(GraphicTable, IsFilledFromContent) {
+    const auto table = peru::make<CGraphicTable>();
+    table->InsertCols(0, 3);
+    table->InsertRows(0, 2);
+    EXPECT_EQ(table->GetHint(), "Double click to edit!");
+    table->GetRow(0).contentId = "headings";
+    table->SetCellText(0, 0, makeRichText("Title", kFont));
+    EXPECT_EQ(table->GetHint(), "Double click to edit table");
+    table->GetCol(0).contentId = "title";
+    table->GetCol(2).contentId = "duration";
+    table->SetColHiddenByTheme(2, true);
+    table->SetRowHeight(1, 7);
+    table->SetCellText(1, 1, makeRichText("-", kFont));
+    table->SetCellText(1, 0, makeRichText("x", kFont, {9, 9, 9, 255}));
+    table->GetCell(1, 0).margin = 2;
+    const auto textAt = [&](int row, int col) {
+        const auto paragraphs = parseRichText(*table->GetCell(row, col).text);
+        return paragraphs[0].runs[0].text;
+    };
+    const auto fill = [&](int count) {
+        table->FillFromContent(count,
+                               [](const std::string& id, int item) { return id + std::to_string(item); });
+    };
+    for (const int count : {3, 5, 2, 0, 4}) {
+        fill(count);
+        ASSERT_EQ(table->GetRowCount(), 1 + std::max(1, count));
+        EXPECT_EQ(textAt(0, 0), "Title");
+        for (int row = 1; row < table->GetRowCount(); ++row) {
+            const std::string number = std::to_string(row - 1);
+            EXPECT_EQ(textAt(row, 0), count ? "title" + number : "");
+            EXPECT_EQ(textAt(row, 2), count ? "duration" + number : "");
+            EXPECT_EQ(textAt(row, 1), row == 1 ? "-" : "");
+            EXPECT_EQ(table->GetRow(row).height, 7);
+            EXPECT_EQ(table->GetCell(row, 0).margin, 2);
+            EXPECT_EQ(parseRichText(*table->GetCell(row, 0).text)[0].runs[0].colour, (SColour{9, 9, 9, 255}));
+        }
+    }
+    EXPECT_EQ(table->GetCol(2).width, 20);
+    EXPECT_THROW(table->SetColWidth(0, -1), peru::CInvalidArgError);
+    EXPECT_THROW(table->SetRowHeight(0, std::nan("")), peru::CInvalidArgError);
 }
 
 TEST(TextWrapper, BreaksBehindDelimiters) {

@@ -1,0 +1,50 @@
+#include "graphics/text/RichTextBuffer.h"
+
+#include "graphics/text/RichTextXml.h"
+#include "peru/Errors.h"
+#include "peru/strings/IStringLocalizer.h"
+
+#include <wx/imagpng.h>
+#include <wx/log.h>
+#include <wx/mstream.h>
+#include <wx/richtext/richtextbuffer.h>
+#include <wx/richtext/richtextxml.h>
+
+namespace graphics {
+
+namespace {
+
+// Images inside of texts are PNG files, which the toolkit reads and writes through its list of handlers.
+void addImageHandler() {
+    if (!wxImage::FindHandler(wxBITMAP_TYPE_PNG)) wxImage::AddHandler(new wxPNGHandler);
+}
+
+} // namespace
+
+std::unique_ptr<wxRichTextBuffer> toRichTextBuffer(const CRichText& text) {
+    parseXml(text); // for its limits
+    addImageHandler();
+    const wxLogNull quiet;
+    wxMemoryInputStream stream(text.GetXml().data(), text.GetXml().size());
+    auto buffer = std::make_unique<wxRichTextBuffer>();
+    // Margins of a new buffer would be added to those of the text.
+    buffer->GetAttributes().GetTextBoxAttr().GetMargins().Reset();
+    if (!wxRichTextXMLHandler().LoadFile(buffer.get(), stream))
+        throw peru::CParseError(
+            peru::localize("graphics.RichTextBuffer.NotRead", "The text is not rich text of a known form."));
+    return buffer;
+}
+
+P<CRichText> fromRichTextBuffer(wxRichTextBuffer& buffer) {
+    addImageHandler();
+    const wxLogNull quiet;
+    wxMemoryOutputStream stream;
+    if (!wxRichTextXMLHandler().SaveFile(&buffer, stream))
+        throw peru::CError(
+            peru::localize("graphics.RichTextBuffer.NotWritten", "The rich text could not be written."));
+    std::string xml(stream.GetSize(), '\0');
+    stream.CopyTo(xml.data(), xml.size());
+    return peru::make<CRichText>(std::move(xml));
+}
+
+} // namespace graphics
