@@ -23,8 +23,14 @@ inline constexpr int kStyleLongDash = 102;
 inline constexpr int kStyleShortDash = 103;
 inline constexpr int kStyleDotDash = 104;
 inline constexpr int kStyleTransparent = 106;
+inline constexpr int kStyleBackwardDiagonal = 111; // rising lines; the styles up to vertical are hatches
+inline constexpr int kStyleCrossDiagonal = 112;
+inline constexpr int kStyleForwardDiagonal = 113; // falling lines
+inline constexpr int kStyleCross = 114;
+inline constexpr int kStyleHorizontal = 115;
+inline constexpr int kStyleVertical = 116;
 
-// Styles of hatches are painted solid.
+// Styles that need a bitmap, which files do not have, are painted solid.
 struct SBrush {
     SColour colour{255, 255, 255, 255};
     int style = kStyleSolid;
@@ -33,6 +39,7 @@ struct SBrush {
     bool operator==(const SBrush&) const = default;
 };
 
+// Styles other than dots and dashes are painted solid: files have no dashes of the user's own.
 struct SPen {
     SColour colour;
     int style = kStyleSolid;

@@ -93,6 +93,21 @@ void CGraphicLabel::Assign(const CGraphicElement& other) {
     CGraphicElement::Assign(other);
 }
 
+void CGraphicStateButton::SetLabel(const std::string& label) {
+    m_label = label;
+    DropHitMask();
+}
+
+void CGraphicLabel::SetText(const std::string& text) {
+    m_text = text;
+    DropHitMask();
+}
+
+void CGraphicLabel::SetFont(const SFont& font) {
+    m_font = font;
+    DropHitMask();
+}
+
 void CGraphicPaper::PaintContent(CPaintContext& context) const {
     if (context.GetOutputKind() != EOutputKind::screen) return;
     const SRect rect = GetLocalRect();

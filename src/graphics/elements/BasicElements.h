@@ -103,7 +103,7 @@ public:
     void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
 
     const std::string& GetLabel() const { return m_label; }
-    void SetLabel(const std::string& label) { m_label = label; }
+    void SetLabel(const std::string& label);
     const std::string& GetButtonHint() const { return m_buttonHint; }
     void SetButtonHint(const std::string& hint) { m_buttonHint = hint; }
 
@@ -127,12 +127,12 @@ public:
     GraphicElementType GetType() const override { return GraphicElementType::label; }
     void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
     void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
-    void Reset() override { m_text.clear(); }
+    void Reset() override { SetText({}); }
 
     const std::string& GetText() const { return m_text; }
-    void SetText(const std::string& text) { m_text = text; }
+    void SetText(const std::string& text);
     const SFont& GetFont() const { return m_font; }
-    void SetFont(const SFont& font) { m_font = font; }
+    void SetFont(const SFont& font);
     const SColour& GetColour() const { return m_colour; }
     void SetColour(const SColour& colour) { m_colour = colour; }
 

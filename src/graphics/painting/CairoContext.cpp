@@ -1,6 +1,7 @@
 #include "graphics/painting/CairoContext.h"
 
 #include "graphics/painting/CairoBitmap.h"
+#include "graphics/painting/Hatch.h"
 #include "graphics/text/PangoLayouts.h"
 
 #include <cmath>
@@ -72,6 +73,16 @@ void CCairoContext::addPath(const CPath& path) {
         }
 }
 
+void CCairoContext::fillPath(const CPath& path, const SBrush& brush) {
+    setColour(m_cairo, brush.colour);
+    if (!isHatch(brush.style)) return cairo_fill_preserve(m_cairo);
+    cairo_save(m_cairo);
+    cairo_clip(m_cairo);
+    paintHatch(m_cairo, brush.style);
+    cairo_restore(m_cairo);
+    addPath(path); // for the outline
+}
+
 void CCairoContext::DrawPath(const CPath& path, const SFill* fill, const SPen* pen) {
     // A matrix without an inverse would put the cairo context into an error state for good.
     if (path.IsEmpty() || !m_matrix.getInverse()) return;
@@ -92,8 +103,7 @@ void CCairoContext::DrawPath(const CPath& path, const SFill* fill, const SPen* p
         cairo_set_source(m_cairo, pattern.get());
         cairo_fill_preserve(m_cairo);
     } else if (hasFill) {
-        setColour(m_cairo, fill->brush.colour);
-        cairo_fill_preserve(m_cairo);
+        fillPath(path, fill->brush);
     }
     if (hasLine) {
         setColour(m_cairo, pen->colour);

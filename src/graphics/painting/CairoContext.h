@@ -27,6 +27,8 @@ public:
 
 private:
     void addPath(const CPath& path);
+    // The path is the current one, before and after the call.
+    void fillPath(const CPath& path, const SBrush& brush);
 
     cairo_t* const m_cairo;
     const double m_resolution;

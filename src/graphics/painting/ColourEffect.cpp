@@ -31,7 +31,7 @@ P<CBitmap> applyEffect(const CBitmap& bitmap, EEffect effect) {
         // The luminance of premultiplied channels is the premultiplied luminance.
         if (effect == EEffect::grey)
             pixel = alpha << 24 | getLuminance(pixel >> 16 & 255, pixel >> 8 & 255, pixel & 255) * 0x10101u;
-        else if (effect == EEffect::mask)
+        else if (effect == EEffect::mask && alpha != 0) // nothing is painted where a bitmap is transparent
             pixel = 0xFF000000u | alpha * 0x10101u;
     }
     return peru::make<CBitmap>(bitmap.GetWidth(), bitmap.GetHeight(), std::move(pixels));

@@ -38,11 +38,20 @@ public:
     }
     void DrawBitmap(const CBitmap& bitmap, const SRect& source, const SRect& target) override {
         if (m_effect == EEffect::none) return Context::DrawBitmap(bitmap, source, target);
-        Context::DrawBitmap(*applyEffect(bitmap, m_effect), source, target);
+        // Large bitmaps come in several parts.
+        if (m_original.get() != &bitmap || m_changedEffect != m_effect) {
+            m_changed = applyEffect(bitmap, m_effect);
+            m_original = peru::P<CBitmap>::share(const_cast<CBitmap*>(&bitmap));
+            m_changedEffect = m_effect;
+        }
+        Context::DrawBitmap(*m_changed, source, target);
     }
 
 private:
     EEffect m_effect = EEffect::none;
+    peru::P<CBitmap> m_original; // the last bitmap with an effect; held, so that its address is not reused
+    peru::P<CBitmap> m_changed;
+    EEffect m_changedEffect = EEffect::none;
 };
 
 } // namespace graphics

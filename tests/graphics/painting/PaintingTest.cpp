@@ -4,8 +4,11 @@
 #include "graphics/elements/GraphicLines.h"
 #include "graphics/elements/GraphicMirror.h"
 #include "graphics/elements/GraphicShape.h"
+#include "graphics/elements/GraphicTable.h"
+#include "graphics/elements/GraphicText.h"
 #include "graphics/painting/DocumentRenderer.h"
 #include "graphics/painting/OffScreen.h"
+#include "graphics/text/RichTextParser.h"
 #include "peru/Errors.h"
 #include "support/Process.h"
 #include "support/TempFolder.h"
@@ -65,6 +68,32 @@ std::vector<P<CGraphicElement>> makeShapes() {
     return shapes;
 }
 
+// What is not a shape: tables and texts, bitmaps, and reflections.
+std::vector<P<CGraphicElement>> makeContents() {
+    const SFont font{"DejaVu Sans", 16, 90, 700, false};
+    const auto text = peru::make<CGraphicText>(), circle = P<CGraphicText>(peru::make<CGraphicTextCircle>());
+    text->SetText(makeRichText("rich text in lines", font));
+    circle->SetText(makeRichText("circular text", font));
+    const auto table = peru::make<CGraphicTable>();
+    table->InsertCols(0, 2);
+    table->InsertRows(0, 1);
+    table->SetCellText(0, 0, makeRichText("cell", font));
+    table->SetCellText(0, 1, makeRichText("other", font));
+    const auto image = peru::make<CGraphicImage>();
+    image->SetBitmap(
+        peru::make<CBitmap>(2, 2, std::vector<uint32_t>{0xff000000u, 0, 0x80000000u, 0xff000000u}));
+    const auto mirror = peru::make<CGraphicMirror>();
+    mirror->SetDocument(peru::make<CGraphicDocument>());
+    mirror->GetDocument()->Add(makeShapes()[0]);
+    std::vector<P<CGraphicElement>> contents{text, circle, table, image, mirror};
+    for (const auto& element : contents) {
+        element->SetSize(36, 26);
+        element->SetCenter(29, 21);
+        element->SetRotation(17);
+    }
+    return contents;
+}
+
 // Area, center and spread of what is painted, in millimetres.
 struct SMoments {
     double area = 0, x = 0, y = 0, spreadX = 0, spreadY = 0;
@@ -116,6 +145,15 @@ TEST(Painting, GivesTheSameShapesAtEveryResolution) {
         ASSERT_GT(reference.area, 20) << what;
         for (const double dpi : {96.0, 300.0})
             expectSame(measure(*document, dpi), reference, 0.25 * 25.4 / dpi, what);
+    }
+    for (const auto& element : makeContents()) {
+        const auto document = makeSheet();
+        document->Add(element);
+        const SMoments reference = measure(*document, 600);
+        ASSERT_GT(reference.area, 20);
+        for (const double dpi : {96.0, 300.0})
+            expectSame(measure(*document, dpi), reference, 0.5 * 25.4 / dpi,
+                       GraphicTypeToXml(element->GetType()));
     }
 }
 
@@ -208,10 +246,65 @@ TEST(Painting, AppliesEffects) {
     CPaintContext context(mask.GetGraphics(), CMatrix());
     document->Paint(context, {0, 0, 120, 80});
     EXPECT_EQ(mask.GetRow(40)[60], 0xff808080u);
+    // Bitmaps and texts as well; nothing is painted where a bitmap is transparent.
+    const auto image = peru::make<CGraphicImage>();
+    image->SetBitmap(peru::make<CBitmap>(2, 1, std::vector<uint32_t>{0, 0x80400000u}));
+    image->SetSize(60, 40);
+    image->SetCenter(30, 20);
+    const auto text = peru::make<CGraphicText>();
+    text->SetText(makeRichText("\u2588", {"DejaVu Sans", 100, 90, 400, false}, {255, 0, 0, 255}));
+    text->SetSize(60, 40);
+    text->SetCenter(30, 20);
+    for (const auto& [effect, left, right, glyph] : {std::tuple(EEffect::mask, 0u, 0xff808080u, 0xffffffffu),
+                                                     {EEffect::grey, 0u, 0x80131313u, 0xff4c4c4cu},
+                                                     {EEffect::none, 0u, 0x80400000u, 0xffff0000u}}) {
+        COffScreen picture(120, 80);
+        picture.GetGraphics().SetEffect(effect);
+        CPaintContext other(picture.GetGraphics(), CMatrix::scaling(2, 2));
+        image->Paint(other);
+        EXPECT_EQ(picture.GetRow(40)[10], left);
+        EXPECT_EQ(picture.GetRow(40)[110], right);
+        text->Paint(other);
+        EXPECT_EQ(picture.GetRow(40)[10], glyph);
+    }
     shape->SetGradient({{255, 0, 0, 255}, {0, 0, 255, 255}});
     const auto picture = RenderBitmap(*document, {50.8});
     EXPECT_GT(getPixel(picture, 60, 2) >> 16 & 255, 240u);
     EXPECT_GT(getPixel(picture, 60, 77) & 255, 240u);
+}
+
+// A hatch is the same along its lines, and covers its share of the area.
+TEST(Painting, HatchesAreas) {
+    struct SCase {
+        int style;
+        int alongX, alongY; // a step along the lines, in pixels of a tenth of a millimetre
+        double coverage;
+    };
+    for (const SCase& c : {SCase{kStyleHorizontal, 20, 0, 0.125},
+                           {kStyleVertical, 0, 20, 0.125},
+                           {kStyleBackwardDiagonal, 20, -20, 0.125},
+                           {kStyleForwardDiagonal, 20, 20, 0.125},
+                           {kStyleCross, 20, 20, 0.234},
+                           {kStyleCrossDiagonal, 0, 0, 0.234}}) {
+        const auto document = makeSheet();
+        const auto rectangle = peru::make<CGraphicRectangle>();
+        rectangle->SetSize(50, 30);
+        rectangle->SetCenter(30, 20);
+        rectangle->SetPen({{0, 0, 255, 255}, kStyleSolid, 1});
+        rectangle->SetBrush({{0, 0, 0, 255}, c.style});
+        document->Add(rectangle);
+        const auto picture = RenderBitmap(*document, {254});
+        double sum = 0;
+        for (int y = 100; y < 300; ++y)
+            for (int x = 100; x < 500; ++x) {
+                const int alpha = static_cast<int>(getPixel(picture, x, y) >> 24);
+                ASSERT_NEAR(alpha, getPixel(picture, x + c.alongX, y + c.alongY) >> 24, 12) << c.style;
+                sum += alpha / 255.0;
+            }
+        EXPECT_NEAR(sum / (200 * 400), c.coverage, 0.01) << c.style;
+        EXPECT_EQ(getPixel(picture, 300, 50), 0xff0000ffu) << c.style; // the outline
+        EXPECT_EQ(getPixel(picture, 300, 40), 0u) << c.style;
+    }
 }
 
 TEST(Painting, StretchesImages) {
