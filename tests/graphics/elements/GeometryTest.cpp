@@ -33,7 +33,40 @@ struct SPlain {
         const double localY = dx * std::sin(angle) + dy * std::cos(angle);
         return std::min(width / 2 - std::abs(localX), height / 2 - std::abs(localY));
     }
+    double radius() const { return std::min(width, height) / 2; }
+    // From a point to the rectangle; 0 inside.
+    double distance(SPoint point) const {
+        const double angle = -degrees * std::numbers::pi / 180;
+        const double dx = point.x - x, dy = point.y - y;
+        return std::hypot(std::max(0.0, std::abs(dx * std::cos(angle) - dy * std::sin(angle)) - width / 2),
+                          std::max(0.0, std::abs(dx * std::sin(angle) + dy * std::cos(angle)) - height / 2));
+    }
+    // The widest gap between the projections of two rectangles on this one's axes.
+    double gap(const SPlain& other) const {
+        double gap = -1e9;
+        for (const double turn : {0.0, 90.0}) {
+            const double angle = (degrees + turn) * std::numbers::pi / 180;
+            const auto project = [&](const SPlain& plain) {
+                double low = 1e9, high = -1e9;
+                for (const auto& [cx, cy] : {std::pair(-1, -1), {1, -1}, {1, 1}, {-1, 1}}) {
+                    const SPoint corner = plain.corner(cx, cy);
+                    const double value = corner.x * std::cos(angle) + corner.y * std::sin(angle);
+                    low = std::min(low, value), high = std::max(high, value);
+                }
+                return std::pair(low, high);
+            };
+            const auto [low, high] = project(*this);
+            const auto [otherLow, otherHigh] = project(other);
+            gap = std::max({gap, otherLow - high, low - otherHigh});
+        }
+        return gap;
+    }
 };
+
+SPlain toPlain(const CGraphicElement& element) {
+    return {element.GetCenter().x, element.GetCenter().y, element.GetSize().width, element.GetSize().height,
+            element.GetRotation()};
+}
 
 } // namespace
 
@@ -45,8 +78,7 @@ TEST(GraphicElement, AgreesWithAPlainModel) {
         const auto element = peru::make<CGraphicRectangle>();
         tests::place(*element, random);
         document->Add(element);
-        const SPlain plain{element->GetCenter().x, element->GetCenter().y, element->GetSize().width,
-                           element->GetSize().height, element->GetRotation()};
+        const SPlain plain = toPlain(*element);
         double minX = 1e9, minY = 1e9, maxX = -1e9, maxY = -1e9;
         for (const auto& [x, y] : {std::pair(-1, -1), {1, -1}, {1, 1}, {-1, 1}}) {
             const SPoint corner = plain.corner(x, y);
@@ -153,6 +185,30 @@ TEST(GraphicElement, IntersectsByOutline) {
     const auto inner = makeAt(rectangle, 0, 10);
     inner->SetSize(2, 2);
     EXPECT_TRUE(inner->Intersects(*makeAt(rectangle, 0, 0)));
+}
+
+TEST(GraphicElement, IntersectsLikeAPlainModel) {
+    std::mt19937 random(4);
+    using enum GraphicElementType;
+    const std::pair<GraphicElementType, GraphicElementType> kPairs[] = {
+        {circle, circle}, {circle, rectangle}, {circle, shape}, {rectangle, rectangle}, {shape, shape}};
+    int found = 0;
+    for (int i = 0; i < 100000; ++i) {
+        const auto& [firstType, secondType] = kPairs[i % 5];
+        const auto first = CreateElement(firstType), second = CreateElement(secondType);
+        tests::place(*first, random);
+        tests::place(*second, random);
+        const SPlain a = toPlain(*first), b = toPlain(*second);
+        const double gap = secondType == circle  ? std::hypot(a.x - b.x, a.y - b.y) - a.radius() - b.radius()
+                           : firstType == circle ? b.distance({a.x, a.y}) - a.radius()
+                                                 : std::max(a.gap(b), b.gap(a));
+        if (std::abs(gap) < 1e-6) continue;
+        ASSERT_EQ(first->Intersects(*second), gap < 0) << i;
+        ASSERT_EQ(second->Intersects(*first), gap < 0) << i;
+        found += gap < 0;
+    }
+    EXPECT_GT(found, 5000);
+    EXPECT_LT(found, 50000);
 }
 
 TEST(Units, FormatLengths) {
