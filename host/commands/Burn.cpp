@@ -127,9 +127,8 @@ void CBurner::failInput(const fs::path& input, const std::string& reason) {
 
 void CBurner::findDrive() {
     if (m_options.drive.empty()) return;
-    std::error_code none;
     for (SDrive& drive : findDrives())
-        if (fs::equivalent(m_options.drive, drive.path, none)) m_drive = std::move(drive.handle);
+        if (isSameDrive(m_options.drive, drive.path)) m_drive = std::move(drive.handle);
     if (!m_drive) throw std::runtime_error(tr("host.Burn.noDrive", "There is no such drive"));
     for (int second = 0; getDiscFunctions().DriveCheckDisc(m_drive.get(), 1000, 0) != 1; ++second)
         if (second == kReadySeconds || isCancelled()) throw makeDiscError();
@@ -148,9 +147,12 @@ void CBurner::checkTarget() const {
         for (const fs::path& input : m_options.inputs)
             if (isSameFile(input, file))
                 throw std::runtime_error(tr("host.sameFile", "Input and output are the same file"));
-        if (!m_options.force)
-            throw std::runtime_error(
-                tr("host.existsForce", "%FILE% exists (--force replaces it)", {{"%FILE%", file.string()}}));
+        if (m_options.force) continue;
+        // The messages of the job begin with the name of the target.
+        throw std::runtime_error(
+            file == m_target
+                ? tr("host.Burn.exists", "The file exists (--force replaces it)")
+                : tr("host.existsForce", "%FILE% exists (--force replaces it)", {{"%FILE%", file.string()}}));
     }
 }
 
@@ -241,10 +243,10 @@ bool CBurner::write(CDiscProject& project) {
     if (!m_drive) return project.writeImage(m_target, settings, advance);
     try {
         return project.writeDisc(m_drive.get(), settings, advance);
-    } catch (const std::exception& failure) {
+    } catch (const std::exception&) {
         if (m_options.blank || getDiscFunctions().GetLastError(nullptr) != DISCIO_ERROR_DISC_NOT_EMPTY) throw;
-        throw std::runtime_error(tr("host.Burn.notEmpty", "%REASON% (--blank erases a rewritable disc)",
-                                    {{"%REASON%", failure.what()}}));
+        throw std::runtime_error(
+            tr("host.Burn.notEmpty", "The disc is not empty (--blank erases a rewritable disc)"));
     }
 }
 

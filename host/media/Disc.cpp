@@ -36,14 +36,14 @@ std::vector<SDrive> openDrives(DISCIO_Library* library) {
     return drives;
 }
 
+} // namespace
+
 // fs::equivalent is not defined for devices.
-bool isSame(const fs::path& place, const std::string& drive) {
+bool isSameDrive(const fs::path& place, const std::string& drive) {
     std::error_code none;
     const fs::path resolved = fs::canonical(place, none);
     return place == drive || (!resolved.empty() && resolved == fs::canonical(drive, none));
 }
-
-} // namespace
 
 std::vector<SDrive> findDrives() {
     return openDrives(createLibrary({}).get());
@@ -77,7 +77,7 @@ CDisc::CDisc(const fs::path& place) {
         if (!chosen) throw std::runtime_error(tr("host.Disc.noDisc", "There is no disc in any drive"));
     } else {
         for (const SDrive& drive : drives)
-            if (isSame(place, drive.path)) chosen = &drive;
+            if (isSameDrive(place, drive.path)) chosen = &drive;
         if (!chosen)
             throw std::runtime_error(tr("host.Disc.notADisc", "%FILE% is neither a drive nor a disc image",
                                         {{"%FILE%", place.string()}}));

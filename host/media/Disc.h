@@ -24,6 +24,8 @@ struct SDrive {
 };
 // Of the machine.
 std::vector<SDrive> findDrives();
+// Whether a name that a user gives, which may be a link, means the drive of that path.
+bool isSameDrive(const std::filesystem::path& place, const std::string& drive);
 // "CD-ROM" and so on.
 std::string describeMedium(int32_t type);
 

@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <cstring>
 #include <scsi/sg.h>
+#include <unistd.h>
 
 namespace tests {
 
@@ -81,6 +82,7 @@ bool write(const unsigned char* command, const std::string& data) {
     SFakeBurner& burner = fakeBurner();
     const int first = toInt(command + 2), count = command[7] << 8 | command[8];
     if (count == 0) return true;
+    if (burner.writeMicroseconds > 0) ::usleep(static_cast<useconds_t>(burner.writeMicroseconds));
     const size_t size = data.size() / static_cast<size_t>(count);
     for (int i = 0; i < count; ++i) {
         const std::string bytes = data.substr(static_cast<size_t>(i) * size, size);
@@ -89,6 +91,7 @@ bool write(const unsigned char* command, const std::string& data) {
             burner.leadIn += joinSixBits(bytes);
         else
             burner.blocks[first + i] = bytes;
+        if (first + i == burner.damagedAt) burner.blocks[first + i].back() ^= 1;
     }
     return true;
 }
@@ -104,7 +107,9 @@ bool answer(const unsigned char* command, const std::string& data, std::string& 
     case 0x54: // SEND OPC INFORMATION
     case 0x5B: // CLOSE TRACK SESSION
     case 0xB6: // SET STREAMING
+        return true;
     case 0xBB: // SET CD SPEED
+        burner.speed = command[4] << 8 | command[5];
         return true;
     case 0x03: // REQUEST SENSE
         reply = std::string("\x70", 1) + std::string(17, '\0');

@@ -10,7 +10,10 @@ namespace tests {
 
 struct SFakeBurner {
     bool isRewritable = false;
-    int failsAt = INT32_MIN; // the block whose writing fails
+    int failsAt = INT32_MIN;   // the block whose writing fails
+    int damagedAt = INT32_MIN; // the block that is not written as it was sent
+    int writeMicroseconds = 0; // the time that a write takes
+    int speed = 0;             // kB in a second
     bool wasBlanked = false;
     bool isDummy = false;
     std::string cueSheet; // entries of 8 bytes

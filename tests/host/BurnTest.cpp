@@ -1,6 +1,9 @@
 #include "discio2/DiscSupport.h"
 #include "host/Program.h"
 
+#include <chrono>
+#include <thread>
+
 using namespace tests;
 
 namespace {
@@ -73,12 +76,13 @@ TEST_F(Burn, FailuresNameTheReasonAndLeaveNothing) {
     const struct {
         std::vector<std::string> arguments;
         const char* reason;
-    } failing[] = {{{"a.wav", "bad.wav", "--image", "x.cue"}, "bad.wav: "},
-                   {{"a.wav", "--image", "old.cue"}, "old.cue exists (--force replaces it)"},
-                   {{"a.wav", "nothing.wav", "--image", "x.iso"}, "nothing.wav: No such file"},
-                   {{"b", "--image", "x.iso"}, "contains itself"},
-                   {{"a.wav", "--drive", "/dev/null"}, "There is no such drive"},
-                   {{"a.wav", "--image", "none/x.cue"}, "none"}};
+    } failing[] = {
+        {{"a.wav", "bad.wav", "--image", "x.cue"}, "bad.wav: "},
+        {{"a.wav", "--image", "old.cue"}, "tonewright: old.cue: The file exists (--force replaces it)"},
+        {{"a.wav", "nothing.wav", "--image", "x.iso"}, "nothing.wav: No such file"},
+        {{"b", "--image", "x.iso"}, "contains itself"},
+        {{"a.wav", "--drive", "/dev/null"}, "There is no such drive"},
+        {{"a.wav", "--image", "none/x.cue"}, "none"}};
     for (auto c : failing) {
         c.arguments.insert(c.arguments.begin(), "burn");
         EXPECT_NE(fail(c.arguments).find(c.reason), std::string::npos) << c.reason;
@@ -97,4 +101,27 @@ TEST_F(Burn, FailuresNameTheReasonAndLeaveNothing) {
     EXPECT_EQ(readFile(folder / "old.cue"), "old");
     succeed({"burn", "a.wav", "--image", "old.cue", "--force", "-q"});
     EXPECT_EQ(readFile(folder / "old.bin"), makeSectors(2, 1));
+}
+
+// In the middle of the writing; the images are too large to be ready before.
+TEST_F(Burn, CtrlCLeavesEverythingAsItWas) {
+    folder.write("long.wav", toWave("").replace(40, 4, little(uint64_t{3600} * 176400, 4)));
+    std::filesystem::resize_file(folder / "long.wav", 44 + uint64_t{3600} * 176400);
+    folder.write("old.cue", "old");
+    const auto before = list();
+    for (const char* image : {"old.cue", "new.iso"}) {
+        SCOPED_TRACE(image);
+        CProcess process({kProgram, "burn", "long.wav", "--image", image, "--force", "--json"}, folder.path(),
+                         programEnvironment());
+        const auto due = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+        while (process.readOut().find("\"progress\"") == std::string::npos &&
+               std::chrono::steady_clock::now() < due)
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        process.signal(SIGINT);
+        const SProcessResult result = process.wait();
+        EXPECT_EQ(result.exitCode, 130) << result.out << result.err;
+        EXPECT_EQ(parseLines(result.out).back()["event"], "cancelled");
+        EXPECT_EQ(list(), before);
+        EXPECT_EQ(readFile(folder / "old.cue"), "old");
+    }
 }
