@@ -162,19 +162,31 @@ TEST(DISABLED_Device, MixedDiscsAndDataDiscs) {
     }
 }
 
+// Its first read is off as often as the others, and silence hides where a read belongs.
 TEST(DISABLED_Device, SamplesAreExactFromAPoorDrive) {
     const CFakeDrive fake;
     fakeDisc() = {};
     fakeDisc().starts = {0, 150, 400, 450};
     fakeDisc().samples = makeSectors(450, 8);
+    for (const size_t silent : {0u, 1u, 149u, 151u, 201u, 202u, 203u, 400u, 401u, 448u})
+        std::fill_n(fakeDisc().samples.begin() + static_cast<std::ptrdiff_t>(silent * (kSectorBytes + 4)),
+                    kSectorBytes, '\0');
     fakeDisc().failures = {{170, 2}, {250, 3}, {399, 1}};
     fakeDisc().jitter = 500;
-    fakeDisc().readMicroseconds = 500;
+    fakeDisc().readMicroseconds = 100;
     const SOpenDrive open;
-    int64_t repairs = 0;
-    EXPECT_TRUE(readTrack(open.disc.get(), 1, repairs) ==
-                fakeDisc().samples.substr(150 * kSectorBytes, 250 * kSectorBytes));
-    EXPECT_GT(repairs, 6);
+    int64_t repairs = 0, all = 0;
+    for (int i = 0; i < 9; ++i) {
+        const auto at = static_cast<size_t>(i % 3);
+        const auto start = static_cast<size_t>(fakeDisc().starts[at]);
+        EXPECT_TRUE(readTrack(open.disc.get(), i % 3, repairs) ==
+                    fakeDisc().samples.substr(start * kSectorBytes,
+                                              (static_cast<size_t>(fakeDisc().starts[at + 1]) - start) *
+                                                  kSectorBytes))
+            << i;
+        all += repairs;
+    }
+    EXPECT_GT(all, 6);
     for (const auto& [block, times] : fakeDisc().failures) EXPECT_EQ(times, 0) << block;
     // The tray is opened.
     fakeDisc().readsUntilOpened = 3;

@@ -55,10 +55,9 @@ bool readSectors(int block, int blocks, std::string& reply) {
     const int64_t size = int64_t{blocks} * kSectorBytes;
     if (disc.jitter > 0 && blocks > 1) {
         static std::minstd_rand s_random(1);
-        static int s_reads = 0;
         const int shift =
             static_cast<int>(s_random() % (2 * static_cast<unsigned>(disc.jitter))) - disc.jitter;
-        if (++s_reads % 3 == 0) place += shift * 4;
+        if (s_random() % 3 == 0) place += shift * 4;
         place = std::clamp<int64_t>(place, 0, static_cast<int64_t>(disc.samples.size()) - size);
     }
     reply = disc.samples.substr(static_cast<size_t>(place), static_cast<size_t>(size));

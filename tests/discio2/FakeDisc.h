@@ -24,7 +24,7 @@ struct SFakeDisc {
     int badBlock = -1;           // cannot be read
     std::map<int, int> failures; // by block: how often it cannot be read
     int shakyReads = 0;          // that many reads deliver samples of the wrong place
-    int jitter = 0;              // every third read is off by up to that many frames
+    int jitter = 0;              // one read in three is off by up to that many frames
     int readMicroseconds = 0;    // the time that a read takes
     int readsUntilOpened = -1;   // the tray is opened after them
     int subchannelReads = 0;     // so far

@@ -1,38 +1,23 @@
 #include "drives/DeviceMedium.h"
 #include "CdText.h"
-#include "drives/DeviceStatus.h"
+#include "drives/CdioDevice.h"
+#include "drives/DeviceAudioReader.h"
 #include "drives/Pregaps.h"
 
 #include <algorithm>
 #include <array>
 #include <cdio/cdio.h>
-#include <cdio/logging.h>
 #include <cdio/mmc.h>
 #include <cdio/mmc_ll_cmds.h>
-#include <cdio/paranoia/cdda.h>
-#include <cdio/paranoia/paranoia.h>
-#include <cerrno>
 #include <cstring>
-#include <linux/cdrom.h>
 #include <utility>
 
 namespace discio {
 
 namespace {
 
-using Device = std::unique_ptr<CdIo_t, void (*)(CdIo_t*)>;
-
-constexpr int kMaxRetries = 20; // of one sector whose samples are in doubt
-constexpr int kMaxReads = 8;    // of one sector that the drive cannot read
 // Between two sessions: lead-out, lead-in and pregap.
 constexpr int32_t kSessionGap = 6750 + 4500 + 150;
-
-Device openDevice(const std::string& path) {
-    cdio_log_set_handler([](cdio_log_level_t, const char*) {}); // it would print to standard output
-    Device device(cdio_open(path.c_str(), DRIVER_LINUX), cdio_destroy);
-    if (!device) throw CDiscError(DISCIO_ERROR_DEVICE, path + " cannot be opened");
-    return device;
-}
 
 EMediumType toMediumType(uint16_t profile) {
     static constexpr std::pair<uint16_t, int> kProfiles[] = {
@@ -137,155 +122,10 @@ STableOfContents readContents(CdIo_t* device) {
     return contents;
 }
 
-// Whether another medium has the same tracks in the same places.
-bool areSame(const STableOfContents& one, const STableOfContents& other) {
-    return one.leadOut == other.leadOut &&
-           std::equal(
-               one.tracks.begin(), one.tracks.end(), other.tracks.begin(), other.tracks.end(),
-               [](const STrack& a, const STrack& b) { return a.start == b.start && a.isAudio == b.isAudio; });
-}
-
-class CDeviceAudioReader;
-
-// The library's callbacks have no user data.
-thread_local CDeviceAudioReader* t_reader = nullptr;
-thread_local int64_t t_repairs = 0;
-thread_local int64_t t_skipped = 0;
-
-void onRead(long, paranoia_cb_mode_t mode) {
-    switch (mode) {
-    case PARANOIA_CB_FIXUP_EDGE:
-    case PARANOIA_CB_FIXUP_ATOM:
-    case PARANOIA_CB_FIXUP_DROPPED:
-    case PARANOIA_CB_FIXUP_DUPED:
-    case PARANOIA_CB_REPAIR:
-        ++t_repairs;
-        break;
-    case PARANOIA_CB_SKIP:
-        ++t_skipped;
-        break;
-    default:
-        break;
-    }
-}
-
-class CDeviceAudioReader : public IAudioReader {
-public:
-    CDeviceAudioReader(const std::string& path, const STableOfContents& contents, const STrack& track)
-        : m_path(path), m_track(track), m_device(openDevice(path)) {
-        cdio_get_media_changed(m_device.get()); // reports from now on
-        if (STableOfContents now = readTrackPlaces(); !areSame(now, contents)) throwLost();
-        m_drive.reset(cdio_cddap_identify_cdio(m_device.get(), CDDA_MESSAGE_FORGETIT, nullptr));
-        if (!m_drive || cdio_cddap_open(m_drive.get()) != 0)
-            throw CDiscError(DISCIO_ERROR_DEVICE, path + " cannot read audio");
-        m_drive->read_audio = [](cdrom_drive_t*, void* to, lsn_t block, long count) {
-            return t_reader->readSectors(to, block, count);
-        };
-        m_drive->bigendianp = 0; // as READ CD delivers; the library's guess from the sound errs with noise
-        m_paranoia.reset(cdio_paranoia_init(m_drive.get()));
-        cdio_paranoia_modeset(m_paranoia.get(), PARANOIA_MODE_FULL ^ PARANOIA_MODE_NEVERSKIP);
-        cdio_paranoia_set_range(m_paranoia.get(), track.start - track.getReadablePregap(), track.end() - 1);
-    }
-
-    void read(int32_t block, int32_t count, int16_t* samples) override {
-        if (checkLost(false)) throwLost();
-        t_reader = this;
-        if (block != m_next) {
-            if (cdio_paranoia_seek(m_paranoia.get(), block, SEEK_SET) < 0) throwUnreadable(block);
-            m_next = block;
-        }
-        t_repairs = t_skipped = 0;
-        for (int32_t i = 0; i < count; ++i, ++m_next) {
-            const int16_t* sector = cdio_paranoia_read_limited(m_paranoia.get(), onRead, kMaxRetries);
-            m_repairs += std::exchange(t_repairs, 0);
-            if (!sector || t_skipped > 0) throwUnreadable(m_next);
-            std::memcpy(samples + static_cast<size_t>(i) * kAudioSectorBytes / 2, sector, kAudioSectorBytes);
-        }
-    }
-    int64_t getRepairs() const override { return m_repairs; }
-
-private:
-    struct SCloseDrive {
-        void operator()(cdrom_drive_t* drive) const { cdio_cddap_close_no_free_cdio(drive); }
-    };
-    struct SFreeParanoia {
-        void operator()(cdrom_paranoia_t* paranoia) const { cdio_paranoia_free(paranoia); }
-    };
-
-    STableOfContents readTrackPlaces() const {
-        STableOfContents contents;
-        const track_t first = cdio_get_first_track_num(m_device.get());
-        const track_t last = cdio_get_last_track_num(m_device.get());
-        if (first == CDIO_INVALID_TRACK) return contents;
-        for (int number = first; number <= last; ++number) {
-            STrack track;
-            track.start = cdio_get_track_lsn(m_device.get(), static_cast<track_t>(number));
-            track.isAudio =
-                cdio_get_track_format(m_device.get(), static_cast<track_t>(number)) == TRACK_FORMAT_AUDIO;
-            contents.tracks.push_back(track);
-        }
-        contents.leadOut = cdio_get_track_lsn(m_device.get(), CDIO_CDROM_LEADOUT_TRACK);
-        return contents;
-    }
-    // Instead of the library's function: counts the failures, and ends at once when the disc has gone. A
-    // drive that gets another disc fails once, and reads that one from then on.
-    long readSectors(void* to, lsn_t block, long count) {
-        if (!to) { // moves the head, so that the drive forgets what it has read ahead
-            std::array<int16_t, kAudioSectorBytes / 2> ignored;
-            return cdio_read_audio_sectors(m_device.get(), ignored.data(), block, 1) == DRIVER_OP_SUCCESS;
-        }
-        count = std::min<long>(count, m_drive->nsectors);
-        for (int tries = 0; tries < kMaxReads;) {
-            if (cdio_read_audio_sectors(m_device.get(), to, block, static_cast<uint32_t>(count)) ==
-                DRIVER_OP_SUCCESS)
-                return count;
-            ++t_repairs;
-            if (checkLost(true)) {
-                errno = ENOMEDIUM;
-                return -1;
-            }
-            if (count == 1) ++tries;
-            count = std::max(count / 2, 1L);
-        }
-        m_unreadable = block;
-        errno = EIO;
-        return -1;
-    }
-    // The drive reports a change only once. Asks it only after a failure whether there is a disc at all.
-    bool checkLost(bool afterFailure) {
-        if (cdio_get_media_changed(m_device.get()) == 1) m_isLost = true;
-        if (afterFailure && !m_isLost) {
-            const int status = getDeviceStatus(m_path);
-            m_isLost = status == CDS_NO_DISC || status == CDS_TRAY_OPEN;
-        }
-        return m_isLost;
-    }
-    [[noreturn]] void throwLost() const {
-        throw CDiscError(DISCIO_ERROR_DISC_LOST,
-                         "the disc in " + m_path + " has been taken out or exchanged");
-    }
-    [[noreturn]] void throwUnreadable(int32_t block) {
-        if (checkLost(true)) throwLost();
-        if (m_unreadable >= 0) block = std::exchange(m_unreadable, -1);
-        throw CDiscError(DISCIO_ERROR_DEVICE, m_path + ": block " + std::to_string(block) + " of track " +
-                                                  std::to_string(m_track.number) + " cannot be read");
-    }
-
-    std::string m_path;
-    STrack m_track;
-    Device m_device;
-    std::unique_ptr<cdrom_drive_t, SCloseDrive> m_drive;
-    std::unique_ptr<cdrom_paranoia_t, SFreeParanoia> m_paranoia;
-    int32_t m_next = -1;
-    int64_t m_repairs = 0;
-    bool m_isLost = false;
-    int32_t m_unreadable = -1; // the block that the drive could not read; usually ahead of the position
-};
-
 class CDeviceMedium : public IMedium {
 public:
     explicit CDeviceMedium(const std::string& path) : m_path(path) {
-        const Device device = openDevice(path);
+        const CdioDevice device = openCdioDevice(path);
         m_state = readState(device.get());
         if (!m_state.isEmpty) m_contents = readContents(device.get());
         if (m_contents.tracks.empty() && !m_state.isEmpty)
@@ -297,7 +137,7 @@ public:
     const STableOfContents& getContents() const override { return m_contents; }
     SMediumState getState() const override { return m_state; }
     std::unique_ptr<IAudioReader> createAudioReader(const STrack& track) const override {
-        return std::make_unique<CDeviceAudioReader>(m_path, m_contents, track);
+        return createDeviceAudioReader(m_path, m_contents, track);
     }
     // The library for file systems does not know about sessions.
     std::string getDataPath() const override {
