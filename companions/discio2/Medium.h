@@ -38,6 +38,7 @@ struct STrack {
 struct STableOfContents {
     std::vector<STrack> tracks;
     int32_t leadOut = 0;
+    int32_t lastSession = 0; // block; 0 for a single session, or if nothing is known about sessions
     Texts texts = {};
 };
 
@@ -62,6 +63,15 @@ public:
     virtual int64_t getRepairs() const = 0; // -1: unknown
 };
 
+// Reads data from a medium. Belongs to one thread at a time.
+class IDataReader {
+public:
+    virtual ~IDataReader() = default;
+    // Blocks of 2048 bytes. Throws CDiscError.
+    virtual void read(int32_t block, int32_t count, void* to) = 0;
+    virtual std::string getName() const = 0; // of the medium, for messages
+};
+
 // Any thread.
 class IMedium : public std::enable_shared_from_this<IMedium> {
 public:
@@ -78,9 +88,23 @@ public:
     }
     // For the blocks of one track. Throws CDiscError.
     virtual std::unique_ptr<IAudioReader> createAudioReader(const STrack& track) const = 0;
-    // The file or device with the file system of the first data track, which has to start there.
-    // Throws CDiscError if it does not.
+    // The track with the file system to read: that of the last session, otherwise the first one. Null if
+    // there is none.
+    const STrack* findDataTrack() const {
+        const STableOfContents& contents = getContents();
+        const STrack* found = nullptr;
+        for (const STrack& track : contents.tracks)
+            if (!track.isAudio &&
+                (!found || (contents.lastSession > 0 && track.start == contents.lastSession)))
+                found = &track;
+        return found;
+    }
+    // The file or device that starts with that track. Empty if it starts elsewhere. Throws CDiscError.
     virtual std::string getDataPath() const = 0;
+    // Throws CDiscError.
+    virtual std::unique_ptr<IDataReader> createDataReader() const {
+        throw CDiscError(DISCIO_ERROR_NOT_SUPPORTED, "the data has not been written to a disc");
+    }
 };
 
 class IDrive {

@@ -162,3 +162,55 @@ TEST(Data, AMixedDiscHasBothComponents) {
         EXPECT_EQ(listAll(cursor.get()), std::vector<std::string>{"\\file 5"}) << open.getError();
     }
 }
+
+// Behind audio, in a session of its own or not, with addresses from the start of the disc or of the track.
+TEST(Data, FilesBehindAudioAreRead) {
+    const CTempFolder folder;
+    std::filesystem::create_directories(folder / "in/Sub");
+    const std::string content = makeSectors(3, 4);
+    folder.write("in/Sub/Name of a file", content);
+    const auto open = [&](const char* address, const char* naming, bool isRaw, int mode) {
+        std::vector<std::string> command{"genisoimage", "-quiet", "-V", "My disc", naming, "-o", "disc.iso"};
+        if (*address) command.insert(command.end(), {"-C", std::string("0,") + address});
+        command.push_back("in");
+        EXPECT_EQ(run(command, folder.path()).exitCode, 0);
+        const std::string iso = readFile(folder / "disc.iso");
+        std::string bytes = makeSectors(100, 5);
+        for (size_t i = 0; i < iso.size(); i += 2048)
+            bytes += '\0' + std::string(10, '\xFF') + std::string(4, '\0') + static_cast<char>(mode) +
+                     std::string(mode == 2 ? 8 : 0, '\0') + iso.substr(i, 2048) +
+                     std::string(mode == 2 ? 280 : 288, '\0');
+        folder.write("disc.bin", isRaw ? bytes : bytes.substr(0, 100 * kSectorBytes) + iso);
+        return SOpenDisc(folder.write("disc.cue", "FILE disc.bin BINARY\nTRACK 01 AUDIO\nINDEX 01 00:00:00\n"
+                                                  "TRACK 02 MODE" +
+                                                      std::to_string(mode) + (isRaw ? "/2352" : "/2048") +
+                                                      "\nINDEX 01 00:01:25\n"));
+    };
+    const struct {
+        const char* address;
+        const char* naming;
+        bool isRaw;
+        int mode;
+    } cases[] = {{"100", "-J", true, 1}, {"", "-R", true, 2}, {"11500", "-R", false, 1}};
+    for (const auto& each : cases) {
+        SCOPED_TRACE(each.address);
+        const SOpenDisc disc = open(each.address, each.naming, each.isRaw, each.mode);
+        ASSERT_TRUE(disc.disc) << disc.getError();
+        EXPECT_TRUE(disc.readSegment(0) == makeSectors(100, 5));
+        const Discio<DISCIO_DataCursor> root(DISCIO_DiscDataCreateCursorW(disc.disc.get(), u""));
+        ASSERT_TRUE(root) << disc.getError();
+        EXPECT_EQ(listAll(root.get()), (std::vector<std::string>{"\\Sub\\", "\\Sub\\Name of a file 7056"}));
+        EXPECT_EQ(narrow(DISCIO_DiscDataGetTitleW(disc.disc.get())), "My disc");
+        const Discio<DISCIO_DataCursor> file(DISCIO_DiscDataCreateCursorW(disc.disc.get(), u"Sub"));
+        std::string bytes(content.size(), '\0');
+        EXPECT_EQ(DISCIO_DataCursorNext(file.get()), 1);
+        EXPECT_EQ(DISCIO_DataCursorRead(file.get(), 7, bytes.data(), 100000), 7049) << disc.getError();
+        EXPECT_EQ(bytes.substr(0, 7049), content.substr(7));
+    }
+    std::string damaged = readFile(folder / "disc.bin");
+    damaged.replace(100 * kSectorBytes + 16 * 2048, 6, "\1XXXXX");
+    folder.write("disc.bin", damaged);
+    const SOpenDisc none(folder / "disc.cue");
+    EXPECT_FALSE(Discio<DISCIO_DataCursor>(DISCIO_DiscDataCreateCursorW(none.disc.get(), u"")));
+    EXPECT_EQ(DISCIO_GetLastError(none.library.get()), DISCIO_ERROR_BROKEN_FILE_SYSTEM) << none.getError();
+}

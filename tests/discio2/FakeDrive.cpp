@@ -161,9 +161,11 @@ void CFakeDrive::announce(const std::string& name, bool hasMedium, bool isChange
     umockdev_testbed_uevent(m_testbed, device.c_str(), "change");
 }
 
-void CFakeDrive::setData(const std::string& bytes) {
+void CFakeDrive::setData(const std::string& bytes, int block) {
     gchar* root = umockdev_testbed_get_root_dir(m_testbed);
-    std::ofstream(std::string(root) + "/dev/sr0", std::ios::binary) << bytes;
+    std::ofstream device(std::string(root) + "/dev/sr0", std::ios::binary);
+    device.seekp(std::streamoff{block} * 2048);
+    device << bytes;
     g_free(root);
 }
 

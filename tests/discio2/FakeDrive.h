@@ -19,8 +19,8 @@ public:
 
     // The event of the kernel about the medium of a device, "sr0" or "sdb".
     void announce(const std::string& name, bool hasMedium, bool isChanged = true);
-    // The sectors of a data track at the start of the disc, 2048 bytes each.
-    void setData(const std::string& bytes);
+    // The sectors of a data track from that block on, 2048 bytes each. There is no other data then.
+    void setData(const std::string& bytes, int block = 0);
 
 private:
     UMockdevTestbed* m_testbed;

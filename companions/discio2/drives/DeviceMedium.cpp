@@ -2,6 +2,7 @@
 #include "CdText.h"
 #include "drives/CdioDevice.h"
 #include "drives/DeviceAudioReader.h"
+#include "drives/DeviceStatus.h"
 #include "drives/Pregaps.h"
 
 #include <algorithm>
@@ -9,7 +10,9 @@
 #include <cdio/cdio.h>
 #include <cdio/mmc.h>
 #include <cdio/mmc_ll_cmds.h>
+#include <cerrno>
 #include <cstring>
+#include <unistd.h>
 #include <utility>
 
 namespace discio {
@@ -104,6 +107,7 @@ STableOfContents readContents(CdIo_t* device) {
     contents.leadOut = cdio_get_track_lsn(device, CDIO_CDROM_LEADOUT_TRACK);
     lsn_t session = 0; // start of the last one
     if (cdio_get_last_session(device, &session) != DRIVER_OP_SUCCESS) session = 0;
+    contents.lastSession = session;
     for (size_t i = 0; i < contents.tracks.size(); ++i) {
         STrack& track = contents.tracks[i];
         int32_t end = contents.leadOut;
@@ -122,6 +126,33 @@ STableOfContents readContents(CdIo_t* device) {
     return contents;
 }
 
+// The kernel counts the blocks of all sessions.
+class CDeviceDataReader : public IDataReader {
+public:
+    explicit CDeviceDataReader(const std::string& path) : m_path(path), m_device(path) {}
+
+    void read(int32_t block, int32_t count, void* to) override {
+        auto* at = static_cast<char*>(to);
+        int64_t left = int64_t{count} * kDataSectorBytes;
+        for (int64_t offset = int64_t{block} * kDataSectorBytes; left > 0;) {
+            const ssize_t some = ::pread(m_device.get(), at, static_cast<size_t>(left), offset);
+            if (some < 0 && errno == EINTR) continue;
+            if (some <= 0)
+                throw CDiscError(DISCIO_ERROR_READ_INPUT, m_path + ": block " +
+                                                              std::to_string(offset / kDataSectorBytes) +
+                                                              " cannot be read");
+            at += some;
+            offset += some;
+            left -= some;
+        }
+    }
+    std::string getName() const override { return m_path; }
+
+private:
+    std::string m_path;
+    CDeviceDescriptor m_device;
+};
+
 class CDeviceMedium : public IMedium {
 public:
     explicit CDeviceMedium(const std::string& path) : m_path(path) {
@@ -139,15 +170,12 @@ public:
     std::unique_ptr<IAudioReader> createAudioReader(const STrack& track) const override {
         return createDeviceAudioReader(m_path, m_contents, track);
     }
-    // The library for file systems does not know about sessions.
     std::string getDataPath() const override {
-        for (const STrack& track : m_contents.tracks)
-            if (!track.isAudio && track.start != 0)
-                throw CDiscError(DISCIO_ERROR_NOT_SUPPORTED,
-                                 m_path + ": the data track does not start at the beginning of the disc");
-            else if (!track.isAudio)
-                break;
-        return m_path;
+        const STrack* track = findDataTrack();
+        return track && track->start == 0 ? m_path : std::string();
+    }
+    std::unique_ptr<IDataReader> createDataReader() const override {
+        return std::make_unique<CDeviceDataReader>(m_path);
     }
 
 private:

@@ -1,3 +1,4 @@
+#include "data/SessionVolume.h"
 #include "exports/Handles.h"
 #include "projects/SourcePath.h"
 
@@ -10,10 +11,11 @@ namespace discio {
 IDataVolume& SDisc::getVolume() {
     std::lock_guard lock(mutex);
     if (!volume) {
-        const auto& tracks = medium->getContents().tracks;
-        if (std::none_of(tracks.begin(), tracks.end(), [](const STrack& track) { return !track.isAudio; }))
-            throw CDiscError(DISCIO_ERROR_NO_DATA, "");
-        volume = openDataVolume(medium->getDataPath());
+        const STrack* track = medium->findDataTrack();
+        if (!track) throw CDiscError(DISCIO_ERROR_NO_DATA, "");
+        const std::string path = medium->getDataPath();
+        volume =
+            path.empty() ? openSessionVolume(medium->createDataReader(), track->start) : openDataVolume(path);
     }
     return *volume;
 }

@@ -27,6 +27,19 @@ private:
     std::shared_ptr<const CImageMedium> m_medium;
 };
 
+class CImageDataReader : public IDataReader {
+public:
+    explicit CImageDataReader(std::shared_ptr<const CImageMedium> medium) : m_medium(std::move(medium)) {}
+    void read(int32_t block, int32_t count, void* to) override {
+        for (int32_t i = 0; i < count; ++i)
+            m_medium->readData(block + i, static_cast<char*>(to) + int64_t{i} * kDataSectorBytes);
+    }
+    std::string getName() const override { return m_medium->getPath(); }
+
+private:
+    std::shared_ptr<const CImageMedium> m_medium;
+};
+
 } // namespace
 
 CImageMedium::CImageMedium(const std::string& path) : m_path(path), m_layout(readImage(path)) {}
@@ -87,16 +100,36 @@ void CImageMedium::readAudio(int32_t block, int32_t count, int16_t* samples) con
     }
 }
 
+void CImageMedium::readData(int32_t block, char* to) const {
+    const SExtent* extent = findExtent(block);
+    if (!extent || isAudioForm(extent->form) || extent->file < 0)
+        throw CDiscError(DISCIO_ERROR_NO_DATA, m_path + " has no data in block " + std::to_string(block));
+    const CImageFile& file = *m_layout.files[static_cast<size_t>(extent->file)];
+    const int64_t offset = extent->offset + int64_t{block - extent->start} * getSectorBytes(extent->form);
+    constexpr int kMode = 15, kHeader = 16, kSubheader = 8;
+    int inside = 0;
+    if (extent->form == ESectorForm::withSubheader) {
+        inside = kSubheader;
+    } else if (extent->form != ESectorForm::data) {
+        char header[kHeader];
+        if (file.read(offset, header, kHeader) < kHeader) header[kMode] = 0;
+        inside = kHeader + (header[kMode] == 2 ? kSubheader : 0);
+    }
+    if (file.read(offset + inside, to, kDataSectorBytes) < kDataSectorBytes)
+        throw CDiscError(DISCIO_ERROR_READ_INPUT, file.getPath() + " is too short");
+}
+
 std::string CImageMedium::getDataPath() const {
-    const auto& tracks = m_layout.contents.tracks;
-    const auto track =
-        std::find_if(tracks.begin(), tracks.end(), [](const STrack& each) { return !each.isAudio; });
-    if (track == tracks.end()) throw CDiscError(DISCIO_ERROR_NO_DATA, m_path + " has no data track");
+    const STrack* track = findDataTrack();
+    if (!track) throw CDiscError(DISCIO_ERROR_NO_DATA, m_path + " has no data track");
     const SExtent* extent = findExtent(track->start);
-    if (!extent || extent->file < 0 || extent->offset != 0 || extent->start != track->start)
-        throw CDiscError(DISCIO_ERROR_NOT_SUPPORTED,
-                         m_path + ": the data track does not start at the beginning of its file");
-    return m_layout.files[static_cast<size_t>(extent->file)]->getPath();
+    const bool isWhole = extent && extent->file >= 0 && extent->offset == 0 && extent->start == track->start;
+    return isWhole ? m_layout.files[static_cast<size_t>(extent->file)]->getPath() : std::string();
+}
+
+std::unique_ptr<IDataReader> CImageMedium::createDataReader() const {
+    return std::make_unique<CImageDataReader>(
+        std::static_pointer_cast<const CImageMedium>(shared_from_this()));
 }
 
 } // namespace discio

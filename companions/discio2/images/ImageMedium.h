@@ -13,9 +13,12 @@ public:
     SMediumState getState() const override;
     std::unique_ptr<IAudioReader> createAudioReader(const STrack& track) const override;
     std::string getDataPath() const override;
+    std::unique_ptr<IDataReader> createDataReader() const override;
 
     // Throws CDiscError.
     void readAudio(int32_t block, int32_t count, int16_t* samples) const;
+    void readData(int32_t block, char* to) const; // one block
+    const std::string& getPath() const { return m_path; }
 
 private:
     const SExtent* findExtent(int32_t block) const;

@@ -25,7 +25,12 @@ namespace discio {
     use(iso_write_opts_set_allow_longer_paths) use(iso_write_opts_set_omit_version_numbers) \
     use(iso_write_opts_set_relaxed_vol_atts) use(iso_write_opts_set_dir_rec_mtime) \
     use(iso_write_opts_set_always_gmt) use(iso_write_opts_set_output_charset) \
-    use(iso_write_opts_set_tail_blocks)
+    use(iso_write_opts_set_tail_blocks) use(iso_read_opts_new) use(iso_read_opts_free) \
+    use(iso_read_opts_set_start_block) use(iso_read_opts_set_no_aaip) use(iso_read_opts_set_no_md5) \
+    use(iso_read_opts_set_ecma119_map) use(iso_data_source_unref) use(iso_image_import) \
+    use(iso_image_get_volume_id) use(iso_dir_get_children) use(iso_dir_iter_next) use(iso_dir_iter_free) \
+    use(iso_node_get_type) use(iso_node_get_name) use(iso_node_get_mtime) use(iso_file_get_size) \
+    use(iso_file_get_old_image_sections)
 // clang-format on
 
 struct SIsoLibrary {

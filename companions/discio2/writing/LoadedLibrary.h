@@ -1,4 +1,4 @@
-// Libraries for writing, loaded with the first write: who only reads discs does without them.
+// Libraries that are loaded with their first use: most discs are read without them.
 #pragma once
 
 #include "Error.h"
