@@ -22,7 +22,7 @@ std::string getText(DISCIO_Disc* disc, int segment, int32_t text) {
 
 } // namespace
 
-TEST(Write, ARecordersProgramReadsTheCueSheet) {
+TEST(Write, OtherProgramsReadTheCueSheet) {
     const CTempFolder folder;
     SSource a(makeSectors(310, 1)), b(makeSectors(301, 2).substr(0, 4 * (588 * 300 + 7)));
     const SProject own(true);
@@ -49,6 +49,11 @@ TEST(Write, ARecordersProgramReadsTheCueSheet) {
     for (const char* line : {"START  00:00:00(     0)", "END    00:04:10(   310)", "PREGAP 00:02:00(   150)",
                              "START  00:06:10(   460)", "END    00:10:11(   761)"})
         EXPECT_NE(peer.out.find(line), std::string::npos) << line << "\n" << peer.out;
+    const SProcessResult info = run({"cd-info", "--no-cddb", "--no-device-info", "disc.cue"}, folder.path());
+    ASSERT_EQ(info.exitCode, 0) << info.err;
+    for (const char* line : {"1: 00:02:00  000000 audio", "2: 00:08:10  000460 audio", "000761 leadout",
+                             "(MCN): 1234567890123", "PERFORMER: Band"})
+        EXPECT_NE(info.out.find(line), std::string::npos) << line << "\n" << info.out;
     // Texts beyond Latin-1 are in the sheet only.
     DISCIO_DiscAudioSetSegmentMetaDataStringW(disc, 0, DISCIO_TEXT_TITLE, u"\u0416");
     ASSERT_EQ(own.write(folder / "other.cue"), 1) << lastError();

@@ -54,6 +54,10 @@ TEST_F(DISABLED_Burn, Audio) {
                 makeSectors(310, 1) + std::string(150 * kSectorBytes, '\0') + makeSectors(320, 2));
     const std::string shown = succeed({"disc", "/dev/sr0"});
     for (const char* text : {"Platte", "Ein Lied"}) EXPECT_NE(shown.find(text), std::string::npos) << shown;
+    const std::string info = peer({"cd-info", "--no-cddb", "--no-device-info", "/dev/sr0"});
+    for (const char* line :
+         {"000000 audio", "000460 audio", "000780 leadout", "TITLE: Platte", "TITLE: Ein Lied"})
+        EXPECT_NE(info.find(line), std::string::npos) << info;
     EXPECT_NE(fail({"burn", "1.wav", "--drive", "/dev/sr0"}).find("cannot be written to"), std::string::npos);
     EXPECT_EQ(list(), before);
 }
