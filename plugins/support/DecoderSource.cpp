@@ -13,13 +13,13 @@ namespace sonora2::plugins {
 
 namespace {
 
-// Read-ahead is limited to one second and to this many bytes.
-constexpr int64_t kReadAheadBytes = 512 * 1024;
+// Long enough for few changes between the threads, and at most this many bytes.
+constexpr int64_t kReadAheadChunks = 16;
+constexpr int64_t kReadAheadBytes = 768 * 1024;
 
 size_t getReadAheadChunks(const SPcmFormat& format, int chunkFrames) {
-    const int64_t second = format.rate;
-    const int64_t frames = std::min<int64_t>(second, kReadAheadBytes / format.frameBytes());
-    return static_cast<size_t>(frames / chunkFrames);
+    return static_cast<size_t>(
+        std::min(kReadAheadChunks, kReadAheadBytes / (int64_t{chunkFrames} * format.frameBytes())));
 }
 
 } // namespace

@@ -1,10 +1,19 @@
 #include "support/ReadAhead.h"
 
 #include <algorithm>
+#include <chrono>
 #include <exception>
 #include <utility>
 
 namespace sonora2::plugins {
+
+namespace {
+
+// A decoder that is slower than eight chunks in this time has the consumer woken for what there is, so that
+// nobody waits for chunks after the one that is needed.
+constexpr auto kPatience = std::chrono::milliseconds(2);
+
+} // namespace
 
 CReadAhead::CReadAhead(CChunkProducer& producer, size_t limit)
     : m_producer(producer), m_limit(limit == 0 ? 0 : std::max<size_t>(limit, 2)) {}
@@ -36,7 +45,7 @@ P<audio::IAudioChunk> CReadAhead::next() {
     bool drained = false;
     {
         std::unique_lock lock(m_mutex);
-        m_filled.wait(lock, [this] { return !m_chunks.empty() || m_ended; });
+        if (m_chunks.empty() && !m_ended) waitForBatch(lock);
         if (m_chunks.empty()) {
             error = std::exchange(m_error, nullptr);
         } else {
@@ -45,10 +54,21 @@ P<audio::IAudioChunk> CReadAhead::next() {
             drained = m_chunks.size() == m_limit / 2;
         }
     }
-    // Waking the thread when the queue is half empty lets it decode several chunks per wake-up.
+    // Waking the thread when the queue is half empty lets it decode many chunks per wake-up.
     if (drained) m_drained.notify_one();
     if (error) error->raise();
     return chunk;
+}
+
+void CReadAhead::waitForBatch(std::unique_lock<std::mutex>& lock) {
+    const auto isFilled = [this] { return m_chunks.size() >= m_wanted || m_ended; };
+    m_wanted = m_batch;
+    if (!m_filled.wait_for(lock, kPatience, isFilled)) {
+        m_wanted = 1;
+        m_filled.wait(lock, isFilled);
+    }
+    m_wanted = 0;
+    m_batch = std::min(2 * m_batch, m_limit / 2);
 }
 
 bool CReadAhead::isEnded() const {
@@ -82,6 +102,7 @@ void CReadAhead::run() {
         P<audio::IAudioChunk> chunk;
         P<peru::CException> error;
         more = produce(chunk, error);
+        bool isFilled;
         {
             std::lock_guard lock(m_mutex);
             if (chunk) m_chunks.push_back(std::move(chunk));
@@ -89,8 +110,10 @@ void CReadAhead::run() {
                 m_error = std::move(error);
                 m_ended = true;
             }
+            isFilled = m_wanted > 0 && (m_chunks.size() >= m_wanted || m_ended);
         }
-        m_filled.notify_one(); // after unlocking, so that the consumer does not block on the lock
+        if (isFilled)
+            m_filled.notify_one(); // after unlocking, so that the consumer does not block on the lock
         std::unique_lock lock(m_mutex);
         if (more && m_chunks.size() >= m_limit)
             m_drained.wait(lock, [this] { return m_stopping || m_chunks.size() <= m_limit / 2; });
