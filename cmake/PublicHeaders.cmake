@@ -59,6 +59,7 @@ set(TONEWRIGHT_PUBLIC_HEADERS
     sonora2/media/ISalvage.h
     sonora2/media/ISonoraPicture.h
     sonora2/media/ISource.h
+    sonora2/media/ITwinSource.h
     sonora2/media/IVideoSource.h
     sonora2/pictures/NV12Picture.h
     sonora2/pictures/Picture.h

@@ -207,6 +207,12 @@ void CMpegDecoder::seek(int64_t frame) {
     m_frameEnd = 0;
 }
 
+std::unique_ptr<IDecoder> CMpegDecoder::createTwin() {
+    auto twin = std::make_unique<CMpegDecoder>(m_file);
+    twin->m_scan = m_scan;
+    return twin;
+}
+
 P<peru::IString> CMpegDecoder::describe(int error) const {
     switch (error) {
     case MPG123_ERR_READER:

@@ -178,6 +178,12 @@ void CFlacDecoder::seek(int64_t frame) {
     discard(frame);
 }
 
+std::unique_ptr<IDecoder> CFlacDecoder::createTwin() {
+    auto twin = std::make_unique<CFlacDecoder>(m_file);
+    twin->m_scanned = m_scanned;
+    return twin;
+}
+
 void CFlacDecoder::discard(int64_t frames) {
     std::array<uint8_t, 16384> forgotten;
     const int step = static_cast<int>(forgotten.size()) / m_format.frameBytes();

@@ -20,6 +20,7 @@ public:
     void close() override;
     int read(uint8_t* pcm, int frames) override;
     void seek(int64_t frame) override;
+    std::unique_ptr<IDecoder> createTwin() override;
 
 private:
     struct SDeleter {

@@ -294,6 +294,12 @@ void CSndfileDecoder::seek(int64_t frame) {
     m_position = frame;
 }
 
+// Floating-point samples are left to one decoder, which counts those that clip.
+std::unique_ptr<IDecoder> CSndfileDecoder::createTwin() {
+    if (m_transfer != ETransfer::raw && m_transfer != ETransfer::rawSigned8) return nullptr;
+    return std::make_unique<CSndfileDecoder>(m_file);
+}
+
 template <class Sample> void CSndfileDecoder::checkClipping(const Sample* samples, sf_count_t frames) {
     const int64_t known = std::clamp<int64_t>(m_checked - m_position, 0, std::max<int64_t>(frames, 0));
     Sample peak = 0;

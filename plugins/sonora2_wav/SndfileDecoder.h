@@ -29,6 +29,7 @@ public:
     int read(uint8_t* pcm, int frames) override;
     void seek(int64_t frame) override;
     void deliverFloat() override { m_deliversFloat = true; }
+    std::unique_ptr<IDecoder> createTwin() override; // for linear PCM
 
 private:
     // How samples are read from the library.

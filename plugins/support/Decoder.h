@@ -4,6 +4,7 @@
 #include "sonora2/context/ILogManager.h"
 #include "support/MediaFile.h"
 
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -66,6 +67,9 @@ public:
     virtual std::vector<SSoundtrack> getSoundtracks() { return {{}}; }
     // Selects one of them for the next open(). Only called while closed.
     virtual void selectSoundtrack(int index) {}
+    // Another decoder of the same file, closed, for use by another thread while this one is open. Null unless
+    // reading from any frame on yields exactly what an uninterrupted run does.
+    virtual std::unique_ptr<IDecoder> createTwin() { return nullptr; }
 };
 
 } // namespace sonora2::plugins

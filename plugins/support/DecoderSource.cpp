@@ -184,6 +184,28 @@ int64_t CDecoderSource::getBitRate() {
                         static_cast<double>(m_media.frames));
 }
 
+void CDecoderSource::skipToFrame(int64_t frame) {
+    requireOpened();
+    restartAt(std::clamp<int64_t>(frame, 0, m_total));
+}
+
+P<common::IAudioSource> CDecoderSource::createTwin() {
+    requireOpened();
+    if (m_salvage || m_soundtrack != 0 || m_media.isEstimate || m_media.isDirect || m_media.format.isFloat)
+        return nullptr;
+    std::unique_ptr<IDecoder> decoder = m_decoder->createTwin();
+    if (!decoder) return nullptr;
+    auto twin = peru::make<CDecoderSource>(m_context, m_pluginName, m_file, std::move(decoder), m_delivered);
+    twin->m_log = peru::make<CWarningLog>(nullptr);
+    twin->m_salvage = false;
+    twin->m_preventClipping = m_preventClipping;
+    twin->m_isTwin = true;
+    twin->open();
+    // Otherwise the file has been replaced.
+    const bool isSame = twin->m_media.format == m_media.format && twin->m_total == m_total;
+    return isSame ? twin : nullptr;
+}
+
 P<audio::IAudioChunk> CDecoderSource::getNextAudioChunk() {
     requireOpened();
     if (isEOF()) return nullptr;
@@ -209,9 +231,9 @@ void CDecoderSource::peekChunk() {
 
 P<audio::IAudioChunk> CDecoderSource::pullChunk() {
     if (!m_readAhead) {
+        const bool isDirect = m_media.isDirect || m_isTwin;
         m_readAhead = std::make_unique<CReadAhead>(
-            *m_producer,
-            m_media.isDirect ? 0 : getReadAheadChunks(m_delivered, m_producer->getChunkFrames()));
+            *m_producer, isDirect ? 0 : getReadAheadChunks(m_delivered, m_producer->getChunkFrames()));
     }
     return m_readAhead->next();
 }

@@ -6,6 +6,7 @@
 #include "sonora2/media/IFloatSamples.h"
 #include "sonora2/media/IMediaDescription.h"
 #include "sonora2/media/ISalvage.h"
+#include "sonora2/media/ITwinSource.h"
 #include "support/ReadAhead.h"
 #include "support/WarningLog.h"
 
@@ -20,7 +21,8 @@ class CDecoderSource : public peru::CObject,
                        public common::IMediaDescription,
                        public common::ISalvage,
                        public common::IClippingPrevention,
-                       public common::IFloatSamples {
+                       public common::IFloatSamples,
+                       public common::ITwinSource {
 public:
     // Created closed. A zero in `wanted` selects the file's own value.
     CDecoderSource(const P<common::ISonoraContext>& context, const P<peru::IString>& pluginName,
@@ -66,6 +68,11 @@ public:
     void setDeliveredFormat(int sampleRate, int channelCount, int bytesPerSample) override;
     P<peru::IString> takeWarnings() override;
 
+    int64_t getFrame() override { return m_delivering; }
+    int64_t getFrameCount() override { return m_total; }
+    void skipToFrame(int64_t frame) override;
+    P<common::IAudioSource> createTwin() override;
+
 private:
     void openDecoder();
     void change(bool& option, bool value);
@@ -86,6 +93,7 @@ private:
     double m_startTime = 0.0;
     bool m_salvage = false;
     bool m_preventClipping = false;
+    bool m_isTwin = false; // decodes on the caller's thread
     int m_soundtrack = 0;
     std::unique_ptr<IDecoder> m_decoder;
     P<CWarningLog> m_log;

@@ -2,16 +2,15 @@
 #include "peru/strings/LocalizedFormat.h"
 #include "peru/strings/StringFormat.h"
 #include "sonora2/context/LastFailure.h"
-#include "sonora2/encoding/SampleReader.h"
 #include "tonewright/EditorXml.h"
 #include "tonewright/RecordingAudioSource.h"
+#include "tonewright/StepReader.h"
 #include "tonewright/TracklistAudioSource.h"
 #include "tonewright/exports/AppReference.h"
 #include "tonewright/exports/Barrier.h"
 #include "tonewright/exports/Handles.h"
 
 #include <cmath>
-#include <cstring>
 #include <limits>
 
 using namespace tonewright;
@@ -19,9 +18,6 @@ using namespace tonewright::exports;
 using sonora2::common::IAudioSource;
 
 namespace {
-
-constexpr int kStepsPerBlock = 100;
-constexpr float kSampleScale = 3.0517578125e-05f; // 1 / 32768
 
 // Frames between two steps of a waveform. Throws CError for a step of less than one frame or of more than one
 // chunk can hold.
@@ -44,31 +40,13 @@ bool fetchSamples(TONEWRIGHT_Handle handle, const P<IAudioSource>& source,
         throw peru::CError(
             peru::localize("tonewright.FetchStreamSamples.noChannel",
                            "TONEWRIGHT_AudioSource_FetchStreamSamples: a source of no channel"));
-    const int blockSize = channels * kStepsPerBlock;
-    const int framesPerStep = getFramesPerStep(*source, secondsPerStep);
-    const P<peru::IMemoryBlock> block = context->getMemoryManager()->getBlock(
-        static_cast<int64_t>(blockSize) * static_cast<int64_t>(sizeof(float)));
-    auto* samples = reinterpret_cast<float*>(block->getData());
-    const size_t frameBytes = static_cast<size_t>(channels) * sizeof(int16_t);
-
-    auto reader = peru::make<sonora2::common::CSampleReader>(context, source);
     const double duration = source->getDuration();
-    int filled = 0;
-    while (reader->hasSamples()) {
-        const P<sonora2::audio::IAudioChunk> chunk = reader->getSamples(framesPerStep);
-        if (!chunk || chunk->getSize() < frameBytes) continue;
-        const uint8_t* frame = chunk->getData();
-        for (int channel = 0; channel < channels; ++channel, frame += sizeof(int16_t)) {
-            int16_t sample;
-            std::memcpy(&sample, frame, sizeof(sample));
-            samples[filled++] = static_cast<float>(sample) * kSampleScale;
-        }
-        if (filled < blockSize) continue;
-        const double fraction = duration > 0.0 ? chunk->getTimestamp() / duration : 0.0;
-        if (!callback(handle, fraction, samples, blockSize, user)) return false;
-        filled = 0;
-    }
-    return true;
+    return CStepReader(context, source, getFramesPerStep(*source, secondsPerStep),
+                       [&](const auto& block) {
+                           const double fraction = duration > 0.0 ? block.time / duration : 0.0;
+                           return callback(handle, fraction, block.samples, block.count, user);
+                       })
+        .read();
 }
 
 } // namespace
