@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <cstring>
 #include <new>
 #include <utility>
 
@@ -82,7 +83,6 @@ void CFlacEncoder::open(COutputFile& file, const SEncoderSettings& settings) {
 
 void CFlacEncoder::write(const uint8_t* pcm, int frames) {
     if (m_parallel) {
-        addToHash(pcm, static_cast<size_t>(frames) * m_format.frameBytes());
         m_parallel->write(pcm, frames);
     } else if (!m_encoder->process(pcm, frames)) {
         failEncoding(getState());
@@ -141,13 +141,15 @@ void CFlacEncoder::noteFrame(uint32_t samples) {
     m_encoded += samples;
 }
 
-void CFlacEncoder::addToHash(const uint8_t* pcm, size_t size) {
-    if (m_format.bytesPerSample == 1) { // the checksum is of signed samples
-        m_signed.assign(pcm, pcm + size);
-        pcm::flipSign8(m_signed.data(), size);
-        pcm = m_signed.data();
+void CFlacEncoder::addToHash(const std::vector<uint8_t>& pcm) noexcept {
+    if (m_format.bytesPerSample > 1) return MD5Update(&m_hash, pcm.data(), pcm.size());
+    std::array<uint8_t, 4096> part; // the checksum is of signed samples
+    for (size_t at = 0; at < pcm.size(); at += part.size()) {
+        const size_t size = std::min(pcm.size() - at, part.size());
+        std::memcpy(part.data(), &pcm[at], size);
+        pcm::flipSign8(part.data(), size);
+        MD5Update(&m_hash, part.data(), size);
     }
-    MD5Update(&m_hash, pcm, size);
 }
 
 // What the library writes at the end of a stream that it has encoded itself. Source: RFC 9639, section 8.2.

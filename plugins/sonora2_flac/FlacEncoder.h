@@ -51,7 +51,7 @@ private:
     void noteFrame(uint32_t samples); // the next one, at the file's position
     void addSeekPoint(int64_t offset, uint32_t frames);
     void addFrame(const uint8_t* bytes, size_t size, uint32_t samples) override;
-    void addToHash(const uint8_t* pcm, size_t size);
+    void addToHash(const std::vector<uint8_t>& pcm) noexcept override;
     void writeStreamInfo();
     void writeSeekTable();
     [[noreturn]] void failEncoding(const char* reason) override;
@@ -63,8 +63,7 @@ private:
     std::unique_ptr<CParallelEncoder> m_parallel; // null if this thread encodes the whole stream
     COutputFile* m_file = nullptr;                // null outside a job; nothing is written then
     SPcmFormat m_format;
-    MD5_CTX m_hash{}; // of the samples, if the stream is encoded in parallel
-    std::vector<uint8_t> m_signed;
+    MD5_CTX m_hash{};             // of the samples, if the stream is encoded in parallel
     uint32_t m_smallestFrame = 0; // bytes; 0 before the first
     uint32_t m_largestFrame = 0;
     std::vector<SSeekPoint> m_seekPoints;

@@ -22,7 +22,10 @@ struct SFrameRun {
     std::vector<uint8_t> encoded;
     std::vector<SFrame> frames; // in `encoded`
     std::string failure;        // of the library; empty for none
-    bool done = false;
+    bool isEncoded = false;
+    bool isHashed = false;
+
+    bool isDone() const { return isEncoded && isHashed; }
 };
 
 // Yields the same frames as an encoder of the whole stream, for the levels for which canSplit() is true. One

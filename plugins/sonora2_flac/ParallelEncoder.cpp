@@ -75,6 +75,7 @@ void CParallelEncoder::cut(size_t bytes) {
     m_runs.push_back(std::exchange(m_filling, std::move(next)));
     std::lock_guard lock(m_mutex);
     m_waiting.push_back(m_runs.back().get());
+    m_unhashed.push_back(m_runs.back().get());
 }
 
 void CParallelEncoder::deliverReady(size_t most) {
@@ -86,20 +87,13 @@ void CParallelEncoder::deliverReady(size_t most) {
             m_runs.pop_front();
             continue;
         }
-        // A waiting run that no helper will take is the caller's work.
-        bool helped;
-        {
-            std::lock_guard lock(m_mutex);
-            helped = m_shares > 0;
-        }
-        if (helped && m_runs.size() <= most) return;
-        if (SFrameRun* run = takeWaiting()) {
-            m_own.encode(*run);
-            std::lock_guard lock(m_mutex);
-            run->done = true;
-        } else {
-            waitFor(first);
-        }
+        // What no helper takes is the caller's work.
+        std::unique_lock lock(m_mutex);
+        if (m_shares > 0 && m_runs.size() <= most) return;
+        if (const STask task = takeTask(); task.run)
+            perform(task, m_own, 0, lock);
+        else
+            m_finished.wait(lock, [&first] { return first.isDone(); });
     }
 }
 
@@ -121,7 +115,7 @@ CParallelEncoder::RunPtr CParallelEncoder::takeIdle() {
     RunPtr run = std::move(m_idle.back());
     m_idle.pop_back();
     run->pcm.clear();
-    run->done = false;
+    run->isEncoded = run->isHashed = false;
     return run;
 }
 
@@ -154,22 +148,44 @@ void CParallelEncoder::addHelpers() {
     }
 }
 
-SFrameRun* CParallelEncoder::takeWaiting() {
-    std::lock_guard lock(m_mutex);
-    if (m_waiting.empty()) return nullptr;
-    SFrameRun* run = m_waiting.front();
-    m_waiting.pop_front();
-    return run;
-}
-
 bool CParallelEncoder::isDone(const SFrameRun& run) {
     std::lock_guard lock(m_mutex);
-    return run.done;
+    return run.isDone();
 }
 
-void CParallelEncoder::waitFor(const SFrameRun& run) {
-    std::unique_lock lock(m_mutex);
-    m_finished.wait(lock, [&run] { return run.done; });
+// Hashing comes first: only one thread can do it at a time, and every run waits for the one before.
+CParallelEncoder::STask CParallelEncoder::takeTask() {
+    const bool isHash = !m_isHashing && !m_unhashed.empty();
+    std::deque<SFrameRun*>& queue = isHash ? m_unhashed : m_waiting;
+    if (queue.empty()) return {};
+    const STask task{queue.front(), isHash};
+    queue.pop_front();
+    m_isHashing = m_isHashing || isHash;
+    return task;
+}
+
+void CParallelEncoder::perform(const STask& task, CFrameRunEncoder& encoder, size_t worker,
+                               std::unique_lock<std::mutex>& lock) {
+    SFrameRun& run = *task.run;
+    lock.unlock();
+    if (task.isHash)
+        m_sink.addToHash(run.pcm);
+    else
+        encoder.encode(run);
+    lock.lock();
+    if (task.isHash) {
+        m_isHashing = false;
+        run.isHashed = true;
+    } else {
+        m_frameCounts[worker] += run.frames.size();
+        run.isEncoded = true;
+    }
+    if (run.isDone()) m_finished.notify_one();
+}
+
+std::vector<size_t> CParallelEncoder::getFrameCounts() {
+    std::lock_guard lock(m_mutex);
+    return m_frameCounts;
 }
 
 void CParallelEncoder::runHelper(peru::IBase*, void* argument) {
@@ -179,18 +195,16 @@ void CParallelEncoder::runHelper(peru::IBase*, void* argument) {
 void CParallelEncoder::help() {
     CFrameRunEncoder encoder(m_settings);
     std::unique_lock lock(m_mutex);
+    const size_t worker = m_frameCounts.size();
+    m_frameCounts.push_back(0);
     while (true) {
         m_work.wait(lock, [this] { return m_stopping || m_newShares > 0; });
         if (m_stopping) return;
         --m_newShares;
-        while (!m_stopping && !m_waiting.empty()) {
-            SFrameRun& run = *m_waiting.front();
-            m_waiting.pop_front();
-            lock.unlock();
-            encoder.encode(run);
-            lock.lock();
-            run.done = true;
-            m_finished.notify_one();
+        while (!m_stopping) {
+            const STask task = takeTask();
+            if (!task.run) break;
+            perform(task, encoder, worker, lock);
         }
         --m_shares;
         peru::getThreadBudget().leave();

@@ -13,17 +13,22 @@
 
 namespace sonora2::plugins::flac {
 
-// Receives the frames in their order, on the thread that calls the encoder. May throw.
+// Receives the sound and the frames in their order; except for the sound, on the thread that calls the
+// encoder.
 class IFrameSink {
 public:
     virtual ~IFrameSink() = default;
+    // Of one run after the other, on any thread.
+    virtual void addToHash(const std::vector<uint8_t>& pcm) noexcept = 0;
+    // These may throw.
     virtual void addFrame(const uint8_t* bytes, size_t size, uint32_t samples) = 0;
     [[noreturn]] virtual void failEncoding(const char* reason) = 0;
 };
 
 // The sound is cut into runs of blocks. Helper threads encode them while the process has processors left (see
-// peru::CThreadBudget); otherwise the caller's thread does. A stream of one run starts no thread. All
-// functions are called by one thread; the destructor drops what has not been delivered.
+// peru::CThreadBudget); otherwise the caller's thread does. They also hash the sound, which would keep the
+// caller from feeding many threads. A stream of one run starts no thread and is not hashed. All functions are
+// called by one thread; the destructor drops what has not been delivered.
 class CParallelEncoder {
 public:
     static constexpr int kMostThreads = 8; // with the caller's
@@ -42,7 +47,14 @@ public:
     // The beginning of the stream, as long as it is its first run, which is not being encoded yet.
     const std::vector<uint8_t>* getUncut() const { return m_nextNumber == 0 ? &m_filling->pcm : nullptr; }
 
+    // Frames that each thread has encoded, the caller's first. For measurements.
+    std::vector<size_t> getFrameCounts();
+
 private:
+    struct STask {
+        SFrameRun* run = nullptr; // null for no task
+        bool isHash = false;      // otherwise the run is to be encoded
+    };
     using RunPtr = std::unique_ptr<SFrameRun>;
 
     void cut(size_t bytes); // from the run that is being filled
@@ -51,9 +63,11 @@ private:
     void deliver(const SFrameRun& run);
     RunPtr takeIdle();
     void addHelpers();
-    SFrameRun* takeWaiting();
     bool isDone(const SFrameRun& run);
-    void waitFor(const SFrameRun& run);
+    // Both with the lock, which is not held during the work.
+    STask takeTask();
+    void perform(const STask& task, CFrameRunEncoder& encoder, size_t worker,
+                 std::unique_lock<std::mutex>& lock);
     static void runHelper(peru::IBase* owner, void* argument);
     void help();
 
@@ -69,12 +83,15 @@ private:
     bool m_progress = false;
     std::vector<P<peru::IThread>> m_helpers;
 
-    std::mutex m_mutex; // guards everything below, and `done` of the runs
+    std::mutex m_mutex; // guards everything below, and whether runs are encoded and hashed
     std::condition_variable m_work;
     std::condition_variable m_finished;
-    std::deque<SFrameRun*> m_waiting; // cut, but not being encoded
-    int m_shares = 0;                 // of the budget, which the helpers use or are about to use
-    int m_newShares = 0;              // those that no helper has taken up
+    std::deque<SFrameRun*> m_waiting;  // cut, but not being encoded
+    std::deque<SFrameRun*> m_unhashed; // cut, but not being hashed
+    bool m_isHashing = false;
+    std::vector<size_t> m_frameCounts{0}; // by worker, of which 0 is the caller
+    int m_shares = 0;                     // of the budget, which the helpers use or are about to use
+    int m_newShares = 0;                  // those that no helper has taken up
     bool m_stopping = false;
 };
 
