@@ -1,4 +1,4 @@
-#include "arguments/ParserErrors.h"
+#include "parser/ParserErrors.h"
 #include "base/Translation.h"
 
 #include <optional>
