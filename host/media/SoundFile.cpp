@@ -5,23 +5,11 @@
 #include "library/Failure.h"
 
 #include <algorithm>
-#include <cerrno>
-#include <cstring>
 #include <stdexcept>
-#include <sys/stat.h>
-#include <unistd.h>
 
 namespace host {
 
 namespace fs = std::filesystem;
-
-namespace {
-
-[[noreturn]] void throwSystem(int error) {
-    throw std::runtime_error(std::strerror(error));
-}
-
-} // namespace
 
 SSoundFile openSoundFile(const fs::path& file) {
     checkInput(file);
@@ -37,15 +25,6 @@ SSoundFile openSoundPipe(const fs::path& file) {
         throw std::runtime_error(takeFailure(tr("host.unreadable", "The file cannot be read"), file));
     sound.samples = {sound.info.sampleRate, sound.info.channelCount, sound.info.bytesPerSample};
     return sound;
-}
-
-void checkInput(const fs::path& file) {
-    struct stat status;
-    if (::stat(file.c_str(), &status) != 0) throwSystem(errno);
-    if (S_ISDIR(status.st_mode)) throwSystem(EISDIR);
-    if (!S_ISREG(status.st_mode)) throw std::runtime_error(tr("host.notRegular", "Is not a regular file"));
-    if (status.st_size == 0) throw std::runtime_error(tr("host.emptyFile", "The file is empty"));
-    if (::access(file.c_str(), R_OK) != 0) throwSystem(errno);
 }
 
 std::string describe(const SSampleFormat& samples) {
@@ -76,11 +55,6 @@ std::string codecName(const fs::path& file) {
     for (const auto& known : kCodecs)
         if (extension == known.extension) return known.codec;
     return extension.empty() ? tr("host.unknown", "unknown") : extension.substr(1);
-}
-
-bool isSameFile(const fs::path& a, const fs::path& b) {
-    std::error_code none;
-    return fs::equivalent(a, b, none);
 }
 
 } // namespace host

@@ -1,6 +1,7 @@
 // Input files.
 #pragma once
 
+#include "base/InputFile.h"
 #include "library/Library.h"
 
 #include <filesystem>
@@ -32,11 +33,6 @@ SSoundFile openSoundFile(const std::filesystem::path& file);
 
 // The same for a named pipe. Its source has no known duration and cannot seek.
 SSoundFile openSoundPipe(const std::filesystem::path& pipe);
-
-// Throws std::runtime_error with the reason unless this is a readable regular file that is not empty.
-void checkInput(const std::filesystem::path& file);
-
-bool isSameFile(const std::filesystem::path& a, const std::filesystem::path& b);
 
 // ".xyz files", for messages.
 std::string describeKind(const std::filesystem::path& file);
