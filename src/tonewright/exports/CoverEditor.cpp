@@ -1,4 +1,6 @@
+#include "ced/LazyLibrary.h"
 #include "tonewright/exports/AppReference.h"
+#include "tonewright/exports/Barrier.h"
 
 #include <atomic>
 
@@ -6,7 +8,12 @@ using namespace tonewright::exports;
 
 TONEWRIGHT_WindowHandle TONEWRIGHT_CreateCoverEditorHandle(TONEWRIGHT_WindowHandle, const char16_t*,
                                                            TONEWRIGHT_CoverEditorCallback) {
-    return notAvailable<TONEWRIGHT_WindowHandle>("TONEWRIGHT_CreateCoverEditorHandle", 0);
+    // All other functions of the family act on an editor that this one has created, so only it loads the
+    // module. The module has documents but no windows so far.
+    return barrier<TONEWRIGHT_WindowHandle>(0, [] {
+        ced::getLibrary();
+        return notAvailable<TONEWRIGHT_WindowHandle>("TONEWRIGHT_CreateCoverEditorHandle", 0);
+    });
 }
 
 void TONEWRIGHT_ReleaseCoverEditorHandle(TONEWRIGHT_WindowHandle) {
