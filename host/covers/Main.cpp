@@ -47,11 +47,9 @@ template <class Options> void addFile(CLI::App& command, Options& options) {
         ->option_text(" ");
 }
 
-template <class Options> void addFileNames(CLI::App& command, Options& options) {
-    command.add_flag(
-        "--file-names", options.hasFileNames,
-        tr("host.help.covers.fileNames",
-           "Exported projects: take pictures from the files that they name, and do not store them again"));
+template <class Options>
+void addFileNames(CLI::App& command, Options& options, const std::string& description) {
+    command.add_flag("--file-names", options.hasFileNames, description);
 }
 
 void addInfo(CLI::App& app, Run& run) {
@@ -88,9 +86,9 @@ void addRender(CLI::App& app, Run& run) {
     command
         ->add_option("--target", options->target,
                      tr("host.help.covers.render.target",
-                        "What the design is for, such as disc, or its number from 1 to 6: dvd-case, booklet, "
-                        "slim-case, "
-                        "jewel-case, blu-ray-case, disc (default: the first that has a design)"))
+                        "What the design is for: dvd-case, booklet, slim-case, jewel-case, blu-ray-case or "
+                        "disc, or the\n"
+                        "number 1 to 6 in this order (default: the first that has a design)"))
         ->option_text("NAME");
     command
         ->add_option(
@@ -100,7 +98,9 @@ void addRender(CLI::App& app, Run& run) {
         ->check(CLI::Range(1, 100000));
     command->add_flag("--grey", options->isGrey,
                       tr("host.help.covers.render.grey", "Paint in shades of grey"));
-    addFileNames(*command, *options);
+    addFileNames(*command, *options,
+                 tr("host.help.covers.render.fileNames",
+                    "Take pictures of an exported project from the files that it names"));
     command->add_flag("-f,--force", options->force, tr("host.help.forceOne", "Replace an existing file"));
     command->callback([options, dpi, &run] {
         if (dpi->count() > 0 && options->output.extension() != ".png")
@@ -125,7 +125,10 @@ void addConvert(CLI::App& app, Run& run) {
     command->add_flag(
         "--lossless", options->isLossless,
         tr("host.help.covers.convert.lossless", "Store pictures of a project as PNG instead of JPEG"));
-    addFileNames(*command, *options);
+    addFileNames(*command, *options,
+                 tr("host.help.covers.convert.fileNames",
+                    "Exported projects: take pictures from the files that they "
+                    "name, and do not store those that exist"));
     command->add_flag("-f,--force", options->force, tr("host.help.forceOne", "Replace an existing file"));
     command->callback([options, &run] {
         if (options->isLossless && options->output.extension() != ".cedprj")

@@ -55,8 +55,8 @@ std::optional<ItemType> ItemTypeFromXml(std::string_view text) {
 
 std::string ItemTypeToStr(ItemType type) {
     const SItem* const item = findItem(type);
-    return peru::CString::toStdString(
-        peru::localize(item ? item->key : "ced.ItemType.Unknown", item ? item->text : "Unknown"));
+    return peru::CString::toStdString(item ? peru::localize(item->key, item->text)
+                                           : peru::localize("ced.ItemType.Unknown", "Unknown"));
 }
 
 std::vector<ItemType> getItemTypes(TargetType target) {

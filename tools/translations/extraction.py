@@ -8,7 +8,10 @@ import re
 from dataclasses import dataclass, field
 
 SUFFIXES = {".cpp", ".h"}
-KEY = re.compile(r"(?:peru|sonora2|filetag|freedb|disciopp|tonewright|zvr_lang|host)(?:\.[A-Za-z0-9_]+)+")
+KEY = re.compile(
+    r"(?:peru|sonora2|filetag|freedb|disciopp|tonewright|zvr_lang|host|graphics|ced"
+    r"|CGraphicShape|CFreeForm[A-Za-z]*)(?:\.[A-Za-z0-9_]+)+"
+)
 TOKEN = re.compile(
     r"""//[^\n]*|/\*.*?\*/            # comments
       | R"(?P<tag>[^(\s]*)\(.*?\)(?P=tag)"
