@@ -85,6 +85,7 @@ TEST(BufferedIOStream, ReturnsBytesInOrderAcrossBlocks) {
             stream->write(bytes, size);
         } else {
             const int64_t available = stream->getAvailable();
+            ASSERT_EQ(stream->isAtEnd(), available == 0);
             ASSERT_EQ(stream->readSome(bytes, size), std::min(size, available));
             for (int64_t k = 0; k < std::min(size, available); ++k) ASSERT_EQ(bytes[k], expected++);
         }
