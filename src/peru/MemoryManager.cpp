@@ -9,6 +9,7 @@
 #include <cstring>
 #include <limits>
 #include <new>
+#include <utility>
 
 namespace peru {
 
@@ -65,9 +66,10 @@ void CMemoryBlockBase::readFrom(const P<IDataInStream>& stream) {
     const int64_t size = stream->readInt32();
     if (size < 0) throw CEndOfStreamError(stream->getURI());
     setSize(0);
+    prepareRead(size);
     while (m_size < size) {
         const int64_t done = m_size;
-        const int64_t step = std::min(size - done, std::max(done, kStep));
+        const int64_t step = std::min(size - done, std::max({done, kStep, m_capacity - done}));
         setSize(done + step);
         stream->read(m_data + done, step);
     }
@@ -91,6 +93,17 @@ void CCachedMemoryBlock::destroy() {
         CMemoryBlockBase::destroy();
 }
 
+// A block of unknown size is created small. Growing it while it is read would copy what has arrived again and
+// again, into memory that is new to the processor.
+void CCachedMemoryBlock::prepareRead(int64_t size) {
+    if (size <= m_capacity) return;
+    CCachedMemoryBlock* const larger = m_manager->takeFree(size);
+    if (!larger) return;
+    std::swap(m_data, larger->m_data);
+    std::swap(m_capacity, larger->m_capacity);
+    m_manager->takeBack(larger);
+}
+
 CMemoryManager::CMemoryManager(int cachedBlocks)
     : m_cachedBlocks(cachedBlocks), m_mutex(getMutexFactory()->createMutex()) {}
 
@@ -102,32 +115,38 @@ CMemoryManager::~CMemoryManager() {
         }
 }
 
+int64_t CMemoryManager::getClassCapacity(int64_t size) {
+    return static_cast<int64_t>(std::bit_ceil(static_cast<uint64_t>(std::max(size, kSmallestBlock))));
+}
+
 P<IMemoryBlock> CMemoryManager::getBlock(int64_t size) {
     if (size < 0) throw CInvalidArgError("size", "CMemoryManager::getBlock");
     if (size > kLargestCachedBlock) return make<CMemoryBlock>(size);
 
-    const uint64_t capacity = std::bit_ceil(static_cast<uint64_t>(std::max(size, kSmallestBlock)));
-    SFreeList& list = m_free[static_cast<size_t>(std::countr_zero(capacity / kSmallestBlock))];
-    CCachedMemoryBlock* block = nullptr;
-    {
-        CMutexLock lock(m_mutex);
-        block = list.first;
-        if (block) {
-            list.first = block->m_next;
-            --list.count;
-        }
-    }
     const P<CMemoryManager> self = P<CMemoryManager>::share(this);
+    CCachedMemoryBlock* block = takeFree(size);
     if (block) {
         block->resetCount();
-        block->m_next = nullptr;
         block->m_manager = self;
     } else {
-        block = new CCachedMemoryBlock(self, static_cast<int64_t>(capacity));
+        block = new CCachedMemoryBlock(self, getClassCapacity(size));
     }
     P<IMemoryBlock> result(block);
     result->setSize(size);
     return result;
+}
+
+// Null if the free lists have no block of that class.
+CCachedMemoryBlock* CMemoryManager::takeFree(int64_t size) {
+    if (size > kLargestCachedBlock) return nullptr;
+    const auto classes = static_cast<uint64_t>(getClassCapacity(size) / kSmallestBlock);
+    SFreeList& list = m_free[static_cast<size_t>(std::countr_zero(classes))];
+    const CMutexLock lock(m_mutex);
+    CCachedMemoryBlock* const block = list.first;
+    if (!block) return nullptr;
+    list.first = std::exchange(block->m_next, nullptr);
+    --list.count;
+    return block;
 }
 
 void CMemoryManager::takeBack(CCachedMemoryBlock* block) {

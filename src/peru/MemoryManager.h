@@ -42,6 +42,9 @@ public:
 
 protected:
     explicit CMemoryBlockBase(int64_t capacity);
+    // Called before a read of that many bytes, of which perhaps none arrive: may enlarge the capacity of the
+    // empty block by memory that is in stock, but allocates none.
+    virtual void prepareRead(int64_t) {}
 
     uint8_t* m_data = nullptr;
     int64_t m_size = 0;
@@ -62,6 +65,9 @@ public:
     ~CCachedMemoryBlock() override;
     void destroy() override;
 
+protected:
+    void prepareRead(int64_t size) override;
+
 private:
     friend class CMemoryManager;
     CCachedMemoryBlock(const P<CMemoryManager>& manager, int64_t capacity);
@@ -80,6 +86,8 @@ public:
 
 private:
     friend class CCachedMemoryBlock;
+    static int64_t getClassCapacity(int64_t size);
+    CCachedMemoryBlock* takeFree(int64_t size);
     void takeBack(CCachedMemoryBlock* block);
 
     // Powers of two from 64 bytes to 16 MiB. Larger blocks are rare and go back to the system.

@@ -1,9 +1,11 @@
 #include "peru/MemoryManager.h"
 #include "peru/Errors.h"
 #include "peru/streams/BufferedIOStream.h"
+#include "peru/streams/DataStreams.h"
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <atomic>
 #include <cstring>
 #include <random>
@@ -53,6 +55,29 @@ TEST(MemoryManager, GrownBlockServesTheClassItCanFill) {
     manager = nullptr;
     std::memset(block->getData(), 1, 1024);
     block = nullptr; // destroys the manager and the cached block
+}
+
+TEST(MemoryManager, ReadingUsesABlockInStockOrGrowsAsBytesArrive) {
+    const P<CMemoryManager> manager = make<CMemoryManager>();
+    constexpr int32_t kSize = 300'000;
+    const auto read = [&](int32_t stated, int32_t sent) {
+        const P<CBufferedIOStream> stream = make<CBufferedIOStream>(make<CMemoryManager>());
+        stream->write(&stated, sizeof stated);
+        const std::string bytes(static_cast<size_t>(sent), 'x');
+        stream->write(bytes.data(), sent);
+        P<IMemoryBlock> block = manager->getBlock(1);
+        if (stated == sent)
+            block->readFrom(make<CDataInStream>(stream));
+        else
+            EXPECT_THROW(block->readFrom(make<CDataInStream>(stream)), CEndOfStreamError);
+        return block;
+    };
+    EXPECT_LT(read(1 << 30, 100)->getCapacity(), 1 << 20);
+    const uint8_t* stock = manager->getBlock(kSize)->getData();
+    const P<IMemoryBlock> block = read(kSize, kSize);
+    EXPECT_EQ(block->getData(), stock);
+    EXPECT_EQ(std::count(stock, stock + block->getSize(), 'x'), kSize);
+    EXPECT_EQ(read(kSize, kSize)->getSize(), kSize); // nothing in stock
 }
 
 TEST(MemoryManager, IsSafeFromAnyThread) {

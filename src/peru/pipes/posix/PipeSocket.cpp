@@ -230,8 +230,24 @@ bool CPipeSocket::waitForData(uint32_t milliseconds) {
     return wait(m_readWait, POLLIN, milliseconds) == EWait::ready && isOpen();
 }
 
+// A write that the socket's buffer cannot hold makes the two processes wait for each other several times. The
+// buffer stays small until such a write, since bytes in it hide from the writer how far behind the reader is.
+void CPipeSocket::makeRoom(const SPipePart* parts, size_t count) {
+    constexpr int64_t kLargeWrite = 1 << 20;
+    constexpr int64_t kMostRoom = 4 << 20;
+    int64_t bytes = 0;
+    for (size_t i = 0; i < count; ++i) bytes += parts[i].size;
+    bytes = std::min(bytes, kMostRoom);
+    if (bytes < kLargeWrite || bytes <= m_room) return;
+    m_room = bytes;
+    const int size = static_cast<int>(bytes);
+    // The system may grant less, and writing then takes more steps.
+    static_cast<void>(::setsockopt(getDescriptor(), SOL_SOCKET, SO_SNDBUF, &size, sizeof size));
+}
+
 void CPipeSocket::write(const SPipePart* parts, size_t count) {
     requireOpen();
+    makeRoom(parts, count);
     constexpr size_t kBatch = 16;
     std::array<iovec, kBatch> blocks;
     size_t part = 0;

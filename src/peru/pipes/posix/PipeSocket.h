@@ -75,6 +75,7 @@ private:
     void waitToRead();
     EWait wait(const CWait& wait, short events, std::optional<uint32_t> milliseconds) const;
     void requireOpen() const;
+    void makeRoom(const SPipePart* parts, size_t count);
 
     // Small reads take their bytes from here, so that a message costs one system call. Only the reading
     // thread uses the buffer; others only see how many bytes are in it.
@@ -83,6 +84,8 @@ private:
     int64_t m_bufferStart = 0;
     std::atomic<int64_t> m_buffered{0};
     std::atomic<int64_t> m_taken{0};
+
+    int64_t m_room = 0; // that was asked for; used by the writing thread only
 
     CFileHandle m_socket;
     std::atomic<int> m_descriptor{-1}; // of m_socket, for threads that do not attach it
