@@ -1,4 +1,6 @@
 // Pictures of video files, compared with another program's.
+#include "peru/streams/BufferedIOStream.h"
+#include "peru/streams/DataStreams.h"
 #include "plugins/AvFixture.h"
 #include "sonora2/media/ISonoraPicture.h"
 #include "sonora2/media/IVideoSource.h"
@@ -54,6 +56,13 @@ protected:
         }
         return bytes;
     }
+    static std::string wireOf(const P<ISonoraPicture>& picture) {
+        const auto stream = peru::make<peru::CBufferedIOStream>(peru::make<peru::CMemoryManager>());
+        picture->writeTo(peru::make<peru::CDataOutStream>(stream));
+        std::string bytes(static_cast<size_t>(stream->getAvailable()), '\0');
+        stream->read(bytes.data(), stream->getAvailable());
+        return bytes;
+    }
 };
 
 TEST_F(AvVideo, Pictures_AreThoseOfAnotherProgram) {
@@ -76,7 +85,9 @@ TEST_F(AvVideo, Pictures_AreThoseOfAnotherProgram) {
             ASSERT_TRUE(picture);
             EXPECT_EQ(row.type, picture->getPictureType());
             EXPECT_EQ(times.back(), picture->getTimestamp());
+            const std::string untouched = wireOf(picture);
             pictures.push_back(bytesOf(picture));
+            EXPECT_TRUE(untouched == wireOf(picture));
             all += pictures.back();
         }
         EXPECT_FALSE(source->getNextPicture());

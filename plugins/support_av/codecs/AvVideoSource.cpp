@@ -10,7 +10,6 @@
 
 extern "C" {
 #include <libavutil/cpu.h>
-#include <libavutil/imgutils.h>
 }
 
 #include <algorithm>
@@ -77,7 +76,8 @@ void CAvVideoSource::openCodec() {
     if (!m_packet || !m_frame) throw std::bad_alloc();
     m_codec = m_demuxer->createCodec();
     m_codec->max_pixels = kMaxPixels;
-    m_codec->thread_count = std::min(av_cpu_count(), kMaxThreads);
+    // One more than there are processors: a thread whose picture is delivered is idle until the next request.
+    m_codec->thread_count = std::min(av_cpu_count() + 1, kMaxThreads);
     if (const int error = avcodec_open2(m_codec.get(), nullptr, nullptr); error < 0)
         failToOpen(m_file, describe(error));
     m_flushed = false;
@@ -225,37 +225,50 @@ bool CAvVideoSource::sendPacket() {
     return true;
 }
 
+// The frame is moved into the block if it has the wanted layout and size already.
+P<peru::IMemoryBlock> CAvVideoSource::makeBlock(AVPixelFormat format,
+                                                const std::vector<CFrameBlock::SPlane>& planes) {
+    const P<peru::IMemoryManager> memory = m_context->getMemoryManager();
+    if (m_frame->format == format && m_frame->width == m_width && m_frame->height == m_height) {
+        Frame frame(av_frame_alloc());
+        if (!frame) throw std::bad_alloc();
+        av_frame_move_ref(frame.get(), m_frame.get());
+        return peru::make<CFrameBlock>(memory, std::move(frame), planes);
+    }
+    int64_t bytes = 0;
+    std::array<int64_t, 4> offsets{};
+    std::array<int, 4> pitches{};
+    for (const CFrameBlock::SPlane& plane : planes) {
+        offsets[static_cast<size_t>(plane.index)] = bytes;
+        pitches[static_cast<size_t>(plane.index)] = plane.rowBytes;
+        bytes += int64_t{plane.rowBytes} * plane.rows;
+    }
+    P<peru::IMemoryBlock> block = memory->getBlock(bytes);
+    std::array<uint8_t*, 4> data{};
+    for (size_t i = 0; i < planes.size(); ++i) data[i] = block->getData() + offsets[i];
+    scale(format, data.data(), pitches.data());
+    return block;
+}
+
 P<common::ISonoraPicture> CAvVideoSource::makePicture() {
     const P<peru::IMemoryManager> memory = m_context->getMemoryManager();
     const double time = m_nextTime - m_origin - m_startTime;
     const int width = m_width, height = m_height;
-    const auto getBlock = [&](int64_t bytes) { return memory->getBlock(bytes); };
     switch (chooseLayout(*m_frame, width, height)) {
-    case AV_PIX_FMT_NV12: {
-        const P<peru::IMemoryBlock> block = getBlock(common::CNV12Picture::getBlockBytes(width, height));
-        uint8_t* const luma = block->getData();
-        scale(AV_PIX_FMT_NV12, std::array<uint8_t*, 4>{luma, luma + int64_t{width} * height}.data(),
-              std::array<int, 4>{width, width}.data());
-        return peru::make<common::CNV12Picture>(memory, time, width, height, false, block);
-    }
-    case AV_PIX_FMT_YUV420P: {
-        const P<peru::IMemoryBlock> block = getBlock(common::CYV12Picture::getBlockBytes(width, height));
-        uint8_t* const luma = block->getData();
-        uint8_t* const v = luma + int64_t{width} * height;
-        scale(AV_PIX_FMT_YUV420P, std::array<uint8_t*, 4>{luma, v + int64_t{width} * height / 4, v}.data(),
-              std::array<int, 4>{width, width / 2, width / 2}.data());
-        return peru::make<common::CYV12Picture>(memory, time, width, height, false, block);
-    }
-    case AV_PIX_FMT_YUYV422: {
-        const P<peru::IMemoryBlock> block = getBlock(common::CYUY2Picture::getBlockBytes(width, height));
-        scale(AV_PIX_FMT_YUYV422, std::array<uint8_t*, 4>{block->getData()}.data(),
-              std::array<int, 4>{width * 2}.data());
-        return peru::make<common::CYUY2Picture>(memory, time, width, height, false, block);
-    }
+    case AV_PIX_FMT_NV12:
+        return peru::make<common::CNV12Picture>(
+            memory, time, width, height, false,
+            makeBlock(AV_PIX_FMT_NV12, {{0, width, height}, {1, width, height / 2}}));
+    case AV_PIX_FMT_YUV420P: // the block has V before U
+        return peru::make<common::CYV12Picture>(
+            memory, time, width, height, false,
+            makeBlock(AV_PIX_FMT_YUV420P,
+                      {{0, width, height}, {2, width / 2, height / 2}, {1, width / 2, height / 2}}));
+    case AV_PIX_FMT_YUYV422:
+        return peru::make<common::CYUY2Picture>(memory, time, width, height, false,
+                                                makeBlock(AV_PIX_FMT_YUYV422, {{0, width * 2, height}}));
     default: {
-        const P<peru::IMemoryBlock> block = getBlock(common::CRGBPicture::getBlockBytes(width, height));
-        scale(AV_PIX_FMT_BGRA, std::array<uint8_t*, 4>{block->getData()}.data(),
-              std::array<int, 4>{width * 4}.data());
+        const P<peru::IMemoryBlock> block = makeBlock(AV_PIX_FMT_BGRA, {{0, width * 4, height}});
         auto* const pixels = reinterpret_cast<uint32_t*>(block->getData());
         const int64_t count = int64_t{width} * height;
         for (int64_t i = 0; i < count; ++i) pixels[i] |= 0xFF000000u; // pictures are opaque
@@ -266,12 +279,6 @@ P<common::ISonoraPicture> CAvVideoSource::makePicture() {
 
 void CAvVideoSource::scale(AVPixelFormat format, uint8_t* const planes[], const int pitches[]) {
     const auto own = static_cast<AVPixelFormat>(m_frame->format);
-    if (own == format && m_frame->width == m_width && m_frame->height == m_height) {
-        av_image_copy(const_cast<uint8_t**>(planes), const_cast<int*>(pitches),
-                      const_cast<const uint8_t**>(m_frame->data), m_frame->linesize, format, m_width,
-                      m_height);
-        return;
-    }
     m_scaler.reset(sws_getCachedContext(m_scaler.release(), m_frame->width, m_frame->height, own, m_width,
                                         m_height, format, SWS_BICUBIC | SWS_ACCURATE_RND, nullptr, nullptr,
                                         nullptr));

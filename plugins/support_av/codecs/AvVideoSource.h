@@ -2,9 +2,12 @@
 #pragma once
 
 #include "codecs/Demuxer.h"
+#include "codecs/FrameBlock.h"
 #include "sonora2/context/ISonoraContext.h"
 #include "sonora2/media/ISonoraPicture.h"
 #include "sonora2/media/IVideoSource.h"
+
+#include <vector>
 
 namespace sonora2::plugins::av {
 
@@ -51,7 +54,8 @@ private:
     bool sendPacket();
     bool goTo(double time, double from);
     void requireOpened() const;
-    P<common::ISonoraPicture> makePicture();
+    P<common::ISonoraPicture> makePicture(); // readNext() has to follow
+    P<peru::IMemoryBlock> makeBlock(AVPixelFormat format, const std::vector<CFrameBlock::SPlane>& planes);
     void scale(AVPixelFormat format, uint8_t* const planes[], const int pitches[]);
 
     const P<common::ISonoraContext> m_context;
