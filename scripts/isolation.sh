@@ -5,6 +5,7 @@
 #   faults   a plug-in commits every fault in every operation
 #   damage   containers are cut off at 20 places and changed at random 100 times
 #   speed    boxed decoding of sound and video compared with plain decoding
+#   start    time from the start of a slave to its first answer, and what the dynamic loader takes of it
 # The host must survive, and nothing of the slaves may be left. For a machine with nothing else to do.
 # PARTS selects among them: PARTS="kills damage" scripts/isolation.sh
 set -euo pipefail
@@ -12,14 +13,14 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 preset=${1:-release}
 count=${2:-1000}
-parts=${PARTS:-kills jobs faults damage speed}
+parts=${PARTS:-kills jobs faults damage speed start}
 bin=build/$preset/bin
 
 wants() { [[ " $parts " == *" $1 "* ]]; }
 
 targets=(isolation_tests)
 if wants damage; then targets+=(plugins_tests); fi
-if wants speed; then targets+=(sonora2_bench); fi
+if wants speed || wants start; then targets+=(sonora2_bench); fi
 cmake --build --preset "$preset" --target "${targets[@]}"
 
 if wants kills; then
@@ -38,4 +39,15 @@ fi
 if wants speed; then
     "$bin/sonora2_bench" --benchmark_filter='plain|boxed' --benchmark_repetitions=5 \
         --benchmark_report_aggregates_only=true
+fi
+if wants start; then
+    "$bin/sonora2_bench" --benchmark_filter=startSlave --benchmark_repetitions=20 \
+        --benchmark_report_aggregates_only=true
+    # Ends at once, without arguments: what is left is the loading of the libraries.
+    loaded=$(for _ in {1..20}; do
+        start=${EPOCHREALTIME/./}
+        "$bin/../lib/sonora2_slave" 2>/dev/null || true
+        echo $((${EPOCHREALTIME/./} - start))
+    done | sort -n | sed -n 10p)
+    echo "loading the program and its libraries: $((loaded / 1000)).$(printf %03d $((loaded % 1000))) ms (median)"
 fi
