@@ -245,39 +245,6 @@ void CGraphicTable::ClearCells() {
     DropHitMask();
 }
 
-std::vector<int> CGraphicTable::resizeItemRows(int count) {
-    std::vector<int> rows;
-    for (int row = 0; row < GetRowCount(); ++row)
-        if (GetRow(row).contentId.empty()) rows.push_back(row);
-    while (static_cast<int>(rows.size()) > count) {
-        DeleteRows(rows.back(), 1);
-        rows.pop_back();
-    }
-    while (static_cast<int>(rows.size()) < count) {
-        const int row = rows.empty() ? GetRowCount() : rows.back() + 1;
-        InsertRows(row, 1);
-        // The row before it is the model, not a row with headings behind it.
-        if (!rows.empty()) {
-            GetRow(row).height = GetRow(row - 1).height;
-            for (int col = 0; col < GetColCount(); ++col) GetCell(row, col).copyFormat(GetCell(row - 1, col));
-        }
-        rows.push_back(row);
-    }
-    return rows;
-}
-
-void CGraphicTable::FillFromContent(int itemCount, const GetContentValue& getValue) {
-    const std::vector<int> rows = resizeItemRows(std::max(1, itemCount));
-    for (int item = 0; item < static_cast<int>(rows.size()); ++item)
-        for (int col = 0; col < GetColCount(); ++col) {
-            const std::string& id = GetCol(col).contentId;
-            if (id.empty()) continue;
-            const int row = rows[static_cast<size_t>(item)];
-            SetCellText(row, col,
-                        makeRichTextLike(GetCell(row, col).text, item < itemCount ? getValue(id, item) : ""));
-        }
-}
-
 bool CGraphicTable::HasText() const {
     return std::any_of(m_cells.begin(), m_cells.end(), [](const auto& line) {
         return std::any_of(line.begin(), line.end(),

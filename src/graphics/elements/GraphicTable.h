@@ -4,8 +4,6 @@
 #include "graphics/elements/GraphicElement.h"
 #include "graphics/elements/RichText.h"
 
-#include <functional>
-
 namespace graphics {
 
 class CLayoutCache;
@@ -113,14 +111,6 @@ public:
     // Drops the texts; the format remains.
     void ClearCells();
 
-    // A value of an item, by the content id of a column.
-    using GetContentValue = std::function<std::string(const std::string& contentId, int item)>;
-    // Fills the columns that have a content id, one row for each item. Rows with a content id of their own,
-    // such as the one with the headings, stay as they are. Missing rows are added with the format of the last
-    // one, and those beyond the items are removed; without items, one empty row remains, so the format is not
-    // lost.
-    void FillFromContent(int itemCount, const GetContentValue& getValue);
-
     // Whether a cell has a character or an image.
     bool HasText() const;
     // Of the visible columns and of the rows, in millimetres, before they are scaled to the box.
@@ -132,8 +122,6 @@ protected:
 
 private:
     void checkRange(const char* method, int index, int count, int size) const;
-    // Removes or adds rows at the end of the item rows; returns the indices of the item rows.
-    std::vector<int> resizeItemRows(int count);
 
     std::vector<P<CRow>> m_rows;
     std::vector<P<CCol>> m_cols;

@@ -1,3 +1,4 @@
+#include "ced/GraphicTableContent.h"
 #include "graphics/Elements.h"
 #include "graphics/painting/DocumentRenderer.h"
 #include "graphics/text/RichTextParser.h"
@@ -199,8 +200,10 @@ TEST(GraphicTable, IsPaintedWithoutHiddenColumns) {
     EXPECT_GT(paint(label).area, 5);
 }
 
-TEST(GraphicTable, IsFilledFromContent) {
-    const auto table = peru::make<CGraphicTable>();
+TEST(GraphicTableContent, IsFilledFromContent) {
+    const auto factory = peru::make<ced::CGraphicElementFactory>();
+    EXPECT_FALSE(factory->CreateElement("unknown"));
+    const auto table = P<ced::CGraphicTableContent>(factory->CreateElement("table-content"));
     table->InsertCols(0, 3);
     table->InsertRows(0, 2);
     EXPECT_EQ(table->GetHint(), "Double click to edit!");
@@ -237,6 +240,9 @@ TEST(GraphicTable, IsFilledFromContent) {
         }
     }
     EXPECT_EQ(table->GetCol(2).width, 20);
+    const auto clone = table->Clone();
+    EXPECT_EQ(clone->GetTypeName(), "table-content");
+    EXPECT_TRUE(peru::tryCast<ced::CGraphicTableContent>(clone));
     EXPECT_THROW(table->SetColWidth(0, -1), peru::CInvalidArgError);
     EXPECT_THROW(table->SetRowHeight(0, std::nan("")), peru::CInvalidArgError);
 }
