@@ -11,6 +11,10 @@ namespace graphics {
 // unit.
 inline constexpr double kUnitsPerMillimetre = 100;
 
+// Bounds on what a damaged file can ask for; the rest of a longer text is left out.
+inline constexpr size_t kMaximalText = 1'000'000; // bytes
+inline constexpr size_t kMaximalLines = 10'000;
+
 struct SUnref {
     void operator()(void* object) const { g_object_unref(object); }
 };
@@ -36,6 +40,7 @@ struct CTextLayout::SImpl {
     std::vector<SBlock> blocks; // lines and bullets
     double width = 0;           // units, as the height
     double height = 0;
+    size_t textLeft = kMaximalText; // bytes that may still be laid out
 };
 
 // For layouts without hinting, so that extents do not vary with the scale.

@@ -31,7 +31,7 @@ std::unique_ptr<wxRichTextBuffer> toRichTextBuffer(const CRichText& text) {
     buffer->GetAttributes().GetTextBoxAttr().GetMargins().Reset();
     if (!wxRichTextXMLHandler().LoadFile(buffer.get(), stream))
         throw peru::CParseError(
-            peru::localize("graphics.RichTextBuffer.NotRead", "The text is not rich text of a known form."));
+            peru::localize("graphics.RichText.NotRead", "The text is not rich text of a known form."));
     return buffer;
 }
 
@@ -39,9 +39,7 @@ P<CRichText> fromRichTextBuffer(wxRichTextBuffer& buffer) {
     addImageHandler();
     const wxLogNull quiet;
     wxMemoryOutputStream stream;
-    if (!wxRichTextXMLHandler().SaveFile(&buffer, stream))
-        throw peru::CError(
-            peru::localize("graphics.RichTextBuffer.NotWritten", "The rich text could not be written."));
+    if (!wxRichTextXMLHandler().SaveFile(&buffer, stream)) throwNotWritten();
     std::string xml(stream.GetSize(), '\0');
     stream.CopyTo(xml.data(), xml.size());
     return peru::make<CRichText>(std::move(xml));

@@ -22,6 +22,7 @@ constexpr double kSmallCapitalsScale = 0.75;
 constexpr double kMillimetresPerPixel = 25.4 / 96;
 constexpr double kMaximalLength = 10000; // millimetres
 constexpr size_t kMaximalTabs = 1000;
+constexpr size_t kMaximalParagraphs = 10'000; // as many as lines are laid out
 
 enum ETextEffect : int {
     kCapitals = 0x1,
@@ -253,6 +254,7 @@ void readParagraph(const wxXmlNode& node, const SStyle& style, std::vector<SPara
 
 void readParagraphs(const wxXmlNode& node, const SStyle& inherited, std::vector<SParagraph>& paragraphs) {
     for (const wxXmlNode* child = node.GetChildren(); child; child = child->GetNext()) {
+        if (paragraphs.size() >= kMaximalParagraphs) return;
         if (child->GetType() != wxXML_ELEMENT_NODE) continue;
         const wxString& name = child->GetName();
         if (name == "paragraph")

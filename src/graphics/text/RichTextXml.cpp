@@ -1,13 +1,17 @@
 #include "graphics/text/RichTextXml.h"
 
 #include "peru/Errors.h"
-#include "peru/strings/String.h"
+#include "peru/strings/IStringLocalizer.h"
 #include "peru/xml/XmlDocument.h"
 
 #include <wx/log.h>
 #include <wx/mstream.h>
 
 namespace graphics {
+
+void throwNotWritten() {
+    throw peru::CError(peru::localize("graphics.RichText.NotWritten", "The rich text could not be written."));
+}
 
 std::unique_ptr<wxXmlDocument> parseXml(const CRichText& text) {
     const std::string& xml = text.GetXml();
@@ -17,14 +21,14 @@ std::unique_ptr<wxXmlDocument> parseXml(const CRichText& text) {
     wxMemoryInputStream stream(xml.data(), xml.size());
     auto document = std::make_unique<wxXmlDocument>();
     if (!document->Load(stream) || !document->GetRoot())
-        throw peru::CParseError(peru::CString::fromUTF8("invalid rich text"));
+        throw peru::CParseError(peru::localize("graphics.RichText.Damaged", "The rich text is damaged."));
     return document;
 }
 
 std::string printXml(const wxXmlDocument& document) {
     const wxLogNull quiet;
     wxMemoryOutputStream stream;
-    if (!document.Save(stream)) throw peru::CError("The rich text cannot be written.");
+    if (!document.Save(stream)) throwNotWritten();
     std::string xml(stream.GetSize(), '\0');
     stream.CopyTo(xml.data(), xml.size());
     return xml;

@@ -12,7 +12,9 @@ namespace graphics {
 // Unlike our own documents, the tree keeps all white space inside of texts. Throws CParseError if the text is
 // not well-formed or exceeds the limits of IXmlDocument.
 std::unique_ptr<wxXmlDocument> parseXml(const CRichText& text);
+// Throws CError.
 std::string printXml(const wxXmlDocument& document);
+[[noreturn]] void throwNotWritten();
 
 // UTF-8; empty if the node lacks the attribute.
 std::string getAttribute(const wxXmlNode& node, const char* name);

@@ -102,12 +102,20 @@ private:
 
     // Text without line breaks.
     void addText(Runs& runs) {
-        for (STextRun& run : runs) prepareText(run);
+        size_t size = 0;
+        for (STextRun& run : runs) {
+            prepareText(run);
+            size += run.text.size();
+        }
+        if (size > m_target.textLeft) m_target.textLeft = 0;
+        if (m_target.textLeft == 0 || m_target.blocks.size() >= kMaximalLines) return;
+        m_target.textLeft -= size;
         Layout layout = makeLayout(runs);
         if (!(m_width > 0)) return addLine(std::move(layout), false);
         const auto ends = breakLines(layout.get(), getRoom(m_isFirst), getRoom(false), m_tabs);
         if (ends.size() == 1) return addLine(std::move(layout), false);
-        for (size_t i = 0, begin = 0; i < ends.size(); begin = ends[i++]) {
+        for (size_t i = 0, begin = 0; i < ends.size() && m_target.blocks.size() < kMaximalLines;
+             begin = ends[i++]) {
             Runs line = cut(runs, begin, ends[i]);
             const bool isJustified =
                 m_paragraph.alignment == ETextAlignment::justified && i + 1 < ends.size();

@@ -19,6 +19,7 @@ struct STextLine {
 
 // Lines are broken in millimetres, with metrics that do not depend on any device, so they are the same on
 // every screen and on paper. A word that is wider than the line is broken between characters.
+// Only the first 10,000 lines and million bytes are laid out.
 class GRAPHICS_API CTextLayout {
 public:
     // `width` 0: one line for each paragraph, without its indents. Colours and images pass through the

@@ -17,6 +17,7 @@ namespace graphics {
 namespace {
 
 constexpr SColour kHintColour{128, 128, 128, 255};
+constexpr size_t kMaximalCircleText = 5000; // characters; a circle has room for far fewer
 
 std::vector<SParagraph> makeLine(const std::string& text, const SFont& font, const SColour& colour,
                                  ETextAlignment alignment = ETextAlignment::left) {
@@ -81,10 +82,11 @@ std::vector<SGlyph> splitGlyphs(const std::vector<SParagraph>& paragraphs, EEffe
         glyphs.push_back({std::move(layout), width});
     };
     for (const SParagraph& paragraph : paragraphs) {
+        if (glyphs.size() > kMaximalCircleText) break;
         // Paragraphs follow each other on the circle.
         if (!glyphs.empty() && !paragraph.runs.empty()) add(" ", paragraph.runs[0]);
         for (const STextRun& run : paragraph.runs)
-            for (const std::string& text : splitCharacters(run.text))
+            for (const std::string& text : splitCharacters(run.text.substr(0, kMaximalCircleText)))
                 add(text == "\n" || text == "\t" ? " " : text, run);
     }
     return glyphs;
