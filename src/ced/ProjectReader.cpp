@@ -6,7 +6,6 @@
 #include "graphics/storage/XmlValues.h"
 #include "peru/Errors.h"
 #include "peru/streams/IStreamManager.h"
-#include "peru/streams/StreamTools.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/system/IPathes.h"
 
@@ -35,7 +34,9 @@ std::string readFile(const P<peru::IURI>& file) {
     const auto stream = peru::getStreamManager()->getSeekableInStream(file);
     if (stream->getSize() > kMaximalFile)
         throw peru::CFileError(peru::localize("ced.CProject.TooLarge", "The file is too large."), file);
-    return peru::readAll(*stream);
+    std::string bytes(static_cast<size_t>(stream->getSize()), '\0');
+    stream->read(bytes.data(), static_cast<int64_t>(bytes.size()));
+    return bytes;
 }
 
 // A name that leads out of a folder would be dangerous for whoever unpacks the archive.

@@ -16,6 +16,9 @@ EBitmapFormat chooseFormat(const CBitmap& bitmap, const std::string& sourceFileN
 P<CBitmap> tryLoadBitmap(EBitmapFormat format, std::string bytes, const std::string& source,
                          IResourceInputStore& store) {
     try {
+        if (format == EBitmapFormat::none)
+            throw peru::CError(
+                peru::localize("graphics.Attachment.UnknownFormat", "The picture has an unknown format."));
         return peru::make<CBitmap>(format, std::move(bytes));
     } catch (const peru::CException& error) {
         reportAttachment(store, source, error);

@@ -17,9 +17,9 @@ namespace {
 
 constexpr int kCompressionLevel = 9;
 // The tree of a document takes several times the memory of its text.
-constexpr size_t kMaximalXml = 64 << 20; // bytes, without attachments
-constexpr size_t kMaximalXmlWithAttachments = 512 << 20;
-constexpr int64_t kMaximalMarkup = 4'000'000; // tags and attributes
+constexpr size_t kMaximalXml = 64 << 20;                   // bytes, without attachments
+constexpr size_t kMaximalXmlWithAttachments = 2047u << 20; // what a string can hold
+constexpr int64_t kMaximalMarkup = 4'000'000;              // tags and attributes
 
 bool hasTooMuchMarkup(const std::string& xml) {
     return std::count_if(xml.begin(), xml.end(), [](char ch) { return ch == '<' || ch == '='; }) >

@@ -9,6 +9,7 @@
 #include <wx/log.h>
 #include <wx/mstream.h>
 #include <wx/zipstrm.h>
+#include <zlib.h>
 
 namespace graphics {
 
@@ -37,6 +38,26 @@ void CZipCatalogue::readCatalogue() {
         m_entries.emplace(entry->GetInternalName().utf8_string(), std::move(entry));
 }
 
+std::optional<std::string_view> CZipCatalogue::findStored(const wxZipEntry& entry) const {
+    constexpr size_t kHeader = 30, kNameLength = 26, kExtraLength = 28;
+    const std::string_view archive = m_archive;
+    const auto offset = static_cast<size_t>(entry.GetOffset());
+    const auto size = static_cast<size_t>(entry.GetSize());
+    if (entry.GetMethod() != wxZIP_METHOD_STORE || (entry.GetFlags() & wxZIP_ENCRYPTED) != 0 ||
+        entry.GetCompressedSize() != entry.GetSize() || offset > archive.size() ||
+        archive.size() - offset < kHeader || !archive.substr(offset).starts_with("PK\3\4"))
+        return std::nullopt;
+    const auto readLength = [&](size_t at) -> size_t {
+        return static_cast<uint8_t>(archive[offset + at]) | static_cast<uint8_t>(archive[offset + at + 1])
+                                                                << 8;
+    };
+    const size_t begin = offset + kHeader + readLength(kNameLength) + readLength(kExtraLength);
+    if (begin > archive.size() || size > archive.size() - begin) return std::nullopt;
+    const std::string_view bytes = archive.substr(begin, size);
+    const auto sum = crc32_z(0, reinterpret_cast<const Bytef*>(bytes.data()), bytes.size());
+    return sum == entry.GetCrc() ? std::optional(bytes) : std::nullopt;
+}
+
 bool CZipCatalogue::HasEntry(const std::string& name) {
     readCatalogue();
     return m_entries.count(name) != 0;
@@ -46,9 +67,17 @@ std::string CZipCatalogue::ReadEntry(const std::string& name, int64_t maximalSiz
     if (!HasEntry(name)) fail("graphics.CZipCatalogue.Missing", "The archive has no entry \"%NAME%\".", name);
     m_readEntries.insert(name);
     const wxLogNull quiet;
+    const auto tooLarge = [&] {
+        fail("graphics.CZipCatalogue.TooLarge", "The entry \"%NAME%\" of the archive is too large.", name);
+    };
     const auto damaged = [&] {
         fail("graphics.CZipCatalogue.Damaged", "The entry \"%NAME%\" of the archive is damaged.", name);
     };
+    if (const auto stored = findStored(*m_entries.at(name))) {
+        m_total += static_cast<int64_t>(stored->size());
+        if (static_cast<int64_t>(stored->size()) > maximalSize || m_total > m_maximalTotal) tooLarge();
+        return std::string(*stored);
+    }
     if (!m_zip->OpenEntry(*m_entries.at(name))) damaged();
     // In pieces: the size that the archive announces may be wrong.
     std::string bytes;
@@ -59,9 +88,7 @@ std::string CZipCatalogue::ReadEntry(const std::string& name, int64_t maximalSiz
         const size_t count = m_zip->LastRead();
         bytes.append(buffer.data(), count);
         m_total += static_cast<int64_t>(count);
-        if (static_cast<int64_t>(bytes.size()) > maximalSize || m_total > m_maximalTotal)
-            fail("graphics.CZipCatalogue.TooLarge", "The entry \"%NAME%\" of the archive is too large.",
-                 name);
+        if (static_cast<int64_t>(bytes.size()) > maximalSize || m_total > m_maximalTotal) tooLarge();
         if (m_zip->Eof()) break;
         if (!m_zip->IsOk() || count == 0) damaged();
     }
@@ -104,7 +131,9 @@ P<CBitmap> CZipCatalogue::LoadBitmap(const Node& node, const std::string& key, E
 P<CBitmap> CZipCatalogue::LoadBitmapEntry(const std::string& name, EBitmapFormat format) {
     if (const auto known = m_bitmaps.find(name); known != m_bitmaps.end()) return known->second;
     try {
-        return m_bitmaps[name] = tryLoadBitmap(format, ReadEntry(name), name, *this);
+        const auto bitmap = tryLoadBitmap(format, ReadEntry(name), name, *this);
+        if (!bitmap) m_readEntries.erase(name); // nobody holds its bytes
+        return m_bitmaps[name] = bitmap;
     } catch (const peru::CException& error) {
         reportAttachment(*this, name, error);
         return {};

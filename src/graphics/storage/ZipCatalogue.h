@@ -5,6 +5,7 @@
 #include "graphics/storage/Reusables.h"
 
 #include <memory>
+#include <optional>
 #include <set>
 
 class wxZipEntry;
@@ -45,11 +46,14 @@ public:
     std::string ReadEntry(const std::string& name, int64_t maximalSize = kMaximalEntry);
     // The picture of an entry; empty if it is missing or damaged.
     P<CBitmap> LoadBitmapEntry(const std::string& name, EBitmapFormat format);
-    // Files that nobody has asked for, in the order of their names.
+    // Files that nobody has asked for, or that are no valid pictures, in the order of their names.
     std::vector<std::string> GetUnreadEntries();
 
 private:
     void readCatalogue();
+    // The bytes of an entry that is stored without compression, without the toolkit's stream, which copies
+    // them three times; empty for other entries and for damaged ones.
+    std::optional<std::string_view> findStored(const wxZipEntry& entry) const;
     // The name and the bytes of an attachment; empty if it is missing or damaged.
     bool readAttachment(const P<peru::IXmlNode>& node, const std::string& key, std::string& name,
                         std::string& bytes);
