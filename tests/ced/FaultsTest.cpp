@@ -172,6 +172,9 @@ TEST(ProjectFaults, ErrorsNameTheEntryOrElement) {
         {makeArchive({{"project.xml", attached}, {"image3.png", large}}), "image3.png.*too large"},
         {image("<attachment-bitmap extension=\"jpg\"><base64>?</base64></attachment-bitmap>"),
          "attachment-bitmap.*base64"},
+        {"<project><disc><item><graphic-document><image "
+         "filename=\"a.jpg\"/></graphic-document></item></disc></project>",
+         "a.jpg"},
     };
     for (const auto& [file, expected] : cases) {
         P<CProject> project;

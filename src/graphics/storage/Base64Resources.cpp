@@ -107,7 +107,16 @@ P<CBitmap> CBase64Resources::LoadBitmap(const Node& node, const std::string& key
         if (const auto bitmap = loadFile(fileName)) return bitmap;
     }
     std::string extension;
-    if (const Node child = node->getChildNode(key.c_str())) readAttribute(child, "extension", extension);
+    if (const Node child = node->getChildNode(key.c_str())) {
+        readAttribute(child, "extension", extension);
+    } else {
+        std::string source;
+        if (readAttribute(node, "filename", source))
+            Report(peru::localize("graphics.CBase64Resources.NotInFile",
+                                  "The file does not contain the picture \"%NAME%\", but its name only.",
+                                  {{"%NAME%", peru::CString::fromUTF8(source)}}));
+        return {};
+    }
     return LoadBitmap(node, key, getFormatOfFile("." + extension));
 }
 
