@@ -28,10 +28,6 @@ int addFramesOf(ebur128_state* state, const double* samples, size_t frames) {
     return ebur128_add_frames_double(state, samples, frames);
 }
 
-template <class Sample> void addTo(ebur128_state* state, const Sample* samples, size_t frames) {
-    if (addFramesOf(state, samples, frames) != EBUR128_SUCCESS) throw std::bad_alloc();
-}
-
 // The library's own layouts end at 5.1. Sound files with 7 and 8 channels have the order of WAV: the rear
 // channels come before those at the sides, which alone are weighted. Beyond that nothing is known about the
 // channels, and all count alike.
@@ -65,7 +61,7 @@ CAnalysator::CAnalysator(int flags)
 void CAnalysator::initialise(int channelCount, int bytesPerSample, int sampleRate) {
     m_state.reset();
     m_partial.clear();
-    m_isFinished = false;
+    m_isFinished = m_hasForgotten = false;
     const bool isValid =
         m_isFloat ? bytesPerSample == 4 || bytesPerSample == 8 : bytesPerSample >= 1 && bytesPerSample <= 4;
     if (!isValid || channelCount < 1 || sampleRate < 1) return;
@@ -100,6 +96,27 @@ void CAnalysator::analyse(const uint8_t* bytes, size_t count) {
     m_partial.assign(bytes + frames * frameBytes, bytes + count);
 }
 
+template <class Sample> void CAnalysator::add(const Sample* samples, size_t frames) {
+    if (addFramesOf(m_state.get(), samples, frames) != EBUR128_SUCCESS) throw std::bad_alloc();
+    if (!m_hasForgotten) return;
+    m_samplePeak = std::max(m_samplePeak, findPeak(ebur128_prev_sample_peak));
+    m_truePeak = std::max(m_truePeak, findPeak(ebur128_prev_true_peak));
+}
+
+template <class Read> double CAnalysator::findPeak(Read read) const {
+    double highest = 0.0, peak = 0.0;
+    for (unsigned channel = 0; channel < m_channels; ++channel)
+        if (read(m_state.get(), channel, &peak) == EBUR128_SUCCESS) highest = std::max(highest, peak);
+    return highest;
+}
+
+bool CAnalysator::forgetPeaks() {
+    if (!m_hasPeaks || !m_state || m_isFinished) return false;
+    m_hasForgotten = true;
+    m_samplePeak = m_truePeak = 0.0;
+    return true;
+}
+
 void CAnalysator::addFrames(const uint8_t* bytes, size_t frames) {
     if (m_isFloat && m_bytesPerSample == sizeof(float))
         addConverted(m_floats, bytes, frames, readFinite<float>);
@@ -122,7 +139,7 @@ CAnalysator::addConverted(std::vector<Sample>& block, const uint8_t* bytes, size
     while (frames > 0) {
         const size_t now = std::min(frames, kBlockFrames);
         for (size_t i = 0; i < now * m_channels; ++i) block[i] = convert(bytes + i * m_bytesPerSample);
-        addTo(m_state.get(), block.data(), now);
+        add(block.data(), now);
         bytes += now * m_channels * m_bytesPerSample;
         frames -= now;
     }
@@ -132,7 +149,7 @@ CAnalysator::addConverted(std::vector<Sample>& block, const uint8_t* bytes, size
 template <class Sample>
 void CAnalysator::addAligned(std::vector<Sample>& block, const uint8_t* bytes, size_t frames) {
     if (reinterpret_cast<uintptr_t>(bytes) % alignof(Sample) == 0)
-        return addTo(m_state.get(), reinterpret_cast<const Sample*>(bytes), frames);
+        return add(reinterpret_cast<const Sample*>(bytes), frames);
     addConverted(block, bytes, frames, [](const uint8_t* from) {
         Sample sample;
         std::memcpy(&sample, from, sizeof sample);
@@ -158,20 +175,9 @@ void CAnalysator::finish() {
 
 bool CAnalysator::getPeaks(double& samplePeak, double& truePeak) const {
     if (!m_hasPeaks || !m_state) return false;
-    if (m_isFinished) {
-        samplePeak = m_samplePeak;
-        truePeak = m_truePeak;
-        return true;
-    }
-    samplePeak = truePeak = 0.0;
-    for (unsigned channel = 0; channel < m_channels; ++channel) {
-        double peak = 0.0;
-        if (ebur128_sample_peak(m_state.get(), channel, &peak) == EBUR128_SUCCESS)
-            samplePeak = std::max(samplePeak, peak);
-        if (ebur128_true_peak(m_state.get(), channel, &peak) == EBUR128_SUCCESS)
-            truePeak = std::max(truePeak, peak);
-    }
-    truePeak = std::max(truePeak, samplePeak);
+    const bool isCollected = m_isFinished || m_hasForgotten;
+    samplePeak = isCollected ? m_samplePeak : findPeak(ebur128_sample_peak);
+    truePeak = std::max(isCollected ? m_truePeak : findPeak(ebur128_true_peak), samplePeak);
     return true;
 }
 

@@ -22,6 +22,8 @@ public:
     void finish();
     // Results from now on are those of a format that cannot be measured.
     void invalidate() { m_state.reset(); }
+    // The peaks from here on. False without peaks.
+    bool forgetPeaks();
     // False without peaks.
     bool getPeaks(double& samplePeak, double& truePeak) const;
 
@@ -40,6 +42,8 @@ private:
     // Empty if one of them has none.
     static std::vector<ebur128_state*> listStates(std::span<const CAnalysator* const> analysators);
     void addFrames(const uint8_t* bytes, size_t frames);
+    template <class Sample> void add(const Sample* samples, size_t frames);
+    template <class Read> double findPeak(Read read) const; // the highest of all channels
     template <class Sample, class Convert>
     void addConverted(std::vector<Sample>& block, const uint8_t* bytes, size_t frames, Convert convert);
     template <class Sample> void addAligned(std::vector<Sample>& block, const uint8_t* bytes, size_t frames);
@@ -49,7 +53,8 @@ private:
     const bool m_hasRange;
     State m_state;
     bool m_isFinished = false;
-    double m_samplePeak = 0.0, m_truePeak = 0.0; // once finished
+    bool m_hasForgotten = false;                 // peaks; those since then are collected here
+    double m_samplePeak = 0.0, m_truePeak = 0.0; // if so, or once finished
     size_t m_channels = 0;
     size_t m_bytesPerSample = 0;
     std::vector<uint8_t> m_partial; // the beginning of a frame

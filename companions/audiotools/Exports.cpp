@@ -118,6 +118,10 @@ double getAnalysatorRange(TONEWRIGHT_Analysator* const* analysators, int32_t cou
     return measure(analysators, static_cast<size_t>(count), CAnalysator::measureRange);
 }
 
+int32_t forgetAnalysatorPeaks(TONEWRIGHT_Analysator* analysator) {
+    return analysator && toObject(analysator).forgetPeaks() ? 1 : 0;
+}
+
 void finishAnalysator(TONEWRIGHT_Analysator* analysator) {
     if (analysator) callAnalysator(analysator, [](CAnalysator& object) { object.finish(); });
 }

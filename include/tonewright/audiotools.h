@@ -88,6 +88,12 @@ AUDIOTOOLS_API double getAnalysatorRange(TONEWRIGHT_Analysator* const* analysato
 /* No more samples follow: releases memory that only they would need. The results stay. */
 AUDIOTOOLS_API void finishAnalysator(TONEWRIGHT_Analysator* analysator);
 
+/* The peaks of what has been added so far do not count from now on. A long recording can so be measured in
+ * parts, by several analysers: the 64 frames before a part are added first, and then forgotten, since the
+ * curve through the samples depends on them. The highest peaks of all parts are those of the recording. 1, or
+ * 0 for an analyser without peaks or without a format. */
+AUDIOTOOLS_API int32_t forgetAnalysatorPeaks(TONEWRIGHT_Analysator* analysator);
+
 /* --- Equalizer ----------------------------------------------------------------------------------- */
 
 /* Changes the level of ten bands. For one thread at a time. */

@@ -1,14 +1,17 @@
 // Measures loudness and applies gains.
 #include "host_support/GainSource.h"
 #include "host_support/Guard.h"
+#include "host_support/PeakMeter.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/strings/StringFormat.h"
+#include "peru/threads/OrderedParts.h"
 #include "sonora2/media/CloseGuard.h"
-#include "sonora2/plugins/CompanionLibrary.h"
-#include "tonewright/audiotools.h"
 
 #include <cmath>
+#include <deque>
 #include <new>
+#include <optional>
+#include <utility>
 #include <vector>
 
 using namespace tonewright::host_support;
@@ -17,58 +20,48 @@ using sonora2::common::IFloatSamples;
 
 namespace {
 
-// Loaded with the first measurement and held by each of them.
-class CAudioTools : public peru::CObject {
-public:
-    CAudioTools()
-        : m_library(sonora2::common::loadCompanionLibrary("audiotools")),
-          create(find<decltype(createLoudnessAnalysator)>("createLoudnessAnalysator")),
-          getPeaks(find<decltype(getAnalysatorPeaks)>("getAnalysatorPeaks")),
-          getLoudness(find<decltype(getAnalysatorLoudness)>("getAnalysatorLoudness")),
-          getRange(find<decltype(getAnalysatorRange)>("getAnalysatorRange")),
-          finish(find<decltype(finishAnalysator)>("finishAnalysator")) {}
-    ~CAudioTools() override = default;
-
-private:
-    template <class Function> Function* find(const char* name) const {
-        return sonora2::common::requireFunction<Function>(m_library, name);
-    }
-    const P<peru::IDynamicLibrary> m_library;
-
-public:
-    decltype(createLoudnessAnalysator)* const create;
-    decltype(getAnalysatorPeaks)* const getPeaks;
-    decltype(getAnalysatorLoudness)* const getLoudness;
-    decltype(getAnalysatorRange)* const getRange;
-    decltype(finishAnalysator)* const finish;
-};
+// Chunks read before the threads are divided, so that jobs that start side by side know of each other, and
+// short sound starts no thread.
+constexpr size_t kFirstChunks = 4;
+constexpr int kMostThreads = 8;
 
 class CMeasurement : public peru::CObject {
 public:
-    CMeasurement(bool isFloat, int channels, int bytesPerSample, int rate)
-        : tools(peru::make<CAudioTools>()),
-          analysator(tools->create(TONEWRIGHT_ANALYSATOR_PEAKS | TONEWRIGHT_ANALYSATOR_RANGE |
-                                   (isFloat ? TONEWRIGHT_ANALYSATOR_FLOAT : 0))) {
+    // Threads beside the calling one measure the peaks; with 0, everything is measured in one pass.
+    CMeasurement(const P<CAudioTools>& audioTools, const SAnalysedFormat& format, int helpers)
+        : tools(audioTools), analysator(tools->create(TONEWRIGHT_ANALYSATOR_RANGE |
+                                                      (helpers > 0 ? 0 : TONEWRIGHT_ANALYSATOR_PEAKS) |
+                                                      (format.isFloat ? TONEWRIGHT_ANALYSATOR_FLOAT : 0))) {
         if (!analysator) throw std::bad_alloc();
-        analysator->operations->initialise(analysator, channels, bytesPerSample, rate);
-        if (std::isnan(analysator->operations->result(analysator))) {
-            analysator->operations->destroy(analysator);
-            throw peru::CError(peru::localize(
-                "tonewright.Loudness.format",
-                "The loudness of %CHANNELS% channels at %RATE% Hz cannot be measured",
-                {{"%CHANNELS%", peru::format("%d", channels)}, {"%RATE%", peru::format("%d", rate)}}));
-        }
+        analysator->operations->initialise(analysator.get(), format.channels, format.bytesPerSample,
+                                           format.rate);
+        if (std::isnan(analysator->operations->result(analysator.get())))
+            throw peru::CError(
+                peru::localize("tonewright.Loudness.format",
+                               "The loudness of %CHANNELS% channels at %RATE% Hz cannot be measured",
+                               {{"%CHANNELS%", peru::format("%d", format.channels)},
+                                {"%RATE%", peru::format("%d", format.rate)}}));
+        if (helpers > 0) m_meter.emplace(tools, format, helpers);
     }
-    ~CMeasurement() override { analysator->operations->destroy(analysator); }
-    CMeasurement(const CMeasurement&) = delete;
-    CMeasurement& operator=(const CMeasurement&) = delete;
+    ~CMeasurement() override = default;
 
-    void add(sonora2::audio::IAudioChunk& chunk) const {
-        analysator->operations->analyse(analysator, chunk.getData(), chunk.getSize());
+    void add(sonora2::audio::IAudioChunk& chunk) {
+        if (m_meter) m_meter->add(chunk.getData(), chunk.getSize());
+        analysator->operations->analyse(analysator.get(), chunk.getData(), chunk.getSize());
+    }
+    void finish() {
+        if (m_meter) m_meter->finish(samplePeak, truePeak);
+        m_meter.reset();
+        tools->getPeaks(analysator.get(), &samplePeak, &truePeak); // changes nothing without peaks
+        tools->finish(analysator.get());
     }
 
     const P<CAudioTools> tools;
-    TONEWRIGHT_Analysator* const analysator;
+    const Analysator analysator;
+    double samplePeak = 0.0, truePeak = 0.0; // once finished
+
+private:
+    std::optional<CPeakMeter> m_meter;
 };
 
 bool useFloat(const P<IAudioSource>& source) {
@@ -86,11 +79,28 @@ P<CMeasurement> measure(const P<IAudioSource>& source, TONEWRIGHT_LoudnessProgre
     if (!source->isOpened()) source->open();
     const sonora2::common::CCloseGuard closing(*source);
     const bool isFloat = useFloat(source);
-    const auto measurement = peru::make<CMeasurement>(isFloat, source->getChannelCount(),
-                                                      source->getBytesPerSample(), source->getSampleRate());
+    const SAnalysedFormat format{isFloat, source->getChannelCount(), source->getBytesPerSample(),
+                                 source->getSampleRate()};
     const double duration = source->getDuration();
-    while (!source->isEOF()) {
-        const P<sonora2::audio::IAudioChunk> chunk = source->getNextAudioChunk();
+    const peru::CThreadShare share;
+    std::deque<P<sonora2::audio::IAudioChunk>> first;
+    while (first.size() < kFirstChunks && !source->isEOF()) {
+        P<sonora2::audio::IAudioChunk> chunk = source->getNextAudioChunk();
+        if (!chunk) break;
+        first.push_back(std::move(chunk));
+    }
+    const auto tools = peru::make<CAudioTools>();
+    const bool isLong = first.size() == kFirstChunks && tools->forgetPeaks;
+    const peru::CIdleThreads idle(isLong ? kMostThreads - 1 : 0);
+    const auto measurement = peru::make<CMeasurement>(tools, format, idle.getCount());
+    while (!first.empty() || !source->isEOF()) {
+        P<sonora2::audio::IAudioChunk> chunk;
+        if (first.empty()) {
+            chunk = source->getNextAudioChunk();
+        } else {
+            chunk = std::move(first.front());
+            first.pop_front();
+        }
         if (!chunk) break;
         const double fraction = duration > 0.0 ? chunk->getTimestamp() / duration : 0.0;
         const int32_t answer = callback ? callback(fraction, user) : TONEWRIGHT_CONTINUE;
@@ -99,7 +109,7 @@ P<CMeasurement> measure(const P<IAudioSource>& source, TONEWRIGHT_LoudnessProgre
         measurement->add(*chunk);
     }
     source->close();
-    measurement->tools->finish(measurement->analysator);
+    measurement->finish();
     return measurement;
 }
 
@@ -123,11 +133,9 @@ int32_t TONEWRIGHT_Host_GetLoudness(const TONEWRIGHT_Handle* measurements, int32
         std::vector<TONEWRIGHT_Analysator*> analysators;
         for (int32_t i = 0; i < count; ++i) {
             const auto object = require<CMeasurement>(measurements[i], "a measurement of loudness");
-            double samplePeak = 0.0, truePeak = 0.0;
-            object->tools->getPeaks(object->analysator, &samplePeak, &truePeak);
-            values.samplePeak = std::max(values.samplePeak, samplePeak);
-            values.truePeak = std::max(values.truePeak, truePeak);
-            analysators.push_back(object->analysator);
+            values.samplePeak = std::max(values.samplePeak, object->samplePeak);
+            values.truePeak = std::max(values.truePeak, object->truePeak);
+            analysators.push_back(object->analysator.get());
             objects.push_back(object);
         }
         values.integrated = objects.front()->tools->getLoudness(analysators.data(), count);

@@ -1,9 +1,12 @@
 #include "host/Wav.h"
+#include "peru/threads/ThreadBudget.h"
 
 #include <gtest/gtest.h>
 #include <tonewright/host.h>
 
 #include <memory>
+#include <tuple>
+#include <vector>
 
 namespace {
 
@@ -51,6 +54,32 @@ TEST_F(HostLoudness, GainSourcesChangeEveryWidth) {
         ASSERT_EQ(TONEWRIGHT_Host_ReadFrames(reader.get(), loud.samples.data(), 48000), 48000);
         for (size_t i = 0; i < loud.frames(); ++i)
             ASSERT_NEAR(loud.at(i, 0), std::clamp(3 * sound.at(i, 0), -1.0, 1.0), std::ldexp(1.01, 1 - bits));
+    }
+}
+
+// Peaks that only the curve through the samples has, where the sound is divided and elsewhere.
+TEST_F(HostLoudness, AnyNumberOfThreadsMeasuresTheSame) {
+    const int limit = peru::getThreadBudget().getLimit();
+    for (const auto& [rate, channels, bits] : {std::tuple{44100, 2, 16}, {96000, 1, 24}, {48000, 6, 8}}) {
+        SSound sound = makeNoise(rate, channels, bits, 1200000 / (channels * bits / 8));
+        const size_t part = 524288 / (64 * sound.frameBytes()) * 64 * sound.frameBytes();
+        for (size_t at = 0; at < sound.samples.size(); ++at) {
+            const size_t distance = std::min(at % part, part - at % part);
+            if (distance > 20 * sound.frameBytes()) sound.samples[at] = bits == 8 ? '\x7e' : '\0';
+        }
+        const Handle source = makeSource(sound);
+        std::vector<TONEWRIGHT_Loudness> results;
+        for (const int threads : {1, 2, 8}) {
+            peru::getThreadBudget().setLimit(threads);
+            const Handle measurement(TONEWRIGHT_Host_MeasureLoudness(source.get(), nullptr, nullptr));
+            const TONEWRIGHT_Handle handle = measurement.get();
+            results.emplace_back().size = sizeof(TONEWRIGHT_Loudness);
+            EXPECT_EQ(TONEWRIGHT_Host_GetLoudness(&handle, 1, &results.back()), 1);
+        }
+        peru::getThreadBudget().setLimit(limit);
+        EXPECT_GT(results[0].truePeak, results[0].samplePeak);
+        for (const TONEWRIGHT_Loudness& loudness : results)
+            EXPECT_EQ(std::memcmp(&results[0], &loudness, sizeof loudness), 0) << describe(sound);
     }
 }
 
