@@ -216,25 +216,34 @@ def main():
     wav = make_material(work, arguments.minutes)
     ours = lambda *options: [host, "convert", "--force", "--quiet", *options]
     out = lambda name: work / name
+    alone = lambda command: ["env", "TONEWRIGHT_THREADS=1", *command]
+    flac, mp3 = work / "material.flac", work / "material.mp3"
+    picture = "showwavespic=s=1200x300:split_channels=1"
     rate48 = "aresample=48000:filter_size=16:phase_shift=10:linear_interp=0:exact_rational=0:cutoff=1.0:filter_type=kaiser:kaiser_beta=9"
 
     jobs = [
         ("WAV to FLAC", ours(wav, "-o", out("o.flac")), "flac", ["flac", "-s", "-f", "-5", wav, "-o", out("p.flac")]),
+        ("WAV to FLAC, 1 thread", alone(ours(wav, "-o", out("o.flac"))), "flac", ["flac", "-s", "-f", "-5", wav, "-o", out("p.flac")]),
         ("WAV to MP3, CBR 192", ours(wav, "-o", out("o.mp3"), "--bitrate", "192000"), "lame", ["lame", "--silent", "--noreplaygain", "-b", "192", wav, out("p.mp3")]),
         ("WAV to MP3, VBR", ours(wav, "-o", out("v.mp3"), "--quality", "0.8"), "lame", ["lame", "--silent", "--noreplaygain", "-V", "2", wav, out("pv.mp3")]),
         ("WAV to Ogg Vorbis", ours(wav, "-o", out("o.ogg"), "--quality", "0.5"), "oggenc", ["oggenc", "-Q", "-q", "5", wav, "-o", out("p.ogg")]),
-        ("FLAC to WAV", ours(work / "material.flac", "-o", out("f.wav")), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", work / "material.flac", out("pf.wav")]),
-        ("MP3 to WAV", ours(work / "material.mp3", "-o", out("m.wav")), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", work / "material.mp3", out("pm.wav")]),
+        ("FLAC to WAV", ours(flac, "-o", out("f.wav")), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", flac, out("pf.wav")]),
+        ("MP3 to WAV", ours(mp3, "-o", out("m.wav")), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", mp3, out("pm.wav")]),
+        ("FLAC to WAV", ours(flac, "-o", out("f.wav")), "flac", ["flac", "-s", "-f", "-d", flac, "-o", out("pf.wav")]),
+        ("MP3 to WAV", ours(mp3, "-o", out("m.wav")), "mpg123", ["mpg123", "-q", "-w", out("pm.wav"), mp3]),
+        ("waveform of FLAC", [host, "waveform", "--force", flac, "-o", out("w.png")], "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", flac, "-filter_complex", picture, "-frames:v", "1", out("pw.png")]),
+        ("waveform of FLAC, 1 thread", alone([host, "waveform", "--force", flac, "-o", out("w.png")]), "flac -t", ["flac", "-s", "-t", flac]),
+        ("loudness of FLAC", [host, "loudness", flac], "ffmpeg", ["ffmpeg", "-v", "error", "-i", flac, "-af", "ebur128=peak=true", "-f", "null", "-"]),
         ("WAV 44.1 to 48 kHz", ours(wav, "-o", out("r.wav"), "--rate", "48000"), "ffmpeg", ["ffmpeg", "-v", "error", "-y", "-i", wav, "-af", rate48, out("pr.wav")]),
     ]
-    print(f"{'job':24} {'peer':8} {'CPU':>6} {'wall':>6} {'x real time':>12} {'peak MiB':>9} {'peer MiB':>9}")
+    print(f"{'job':26} {'peer':8} {'CPU':>6} {'wall':>6} {'x real time':>12} {'peak MiB':>9} {'peer MiB':>9}")
     for name, our_command, peer, peer_command in jobs:
         if arguments.only.lower() not in name.lower():
             continue
         pairs = [(run(our_command), run(peer_command)) for _ in range(arguments.repeat)]
         mine, theirs = best([a for a, _ in pairs]), best([b for _, b in pairs])
         print(
-            f"{name:24} {peer:8} {mine[0] / theirs[0]:6.2f} {mine[1] / theirs[1]:6.2f} "
+            f"{name:26} {peer:8} {mine[0] / theirs[0]:6.2f} {mine[1] / theirs[1]:6.2f} "
             f"{arguments.minutes * 60 / mine[1]:12.0f} {mine[2] / 1024:9.1f} {theirs[2] / 1024:9.1f}",
             flush=True,
         )
@@ -254,12 +263,12 @@ def main():
             _, wall, peak = run(ours(silence, "-o", out("silence.flac")))
             print(f"  {title:10} {peak / 1024:6.1f} MiB in {wall:.2f} s")
             silence.unlink()
-    for leftover in ("o.flac", "p.flac", "o.mp3", "p.mp3", "v.mp3", "pv.mp3", "o.ogg", "p.ogg", "f.wav", "pf.wav", "m.wav", "pm.wav", "r.wav", "pr.wav", "silence.flac"):
+    for leftover in ("o.flac", "p.flac", "o.mp3", "p.mp3", "v.mp3", "pv.mp3", "o.ogg", "p.ogg", "f.wav", "pf.wav", "m.wav", "pm.wav", "r.wav", "pr.wav", "w.png", "pw.png", "silence.flac"):
         (work / leftover).unlink(missing_ok=True)
 
 
 if __name__ == "__main__":
-    for tool in ("flac", "metaflac", "lame", "oggenc", "ffmpeg", "sox"):
+    for tool in ("flac", "metaflac", "lame", "mpg123", "oggenc", "ffmpeg", "sox"):
         if not shutil.which(tool):
             sys.exit(f"{tool} is missing: run scripts/setup.sh")
     main()
