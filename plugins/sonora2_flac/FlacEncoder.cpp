@@ -38,6 +38,7 @@ void putBigEndian(uint8_t* at, uint64_t value, int bytes) {
 CFlacEncoder::CFlacEncoder() = default;
 
 CFlacEncoder::~CFlacEncoder() {
+    m_parallel.reset(); // its threads call this object
     m_file = nullptr; // deleting the library's encoder finishes the stream
 }
 
