@@ -82,7 +82,8 @@ void setUdfExtents(SDataEntry& entry, std::string_view fileEntry, int64_t partit
     const int form = fileEntry[kFlags] & 7;
     const size_t attributes = getNumber(fileEntry, kAttributeBytes);
     const size_t size = getNumber(fileEntry, kDescriptorBytes);
-    entry.isReadable = attributes + size <= fileEntry.size() - kHeader;
+    entry.isReadable = entry.size >= 0 && attributes + size <= fileEntry.size() - kHeader;
+    entry.size = std::max<int64_t>(entry.size, 0);
     if (!entry.isReadable) return;
     const std::string_view descriptors = fileEntry.substr(kHeader + attributes, size);
     if (form == kInside) {

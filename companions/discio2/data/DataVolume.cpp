@@ -137,8 +137,8 @@ public:
 
     void readBlocks(int64_t block, int64_t count, void* to) override {
         std::lock_guard lock(m_mutex);
-        if (udf_read_sectors(m_udf.get(), to, static_cast<lsn_t>(block), static_cast<long>(count)) !=
-            DRIVER_OP_SUCCESS)
+        if (block + count > INT32_MAX || udf_read_sectors(m_udf.get(), to, static_cast<lsn_t>(block),
+                                                          static_cast<long>(count)) != DRIVER_OP_SUCCESS)
             throw CDiscError(DISCIO_ERROR_READ_INPUT,
                              m_path + ": block " + std::to_string(block) + " cannot be read");
     }
