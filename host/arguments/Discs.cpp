@@ -2,6 +2,7 @@
 #include "arguments/Cddb.h"
 #include "base/Translation.h"
 #include "commands/Drives.h"
+#include "commands/ExtractFiles.h"
 #include "commands/Rip.h"
 #include "commands/ShowDisc.h"
 
@@ -77,17 +78,31 @@ void addDrives(CLI::App& app, Run& run) {
 }
 
 void addDisc(CLI::App& app, Run& run) {
-    struct SOptions {
-        std::filesystem::path place;
-        bool json = false;
-    };
-    const auto options = std::make_shared<SOptions>();
-    CLI::App* command =
-        app.add_subcommand("disc", tr("host.help.disc", "Show the tracks, texts and files of a disc."));
+    const auto options = std::make_shared<SExtractOptions>();
+    CLI::App* command = app.add_subcommand(
+        "disc", tr("host.help.disc", "Show the tracks, texts and files of a disc, or copy files from it."));
     command->add_option("DISC", options->place, describePlace())->option_text(" ");
     command->add_flag("--json", options->json, tr("host.help.jsonLines", "Print one JSON object per line"));
-    command->callback(
-        [options, &run] { run = [options](CLibrary&) { return showDisc(options->place, options->json); }; });
+    auto* const extract =
+        command
+            ->add_option("-x,--extract", options->names,
+                         tr("host.help.disc.extract",
+                            "Copy these files, and folders with everything in them, instead; / is the whole "
+                            "disc.\nFolders are separated by /"))
+            ->option_text("FILE ...");
+    command
+        ->add_option("-d,--directory", options->directory,
+                     tr("host.help.disc.directory", "Folder for the copies (default: the current one)"))
+        ->option_text("FOLDER")
+        ->needs(extract);
+    command->add_flag("-f,--force", options->force, tr("host.help.force", "Replace existing files"))
+        ->needs(extract);
+    command->callback([options, &run] {
+        run = [options](CLibrary& library) {
+            return options->names.empty() ? showDisc(options->place, options->json)
+                                          : extractFiles(library, *options);
+        };
+    });
 }
 
 void addRip(CLI::App& app, Run& run) {

@@ -39,6 +39,9 @@ namespace host {
     X(DataCursorNext)                                                                                        \
     X(DataCursorIsFolder)                                                                                    \
     X(DataCursorGetDiscPathW)                                                                                \
+    X(DataCursorGetNameW)                                                                                    \
+    X(DataCursorGetLastModifiedTime)                                                                         \
+    X(DataCursorRead)                                                                                        \
     X(DataCursorGetSize)                                                                                     \
     X(DataCursorCreateSubCursor)                                                                             \
     X(ProjectGetVirtualDisc)                                                                                 \
