@@ -83,22 +83,17 @@ void addCare(CLI::App& command, SConvertOptions& options) {
     command.add_flag("--prevent-clipping", options.preventClipping,
                      tr("host.help.convert.preventClipping",
                         "Make floating-point sound that exceeds full scale quieter instead of clipping it"));
-    auto* normalize =
-        command.add_flag("--normalize{-18}")
-            ->description(tr("host.help.convert.normalize",
-                             "Bring each output to a loudness of -18 LUFS, or that of --normalize=LUFS;\nthe "
-                             "gain is limited where peaks would exceed -1 dBTP"))
-            ->check(CLI::Validator(isLoudness, ""))
-            ->each([&](const std::string& text) { options.loudness = std::strtod(text.c_str(), nullptr); });
-    command
-        .add_flag("--album", options.oneGain,
-                  tr("host.help.convert.album",
-                     "Give all files the same gain, which brings them to that loudness together"))
-        ->needs(normalize);
-    command
-        .add_flag("--allow-clipping", options.allowClipping,
-                  tr("host.help.convert.allowClipping", "Apply the gain of --normalize without a limit"))
-        ->needs(normalize);
+    command.add_flag("--normalize{-18}")
+        ->description(tr("host.help.convert.normalize",
+                         "Bring each output to a loudness of -18 LUFS, or that of --normalize=LUFS;\nthe "
+                         "gain is limited where peaks would exceed -1 dBTP"))
+        ->check(CLI::Validator(isLoudness, ""))
+        ->each([&](const std::string& text) { options.loudness = std::strtod(text.c_str(), nullptr); });
+    command.add_flag("--album", options.oneGain,
+                     tr("host.help.convert.album",
+                        "Give all files the same gain, which brings them to that loudness together"));
+    command.add_flag("--allow-clipping", options.allowClipping,
+                     tr("host.help.convert.allowClipping", "Apply the gain of --normalize without a limit"));
     command.add_flag_callback(
         "--no-tags", [&] { options.carryTags = false; },
         tr("host.help.convert.noTags", "Do not copy title, artist and the other fields of tags"));
@@ -146,8 +141,12 @@ void placeOutput(SConvertOptions& options) {
                                    tr("host.Convert.oneInput", "takes one input; use --to for several"));
 }
 
-// "--normalize -14" is an option without a value and an input.
-void checkLoudness(const SConvertOptions& options) {
+// "--normalize -14" is an option without a value and an input. A preset may set --normalize, so the parser
+// does not check what needs it.
+void checkLoudness(const CLI::App& command, const SConvertOptions& options) {
+    for (const char* name : {"--album", "--allow-clipping"})
+        if (!options.loudness && command.get_option(name)->count() > 0)
+            throw CLI::RequiresError(name, "--normalize");
     for (const fs::path& input : options.inputs)
         if (options.loudness && input.native().starts_with('-') && isLoudness(input).empty())
             throw CLI::ValidationError("--normalize",
@@ -190,7 +189,7 @@ void addConvert(CLI::App& app, Run& run) {
     addOutput(*command, options->show);
     command->callback([options, command, &run] {
         applyPreset(*command);
-        checkLoudness(*options);
+        checkLoudness(*command, *options);
         placeOutput(*options);
         checkStandardInput(*options);
         checkBitRates(*options);

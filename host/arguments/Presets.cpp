@@ -27,8 +27,8 @@ struct SPreset {
     std::string origin; // for messages
 };
 
-const char* const kKeys[] = {"to",      "rate",        "channels",    "bits",     "quality",
-                             "bitrate", "min-bitrate", "max-bitrate", "resampler"};
+const char* const kKeys[] = {"to",      "rate",        "channels",    "bits",      "quality",
+                             "bitrate", "min-bitrate", "max-bitrate", "resampler", "normalize"};
 const char* const kCompression[] = {"quality", "bitrate", "min-bitrate", "max-bitrate"};
 
 const struct {

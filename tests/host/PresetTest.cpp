@@ -60,6 +60,12 @@ TEST_F(Preset, SetsWhatTheUserDoesNot) {
         EXPECT_EQ(result.exitCode, 0) << result.err;
         EXPECT_EQ(probe(each.output), each.expected);
     }
+    define("loud", "to = wav\nnormalize = -20\n");
+    const std::string converted =
+        withPresets({"convert", "in.wav", "-o", "loud.wav", "--preset", "loud", "--allow-clipping", "--json"})
+            .out;
+    EXPECT_NE(converted.find("\"gain\""), std::string::npos) << converted;
+    std::filesystem::remove(folder / "config/tonewright/presets/loud.ini");
     const std::string listed = withPresets({"convert", "--list-presets"}).out;
     for (const char* name : {"archive", "cd", "mine", "phone", "podcast", "portable", "speech"})
         EXPECT_NE(("\n" + listed).find("\n" + std::string(name) + " "), std::string::npos) << listed;
@@ -111,6 +117,7 @@ TEST_F(Preset, IsRefusedWithFileAndKey) {
         {"rate = 44100, 48000\n", "rate takes one value"},
         {"rate = 44100\nbits = 16\nrate = 48000\n", "rate is set twice"},
         {"max-bitrate = 128k\n", "needs bitrate"},
+        {"normalize = loud\n", "--normalize: loud"},
         {"quality = 0.5\nbitrate = 128k\n", "exclude each other"},
         {"# nothing\n", "sets nothing"},
     };
