@@ -5,6 +5,7 @@ Called by scripts/bench.sh with the build folder. A ratio below 1 means that Ton
 """
 
 import argparse
+import os
 import pathlib
 import shutil
 import subprocess
@@ -202,12 +203,39 @@ def bench_mixing(host, work, wav, minutes, repeat):
         leftover.unlink()
 
 
+def bench_discs(host, work, wav, repeat):
+    """Rips an image of ten tracks, and builds a disc image of 400 files of 1 MB."""
+    folder = work / "discs"
+    shutil.rmtree(folder, ignore_errors=True)
+    files = folder / "files"
+    files.mkdir(parents=True)
+    for i in range(400):
+        (files / f"{i}.bin").write_bytes(os.urandom(1000000))
+    subprocess.run(["sox", wav, "-t", "raw", "-e", "signed", "-b", "16", "-L", folder / "disc.bin"], check=True)
+    count = (folder / "disc.bin").stat().st_size // 2352
+    sheet = 'FILE "disc.bin" BINARY\n'
+    for i in range(10):
+        start = count // 10 * i
+        sheet += f"TRACK {i + 1:02} AUDIO\nINDEX 01 {start // 4500:02}:{start // 75 % 60:02}:{start % 75:02}\n"
+    cue, iso, other = folder / "disc.cue", folder / "o.iso", folder / "p.iso"
+    cue.write_text(sheet)
+    print(f"\n{'discs':40} {'peer':8} {'CPU':>6} {'wall':>6} {'ms':>9} {'peer ms':>9}")
+    rip = [host, "rip", cue, "--to", "flac", "--force", "--quiet", "-d", folder / "ripped"]
+    compare("rip an image, 10 tracks", repeat, rip, "flac", ["flac", "-s", "-f", "-5", wav, "-o", folder / "p.flac"])
+    burn = [host, "burn", files, "--image", iso, "--force", "--quiet"]
+    xorriso = ["xorriso", "-as", "mkisofs", "-quiet", "-J", "-R", "-o", other, files]
+    compare("ISO of 400 MB, read back", repeat, burn, "xorriso", xorriso)
+    script = 'out="$1"; shift; "$@" && sync "$out" && cat "$out"'
+    compare("ISO of 400 MB; synced, read", repeat, burn, "xorriso", ["sh", "-c", script, "sh", other, *xorriso])
+    shutil.rmtree(folder)
+
+
 def main():
     parser = argparse.ArgumentParser(description=__doc__)
     parser.add_argument("build", type=pathlib.Path)
     parser.add_argument("--minutes", type=int, default=10, help="length of the material")
     parser.add_argument("--repeat", type=int, default=3, help="runs of each job, interleaved with its peer")
-    parser.add_argument("--only", default="", help="only jobs whose name contains this text; \"tags\", \"mixing\" and \"playing\" select those groups")
+    parser.add_argument("--only", default="", help="only jobs whose name contains this text; \"tags\", \"mixing\", \"discs\" and \"playing\" select those groups")
     arguments = parser.parse_args()
 
     host = arguments.build / "bin/tonewright"
@@ -253,6 +281,8 @@ def main():
         bench_tags(host, work, wav, arguments.repeat)
     if arguments.only.lower() in "mixing":
         bench_mixing(host, work, wav, arguments.minutes, arguments.repeat)
+    if arguments.only.lower() in "discs":
+        bench_discs(host, work, wav, arguments.repeat)
     if arguments.only.lower() in "playing":
         bench_playing(host, work, wav, run)
     if not arguments.only:
@@ -268,7 +298,7 @@ def main():
 
 
 if __name__ == "__main__":
-    for tool in ("flac", "metaflac", "lame", "mpg123", "oggenc", "ffmpeg", "sox"):
+    for tool in ("flac", "metaflac", "lame", "mpg123", "oggenc", "ffmpeg", "sox", "xorriso"):
         if not shutil.which(tool):
             sys.exit(f"{tool} is missing: run scripts/setup.sh")
     main()
