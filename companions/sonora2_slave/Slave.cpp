@@ -13,6 +13,7 @@
 #include "sonora2/plugins/ILazyPlugin.h"
 #include "sonora2/plugins/PluginExtensions.h"
 #include "sonora2/plugins/PluginModule.h"
+#include "sonora2/samplerateconverter/IResampler.h"
 #include "sonora2_slave/CrashDetails.h"
 #include "sonora2_slave/ServedMedia.h"
 #include "sonora2_slave/sandbox/JobAccess.h"
@@ -136,10 +137,20 @@ void CSlave::beforeMedia(const P<peru::IURI>& medium, bool isWritten) {
     if (!m_isConfined) confine(medium, isWritten);
 }
 
+// A plug-in may need the filter later. Without it all media can be read in their own format.
+void CSlave::loadResampler() const {
+    try {
+        sonora2::samplerateconverter::getResamplerLibrary();
+    } catch (const peru::CException& exception) {
+        m_log->log(kSeverityWarning, exception.getDescription());
+    }
+}
+
 // For good: a slave that is asked for a second medium cannot open it.
 void CSlave::confine(const P<peru::IURI>& medium, bool isWritten) {
     // Libraries that are not loaded yet cannot be read later.
     if (const auto lazy = peru::tryCast<ILazyPlugin>(m_plugin)) lazy->load();
+    loadResampler();
     redirectStandardFiles(isWritten);
     const char* mode = std::getenv(kSandboxVariable);
     if (kHasSandbox && (!mode || std::strcmp(mode, "none") != 0)) {

@@ -41,6 +41,7 @@ private:
     sonora2::common::ISonoraPlugin& requirePlugin() const;
     void servePlugin();
     void beforeMedia(const P<peru::IURI>& medium, bool isWritten);
+    void loadResampler() const;
     void confine(const P<peru::IURI>& medium, bool isWritten);
 
     SSlaveOptions m_options;

@@ -5,7 +5,7 @@
 #include "peru/strings/StringFormat.h"
 #include "sonora2/media/AudioChunk.h"
 #include "sonora2/samplerateconverter/ChannelConverters.h"
-#include "sonora2/samplerateconverter/Resampler.h"
+#include "sonora2/samplerateconverter/IResampler.h"
 #include "sonora2/samplerateconverter/SampleWidths.h"
 
 #include <cstring>
@@ -28,10 +28,6 @@ constexpr int kPhaseShift = 10;
 constexpr int kLinear = 0;
 constexpr double kCutoff = 1.0;
 
-struct SResamplerDeleter {
-    void operator()(SResampler* resampler) const { resamplerClose(resampler); }
-};
-
 template <class Sample = int16_t> Sample* samplesOf(const P<IMemoryBlock>& block) {
     return reinterpret_cast<Sample*>(block->getData());
 }
@@ -43,7 +39,7 @@ struct CSampleRateConverter::SImpl {
         P<IMemoryBlock> input; // for the filter, carry-over first
         int carryBytes = 0;    // bytes of the input consumed by the last call
         int carrySamples = 0;  // samples left for the next call
-        std::unique_ptr<SResampler, SResamplerDeleter> resampler;
+        P<IResampler> resampler;
         P<IMemoryBlock> output; // during one call
         int produced = 0;
     };
@@ -89,8 +85,8 @@ void CSampleRateConverter::SImpl::prepare() {
     for (int i = 0; i < dstChannels; ++i) {
         SChannel& channel = channels[i];
         if (srcRate <= kMaxRate && dstRate <= kMaxRate)
-            channel.resampler.reset(
-                resamplerInit(dstRate, srcRate, kFilterSize, kPhaseShift, kLinear, kCutoff, sampleBytes));
+            channel.resampler = getResamplerLibrary()->create(dstRate, srcRate, kFilterSize, kPhaseShift,
+                                                              kLinear, kCutoff, sampleBytes);
         if (!channel.resampler)
             throw peru::CError(
                 peru::format({"sonora2.CSampleRateConverter.filter",
@@ -148,8 +144,8 @@ void CSampleRateConverter::SImpl::resample(SChannel& channel) {
     const int samples = static_cast<int>(channel.input->getSize() / sampleBytes);
     channel.output = memoryManager->getBlock(int64_t{kMaxOutputFrames} * sampleBytes);
     int consumed = 0;
-    channel.produced = resamplerRun(channel.resampler.get(), channel.output->getData(),
-                                    channel.input->getData(), &consumed, samples, kMaxOutputFrames);
+    channel.produced = channel.resampler->run(channel.output->getData(), channel.input->getData(), &consumed,
+                                              samples, kMaxOutputFrames);
     if (channel.produced < 0) throw std::bad_alloc();
     channel.carrySamples = samples - consumed;
     channel.carryBytes = consumed * sampleBytes;

@@ -1,4 +1,5 @@
-#include "sonora2/samplerateconverter/Resampler.h"
+#include "peru/Object.h"
+#include "sonora2/samplerateconverter/IResampler.h"
 
 extern "C" {
 #include <libavutil/channel_layout.h>
@@ -22,23 +23,36 @@ struct SContextDeleter {
     void operator()(SwrContext* context) const { swr_free(&context); }
 };
 
-} // namespace
+using Context = std::unique_ptr<SwrContext, SContextDeleter>;
 
-struct SResampler {
-    std::unique_ptr<SwrContext, SContextDeleter> context;
-    int64_t inRate;
-    int64_t outRate;
-    int64_t margin; // output samples that the history may add to what a call's own input gives
+class CResampler : public peru::CObject, public IResampler {
+public:
+    CResampler(Context context, int inRate, int outRate, int64_t margin)
+        : m_context(std::move(context)), m_inRate(inRate), m_outRate(outRate), m_margin(margin) {}
+    int run(void* dst, const void* src, int* consumed, int srcSize, int dstSize) override;
+
+private:
+    ~CResampler() override = default;
+
+    Context m_context;
+    int64_t m_inRate;
+    int64_t m_outRate;
+    int64_t m_margin; // output samples that the history may add to what a call's own input gives
 };
 
-namespace {
+class CLibrary : public peru::CObject, public IResamplerLibrary {
+public:
+    P<IResampler> create(int outRate, int inRate, int filterSize, int phaseShift, int linear, double cutoff,
+                         int bytesPerSample) override;
+
+private:
+    ~CLibrary() override = default;
+};
 
 bool isBestWanted() {
     const char* wanted = std::getenv("TONEWRIGHT_RESAMPLER");
     return wanted && std::strcmp(wanted, "best") == 0;
 }
-
-using Context = std::unique_ptr<SwrContext, SContextDeleter>;
 
 Context allocate(int outRate, int inRate, AVSampleFormat format) {
     AVChannelLayout mono = AV_CHANNEL_LAYOUT_MONO;
@@ -61,18 +75,14 @@ Context createBest(int outRate, int inRate, AVSampleFormat format) {
     return accepted ? std::move(context) : nullptr;
 }
 
-} // namespace
-
-SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShift, int linear, double cutoff,
-                          int bytesPerSample) {
+P<IResampler> CLibrary::create(int outRate, int inRate, int filterSize, int phaseShift, int linear,
+                               double cutoff, int bytesPerSample) {
     if (outRate <= 0 || inRate <= 0 || outRate / inRate >= kMaxRatio || inRate / outRate >= kMaxRatio)
         return nullptr;
     const AVSampleFormat format = bytesPerSample == 2 ? AV_SAMPLE_FMT_S16P : AV_SAMPLE_FMT_S32P;
     if (isBestWanted()) {
         if (Context best = createBest(outRate, inRate, format))
-            return std::make_unique<SResampler>(
-                       SResampler{std::move(best), inRate, outRate, int64_t{1} << 20})
-                .release();
+            return peru::make<CResampler>(std::move(best), inRate, outRate, int64_t{1} << 20);
     }
     Context context = allocate(outRate, inRate, format);
     if (!context) return nullptr;
@@ -91,26 +101,29 @@ SResampler* resamplerInit(int outRate, int inRate, int filterSize, int phaseShif
     // The filter first collects two filter lengths of input and then outputs them at once.
     const int64_t taps = filterSize * ((std::max(inRate, outRate) + int64_t{outRate} - 1) / outRate);
     const int64_t margin = 2 * taps * outRate / inRate + kOutputMargin;
-    return std::make_unique<SResampler>(SResampler{std::move(context), inRate, outRate, margin}).release();
+    return peru::make<CResampler>(std::move(context), inRate, outRate, margin);
 }
 
-int resamplerRun(SResampler* resampler, void* dst, const void* src, int* consumed, int srcSize, int dstSize) {
+int CResampler::run(void* dst, const void* src, int* consumed, int srcSize, int dstSize) {
     // The library buffers whatever does not fit the output, without bound, so it gets no more input than fits
     // (apart from the initial fill). The output size passed to it stays close to what is expected, since it
     // becomes slow with a large one.
-    const int64_t fitting = dstSize * resampler->inRate / resampler->outRate;
+    const int64_t fitting = dstSize * m_inRate / m_outRate;
     const int taken = static_cast<int>(std::min<int64_t>(srcSize, fitting));
-    const int64_t expected = taken * resampler->outRate / resampler->inRate + resampler->margin;
+    const int64_t expected = taken * m_outRate / m_inRate + m_margin;
     uint8_t* out = static_cast<uint8_t*>(dst);
     const uint8_t* in = static_cast<const uint8_t*>(src);
-    const int made = swr_convert(resampler->context.get(), &out,
+    const int made = swr_convert(m_context.get(), &out,
                                  static_cast<int>(std::min<int64_t>(dstSize, expected)), &in, taken);
     *consumed = made < 0 ? 0 : taken;
     return made < 0 ? -1 : made;
 }
 
-void resamplerClose(SResampler* resampler) {
-    std::unique_ptr<SResampler> closed(resampler);
-}
+} // namespace
 
 } // namespace sonora2::samplerateconverter
+
+extern "C" SONORA2_API void
+sonora2_getResamplerLibrary(peru::P<sonora2::samplerateconverter::IResamplerLibrary>& library) {
+    library = peru::make<sonora2::samplerateconverter::CLibrary>();
+}
