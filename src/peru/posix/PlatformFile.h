@@ -32,10 +32,10 @@ private:
 // Throws CURITypeNotSupportedError if the URI is not a path on this machine.
 std::string toPath(const P<IURI>& uri);
 // The same, but returns an empty path instead of throwing.
-std::string tryToPath(const P<IURI>& uri);
+PERU_API std::string tryToPath(const P<IURI>& uri);
 // A folder's URI ends in "/".
-P<IURI> toURI(const std::string& path);
-P<IURI> toFolderURI(std::string path);
+PERU_API P<IURI> toURI(const std::string& path);
+PERU_API P<IURI> toFolderURI(std::string path);
 
 // The system's text for an errno value.
 P<IString> getSystemText(int error);

@@ -25,4 +25,15 @@ size_t measureUTF8Character(std::string_view text) {
     return ch < smallest || ch > kMaxCodePoint || SUTF16Rules::isSurrogate(ch) ? 0 : size;
 }
 
+std::string makeValidUTF8(std::string_view text) {
+    std::string valid;
+    valid.reserve(text.size());
+    while (!text.empty()) {
+        const size_t size = measureUTF8Character(text);
+        valid.append(size ? text.substr(0, size) : "\xEF\xBF\xBD");
+        text.remove_prefix(size ? size : 1);
+    }
+    return valid;
+}
+
 } // namespace peru

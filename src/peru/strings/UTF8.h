@@ -4,6 +4,7 @@
 #include "peru/Api.h"
 
 #include <cstddef>
+#include <string>
 #include <string_view>
 
 namespace peru {
@@ -15,5 +16,8 @@ PERU_API size_t measureUTF8Character(std::string_view text);
 
 // The code point of a well-formed character of `size` bytes.
 char32_t decodeUTF8Character(const char* text, size_t size);
+
+// For display: every byte that is not part of a well-formed character becomes U+FFFD.
+PERU_API std::string makeValidUTF8(std::string_view text);
 
 } // namespace peru

@@ -1,4 +1,4 @@
-#include "peru/files/posix/ShellFolder.h"
+#include "peru/desktop/posix/ShellFolder.h"
 
 #include "support/Files.h"
 #include "support/TempFolder.h"

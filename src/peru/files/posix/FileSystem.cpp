@@ -4,10 +4,10 @@
 #include "peru/files/posix/FileOperations.h"
 #include "peru/files/posix/FileSystemFileObject.h"
 #include "peru/files/posix/FileTimes.h"
-#include "peru/files/posix/GObjectPointer.h"
 #include "peru/posix/PlatformFile.h"
 #include "peru/strings/IStringLocalizer.h"
 #include "peru/strings/StringFormat.h"
+#include "peru/system/IDesktop.h"
 #include "peru/system/IPathes.h"
 #include "peru/system/ISystem.h"
 
@@ -16,7 +16,6 @@
 #include <cstdlib>
 #include <fcntl.h>
 #include <filesystem>
-#include <gio/gio.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -99,12 +98,9 @@ void CFileSystem::deleteFolder(const P<IURI>& uri) {
 }
 
 void CFileSystem::deleteUndoable(const P<IURI>& uri) {
-    TGObject<GFile> file(g_file_new_for_path(toPath(uri).c_str()));
-    GError* error = nullptr;
-    if (g_file_trash(file.get(), nullptr, &error)) return;
-    CGError owner(error);
-    throw CFileError(format(localize("peru.CFileSystem.shellDeleteUndoable", "shell error %d"), error->code),
-                     uri);
+    if (const int error = getDesktop()->moveToTrash(toPath(uri)))
+        throw CFileError(format(localize("peru.CFileSystem.shellDeleteUndoable", "shell error %d"), error),
+                         uri);
 }
 
 void CFileSystem::copyFile(const P<IURI>& source, const P<IURI>& destination) {

@@ -2,15 +2,15 @@
 
 #include "peru/Errors.h"
 #include "peru/files/posix/FileTimes.h"
-#include "peru/files/posix/GObjectPointer.h"
 #include "peru/posix/PlatformFile.h"
 #include "peru/strings/IStringLocalizer.h"
+#include "peru/strings/UTF8.h"
+#include "peru/system/IDesktop.h"
 #include "peru/system/IPathes.h"
 
 #include <cerrno>
 #include <cstring>
 #include <fcntl.h>
-#include <gio/gio.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -91,15 +91,12 @@ P<IString> CFileSystemFileObject::getName() {
 }
 
 P<IString> CFileSystemFileObject::getDisplayName() {
-    CGText name(g_filename_display_name(getLastSegment(m_path).c_str()));
-    return CString::fromUTF8(name.get());
+    return CString::fromUTF8(makeValidUTF8(getLastSegment(m_path)));
 }
 
 P<IString> CFileSystemFileObject::getKind() {
     if (m_folder) return CString::fromUTF8("inode/directory");
-    CGText type(g_content_type_guess(m_path.c_str(), nullptr, 0, nullptr));
-    CGText mime(g_content_type_get_mime_type(type.get()));
-    return mime ? CString::fromUTF8(mime.get()) : CString::empty();
+    return CString::fromUTF8(getDesktop()->findKind(m_path));
 }
 
 P<IFileObjectCursor> CFileSystemFileObject::enumerate() {

@@ -7,7 +7,7 @@
 
 namespace peru::posix {
 
-class CFileTimes : public peru::CFileTimes {
+class PERU_API CFileTimes : public peru::CFileTimes {
 public:
     // `creation` is null if the file system does not record it. Times outside the range of peru::CFileTimes
     // (the years 1678 to 2261) are clamped to it.

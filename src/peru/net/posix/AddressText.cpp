@@ -1,10 +1,11 @@
 #include "peru/net/posix/AddressText.h"
 
+#include "peru/system/IDesktop.h"
 #include "peru/uri/URIEscapes.h"
 
+#include <algorithm>
 #include <arpa/inet.h>
 #include <charconv>
-#include <glib.h>
 #include <net/if.h>
 
 namespace peru::net::posix {
@@ -44,11 +45,8 @@ std::string getNetworkHost(const P<IURI>& uri) {
     if (host.starts_with('[')) return host.substr(1, host.size() - 2);
     for (const char c : host)
         if (static_cast<unsigned char>(c) <= ' ' || c == 0x7F) return {};
-    if (!g_hostname_is_non_ascii(host.c_str())) return host;
-    char* ascii = g_utf8_validate(host.c_str(), -1, nullptr) ? g_hostname_to_ascii(host.c_str()) : nullptr;
-    host = ascii ? ascii : "";
-    g_free(ascii);
-    return host;
+    const auto isAscii = [](char c) { return static_cast<unsigned char>(c) < 0x80; };
+    return std::all_of(host.begin(), host.end(), isAscii) ? host : getDesktop()->toASCIIHost(host);
 }
 
 } // namespace peru::net::posix

@@ -6,9 +6,9 @@
 #include "peru/net/ProxyRules.h"
 #include "peru/net/posix/AddressText.h"
 #include "peru/net/posix/BackgroundTask.h"
+#include "peru/system/IDesktop.h"
 
 #include <cstdlib>
-#include <gio/gio.h>
 
 namespace peru::net::posix {
 
@@ -46,15 +46,6 @@ bool isThisMachine(const P<IURI>& target) {
     return address && address->isLoopback();
 }
 
-Candidates askDesktop(const std::string& target) {
-    GProxyResolver* resolver = g_proxy_resolver_get_default();
-    char** found = resolver ? g_proxy_resolver_lookup(resolver, target.c_str(), nullptr, nullptr) : nullptr;
-    Candidates candidates;
-    for (char** entry = found; entry && *entry; ++entry) candidates.emplace_back(*entry);
-    g_strfreev(found);
-    return candidates;
-}
-
 const char* getNoProxy() {
     const char* list = std::getenv("no_proxy");
     if (!list) list = std::getenv("NO_PROXY");
@@ -74,7 +65,9 @@ P<IProxyLookUp> CProxyManager::startLookUp(const P<IURI>& target) {
         return make<CProxyLookUp>(CTask::finished({}), m_defaultPort);
     if (proxy) return make<CProxyLookUp>(CTask::finished({proxy}), m_defaultPort);
     return make<CProxyLookUp>(
-        CTask::start([text = CString::toStdString(target->getAsString())] { return askDesktop(text); }),
+        CTask::start([desktop = getDesktop(), text = CString::toStdString(target->getAsString())] {
+            return desktop->findProxies(text);
+        }),
         m_defaultPort);
 }
 

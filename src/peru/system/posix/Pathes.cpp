@@ -2,10 +2,10 @@
 
 #include "peru/Errors.h"
 #include "peru/GlobalObjFactory.h"
+#include "peru/strings/UTF8.h"
 #include "peru/uri/URI.h"
 
 #include <cstdlib>
-#include <glib.h>
 
 namespace peru::posix {
 namespace {
@@ -66,12 +66,7 @@ P<IString> CPathes::toPlatformPath(const P<IURI>& uri, bool forDisplay) {
     std::string path = CString::toStdString(uri->getUnescapedPath());
     // A path ends at its first zero byte, so such a URI would name a different file.
     if (path.find('\0') != std::string::npos) return CString::empty();
-    if (forDisplay && !g_utf8_validate(path.data(), static_cast<gssize>(path.size()), nullptr)) {
-        char* valid = g_utf8_make_valid(path.data(), static_cast<gssize>(path.size()));
-        path = valid;
-        g_free(valid);
-    }
-    return CString::fromUTF8(path);
+    return CString::fromUTF8(forDisplay ? makeValidUTF8(path) : path);
 }
 
 P<IURI> CPathes::fromPlatformPath(const CStringArg& path) {

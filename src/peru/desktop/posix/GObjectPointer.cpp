@@ -1,4 +1,4 @@
-#include "peru/files/posix/GObjectPointer.h"
+#include "peru/desktop/posix/GObjectPointer.h"
 
 #include <gio/gio.h>
 

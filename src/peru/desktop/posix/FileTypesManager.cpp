@@ -1,19 +1,13 @@
-#include "peru/files/posix/FileTypesManager.h"
+#include "peru/desktop/posix/FileTypesManager.h"
 
-#include "peru/GlobalObjFactory.h"
+#include "peru/desktop/posix/GObjectPointer.h"
 #include "peru/strings/IStringLocalizer.h"
 
 #include <gio/gio.h>
-#include <memory>
 
 namespace peru::posix {
 
 namespace {
-
-struct SFree {
-    void operator()(char* text) const { g_free(text); }
-};
-using CText = std::unique_ptr<char, SFree>;
 
 class CFileType : public CObject, public IFileType {
 public:
@@ -69,9 +63,9 @@ EFileCategory findCategory(const char* contentType, const P<CMimeType>& mimeType
 }
 
 CFileType::CFileType(const P<IString>& extension, const char* contentType) : m_extension(extension) {
-    const CText description(g_content_type_get_description(contentType));
-    const CText mimeType(g_content_type_get_mime_type(contentType));
-    const CText genericIcon(g_content_type_get_generic_icon_name(contentType));
+    const CGText description(g_content_type_get_description(contentType));
+    const CGText mimeType(g_content_type_get_mime_type(contentType));
+    const CGText genericIcon(g_content_type_get_generic_icon_name(contentType));
     m_description = toString(description.get());
     m_iconName = findIconName(contentType, genericIcon.get());
     m_mimeType = CMimeType::parse(toString(mimeType ? mimeType.get() : "application/octet-stream"));
@@ -87,9 +81,10 @@ P<IFileType> CFileTypesManager::getFileType(const CStringArg& extension) {
     if (name.starts_with('.')) name.erase(0, 1);
     const P<IString> key = CString::fromUTF8(name)->toLower();
     // An empty extension must not be looked up: the guess would be made from the name alone.
-    const CText contentType(name.empty() ? g_strdup("application/octet-stream")
-                                         : g_content_type_guess(("name." + CString::toStdString(key)).c_str(),
-                                                                nullptr, 0, nullptr));
+    const CGText contentType(
+        name.empty()
+            ? g_strdup("application/octet-stream")
+            : g_content_type_guess(("name." + CString::toStdString(key)).c_str(), nullptr, 0, nullptr));
     return make<CFileType>(key, contentType.get());
 }
 
@@ -114,13 +109,3 @@ P<IString> CFileTypesManager::getCategoryName(EFileCategory category) {
 }
 
 } // namespace peru::posix
-
-namespace peru {
-
-P<IFileTypesManager> getFileTypesManager() {
-    static const CGlobalObjFactory::SKey key;
-    return CGlobalObjFactory::get<IFileTypesManager>(
-        key, []() -> P<IFileTypesManager> { return make<posix::CFileTypesManager>(); });
-}
-
-} // namespace peru

@@ -1,8 +1,8 @@
 // The desktop's view of files through GIO, including locations that are not on disk.
 #pragma once
 
+#include "peru/desktop/posix/GObjectPointer.h"
 #include "peru/files/IFileObject.h"
-#include "peru/files/posix/GObjectPointer.h"
 
 namespace peru::posix {
 
