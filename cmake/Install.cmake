@@ -39,6 +39,15 @@ if(internal_libraries)
     )
 endif()
 install(TARGETS ${plugins} LIBRARY DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER} COMPONENT libraries)
+if(NOT CMAKE_CROSSCOMPILING)
+    foreach(plugin ${plugins})
+        install(
+            FILES ${TONEWRIGHT_LIBRARY_DIR}/${plugin}.plugin
+            DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER}
+            COMPONENT libraries
+        )
+    endforeach()
+endif()
 install(TARGETS ${companions} RUNTIME DESTINATION ${TONEWRIGHT_COMPANION_FOLDER} COMPONENT libraries)
 install(TARGETS tonewright_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT program)
 install(

@@ -143,4 +143,13 @@ function(tw_plugin name)
     # The libraries are in the parent folder of an installed plug-in and next to one in the build tree.
     set_target_properties(${name} PROPERTIES INSTALL_RPATH "$ORIGIN/..;$ORIGIN")
     set_property(GLOBAL APPEND PROPERTY TONEWRIGHT_PLUGINS ${name})
+    # The description names the library that it belongs to by its build ID. Without one, such as for another processor,
+    # the plug-in is loaded at start-up.
+    target_link_options(${name} PRIVATE -Wl,--build-id)
+    if(NOT CMAKE_CROSSCOMPILING)
+        add_custom_command(
+            TARGET ${name} POST_BUILD COMMAND plugin_describer $<TARGET_FILE:${name}>
+            BYPRODUCTS ${TONEWRIGHT_LIBRARY_DIR}/${name}.plugin VERBATIM
+        )
+    endif()
 endfunction()

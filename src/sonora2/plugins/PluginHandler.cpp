@@ -11,6 +11,7 @@
 #include "sonora2/boxed/PluginModuleBoxed.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
+#include "sonora2/plugins/DescribedPlugin.h"
 #include "sonora2/plugins/ParameterRecord.h"
 #include "sonora2/plugins/PluginExtensions.h"
 #include "sonora2/plugins/PluginModule.h"
@@ -93,6 +94,15 @@ bool contains(IPluginExtensions& extensions, const P<IString>& key) {
     return false;
 }
 
+// A described plug-in is loaded when it is needed: the library of its codec may take longer to load than a
+// small file takes to convert.
+P<ISonoraPlugin> openPlugin(const P<ISonoraContext>& context, const P<IURI>& library) {
+    const std::string path = CString::toStdString(peru::getPathes()->toPlatformPath(library));
+    if (std::optional<SPluginDescription> description = findDescription(path))
+        return peru::make<CDescribedPlugin>(context, library, *std::move(description));
+    return peru::make<CPluginModule>(context, library);
+}
+
 } // namespace
 
 CPluginHandler::CPluginHandler(const P<ISonoraContext>& context, bool boxed,
@@ -112,14 +122,13 @@ void CPluginHandler::loadPlugin(const peru::CStringArg& name) {
         const P<IString> fileName = peru::format(kLibraryNameFormat, name);
         const P<IURI> library = findLibrary(fileName);
         if (!library) throw CSonoraError(peru::format("could not load plugin: %s", fileName));
-        const P<ISonoraPlugin> module = peru::make<CPluginModule>(m_context, library);
+        const P<ISonoraPlugin> module = openPlugin(m_context, library);
         if (m_boxed || isBoxedPlugin(m_context, name))
             addPlugin(makeBoxed(*module, library), module);
         else
             addPlugin(module, module);
     } catch (const peru::CException& e) {
-        log(kSeverityWarning,
-            peru::format("Error while loading DLL: %s - %s", e.getTitle(), e.getDescription()));
+        logLoadFailure(m_context, e);
     }
 }
 
