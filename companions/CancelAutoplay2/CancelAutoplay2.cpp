@@ -1,58 +1,37 @@
-// Usage: CancelAutoplay2 PID dummy. Keeps the desktop session from mounting media automatically while the
-// process PID is running. Without a session, or if it does not respond, it only waits for that process.
+// Usage: CancelAutoplay2 PID dummy. Becomes CancelAutoplay2Session once the process PID has been running for
+// a while: most processes end before a disc can be inserted, and the libraries that talk to the session take
+// longer to load than a short job.
 #include <cerrno>
+#include <climits>
 #include <csignal>
+#include <cstdio>
 #include <cstdlib>
-
-#include <gio/gio.h>
-#include <glib-unix.h>
+#include <cstring>
+#include <poll.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
 namespace {
 
-constexpr guint32 kInhibitAutoMount = 16;
-constexpr int kAnswerTimeout = 5000; // milliseconds
+constexpr int kDelay = 300; // milliseconds
+constexpr int kInterval = 1000;
 
-// The address of the session bus, or null if there is none. Asking GIO for the bus would start one.
-gchar* findSessionBus() {
-    if (const char* address = g_getenv("DBUS_SESSION_BUS_ADDRESS"); address && *address)
-        return g_strdup(address);
-    gchar* socket = g_build_filename(g_get_user_runtime_dir(), "bus", nullptr);
-    gchar* address =
-        g_file_test(socket, G_FILE_TEST_EXISTS) ? g_strconcat("unix:path=", socket, nullptr) : nullptr;
-    g_free(socket);
-    return address;
+// Whether the process has ended after at most so many milliseconds. `process` is its descriptor, or -1 if the
+// kernel has none.
+bool hasEnded(pid_t id, int process, int milliseconds) {
+    pollfd wanted{process, POLLIN, 0};
+    if (::poll(&wanted, 1, milliseconds) > 0) return true;
+    return process < 0 && ::kill(id, 0) != 0 && errno == ESRCH;
 }
 
-// The inhibition lasts as long as the connection, that is, until this process ends.
-void onConnected(GObject*, GAsyncResult* result, gpointer) {
-    GDBusConnection* bus = g_dbus_connection_new_for_address_finish(result, nullptr);
-    if (!bus) return;
-    g_dbus_connection_set_exit_on_close(bus, FALSE);
-    g_dbus_connection_call(
-        bus, "org.gnome.SessionManager", "/org/gnome/SessionManager", "org.gnome.SessionManager", "Inhibit",
-        g_variant_new("(susu)", "CancelAutoplay2", guint32{0}, "Discs are in use by the audio suite",
-                      kInhibitAutoMount),
-        G_VARIANT_TYPE("(u)"), G_DBUS_CALL_FLAGS_NO_AUTO_START, kAnswerTimeout, nullptr, nullptr, nullptr);
-}
-
-gboolean onParentEnded(gint, GIOCondition, gpointer loop) {
-    g_main_loop_quit(static_cast<GMainLoop*>(loop));
-    return G_SOURCE_REMOVE;
-}
-
-struct SWatch {
-    pid_t parent;
-    GMainLoop* loop;
-};
-
-// For kernels without process file descriptors.
-gboolean lookForParent(gpointer data) {
-    auto* watch = static_cast<SWatch*>(data);
-    if (kill(watch->parent, 0) == 0 || errno != ESRCH) return G_SOURCE_CONTINUE;
-    g_main_loop_quit(watch->loop);
-    return G_SOURCE_REMOVE;
+// Returns if that program is missing.
+void becomeSession(char** arguments) {
+    char path[PATH_MAX];
+    const ssize_t length = ::readlink("/proc/self/exe", path, sizeof path);
+    constexpr char kSuffix[] = "Session";
+    if (length <= 0 || static_cast<size_t>(length) + sizeof kSuffix > sizeof path) return;
+    std::memcpy(path + length, kSuffix, sizeof kSuffix);
+    ::execv(path, arguments);
 }
 
 } // namespace
@@ -61,29 +40,15 @@ int main(int argc, char** argv) {
     char* end = nullptr;
     const long parent = argc > 1 ? std::strtol(argv[1], &end, 10) : 0;
     if (parent <= 0 || *end != '\0') {
-        g_printerr("usage: CancelAutoplay2 PROCESS-ID dummy\n");
+        std::fputs("usage: CancelAutoplay2 PROCESS-ID dummy\n", stderr);
         return 2;
     }
-
-    GMainLoop* loop = g_main_loop_new(nullptr, FALSE);
-    SWatch watch{static_cast<pid_t>(parent), loop};
-    const int process = static_cast<int>(syscall(SYS_pidfd_open, watch.parent, 0));
-    if (process >= 0)
-        g_unix_fd_add(process, G_IO_IN, onParentEnded, loop);
-    else if (errno == ESRCH)
-        return 0;
-    else
-        g_timeout_add_seconds(1, lookForParent, &watch);
-
-    if (gchar* address = findSessionBus()) {
-        g_dbus_connection_new_for_address(
-            address,
-            static_cast<GDBusConnectionFlags>(G_DBUS_CONNECTION_FLAGS_AUTHENTICATION_CLIENT |
-                                              G_DBUS_CONNECTION_FLAGS_MESSAGE_BUS_CONNECTION),
-            nullptr, nullptr, onConnected, nullptr);
-        g_free(address);
+    const auto id = static_cast<pid_t>(parent);
+    const int process = static_cast<int>(::syscall(SYS_pidfd_open, id, 0)); // closed by exec
+    if (process < 0 && errno == ESRCH) return 0;
+    if (hasEnded(id, process, kDelay)) return 0;
+    becomeSession(argv);
+    while (!hasEnded(id, process, kInterval)) {
     }
-    g_main_loop_run(loop);
-    g_main_loop_unref(loop);
     return 0;
 }
