@@ -65,11 +65,18 @@ std::string getFolderOf(const std::string& file) {
 }
 
 // The folder of libperu.so; empty if the loader does not know it.
-std::string getLibraryFolder() {
+std::string findLibraryFolder() {
     Dl_info info;
     if (!::dladdr(reinterpret_cast<void*>(&getSystem), &info) || !info.dli_fname) return "";
     std::string file = getRealPath(info.dli_fname);
     return file.empty() ? "" : getFolderOf(file);
+}
+
+// Found once: start-up asks for each plug-in.
+const std::string& getLibraryFolder() {
+    // Never destroyed: threads that outlive the singletons may ask.
+    static const std::string& s_folder = *new std::string(findLibraryFolder());
+    return s_folder;
 }
 
 // The library is in "lib", "lib64" or an architecture's folder below it; the parent folder is the prefix.
@@ -136,7 +143,7 @@ std::vector<P<IURI>> CSystem::getSearchFolders(const char* environmentVariable, 
         if (end > start) enter(list.substr(start, end - start));
         start = end + 1;
     }
-    std::string libraryFolder = getLibraryFolder();
+    const std::string& libraryFolder = getLibraryFolder();
     if (!libraryFolder.empty()) {
         enter(libraryFolder);
         if (installed && *installed) enter(joinPath(getInstallationPrefix(libraryFolder), installed));
