@@ -14,6 +14,7 @@ import tempfile
 import time
 
 from playing import bench_playing
+from startup import bench_startup
 
 SOUNDS = sorted(pathlib.Path("/usr/share/sounds/alsa").glob("*.wav")) + sorted(
     pathlib.Path("/usr/share/sounds/freedesktop/stereo").glob("*.oga")
@@ -235,7 +236,7 @@ def main():
     parser.add_argument("build", type=pathlib.Path)
     parser.add_argument("--minutes", type=int, default=10, help="length of the material")
     parser.add_argument("--repeat", type=int, default=3, help="runs of each job, interleaved with its peer")
-    parser.add_argument("--only", default="", help="only jobs whose name contains this text; \"tags\", \"mixing\", \"discs\" and \"playing\" select those groups")
+    parser.add_argument("--only", default="", help="only jobs whose name contains this text; \"start-up\", \"tags\", \"mixing\", \"discs\" and \"playing\" select those groups")
     arguments = parser.parse_args()
 
     host = arguments.build / "bin/tonewright"
@@ -277,6 +278,8 @@ def main():
         )
         show(our_command, peer_command)
 
+    if arguments.only.lower() in "start-up":
+        bench_startup(host, work)
     if arguments.only.lower() in "tags":
         bench_tags(host, work, wav, arguments.repeat)
     if arguments.only.lower() in "mixing":
