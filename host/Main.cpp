@@ -12,10 +12,13 @@
 #include "parser/Parser.h"
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <iterator>
 #include <limits>
 #include <map>
+#include <string_view>
 #include <tonewright/host.h>
 
 namespace {
@@ -26,6 +29,27 @@ const std::map<std::string, int32_t> kLogLevels{
     {"trace", TONEWRIGHT_LOG_TRACE},     {"debug", TONEWRIGHT_LOG_DEBUG},
     {"info", TONEWRIGHT_LOG_INFO},       {"warning", TONEWRIGHT_LOG_WARNING},
     {"error", TONEWRIGHT_LOG_EXCEPTION}, {"off", std::numeric_limits<int32_t>::max()}};
+
+// Adds the named command alone, since describing the options of all takes as long as a short job. Without a
+// command of that name, adds all.
+void addCommands(CLI::App& app, Run& run, std::string_view name) {
+    struct SCommand {
+        const char* name;
+        void (*add)(CLI::App&, Run&);
+    };
+    constexpr SCommand kCommands[] = {{"convert", addConvert},   {"info", addInfo},
+                                      {"formats", addFormats},   {"waveform", addWaveform},
+                                      {"loudness", addLoudness}, {"devices", addDevices},
+                                      {"play", addPlay},         {"mix", addMix},
+                                      {"record", addRecord},     {"tag", addTag},
+                                      {"drives", addDrives},     {"disc", addDisc},
+                                      {"rip", addRip},           {"burn", addBurn},
+                                      {"cddb", addCddb},         {"get", addGet}};
+    const bool isKnown = std::any_of(std::begin(kCommands), std::end(kCommands),
+                                     [&](const SCommand& each) { return name == each.name; });
+    for (const SCommand& each : kCommands)
+        if (!isKnown || name == each.name) each.add(app, run);
+}
 
 // Exceptions that the commands do not catch are failures of the job, not of loading the library.
 int runCommand(const Run& run, CLibrary& library) {
@@ -75,9 +99,7 @@ int main(int argc, char** argv) {
            "cannot be loaded or started, 130 stopped by Ctrl-C."));
 
     Run run;
-    for (const auto add : {addConvert, addInfo, addFormats, addWaveform, addLoudness, addDevices, addPlay,
-                           addMix, addRecord, addTag, addDrives, addDisc, addRip, addBurn, addCddb, addGet})
-        add(app, run);
+    addCommands(app, run, argc > 1 ? argv[1] : "");
     if (const std::optional<int> code = parseArguments(app, argc, argv)) return *code;
 
     // Other programs stop reading the fields of a WAV file at one of odd length without padding.
