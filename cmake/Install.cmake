@@ -14,6 +14,7 @@ set(doc_dir ${CMAKE_INSTALL_DATAROOTDIR}/doc)
 get_property(libraries GLOBAL PROPERTY TONEWRIGHT_LIBRARIES)
 get_property(internal_libraries GLOBAL PROPERTY TONEWRIGHT_INTERNAL_LIBRARIES)
 get_property(plugins GLOBAL PROPERTY TONEWRIGHT_PLUGINS)
+get_property(descriptions GLOBAL PROPERTY TONEWRIGHT_PLUGIN_DESCRIPTIONS)
 get_property(companions GLOBAL PROPERTY TONEWRIGHT_COMPANIONS)
 
 set(c_libraries tonewright tonewright_host_support discio2)
@@ -39,15 +40,7 @@ if(internal_libraries)
     )
 endif()
 install(TARGETS ${plugins} LIBRARY DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER} COMPONENT libraries)
-if(NOT CMAKE_CROSSCOMPILING)
-    foreach(plugin ${plugins})
-        install(
-            FILES ${TONEWRIGHT_LIBRARY_DIR}/${plugin}.plugin
-            DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER}
-            COMPONENT libraries
-        )
-    endforeach()
-endif()
+install(FILES ${descriptions} DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER} COMPONENT libraries)
 install(TARGETS ${companions} RUNTIME DESTINATION ${TONEWRIGHT_COMPANION_FOLDER} COMPONENT libraries)
 install(TARGETS tonewright_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT program)
 install(

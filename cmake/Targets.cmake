@@ -26,8 +26,9 @@ macro(tw_sources variable)
     endforeach()
 endmacro()
 
-# A library binds its own functions at link time: fewer relocations at start-up, and no other library can replace them.
-set(TONEWRIGHT_LINK_STRICTLY -Wl,-Bsymbolic-functions)
+# A library binds its own functions and type information at link time: fewer searches for symbols at start-up, and no
+# other library can replace them. Types are compared by name, and no library exports variables.
+set(TONEWRIGHT_LINK_STRICTLY -Wl,-Bsymbolic)
 # An undefined symbol fails the build instead of the first call. Sanitizer runtimes are only linked into the
 # executable, so their symbols are undefined here.
 if(NOT TONEWRIGHT_SANITIZERS)
@@ -151,5 +152,6 @@ function(tw_plugin name)
             TARGET ${name} POST_BUILD COMMAND plugin_describer $<TARGET_FILE:${name}>
             BYPRODUCTS ${TONEWRIGHT_LIBRARY_DIR}/${name}.plugin VERBATIM
         )
+        set_property(GLOBAL APPEND PROPERTY TONEWRIGHT_PLUGIN_DESCRIPTIONS ${TONEWRIGHT_LIBRARY_DIR}/${name}.plugin)
     endif()
 endfunction()
