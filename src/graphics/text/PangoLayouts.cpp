@@ -85,11 +85,17 @@ void addStyle(CAttributes& attributes, PangoContext* context, const STextRun& ru
         attributes.add(pango_attr_rise_new(static_cast<int>(getRise(context, run) * PANGO_SCALE)));
 }
 
-void addImage(CAttributes& attributes, const STextRun& run, EEffect effect,
-              std::vector<std::unique_ptr<SInlineImage>>& images) {
-    images.push_back(std::make_unique<SInlineImage>(
-        SInlineImage{effect == EEffect::none ? run.image : applyEffect(*run.image, effect),
-                     run.imageSize.width * kUnitsPerMillimetre, run.imageSize.height * kUnitsPerMillimetre}));
+void addImage(CAttributes& attributes, const STextRun& run, EEffect effect, CTextLayout::SImpl& target) {
+    P<CBitmap> bitmap = run.image;
+    if (effect != EEffect::none) {
+        // Images are laid out twice: to find the lines, and in their line.
+        P<CBitmap>& changed = target.changedBitmaps[run.image.get()];
+        if (!changed) changed = applyEffect(*run.image, effect);
+        bitmap = changed;
+    }
+    auto& images = target.images;
+    images.push_back(std::make_unique<SInlineImage>(SInlineImage{
+        bitmap, run.imageSize.width * kUnitsPerMillimetre, run.imageSize.height * kUnitsPerMillimetre}));
     const SInlineImage& image = *images.back();
     const PangoRectangle rect{0, static_cast<int>(-image.height * PANGO_SCALE),
                               static_cast<int>(image.width * PANGO_SCALE),
@@ -151,7 +157,7 @@ void prepareText(STextRun& run) {
 }
 
 Layout makePangoLayout(PangoContext* context, const SParagraph& paragraph, const std::vector<STextRun>& runs,
-                       EEffect effect, std::vector<std::unique_ptr<SInlineImage>>& images) {
+                       EEffect effect, CTextLayout::SImpl& target) {
     Layout layout(pango_layout_new(context));
     pango_layout_set_font_description(layout.get(),
                                       makeDescription(paragraph.font, paragraph.fontScale).get());
@@ -163,7 +169,7 @@ Layout makePangoLayout(PangoContext* context, const SParagraph& paragraph, const
         if (text.size() == begin) continue;
         attributes.setRange(begin, text.size());
         if (run.image)
-            addImage(attributes, run, effect, images);
+            addImage(attributes, run, effect, target);
         else
             addStyle(attributes, context, run, effect);
     }

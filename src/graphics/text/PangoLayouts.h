@@ -5,6 +5,8 @@
 
 #include <pango/pangocairo.h>
 
+#include <map>
+
 namespace graphics {
 
 // Layouts are computed at this many units per millimetre, since glyph positions are rounded to fractions of a
@@ -37,8 +39,9 @@ struct CTextLayout::SImpl {
     };
 
     std::vector<std::unique_ptr<SInlineImage>> images;
-    std::vector<SBlock> blocks; // lines and bullets
-    double width = 0;           // units, as the height
+    std::map<const CBitmap*, P<CBitmap>> changedBitmaps; // with the effect, by the bitmaps of the paragraphs
+    std::vector<SBlock> blocks;                          // lines and bullets
+    double width = 0;                                    // units, as the height
     double height = 0;
     size_t textLeft = kMaximalText; // bytes that may still be laid out
 };
@@ -54,8 +57,8 @@ SFontHeight getFontHeight(PangoContext* context, const SFont& font, double scale
 // Replaces the text by what is laid out: capitals, and the character that stands for an image. Invalid bytes
 // are replaced as well, since a layout would drop the whole text.
 void prepareText(STextRun& run);
-// One line of text that was prepared. The images are added to the list.
+// One line of text that was prepared. The images are added to the target.
 Layout makePangoLayout(PangoContext* context, const SParagraph& paragraph, const std::vector<STextRun>& runs,
-                       EEffect effect, std::vector<std::unique_ptr<SInlineImage>>& images);
+                       EEffect effect, CTextLayout::SImpl& target);
 
 } // namespace graphics

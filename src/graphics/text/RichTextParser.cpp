@@ -22,6 +22,7 @@ constexpr double kSmallCapitalsScale = 0.75;
 constexpr double kMillimetresPerPixel = 25.4 / 96;
 constexpr double kMaximalLength = 10000; // millimetres
 constexpr size_t kMaximalTabs = 1000;
+constexpr size_t kMaximalRuns = 5'000;        // of a paragraph
 constexpr size_t kMaximalParagraphs = 10'000; // as many as lines are laid out
 
 enum ETextEffect : int {
@@ -234,6 +235,7 @@ void readParagraph(const wxXmlNode& node, const SStyle& style, std::vector<SPara
     bool hasObjects = false;
     for (const wxXmlNode* child = node.GetChildren(); child; child = child->GetNext()) {
         if (child->GetType() != wxXML_ELEMENT_NODE) continue;
+        if (paragraph.runs.size() >= kMaximalRuns) break;
         const wxString& name = child->GetName();
         if (name == "text" || name == "symbol") {
             std::string text = name == "text" ? unquote(getText(*child)) : readSymbol(*child);

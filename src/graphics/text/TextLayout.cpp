@@ -126,7 +126,7 @@ private:
     }
 
     Layout makeLayout(const Runs& runs) {
-        Layout layout = makePangoLayout(m_context, m_paragraph, runs, m_effect, m_target.images);
+        Layout layout = makePangoLayout(m_context, m_paragraph, runs, m_effect, m_target);
         setTabs(layout.get(), m_tabs);
         return layout;
     }
@@ -153,8 +153,7 @@ private:
 
     // On the baseline of the first line.
     void addBullet(PangoLayout* line) {
-        Layout bullet =
-            makePangoLayout(m_context, m_paragraph, m_paragraph.bullet, m_effect, m_target.images);
+        Layout bullet = makePangoLayout(m_context, m_paragraph, m_paragraph.bullet, m_effect, m_target);
         PangoRectangle extents;
         pango_layout_get_extents(bullet.get(), nullptr, &extents);
         const double room = std::max(0.0, m_subIndent - toUnits(extents.width));
