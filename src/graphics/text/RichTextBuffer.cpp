@@ -14,8 +14,20 @@ namespace graphics {
 
 namespace {
 
-// Images inside of texts are PNG files, which the toolkit reads and writes through its list of handlers.
-void addImageHandler() {
+// What the toolkit registers when it starts, for processes that have not started it: reading a text without
+// the names of its nodes would silently give an empty buffer. Images inside of texts are PNG files.
+void prepareToolkit() {
+    static constexpr std::pair<const char*, const char*> kClasses[] = {
+        {"text", "wxRichTextPlainText"},
+        {"symbol", "wxRichTextPlainText"},
+        {"image", "wxRichTextImage"},
+        {"paragraph", "wxRichTextParagraph"},
+        {"paragraphlayout", "wxRichTextParagraphLayoutBox"},
+        {"textbox", "wxRichTextBox"},
+        {"cell", "wxRichTextCell"},
+        {"table", "wxRichTextTable"},
+        {"field", "wxRichTextField"}};
+    for (const auto& [node, name] : kClasses) wxRichTextXMLHandler::RegisterNodeName(node, name);
     if (!wxImage::FindHandler(wxBITMAP_TYPE_PNG)) wxImage::AddHandler(new wxPNGHandler);
 }
 
@@ -23,7 +35,7 @@ void addImageHandler() {
 
 std::unique_ptr<wxRichTextBuffer> toRichTextBuffer(const CRichText& text) {
     parseXml(text); // for its limits
-    addImageHandler();
+    prepareToolkit();
     const wxLogNull quiet;
     wxMemoryInputStream stream(text.GetXml().data(), text.GetXml().size());
     auto buffer = std::make_unique<wxRichTextBuffer>();
@@ -36,7 +48,7 @@ std::unique_ptr<wxRichTextBuffer> toRichTextBuffer(const CRichText& text) {
 }
 
 P<CRichText> fromRichTextBuffer(wxRichTextBuffer& buffer) {
-    addImageHandler();
+    prepareToolkit();
     const wxLogNull quiet;
     wxMemoryOutputStream stream;
     if (!wxRichTextXMLHandler().SaveFile(&buffer, stream)) throwNotWritten();
