@@ -164,7 +164,7 @@ TEST(ProjectFaults, ErrorsNameTheEntryOrElement) {
         {"PK", "project.xml"},
         {withXml("<theme/>"), "project.xml.*project"},
         {withXml("<project><disc>"), "project.xml.*line"},
-        {withXml("<project>" + std::string(65 << 20, ' ')), "project.xml.* too large"},
+        {withXml("<project>" + std::string(65 << 20, ' ')), "project.xml.* too large"}, // 200 kB
         {withXml(image("<size width=\"1,5\"/>")), "1,5.*width.*size"},
         {"<project version=\"two\"/>", "two.*version.*project"},
         {withXml(attached), "image3.png"},

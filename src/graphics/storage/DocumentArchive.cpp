@@ -17,13 +17,21 @@ namespace {
 
 constexpr int kCompressionLevel = 9;
 // The tree of a document takes several times the memory of its text.
-constexpr size_t kMaximalXml = 64 << 20;                   // bytes, without attachments
-constexpr size_t kMaximalXmlWithAttachments = 2047u << 20; // what a string can hold
-constexpr int64_t kMaximalMarkup = 4'000'000;              // tags and attributes
+constexpr size_t kMaximalXml = 64 << 20; // bytes, without attachments
+constexpr size_t kMaximalXmlWithAttachments = 1024 << 20;
+constexpr int64_t kMaximalMarkup = 4'000'000; // tags and attributes
 
 bool hasTooMuchMarkup(const std::string& xml) {
     return std::count_if(xml.begin(), xml.end(), [](char ch) { return ch == '<' || ch == '='; }) >
            kMaximalMarkup;
+}
+
+// Also when writing: a file that cannot be opened again would be a loss.
+void checkLimits(const std::string& xml, size_t limit, const std::string& name) {
+    if (xml.size() > limit || hasTooMuchMarkup(xml))
+        throw peru::CError(peru::localize("graphics.DocumentArchive.TooLarge",
+                                          "The XML \"%NAME%\" is too large.",
+                                          {{"%NAME%", peru::CString::fromUTF8(name)}}));
 }
 
 P<peru::CXmlDocument> parse(const char* root, const std::string& bytes, size_t limit,
@@ -33,8 +41,7 @@ P<peru::CXmlDocument> parse(const char* root, const std::string& bytes, size_t l
             key, text,
             {{"%NAME%", peru::CString::fromUTF8(name)}, {"%ROOT%", root}, {"%DETAILS%", details}}));
     };
-    if (bytes.size() > limit || hasTooMuchMarkup(bytes))
-        fail("graphics.DocumentArchive.TooLarge", "The XML \"%NAME%\" is too large.", peru::CString::empty());
+    checkLimits(bytes, limit, name);
     auto document = peru::make<peru::CXmlDocument>();
     try {
         const auto block = peru::make<peru::CMemoryBlock>(static_cast<int64_t>(bytes.size()));
@@ -63,8 +70,11 @@ std::string WriteArchive(const SArchiveForm& form, const SaveContent& save, bool
         for (const SArchiveEntry& entry : entries) resources->WriteEntry(entry.name, entry.bytes);
         const auto document = peru::make<peru::CXmlDocument>();
         save(document->addChildNode(form.root), *resources);
-        resources->WriteEntry(form.entry, peru::CString::toStdString(document->printToString()));
-        if (!archive.Close())
+        const std::string xml = peru::CString::toStdString(document->printToString());
+        checkLimits(xml, kMaximalXml, form.entry);
+        resources->WriteEntry(form.entry, xml);
+        if (!archive.Close() || resources->GetDeflatedSize() >
+                                    CZipCatalogue::GetInflatedLimit(static_cast<int64_t>(memory.GetSize())))
             throw peru::CError(
                 peru::localize("graphics.DocumentArchive.NotWritten", "The archive could not be written."));
     }
@@ -87,7 +97,9 @@ std::string WriteXml(const char* root, const SaveContent& save, CBase64Resources
     const auto document = peru::make<peru::CXmlDocument>();
     const auto resources = peru::make<CBase64Resources>(mode);
     save(document->addChildNode(root), *resources);
-    return peru::CString::toStdString(document->printToString());
+    std::string xml = peru::CString::toStdString(document->printToString());
+    checkLimits(xml, kMaximalXmlWithAttachments, "XML");
+    return xml;
 }
 
 void ReadXml(const char* root, const std::string& bytes, const LoadContent& load,

@@ -23,8 +23,11 @@ namespace {
 
 CZipCatalogue::CZipCatalogue(std::string archive)
     : m_archive(std::move(archive)),
-      m_maximalTotal(std::clamp(static_cast<int64_t>(m_archive.size()) * kMaximalExpansion, kMinimalTotal,
-                                kMaximalTotal)) {}
+      m_maximalTotal(GetInflatedLimit(static_cast<int64_t>(m_archive.size()))) {}
+
+int64_t CZipCatalogue::GetInflatedLimit(int64_t archiveSize) {
+    return std::clamp(archiveSize * kMaximalExpansion, kMinimalTotal, kMaximalTotal);
+}
 
 CZipCatalogue::~CZipCatalogue() = default;
 
@@ -74,8 +77,7 @@ std::string CZipCatalogue::ReadEntry(const std::string& name, int64_t maximalSiz
         fail("graphics.CZipCatalogue.Damaged", "The entry \"%NAME%\" of the archive is damaged.", name);
     };
     if (const auto stored = findStored(*m_entries.at(name))) {
-        m_total += static_cast<int64_t>(stored->size());
-        if (static_cast<int64_t>(stored->size()) > maximalSize || m_total > m_maximalTotal) tooLarge();
+        if (static_cast<int64_t>(stored->size()) > maximalSize) tooLarge();
         return std::string(*stored);
     }
     if (!m_zip->OpenEntry(*m_entries.at(name))) damaged();

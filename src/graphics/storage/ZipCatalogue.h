@@ -23,6 +23,8 @@ public:
     static constexpr int64_t kMaximalExpansion = 20;       // larger ones by this factor,
     static constexpr int64_t kMaximalTotal = 2048ll << 20; // but no archive further than this
 
+    static int64_t GetInflatedLimit(int64_t archiveSize);
+
     // An archive that cannot be read has no entries.
     explicit CZipCatalogue(std::string archive);
     ~CZipCatalogue() override;
@@ -66,7 +68,7 @@ private:
     std::map<std::string, P<CBitmap>> m_bitmaps; // by entry, so that elements share them
     CLoadedResources m_resources;
     CLoadReports m_reports;
-    int64_t m_total = 0; // bytes unpacked
+    int64_t m_total = 0; // bytes inflated
     const int64_t m_maximalTotal;
     bool m_isRead = false;
 };

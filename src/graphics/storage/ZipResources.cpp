@@ -2,6 +2,7 @@
 
 #include "graphics/storage/BitmapFormats.h"
 #include "graphics/storage/XmlValues.h"
+#include "graphics/storage/ZipCatalogue.h"
 #include "peru/Errors.h"
 #include "peru/strings/IStringLocalizer.h"
 
@@ -22,9 +23,12 @@ void CZipResources::WriteEntry(const std::string& name, std::string_view bytes) 
     m_names.insert(name);
     auto entry = std::make_unique<wxZipEntry>(wxString::FromUTF8(name), wxDateTime(1, wxDateTime::Jan, 1990));
     // Deflating a compressed picture again takes time and saves nothing.
-    if (isCompressed(getFormatOfFile(name))) entry->SetMethod(wxZIP_METHOD_STORE);
-    if (m_archive.PutNextEntry(entry.release()) && m_archive.WriteAll(bytes.data(), bytes.size()) &&
-        m_archive.CloseEntry())
+    const bool isStored = isCompressed(getFormatOfFile(name));
+    if (isStored) entry->SetMethod(wxZIP_METHOD_STORE);
+    const auto size = static_cast<int64_t>(bytes.size());
+    if (!isStored) m_deflatedSize += size;
+    if (size <= CZipCatalogue::kMaximalEntry && m_archive.PutNextEntry(entry.release()) &&
+        m_archive.WriteAll(bytes.data(), bytes.size()) && m_archive.CloseEntry())
         return;
     throw peru::CError(peru::localize("graphics.CZipResources.NotWritten",
                                       "The entry \"%NAME%\" could not be written to the archive.",

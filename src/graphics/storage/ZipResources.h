@@ -27,7 +27,10 @@ public:
     bool IsLossless() const override { return m_isLossless; }
 
     // With a fixed date: the same content gives the same archive.
+    // Throws CError above the size that can be read.
     void WriteEntry(const std::string& name, std::string_view bytes);
+    // The bytes of all entries that were compressed.
+    int64_t GetDeflatedSize() const { return m_deflatedSize; }
 
 private:
     // An unused name: the word, a number and the ending.
@@ -39,6 +42,7 @@ private:
     CSavedResources m_resources;
     std::map<const CBitmap*, std::string>
         m_bitmapEntries; // so that elements that share a bitmap share its entry
+    int64_t m_deflatedSize = 0;
     bool m_isLossless = false;
 };
 
