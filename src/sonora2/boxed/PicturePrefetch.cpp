@@ -35,8 +35,13 @@ void CPicturePrefetch::start() {
     clear();
     m_stop->reset();
     m_running = true;
-    m_thread =
-        peru::getThreadManager()->createThread(P<peru::IAction>(peru::make<CWork>([this] { work(); })));
+    try {
+        m_thread =
+            peru::getThreadManager()->createThread(P<peru::IAction>(peru::make<CWork>([this] { work(); })));
+    } catch (...) {
+        m_running = false; // pictures are fetched when they are wanted
+        throw;
+    }
 }
 
 void CPicturePrefetch::stop() {
