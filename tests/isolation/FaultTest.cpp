@@ -179,6 +179,26 @@ TEST_F(Boxed, HangsEndAtTheDeadline) {
     expectHealthy();
 }
 
+#ifndef TONEWRIGHT_SANITIZED // which replace vfork
+TEST_F(Boxed, WaitingForADeviceIsNoHang) {
+    const CEnvironment noSandbox("TONEWRIGHT_BOXED_SANDBOX", "none"); // which refuses a second process
+    setDeadline(1'000);
+    EXPECT_THAT(encode(m_out / "wait-for-device@open.faulty"),
+                AnyOf("", HasSubstr("Client connection disappeared"))); // on a very busy machine
+}
+#endif
+
+TEST_F(Boxed, PipeFolderOfOthersIsAnError) {
+    const auto pipes = m_out / "tonewright-pipes";
+    std::filesystem::create_directory(pipes);
+    std::filesystem::permissions(pipes, std::filesystem::perms(0755));
+    {
+        const CEnvironment variable("XDG_RUNTIME_DIR", m_out.path().string());
+        EXPECT_THAT(decode("x.faulty"), HasSubstr("could not be created"));
+    }
+    expectHealthy();
+}
+
 TEST_F(Faults, EveryOperationOfASourceMayFail) {
     setMemory(128);
     forEachFault(kSourceOperations, [this](const SFault& fault, const char* operation) {

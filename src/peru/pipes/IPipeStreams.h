@@ -4,6 +4,7 @@
 #include "peru/streams/IStreams.h"
 
 #include <cstddef>
+#include <functional>
 
 namespace peru {
 
@@ -16,6 +17,9 @@ public:
     // "The deadline for reading from the pipe has passed" (or "writing to"). The time counts from this call,
     // not from the start of each operation, so that one deadline can cover a whole message.
     virtual void setDeadline(uint32_t milliseconds) = 0;
+    // Asked by the thread that waits each time the deadline has passed: true starts its time once more. Set
+    // while no operation runs; empty removes it.
+    virtual void setExtension(const std::function<bool()>& extension) = 0;
     // Ends an operation that waits, and every later one that would have to wait, until resume() is called. A
     // read throws CAbortedError with "Read was aborted", a write CException with "Error write data to pipe".
     // What arrived in part is lost, so the two ends may no longer agree on where a message starts.

@@ -136,6 +136,11 @@ void CSlaveHandler::createSlave() {
     m_pipeServer = peru::getPipeManager()->createServer(makePipeName());
     m_pipeServer->setDeadline(m_deadline);
     m_client = m_pipeServer->acceptOne(this);
+    // Without a pipe nothing was started. Its log entry names the reason.
+    if (!m_process)
+        throw CSonoraError(peru::localize("sonora2.CSlaveHandler.noPipe",
+                                          "The pipe to the plug-in %PLUGIN% could not be created.",
+                                          {{"%PLUGIN%", m_pluginName}}));
     m_process->setEndAction(nullptr);
     if (!m_client) {
         endSlave();
@@ -143,6 +148,10 @@ void CSlaveHandler::createSlave() {
         throw CSonoraError(
             "CSonoraPluginBoxed::createSlave: Client connection disappeared after connecting.");
     }
+    m_patience = peru::make<CSlavePatience>(m_process, uint64_t{m_deadline} * kCloseDeadlineFactor);
+    const auto extend = [patience = m_patience] { return patience->extend(); };
+    m_client->getInStream()->setExtension(extend);
+    m_client->getOutStream()->setExtension(extend);
     const P<CSonoraPluginClient> client = peru::make<CSonoraPluginClient>(
         m_client->getInStream(), m_client->getOutStream(), m_context, m_deadline);
     call("createSlave", [&] {
@@ -222,7 +231,7 @@ void CSlaveHandler::fail(const char* operation, const peru::CException& exceptio
         const std::string text = CString::toStdString(title);
         throw CSonoraError(CString::fromUTF8(text.substr(sizeof kErrorStart - 1)));
     }
-    const bool isLate = m_deadline != 0 && elapsed >= std::chrono::milliseconds(m_deadline);
+    const bool isLate = m_deadline != 0 && elapsed >= std::chrono::milliseconds(getAllowedTime());
     const P<IString> reason = describeEnd(operation, exception, isLate);
     endSlave();
     {
@@ -232,6 +241,11 @@ void CSlaveHandler::fail(const char* operation, const peru::CException& exceptio
     keepFailure(reason);
     checkForSlaveError();
     throw CSonoraError(reason);
+}
+
+// Milliseconds that the current call had, with its extensions.
+uint64_t CSlaveHandler::getAllowedTime() const {
+    return m_patience ? m_patience->getAllowed() : m_deadline;
 }
 
 P<IString> CSlaveHandler::describeEnd(const char* operation, const peru::CException& exception, bool isLate) {
@@ -254,12 +268,13 @@ P<IString> CSlaveHandler::describeEnd(const char* operation, const peru::CExcept
             {{"%PLUGIN%", m_pluginName}, {"%OPERATION%", where}, {"%CODE%", peru::format("%d", exitCode)}});
     }
     if (isLate)
-        return peru::localize("sonora2.CSlaveHandler.hanging",
-                              "The plug-in %PLUGIN% does not respond in %OPERATION%; it was ended after "
-                              "%SECONDS% s.",
-                              {{"%PLUGIN%", m_pluginName},
-                               {"%OPERATION%", where},
-                               {"%SECONDS%", peru::format("%g", m_deadline / 1000.0)}});
+        return peru::localize(
+            "sonora2.CSlaveHandler.hanging",
+            "The plug-in %PLUGIN% does not respond in %OPERATION%; it was ended after "
+            "%SECONDS% s.",
+            {{"%PLUGIN%", m_pluginName},
+             {"%OPERATION%", where},
+             {"%SECONDS%", peru::format("%g", static_cast<double>(getAllowedTime()) / 1000.0)}});
     const P<IString> description = exception.getDescription();
     return peru::localize("sonora2.CSlaveHandler.connectionFailed",
                           "The connection to the plug-in %PLUGIN% has failed in %OPERATION% (%REASON%).",

@@ -7,6 +7,7 @@
 #include "peru/system/IDynamicLibrary.h"
 #include "peru/threads/IMutex.h"
 #include "peru/uri/URI.h"
+#include "sonora2/boxed/SlavePatience.h"
 #include "sonora2/context/ISonoraContext.h"
 #include "sonora2/context/SonoraError.h"
 
@@ -40,6 +41,7 @@ public:
     // error names the plug-in, the operation and the reason; it is thrown again by every later call.
     template <class Call> auto call(const char* operation, Call&& call) {
         checkForSlaveError();
+        if (m_patience) m_patience->start(m_deadline);
         const auto start = std::chrono::steady_clock::now();
         try {
             return call();
@@ -51,7 +53,8 @@ public:
             fail(operation, peru::CError(exception.what()), std::chrono::steady_clock::now() - start);
         }
     }
-    // What call() counts as late; the deadline of the context by default. 0 means never.
+    // What call() counts as late; the deadline of the context by default. 0 means never. While the slave
+    // waits for a device, a call may take kCloseDeadlineFactor times the deadline of the context.
     uint32_t getDeadline() const { return m_deadline; }
     void setDeadline(uint32_t milliseconds) { m_deadline = milliseconds; }
     bool hasFailed() const;
@@ -68,6 +71,7 @@ private:
                            std::chrono::steady_clock::duration elapsed);
     P<peru::IString> readCrashLog();
     P<peru::IString> describeEnd(const char* operation, const peru::CException& exception, bool isLate);
+    uint64_t getAllowedTime() const;
     void keepFailure(const P<peru::IString>& failure);
     void endSlave() noexcept;
 
@@ -80,7 +84,8 @@ private:
     P<peru::IString> m_pluginName;
     P<peru::IString> m_medium; // may be empty
     P<peru::CURI> m_crashLog;
-    uint32_t m_deadline; // milliseconds; 0 means without limit
+    uint32_t m_deadline;          // milliseconds; 0 means without limit
+    P<CSlavePatience> m_patience; // empty until the slave has started
 
     P<peru::IMutex> m_failureMutex; // guards the member below and the reading of the crash log
     P<peru::IString> m_failure;     // empty handle until the slave has failed

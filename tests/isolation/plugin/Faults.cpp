@@ -66,6 +66,13 @@ std::string makeLongAnswer() {
            std::string(100'000, 'x');
 }
 
+// The caller of vfork waits like one that waits for a disk.
+void waitForDevice() {
+    if (::vfork() != 0) return;
+    ::usleep(1'500'000);
+    ::_exit(0);
+}
+
 void closeAll() {
     for (int file = 3; file < 64; ++file) ::close(file);
 }
@@ -105,6 +112,7 @@ const std::map<std::string, std::function<void()>> kFaults = {
          for (;;) ::pause();
      }},
     {"pause", [] { ::usleep(600'000); }},
+    {"wait-for-device", waitForDevice},
     {"allocate", allocate},
     {"garbage", [] { writeToSockets(std::string(100'000, '\xff')); }},
     {"long-answer", [] { writeToSockets(makeLongAnswer()); }},

@@ -94,6 +94,12 @@ TEST_F(PipeStreams, WaitsEndByDeadlineAbortAndClose) {
     pair.client->getOutStream()->writeByte(1); // half of what is read
     in->setDeadline(20);
     EXPECT_EQ(titleOf(read), "The deadline for reading from the pipe has passed");
+    int asked = 0;
+    in->setExtension([&] { return ++asked < 3; });
+    in->setDeadline(20);
+    EXPECT_EQ(titleOf(read), "The deadline for reading from the pipe has passed");
+    EXPECT_EQ(asked, 3);
+    in->setExtension(nullptr);
     in->setDeadline(IPipeStream::kNoDeadline);
     out->setDeadline(20);
     EXPECT_EQ(titleOf(write), "The deadline for writing to the pipe has passed");

@@ -39,6 +39,9 @@ public:
     bool waitForData(uint32_t milliseconds) override { return m_socket->waitForData(milliseconds); }
     EArrival fetch() override { return m_socket->fetch(); }
     void setDeadline(uint32_t milliseconds) override { m_socket->getReadWait().setDeadline(milliseconds); }
+    void setExtension(const std::function<bool()>& extension) override {
+        m_socket->getReadWait().setExtension(extension);
+    }
     void abort() override { m_socket->getReadWait().abort(); }
     void resume() override { m_socket->getReadWait().resume(); }
 
@@ -72,6 +75,9 @@ public:
         m_socket->write(parts, count);
     }
     void setDeadline(uint32_t milliseconds) override { m_socket->getWriteWait().setDeadline(milliseconds); }
+    void setExtension(const std::function<bool()>& extension) override {
+        m_socket->getWriteWait().setExtension(extension);
+    }
     void abort() override { m_socket->getWriteWait().abort(); }
     void resume() override { m_socket->getWriteWait().resume(); }
 

@@ -69,7 +69,19 @@ void CWakeEvent::reset() noexcept {
 }
 
 void CPipeSocket::CWait::setDeadline(uint32_t milliseconds) {
+    m_milliseconds = milliseconds;
     m_deadline = milliseconds == IPipeStream::kNoDeadline ? 0 : getNow() + int64_t{milliseconds} * 1'000'000;
+}
+
+bool CPipeSocket::CWait::extend() {
+    if (!m_extension || !m_extension()) return false;
+    setDeadline(m_milliseconds);
+    return true;
+}
+
+bool CPipeSocket::CWait::hasPassed() {
+    const int64_t deadline = m_deadline;
+    return deadline != 0 && getNow() >= deadline && !extend();
 }
 
 void CPipeSocket::CWait::abort() noexcept {
@@ -146,13 +158,16 @@ CPipeSocket::EWait CPipeSocket::wait(const CWait& wait, short events,
 }
 
 void CPipeSocket::waitToRead() {
-    switch (wait(m_readWait, POLLIN, std::nullopt)) {
-    case EWait::ready:
-        return;
-    case EWait::late:
-        throwReadLate();
-    case EWait::aborted:
-        throw CPipeAbortedError();
+    for (;;) {
+        switch (wait(m_readWait, POLLIN, std::nullopt)) {
+        case EWait::ready:
+            return;
+        case EWait::late:
+            if (!m_readWait.extend()) throwReadLate();
+            continue;
+        case EWait::aborted:
+            throw CPipeAbortedError();
+        }
     }
 }
 
@@ -164,8 +179,7 @@ int64_t CPipeSocket::receive(uint8_t* buffer, int64_t size, bool waitsFirst) {
     for (;;) {
         requireOpen();
         // A peer that sends without a pause must not get past the deadline either.
-        if (const int64_t deadline = m_readWait.m_deadline; deadline != 0 && getNow() >= deadline)
-            throwReadLate();
+        if (m_readWait.hasPassed()) throwReadLate();
         const ssize_t count = ::recv(getDescriptor(), buffer, static_cast<size_t>(size), MSG_DONTWAIT);
         if (count > 0) return count;
         // A peer that closes with unread bytes of ours at its end resets the connection.
@@ -258,8 +272,7 @@ void CPipeSocket::write(const SPipePart* parts, size_t count) {
             offset = 0;
         }
         if (part == count) return;
-        if (const int64_t deadline = m_writeWait.m_deadline; deadline != 0 && getNow() >= deadline)
-            throwWriteLate();
+        if (m_writeWait.hasPassed()) throwWriteLate();
         msghdr message = {};
         message.msg_iov = blocks.data();
         message.msg_iovlen = std::min(count - part, kBatch);
@@ -278,7 +291,8 @@ void CPipeSocket::write(const SPipePart* parts, size_t count) {
             case EWait::ready:
                 continue;
             case EWait::late:
-                throwWriteLate();
+                if (!m_writeWait.extend()) throwWriteLate();
+                continue;
             case EWait::aborted:
                 throwWriteError();
             }

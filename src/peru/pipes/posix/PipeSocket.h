@@ -6,6 +6,7 @@
 #include "peru/posix/PlatformFile.h"
 
 #include <atomic>
+#include <functional>
 #include <memory>
 #include <optional>
 
@@ -56,14 +57,20 @@ public:
     class CWait {
     public:
         void setDeadline(uint32_t milliseconds);
+        void setExtension(const std::function<bool()>& extension) { m_extension = extension; }
         void abort() noexcept;
         void resume() noexcept;
 
     private:
         friend class CPipeSocket;
+        bool hasPassed();
+        bool extend();
+
         CWakeEvent m_wake;
         std::atomic<bool> m_aborted{false};
-        std::atomic<int64_t> m_deadline{0}; // nanoseconds of the monotonic clock, 0 if there is none
+        std::atomic<int64_t> m_deadline{0};      // nanoseconds of the monotonic clock, 0 if there is none
+        std::atomic<uint32_t> m_milliseconds{0}; // from which it was computed
+        std::function<bool()> m_extension;
     };
     CWait& getReadWait() { return m_readWait; }
     CWait& getWriteWait() { return m_writeWait; }
