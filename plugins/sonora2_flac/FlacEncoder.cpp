@@ -39,7 +39,7 @@ CFlacEncoder::CFlacEncoder() = default;
 
 CFlacEncoder::~CFlacEncoder() {
     m_parallel.reset(); // its threads call this object
-    m_file = nullptr; // deleting the library's encoder finishes the stream
+    m_file = nullptr;   // deleting the library's encoder finishes the stream
 }
 
 bool CFlacEncoder::accepts(const SPcmFormat& format) const {
