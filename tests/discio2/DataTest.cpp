@@ -169,6 +169,7 @@ TEST(Data, FilesBehindAudioAreRead) {
     std::filesystem::create_directories(folder / "in/Sub");
     const std::string content = makeSectors(3, 4);
     folder.write("in/Sub/Name of a file", content);
+    folder.write("audio.bin", makeSectors(100, 5));
     const auto open = [&](const char* address, const char* naming, bool isRaw, int mode) {
         std::vector<std::string> command{"genisoimage", "-quiet", "-V", "My disc", naming, "-o", "disc.iso"};
         if (*address) command.insert(command.end(), {"-C", std::string("0,") + address});
@@ -207,6 +208,15 @@ TEST(Data, FilesBehindAudioAreRead) {
         EXPECT_EQ(DISCIO_DataCursorRead(file.get(), 7, bytes.data(), 100000), 7049) << disc.getError();
         EXPECT_EQ(bytes.substr(0, 7049), content.substr(7));
     }
+    // In a file of its own.
+    open("11500", "-R", false, 1);
+    const SOpenDisc apart(folder.write("apart.cue",
+                                       "FILE audio.bin BINARY\nTRACK 01 AUDIO\nINDEX 01 00:00:00\n"
+                                       "FILE disc.iso BINARY\nTRACK 02 MODE1/2048\n"
+                                       "INDEX 01 00:00:00\n"));
+    const Discio<DISCIO_DataCursor> root(DISCIO_DiscDataCreateCursorW(apart.disc.get(), u""));
+    ASSERT_TRUE(root) << apart.getError();
+    EXPECT_EQ(listAll(root.get()), (std::vector<std::string>{"\\Sub\\", "\\Sub\\Name of a file 7056"}));
     std::string damaged = readFile(folder / "disc.bin");
     damaged.replace(100 * kSectorBytes + 16 * 2048, 6, "\1XXXXX");
     folder.write("disc.bin", damaged);

@@ -14,8 +14,15 @@ IDataVolume& SDisc::getVolume() {
         const STrack* track = medium->findDataTrack();
         if (!track) throw CDiscError(DISCIO_ERROR_NO_DATA, "");
         const std::string path = medium->getDataPath();
-        volume =
-            path.empty() ? openSessionVolume(medium->createDataReader(), track->start) : openDataVolume(path);
+        // The addresses in a file of its own may count from the start of the disc, too.
+        if (track->start > 0) {
+            try {
+                volume = openSessionVolume(medium->createDataReader(), track->start);
+            } catch (const CDiscError&) {
+                if (path.empty()) throw;
+            }
+        }
+        if (!volume) volume = openDataVolume(path);
     }
     return *volume;
 }
