@@ -27,12 +27,14 @@ macro(tw_sources variable)
 endmacro()
 
 # A library binds its own functions and type information at link time: fewer searches for symbols at start-up, and no
-# other library can replace them. Types are compared by name, and no library exports variables.
-set(TONEWRIGHT_LINK_STRICTLY -Wl,-Bsymbolic)
-# An undefined symbol fails the build instead of the first call. Sanitizer runtimes are only linked into the
-# executable, so their symbols are undefined here.
-if(NOT TONEWRIGHT_SANITIZERS)
-    list(APPEND TONEWRIGHT_LINK_STRICTLY -Wl,--no-undefined)
+# other library can replace them. Types are compared by name, and no library exports variables. An undefined symbol fails
+# the build instead of the first call.
+# The sanitizers compare types by address, and their runtimes are only linked into the executable, so that their symbols
+# are undefined here.
+if(TONEWRIGHT_SANITIZERS)
+    set(TONEWRIGHT_LINK_STRICTLY -Wl,-Bsymbolic-functions)
+else()
+    set(TONEWRIGHT_LINK_STRICTLY -Wl,-Bsymbolic -Wl,--no-undefined)
 endif()
 
 # Installed below lib and libexec.
