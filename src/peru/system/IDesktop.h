@@ -15,8 +15,9 @@ public:
     virtual P<IFileTypesManager> createFileTypesManager() = 0;
     // The MIME type that belongs to the file's name; the file is not opened. Empty if there is none.
     virtual std::string findKind(const std::string& path) = 0;
-    // Moves the file or folder to the trash. Returns 0 or the desktop's error code.
-    virtual int moveToTrash(const std::string& path) = 0;
+    // Moves the file or folder to the trash. If it returns false, `error` is the desktop's code, which may be
+    // 0.
+    virtual bool moveToTrash(const std::string& path, int& error) = 0;
     // The proxies for the URI in order of preference, "direct://" among them. May take long.
     virtual std::vector<std::string> findProxies(const std::string& uri) = 0;
     // The ASCII form of an international host name; empty if the text cannot be a name.

@@ -19,11 +19,12 @@ public:
         const CGText type(g_content_type_guess(path.c_str(), nullptr, 0, nullptr));
         return toString(CGText(g_content_type_get_mime_type(type.get())));
     }
-    int moveToTrash(const std::string& path) override {
+    bool moveToTrash(const std::string& path, int& code) override {
         const TGObject<GFile> file(g_file_new_for_path(path.c_str()));
         GError* error = nullptr;
-        if (g_file_trash(file.get(), nullptr, &error)) return 0;
-        return CGError(error)->code;
+        if (g_file_trash(file.get(), nullptr, &error)) return true;
+        code = CGError(error)->code;
+        return false;
     }
     std::vector<std::string> findProxies(const std::string& uri) override {
         GProxyResolver* resolver = g_proxy_resolver_get_default();

@@ -98,9 +98,9 @@ void CFileSystem::deleteFolder(const P<IURI>& uri) {
 }
 
 void CFileSystem::deleteUndoable(const P<IURI>& uri) {
-    if (const int error = getDesktop()->moveToTrash(toPath(uri)))
-        throw CFileError(format(localize("peru.CFileSystem.shellDeleteUndoable", "shell error %d"), error),
-                         uri);
+    int error = 0;
+    if (getDesktop()->moveToTrash(toPath(uri), error)) return;
+    throw CFileError(format(localize("peru.CFileSystem.shellDeleteUndoable", "shell error %d"), error), uri);
 }
 
 void CFileSystem::copyFile(const P<IURI>& source, const P<IURI>& destination) {
