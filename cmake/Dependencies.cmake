@@ -37,6 +37,13 @@ add_library(LAME::lame INTERFACE IMPORTED)
 target_include_directories(LAME::lame INTERFACE ${LAME_INCLUDE_DIR})
 target_link_libraries(LAME::lame INTERFACE ${LAME_LIBRARY})
 
+find_package(JPEG REQUIRED)
+find_path(MNG_INCLUDE_DIR libmng.h REQUIRED)
+find_library(MNG_LIBRARY mng REQUIRED)
+add_library(MNG::mng INTERFACE IMPORTED)
+target_include_directories(MNG::mng INTERFACE ${MNG_INCLUDE_DIR})
+target_link_libraries(MNG::mng INTERFACE ${MNG_LIBRARY})
+
 find_package(CLI11 REQUIRED)
 find_package(nlohmann_json REQUIRED)
 if(TONEWRIGHT_TESTS)
