@@ -31,8 +31,23 @@ void CGraphicImage::Reset() {
 }
 
 void CGraphicImage::SetBitmap(const P<CBitmap>& bitmap) {
-    m_bitmap = bitmap;
+    m_bitmap.Set(bitmap);
     DropHitMask();
+}
+
+void CGraphicImage::SetRotation(double degrees) {
+    m_bitmap.DropVersions();
+    CGraphicElement::SetRotation(degrees);
+}
+
+void CGraphicImage::SetMirrored(EAxis axis, bool isMirrored) {
+    m_bitmap.DropVersions();
+    CGraphicElement::SetMirrored(axis, isMirrored);
+}
+
+void CGraphicImage::SetColoured(bool isColoured) {
+    m_bitmap.DropVersions();
+    CGraphicElement::SetColoured(isColoured);
 }
 
 void CGraphicImage::SetScaleMargins(const SScaleMargins& margins) {
@@ -80,29 +95,47 @@ SStrips divide(int pixels, double begin, double length, double low, double high,
 
 } // namespace
 
-void CGraphicImage::PaintContent(CPaintContext& context) const {
-    if (!m_bitmap) return;
+P<CBitmap> CGraphicImage::getPaintedBitmap(const CPaintContext& context) const {
+    const P<CBitmap>& bitmap = m_bitmap.Get();
+    // Margins are parts of the bitmap's own pixels, and a page of paper has no pixels.
+    constexpr double kOnePixelPerUnit = 1;
+    const SScaleMargins& margins = m_scaleMargins;
+    if (m_isNoScale || margins.left > 0 || margins.top > 0 || margins.right > 0 || margins.bottom > 0 ||
+        context.GetGraphics().GetResolution() != kOnePixelPerUnit)
+        return bitmap;
+    const CMatrix& matrix = context.GetMatrix();
     const SRect box = GetLocalRect();
-    const double width = m_bitmap->GetWidth(), height = m_bitmap->GetHeight();
+    const double width = std::ceil(box.width * std::hypot(matrix.xx, matrix.yx));
+    const double height = std::ceil(box.height * std::hypot(matrix.xy, matrix.yy));
+    // Scaling a smaller bitmap each time it is painted costs little more than painting it.
+    if (!(width >= 1 && height >= 1 && 2 * width <= bitmap->GetWidth() && 2 * height <= bitmap->GetHeight()))
+        return bitmap;
+    return m_bitmap.Get({static_cast<int>(width), static_cast<int>(height)});
+}
+
+void CGraphicImage::PaintContent(CPaintContext& context) const {
+    if (!m_bitmap.Get()) return;
+    const P<CBitmap> bitmap = getPaintedBitmap(context);
+    const SRect box = GetLocalRect();
+    const double width = bitmap->GetWidth(), height = bitmap->GetHeight();
     IGraphicsContext& graphics = context.GetGraphics();
     if (m_isNoScale) {
         graphics.PushClip(box);
         graphics.DrawBitmap(
-            *m_bitmap, {0, 0, width, height},
+            *bitmap, {0, 0, width, height},
             SRect::fromCenter({}, {width * kMillimetresPerPixel, height * kMillimetresPerPixel}));
         graphics.PopClip();
         return;
     }
     const SScaleMargins& margins = m_scaleMargins;
-    const SStrips x = divide(m_bitmap->GetWidth(), box.left, box.width, margins.left, margins.right,
+    const SStrips x = divide(bitmap->GetWidth(), box.left, box.width, margins.left, margins.right,
                              margins.leftFactor, margins.rightFactor);
-    const SStrips y = divide(m_bitmap->GetHeight(), box.top, box.height, margins.top, margins.bottom,
+    const SStrips y = divide(bitmap->GetHeight(), box.top, box.height, margins.top, margins.bottom,
                              margins.topFactor, margins.bottomFactor);
     for (int row = 0; row < 3; ++row)
         for (int col = 0; col < 3; ++col)
             graphics.DrawBitmap(
-                *m_bitmap,
-                SRect::fromEdges(x.source[col], y.source[row], x.source[col + 1], y.source[row + 1]),
+                *bitmap, SRect::fromEdges(x.source[col], y.source[row], x.source[col + 1], y.source[row + 1]),
                 SRect::fromEdges(x.target[col], y.target[row], x.target[col + 1], y.target[row + 1]));
 }
 

@@ -3,7 +3,7 @@
 
 #include "graphics/elements/GraphicElement.h"
 #include "graphics/elements/ScaleMargins.h"
-#include "graphics/images/Bitmap.h"
+#include "graphics/images/ResourceBuffer.h"
 
 namespace graphics {
 
@@ -19,8 +19,11 @@ public:
     void Save(const P<peru::IXmlNode>& node, IResourceOutputStore& store) const override;
     void Load(const P<peru::IXmlNode>& node, IResourceInputStore& store) override;
     void Reset() override;
+    void SetRotation(double degrees) override;
+    void SetMirrored(EAxis axis, bool isMirrored) override;
+    void SetColoured(bool isColoured) override;
 
-    const P<CBitmap>& GetBitmap() const { return m_bitmap; } // may be empty
+    const P<CBitmap>& GetBitmap() const { return m_bitmap.Get(); } // may be empty
     void SetBitmap(const P<CBitmap>& bitmap);
     // A path, or empty for an image that does not come from a file.
     const std::string& GetFileName() const { return m_fileName; }
@@ -35,7 +38,10 @@ protected:
     void PaintContent(CPaintContext& context) const override;
 
 private:
-    P<CBitmap> m_bitmap;
+    // The bitmap in the size of the device's pixels if it is much larger and fills the box.
+    P<CBitmap> getPaintedBitmap(const CPaintContext& context) const;
+
+    TResourceBuffer<CBitmap> m_bitmap;
     std::string m_fileName;
     SScaleMargins m_scaleMargins;
     bool m_isNoScale = false;

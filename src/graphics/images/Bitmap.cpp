@@ -1,45 +1,74 @@
 #include "graphics/images/Bitmap.h"
 
+#include "graphics/images/BitmapCache.h"
 #include "graphics/images/ImageCodec.h"
+#include "graphics/images/ScaledImage.h"
 #include "peru/Errors.h"
 #include "peru/log/LogManager.h"
 
 namespace graphics {
 
 CBitmap::CBitmap(int width, int height, std::vector<uint32_t> pixels)
-    : m_width(width), m_height(height), m_pixels(std::move(pixels)) {
-    if (width < 1 || height < 1 ||
-        m_pixels.size() != static_cast<size_t>(width) * static_cast<size_t>(height))
-        throw peru::CInvalidArgError("pixels", "CBitmap");
+    : CBitmap(std::make_shared<peru::gui::CPremultipliedImage>(width, height, std::move(pixels))) {}
+
+CBitmap::CBitmap(CPixels::Image image)
+    : m_size{image->getWidth(), image->getHeight()}, m_image(std::move(image)) {}
+
+CBitmap::CBitmap(EBitmapFormat format, std::string bytes)
+    : m_size(probeImage(format, bytes)), m_format(format), m_bytes(std::move(bytes)) {}
+
+CBitmap::~CBitmap() {
+    getBitmapCache().Drop(this);
 }
 
-CBitmap::CBitmap(EBitmapFormat format, std::string bytes) : m_format(format), m_bytes(std::move(bytes)) {
-    const SPixelSize size = probeImage(format, m_bytes);
-    m_width = size.width;
-    m_height = size.height;
-}
-
-const std::vector<uint32_t>& CBitmap::GetPixels() const {
-    if (!m_pixels.empty()) return m_pixels;
-    try {
-        m_pixels = decodeImage(m_format, m_bytes, {m_width, m_height});
-    } catch (const peru::CException& error) {
-        peru::getLogManager()->warning(peru::CString::fromUTF8("graphics"), error.getDescription());
-        m_pixels.assign(static_cast<size_t>(m_width) * static_cast<size_t>(m_height), 0);
+CPixels CBitmap::GetPixels() const {
+    if (m_image) return CPixels(m_image);
+    CBitmapCache& cache = getBitmapCache();
+    CPixels::Image image = cache.Find({this, m_size.width, m_size.height});
+    if (!image) {
+        image = decode();
+        cache.Add({this, m_size.width, m_size.height}, image);
     }
-    return m_pixels;
+    return CPixels(std::move(image));
+}
+
+CPixels::Image CBitmap::decode() const {
+    if (!m_isDamaged) {
+        try {
+            return std::make_shared<peru::gui::CPremultipliedImage>(decodeImage(m_format, m_bytes, m_size));
+        } catch (const peru::CException& error) {
+            m_isDamaged = true;
+            peru::getLogManager()->warning(peru::CString::fromUTF8("graphics"), error.getDescription());
+        }
+    }
+    return std::make_shared<peru::gui::CPremultipliedImage>(m_size.width, m_size.height);
+}
+
+P<CBitmap> CBitmap::GetVersion(SPixelSize size) const {
+    if (size.width < 1 || size.height < 1) throw peru::CInvalidArgError("size", "GetVersion");
+    if (size == m_size) return peru::make<CBitmap>(GetPixels().GetImage());
+    CBitmapCache& cache = getBitmapCache();
+    CPixels::Image image = cache.Find({this, size.width, size.height});
+    if (!image) {
+        image = std::make_shared<peru::gui::CPremultipliedImage>(scaleImage(*GetPixels().GetImage(), size));
+        cache.Add({this, size.width, size.height}, image);
+    }
+    return peru::make<CBitmap>(std::move(image));
+}
+
+void CBitmap::DropVersions() const {
+    getBitmapCache().DropOthers({this, m_size.width, m_size.height});
 }
 
 bool CBitmap::HasAlpha() const {
-    if (m_format == EBitmapFormat::jpg) return false;
-    if (m_format == EBitmapFormat::jng) return true;
-    const auto& pixels = GetPixels();
-    return std::any_of(pixels.begin(), pixels.end(), [](uint32_t pixel) { return (pixel >> 24) != 255; });
+    if (!m_hasAlpha) m_hasAlpha = probeAlpha(m_format, m_bytes);
+    if (!m_hasAlpha) m_hasAlpha = !GetPixels().GetImage()->isOpaque();
+    return *m_hasAlpha;
 }
 
 std::string CBitmap::Encode(EBitmapFormat format) const {
     if (format == m_format) return m_bytes;
-    return encodeImage(format, GetPixels(), {m_width, m_height});
+    return encodeImage(format, *GetPixels().GetImage());
 }
 
 } // namespace graphics

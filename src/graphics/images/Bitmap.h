@@ -3,8 +3,12 @@
 
 #include "graphics/Api.h"
 #include "peru/Object.h"
+#include "peru/gui/ImageLimits.h"
+#include "peru/gui/RGBAImage.h"
 
 #include <cstdint>
+#include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -13,38 +17,85 @@ namespace graphics {
 using peru::P;
 
 // The numbers are those of wxWidgets.
-enum class EBitmapFormat { none = 0, bmp = 1, ico = 3, png = 15, jpg = 17, jng = 1050 };
+enum class EBitmapFormat {
+    none = 0,
+    bmp = 1,
+    ico = 3,
+    tif = 11,
+    gif = 13,
+    png = 15,
+    jpg = 17,
+    jng = 1050,
+    mng = 1051
+};
 
-// The limit on the pixels of one picture, checked before memory is allocated.
-inline constexpr int64_t kMaximalPixels = 100'000'000;
+inline constexpr int64_t kMaximalPixels = peru::gui::kDefaultMaximalPixels;
 
-// Premultiplied ARGB, 32 bits for each pixel, row by row from the top. Immutable, so elements share it.
-// Interface thread only.
+struct SPixelSize {
+    int width;
+    int height;
+
+    bool operator==(const SPixelSize&) const = default;
+};
+
+// The pixels of a bitmap, premultiplied, which stay in memory as long as this object exists.
+class CPixels {
+public:
+    using Image = std::shared_ptr<const peru::gui::CPremultipliedImage>;
+
+    explicit CPixels(Image image) : m_image(std::move(image)) {}
+
+    const Image& GetImage() const { return m_image; }
+    operator const std::vector<uint32_t>&() const {
+        return m_image->getPixels();
+    } // NOLINT: behaves as pixels
+    const uint32_t* data() const { return m_image->getPixels().data(); }
+    size_t size() const { return m_image->getPixels().size(); }
+    uint32_t operator[](size_t index) const { return m_image->getPixels()[index]; }
+    auto begin() const { return m_image->getPixels().begin(); }
+    auto end() const { return m_image->getPixels().end(); }
+    bool operator==(const CPixels& other) const { return *m_image == *other.m_image; }
+    bool operator==(const std::vector<uint32_t>& pixels) const { return m_image->getPixels() == pixels; }
+
+private:
+    Image m_image;
+};
+
+// Immutable, so elements share it. Interface thread only.
 class GRAPHICS_API CBitmap : public peru::CObject {
 public:
-    // Throws CInvalidArgError if the number of pixels does not fit the size.
+    // Premultiplied ARGB. Throws CInvalidArgError if the number of pixels does not fit the size.
     CBitmap(int width, int height, std::vector<uint32_t> pixels);
-    // From the bytes of a file, which are decoded when the pixels are first needed, and stored as they are
-    // when the bitmap is saved in the same format. Throws CError if the format is unknown or the size above
-    // the limit.
+    explicit CBitmap(CPixels::Image image);
+    // From the bytes of a file, which are decoded when the pixels are needed, and stored as they are when the
+    // bitmap is saved in the same format. Throws CError if the format is unknown or the size above the limit.
     CBitmap(EBitmapFormat format, std::string bytes);
-    ~CBitmap() override = default;
+    ~CBitmap() override;
 
-    int GetWidth() const { return m_width; }
-    int GetHeight() const { return m_height; }
-    // All transparent if the bytes are damaged.
-    const std::vector<uint32_t>& GetPixels() const;
+    int GetWidth() const { return m_size.width; }
+    int GetHeight() const { return m_size.height; }
+    // All transparent if the bytes are damaged. Decoded pixels are kept within the limit of memory of all
+    // bitmaps (getImageMemory()), and decoded again after they were released.
+    CPixels GetPixels() const;
+    // The bitmap stretched to another size, kept within the same limit. Throws CInvalidArgError if a side is
+    // below 1.
+    P<CBitmap> GetVersion(SPixelSize size) const;
+    // Releases all versions.
+    void DropVersions() const;
     // True if a pixel may not be opaque.
     bool HasAlpha() const;
     // The content of a file. Throws CError if the format cannot be written.
     std::string Encode(EBitmapFormat format) const;
 
 private:
-    int m_width = 0;
-    int m_height = 0;
+    CPixels::Image decode() const;
+
+    SPixelSize m_size = {0, 0};
     const EBitmapFormat m_format = EBitmapFormat::none;
     const std::string m_bytes;
-    mutable std::vector<uint32_t> m_pixels; // empty until they are needed
+    const CPixels::Image m_image; // of a bitmap without bytes
+    mutable bool m_isDamaged = false;
+    mutable std::optional<bool> m_hasAlpha;
 };
 
 } // namespace graphics

@@ -14,7 +14,8 @@ void paintBitmap(cairo_t* cairo, const CBitmap& bitmap, const SRect& source, con
     const int top = std::clamp(static_cast<int>(std::lround(source.top)), 0, bitmap.GetHeight() - 1);
     const int width = std::clamp(static_cast<int>(std::lround(source.width)), 1, bitmap.GetWidth() - left);
     const int height = std::clamp(static_cast<int>(std::lround(source.height)), 1, bitmap.GetHeight() - top);
-    auto* const pixels = const_cast<uint32_t*>(bitmap.GetPixels().data()) +
+    const CPixels held = bitmap.GetPixels();
+    auto* const pixels = const_cast<uint32_t*>(held.data()) +
                          static_cast<size_t>(top) * static_cast<size_t>(bitmap.GetWidth()) + left;
     const Surface surface(cairo_image_surface_create_for_data(reinterpret_cast<unsigned char*>(pixels),
                                                               CAIRO_FORMAT_ARGB32, width, height,

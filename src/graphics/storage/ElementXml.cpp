@@ -136,7 +136,7 @@ void CGraphicImage::Save(const Node& node, IResourceOutputStore& store) const {
     write(node, "scale-margins", m_scaleMargins);
     if (m_isNoScale) writeBool(node, "noscale", true);
     writeAttribute(node, "filename", m_fileName);
-    store.SaveBitmap(node, "attachment-bitmap", m_bitmap, m_fileName);
+    store.SaveBitmap(node, "attachment-bitmap", m_bitmap.Get(), m_fileName);
 }
 
 void CGraphicImage::Load(const Node& node, IResourceInputStore& store) {

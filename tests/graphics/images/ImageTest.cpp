@@ -1,5 +1,8 @@
 #include "graphics/Elements.h"
+#include "graphics/ImageTool.h"
+#include "graphics/images/BitmapCache.h"
 #include "graphics/images/ImageCodec.h"
+#include "graphics/painting/DocumentRenderer.h"
 #include "peru/Errors.h"
 
 #include <gtest/gtest.h>
@@ -67,4 +70,88 @@ TEST(Bitmap, RejectsDamagedFiles) {
         peru::make<CBitmap>(2, 2, std::vector<uint32_t>(4, 0x80808080u))->Encode(EBitmapFormat::jng);
     jng[19] = 3;
     EXPECT_EQ(peru::make<CBitmap>(EBitmapFormat::jng, jng)->GetPixels(), std::vector<uint32_t>(6, 0));
+}
+
+TEST(Bitmap, ReadsWhatThePeerWrites) {
+    const tests::CTempFolder folder;
+    for (const auto& [name, format] : {std::pair("a.tif", EBitmapFormat::tif),
+                                       {"a.gif", EBitmapFormat::gif},
+                                       {"a.mng", EBitmapFormat::mng},
+                                       {"a.png", EBitmapFormat::png},
+                                       {"a.bmp", EBitmapFormat::bmp},
+                                       {"a.ico", EBitmapFormat::ico}}) {
+        tests::runImageTool(folder.path(), std::string("-size 20x10 pattern:checkerboard -colors 4 ") + name);
+        const std::string bytes = tests::readFile(folder / name);
+        ASSERT_EQ(detectFormat(bytes), format) << name;
+        const auto bitmap = peru::make<CBitmap>(format, bytes);
+        EXPECT_EQ(bitmap->GetPixels(), tests::readByImageTool(folder.path(), name)) << name;
+        EXPECT_FALSE(bitmap->HasAlpha()) << name;
+        tests::damage(bytes, [&, kind = format](const std::string& damaged) {
+            try {
+                const auto other = peru::make<CBitmap>(kind, damaged);
+                if (other->GetWidth() < 1000 && other->GetHeight() < 1000) other->GetPixels();
+            } catch (const peru::CError&) {
+            }
+        });
+        // The limit holds before anything is decoded.
+        peru::gui::setMaximalPixels(199);
+        EXPECT_THROW(peru::make<CBitmap>(format, bytes), peru::CError) << name;
+        peru::gui::setMaximalPixels(0);
+    }
+}
+
+namespace {
+
+P<CGraphicDocument> makeAlbum(int count, const std::string& png) {
+    auto document = peru::make<CGraphicDocument>();
+    for (int i = 0; i < count; ++i) {
+        auto image = peru::make<CGraphicImage>();
+        image->SetBitmap(peru::make<CBitmap>(EBitmapFormat::png, png));
+        image->SetSize(10, 10);
+        image->SetCenter(10 * i, 0);
+        document->Add(image);
+    }
+    return document;
+}
+
+} // namespace
+
+TEST(BitmapCache, HoldsNoMoreThanItsLimit) {
+    constexpr int64_t kBytes = 200 * 200 * 4;
+    std::vector<uint32_t> pixels(200 * 200, 0xFF336699u);
+    const std::string png = peru::make<CBitmap>(200, 200, pixels)->Encode(EBitmapFormat::png);
+    peru::gui::setImageMemory(5 * kBytes + 100);
+    const int64_t before = getBitmapCache().GetBytes();
+    const auto document = makeAlbum(12, png);
+    EXPECT_EQ(getBitmapCache().GetBytes(), before); // nothing is decoded
+
+    // Each element has 10 mm, that is 10 pixels here: the versions remain when the large pictures are gone.
+    SRenderOptions options;
+    options.dpi = 25.4;
+    const auto first = RenderBitmap(*document, options);
+    EXPECT_LE(getBitmapCache().GetBytes(), 5 * kBytes + 100);
+    const auto bitmap = P<CGraphicImage>(document->GetElement(0))->GetBitmap();
+    const SPixelSize small{10, 10};
+    const auto version = bitmap->GetVersion(small)->GetPixels();
+    EXPECT_EQ(version[55], 0xFF336699u);
+    EXPECT_EQ(bitmap->GetVersion(small)->GetPixels().GetImage(), version.GetImage());
+    EXPECT_EQ(RenderBitmap(*document, options)->GetPixels(), first->GetPixels());
+
+    // Released pixels remain with those who hold them, and are decoded again for others.
+    const CPixels held = bitmap->GetPixels();
+    for (int i = 1; i < 12; ++i) P<CGraphicImage>(document->GetElement(i))->GetBitmap()->GetPixels();
+    EXPECT_LE(getBitmapCache().GetBytes(), 5 * kBytes + 100);
+    EXPECT_NE(bitmap->GetPixels().GetImage(), held.GetImage());
+    EXPECT_EQ(held, pixels);
+
+    // A change of the element releases the versions, a picture above the limit is not kept, the end of the
+    // bitmaps releases everything.
+    document->GetElement(0)->SetRotation(30);
+    EXPECT_NE(bitmap->GetVersion(small)->GetPixels().GetImage(), version.GetImage());
+    peru::gui::setImageMemory(kBytes - 1);
+    P<CGraphicImage>(document->GetElement(1))->GetBitmap()->GetPixels();
+    EXPECT_EQ(getBitmapCache().GetBytes(), 0);
+    EXPECT_NE(bitmap->GetPixels().GetImage(), bitmap->GetPixels().GetImage());
+    peru::gui::setImageMemory(0);
+    for (int i = 0; i < 12; ++i) P<CGraphicImage>(document->GetElement(i))->SetBitmap(nullptr);
 }
