@@ -18,7 +18,7 @@ constexpr int kDefaultQuality = 92;
 CJngHandler::CJngHandler() {
     m_name = "JNG file";
     m_extension = "jng";
-    m_type = kJngType;
+    m_type = static_cast<wxBitmapType>(kJngType);
     m_mime = "image/x-jng";
 }
 
@@ -50,7 +50,7 @@ bool CJngHandler::DoCanRead(wxInputStream& stream) {
 CMngHandler::CMngHandler() {
     m_name = "MNG file";
     m_extension = "mng";
-    m_type = kMngType;
+    m_type = static_cast<wxBitmapType>(kMngType);
     m_mime = "video/x-mng";
 }
 

@@ -7,8 +7,10 @@
 
 namespace wxjng {
 
-inline constexpr auto kJngType = static_cast<wxBitmapType>(1050);
-inline constexpr auto kMngType = static_cast<wxBitmapType>(1051);
+// Values of wxBitmapType that the toolkit does not define. They are numbers, since a sanitizer rejects variables of
+// that type with other values than its own.
+inline constexpr int kJngType = 1050;
+inline constexpr int kMngType = 1051;
 
 // Options of an image for writing JNG, beside wxIMAGE_OPTION_QUALITY: the compression of the alpha channel, 0
 // without loss (the default) or 8 as JPEG.

@@ -8,6 +8,7 @@
 #include "wxjng/PngSamples.h"
 
 #include <cstring>
+#include <utility>
 #include <wx/image.h>
 
 namespace wxjng {
@@ -36,11 +37,10 @@ public:
         mng_setcb_refresh(handle, refresh);
         mng_setcb_gettickcount(handle, getTime);
         mng_setcb_settimer(handle, setTimer);
-        mng_setcb_processmend(handle, end);
-        mng_setcb_processterm(handle, repeat);
         mng_setcb_errorproc(handle, [](mng_handle, mng_int32, mng_int8, mng_chunkid, mng_uint32, mng_int32,
                                        mng_int32, mng_pchar) { return mng_bool{MNG_FALSE}; });
         mng_set_doprogressive(handle, MNG_FALSE);
+        mng_set_cacheplayback(handle, MNG_FALSE);
     }
 
     const SMngStream& getStream() const { return m_stream; }
@@ -58,7 +58,7 @@ public:
             proceed();
             if (!m_hasPainted) m_duration += m_timer;
         }
-        if (m_hasPainted && m_hasEndedBefore) { // this is the repetition
+        if (m_hasPainted && m_isBehindEnd) { // this is the invisible picture
             m_hasPainted = false;
             m_isFinished = true;
         }
@@ -104,18 +104,9 @@ private:
         return MNG_TRUE;
     }
 
-    static mng_bool MNG_DECL end(mng_handle handle, mng_uint32, mng_uint32) {
-        get(handle).m_hasEnded = true;
-        return MNG_TRUE;
-    }
-
-    static mng_bool MNG_DECL repeat(mng_handle, mng_uint8, mng_uint8, mng_uint32, mng_uint32) {
-        return MNG_TRUE;
-    }
-
     // Runs the library up to its next wait or to the end.
     void proceed() {
-        m_hasEndedBefore = m_hasEnded;
+        m_isBehindEnd = m_position > m_stream.end;
         m_timer = 0;
         const mng_handle handle = m_handle.use();
         const mng_retcode result =
@@ -124,7 +115,7 @@ private:
         if (result != MNG_NEEDTIMERWAIT && result != MNG_NOERROR) failDamaged("mng");
         m_time += static_cast<mng_uint32>(m_timer);
         // The library waits for a millisecond at the end of the file, which no frame asks for.
-        if (m_hasEnded && !m_hasEndedBefore && m_timer == 1) m_timer = 0;
+        if (m_position == m_stream.bytes.size() && m_timer == 1) m_timer = 0;
     }
 
     const SMngStream m_stream;
@@ -134,10 +125,9 @@ private:
     size_t m_position = 0;
     bool m_hasStarted = false;
     bool m_isFinished = false;
-    bool m_hasPainted = false; // during the last call of the library
-    bool m_hasEnded = false;
-    bool m_hasEndedBefore = false; // before the last call of the library
-    mng_uint32 m_time = 0;         // a clock that advances as the library waits
+    bool m_hasPainted = false;  // during the last call of the library
+    bool m_isBehindEnd = false; // before the last call of the library
+    mng_uint32 m_time = 0;      // a clock that advances as the library waits
     int m_timer = 0;
     int m_duration = 0;
     CMngHandle m_handle;

@@ -4,6 +4,7 @@
 #include "wxjng/Chunks.h"
 
 #include <algorithm>
+#include <utility>
 
 namespace graphics::animation {
 

@@ -49,7 +49,9 @@ public:
     operator const std::vector<uint32_t>&() const {
         return m_image->getPixels();
     } // NOLINT: behaves as pixels
-    const uint32_t* data() const { return m_image->getPixels().data(); }
+    // Not of a temporary object, which releases the pixels at the end of the expression.
+    const uint32_t* data() const& { return m_image->getPixels().data(); }
+    const uint32_t* data() && = delete;
     size_t size() const { return m_image->getPixels().size(); }
     uint32_t operator[](size_t index) const { return m_image->getPixels()[index]; }
     auto begin() const { return m_image->getPixels().begin(); }

@@ -19,9 +19,9 @@ namespace {
 
 constexpr int kJpegQuality = 92;
 
-template <class Handler> void registerHandler(wxBitmapType type) {
+template <class Handler> void registerHandler(int type) {
     // The toolkit's list owns the handler.
-    if (!wxImage::FindHandler(type)) wxImage::AddHandler(new Handler);
+    if (!wxImage::FindHandler(static_cast<wxBitmapType>(type))) wxImage::AddHandler(new Handler);
 }
 
 [[noreturn]] void fail(const char* key, const char* text, EBitmapFormat format) {

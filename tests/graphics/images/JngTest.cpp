@@ -69,7 +69,7 @@ TEST(Jng, HandlersServeTheToolkit) {
         ASSERT_TRUE(makePicture(false, true).SaveFile(path));
         wxImage copy;
         ASSERT_TRUE(copy.LoadFile(path)) << extension; // by the content
-        EXPECT_EQ(copy.GetType(), type);
+        EXPECT_EQ(static_cast<int>(copy.GetType()), type);
         EXPECT_TRUE(copy.HasAlpha());
         EXPECT_EQ(wxImage::GetImageCount(path), 1);
     }
