@@ -5,13 +5,13 @@
 using namespace graphics;
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    peru::gui::setMaximalPixels(1'000'000); // large pictures are slow to decode, and show nothing more
     const std::string bytes(reinterpret_cast<const char*>(data), size);
-    for (const auto format : {EBitmapFormat::png, EBitmapFormat::jpg, EBitmapFormat::jng, EBitmapFormat::bmp,
-                              EBitmapFormat::ico}) {
+    for (const auto format :
+         {EBitmapFormat::png, EBitmapFormat::jpg, EBitmapFormat::jng, EBitmapFormat::bmp, EBitmapFormat::ico,
+          EBitmapFormat::tif, EBitmapFormat::gif, EBitmapFormat::mng}) {
         try {
-            const SPixelSize pixels = probeImage(format, bytes);
-            // Large pictures are slow to decode, and show nothing more.
-            if (int64_t{pixels.width} * pixels.height < 1'000'000) decodeImage(format, bytes, pixels);
+            decodeImage(format, bytes, probeImage(format, bytes));
         } catch (const peru::CException&) {
         }
     }
