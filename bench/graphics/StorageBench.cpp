@@ -15,8 +15,10 @@ constexpr SPixelSize kSize{3872, 2592}; // 10 megapixels
 const std::string& getArchive() {
     static const std::string archive = [] {
         std::vector<uint32_t> pixels(static_cast<size_t>(kSize.width) * static_cast<size_t>(kSize.height));
+        // Some noise, so that the files have the size of photographs.
         for (size_t i = 0; i < pixels.size(); ++i)
-            pixels[i] = 0xFF000000u | static_cast<uint32_t>(i % static_cast<size_t>(kSize.width) / 16);
+            pixels[i] = 0xFF000000u | static_cast<uint32_t>(i % static_cast<size_t>(kSize.width) / 16) |
+                        (static_cast<uint32_t>(i) * 2654435761u >> 28) << 10;
         const std::string jpeg = encodeImage(EBitmapFormat::jpg, pixels, kSize);
         auto document = peru::make<CGraphicDocument>();
         for (int i = 0; i < kImages; ++i) {
