@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Writes a design that shows every type of element, as an exported project: showcase.py FILE.xml
 
-It also shows how another program can make such a file: the elements are XML, and texts and pictures are in it as base64.
+It also shows how another program can make such a file: elements are XML, texts and pictures are in it as base64.
 """
 
 import base64
@@ -101,14 +101,16 @@ def element(parent, tag, left, top, width, height, rotation=0, **attributes):
     return node
 
 
-def shape(parent, kind, left, top, width, height, fill, line=None, rotation=0, gradient=None, form=None, **more):
+def shape(
+    parent, kind, left, top, width, height, fill, line=None, rotation=0, gradient=None, form=None, style=SOLID, **more
+):
     node = element(parent, "shape", left, top, width, height, rotation, shape=kind, **more)
     if gradient:
         child = xml.SubElement(node, "gradient")
         colour(child, "start", gradient[0])
         colour(child, "end", gradient[1])
     brush(node, fill)
-    pen(node, line)
+    pen(node, line, 0.7 if style == DOT else 0.4, style)
     if form:
         xml.SubElement(node, "free-form", name=f"freeform.{form}")
     return node
@@ -157,8 +159,8 @@ def table(parent, left, top, width, height, columns, rows):
             rich_text(cell, [[(words, style)]], 8, BLUE if i == 0 else DARK, RIGHT if j == len(row) - 1 else LEFT)
 
 
-def design(parent, tag, width, height):
-    document = xml.SubElement(xml.SubElement(parent, tag), "graphic-document", version="1")
+def design(target, width, height):
+    document = xml.SubElement(xml.SubElement(target, "item"), "graphic-document", version="1")
     box = {"left": "0", "top": "0", "width": number(width), "height": number(height)}
     xml.SubElement(document, "bounding-box", box)
     xml.SubElement(document, "content-box", box)
@@ -168,12 +170,13 @@ def design(parent, tag, width, height):
 # The designs
 
 
-def front(parent):
+def front(target):
     """Shapes and pictures, one of each kind with its name below."""
-    page = design(parent, "jewel-case-front", 121, 121)
+    page = design(target, 121, 121)
     element(page, "paper", 0, 0, 121, 121)
     shape(page, "rectangle", 0, 0, 121, 121, WHITE, gradient=((226, 234, 246), WHITE))
-    text(page, 6, 4, 109, 12, [[("Every element ", {"fontweight": "700"}), ("on one cover", {"fontstyle": "93"})]], size=18, align=CENTER)
+    title = [[("Every element ", {"fontweight": "700"}), ("on one cover", {"fontstyle": "93"})]]
+    text(page, 6, 4, 109, 12, title, size=18, align=CENTER)
 
     cells = [(8 + 37 * (i % 3), 19 + 25 * (i // 3)) for i in range(12)]
     names = ["rectangle", "circle", "ellipse, gradient", "rounded rectangle", "star", "triangle, turned"]
@@ -190,9 +193,7 @@ def front(parent):
     shape(page, "rounded-rectangle", cells[3][0] + 2, cells[3][1], 27, 17, GREEN, DARK, **{"corner-radius": "5"})
     shape(page, "free-form", cells[4][0] + 6, cells[4][1], 19, 18, GOLD, DARK, form="star")
     shape(page, "free-form", cells[5][0] + 8, cells[5][1] + 1, 14, 14, RED, DARK, rotation=30, form="triangle")
-    node = shape(page, "free-form", cells[6][0] + 3, cells[6][1] + 1, 25, 16, (240, 240, 245), form="trapeze")
-    node.remove(node.find("pen"))
-    pen(node, BLUE, 0.7, DOT)
+    shape(page, "free-form", cells[6][0] + 3, cells[6][1] + 1, 25, 16, (240, 240, 245), BLUE, form="trapeze", style=DOT)
     image(page, cells[7][0] + 3, cells[7][1], 25, 18, picture(sunset, 400, 288))
     image(page, cells[8][0] + 6, cells[8][1], 18, 18, picture(badge, 240, 240), rotation=15)
 
@@ -215,16 +216,17 @@ def front(parent):
     element(page, "state-button", 100, 112, 18, 6, label="Edit", hint="Changes the cover")
 
 
-def back(parent):
+def back(target):
     """Texts in all alignments, a table, and elements that are turned, mirrored and grey."""
-    page = design(parent, "jewel-case-back", 151, 118)
+    page = design(target, 151, 118)
     shape(page, "rectangle", 0, 0, 151, 118, (250, 248, 242))
     spine = [[("Every element  ", {"fontweight": "700"}), ("Tonewright", {})]]
     for left, rotation in ((-56, 270), (89, 90)):
         shape(page, "rectangle", 0 if left < 0 else 145, 0, 6, 118, DARK)
         text(page, left, 56.5, 118, 5, spine, rotation, size=9, rgb=WHITE, align=CENTER)
     text(page, 12, 6, 127, 9, "Texts and tables", size=16, rgb=BLUE)
-    words = "Lines are broken in millimetres, so they are the same on a screen, on paper and in a picture of any resolution."
+    words = "Lines are broken in millimetres, so they are the same on a screen, on paper and in a picture"
+    words += " of any resolution."
     for i, (align, name) in enumerate(((LEFT, "Left"), (CENTER, "Center"), (RIGHT, "Right"), (JUSTIFIED, "Justified"))):
         paragraphs = [[(f"{name}: ", {"fontweight": "700"}), (words, {})]]
         text(page, 12 + 32 * i, 18, 29, 20, paragraphs, size=7, align=align)
@@ -235,19 +237,21 @@ def back(parent):
     pieces += [("underlined", {"fontunderlined": "1"}), (", ", {}), ("red", {"textcolor": "#BE3C32"})]
     pieces += [(" and ", {}), ("large", {"fontpointsize": "14"})]
     text(page, 12, 88, 82, 9, [pieces])
-    text(page, 12, 98, 82, 14, ["Other scripts: Größe, Ελληνικά, Русский", "$title stands for the title of the disc."], size=8)
+    words = ["Other scripts: Größe, Ελληνικά, Русский", "$title stands for the title of the disc."]
+    text(page, 12, 98, 82, 14, words, size=8)
 
     data = picture(sunset, 400, 288)
-    for i, (name, more) in enumerate((("turned", {}), ("mirrored", {"mirror-x": "true"}), ("grey", {"coloured": "false"}))):
+    variants = (("turned", {}), ("mirrored", {"mirror-x": "true"}), ("grey", {"coloured": "false"}))
+    for i, (name, more) in enumerate(variants):
         node = image(page, 107, 54 + 20 * i, 24, 16, data, rotation=20 if i == 0 else 0)
         for key, value in more.items():
             node.set(key, value)
         label(page, 132, 61 + 20 * i, 12, 4, name, 6, rgb=GREY)
 
 
-def disc(parent):
+def disc(target):
     """A label with texts on circles."""
-    page = design(parent, "disc", 117, 117)
+    page = design(target, 117, 117)
     node = element(page, "circle", 0, 0, 117, 117)
     brush(node, (236, 240, 246))
     pen(node, GREY, 0.2)
@@ -261,7 +265,8 @@ def disc(parent):
 
 
 def main():
-    root = xml.Element("project", {"version": "2", "creator": "showcase.py", "print-cutmarks": "true", "print-coloured": "true"})
+    root = xml.Element("project", {"version": "2", "creator": "showcase.py"})
+    root.attrib |= {"print-cutmarks": "true", "print-coloured": "true"}
     content = xml.SubElement(root, "content", {"title": "Every element", "sub-title": "", "type": "audio"})
     xml.SubElement(content, "items")
     case = xml.SubElement(root, "jewel-case")

@@ -9,12 +9,6 @@
 
 namespace host {
 
-std::string isNumber(const std::string& text) {
-    return std::isnan(std::strtod(text.c_str(), nullptr))
-               ? tr("host.arguments.isNotANumber", "is not a number")
-               : "";
-}
-
 std::string toWholeNumber(std::string& text, const std::string& unit) {
     char* end = nullptr;
     double number = std::strtod(text.c_str(), &end);

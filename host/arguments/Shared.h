@@ -3,6 +3,7 @@
 
 #include "library/Library.h"
 #include "media/FormatOptions.h"
+#include "parser/Parser.h"
 #include "terminal/Progress.h"
 
 #include <CLI/CLI.hpp>
@@ -14,9 +15,6 @@ namespace host {
 
 // The command that the user chose; set by the parser. Returns an exit code.
 using Run = std::function<int(CLibrary&)>;
-
-// A check for numbers, since CLI::Range accepts NaN.
-std::string isNumber(const std::string& text);
 
 // The options of the output format. `widths` are the bits per sample to choose from.
 void addFormat(CLI::App& command, SFormatOptions& options, const std::set<int>& widths);

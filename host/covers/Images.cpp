@@ -21,14 +21,9 @@ int writeImages(const SImagesRequest& request) {
     const int code = runForFile(request.file, [&] {
         const std::string bytes = readFile(request.file);
         const P<ced::CProject> project = ced::CProject::FromBytes(bytes);
-        const auto forEach = [&](const std::function<void(const SAttachment&)>& use) {
-            forEachAttachment(*project, bytes, [&](const SAttachment& attachment) {
-                if (isCancelled()) throw peru::CAbortedError();
-                if (attachment.bytes) use(attachment);
-            });
-        };
-        forEach([&](const SAttachment& each) {
-            requireFree(request.folder / each.name, request.force, request.file);
+        forEachAttachment(*project, bytes, [&](const SAttachment& each) {
+            if (isCancelled()) throw peru::CAbortedError();
+            if (each.bytes) requireFree(request.folder / each.name, request.force, request.file);
         });
         std::error_code error;
         fs::create_directories(request.folder, error);

@@ -8,7 +8,6 @@
 #include "base/Translation.h"
 #include "parser/Parser.h"
 
-#include <cmath>
 #include <functional>
 #include <memory>
 
@@ -31,12 +30,6 @@ std::function<std::string(const std::string&)> endsInOneOf(const char* const (&t
         return tr("host.Covers.extension", "%FILE% does not end in one of %LIST%",
                   {{"%FILE%", name}, {"%LIST%", list}});
     };
-}
-
-std::string isNumber(const std::string& text) {
-    return std::isnan(std::strtod(text.c_str(), nullptr))
-               ? tr("host.arguments.isNotANumber", "is not a number")
-               : "";
 }
 
 template <class Options> void addFile(CLI::App& command, Options& options) {

@@ -6,7 +6,9 @@
 #include "parser/ParserErrors.h"
 
 #include <algorithm>
+#include <cmath>
 #include <cstdio>
+#include <cstdlib>
 
 namespace host {
 
@@ -104,6 +106,12 @@ std::optional<int> parseArguments(CLI::App& app, int argc, char** argv) {
         return app.exit(error) == 0 ? kExitSuccess : kExitUsage;
     }
     return std::nullopt;
+}
+
+std::string isNumber(const std::string& text) {
+    return std::isnan(std::strtod(text.c_str(), nullptr))
+               ? tr("host.arguments.isNotANumber", "is not a number")
+               : "";
 }
 
 } // namespace host

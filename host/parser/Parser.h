@@ -3,6 +3,7 @@
 
 #include <CLI/CLI.hpp>
 #include <optional>
+#include <string>
 
 namespace host {
 
@@ -19,5 +20,8 @@ void addLanguage(CLI::App& app);
 // Reads the arguments. Returns an exit code if the program is to end: after a help text, or after an error
 // that was printed. The call runs the callbacks of options and commands.
 std::optional<int> parseArguments(CLI::App& app, int argc, char** argv);
+
+// A check for numbers, since CLI::Range accepts NaN.
+std::string isNumber(const std::string& text);
 
 } // namespace host
