@@ -43,6 +43,14 @@ install(TARGETS ${plugins} LIBRARY DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER} COMPO
 install(FILES ${descriptions} DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER} COMPONENT libraries)
 install(TARGETS ${companions} RUNTIME DESTINATION ${TONEWRIGHT_COMPANION_FOLDER} COMPONENT libraries)
 install(TARGETS tonewright_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT program)
+# Apart from the others, whose packages would otherwise depend on the user interface toolkit.
+install(TARGETS tonewright_covereditor LIBRARY DESTINATION ${TONEWRIGHT_PLUGIN_FOLDER} COMPONENT covers)
+install(TARGETS tonewright_covers RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT covers)
+install(
+    FILES ${PROJECT_SOURCE_DIR}/docs/covers.md ${PROJECT_SOURCE_DIR}/docs/project.xsd ${PROJECT_SOURCE_DIR}/docs/examples/showcase.py
+    DESTINATION ${doc_dir}/tonewright-covers
+    COMPONENT covers
+)
 install(
     TARGETS plugin_support
     EXPORT tonewright-plugin-support-targets

@@ -1,6 +1,7 @@
 # cpack -G DEB, best through scripts/package.sh:
 #   libtonewright0      libraries, plug-ins and companions
 #   tonewright          the command line program
+#   tonewright-covers   the program for graphic documents, with their module
 #   libtonewright-dev   headers, link names, the library for plug-ins, documentation and examples
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_NAME tonewright)
@@ -8,7 +9,7 @@ set(CPACK_PACKAGE_CONTACT "Tonewright maintainers <maintainers@tonewright.invali
 set(CPACK_PACKAGE_DIRECTORY ${PROJECT_SOURCE_DIR}/dist)
 set(CPACK_STRIP_FILES ON)
 set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
-set(CPACK_COMPONENTS_ALL libraries program development)
+set(CPACK_COMPONENTS_ALL libraries program covers development)
 set(CPACK_DEB_COMPONENT_INSTALL ON)
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_ENABLE_COMPONENT_DEPENDS ON)
@@ -20,8 +21,9 @@ set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${TONEWRIGHT_LIBRARY_DIR})
 
 set(libraries_package libtonewright${PROJECT_VERSION_MAJOR})
 set(program_package tonewright)
+set(covers_package tonewright-covers)
 set(development_package libtonewright-dev)
-foreach(component libraries program development)
+foreach(component libraries program covers development)
     string(TOUPPER ${component} key)
     set(CPACK_DEBIAN_${key}_PACKAGE_NAME ${${component}_package})
     set(CPACK_DEBIAN_${key}_PACKAGE_SHLIBDEPS ON)
@@ -30,9 +32,11 @@ set(CPACK_DEBIAN_LIBRARIES_PACKAGE_SECTION libs)
 # Loaded at the first use of a device and at the first write of a disc, so not linked.
 set(CPACK_DEBIAN_LIBRARIES_PACKAGE_DEPENDS "libportaudio2, libburn4, libisofs6")
 set(CPACK_DEBIAN_PROGRAM_PACKAGE_SECTION sound)
+set(CPACK_DEBIAN_COVERS_PACKAGE_SECTION graphics)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SHLIBDEPS OFF)
 set(CPACK_COMPONENT_PROGRAM_DEPENDS libraries)
+set(CPACK_COMPONENT_COVERS_DEPENDS libraries)
 set(CPACK_COMPONENT_DEVELOPMENT_DEPENDS libraries)
 set(CPACK_COMPONENT_LIBRARIES_DESCRIPTION
     "core library of a desktop audio suite
@@ -44,6 +48,12 @@ set(CPACK_COMPONENT_PROGRAM_DESCRIPTION
 The command line program of the Tonewright library. It reads and writes WAV,
 FLAC, Ogg Vorbis and MP3, carries tags and pictures from one format to the
 other, and replaces a file only by a complete one."
+)
+set(CPACK_COMPONENT_COVERS_DESCRIPTION
+    "shows, paints and converts covers and labels of discs
+The module of the Tonewright library for graphic documents, with a command
+line program that paints designs as PNG, PDF and SVG and converts projects.
+It needs no display."
 )
 set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION
     "core library of a desktop audio suite (development files)
@@ -96,7 +106,7 @@ if(TONEWRIGHT_PACKAGING)
     foreach(name changelog changelog.Debian)
         execute_process(COMMAND ${GZIP} -9nkf ${name} WORKING_DIRECTORY ${PROJECT_BINARY_DIR} COMMAND_ERROR_IS_FATAL ANY)
     endforeach()
-    foreach(component libraries program development)
+    foreach(component libraries program covers development)
         install(
             FILES ${PROJECT_SOURCE_DIR}/packaging/copyright ${changelogs}
             DESTINATION ${doc_dir}/${${component}_package}

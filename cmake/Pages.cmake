@@ -6,21 +6,27 @@ if(TONEWRIGHT_SANITIZERS OR TONEWRIGHT_COVERAGE OR CMAKE_CROSSCOMPILING OR NOT P
     return()
 endif()
 
-set(pages ${PROJECT_BINARY_DIR}/pages)
 set(compress $<$<BOOL:${TONEWRIGHT_PACKAGING}>:--compress>) # Debian's policy
-add_custom_command(
-    OUTPUT ${pages}.stamp
-    COMMAND ${Python3_EXECUTABLE} ${PROJECT_SOURCE_DIR}/packaging/pages.py $<TARGET_FILE:tonewright_host> ${PROJECT_VERSION} ${pages} ${compress}
-    COMMAND ${CMAKE_COMMAND} -E touch ${pages}.stamp
-    DEPENDS tonewright_host ${PROJECT_SOURCE_DIR}/packaging/pages.py
-    COMMENT "Manual pages and completions"
-    VERBATIM
-)
-add_custom_target(tonewright_pages ALL DEPENDS ${pages}.stamp)
-
 # Debian's zsh searches site-functions below /usr/local only.
 set(zsh_folder $<IF:$<BOOL:${TONEWRIGHT_PACKAGING}>,vendor-completions,site-functions>)
-install(DIRECTORY ${pages}/man1 DESTINATION ${CMAKE_INSTALL_MANDIR} COMPONENT program)
-install(FILES ${pages}/tonewright DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/bash-completion/completions COMPONENT program)
-install(FILES ${pages}/_tonewright DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/zsh/${zsh_folder} COMPONENT program)
-install(FILES ${pages}/tonewright.fish DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/fish/vendor_completions.d COMPONENT program)
+
+# install_pages(TARGET NAME COMPONENT): the pages and completions of a program.
+function(install_pages target name component)
+    set(pages ${PROJECT_BINARY_DIR}/pages-${name})
+    add_custom_command(
+        OUTPUT ${pages}.stamp
+        COMMAND ${Python3_EXECUTABLE} ${PROJECT_SOURCE_DIR}/packaging/pages.py $<TARGET_FILE:${target}> ${PROJECT_VERSION} ${pages} ${compress}
+        COMMAND ${CMAKE_COMMAND} -E touch ${pages}.stamp
+        DEPENDS ${target} ${PROJECT_SOURCE_DIR}/packaging/pages.py
+        COMMENT "Manual pages and completions of ${name}"
+        VERBATIM
+    )
+    add_custom_target(${target}_pages ALL DEPENDS ${pages}.stamp)
+    install(DIRECTORY ${pages}/man1 DESTINATION ${CMAKE_INSTALL_MANDIR} COMPONENT ${component})
+    install(FILES ${pages}/${name} DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/bash-completion/completions COMPONENT ${component})
+    install(FILES ${pages}/_${name} DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/zsh/${zsh_folder} COMPONENT ${component})
+    install(FILES ${pages}/${name}.fish DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/fish/vendor_completions.d COMPONENT ${component})
+endfunction()
+
+install_pages(tonewright_host tonewright program)
+install_pages(tonewright_covers tonewright-covers covers)

@@ -14,13 +14,15 @@ import subprocess
 import sys
 from dataclasses import dataclass, field
 
-NAME = "tonewright"
+NAME = ""  # of the program; set by main()
 FOLDERS = {"FOLDER", "DIRECTORY", "DIR"}
 FILES = {"FILE", "FILES", "IN", "OUT", "PATH", "ARRANGEMENT", "IMAGE", "PICTURE"}
-ENVIRONMENT = [
-    ("TONEWRIGHT_PLUGIN_PATH", "Folders, separated by colons, that are searched first for media plug-ins."),
-    ("TONEWRIGHT_RESAMPLER", "With the value best, a steeper filter changes sample rates."),
-]
+ENVIRONMENT = {
+    "tonewright": [
+        ("TONEWRIGHT_PLUGIN_PATH", "Folders, separated by colons, that are searched first for media plug-ins."),
+        ("TONEWRIGHT_RESAMPLER", "With the value best, a steeper filter changes sample rates."),
+    ]
+}
 
 
 @dataclass
@@ -153,8 +155,9 @@ def allowed_values(program, path, option):
     return [value.split("->")[0] for value in found.group(1).split(",")] if found else []
 
 
-def read_commands(program, path=(NAME,)):
+def read_commands(program, path=()):
     """The command and all commands below it, parents first."""
+    path = path or (NAME,)
     answer = run(program, *path[1:], "--help")
     try:
         if answer.returncode != 0:
@@ -199,7 +202,7 @@ def texts(paragraphs):
 
 
 def manual_page(command, commands, version):
-    lines = [f'.TH {command.page.upper()} 1 "" "{NAME.capitalize()} {version}" "User Commands"']
+    lines = [f'.TH {command.page.upper()} 1 "" "Tonewright {version}" "User Commands"']
     lines += [".SH NAME", f"{roff(command.page)} \\- {roff(command.summary)}"]
     lines += [".SH SYNOPSIS", usage_line(command), ".SH DESCRIPTION"]
     lines += texts(command.description)[1:]
@@ -231,9 +234,9 @@ def manual_page(command, commands, version):
         for code in re.split(r", (?=\d+ )", codes.group(1).rstrip(".")):
             number, meaning = code.split(" ", 1)
             lines += [".TP", f"\\fB{number}\\fR", roff(meaning)]
-    if len(command.path) == 1:
+    if len(command.path) == 1 and NAME in ENVIRONMENT:
         lines.append(".SH ENVIRONMENT")
-        for name, text in ENVIRONMENT:
+        for name, text in ENVIRONMENT[NAME]:
             lines += [".TP", f"\\fB{name}\\fR", roff(text)]
     parents = [other.page for other in commands if other is not command and is_related(command, other)]
     if parents:
@@ -254,6 +257,10 @@ def value_kind(entry):
     return "folder" if word in FOLDERS else "file" if word in FILES else "none"
 
 
+def function_name():
+    return "_" + NAME.replace("-", "_")
+
+
 def takes_files(command):
     return any(True for _ in command.entries("argument"))
 
@@ -271,7 +278,7 @@ def bash_completion(commands):
     known = "|".join(f'"{" ".join(command.path)}"' for command in commands)
     lines = [
         f"# bash completion for {NAME}, made from the program's --help.",
-        f"_{NAME}() {{",
+        f"{function_name()}() {{",
         '    local cur=${COMP_WORDS[COMP_CWORD]} prev=${COMP_WORDS[COMP_CWORD - 1]} command=' + NAME,
         "    local i word words= values= kind=none",
         "    COMPREPLY=()",
@@ -319,7 +326,7 @@ def bash_completion(commands):
         "    compopt +o default +o bashdefault",
         '    if [[ -n $words ]]; then mapfile -t COMPREPLY < <(compgen -W "$words" -- "$cur"); fi',
         "}",
-        f"complete -o bashdefault -o default -F _{NAME} {NAME}",
+        f"complete -o bashdefault -o default -F {function_name()} {NAME}",
     ]
     return "\n".join(lines) + "\n"
 
@@ -364,7 +371,7 @@ def zsh_completion(commands):
             lines += [f"        {spec} \\" for spec in specs]
             lines.append("        '*:file:_files'" if takes_files(command) else "        ':'")
         lines += ["}", ""]
-    lines.append(f'_{NAME} "$@"')
+    lines.append(f'{function_name()} "$@"')
     return "\n".join(lines) + "\n"
 
 
@@ -375,7 +382,7 @@ def fish_completion(commands):
         f"# fish completion for {NAME}, made from the program's --help.",
         "",
         "# Whether the words in front of the cursor select this command, such as \"tag set\".",
-        f"function __{NAME}_at",
+        f"function _{function_name()}_at",
         "    set -l found",
         "    set -l skip 0",
         "    for word in (commandline -opc)[2..]",
@@ -395,7 +402,7 @@ def fish_completion(commands):
         f"complete -c {NAME} -f",
     ]
     for command in commands:
-        start = f"complete -c {NAME} -n {text(' '.join((f'__{NAME}_at', *command.path[1:])))}"
+        start = f"complete -c {NAME} -n {text(' '.join((f'_{function_name()}_at', *command.path[1:])))}"
         if takes_files(command):
             lines.append(f"{start} -F")
         for entry in command.entries("command"):
@@ -416,7 +423,9 @@ def fish_completion(commands):
 
 
 def main():
+    global NAME
     program, version, folder = sys.argv[1:4]
+    NAME = pathlib.Path(program).name
     compress = "--compress" in sys.argv[4:]
     target = pathlib.Path(folder)
     # A page of a command that no longer exists must not be installed.

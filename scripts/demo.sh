@@ -1,11 +1,11 @@
 #!/usr/bin/env bash
-# A first demonstration: installs missing packages, builds, converts real recordings to four formats and mixes three
-# of them. The results go to the given folder, by default build/demo.
+# A first demonstration: installs missing packages, builds, converts real recordings to four formats, mixes three of
+# them and paints a design of covers. The results go to the given folder, by default build/demo.
 set -euo pipefail
 
 target=$(realpath -m -- "${1:-$(dirname "$0")/../build/demo}")
 cd "$(dirname "$0")/.."
-scripts/build.sh release tonewright_host companions/all plugins/all
+scripts/build.sh release tonewright_host tonewright_covers companions/all plugins/all
 tonewright=build/release/bin/tonewright
 mkdir -p "$target"
 
@@ -32,8 +32,19 @@ arrangement=docs/examples/arrangement.xml
 printf '\n%s mixed:\n' "$arrangement"
 "$tonewright" mix "$arrangement" -o "$target/mixed.flac" --force
 "$tonewright" waveform "$target/mixed.flac" -o "$target/mixed.png" --force
+
+# Every type of element: as XML, as a project, and painted.
+covers=build/release/bin/tonewright-covers
+printf '\nA design for covers:\n'
+python3 docs/examples/showcase.py "$target/showcase.xml"
+"$covers" convert "$target/showcase.xml" -o "$target/showcase.cedprj" --force
+"$covers" info "$target/showcase.cedprj"
+"$covers" render "$target/showcase.cedprj" --item 1 -o "$target/front.png" --force
+"$covers" render "$target/showcase.cedprj" --item 2 -o "$target/back.pdf" --force
+"$covers" render "$target/showcase.cedprj" --target disc -o "$target/disc.svg" --force
+
 cat <<TEXT
-Its waveform is in $target/mixed.png.
+The waveform of the mix is in $target/mixed.png.
 
 The files are in $target. Some commands to try next:
   $tonewright --help
@@ -41,4 +52,5 @@ The files are in $target. Some commands to try next:
   $tonewright info $target/*
   $tonewright mix $arrangement -o mixed.mp3
   $tonewright waveform $target/Front_Center.flac -o wave.png
+  $covers render $target/showcase.cedprj -o front.pdf
 TEXT

@@ -30,9 +30,9 @@ check_binary() {
 
 # Pages and completions describe every command and every option that the program has.
 check_command() {
-    local name="tonewright${*:+ $*}" page help option child
+    local root=$1 name="$*" page help option child
     page=$prefix/share/man/man1/${name// /-}.1
-    help=$("$program" "$@" --help)
+    help=$("$prefix/bin/$root" "${@:2}" --help)
     [[ ! -e $page.gz ]] || { gunzip -c "$page.gz" >page; page=page; }
     [[ -s $page ]] || fail "no manual page for $name"
     if command -v groff >/dev/null; then
@@ -48,8 +48,8 @@ check_command() {
     done
 }
 complete_words() {
-    bash -c 'source "$0"; compopt() { :; }; COMP_WORDS=(tonewright "$@") COMP_CWORD=$#; _tonewright; echo "${COMPREPLY[*]}"' \
-        "$prefix/share/bash-completion/completions/tonewright" "$@"
+    bash -c 'source "$0"; compopt() { :; }; COMP_WORDS=("$@") COMP_CWORD=$(($# - 1)); "_${1//-/_}"; echo "${COMPREPLY[*]}"' \
+        "$prefix/share/bash-completion/completions/$1" "$@"
 }
 
 for way in prefix destdir; do
@@ -67,7 +67,14 @@ for way in prefix destdir; do
 
     while read -r file; do check_binary "$file"; done < <(find "$prefix" -type f -perm -u+x -o -name '*.so*' -type f)
     ! grep -rl '\.\./\|/posix/' "$prefix/include" "$libdir/pkgconfig" || fail "relative or internal paths are installed"
-    [[ ! -e $build/pages.stamp ]] || check_command
+    if [[ -d $prefix/share/bash-completion ]]; then
+        check_command tonewright
+        check_command tonewright-covers
+    fi
+    # Packages without the program for covers must not need a user interface toolkit.
+    for file in "$program" "$library" "$libdir"/libtonewright_host.so; do
+        [[ ! $(ldd "$file") =~ libgtk|libwx|libcairo ]] || fail "$file loads a user interface toolkit"
+    done
 
     # pkg-config puts DESTDIR in front of the paths, as a build of a dependent package does.
     compile() {
@@ -94,6 +101,10 @@ for project in "$source/host" "$source/cpp" "$examples/plugin"; do
 done
 quietly "$cmake" -S "$source/subproject" -B "$work/enclosing" -G Ninja "-DEXAMPLES=$source/../../docs/examples"
 quietly "$cmake" --build "$work/enclosing" --target users
+
+quietly python3 "$examples/showcase.py" showcase.xml
+quietly "$prefix/bin/tonewright-covers" render showcase.xml -o showcase.pdf
+[[ $(pdftotext showcase.pdf -) == *"Every element"* ]] || fail "tonewright-covers paints no text"
 
 rm tone.flac
 quietly host/host tone.wav tone.flac
