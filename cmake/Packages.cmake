@@ -86,12 +86,14 @@ if(TONEWRIGHT_PACKAGING)
     add_custom_target(exported_symbols ALL DEPENDS ${symbols})
     set(CPACK_DEBIAN_LIBRARIES_PACKAGE_CONTROL_EXTRA ${PROJECT_SOURCE_DIR}/packaging/triggers ${PROJECT_BINARY_DIR}/shlibs ${symbols})
 
-    install(
-        FILES ${PROJECT_SOURCE_DIR}/packaging/${libraries_package}.lintian-overrides
-        DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/lintian/overrides
-        RENAME ${libraries_package}
-        COMPONENT libraries
-    )
+    foreach(component libraries covers)
+        install(
+            FILES ${PROJECT_SOURCE_DIR}/packaging/${${component}_package}.lintian-overrides
+            DESTINATION ${CMAKE_INSTALL_DATAROOTDIR}/lintian/overrides
+            RENAME ${${component}_package}
+            COMPONENT ${component}
+        )
+    endforeach()
 
     # Every Debian package has a copyright file and two compressed changelogs under its own name.
     find_program(GZIP gzip REQUIRED)
