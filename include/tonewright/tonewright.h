@@ -424,7 +424,8 @@ TONEWRIGHT_API double TONEWRIGHT_INORMALIZE_processAudioSource(TONEWRIGHT_Handle
 /* One editor at a time; all calls on the host's window thread. */
 
 /* Creates the editor in a child window of `parent`. Result: the child window, which the host positions, or 0.
- * The callback may be null. */
+ * The callback may be null. The first call loads the cover editor's module, which is a package of its own;
+ * if it is missing or of another version, that is the last failure. */
 TONEWRIGHT_API TONEWRIGHT_WindowHandle TONEWRIGHT_CreateCoverEditorHandle(
     TONEWRIGHT_WindowHandle parent, const char16_t* userDataPath, TONEWRIGHT_CoverEditorCallback callback);
 
