@@ -65,9 +65,10 @@ void drawShape(cairo_t* cairo, const CGraphicShape& shape) {
 
 void drawImage(cairo_t* cairo, const CGraphicImage& image) {
     const CBitmap& bitmap = *image.GetBitmap();
+    const CPixels pixels = bitmap.GetPixels();
     const SSize size = image.GetSize();
     cairo_surface_t* const surface = cairo_image_surface_create_for_data(
-        reinterpret_cast<unsigned char*>(const_cast<uint32_t*>(bitmap.GetPixels().data())),
+        reinterpret_cast<unsigned char*>(const_cast<uint32_t*>(pixels.data())),
         CAIRO_FORMAT_ARGB32, bitmap.GetWidth(), bitmap.GetHeight(), bitmap.GetWidth() * 4);
     cairo_rectangle(cairo, -size.width / 2, -size.height / 2, size.width, size.height);
     cairo_translate(cairo, -size.width / 2, -size.height / 2);
@@ -106,15 +107,15 @@ void paint(CGraphicDocument& document, COffScreen& target) {
 
 // A comparison of speed is worth nothing if the pictures differ.
 void requireSamePicture(CGraphicDocument& document) {
-    const P<CBitmap> painted = RenderBitmap(document);
+    const CPixels painted = RenderBitmap(document)->GetPixels();
     cairo_surface_t* const drawn = drawWithCairo(document);
     const unsigned char* const bytes = cairo_image_surface_get_data(drawn);
     double difference = 0;
-    for (size_t i = 0; i < painted->GetPixels().size() * 4; ++i)
+    for (size_t i = 0; i < painted.size() * 4; ++i)
         difference +=
-            std::abs(reinterpret_cast<const unsigned char*>(painted->GetPixels().data())[i] - bytes[i]);
+            std::abs(reinterpret_cast<const unsigned char*>(painted.data())[i] - bytes[i]);
     cairo_surface_destroy(drawn);
-    if (difference / static_cast<double>(painted->GetPixels().size() * 4) > 0.05) std::abort();
+    if (difference / static_cast<double>(painted.size() * 4) > 0.05) std::abort();
 }
 
 const P<CGraphicDocument>& getSheet() {

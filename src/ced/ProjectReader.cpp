@@ -1,5 +1,6 @@
 #include "ced/ProjectReader.h"
 
+#include "ced/GraphicTableContent.h"
 #include "ced/ItemType.h"
 #include "graphics/elements/GraphicImage.h"
 #include "graphics/storage/BitmapFormats.h"
@@ -135,6 +136,9 @@ void CProjectReader::KeepOtherEntries(graphics::CZipCatalogue& catalogue) {
 }
 
 P<CProject> CProject::FromBytes(std::string bytes, EMode mode) {
+    // Designs contain elements of this namespace.
+    [[maybe_unused]] static const bool s_isRegistered =
+        (graphics::setElementFactory(peru::make<CGraphicElementFactory>()), true);
     return CProjectReader::Read(std::move(bytes), mode);
 }
 

@@ -1,4 +1,5 @@
 #include "ced/Project.h"
+#include "ced/GraphicTableContent.h"
 #include "ced/ItemType.h"
 #include "graphics/Elements.h"
 #include "support/Files.h"
@@ -81,7 +82,7 @@ TEST(Project, ReadsEveryKindOfFile) {
     };
     const std::string items =
         "<disc><item><attachment-thumbnail name=\"image0.jpg\"/><format type=\"disc\" width=\"116\"/>"
-        "<graphic-document><label text=\"a\"/></graphic-document></item></disc>";
+        "<graphic-document><label text=\"a\"/><table-content/></graphic-document></item></disc>";
     const struct {
         std::string bytes;
         EProjectFile kind;
@@ -109,6 +110,9 @@ TEST(Project, ReadsEveryKindOfFile) {
         for (const auto& [name, document] : project->GetDocuments()) count += document->GetItems().size();
         EXPECT_EQ(count, file.count) << static_cast<int>(file.kind);
         EXPECT_EQ(CProject::FromBytes(project->ToArchive())->GetDocuments().size(), 1u);
+        if (file.kind != EProjectFile::exported) continue;
+        const auto design = project->GetDocuments()[0].second->GetItems()[0]->GetDocument();
+        EXPECT_TRUE(P<CGraphicTableContent>(design->GetElement(1)));
     }
     const auto folded =
         CProject::FromBytes(files[4].bytes)->GetTarget(TargetType::jewelCase)->GetItems()[0]->GetDocument();

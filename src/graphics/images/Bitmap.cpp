@@ -68,7 +68,11 @@ bool CBitmap::HasAlpha() const {
 
 std::string CBitmap::Encode(EBitmapFormat format) const {
     if (format == m_format) return m_bytes;
-    return encodeImage(format, *GetPixels().GetImage());
+    const CPixels pixels = GetPixels();
+    if (m_isDamaged)
+        throw peru::CError(peru::localize("graphics.CBitmap.Damaged",
+                                          "The picture is damaged and cannot be stored in another format."));
+    return encodeImage(format, *pixels.GetImage());
 }
 
 } // namespace graphics

@@ -86,7 +86,8 @@ public:
     void DropVersions() const;
     // True if a pixel may not be opaque.
     bool HasAlpha() const;
-    // The content of a file. Throws CError if the format cannot be written.
+    // The content of a file. Throws CError if the format cannot be written, or if the bytes are damaged and
+    // the format is another one.
     std::string Encode(EBitmapFormat format) const;
 
 private:

@@ -1,5 +1,6 @@
 #include "graphics/storage/Base64Resources.h"
 
+#include "graphics/images/ImageCodec.h"
 #include "graphics/storage/BitmapFormats.h"
 #include "graphics/storage/XmlValues.h"
 #include "peru/Errors.h"
@@ -59,15 +60,11 @@ std::string readFile(const std::string& fileName) {
 P<CBitmap> loadFile(const std::string& fileName) {
     const std::string bytes = fileName.empty() ? std::string() : readFile(fileName);
     if (bytes.empty()) return {};
-    for (const EBitmapFormat format : {EBitmapFormat::jpg, EBitmapFormat::png, EBitmapFormat::jng,
-                                       EBitmapFormat::bmp, EBitmapFormat::ico}) {
-        try {
-            return peru::make<CBitmap>(format, bytes);
-        } catch (const peru::CException&) {
-            // not of this format
-        }
+    try {
+        return peru::make<CBitmap>(detectFormat(bytes), bytes);
+    } catch (const peru::CException&) {
+        return {};
     }
-    return {};
 }
 
 } // namespace

@@ -43,6 +43,10 @@ TEST(Bitmap, SurvivesEachFormat) {
 
 TEST(Bitmap, RejectsDamagedFiles) {
     std::mt19937 random(5);
+    const std::string whole = tests::makeBitmap(random, true)->Encode(EBitmapFormat::png);
+    const auto cut = peru::make<CBitmap>(EBitmapFormat::png, whole.substr(0, whole.size() / 2));
+    EXPECT_EQ(cut->Encode(EBitmapFormat::png).size(), whole.size() / 2);
+    EXPECT_THROW(cut->Encode(EBitmapFormat::jpg), peru::CError); // not a transparent picture
     for (const auto format : {EBitmapFormat::png, EBitmapFormat::jng, EBitmapFormat::jpg, EBitmapFormat::bmp,
                               EBitmapFormat::ico}) {
         const std::string bytes = tests::makeBitmap(random, true)->Encode(format);
