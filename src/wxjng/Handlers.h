@@ -7,8 +7,8 @@
 
 namespace wxjng {
 
-// Values of wxBitmapType that the toolkit does not define. They are numbers, since a sanitizer rejects variables of
-// that type with other values than its own.
+// Values of wxBitmapType that the toolkit does not define. They are numbers, since a sanitizer rejects
+// variables of that type with other values than its own.
 inline constexpr int kJngType = 1050;
 inline constexpr int kMngType = 1051;
 
