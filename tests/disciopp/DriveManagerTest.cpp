@@ -23,12 +23,18 @@ public:
         std::deque<std::vector<SMediumEvent>> steps; // guarded by the mutex, as all below
         int64_t time = 0;
         bool isWoken = false;
+        bool isIdle = false; // waits for events alone
         std::vector<std::string> watched;
 
         void add(const std::vector<SMediumEvent>& events) {
             std::lock_guard lock(mutex);
             steps.push_back(events);
+            isIdle = false;
             changed.notify_all();
+        }
+        void waitUntilIdle() {
+            std::unique_lock lock(mutex);
+            changed.wait_for(lock, std::chrono::seconds(60), [this] { return isIdle; });
         }
     };
 
@@ -38,7 +44,11 @@ public:
     std::vector<SMediumEvent> wait(int milliseconds) override {
         std::unique_lock lock(m_script.mutex);
         const auto hasNews = [&] { return m_script.isWoken || !m_script.steps.empty(); };
-        if (milliseconds < 0) m_script.changed.wait(lock, hasNews);
+        if (milliseconds < 0 && !hasNews()) {
+            m_script.isIdle = true;
+            m_script.changed.notify_all();
+            m_script.changed.wait(lock, hasNews);
+        }
         m_script.time += std::max(milliseconds, 0);
         if (m_script.steps.empty()) return {};
         const auto events = m_script.steps.front();
@@ -118,6 +128,7 @@ TEST_F(SManager, EventsFollowTheMedium) {
     // One that is usable, after an event of something that is no drive.
     writeImage();
     script.add({{"/dev/sdx", true}, {path, true}});
+    script.waitUntilIdle();
     EXPECT_EQ(listener->take(2), "1 3 ");
     const P<IDrive> drive = manager->findDrive(toURI(path + "/"));
     ASSERT_TRUE(drive);

@@ -87,6 +87,13 @@ TEST(Picture, Conversions_EqualTheirFormulas) {
         }
     }
     EXPECT_EQ(0u, failures);
+    // A last pixel without a partner has no v of its own.
+    Bytes odd(CYUY2Picture::getBlockBytes(3, 1), '\0');
+    odd.replace(0, 6, "\x52\x10\x90\xF0\x28\x50");
+    const int p = (0x28 - 16) * 298, d = 0x50 - 128;
+    const uint32_t last = makePixel((p + 409 * d + 128) >> 8, (p - 208 * d + 128) >> 8, (p + 128) >> 8);
+    const Bytes converted = planeOf(makePicture<CYUY2Picture>(3, 1, odd)->getRGBPicture(), 0);
+    EXPECT_EQ(converted.substr(8), Bytes(reinterpret_cast<const char*>(&last), 4));
 }
 
 TEST(Picture, RGBForm_IsMadeOnceAndAgainAfterAChange) {
