@@ -19,7 +19,8 @@ const std::string& getArchive() {
         for (size_t i = 0; i < pixels.size(); ++i)
             pixels[i] = 0xFF000000u | static_cast<uint32_t>(i % static_cast<size_t>(kSize.width) / 16) |
                         (static_cast<uint32_t>(i) * 2654435761u >> 28) << 10;
-        const std::string jpeg = encodeImage(EBitmapFormat::jpg, pixels, kSize);
+        const std::string jpeg =
+            peru::make<CBitmap>(kSize.width, kSize.height, std::move(pixels))->Encode(EBitmapFormat::jpg);
         auto document = peru::make<CGraphicDocument>();
         for (int i = 0; i < kImages; ++i) {
             const auto image = peru::make<CGraphicImage>();

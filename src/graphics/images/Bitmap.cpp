@@ -5,6 +5,7 @@
 #include "graphics/images/ScaledImage.h"
 #include "peru/Errors.h"
 #include "peru/log/LogManager.h"
+#include "peru/strings/IStringLocalizer.h"
 
 namespace graphics {
 
