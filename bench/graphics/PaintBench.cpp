@@ -68,8 +68,8 @@ void drawImage(cairo_t* cairo, const CGraphicImage& image) {
     const CPixels pixels = bitmap.GetPixels();
     const SSize size = image.GetSize();
     cairo_surface_t* const surface = cairo_image_surface_create_for_data(
-        reinterpret_cast<unsigned char*>(const_cast<uint32_t*>(pixels.data())),
-        CAIRO_FORMAT_ARGB32, bitmap.GetWidth(), bitmap.GetHeight(), bitmap.GetWidth() * 4);
+        reinterpret_cast<unsigned char*>(const_cast<uint32_t*>(pixels.data())), CAIRO_FORMAT_ARGB32,
+        bitmap.GetWidth(), bitmap.GetHeight(), bitmap.GetWidth() * 4);
     cairo_rectangle(cairo, -size.width / 2, -size.height / 2, size.width, size.height);
     cairo_translate(cairo, -size.width / 2, -size.height / 2);
     cairo_scale(cairo, size.width / bitmap.GetWidth(), size.height / bitmap.GetHeight());
@@ -112,8 +112,7 @@ void requireSamePicture(CGraphicDocument& document) {
     const unsigned char* const bytes = cairo_image_surface_get_data(drawn);
     double difference = 0;
     for (size_t i = 0; i < painted.size() * 4; ++i)
-        difference +=
-            std::abs(reinterpret_cast<const unsigned char*>(painted.data())[i] - bytes[i]);
+        difference += std::abs(reinterpret_cast<const unsigned char*>(painted.data())[i] - bytes[i]);
     cairo_surface_destroy(drawn);
     if (difference / static_cast<double>(painted.size() * 4) > 0.05) std::abort();
 }
