@@ -265,6 +265,8 @@ def disc(target):
 
 
 def main():
+    if len(sys.argv) != 2 or sys.argv[1].startswith("-"):
+        sys.exit("usage: showcase.py FILE.xml")
     root = xml.Element("project", {"version": "2", "creator": "showcase.py"})
     root.attrib |= {"print-cutmarks": "true", "print-coloured": "true"}
     content = xml.SubElement(root, "content", {"title": "Every element", "sub-title": "", "type": "audio"})
