@@ -17,6 +17,11 @@ using nlohmann::json;
 using testing::AllOf;
 using testing::HasSubstr;
 
+// The font library's configuration is never released.
+const std::vector<std::pair<std::string, std::string>> kEnvironment{
+    {"LC_ALL", "C.UTF-8"},
+    {"LSAN_OPTIONS", "print_suppressions=0:suppressions=" TONEWRIGHT_TEST_DATA "/font-leaks.supp"}};
+
 using Picture = std::unique_ptr<cairo_surface_t, void (*)(cairo_surface_t*)>;
 
 Picture readPng(const std::filesystem::path& file) {
@@ -47,7 +52,7 @@ protected:
     SProcessResult covers(std::vector<std::string> arguments) {
         arguments.insert(arguments.begin(), {"timeout", "-s", "KILL", "60", "env", "-u", "DISPLAY", "-u",
                                              "WAYLAND_DISPLAY", TONEWRIGHT_PROGRAM});
-        return run(arguments, folder.path(), {{"LC_ALL", "C.UTF-8"}});
+        return run(arguments, folder.path(), kEnvironment);
     }
     std::string succeed(const std::vector<std::string>& arguments) {
         const SProcessResult result = covers(arguments);
@@ -205,7 +210,7 @@ TEST_F(Covers, CtrlC_LeavesNothingHalfWritten) {
         const SProcessResult result =
             run({"timeout", "--preserve-status", "-s", "INT", "-k", "60", delay, TONEWRIGHT_PROGRAM, "render",
                  "show.xml", "-o", "new.png", "--dpi", "200", "-f"},
-                folder.path());
+                folder.path(), kEnvironment);
         EXPECT_TRUE(result.exitCode == 0 || result.exitCode == 130) << result.exitCode << result.err;
         for (const auto& file : std::filesystem::directory_iterator(folder.path()))
             EXPECT_TRUE(file.path().filename() == "show.xml" || file.path().filename() == "new.png") << file;

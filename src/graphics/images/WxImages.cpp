@@ -24,6 +24,11 @@ template <class Handler> void registerHandler(int type) {
     if (!wxImage::FindHandler(static_cast<wxBitmapType>(type))) wxImage::AddHandler(new Handler);
 }
 
+// A toolkit that was never started does not release its list.
+struct SHandlers {
+    ~SHandlers() { wxImage::CleanUpHandlers(); }
+};
+
 [[noreturn]] void fail(const char* key, const char* text, EBitmapFormat format) {
     throw peru::CError(
         peru::localize(key, text, {{"%FORMAT%", peru::CString::fromUTF8(getExtension(format))}}));
@@ -40,6 +45,7 @@ wxImageHandler* findHandler(EBitmapFormat format) {
 
 // The toolkit may be started and stopped in between, so its list decides what is missing.
 void registerImageHandlers() {
+    static const SHandlers s_handlers;
     registerHandler<wxBMPHandler>(wxBITMAP_TYPE_BMP);
     registerHandler<wxICOHandler>(wxBITMAP_TYPE_ICO);
     registerHandler<wxPNGHandler>(wxBITMAP_TYPE_PNG);
