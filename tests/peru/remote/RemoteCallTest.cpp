@@ -431,12 +431,12 @@ TEST_F(RemotePeer, SizesThatLieTakeNoMemory) {
 // Of a size above the limit nothing is read and nothing allocated, even if all of it would arrive.
 TEST_F(RemotePeer, MessagesAreLimited) {
     m_remote->setLimits(300, 100);
-    m_remote->startWorkInThread(10);
     for (int i = 0; i < 10; ++i) { // each below the limit, and together above it
         m_peer->send(addRequest());
+        EXPECT_TRUE(m_remote->processOne());
+        EXPECT_FALSE(m_remote->processOne()); // the last word of the request
         EXPECT_EQ(m_peer->receive(), addAnswer());
     }
-    m_remote->stopWorkInThread();
     m_peer->send(wire("return") + wire("Result") + hex("00FFFFFF7F"));
     const P<CMemoryBlock> block = make<CMemoryBlock>();
     const P<CEchoFunction> echo = make<CEchoFunction>();
