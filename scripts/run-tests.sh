@@ -13,6 +13,8 @@ preset=$1
 shift
 strict=()
 (($#)) || strict=(--no-tests=error)
+# The leak sanitizer misreads the thread-local storage of libraries that are loaded later, and then crashes.
+export ASAN_OPTIONS=intercept_tls_get_addr=0${ASAN_OPTIONS:+:$ASAN_OPTIONS}
 if [[ $preset == release ]]; then
     jobs=$(($(nproc) * 2)) realtime_jobs=$(($(nproc) + 1))
 else
