@@ -104,7 +104,7 @@ void CChunkIterator::adjustCurrentToInsertion(int64_t position, int64_t count) {
         m_offset += count;
     } else if (m_valid) {
         const int64_t inBody = position - m_offset - kHeaderSize;
-        if (inBody >= 0 && inBody <= m_bodySize) m_bodySize += count;
+        if (inBody >= 0 && inBody <= m_bodySize) grow(m_bodySize, count);
     }
 }
 

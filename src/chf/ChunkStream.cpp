@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <exception>
+#include <limits>
 
 namespace chf {
 
@@ -81,8 +82,12 @@ int64_t CChunkStream::findLiveSize(int64_t base) const {
 }
 
 void CChunkStream::resize(int64_t difference) {
-    m_size += difference;
+    grow(m_size, difference);
     m_sizeChanged = true;
+}
+
+void CChunkStream::grow(int64_t& size, int64_t count) {
+    if (__builtin_add_overflow(size, count, &size)) size = std::numeric_limits<int64_t>::max();
 }
 
 void CChunkStream::adjustToInsertion(int64_t position, int64_t count) {

@@ -49,6 +49,8 @@ protected:
     virtual int64_t findLiveSize(int64_t base) const;
     void adjustToInsertion(int64_t position, int64_t count);
     void adjustToRemoval(int64_t position, int64_t count);
+    // A size in a damaged file can be near the limit of its type; it stops there.
+    static void grow(int64_t& size, int64_t count);
 
     TRef<IChunkHolder> m_holder;
     TRef<IStream> m_underlying;

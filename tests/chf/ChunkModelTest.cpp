@@ -50,7 +50,7 @@ public:
     }
 
     void step() {
-        switch (pick(8)) {
+        switch (pick(m_opened.empty() ? 5 : 8)) { // the last three change an open stream
         case 0:
         case 1:
             return open();
@@ -159,7 +159,6 @@ private:
     }
 
     void write() {
-        if (m_opened.empty()) return;
         SOpened& target = m_opened[pick(m_opened.size())];
         std::string& bytes = target.node->bytes;
         const size_t position = pick(bytes.size() + 1);
@@ -170,7 +169,6 @@ private:
         target.stream->Write(data.data(), static_cast<uint32_t>(data.size()));
     }
     void insert() {
-        if (m_opened.empty()) return;
         SOpened& target = m_opened[pick(m_opened.size())];
         const size_t position = pick(target.node->bytes.size() + 1);
         const std::string data = randomBytes();
@@ -180,7 +178,6 @@ private:
         target.stream->Write(data.data(), static_cast<uint32_t>(data.size()));
     }
     void remove() {
-        if (m_opened.empty()) return;
         SOpened& target = m_opened[pick(m_opened.size())];
         std::string& bytes = target.node->bytes;
         const size_t position = pick(bytes.size() + 1);
