@@ -385,8 +385,9 @@ P<IURI> CURI::appendPath(const CStringArg& relativePath) const {
 P<IURI> CURI::makeRelativeTo(const P<IURI>& base) const {
     const P<IURI> same = make<CURI>(*this);
     if (m_parts->relative || !m_parts->hierarchical || !base || !base->isHierarchical()) return same;
-    if (!base->getScheme()->equals(getScheme()) || base->hasAuthority() != m_parts->authority ||
-        !base->getAuthority()->equals(getAuthority()))
+    // A relative base has no scheme, which is not the same as the empty one of ":/a".
+    if (base->isRelative() || !base->getScheme()->equals(getScheme()) ||
+        base->hasAuthority() != m_parts->authority || !base->getAuthority()->equals(getAuthority()))
         return same;
 
     SPath target = splitPath(m_parts->path);

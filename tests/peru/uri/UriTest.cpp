@@ -28,6 +28,11 @@ TEST(URI, TakesAFullURIApart) {
         {u->getFragment(), "f"},    {u->getSchemeSpecificPart(), "//user@host:8080/a/b?x=1#f"}};
     for (const auto& [part, expected] : parts) EXPECT_EQ(str(part), expected);
     EXPECT_EQ(u->getPort(), 8080);
+    EXPECT_EQ(str(u->getPortText()), "8080");
+    EXPECT_TRUE(uri("http://h:0/")->hasPort() && !uri("http://h/")->hasPort());
+    EXPECT_EQ(str(u->getObjectDesc()), str(u));
+    EXPECT_TRUE(u->hasFragment() && u->hasSchemeSpecificPart());
+    EXPECT_FALSE(uri("x")->hasFragment() || uri("")->hasSchemeSpecificPart());
     EXPECT_TRUE(u->isHierarchical());
     EXPECT_FALSE(u->isRelative());
 }
@@ -94,7 +99,9 @@ TEST(URI, PartsAreEscapedWithTheirSets) {
 
     EXPECT_EQ(str(P<IURI>(make<CURI>("", "", "", "", "", "", ""))), "");
     EXPECT_EQ(str(P<IURI>(make<CURI>("file", "", "", "", "/a", "", ""))), "file:///a");
-    EXPECT_EQ(str(P<IURI>(make<CURI>("http", "::1", "", "", "", "", ""))), "http://[::1]");
+    for (const char* host : {"::1", "[::1]"})
+        EXPECT_EQ(str(P<IURI>(make<CURI>("http", host, "", "", "", "", ""))), "http://[::1]");
+    EXPECT_EQ(str(CURI::getFileURI("C:\\a\\b.txt")), "file:///C:/a/b.txt");
     const P<IURI> opaque = make<CURI>("winresicon", "", "", "", "shell32.dll,-1", "", "");
     EXPECT_EQ(str(opaque), "winresicon:shell32.dll,-1");
     EXPECT_FALSE(opaque->isHierarchical());
@@ -116,11 +123,8 @@ TEST(URI, EveryByteOfANameSurvives) {
 }
 
 TEST(URI, NamesOfFiles) {
-    struct SCase {
-        const char *text, *name, *extension, *parent;
-    };
-    for (const SCase& c : {
-             SCase{"file:///a/b.TXT", "b.TXT", "TXT", "file:///a/"},
+    for (const auto& [text, name, extension, parent] : std::initializer_list<std::array<const char*, 4>>{
+             {"file:///a/b.TXT", "b.TXT", "TXT", "file:///a/"},
              {"file:///a/b.d/", "b.d", "d", "file:///a/"},
              {"file:///a.tar.gz?q#f", "a.tar.gz", "gz", "file:///"},
              {"file:///.bashrc", ".bashrc", "", "file:///"},
@@ -135,9 +139,9 @@ TEST(URI, NamesOfFiles) {
              {"../", "..", "", "(none)"},
              {"winresicon:a/b.dll", "", "", "(none)"},
          }) {
-        EXPECT_EQ(str(uri(c.text)->getFileName()), c.name) << c.text;
-        EXPECT_EQ(str(uri(c.text)->getExtension()), c.extension) << c.text;
-        EXPECT_EQ(str(uri(c.text)->getParent()), c.parent) << c.text;
+        EXPECT_EQ(str(uri(text)->getFileName()), name) << text;
+        EXPECT_EQ(str(uri(text)->getExtension()), extension) << text;
+        EXPECT_EQ(str(uri(text)->getParent()), parent) << text;
     }
 }
 
@@ -146,10 +150,7 @@ TEST(URI, AppendedMadeRelativeAndResolved) {
     const Operation append = [](const P<IURI>& u, const char* path) { return u->appendPath(path); };
     const Operation shorten = [](const P<IURI>& u, const char* base) { return u->makeRelativeTo(uri(base)); };
     const Operation resolve = [](const P<IURI>& u, const char* base) { return u->resolveAgainst(uri(base)); };
-    const struct {
-        Operation operation;
-        const char *first, *second, *result;
-    } cases[] = {
+    const std::tuple<Operation, const char*, const char*, const char*> cases[] = {
         {append, "file:///a", "b", "file:///a/b"},
         {append, "file:///a/", "/b/", "file:///a/b/"},
         {append, "file:///", "100% #1?.wav", "file:///100%25%20%231%3F.wav"},
@@ -168,6 +169,8 @@ TEST(URI, AppendedMadeRelativeAndResolved) {
         {shorten, "http://h/a/b", "http://g/a/c", "http://h/a/b"},
         {shorten, "http://h/a/b?q#f", "http://h/a/c", "b?q#f"},
         {shorten, "a/b", "file:///a/c", "a/b"},
+        {shorten, "a/b", "a/c", "a/b"},
+        {shorten, "x:/a/b", "x:a/c", "x:/a/b"},
         {resolve, "../x", "file:///a/b/c", "file:///a/x"},
         {resolve, "../../../x", "file:///a/b", "file:///x"},
         {resolve, "", "file:///a/b", "file:///a/"},
@@ -178,8 +181,9 @@ TEST(URI, AppendedMadeRelativeAndResolved) {
         {resolve, "x?q#f", "http://u@h:1/a/b?r", "http://u@h:1/a/x?q#f"},
         {resolve, "../x", "a/b", "x"},
     };
-    for (const auto& c : cases)
-        EXPECT_EQ(str(c.operation(uri(c.first), c.second)), c.result) << c.first << " and " << c.second;
+    for (const auto& [operation, first, second, result] : cases)
+        EXPECT_EQ(str(operation(uri(first), second)), result) << first << " and " << second;
+    EXPECT_EQ(str(uri("x:/a")->makeRelativeTo(nullptr)), "x:/a");
 }
 
 TEST(URI, RelativeFormResolvesBack) {

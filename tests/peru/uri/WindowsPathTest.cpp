@@ -43,32 +43,20 @@ TEST(WindowsPath, FollowsTheGrammarBothWays) {
 }
 
 TEST(WindowsPath, TakesTheLongFormFrom240UnitsUpwards) {
-    const std::string shortPath = fill("C:\\", 239);
-    const std::string longPath = fill("C:\\", 240);
-    EXPECT_EQ(toWindows(fromWindows(shortPath)), shortPath);
-    EXPECT_EQ(toWindows(fromWindows(longPath)), "\\\\?\\" + longPath);
-    EXPECT_EQ(fromWindows("\\\\?\\" + longPath), fromWindows(longPath));
-
-    const std::string share = fill("\\\\server\\share\\", 300);
-    EXPECT_EQ(toWindows(fromWindows(share)), "\\\\?\\UNC\\" + share.substr(2));
-    EXPECT_EQ(fromWindows("\\\\?\\UNC\\" + share.substr(2)), fromWindows(share));
-
-    // The platform counts two units for each of these characters.
-    std::string notes = "C:\\";
+    const std::string drive = fill("C:\\", 240), share = fill("\\\\server\\share\\", 300),
+                      relative = fill("music\\", 240);
+    std::string notes = "C:\\"; // the platform counts two units for each of these characters
     for (int i = 0; i < 118; ++i) notes += "\xf0\x9f\x8e\xb5";
-    EXPECT_EQ(toWindows(fromWindows(notes)), notes);
+    for (const std::string& path : {fill("C:\\", 239), notes}) EXPECT_EQ(toWindows(fromWindows(path)), path);
     notes += "\xf0\x9f\x8e\xb5";
-    EXPECT_EQ(toWindows(fromWindows(notes)), "\\\\?\\" + notes);
-}
-
-TEST(WindowsPath, CannotExtendEveryPath) {
-    auto message = [](const std::string& path) {
-        return "Error: Windows path is longer than MAX_PATH and the limit cannot be circumvented (path='" +
-               path + "')";
-    };
-    const std::string drive = fill("C:\\", 240);
-    const std::string share = fill("\\\\server\\share\\", 240);
-    const std::string relative = fill("music\\", 240);
+    for (const auto& [path, longForm] : {std::pair(drive, "\\\\?\\" + drive),
+                                         {notes, "\\\\?\\" + notes},
+                                         {share, "\\\\?\\UNC\\" + share.substr(2)}}) {
+        EXPECT_EQ(toWindows(fromWindows(path)), longForm);
+        EXPECT_EQ(fromWindows(longForm), fromWindows(path));
+    }
     for (const auto& [path, knowsLongForm] : {std::pair(drive, false), {share, false}, {relative, true}})
-        EXPECT_EQ(tests::errorOf([&] { toWindows(fromWindows(path), knowsLongForm); }), message(path));
+        EXPECT_EQ(tests::errorOf([&] { toWindows(fromWindows(path), knowsLongForm); }),
+                  "Error: Windows path is longer than MAX_PATH and the limit cannot be circumvented (path='" +
+                      path + "')");
 }
