@@ -30,6 +30,16 @@ void removeQuietly(const P<IFileSystem>& fileSystem, const P<IURI>& uri,
     }
 }
 
+// False if it cannot be determined, as that error would hide the first one.
+bool isFolderQuietly(const P<IFileSystem>& fileSystem, const P<IURI>& uri) {
+    try {
+        P<IFileObject> object = fileSystem->getFileObject(uri);
+        return object && object->isFolder();
+    } catch (const CException&) {
+        return false;
+    }
+}
+
 // The file that the error refers to, otherwise the operation's own.
 P<IURI> getCulprit(const CException& error, const P<IURI>& otherwise) {
     auto* uriError = dynamic_cast<const CURIError*>(&error);
@@ -163,7 +173,7 @@ void CFileSystemManager::createFolder(const P<IURI>& uri) {
                 made.push_back(missing.back());
             } catch (const CException&) {
                 // Another process may have created it in the meantime.
-                if (!isFolder(missing.back())) throw;
+                if (!isFolderQuietly(fileSystem, missing.back())) throw;
             }
         }
     } catch (...) {
@@ -241,6 +251,15 @@ void CFileSystemManager::fillFolder(const SRoute& route, const P<IFileObject>& f
     while (cursor->next()) {
         P<IFileObject> child = cursor->getFileObject();
         P<IURI> destination = route.destination->appendPath(child->getName());
+        // A disc image may hold any name, such as "../x", which would lead out of the folder.
+        P<IURI> parent = destination->getParent();
+        if (!parent || !parent->equals(route.destination->appendPath("/")))
+            throw CFileError(localize("peru.CSystem.CopyFileFailed",
+                                      "Error copying file '%SRC%' to '%DEST%' (%MSG%).",
+                                      {{"%SRC%", getShownName(route.source)},
+                                       {"%DEST%", getShownName(destination)},
+                                       {"%MSG%", child->getName()}}),
+                             route.source);
         copyObject({child->getURI(), destination, route.from, route.to}, child, true);
     }
     if (route.from == route.to)

@@ -5,10 +5,10 @@
 
 namespace peru {
 
-// Created by ISystem::startReplacement. The new content has no name until commit; if the object is destroyed
-// without a commit, or the process dies, nothing of it remains and the old file is unchanged. Not
-// thread-safe. Every operation throws CFileError, except that reading past the end of the stream throws
-// CEndOfStreamError.
+// Created by ISystem::startReplacement. If the object is destroyed without a commit, nothing of the new
+// content remains and the old file is unchanged. The same holds if the process dies, except that a hidden
+// file stays behind where the file system does not support files without a name. Not thread-safe. Every
+// operation throws CFileError, except that reading past the end of the stream throws CEndOfStreamError.
 class PERU_API IFileReplacement : public virtual IBase {
 public:
     // The new content, initially empty. Valid until commit.

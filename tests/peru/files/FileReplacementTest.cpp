@@ -65,7 +65,7 @@ TEST_F(FileReplacement, LeavesHolesWhereTheyAre) {
     constexpr int64_t kSize = int64_t{3} << 30;
     fs::resize_file(file, kSize);
     std::ofstream(file, std::ios::in).seekp(kSize / 2).write("middle", 6);
-    const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
+    const P<IFileReplacement> replacement = start("file");
     replacement->getStream()->write("+", 1);
     replacement->copyFromOld(0, kSize);
     replacement->commit();
@@ -82,35 +82,41 @@ TEST_F(FileReplacement, LeavesHolesWhereTheyAre) {
 }
 
 TEST_F(FileReplacement, MixesOldAndNewBytes) {
-    const std::string old = makeText(300000);
-    const fs::path file = folder.write("file", old);
-    const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
-    const P<ISeekableIOStream> stream = replacement->getStream();
-    stream->write("head", 4);
-    replacement->copyFromOld(10, 200000);
-    stream->write("middle", 6);
-    replacement->copyFromOld(0, 0);
-    replacement->copyFromOld(299990, 10);
-    char start[8];
-    stream->seek(0); // buffered by a read, then overwritten by a range
-    stream->read(start, 8);
-    EXPECT_EQ(std::string(start, 8), "head" + old.substr(10, 4));
-    stream->seek(2);
-    replacement->copyFromOld(5, 3);
-    stream->read(start, 3);
-    EXPECT_EQ(std::string(start, 3), old.substr(11, 3));
-    stream->seek(200020);
-    replacement->copyFromOld(299990, 10);
-    stream->setSize(200025);
-    EXPECT_THROW(getSystem()->startReplacement(toURI(file))->copyFromOld(299999, 2), CFileError);
-    // Not compared by EXPECT_EQ, which would print them.
-    EXPECT_TRUE(readFile(file) == old) << "nothing happens before the commit";
-    EXPECT_EQ(countEntries(folder.path()), 1u);
-    replacement->commit();
-    const std::string wanted = "he" + old.substr(5, 3) + old.substr(11, 199999) + "middle" +
-                               old.substr(299990) + old.substr(299990, 5);
-    EXPECT_TRUE(readFile(file) == wanted);
-    EXPECT_EQ(countEntries(folder.path()), 1u);
+    const std::string old = makeText(600000);
+    const std::string wanted = "he" + old.substr(5, 3) + old.substr(11, 499999) + "middle" +
+                               old.substr(599990) + old.substr(599990, 5);
+    // Copied inside the kernel, and through a buffer where the file system does not support that.
+    for (const int refusal : {0, EOPNOTSUPP}) {
+        const tests::CSystemCalls calls([&](const std::string& call, int) {
+            return call == "copy_file_range" ? refusal : tests::interrupt(call, 0);
+        });
+        const fs::path file = folder.write("file", old);
+        const P<IFileReplacement> replacement = start("file");
+        const P<ISeekableIOStream> stream = replacement->getStream();
+        stream->write("head", 4);
+        replacement->copyFromOld(10, 500000);
+        stream->write("middle", 6);
+        replacement->copyFromOld(0, 0);
+        replacement->copyFromOld(599990, 10);
+        char bytes[8];
+        stream->seek(0); // buffered by a read, then overwritten by a range
+        stream->read(bytes, 8);
+        EXPECT_EQ(std::string(bytes, 8), "head" + old.substr(10, 4));
+        stream->seek(2);
+        replacement->copyFromOld(5, 3);
+        stream->read(bytes, 3);
+        EXPECT_EQ(std::string(bytes, 3), old.substr(11, 3));
+        stream->seek(500020);
+        replacement->copyFromOld(599990, 10);
+        stream->setSize(500025);
+        EXPECT_THROW(start("file")->copyFromOld(599999, 2), CFileError);
+        // Not compared by EXPECT_EQ, which would print them.
+        EXPECT_TRUE(readFile(file) == old) << "nothing happens before the commit";
+        EXPECT_EQ(countEntries(folder.path()), 1u);
+        replacement->commit();
+        EXPECT_TRUE(readFile(file) == wanted);
+        EXPECT_EQ(countEntries(folder.path()), 1u);
+    }
 }
 
 TEST_F(FileReplacement, TakesOverWhatSurroundsTheBytes) {
@@ -147,6 +153,55 @@ TEST_F(FileReplacement, TakesOverWhatSurroundsTheBytes) {
     }
 }
 
+TEST_F(FileReplacement, ReportsFailedCallsAndKeepsTheOldFile) {
+    const fs::path file = folder.write("file", "precious");
+    ASSERT_EQ(::setxattr(file.c_str(), "user.note", "kept", 4, 0), 0);
+    const auto run = [&] {
+        const P<IFileReplacement> replacement = start("file");
+        replacement->copyFromOld(0, 8);
+        replacement->commit();
+    };
+    tests::failEach({{"__pread_chk", EIO, false},
+                     {"pwrite", ENOSPC, false},
+                     {"fsync", EIO, false},
+                     {"rename", EIO, false},
+                     {"fchmod", EPERM, true},
+                     {"fchmod", EIO, false},
+                     {"fsetxattr", EIO, false},
+                     {"fsetxattr", EPERM, true},
+                     {"fsetxattr", EACCES, true},
+                     {"fsetxattr", ENOTSUP, true}},
+                    run, [&](bool) {
+                        EXPECT_EQ(readFile(file), "precious");
+                        EXPECT_EQ(countEntries(folder.path()), 1u);
+                    });
+}
+
+// Attributes that grow while they are read, and another user's file whose owner or group cannot be taken
+// over.
+TEST_F(FileReplacement, TakesOverNoMoreThanItMay) {
+    if (::geteuid() != 0 || !tests::CSystemCalls::kWatchesAll) GTEST_SKIP() << "only root may change owners";
+    const fs::path file = folder / "file";
+    for (const auto& [refused, mode] : {std::pair(0, 06754u), {1, 0754u}, {2, 0744u}}) {
+        ASSERT_EQ(::chown(folder.write("file", "old").c_str(), 1000, 1001), 0);
+        ASSERT_EQ(::chmod(file.c_str(), 06754), 0);
+        ASSERT_EQ(::setxattr(file.c_str(), "user.note", "kept", 4, 0), 0);
+        int owners = 0, lists = 0, values = 0;
+        const tests::CSystemCalls calls([&](const std::string& call, int) {
+            if (call == "flistxattr" || call == "fgetxattr")
+                return ++(call == "flistxattr" ? lists : values) == 2 ? ERANGE : 0;
+            return call == "fchown" && owners++ < refused ? EPERM : 0;
+        });
+        replace("file");
+        struct stat status;
+        ASSERT_EQ(::stat(file.c_str(), &status), 0);
+        EXPECT_EQ(status.st_mode & 07777, mode) << refused;
+        EXPECT_EQ(status.st_gid, refused < 2 ? 1001u : 0u);
+        EXPECT_EQ(getAttribute(file, "user.note"), "kept");
+        fs::remove(file);
+    }
+}
+
 // Permissions are checked as an ordinary user, even if the tests run as root.
 TEST_F(FileReplacement, RefusesWhatTheUserMayNotWrite) {
     const fs::path locked = folder.write("locked", "precious");
@@ -177,10 +232,10 @@ TEST_F(FileReplacement, RefusesWhatTheUserMayNotWrite) {
 TEST_F(FileReplacement, LeavesNothingWithoutCommit) {
     const fs::path file = folder.write("file", "old");
     // Once abandoned regularly, once by a process that is killed half way.
-    getSystem()->startReplacement(toURI(file))->getStream()->write("new", 3);
+    start("file")->getStream()->write("new", 3);
     const pid_t child = ::fork();
     if (child == 0) {
-        const P<IFileReplacement> replacement = getSystem()->startReplacement(toURI(file));
+        const P<IFileReplacement> replacement = start("file");
         replacement->getStream()->write("new", 3);
         replacement->getStream()->flush();
         ::kill(::getpid(), SIGKILL);

@@ -1,13 +1,16 @@
 #include "peru/files/IFileSystemManager.h"
 
+#include "peru/files/SystemCalls.h"
 #include "support/Environment.h"
 #include "support/Files.h"
 #include "support/TempFolder.h"
 
 #include "peru/files/ReadOnlyFileSystem.h"
+#include "peru/files/posix/FileTimes.h"
 #include "peru/uri/URI.h"
 
 #include <fcntl.h>
+#include <functional>
 #include <map>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -93,25 +96,22 @@ protected:
 } // namespace
 
 TEST_F(FileSystemManager, TellsWhatIsThere) {
-    const P<IURI> file = write(".hidden", "12345"), dangling = at("dangling"), self = at("self"),
-                  missing = at("missing"), foreign = make<CURI>("http://host/a");
+    const P<IURI> file = write(".hidden", "12345"), self = at("self"), missing = at("missing"),
+                  foreign = make<CURI>("http://host/a");
     fs::create_symlink(folder / "none", folder / "dangling");
     fs::create_directory_symlink(folder.path(), folder / "self");
-    EXPECT_TRUE(manager()->isFile(file));
-    EXPECT_FALSE(manager()->isFolder(file));
+    const std::pair<P<IURI>, const char*> cases[] = {
+        {file, "file"}, {at("dangling"), "other"}, {self, "folder"}, {missing, "none"}, {foreign, "none"}};
+    for (const auto& [uri, kind] : cases) {
+        EXPECT_EQ(manager()->exists(uri), kind != std::string("none")) << kind;
+        EXPECT_EQ(manager()->isFile(uri), kind == std::string("file")) << kind;
+        EXPECT_EQ(manager()->isFolder(uri), kind == std::string("folder")) << kind;
+    }
     EXPECT_EQ(manager()->getFileSize(file), 5);
     EXPECT_TRUE(manager()->getAttributes(file).hidden);
     chmod((folder / ".hidden").c_str(), 0555);
-    EXPECT_TRUE(manager()->getAttributes(file).readOnly);
-    EXPECT_TRUE(manager()->getAttributes(file).executable);
-
-    EXPECT_TRUE(manager()->exists(dangling));
-    EXPECT_FALSE(manager()->isFile(dangling) || manager()->isFolder(dangling));
-    EXPECT_TRUE(manager()->isFolder(self));
+    EXPECT_TRUE(manager()->getAttributes(file).readOnly && manager()->getAttributes(file).executable);
     EXPECT_TRUE(manager()->getAttributes(self).link);
-    EXPECT_FALSE(manager()->exists(missing));
-    EXPECT_FALSE(manager()->exists(foreign));
-    EXPECT_FALSE(manager()->getFileObject(missing));
     EXPECT_THROW(manager()->getFileSize(missing), CFileNotFoundError);
     EXPECT_THROW(manager()->getFileSize(foreign), CURITypeNotSupportedError);
 }
@@ -149,6 +149,11 @@ TEST_F(FileSystemManager, KeepsTimesToTheNanosecond) {
     EXPECT_EQ(manager()->getTimes(file)->getLastAccessTime(), -1500000001);
     EXPECT_EQ(manager()->getTimes(file)->getLastWriteTime(), 5);
     EXPECT_THROW(manager()->setTimes(at("none"), times), CFileError);
+    // Beyond what 64 bits hold.
+    const timespec late{10'000'000'000, 0}, early{-10'000'000'000, 0};
+    const posix::CFileTimes extreme(&early, early, late);
+    EXPECT_EQ(extreme.getLastWriteTime(), INT64_MAX);
+    EXPECT_EQ(extreme.getLastAccessTime(), INT64_MIN + 1);
 }
 
 TEST_F(FileSystemManager, CreatesParentsOrNothing) {
@@ -159,7 +164,8 @@ TEST_F(FileSystemManager, CreatesParentsOrNothing) {
     EXPECT_EQ(errorOf([&] { manager()->createFolder(at("a/file")); }),
               "Error creating the folder " + path("a/file") + " (File exists).");
     std::string tooLong = (folder / "x/y").string() + "/" + std::string(300, 'n');
-    EXPECT_THROW(manager()->createFolder(toURI(tooLong)), CFileError);
+    EXPECT_EQ(errorOf([&] { manager()->createFolder(toURI(tooLong)); }),
+              "Error creating the folder '" + tooLong + "' (File name too long).");
     EXPECT_FALSE(fs::exists(folder / "x"));
 }
 
@@ -178,6 +184,8 @@ TEST_F(FileSystemManager, DeletesWithoutFollowingLinks) {
 
     EXPECT_EQ(errorOf([&] { manager()->deleteFile(at("none")); }),
               "Error deleting the file " + path("none") + " (No such file or directory).");
+    EXPECT_EQ(errorOf([&] { manager()->deleteFile(at("\xFF")); }),
+              "Error deleting the file " + path("\xEF\xBF\xBD") + " (No such file or directory).");
     EXPECT_THROW(manager()->deleteFile(at("keep")), CFileError);
     EXPECT_EQ(errorOf([&] { manager()->deleteFolder(at("none")); }),
               "Error deleting the folder " + path("none") + " (No such file or directory).");
@@ -197,6 +205,13 @@ TEST_F(FileSystemManager, CopiesTreesAsTheyAre) {
         EXPECT_THROW(manager()->copy(at("source"), toURI(folder / inside)), CFileError) << inside;
     EXPECT_EQ(readTree(folder / "source"), before);
     EXPECT_THROW(manager()->copy(at("none"), at("x")), CFileNotFoundError);
+    tests::failEach(
+        {{"fchmod", EPERM, true},
+         {"fchmod", ENOTSUP, true},
+         {"fchmod", EIO, false},
+         {"futimens", EIO, false}},
+        [&] { manager()->copy(at("source/empty"), at("x")); },
+        [&](bool done) { EXPECT_EQ(fs::remove(folder / "x"), done); });
 }
 
 TEST_F(FileSystemManager, MovesWithinAVolume) {
@@ -222,15 +237,31 @@ TEST_F(FileSystemManager, MovesWithinAVolume) {
     EXPECT_EQ(readTree(folder / "moved"), before);
 }
 
-TEST_F(FileSystemManager, MovesBetweenVolumes) {
+TEST_F(FileSystemManager, MovesBetweenVolumesOrLosesNothing) {
     COtherVolume other(folder.path());
     if (other.path.empty()) GTEST_SKIP() << "no second volume here";
     makeTree(folder / "source");
+    // Nobody can copy a FIFO, not even root.
+    const fs::path pipe = folder / "source/one/two/pipe";
+    ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
     CTree before = readTree(folder / "source");
+    EXPECT_THROW(manager()->copy(at("source"), toURI(other.path / "copy")), CFileError);
+    try {
+        manager()->move(at("source"), toURI(other.path / "moved"));
+        FAIL();
+    } catch (const CFileError& error) {
+        EXPECT_EQ(text(error.getDescription()),
+                  "Error moving folder " + path("source") + " to '" + (other.path / "moved").string() + "'.");
+        EXPECT_EQ(toPath(error.getURI()), pipe.string());
+    }
+    EXPECT_EQ(readTree(folder / "source"), before);
+    EXPECT_TRUE(fs::is_empty(other.path));
+
+    fs::remove(pipe);
+    before = readTree(folder / "source");
     manager()->move(at("source"), toURI(other.path / "moved"));
     EXPECT_EQ(readTree(other.path / "moved"), before);
     EXPECT_FALSE(fs::exists(folder / "source"));
-
     manager()->move(toURI(other.path / "moved/a.txt"), at("a.txt"));
     manager()->move(toURI(other.path / "moved/one/two/dangling"), at("link"));
     EXPECT_EQ(fs::read_symlink(folder / "link"), "/nowhere/at/all");
@@ -240,26 +271,6 @@ TEST_F(FileSystemManager, MovesBetweenVolumes) {
     EXPECT_THROW(manager()->move(at("a.txt"), toURI(other.path / "taken")), CFileError);
     EXPECT_EQ(readFile(other.path / "taken"), "old");
     EXPECT_EQ(readFile(folder / "a.txt"), "alpha");
-}
-
-TEST_F(FileSystemManager, LosesNothingWhenACopyOrMoveBetweenVolumesFails) {
-    COtherVolume other(folder.path());
-    if (other.path.empty()) GTEST_SKIP() << "no second volume here";
-    makeTree(folder / "source");
-    // Nobody can copy a FIFO, not even root.
-    ASSERT_EQ(mkfifo((folder / "source/one/two/pipe").c_str(), 0600), 0);
-    CTree before = readTree(folder / "source");
-    EXPECT_THROW(manager()->copy(at("source"), toURI(other.path / "copy")), CFileError);
-    try {
-        manager()->move(at("source"), toURI(other.path / "moved"));
-        FAIL();
-    } catch (const CFileError& error) {
-        EXPECT_EQ(text(error.getDescription()), "Error moving folder '" + (folder / "source").string() +
-                                                    "' to '" + (other.path / "moved").string() + "'.");
-        EXPECT_EQ(toPath(error.getURI()), (folder / "source/one/two/pipe").string());
-    }
-    EXPECT_EQ(readTree(folder / "source"), before);
-    EXPECT_TRUE(fs::is_empty(other.path));
 }
 
 namespace {
@@ -285,21 +296,35 @@ TEST_F(FileSystemManager, ServesWhatIsMounted) {
     makeTree(folder / "disc");
     fs::remove(folder / "disc/one/two/up");
     fs::remove(folder / "disc/one/two/dangling");
-    P<IURI> disc = make<CURI>("mirror:///one");
+    const P<IURI> disc = make<CURI>("mirror:///one"), file = make<CURI>("mirror:///a.txt"),
+                  fresh = make<CURI>("mirror:///new");
     EXPECT_FALSE(manager()->exists(disc));
     P<IFileSystem> mirror = make<CMirror>(folder / "disc");
     manager()->mount(mirror);
     EXPECT_TRUE(manager()->isFolder(disc));
-    EXPECT_THROW(manager()->deleteFolder(disc), CReadOnlyError);
+    const std::function<void()> changes[] = {[&] { manager()->setTimes(file, manager()->getTimes(file)); },
+                                             [&] { manager()->createFolder(fresh); },
+                                             [&] { manager()->deleteFile(file); },
+                                             [&] { manager()->deleteFolder(disc); },
+                                             [&] { manager()->deleteUndoable(file); },
+                                             [&] { manager()->copy(file, fresh); },
+                                             [&] { manager()->copy(disc, fresh); },
+                                             [&] { manager()->copy(at("disc/one"), fresh); },
+                                             [&] { manager()->move(file, fresh); }};
+    for (const auto& change : changes) EXPECT_THROW(change(), CReadOnlyError);
     // Between two file systems, through streams.
     manager()->copy(disc, at("copy"));
     EXPECT_EQ(readFile(folder / "copy/50% #?.wav"), "beta");
     EXPECT_EQ(readFile(folder / "copy/two/\xff\xe4 x\ny").size(), 300000u);
     EXPECT_EQ(readFile(folder / "copy/link"), "alpha");
     EXPECT_EQ(fs::last_write_time(folder / "copy/two"), fs::last_write_time(folder / "disc/one/two"));
-    EXPECT_THROW(manager()->copy(at("copy"), make<CURI>("mirror:///new")), CReadOnlyError);
+    folder.write("taken", "old");
+    EXPECT_EQ(errorOf([&] { manager()->copy(file, at("taken")); }),
+              "Error copying file '" + text(file->getAsString()) + "' to " + path("taken") +
+                  ". The file already exists.");
+    EXPECT_EQ(readFile(folder / "taken"), "old");
     // A source that cannot be deleted is not moved: the copy is removed again.
-    EXPECT_THROW(manager()->move(make<CURI>("mirror:///a.txt"), at("moved")), CException);
+    EXPECT_THROW(manager()->move(file, at("moved")), CException);
     EXPECT_FALSE(fs::exists(folder / "moved"));
     manager()->unmount(mirror);
     EXPECT_FALSE(manager()->exists(disc));

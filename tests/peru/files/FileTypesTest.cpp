@@ -8,19 +8,27 @@ using namespace peru;
 using tests::text;
 
 TEST(FileTypes, SortsExtensionsIntoCategories) {
-    struct SCase {
-        const char* extension;
-        EFileCategory category;
-    };
     const P<IFileTypesManager> manager = getFileTypesManager();
-    for (const SCase& c : {SCase{"jpg", EFileCategory::image}, SCase{".PNG", EFileCategory::image},
-                           SCase{"mp3", EFileCategory::audio}, SCase{"wav", EFileCategory::audio},
-                           SCase{"avi", EFileCategory::video}, SCase{"txt", EFileCategory::text},
-                           SCase{"zip", EFileCategory::compressed}, SCase{"so", EFileCategory::system},
-                           SCase{"", EFileCategory::unknown}, SCase{"no-such-kind", EFileCategory::unknown}})
-        EXPECT_EQ(manager->getFileType(c.extension)->getCategory(), c.category) << c.extension;
+    const std::tuple<const char*, EFileCategory, const char*> cases[] = {
+        {"jpg", EFileCategory::image, "Image files"},
+        {".PNG", EFileCategory::image, "Image files"},
+        {"mp3", EFileCategory::audio, "Audio files"},
+        {"wav", EFileCategory::audio, "Audio files"},
+        {"avi", EFileCategory::video, "Video files"},
+        {"txt", EFileCategory::text, "Text files"},
+        {"zip", EFileCategory::compressed, "Compressed files"},
+        {"so", EFileCategory::system, "System files"},
+        {"", EFileCategory::unknown, ""},
+        {"no-such-kind", EFileCategory::unknown, ""}};
+    for (const auto& [extension, category, name] : cases) {
+        EXPECT_EQ(manager->getFileType(extension)->getCategory(), category) << extension;
+        EXPECT_EQ(text(manager->getCategoryName(category)), name);
+    }
 
     EXPECT_EQ(text(manager->getFileType(".PNG")->getMimeType()->getAsString()), "image/png");
+    EXPECT_EQ(text(manager->getFileType(".PNG")->getExtension()), "png");
+    EXPECT_EQ(text(manager->getFileType(".PNG")->getIconName()), "image-png");
+    EXPECT_FALSE(manager->getFileType(".PNG")->getDescription()->isEmpty());
     EXPECT_EQ(text(manager->getFileType("")->getMimeType()->getAsString()), "application/octet-stream");
 }
 

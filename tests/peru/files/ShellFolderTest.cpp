@@ -22,21 +22,19 @@ CListing list(const P<IFileObjectCursor>& cursor) {
     CListing listing;
     while (cursor->next()) {
         P<IFileObject> item = cursor->getFileObject();
-        SFileAttributes attributes = item->getAttributes();
-        listing[tests::toPath(item->getURI())] =
-            text(item->getName()) + " " + std::to_string(item->getSize()) +
-            (item->isFolder() ? " folder"
-             : item->isFile() ? " file"
-                              : "") +
-            (attributes.hidden ? " hidden" : "") + (attributes.link ? " link" : "") +
-            (attributes.executable ? " executable" : "");
+        const SFileAttributes attributes = item->getAttributes();
+        std::string& entry = listing[tests::toPath(item->getURI())];
+        entry = text(item->getName()) + " " + std::to_string(item->getSize());
+        for (const bool flag :
+             {item->isFolder(), item->isFile(), attributes.hidden, attributes.link, attributes.executable})
+            entry += flag ? " yes" : " no";
     }
     return listing;
 }
 
 } // namespace
 
-TEST(ShellFolder, AgreesWithTheFileSystem) {
+TEST(ShellFolder, AgreesWithTheFileSystemAndRaisesItsFixedTexts) {
     CTempFolder folder;
     std::filesystem::create_directory(folder / "sub folder");
     folder.write(".hidden", "12");
@@ -51,12 +49,24 @@ TEST(ShellFolder, AgreesWithTheFileSystem) {
     EXPECT_EQ(list(cursor), expected);
     cursor->reset();
     EXPECT_EQ(list(cursor), expected);
-}
 
-TEST(ShellFolder, RaisesItsFixedTexts) {
-    CTempFolder folder;
-    P<IURI> file = toURI(folder.write("a", ""));
-    P<posix::CShellFolder> shell = posix::CShellFolder::bind(toURI(folder.path()));
+    for (const char* name : {"sub folder", "100%25#?.txt"}) {
+        const P<IURI> item = toURI(folder / name);
+        getFileSystemManager()->setTimes(
+            item, make<CFileTimes>(CFileTimes::kUnknown, 1234567891000, 98765432109876000));
+        const P<IFileObject> ours = getFileSystemManager()->getFileObject(item);
+        const P<posix::CShellFileObject> theirs = posix::CShellFileObject::find(item);
+        for (const P<IString>& shown :
+             {ours->getDisplayName(), theirs->getDisplayName(), shell->getItemName(name)})
+            EXPECT_EQ(text(shown), name);
+        EXPECT_EQ(text(ours->getKind()), text(theirs->getKind()));
+        EXPECT_EQ(ours->getTimes()->getLastAccessTime(), theirs->getTimes()->getLastAccessTime());
+        EXPECT_EQ(theirs->getTimes()->getLastWriteTime(), 98765432109876000);
+        EXPECT_FALSE(theirs->getKindDescription()->isEmpty() || theirs->getIconName()->isEmpty());
+    }
+    EXPECT_EQ(tests::toPath(shell->getURI()), folder.path().string());
+    EXPECT_TRUE(posix::CDesktopFileObject::get()->isFolder());
+    const P<IURI> file = toURI(folder / "tool");
     EXPECT_EQ(errorOf([&] { posix::CShellFolder::bind(file); }), "Error binding to shell folder.");
     EXPECT_EQ(errorOf([&] { posix::CShellFileObject::find(file)->enumerate(); }),
               "Error enumerating shell folder contents.");

@@ -2,6 +2,7 @@
 #include "support/TempFolder.h"
 
 #include "peru/files/MountTable.h"
+#include "peru/files/posix/FileSystemVolume.h"
 #include "peru/files/posix/VolumeManager.h"
 #include "peru/threads/ISignal.h"
 
@@ -9,6 +10,7 @@
 #include <sched.h>
 #include <sys/mount.h>
 #include <sys/statvfs.h>
+#include <sys/sysmacros.h>
 #include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
@@ -22,9 +24,9 @@ using tests::toPath;
 namespace {
 
 std::string makeLine(const std::string& device, const std::string& root, const std::string& mountPoint,
-                     const std::string& kind, const std::string& options = "rw,relatime") {
-    return "36 35 " + device + " " + root + " " + mountPoint + " " + options + " shared:1 master:2 - " +
-           kind + " rw\n";
+                     const std::string& kind) {
+    return "36 35 " + device + " " + root + " " + mountPoint + " rw,relatime shared:1 master:2 - " + kind +
+           " rw\n";
 }
 
 std::vector<std::string> selectPoints(const std::string& table) {
@@ -54,7 +56,8 @@ private:
 TEST(MountTable, ReadsTheKernelsLines) {
     std::vector<SMount> mounts =
         parseMountTable("22 1 8:1 /@home /home/a\\040b\\134\\011 ro,nosuid - ext4 /dev/sda1 rw,errors=x\n"
-                        "junk\n1 2 3 4 5 6 - a b\n\n1 2 0:5 / /x rw shared:1 master:2 - tmpfs none ro");
+                        "junk\n1 2 3 4 5 6 - a b\n1 2 0:5 / /y rw - tmpfs none\n\n1 2 0:5 / /x rw shared:1 "
+                        "master:2 - tmpfs none ro");
     std::vector<std::string> found;
     for (const SMount& m : mounts)
         found.push_back(m.device + "," + m.root + "," + m.mountPoint + "," + m.fileSystem + "," + m.source +
@@ -99,6 +102,12 @@ TEST(VolumeManager, TellsWhatLeftAndArrived) {
     std::string table = folder.write("table", line("99:1", "a") + line("99:2", "b")).string();
     P<posix::CVolumeManager> manager = make<posix::CVolumeManager>(table);
     P<CTestListener> stays = make<CTestListener>(), leaves = make<CTestListener>();
+    std::filesystem::create_directory(folder / "ab");
+    const std::string outer = makeLine("99:9", "/", folder.path().string(), "ext4 /dev/none");
+    const auto nested =
+        make<posix::CVolumeManager>(folder.write("nested", line("99:1", "a") + outer).string());
+    EXPECT_EQ(toPath(nested->getVolumeOf(tests::toURI(folder / "a/x"))->getRoot()), (folder / "a/").string());
+    EXPECT_EQ(toPath(nested->getVolumeOf(tests::toURI(folder / "ab"))->getRoot()), (folder / "").string());
     manager->addListener(stays.get());
     manager->addListener(leaves.get());
     leaves->leave = manager.get();
@@ -106,6 +115,10 @@ TEST(VolumeManager, TellsWhatLeftAndArrived) {
     EXPECT_TRUE(stays->log.empty());
 
     P<IFileSystemVolume> gone = manager->getVolumes()[0];
+    EXPECT_EQ(text(gone->getFileSystemName()), "ext4");
+    const auto device = tryCast<posix::IPosixFileSystemVolume>(gone);
+    EXPECT_EQ(text(device->getSource()) + " " + text(device->getDeviceNumber()), "/dev/none 99:1");
+    EXPECT_FALSE(gone->isRemovable());
     folder.write("table", line("99:2", "b") + line("99:3", "c"));
     manager->update();
     EXPECT_EQ(stays->log, (std::vector<std::string>{"-a", "+c"}));
@@ -144,12 +157,40 @@ TEST(VolumeManager, WatchesOnlyWhileSomebodyListens) {
     for (int i = 0; i < 50; ++i) {
         manager->addListener(first.get());
         manager->addListener(second.get());
-        ASSERT_EQ(countThreads(), before + 1);
         manager->removeListener(first.get());
         ASSERT_EQ(countThreads(), before + 1);
         manager->removeListener(second.get());
         ASSERT_TRUE(comesDownTo(before));
     }
+}
+
+TEST(VolumeManager, FindsTheLabelsOfDevices) {
+    const CTempFolder folder;
+    const pid_t child = ::fork();
+    if (child == 0) {
+        // A device folder of its own.
+        if (::unshare(CLONE_NEWNS) != 0 ||
+            ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0 ||
+            ::mount("dev", "/dev", "tmpfs", 0, nullptr) != 0)
+            ::_exit(2);
+        for (const dev_t number : {1, 2, 3})
+            if (::mknod(("/dev/d" + std::to_string(number)).c_str(), S_IFBLK | 0600, makedev(7, number)) != 0)
+                ::_exit(2);
+        std::filesystem::create_directories("/dev/disk/by-label");
+        std::filesystem::create_symlink("/dev/d1", "/dev/disk/by-label/One");
+        std::filesystem::create_symlink("/dev/d2", "/dev/disk/by-label/\\x41\\x20\\xc3\\xa4\\x4\\x5g\\");
+        std::string labels;
+        for (const char* source : {"d1", "d2", "d3", "disk", "none"}) {
+            const std::string line = makeLine("99:1", "/", "/some/point", std::string("ext4 /dev/") + source);
+            const auto manager = make<posix::CVolumeManager>(folder.write("table", line).string());
+            labels += text(manager->getVolumes()[0]->getLabel()) + "|";
+        }
+        ::_exit(labels == "One|A \xC3\xA4\\x4\\x5g\\|point|point|point|" ? 0 : 1);
+    }
+    int status = 0;
+    ASSERT_EQ(::waitpid(child, &status, 0), child);
+    if (WEXITSTATUS(status) == 2) GTEST_SKIP() << "this user may not create devices";
+    EXPECT_EQ(status, 0);
 }
 
 // In a child with mounts of its own.

@@ -90,8 +90,11 @@ void CFileSystem::deleteFolder(const P<IURI>& uri) {
     struct stat status;
     if (::lstat(path.c_str(), &status) != 0) throwDeleteFolderError(uri, errno);
     if (!S_ISDIR(status.st_mode)) throwDeleteFolderError(uri, ENOTDIR);
-    // The root itself cannot be deleted, but all its content would be.
-    if (path == "/") throwDeleteFolderError(uri, EBUSY);
+    // The root itself cannot be deleted, but all its content would be. A path may name it in several ways,
+    // such as "/." after unescaping.
+    struct stat root;
+    if (::stat("/", &root) != 0) throwDeleteFolderError(uri, errno);
+    if (status.st_dev == root.st_dev && status.st_ino == root.st_ino) throwDeleteFolderError(uri, EBUSY);
     std::error_code error;
     std::filesystem::remove_all(path, error);
     if (error) throwDeleteFolderError(uri, error.value());
