@@ -42,9 +42,9 @@ std::string printAddress(std::span<const uint8_t> bytes, uint32_t scope) {
 std::string getNetworkHost(const P<IURI>& uri) {
     if (!uri || !uri->hasHost()) return {};
     std::string host = uri::unescapeBytes(CString::toStdString(uri->getHost()));
-    if (host.starts_with('[')) return host.substr(1, host.size() - 2);
     for (const char c : host)
         if (static_cast<unsigned char>(c) <= ' ' || c == 0x7F) return {};
+    if (host.starts_with('[')) return host.substr(1, host.size() - 2);
     const auto isAscii = [](char c) { return static_cast<unsigned char>(c) < 0x80; };
     return std::all_of(host.begin(), host.end(), isAscii) ? host : getDesktop()->toASCIIHost(host);
 }
