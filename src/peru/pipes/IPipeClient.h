@@ -11,8 +11,8 @@ class PERU_API IPipeClient : public virtual IBase {
 public:
     virtual P<IString> getName() const = 0; // the short name
     // Connects to the server of that name. While the server is busy with other clients, waits up to 1000 ms
-    // for its next free connection. Returns false if there is no server or none was free, and may then be
-    // called again. Throws CInvalidObjectStateError if the client is or was connected.
+    // for its next free connection. False if there is no server or none was free; may then be called again.
+    // Throws CInvalidObjectStateError if the client is or was connected, CError without a private folder.
     virtual bool connect() = 0;
     // True until one of the ends closes the pipe; bytes of a peer that has closed it count as alive until
     // they are read.

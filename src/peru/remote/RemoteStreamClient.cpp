@@ -179,9 +179,11 @@ void CRemoteStreamClient::readAnswer(CRemoteFunction& function) {
         const P<IString> line = m_in->readString();
         // An answer starts with some text. Reading once more tells a closed pipe from an empty line.
         if (line->isEmpty() && m_inPipe && m_inPipe->isAtEnd()) m_in->readUInt8();
-        isAnswered = line->find(kError).isFound() || line->equals(kNotFound);
-        if (line->find(kError).isFound()) throw CRemoteException(line);
-        if (isAnswered)
+        const bool isError = line->find(kError).isFound(), isMissing = line->equals(kNotFound);
+        // The other end leaves the parameters of a missing function unread and takes them for messages.
+        isAnswered = isError || (isMissing && function.getParams().empty());
+        if (isError) throw CRemoteException(line);
+        if (isMissing)
             throw CRemoteException(format("Remote Procedure not found on host: %s", function.getName()));
         if (!line->equals(kReturn)) throw CRemoteException(format("Unexpected return received: %s", line));
         for (const P<CRemoteVar>& result : function.getResults()) result->readFrom(m_in);

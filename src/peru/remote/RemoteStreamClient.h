@@ -23,7 +23,8 @@ class IPipeOutStream;
 // that request in place of its answer, so only one of them may start calls at a time.
 //
 // A request is the string "function" or "void", the name, the parameters and the string "execute". The answer
-// to a function is the string "return" and the results, the string "notfound", or a line with "Error:".
+// to a function is the string "return" and the results, the string "notfound", or a line with "Error:". Since
+// the parameters of a missing function stay unread, its caller closes the connection if there are any.
 class PERU_API CRemoteStreamClient : public CObject, public IRemote {
 public:
     CRemoteStreamClient(const P<IInStream>& in, const P<IOutStream>& out);

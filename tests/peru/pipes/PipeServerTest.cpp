@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <csignal>
+#include <memory>
 #include <mutex>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -121,6 +122,8 @@ TEST_F(PipeServer, NameBelongsToOneLivingServer) {
     EXPECT_TRUE(first->waitForClient(kHang));
     EXPECT_THROW(first->start(), CInvalidObjectStateError);
     first->stop();
+    EXPECT_EQ(first->getClientCount(), 0u);
+    EXPECT_TRUE(peer->getInStream()->isAtEnd());
 
     // A server that was killed leaves its file behind.
     const pid_t child = ::fork();
@@ -177,6 +180,13 @@ TEST_F(PipeServer, AdmitsByItsRules) {
     EXPECT_EQ(refused.receive(), "");
     EXPECT_EQ(pipe->getClientCount(), 0u);
     pipe->stop();
+    pipe->setAccessRules({{{true, kPipeRead | kPipeWrite, mine}, {false, kPipeAll, kPipeAnonymous}}});
+    pipe->setDeadline(kHang);
+    pipe->start();
+    const P<IPipeClient> admitted = client();
+    EXPECT_TRUE(admitted->connect());
+    EXPECT_TRUE(pipe->waitForClient(kHang));
+    pipe->stop();
     pipe->setAccessRules({{{true, 0, mine}, {true, kPipeAll, mine}}});
     EXPECT_EQ(titleOf([&] { pipe->start(); }), "Could not create DACL for Pipe Server");
     EXPECT_EQ(titleOf([&] { pipe->acceptOne(nullptr); }), "Could not create DACL for Pipe Server");
@@ -209,6 +219,16 @@ TEST_F(PipeServer, ListenersFollowTheClients) {
     pipe->stop();
     pipe->start();
     EXPECT_EQ(recorder->waitFor("disconnected 0"), calls);
+    const CRawSocket early(path());
+    std::this_thread::sleep_for(std::chrono::milliseconds(20)); // until nobody waits for its data
+    pipe->addListener(recorder.get());
+    std::this_thread::sleep_for(std::chrono::milliseconds(20)); // until somebody does
+    early.send("early");
+    EXPECT_TRUE(recorder->waitFor("data ear\ndata ly").ends_with("data ly\n"));
+    pipe->stop();
+    all->close();
+    EXPECT_THROW(all->write("x", 1), CStreamClosedError);
+    pipe->removeListener(recorder.get());
 }
 
 TEST_F(PipeServer, DataThatNobodyReadsIsReportedOncePerArrival) {
@@ -221,16 +241,21 @@ TEST_F(PipeServer, DataThatNobodyReadsIsReportedOncePerArrival) {
     const P<IPipeServer> pipe = server();
     pipe->addListener(counter.get());
     pipe->start();
-    const CRawSocket peer(path());
+    auto peer = std::make_unique<CRawSocket>(path());
     counter->waitFor("connected");
     for (int i = 1; i <= 3; ++i) {
-        peer.send("x");
+        peer->send("x");
         while (counter->m_calls < i) std::this_thread::yield();
     }
     const clock_t before = ::clock();
     std::this_thread::sleep_for(std::chrono::milliseconds(50));
     EXPECT_EQ(counter->m_calls, 3);
     EXPECT_LT(::clock() - before, CLOCKS_PER_SEC / 20) << "the accept thread is busy";
+    // A client that has gone is reported when somebody has read the rest.
+    peer = nullptr;
+    std::this_thread::sleep_for(std::chrono::milliseconds(20)); // otherwise the thread sees both at once
+    pipe->getClient(0)->getInStream()->skip(3);
+    EXPECT_EQ(counter->waitFor("disconnected 0"), "created\nconnected\ndisconnected 0\n");
     pipe->removeListener(counter.get());
 }
 

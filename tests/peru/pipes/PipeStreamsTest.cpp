@@ -61,6 +61,14 @@ TEST_F(PipeStreams, NameEachWayToFail) {
     EXPECT_EQ(nowhere->getAvailable(), 0);
     EXPECT_FALSE(nowhere->waitForData(0));
     EXPECT_TRUE(nowhere->isAtEnd());
+    const SPipePart bad[] = {{"x", -1}, {"x", 1}};
+    EXPECT_THROW(apart->getOutStream()->writeParts(bad, 2), CInvalidArgError);
+    EXPECT_THROW(apart->getOutStream()->write("x", -1), CInvalidArgError);
+    EXPECT_THROW(server()->getOutStream()->write("x", -1), CInvalidArgError);
+    EXPECT_THROW(nowhere->read(&byte, -1), CInvalidArgError);
+    EXPECT_THROW(nowhere->readSome(&byte, -1), CInvalidArgError);
+    EXPECT_THROW(nowhere->skip(-1), CInvalidArgError);
+    EXPECT_TRUE(apart->getOutStream()->isAtEnd());
 
     SPair pair = connect();
     const P<IPipeInStream> in = pair.accepted->getInStream();
@@ -71,14 +79,28 @@ TEST_F(PipeStreams, NameEachWayToFail) {
     EXPECT_EQ(in->getAvailable(), 3);
     EXPECT_TRUE(pair.accepted->isAlive());
     char bytes[4] = {};
-    in->read(bytes, 3);
-    EXPECT_STREQ(bytes, "abc");
+    in->skip(1);
+    in->read(bytes, 2);
+    EXPECT_STREQ(bytes, "bc");
     EXPECT_FALSE(pair.accepted->isAlive());
     EXPECT_EQ(errorOf<CFinishedError>([&] { in->read(&byte, 1); }), "Pipe was closed");
     EXPECT_EQ(in->readSome(&byte, 1), 0);
     // SIGPIPE would end the test.
     EXPECT_EQ(titleOf([&] { pair.accepted->getOutStream()->write("x", 1); }), "Error write data to pipe");
     EXPECT_FALSE(pair.accepted->getOutStream()->writeByte(1));
+
+    // Each of these closes both directions.
+    for (int way = 0; way < 3; ++way) {
+        pair = connect();
+        const P<IPipeInStream> rest = pair.client->getInStream();
+        const P<IPipeOutStream> out = pair.client->getOutStream();
+        if (way == 0) rest->close();
+        if (way == 1) out->close();
+        if (way == 2) pair.client = nullptr;
+        EXPECT_EQ(titleOf([&] { rest->read(&byte, 1); }), "Invalid pipe handle") << way;
+        EXPECT_EQ(titleOf([&] { out->write("x", 1); }), "Invalid pipe handle") << way;
+        EXPECT_TRUE(pair.accepted->getInStream()->isAtEnd());
+    }
 }
 
 TEST_F(PipeStreams, WaitsEndByDeadlineAbortAndClose) {
@@ -95,15 +117,20 @@ TEST_F(PipeStreams, WaitsEndByDeadlineAbortAndClose) {
     in->setDeadline(20);
     EXPECT_EQ(titleOf(read), "The deadline for reading from the pipe has passed");
     int asked = 0;
-    in->setExtension([&] { return ++asked < 3; });
-    in->setDeadline(20);
+    const auto start = std::chrono::steady_clock::now();
+    for (const P<IPipeStream>& stream : {P<IPipeStream>(in), P<IPipeStream>(out)}) {
+        stream->setExtension([&] { return ++asked % 3 != 0; });
+        stream->setDeadline(20);
+    }
     EXPECT_EQ(titleOf(read), "The deadline for reading from the pipe has passed");
     EXPECT_EQ(asked, 3);
-    in->setExtension(nullptr);
-    in->setDeadline(IPipeStream::kNoDeadline);
-    out->setDeadline(20);
+    EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(59)) << "three times 20 ms";
     EXPECT_EQ(titleOf(write), "The deadline for writing to the pipe has passed");
-    out->setDeadline(IPipeStream::kNoDeadline);
+    EXPECT_EQ(asked, 6);
+    for (const P<IPipeStream>& stream : {P<IPipeStream>(in), P<IPipeStream>(out)}) {
+        stream->setExtension(nullptr);
+        stream->setDeadline(IPipeStream::kNoDeadline);
+    }
 
     const auto after = [](auto&& action) {
         return std::thread([action] {
