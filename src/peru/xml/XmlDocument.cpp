@@ -61,7 +61,9 @@ bool declaresLatin1(std::string_view text) {
     if (!startsWith(text, "<?xml")) return false;
     std::string declaration(text.substr(0, std::min<size_t>(text.find("?>"), 200)));
     for (char& ch : declaration) ch = ch >= 'A' && ch <= 'Z' ? static_cast<char>(ch + 32) : ch;
-    return declaration.find("iso-8859-1") != std::string::npos;
+    // Up to the quotation mark: the names of ISO-8859-10 to 16 start like this one.
+    return declaration.find("iso-8859-1\"") != std::string::npos ||
+           declaration.find("iso-8859-1'") != std::string::npos;
 }
 
 // Converts the bytes to UTF-8 without a mark.

@@ -3,6 +3,7 @@
 #include "peru/streams/IStreamManager.h"
 #include "peru/streams/MemoryIOStream.h"
 #include "peru/streams/StringStreams.h"
+#include "peru/strings/CharEncodingRules.h"
 #include "peru/strings/StringFormat.h"
 #include "support/Files.h"
 #include "support/Process.h"
@@ -35,6 +36,15 @@ std::string repeat(std::string_view text, int count) {
     std::string all;
     for (int i = 0; i < count; ++i) all += text;
     return all;
+}
+
+bool accepts(const std::function<void()>& change) {
+    try {
+        change();
+        return true;
+    } catch (const CException&) {
+        return false;
+    }
 }
 
 std::string asUTF16(std::u16string_view units, bool bigEndian) {
@@ -79,21 +89,62 @@ TEST(XmlDocument, parse_NamesLineAndFaultOfBadDocuments) {
         // a document and the end of its message
         {"<a>\n\xFF</a>", "is not in a known encoding, such as valid UTF-8, line 2."},
         {"<a>\xF0\x9F\x98", "such as valid UTF-8, line 1."},
+        {"<?xml version='1.0' encoding='ISO-8859-15'?><a>\xA4</a>", "such as valid UTF-8, line 1."},
         {asUTF16(u"<a>\n", false) + "\x3D\xD8", "such as valid UTF-8, line 2."},
+        {asUTF16(u"<a>\n", false) + "\x3D", "such as valid UTF-8, line 2."},
+        {asUTF16(u"<a>\n\xD83D\xD83D", true), "such as valid UTF-8, line 2."},
         {repeat("<a>", 257) + repeat("</a>", 257), "too many attributes in one element, line 1."},
     };
     const std::pair<int, std::vector<std::string>> syntax[] = {
         {1,
-         {"", "<!DOCTYPE a [<!ENTITY b 'c'>]>\n<a/>", "<a b='&#x110000;'/>",
-          "<a>&#" + repeat("1", 100) + ";</a>", "<?xmlencoding=\"?><a b=\"\"/>",
-          "<?xml version='1.0?><a b=''/>", "<?XML version='1.0' encoding?><a/>",
-          "<?xml-a title='an encoding'?><a/>"}},
+         {"",
+          "<!DOCTYPE a [<!ENTITY b 'c'>]>\n<a/>",
+          "<a b='&#x110000;'/>",
+          "<a>&#" + repeat("1", 100) + ";</a>",
+          "<?xmlencoding=\"?><a b=\"\"/>",
+          "<?xml version='1.0?><a b=''/>",
+          "<?XML version='1.0' encoding?><a/>",
+          "<?xml-a title='an encoding'?><a/>",
+          "<?xml a='b\"c'?><a/>",
+          "<?xml a='b'c='d'?><a/>",
+          "<?xml a='b?><a c=''/>",
+          "<?xml a b='c'?><a/>",
+          "<?go",
+          "<?go > ?><a/>",
+          "<!doctype a><a/>",
+          "<!DOCTYPE a \"><a b='\"'/>",
+          "<!DOCTYPE a '><a b=\"'\"/>",
+          "<!DOCTYPE a",
+          "<a/><!DOCTYPE a>",
+          "<a><!DOCTYPE a></a>",
+          "<![CDATA[a]]><a/>",
+          "<a",
+          "<a/ >",
+          "<a b>",
+          "<a b/>",
+          "<a b=1/>",
+          "<a b='1/>",
+          "<a b='1'c='2'/>",
+          "<a =''/>",
+          "<a></>",
+          "<a></a b>",
+          "<a></a",
+          "</a>",
+          "<a>&#x;</a>",
+          "<a>&#;</a>",
+          "<a>&#X41;</a>",
+          "<a>&#65</a>",
+          "<a>&#65",
+          "<a>&amp</a>",
+          "<a>&a;</a>",
+          "<a>&;</a>",
+          "<a>&#-1;</a>",
+          "<a>&#65;&</a>",
+          "<?xml a=' STANDALONE'?><a/>"}},
         {2,
          {"<a>\n<b c='1' c='2'/></a>", "<a>\n<b c='<'/></a>", "<a/>\n<b/>", "<a/>\ntext", "<a>\n</a></a>",
           "<a>\n<![CDATA[ ]] </a>", "<a>\n&#0;</a>", "<a>\nrock & roll</a>", "<a b='\n&nbsp;'/>",
-          "\n<\xEF\xBB\xBF"
-          "a/>",
-          std::string("<a>\n\0</a>", 9)}},
+          "\n<\xEF\xBB\xBFx/>", std::string("<a>\n\0</a>", 9)}},
         {3, {"<a>\n<b>\n</a>\n</b>", "<a>\r<b>\r", "<a>\n\n<!-- </a>"}},
     };
     for (const auto& [line, documents] : syntax)
@@ -165,12 +216,98 @@ TEST(XmlDocument, print_TextsComeBackAndPeersReadThem) {
             EXPECT_EQ(judged.out, texts[i] + "|" + texts[i] + "\n") << judged.err;
         }
     }
-    auto document = make<CXmlDocument>();
-    const P<IXmlNode> root = document->addChildNode("a");
-    root->addChildNode("b")->addChildNode("c")->setText("d");
-    root->addChildNode("e");
-    EXPECT_EQ(print(document), "<?xml version=\"1.0\" encoding=\"UTF-8\" ?>\n<a>\n    <b>\n        <c>d</c>\n"
-                               "    </b>\n    <e />\n</a>\n");
+    // The same text again, with each kind of content in its place.
+    const std::string own =
+        "<?xml version=\"1.1\" encoding=\"UTF-8\" ?>\n<!-- first -->\n<!DOCTYPE a \"b\" 'c'>\n"
+        "<a b=\"1\" c=\"&quot;&apos; &lt;&gt;&amp;  .\">\n    <!-- c -->\n"
+        "    <d>t<e><f /></e><!-- g --><h>u</h>v</d>\n    <i>\n        <j />\n    </i>\n"
+        "    <k><![CDATA[<&]]></k>\n    <l>&#x20;\xEF\xBC\x81 m &#x20;n&#x20;</l>\n</a>\n<!-- last -->\n";
+    const auto document = make<CXmlDocument>("1.1", "utf-8");
+    document->parse(streamOf(own));
+    EXPECT_EQ(print(document), std::string(own).replace(30, 5, "utf-8"));
+}
+
+TEST(XmlDocument, nodes_ReadAndChangeTheirParts) {
+    const auto document = parse("<a p='1' q='2'>x<b/>y<c/><b r='3'/></a>");
+    const P<IXmlNode> root = document->getRootNode();
+    EXPECT_EQ(document->getChildNode("a"), root);
+    EXPECT_FALSE(document->getChildNode("b"));
+    for (WEnum<IXmlNode> nodes : {document->getChildNodes(), document->getChildNodesByName("a")}) {
+        EXPECT_EQ(nodes.getNext(), root);
+        EXPECT_THROW(nodes.getNext(), CEndOfEnumError);
+    }
+    EXPECT_EQ(document->getChildNodesByName("b").getCount(), 0);
+    EXPECT_FALSE(document->getProperty("p"));
+    EXPECT_FALSE(document->getProperties().hasMore());
+    EXPECT_THROW(document->setProperty("p", "2"), CMethodNotImplementedError);
+    EXPECT_EQ(document->getDocument(), document);
+    EXPECT_FALSE(root->getProperty("r"));
+    EXPECT_EQ(text(root->getText()), "xy");
+    root->setText("z<");
+    WEnum<IXmlProperty> properties = root->getProperties();
+    for (const char* name : {"p", "q"}) {
+        const P<IXmlProperty> property = properties.getNext();
+        EXPECT_EQ(text(property->getName()), name);
+        property->setValue(CString::fromUTF8("<" + text(property->getValue())));
+        EXPECT_THROW(property->setValue("\x01"), CInvalidArgError);
+    }
+    EXPECT_THROW(properties.getNext(), CEndOfEnumError);
+    root->removeChildNode(root->getChildNode("c"));
+    root->getChildNode("b")->setText("t");
+    EXPECT_TRUE(print(document).ends_with("<a p=\"&lt;1\" q=\"&lt;2\">z&lt;<b>t</b><b r=\"3\" /></a>\n"));
+    root->removeProperty("p");
+    root->getChildNode("b")->setText("");
+    root->setText("");
+    EXPECT_TRUE(print(document).ends_with("<a q=\"&lt;2\">\n    <b />\n    <b r=\"3\" />\n</a>\n"));
+    EXPECT_THROW(document->removeChildNode(root->getChildNode("b")), CInvalidArgError);
+    EXPECT_THROW(document->removeChildNode(nullptr), CInvalidArgError);
+    document->removeChildNode(root);
+    EXPECT_THROW(root->getName(), CInvalidObjectStateError);
+    EXPECT_FALSE(document->getRootNode());
+    EXPECT_THROW(document->parseString(nullptr), CParseError);
+}
+
+TEST(XmlDocument, characters_AtTheLimitsOfTheirRanges) {
+    constexpr std::pair<char32_t, char32_t> kValid[] = {
+        {0x9, 0xA}, {0xD, 0xD}, {0x20, 0xD7FF}, {0xE000, 0xFFFD}, {0x10000, 0x10FFFF}};
+    std::map<char32_t, bool> cases;
+    for (const auto& [first, last] : kValid)
+        cases.merge(
+            std::map<char32_t, bool>{{first, true}, {last, true}, {first - 1, false}, {last + 1, false}});
+    for (const auto& [ch, valid] : cases) {
+        SCOPED_TRACE(static_cast<uint32_t>(ch));
+        uint8_t utf8[4];
+        const std::string raw(reinterpret_cast<char*>(utf8),
+                              static_cast<size_t>(SUTF8Rules::write(ch, utf8)));
+        std::u16string units(1, static_cast<char16_t>(ch < 0x10000 ? ch : 0xD7C0 + (ch >> 10)));
+        if (ch >= 0x10000) units += static_cast<char16_t>(0xDC00 + (ch & 0x3FF));
+        const auto code = static_cast<int32_t>(ch);
+        std::vector<std::string> documents{"<a>x" + raw + "x</a>", asUTF16(u"<a>x" + units + u"x</a>", false),
+                                           asUTF16(u"<a>x" + units + u"x</a>", true)};
+        for (const char* form : {"<a>x&#%d;x</a>", "<a>x&#x%x;x</a>", "<a>x&#x%X;x</a>"})
+            documents.push_back(text(format(form, code)));
+        for (const std::string& each : documents)
+            EXPECT_EQ(accepts([&] {
+                          EXPECT_EQ(text(parse(each)->getRootNode()->getText()),
+                                    "x" + (each[4] != '&' && ch < 0x20 ? " " : raw) + "x");
+                      }),
+                      valid)
+                << each;
+        const P<IXmlNode> node = make<CXmlDocument>()->addChildNode("a");
+        EXPECT_EQ(accepts([&] { node->setText(CString::fromUTF8(raw)); }), valid);
+    }
+    const P<IXmlNode> node = make<CXmlDocument>()->addChildNode("a");
+    for (int i = 1; i < 0x80; ++i) {
+        const std::string ch(1, static_cast<char>(i));
+        const bool start = std::isalpha(i) || ch == "_";
+        const bool part = start || std::isdigit(i) || std::string("-.:").find(ch) != std::string::npos;
+        const bool blank = std::string(" \t\r\n").find(ch) != std::string::npos;
+        EXPECT_EQ(accepts([&] { node->addChildNode(CString::fromUTF8(ch)); }), start) << ch;
+        EXPECT_EQ(accepts([&] { node->addChildNode(CString::fromUTF8("a" + ch)); }), part) << ch;
+        EXPECT_EQ(accepts([&] { parse("<" + ch + "/>"); }), start) << ch;
+        EXPECT_EQ(accepts([&] { parse("<a" + ch + "/>"); }), part || blank) << ch;
+        EXPECT_EQ(accepts([&] { parse("<a " + ch + "=''/>"); }), start) << ch;
+    }
 }
 
 TEST(XmlDocument, nodes_OutliveTheDocumentButNotTheirRemoval) {
@@ -199,17 +336,19 @@ TEST(XmlDocument, changes_ThatCouldNotBeReadAgainAreRefused) {
     auto document = make<CXmlDocument>();
     P<IXmlNode> node = document->addChildNode("a");
     EXPECT_THROW(document->addChildNode("b"), CInvalidArgError);
-    for (const char16_t* name : {u"", u"1", u"-a", u"a b", u"a<", u"a=", u":a", u"\uFEFFa"}) {
+    EXPECT_TRUE(document->getName()->isEmpty() && document->getText()->isEmpty());
+    EXPECT_THROW(document->setText("a"), CMethodNotImplementedError);
+    for (const char16_t* name : {u"", u"a<", u"\uFEFFa"}) {
         EXPECT_THROW(node->addChildNode(name), CInvalidArgError) << text(newString(name));
         EXPECT_THROW(node->setProperty(name, ""), CInvalidArgError) << text(newString(name));
     }
-    for (const char* bad : {"\x01", "\xED\xA0\x80", "\xFF", "\xEF\xBF\xBF"})
-        EXPECT_THROW(node->setText(CString::fromUTF8(bad)), CInvalidArgError);
+    EXPECT_THROW(node->setText(CString::fromUTF8("\xFF")), CInvalidArgError);
     for (int i = 0; i < IXmlDocument::kMaxProperties; ++i) node->setProperty(format("p%d", i), "");
     node->setProperty("p0", "changed");
     EXPECT_THROW(node->setProperty("one", "more"), CInvalidArgError);
     for (int i = 1; i < IXmlDocument::kMaxDepth; ++i) node = node->addChildNode("a");
     EXPECT_THROW(node->addChildNode("a"), CInvalidArgError);
     parse(print(document));
-    EXPECT_THROW(make<CXmlDocument>("1.0", "KOI8-R"), CInvalidArgError);
+    for (const char* version : {"1.0", "1.2"})
+        EXPECT_THROW(make<CXmlDocument>(version, version[2] == '0' ? "KOI8-R" : "UTF-8"), CInvalidArgError);
 }
