@@ -26,11 +26,7 @@ TEST(Errors, ReadAsTheUserSeesThem) {
     P<IURI> uri = make<CURI>("file:///music/a%20b.wav");
     P<IURI> noURI;
     P<IBase> array = make<CArray>();
-    const struct {
-        P<CException> error;
-        const char* title;
-        const char* description;
-    } cases[] = {
+    const std::tuple<P<CException>, const char*, const char*> cases[] = {
         {error(CError("", "")), "Error", "Unspecified error"},
         {error(CError("broken", "Disc")), "Disc", "broken"},
         {error(CObjectError("lost %OBJECTDESC%, %OBJECTDESC%", array)), "Object error",
@@ -58,10 +54,10 @@ TEST(Errors, ReadAsTheUserSeesThem) {
         {error(CStreamClosedError(uri)), "Error",
          "The stream has been closed (uri: 'file:///music/a%20b.wav')."},
     };
-    for (const auto& each : cases) {
-        EXPECT_EQ(text(each.error->getTitle()), each.title) << each.description;
-        EXPECT_EQ(text(each.error->getDescription()), each.description);
-        EXPECT_STREQ(each.error->what(), each.description);
+    for (const auto& [thrown, title, description] : cases) {
+        EXPECT_EQ(text(thrown->getTitle()), title) << description;
+        EXPECT_EQ(text(thrown->getDescription()), description);
+        EXPECT_STREQ(thrown->what(), description);
     }
 }
 

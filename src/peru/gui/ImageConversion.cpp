@@ -45,6 +45,7 @@ wxImage toWxImage(const CRGBAImage& image) {
     if (image.isOpaque()) return result;
     result.SetAlpha();
     uint8_t* const alphas = result.GetAlpha();
+    if (!alphas) throw CError("Out of memory");
     for (size_t i = 0; i < count; ++i) alphas[i] = static_cast<uint8_t>(pixels[i] >> 24);
     return result;
 }

@@ -13,6 +13,17 @@ size_t countPixels(int width, int height) {
     return static_cast<size_t>(width) * static_cast<size_t>(height);
 }
 
+// The image with each pixel replaced, in the same memory.
+template <EAlpha kTo, EAlpha kFrom, class Map>
+TRGBAImage<kTo> mapPixels(TRGBAImage<kFrom> image, const Map& map) {
+    if (image.isEmpty()) return {};
+    const int width = image.getWidth(), height = image.getHeight();
+    uint32_t* const pixels = image.getRow(0);
+    const size_t count = image.getPixels().size();
+    for (size_t i = 0; i < count; ++i) pixels[i] = map(pixels[i]);
+    return {width, height, std::move(image).takePixels()};
+}
+
 } // namespace
 
 template <EAlpha kAlpha> TRGBAImage<kAlpha>::TRGBAImage(int width, int height)
@@ -44,30 +55,21 @@ template class TRGBAImage<EAlpha::straight>;
 template class TRGBAImage<EAlpha::premultiplied>;
 
 CPremultipliedImage premultiply(CRGBAImage image) {
-    const int width = image.getWidth(), height = image.getHeight();
-    if (image.isEmpty()) return {};
-    uint32_t* const pixels = image.getRow(0);
-    const size_t count = image.getPixels().size();
-    for (size_t i = 0; i < count; ++i) {
-        const uint32_t pixel = pixels[i], alpha = pixel >> 24;
+    return mapPixels<EAlpha::premultiplied>(std::move(image), [](uint32_t pixel) {
+        const uint32_t alpha = pixel >> 24;
         // With t = channel * alpha + 128, (t + t / 256) / 256 is the rounded quotient by 255. Red and blue
         // share a word.
         uint32_t redBlue = (pixel & 0xFF00FF) * alpha + 0x800080;
         redBlue = (redBlue + (redBlue >> 8 & 0xFF00FF)) >> 8 & 0xFF00FF;
         uint32_t green = (pixel >> 8 & 0xFF) * alpha + 0x80;
         green = (green + (green >> 8)) & 0xFF00;
-        pixels[i] = alpha << 24 | redBlue | green;
-    }
-    return {width, height, std::move(image).takePixels()};
+        return alpha << 24 | redBlue | green;
+    });
 }
 
 CRGBAImage unpremultiply(CPremultipliedImage image) {
-    const int width = image.getWidth(), height = image.getHeight();
-    if (image.isEmpty()) return {};
-    uint32_t* const pixels = image.getRow(0);
-    const size_t count = image.getPixels().size();
-    for (size_t i = 0; i < count; ++i) {
-        const uint32_t pixel = pixels[i], alpha = pixel >> 24;
+    return mapPixels<EAlpha::straight>(std::move(image), [](uint32_t pixel) {
+        const uint32_t alpha = pixel >> 24;
         const float divisor = static_cast<float>(static_cast<int32_t>(alpha > 0 ? alpha : 1));
         const uint32_t mask = alpha > 0 ? 0xFFFFFFFFu : 0;
         // Numerators are below 2^16, so the quotient of floats never reaches the next whole number early.
@@ -78,9 +80,8 @@ CRGBAImage unpremultiply(CPremultipliedImage image) {
         };
         const uint32_t colour =
             divide(pixel >> 16 & 0xFF) << 16 | divide(pixel >> 8 & 0xFF) << 8 | divide(pixel & 0xFF);
-        pixels[i] = alpha << 24 | (colour & mask);
-    }
-    return {width, height, std::move(image).takePixels()};
+        return alpha << 24 | (colour & mask);
+    });
 }
 
 } // namespace peru::gui

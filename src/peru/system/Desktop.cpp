@@ -17,6 +17,8 @@ const P<IDesktop>& getDesktop() {
 
 P<IFileTypesManager> getFileTypesManager() {
     static const CGlobalObjFactory::SKey key;
+    // Loaded before the factory's lock is held: a thread that is just loading it needs that lock.
+    getDesktop();
     return CGlobalObjFactory::get<IFileTypesManager>(key,
                                                      [] { return getDesktop()->createFileTypesManager(); });
 }

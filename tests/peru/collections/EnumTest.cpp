@@ -19,13 +19,7 @@ P<CArray> makeArray(const std::string& letters) {
 }
 
 // The remaining elements as one text.
-std::string drain(const P<IEnum>& elements) {
-    std::string all;
-    for (WEnum<IString> typed(elements); typed.hasMore();) all += CString::toStdString(typed.getNext());
-    return all;
-}
-
-std::string drainConst(const P<IConstEnum>& elements) {
+std::string drain(const P<IConstEnum>& elements) {
     std::string all;
     while (elements->hasMore())
         all += CString::toStdString(*PC<IString>(P<const IString>(elements->getNextConst())));
@@ -38,20 +32,16 @@ P<IEnum> chain(const std::vector<std::string>& parts) {
     return multi;
 }
 
-P<IConstEnum> chainConst(const std::string& a, const std::string& b) {
-    return make<CConstMultiEnum>(std::vector<P<IConstEnum>>{makeArray(a)->createConstEnum(), P<IConstEnum>(),
-                                                            makeArray(b)->createConstEnum(true)});
-}
-
 } // namespace
 
 TEST(Enum, WalksToTheEndAndThrowsThere) {
     P<CConstArray> constant =
         make<CConstArray>(std::vector<PC<IBase>>{P<IBase>(newString("x")), P<IBase>(newString("y"))});
-    const struct {
-        P<IConstEnum> elements;
-        const char* expected;
-    } cases[] = {
+    for (int32_t index : {-1, 2}) EXPECT_THROW(constant->getConstAt(index), CInvalidArgError);
+    P<CConstMultiEnum> constChain =
+        make<CConstMultiEnum>(std::vector<P<IConstEnum>>{makeArray("ab")->createConstEnum(), nullptr});
+    constChain->addEnum(makeArray("cd")->createConstEnum(true));
+    const std::pair<P<IConstEnum>, std::string> cases[] = {
         {make<CEmptyEnum>(), ""},
         {makeArray("")->createEnum(), ""},
         {makeArray("")->createConstEnum(true), ""},
@@ -62,49 +52,35 @@ TEST(Enum, WalksToTheEndAndThrowsThere) {
         {constant->createConstEnum(true), "yx"},
         {chain({"", "", ""}), ""},
         {chain({"ab", "", "c"}), "abc"},
-        {chainConst("ab", "cd"), "abdc"},
+        {constChain, "abdc"},
     };
-    for (const auto& each : cases) {
-        SCOPED_TRACE(each.expected);
-        EXPECT_EQ(each.elements->getCount(), static_cast<int32_t>(std::string(each.expected).size()));
+    for (const auto& [elements, expected] : cases) {
+        SCOPED_TRACE(expected);
+        EXPECT_EQ(elements->getCount(), std::ssize(expected));
         for (int round = 0; round < 2; ++round) {
-            EXPECT_EQ(drainConst(each.elements), each.expected);
-            EXPECT_THROW(each.elements->getNextConst(), CEndOfEnumError);
-            if (auto typed = tryCast<IEnum>(each.elements)) {
+            EXPECT_EQ(drain(elements), expected);
+            EXPECT_THROW(elements->getNextConst(), CEndOfEnumError);
+            if (auto typed = tryCast<IEnum>(elements)) {
                 EXPECT_THROW(typed->getNext(), CEndOfEnumError);
             }
-            EXPECT_FALSE(each.elements->hasMore());
-            each.elements->reset();
+            EXPECT_FALSE(elements->hasMore());
+            elements->reset();
         }
     }
-}
-
-TEST(Enum, TypedViewOfNothingIsEmpty) {
     WEnum<IString> none;
     EXPECT_FALSE(none.hasMore());
     EXPECT_THROW(none.getNext(), CEndOfEnumError);
     none.reset();
 }
 
-TEST(Enum, SeesTheChangesOfItsArray) {
-    P<CArray> array = makeArray("abcd");
-    P<IEnum> elements = array->createEnum();
-    elements->getNext();
-    array->removeAt(1);
-    EXPECT_EQ(drain(elements), "cd");
-    array->add(newString("e"));
-    EXPECT_EQ(drain(elements), "e");
-    array->clear();
-    EXPECT_FALSE(elements->hasMore());
-}
-
 TEST(Array, EditsByIndexAndRefusesOthers) {
     P<CArray> array = makeArray("ac");
+    P<IEnum> elements = array->createEnum(); // sees the changes
     P<IBase> b = newString("b");
     array->insertAt(1, b);
     array->insertAt(3, newString("d"));
     array->setAt(0, newString("A"));
-    EXPECT_EQ(drain(array->createEnum()), "Abcd");
+    EXPECT_EQ(drain(elements), "Abcd");
     EXPECT_TRUE(array->remove(b));
     EXPECT_FALSE(array->remove(b));
     EXPECT_EQ(drain(array->createEnum()), "Acd");
@@ -114,6 +90,10 @@ TEST(Array, EditsByIndexAndRefusesOthers) {
         [&](int32_t index) { array->insertAt(index < 0 ? index : index + 1, b); }};
     for (const auto& operation : operations)
         for (int32_t index : {-1, 3}) EXPECT_THROW(operation(index), CInvalidArgError);
+    elements->reset();
+    elements->getNext();
+    array->clear();
+    EXPECT_FALSE(elements->hasMore());
 }
 
 } // namespace peru

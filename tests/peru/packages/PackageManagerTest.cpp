@@ -1,5 +1,4 @@
 #include "peru/packages/PackageManager.h"
-#include "peru/collections/FrailArray.h"
 #include "peru/packages/Package.h"
 
 #include "support/Files.h"
@@ -53,12 +52,11 @@ TEST(PackageManager, BringsUpWhatIsRequiredFirstAndOnce) {
     manager->addListener(leaving.get());
     manager->addListener(listener.get());
     manager->registerPackage(make<CTestPackage>("top", log, std::vector{"left", "right"}));
-    manager->registerPackage(make<CTestPackage>("left", log, std::vector{"base"}));
-    manager->registerPackage(make<CTestPackage>("right", log, std::vector{"base"}));
+    for (const char* name : {"left", "right"})
+        manager->registerPackage(make<CTestPackage>(name, log, std::vector{"base"}));
     manager->registerPackage(make<CTestPackage>("base", log, std::vector{"top"})); // the cycle ends here
     manager->registerPackage(make<CTestPackage>("base", log));
-    EXPECT_TRUE(manager->activateByName("top"));
-    EXPECT_TRUE(manager->activateByName("top"));
+    for (int round = 0; round < 2; ++round) EXPECT_TRUE(manager->activateByName("top"));
     EXPECT_EQ(log, (CLog{"base", "left", "right", "top"}));
     for (const P<IPackage>& package : manager->getPackages())
         EXPECT_TRUE(manager->isActive(package)) << text(package->getName());

@@ -39,6 +39,7 @@ TEST(ValueBoxes, parse_TakesTheWholeTextOrNothing) {
         {pass<CInt>, "-0", "0"},
         {pass<CInt>, "+7", "7"},
         {pass<CInt>, "-2147483648", "-2147483648"},
+        {pass<CInt>, "2147483647", "2147483647"},
         {pass<CInt64>, "9223372036854775807", "9223372036854775807"},
         {pass<CDouble>, "-0", "-0"},
         {pass<CDouble>, "1.50", "1.5"},
@@ -51,7 +52,7 @@ TEST(ValueBoxes, parse_TakesTheWholeTextOrNothing) {
     };
     for (const auto& c : cases) EXPECT_EQ(c.pass(c.text), c.result) << c.text;
     for (const char* bad : {"True", ""}) EXPECT_EQ(pass<CBool>(bad), kBadInteger) << bad;
-    for (const char* bad : {"2147483648", "0x10", " 1", "1 ", "+-1", "1.5", ""})
+    for (const char* bad : {"2147483648", "-2147483649", "0x10", " 1", "1 ", "+-1", "1.5", ""})
         EXPECT_EQ(pass<CInt>(bad), kBadInteger) << bad;
     EXPECT_EQ(pass<CInt64>("9223372036854775808"), kBadInteger);
     for (const char* bad : {"++1", "1,5", "1e400", "1.5 ", ""})

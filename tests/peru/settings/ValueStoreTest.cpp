@@ -32,11 +32,9 @@ P<IValueStore> openRegistry(const char* key, EStoreAccess access = EStoreAccess:
 // Answers for every URI with one store.
 class CMemoryFactory : public CObject, public IValueStoreFactory {
 public:
-    P<IValueStore> openStore(const P<IURI>& uri, EStoreAccess) override {
-        return m_store = make<CXmlValueStore>(make<CXmlDocument>(), uri, EStoreAccess::read, EMode::elements,
-                                              false);
-    }
-    P<IValueStore> m_store;
+    P<IValueStore> openStore(const P<IURI>&, EStoreAccess) override { return m_store; }
+    const P<IValueStore> m_store =
+        make<CXmlValueStore>(make<CXmlDocument>(), nullptr, EStoreAccess::read, EMode::elements, false);
 };
 
 } // namespace
@@ -44,36 +42,49 @@ public:
 TEST(ValueStore, values_ComeBackFromTheFileInBothModes) {
     const CTempFolder folder;
     const std::string long_ = "  two\n\n lines & <more>\t\xF0\x9F\x98\x80 \xE0\xA4\x95 ";
-    for (EMode mode : {EMode::elements, EMode::attributes}) {
-        const P<IURI> uri = tests::toURI(folder / (mode == EMode::elements ? "deep/a.xml" : "b.xml"));
-        P<IValueStore> store = CXmlValueStore::open(uri, EStoreAccess::readWrite, mode);
+    const CEnvironment config("XDG_CONFIG_HOME", folder.path().string());
+    for (const std::string kind : {"", "@", "registry"}) {
+        const P<IURI> uri = tests::toURI(folder / (kind.empty() ? "deep/a.xml" : "b.xml"));
+        const auto open = [&](EStoreAccess access) -> P<IValueStore> {
+            if (kind == "registry") return openRegistry("registry:///HKEY_USERS/A/", access);
+            return CXmlValueStore::open(uri, access, kind.empty() ? EMode::elements : EMode::attributes);
+        };
+        P<IValueStore> store = open(EStoreAccess::readWrite);
         store->setString("", "1st Try", CString::fromUTF8(long_));
-        store->setInt("Tone/-4 dB", "-1", -1);
+        store->setInt("Tone/-4 dB", "1 x", -1);
         store->setInt64("Tone", "big", int64_t{1} << 60);
         store->setBool("Tone", "on", true);
+        store->setBool("Tone", "off", false);
         store->setDouble("Tone", "gain", 0.1);
         store->setString("Tone", "empty", "");
         store->setString("Tone", "word", "maybe");
-        EXPECT_FALSE(std::filesystem::exists(tests::toPath(uri)));
+        EXPECT_EQ(std::filesystem::exists(tests::toPath(uri)), kind == "registry")
+            << "left by the kind before";
         store->flush();
 
-        store = CXmlValueStore::open(uri, EStoreAccess::read, mode);
+        store = open(EStoreAccess::read);
         const P<IString> first = store->getString("", "1st Try", nullptr);
         EXPECT_EQ(text(first->toUTF8String()), long_);
-        EXPECT_EQ(store->getInt("Tone/-4 dB", "-1", 0), -1);
+        EXPECT_EQ(store->getInt("Tone/-4 dB", "1 x", 0), -1);
         EXPECT_EQ(store->getInt64("/Tone/", "big", 0), int64_t{1} << 60);
         EXPECT_TRUE(store->getBool("Tone", "on", false));
         EXPECT_EQ(store->getDouble("Tone", "gain", 0), 0.1);
         EXPECT_EQ(store->getInt("Tone", "empty", 7), 7);
-        EXPECT_EQ(text(store->getString("Tone", "none", newString("else"))), "else");
+        for (const char* name : {"none", "empty"})
+            EXPECT_EQ(text(store->getString("Tone", name, newString("else"))), "else");
         EXPECT_TRUE(store->getBool("Tone", "word", true));
         EXPECT_FALSE(store->getBool("Tone", "word", false));
+        EXPECT_FALSE(store->getBool("Tone", "off", true));
+        for (const bool fallback : {false, true})
+            EXPECT_EQ(store->getBool("Tone", "none", fallback), fallback);
+        EXPECT_EQ(store->getInt64("none", "big", 8), 8);
+        EXPECT_EQ(store->getDouble("Tone", "none", 0.5), 0.5);
         EXPECT_EQ(errorOf([&] { store->getInt("Tone", "big", 0); }), "Error parsing integer.");
         EXPECT_TRUE(store->hasValue("Tone", "empty"));
         EXPECT_FALSE(store->hasValue("Tone", "-4 dB"));
         EXPECT_TRUE(store->hasSection("Tone/-4 dB"));
         EXPECT_FALSE(store->hasSection("Tone/gain"));
-        EXPECT_EQ(join(store->getValueNames("Tone")), "big;on;gain;empty;word;");
+        EXPECT_EQ(join(store->getValueNames("Tone")), "big;on;off;gain;empty;word;");
         EXPECT_EQ(join(store->getValueNames("")), "1st Try;");
         EXPECT_EQ(join(store->getSectionNames("")), "Tone;");
         EXPECT_EQ(join(store->getSectionNames("Tone")).substr(0, 6), "-4 dB;");
@@ -81,32 +92,54 @@ TEST(ValueStore, values_ComeBackFromTheFileInBothModes) {
         EXPECT_THROW(store->setInt("", "a", 1), CReadOnlyError);
         EXPECT_THROW(store->removeSection("Tone"), CReadOnlyError);
 
-        const char* place = mode == EMode::elements ? "/settings/Tone/__L__-4__32__dB/__L__-1"
-                                                    : "/settings/Tone/__L__-4__32__dB/@__L__-1";
-        const auto judged =
-            tests::run({"xmllint", "--xpath", std::string("string(") + place + ")", tests::toPath(uri)});
+        if (kind == "registry") {
+            open(EStoreAccess::readWrite)->removeSection("Tone");
+            EXPECT_FALSE(store->hasSection("Tone"));
+            break;
+        }
+        const auto judged = tests::run({"xmllint", "--xpath",
+                                        "string(/settings/Tone/__L__-4__32__dB/" + kind + "__L__1__32__x)",
+                                        tests::toPath(uri)});
         EXPECT_EQ(judged.out, "-1\n") << judged.err;
     }
-    EXPECT_NE(tests::readFile(folder / "deep/a.xml").find("<__L__1st__32__Try>"), std::string::npos);
 }
 
 TEST(ValueStore, remove_LeavesTheRest) {
     const CTempFolder folder;
-    const P<IURI> uri = tests::toURI(folder / "a.xml");
-    const auto store = CXmlValueStore::open(uri, EStoreAccess::readWrite);
-    store->setInt("a", "b", 1);
-    store->setInt("a/b", "c", 2); // a section of the same name
-    store->setInt("a", "d", 3);
-    for (const char* name : {"b", "none"}) store->removeValue("a", name);
-    EXPECT_FALSE(store->hasValue("a", "b"));
-    EXPECT_EQ(store->getInt("a/b", "c", 0), 2);
-    for (const char* section : {"none/none", "a"}) store->removeSection(section);
-    EXPECT_FALSE(store->hasSection("a"));
-    store->setInt("x", "y", 1);
-    store->removeSection("");
-    EXPECT_EQ(join(store->getSectionNames("")), "");
-    store->flush();
-    EXPECT_FALSE(CXmlValueStore::open(uri, EStoreAccess::read)->hasSection("x"));
+    for (const EMode mode : {EMode::elements, EMode::attributes}) {
+        const P<IURI> uri = tests::toURI(folder / (mode == EMode::elements ? "a.xml" : "b.xml"));
+        const auto store = CXmlValueStore::open(uri, EStoreAccess::readWrite, mode);
+        EXPECT_FALSE(store->hasSection(""));
+        store->setInt("a", "b", 1);
+        store->setInt("a/b", "c", 2); // a section of the same name
+        store->setInt("a", "d", 3);
+        store->setInt("x", "y", 1);
+        store->setInt("x/y", "z", 2);
+        EXPECT_EQ(join(store->getValueNames("a")) + join(store->getSectionNames("a")), "b;d;b;");
+        // Each change reaches the file by itself.
+        const auto reopen = [&] {
+            store->flush();
+            const auto found = CXmlValueStore::open(uri, EStoreAccess::read, mode);
+            std::filesystem::remove(tests::toPath(uri));
+            store->flush();
+            EXPECT_FALSE(std::filesystem::exists(tests::toPath(uri))) << "nothing has changed";
+            return found;
+        };
+        for (const char* name : {"b", "none"}) store->removeValue("a", name);
+        auto found = reopen();
+        EXPECT_FALSE(found->hasValue("a", "b"));
+        EXPECT_EQ(found->getInt("a/b", "c", 0) + found->getInt("a", "d", 0), 5);
+        EXPECT_THROW(found->removeValue("a", "d"), CReadOnlyError);
+        for (const char* section : {"none/none", "a"}) store->removeSection(section);
+        EXPECT_FALSE(reopen()->hasSection("a"));
+        store->removeSection("x/y");
+        found = reopen();
+        EXPECT_FALSE(found->hasSection("x/y"));
+        EXPECT_TRUE(found->hasValue("x", "y"));
+        store->removeSection("");
+        EXPECT_TRUE(reopen()->hasSection("")) << "as the root of the file";
+        EXPECT_FALSE(store->hasSection("x"));
+    }
 }
 
 TEST(ValueStore, files_AreReplacedAndNeverSpoiled) {
@@ -149,6 +182,8 @@ TEST(ValueStore, manager_OpensWhatItKnows) {
     EXPECT_FALSE(manager->openStore(tests::toURI(folder / "a.txt"), EStoreAccess::readWrite));
     EXPECT_FALSE(manager->openStore(make<CURI>("http://a/b.xml"), EStoreAccess::readWrite));
     EXPECT_TRUE(manager->openStore(tests::toURI(folder / "a.XML"), EStoreAccess::readWrite));
+    EXPECT_THROW(manager->openStore(nullptr, EStoreAccess::read), CInvalidArgError);
+    EXPECT_THROW(manager->addFactory(nullptr), CInvalidArgError);
     // The factory that was added first answers, until it is removed.
     const P<IURI> uri = make<CURI>("memory:a");
     std::vector<P<CMemoryFactory>> factories = {make<CMemoryFactory>(), make<CMemoryFactory>()};
@@ -156,7 +191,6 @@ TEST(ValueStore, manager_OpensWhatItKnows) {
     for (const auto& factory : factories) {
         const P<IValueStore> store = manager->openStore(uri, EStoreAccess::read);
         manager->removeFactory(factory);
-        ASSERT_TRUE(store);
         EXPECT_EQ(store, factory->m_store);
     }
     EXPECT_FALSE(manager->openStore(uri, EStoreAccess::read));

@@ -1,6 +1,8 @@
 #include "peru/Errors.h"
 #include "peru/streams/Base64Streams.h"
 #include "peru/streams/StringStreams.h"
+#include "peru/streams/posix/DiskStreams.h"
+#include "support/Files.h"
 #include "support/TempFolder.h"
 
 #include <gtest/gtest.h>
@@ -10,6 +12,7 @@
 namespace {
 
 using namespace peru;
+using namespace peru::posix;
 
 std::string encode(const std::string& bytes, size_t cut) {
     const P<CStringOutStream> text = make<CStringOutStream>();
@@ -49,17 +52,29 @@ TEST(Base64, AgreesWithThePeerInEveryCut) {
     }
 }
 
-TEST(Base64, RefusesOtherText) {
+TEST(Base64, RefusesOtherTextAndWhatIsPastTheEnd) {
     for (const char* text : {"QQ==", "QQ\n", "Q", "QUJDR", "Q-Q_", "\xC3\xA4"})
         EXPECT_THROW(decode(text, 100), CParseError) << text;
-}
+    const auto filter = make<CBase64InStream>(make<CStringInStream>(newString("QUJD")));
+    char byte = 0;
+    filter->skip(1);
+    filter->read(&byte, 1);
+    EXPECT_EQ(byte, 'B');
+    EXPECT_THROW(filter->skip(2), CEndOfStreamError);
 
-TEST(Base64, FinishedStreamTakesNoMore) {
+    const tests::CTempFolder folder;
+    const P<IURI> uri = tests::toURI(folder / "out");
+    const P<CBase64OutStream> filtered = make<CBase64OutStream>(make<CDiskOutStream>(uri, EOpenMode::create));
+    filtered->write("ABCD", 4);
+    EXPECT_TRUE(filtered->isAtEnd() && filtered->getURI()->equals(uri));
+    filtered->flush();
+    EXPECT_EQ(tests::readFile(folder / "out"), "QUJD");
+
     const P<CStringOutStream> text = make<CStringOutStream>();
-    const P<CBase64OutStream> filter = make<CBase64OutStream>(text);
-    filter->write("A", 1);
-    filter->finish();
-    EXPECT_THROW(filter->write("B", 1), CStreamClosedError);
+    const P<CBase64OutStream> finished = make<CBase64OutStream>(text);
+    finished->write("A", 1);
+    finished->finish();
+    EXPECT_THROW(finished->write("B", 1), CStreamClosedError);
     text->write("!", 1); // the target is still open
     EXPECT_EQ(CString::toStdString(text->getString()), "QQ!");
 }

@@ -1,4 +1,5 @@
 #include "peru/Errors.h"
+#include "peru/Rival.h"
 #include "peru/files/SystemCalls.h"
 #include "peru/streams/Base64Streams.h"
 #include "peru/streams/BufferedIOStream.h"
@@ -10,13 +11,9 @@
 #include "support/Files.h"
 #include "support/TempFolder.h"
 
-#include <atomic>
-#include <chrono>
-#include <cstring>
 #include <functional>
 #include <random>
 #include <sys/stat.h>
-#include <thread>
 #include <unistd.h>
 
 namespace {
@@ -41,7 +38,7 @@ void compareWithModel(const P<ISeekableIOStream>& stream, int64_t largest, unsig
     size_t marked = 0;
     for (int i = 0; i < 3000; ++i) {
         const size_t size = random() % 8 == 0 ? random() % static_cast<size_t>(largest) : random() % 64;
-        switch (random() % 7) {
+        switch (random() % 8) {
         case 0:
         case 1: {
             bytes.assign(size, '\0');
@@ -83,6 +80,13 @@ void compareWithModel(const P<ISeekableIOStream>& stream, int64_t largest, unsig
                 stream->setSize(static_cast<int64_t>(model.size()));
             }
             break;
+        case 7:
+            if (position + size <= model.size()) {
+                stream->skip(static_cast<int64_t>(size));
+                position += size;
+            } else {
+                EXPECT_THROW(stream->skip(static_cast<int64_t>(size)), CEndOfStreamError);
+            }
         }
         ASSERT_EQ(stream->getPosition(), static_cast<int64_t>(position)) << i;
         ASSERT_EQ(stream->getSize(), static_cast<int64_t>(model.size())) << i;
@@ -92,12 +96,52 @@ void compareWithModel(const P<ISeekableIOStream>& stream, int64_t largest, unsig
     ASSERT_EQ(readAll(*stream), model);
 }
 
+void compareReading(const P<ISeekableInStream>& stream, const std::string& model) {
+    std::mt19937 random(1);
+    size_t position = 0;
+    for (int i = 0; i < 1000; ++i) {
+        std::string bytes(random() % 20, '\0');
+        if (i % 3 == 0) {
+            position = random() % (model.size() + 10);
+            stream->seek(static_cast<int64_t>(position));
+        } else if (i % 3 == 1 && position + bytes.size() <= model.size()) {
+            stream->skip(std::ssize(bytes));
+            position += bytes.size();
+        } else {
+            bytes.resize(static_cast<size_t>(stream->readSome(bytes.data(), std::ssize(bytes))));
+            ASSERT_EQ(bytes, position < model.size() ? model.substr(position, bytes.size()) : "");
+            position += bytes.size();
+        }
+        ASSERT_EQ(stream->getPosition(), static_cast<int64_t>(position)) << i;
+        ASSERT_EQ(stream->getSize(), std::ssize(model)) << i;
+        ASSERT_EQ(stream->isAtEnd(), position >= model.size()) << i;
+    }
+}
+
 TEST(Streams, AgreeWithAByteArray) {
     const tests::CTempFolder folder;
     for (unsigned seed = 0; seed < 4; ++seed) {
+        std::optional<tests::CSystemCalls> interruptions;
+        if (seed % 2) interruptions.emplace(tests::interrupt);
         compareWithModel(make<CDiskIOStream>(toURI(folder / "file"), EOpenMode::create), 200000, seed);
+        interruptions.reset();
         compareWithModel(make<CMemoryIOStream>(), 5000, seed);
     }
+    const std::string letters = "ABCDEFGHIJKLMNOPQRSTUVWXYZ";
+    compareReading(make<CStringInStream>(newString(letters.c_str())), letters);
+    const P<CStringOutStream> out = make<CStringOutStream>();
+    const std::string many(200000, 'x');
+    EXPECT_EQ(copyStream(*make<CStringInStream>(newString(many.c_str())), *out), 200000);
+    EXPECT_TRUE(out->isAtEnd() && out->getPosition() == 200000 && text(out->getString()) == many);
+    out->reset();
+    EXPECT_TRUE(out->getString()->isEmpty());
+    const P<CDiskIOStream> sparse = make<CDiskIOStream>(toURI(folder / "sparse"), EOpenMode::create);
+    const int64_t far = (int64_t{5} << 32) + 3;
+    sparse->seek(far);
+    write(*sparse, "end");
+    EXPECT_EQ(sparse->getSize(), far + 3);
+    sparse->seek(far - 1);
+    EXPECT_EQ(readAll(*sparse), std::string("\0end", 4));
 }
 
 template <class Interface, class Operation>
@@ -133,33 +177,39 @@ TEST(Streams, RefuseEverythingOnceClosed) {
         expectRefusal<ISeekableStream>(stream, [](auto& s) { s.createMarker(); });
         expectRefusal<ISeekableOutStream>(stream, [](auto& s) { s.setSize(0); });
     }
-    const P<CDiskInStream> named = make<CDiskInStream>(uri);
-    named->close();
-    EXPECT_NE(errorOf<CStreamClosedError>([&] { named->seek(0); }).find(text(uri->getAsString())),
-              std::string::npos);
 }
 
-TEST(Streams, ShortReadNamesTheStream) {
+TEST(Streams, ErrorsNameTheStream) {
     const tests::CTempFolder folder;
     const P<IURI> uri = toURI(folder.write("file", "abc"));
     const P<CDiskInStream> disk = make<CDiskInStream>(uri);
     char bytes[4];
-    EXPECT_THROW(disk->skip(4), CEndOfStreamError);
+    for (const P<IInStream>& stream : std::vector<P<IInStream>>{
+             disk, make<CDiskIOStream>(uri, EOpenMode::open), make<CStringInStream>(newString("abc"))}) {
+        EXPECT_THROW(stream->skip(4), CEndOfStreamError);
+        EXPECT_THROW(stream->skip(-1), CInvalidArgError);
+        EXPECT_EQ(readAll(*stream), "abc");
+    }
+    for (const P<IOutStream>& stream : std::vector<P<IOutStream>>{
+             make<CDiskIOStream>(uri, EOpenMode::open), make<CMemoryIOStream>(), make<CStringOutStream>()})
+        EXPECT_THROW(stream->write(bytes, -1), CInvalidArgError);
+    disk->reset();
     EXPECT_EQ(errorOf<CEndOfStreamError>([&] { disk->read(bytes, 4); }),
               "Unexpected end of data stream (uri: '" + text(uri->getAsString()) + "').");
     EXPECT_EQ(errorOf<CEndOfStreamError>([&] { make<CStringInStream>(newString("abc"))->read(bytes, 4); }),
               "Unexpected end of data stream.");
     EXPECT_THROW(disk->readSome(bytes, -1), CInvalidArgError);
     EXPECT_THROW(disk->seek(-1), CInvalidArgError);
+    disk->close();
+    EXPECT_EQ(errorOf<CStreamClosedError>([&] { disk->seek(0); }),
+              "The stream has been closed (uri: '" + text(uri->getAsString()) + "').");
 }
 
 TEST(DiskStream, OpenModes) {
     const tests::CTempFolder folder;
     const auto file = folder / "file";
     const auto put = [&](EOpenMode mode, const std::string& bytes) {
-        const P<CDiskOutStream> stream = make<CDiskOutStream>(toURI(file), mode);
-        write(*stream, bytes);
-        stream->close();
+        write(*make<CDiskOutStream>(toURI(file), mode), bytes); // the destructor closes it
         return tests::readFile(file);
     };
     EXPECT_THROW(put(EOpenMode::open, "x"), CFileNotFoundError);
@@ -167,7 +217,9 @@ TEST(DiskStream, OpenModes) {
     EXPECT_THROW(put(EOpenMode::createNew, "x"), CStreamError);
     EXPECT_EQ(put(EOpenMode::open, "ab"), "ab345");
     EXPECT_EQ(put(EOpenMode::append, "6"), "ab3456");
-    EXPECT_EQ(put(EOpenMode::create, "x"), "x");
+    EXPECT_EQ(put(EOpenMode::create, "xyz"), "xyz");
+    make<CDiskOutStream>(toURI(file), EOpenMode::open)->setSize(1);
+    EXPECT_EQ(tests::readFile(file), "x");
 }
 
 TEST(DiskStream, WhatCannotBeOpenedSaysWhy) {
@@ -183,47 +235,7 @@ TEST(DiskStream, WhatCannotBeOpenedSaysWhy) {
         EXPECT_NE(error.find("Is a directory"), std::string::npos) << error;
         EXPECT_NE(error.find(folder.path().filename().string()), std::string::npos) << error;
     }
-    // As an ordinary user, even if the tests run as root.
-    ::chmod((folder / "file").c_str(), 0);
-    const bool root = ::geteuid() == 0;
-    ASSERT_EQ(root ? ::seteuid(65534) : 0, 0);
-    EXPECT_THROW(make<CDiskInStream>(toURI(folder / "file")), CFileAccessDeniedError);
-    EXPECT_EQ(root ? ::seteuid(0) : 0, 0);
-}
-
-TEST(DiskStream, FullDiskIsReported) {
-    const P<IURI> full = make<CURI>("file:///dev/full");
-    const std::string large(200000, 'x');
-    EXPECT_THROW(write(*make<CDiskOutStream>(full, EOpenMode::open), large), CStreamError);
-
-    const P<CDiskOutStream> flushed = make<CDiskOutStream>(full, EOpenMode::open);
-    write(*flushed, "x");
-    EXPECT_THROW(flushed->flush(), CStreamError);
-
-    const P<CDiskOutStream> closed = make<CDiskOutStream>(full, EOpenMode::open);
-    write(*closed, "x");
-    const std::string error = errorOf<CStreamError>([&] { closed->close(); });
-    EXPECT_NE(error.find("No space left on device"), std::string::npos) << error;
-    EXPECT_NE(error.find("file:///dev/full"), std::string::npos) << error;
-    closed->close(); // it is closed nevertheless
-
-    write(*make<CDiskOutStream>(full, EOpenMode::open), "x"); // the destructor ignores the error
-}
-
-TEST(DiskStream, PositionsGoBeyond32Bits) {
-    const tests::CTempFolder folder;
-    const P<CDiskIOStream> stream = make<CDiskIOStream>(toURI(folder / "sparse"), EOpenMode::create);
-    const int64_t far = (int64_t{5} << 32) + 3;
-    stream->seek(far);
-    write(*stream, "end");
-    EXPECT_EQ(stream->getSize(), far + 3);
-    stream->seek(far - 1);
-    EXPECT_EQ(readAll(*stream), std::string("\0end", 4));
-}
-
-// Opening must not wait for the other end of a FIFO either.
-TEST(DiskStream, RefusesWhatIsNoRegularFile) {
-    const tests::CTempFolder folder;
+    // Opening must not wait for the other end of a FIFO either.
     const auto pipe = folder / "pipe", socket = folder / "socket";
     ASSERT_EQ(::mkfifo(pipe.c_str(), 0600), 0);
     ASSERT_EQ(::mknod(socket.c_str(), S_IFSOCK | 0600, 0), 0);
@@ -235,6 +247,34 @@ TEST(DiskStream, RefusesWhatIsNoRegularFile) {
         EXPECT_EQ(errorOf<CStreamError>([&] { make<CDiskIOStream>(uri, EOpenMode::create); }), expected);
     }
     EXPECT_THROW(make<CDiskInStream>(make<CURI>("file:///dev/zero")), CStreamError);
+    // As an ordinary user, even if the tests run as root.
+    ::chmod((folder / "file").c_str(), 0);
+    const bool root = ::geteuid() == 0;
+    ASSERT_EQ(root ? ::seteuid(65534) : 0, 0);
+    EXPECT_THROW(make<CDiskInStream>(toURI(folder / "file")), CFileAccessDeniedError);
+    EXPECT_EQ(root ? ::seteuid(0) : 0, 0);
+}
+
+TEST(DiskStream, FullAndUnreadableFilesAreReported) {
+    const auto open = [] { return make<CDiskOutStream>(make<CURI>("file:///dev/full"), EOpenMode::open); };
+    EXPECT_THROW(write(*open(), std::string(200000, 'x')), CStreamError);
+    write(*open(), "x"); // the destructor ignores the error
+    const P<CDiskOutStream> stream = open();
+    write(*stream, "x");
+    EXPECT_THROW(stream->flush(), CStreamError);
+    const std::string error = errorOf<CStreamError>([&] { stream->close(); }); // tries again
+    EXPECT_NE(error.find("No space left on device"), std::string::npos) << error;
+    EXPECT_NE(error.find("file:///dev/full"), std::string::npos) << error;
+    stream->close(); // it is closed nevertheless
+    const P<CDiskOutStream> device = make<CDiskOutStream>(make<CURI>("file:///dev/null"), EOpenMode::open);
+    device->seek(0);
+    device->flush(); // a device cannot be synchronised
+    EXPECT_THROW(device->seek(1), CStreamError);
+    EXPECT_THROW(device->setSize(1), CStreamError);
+    char byte;
+    const P<CDiskInStream> unreadable = make<CDiskInStream>(make<CURI>("file:///proc/self/mem"));
+    EXPECT_EQ(errorOf<CStreamError>([&] { unreadable->readSome(&byte, 1); }),
+              "The file 'file:///proc/self/mem' could not be read: Input/output error.");
 }
 
 TEST(DiskStream, FlushReachesTheDiskAndReportsItsErrors) {
@@ -243,7 +283,7 @@ TEST(DiskStream, FlushReachesTheDiskAndReportsItsErrors) {
     write(*stream, "abc");
     int synced = 0;
     const tests::CSystemCalls watch([&](const std::string& call, int) {
-        EXPECT_EQ(call, "fdatasync");
+        if (call != "fdatasync") return 0;
         EXPECT_EQ(tests::readFile(folder / "file"), "abc");
         return ++synced == 1 ? 0 : EIO;
     });
@@ -252,69 +292,61 @@ TEST(DiskStream, FlushReachesTheDiskAndReportsItsErrors) {
     EXPECT_THROW(stream->flush(), CStreamError);
 }
 
-// Supports one URI and returns its own name as content.
-class CNamedFactory : public CStreamFactory {
+// Opens "res:" URIs by a function.
+class CTestFactory : public CStreamFactory {
 public:
-    CNamedFactory(const char* uri, const char* name) : m_uri(uri), m_name(name) {}
+    using Function = std::function<P<IInStream>(const P<IStreamFactory>& self)>;
+    explicit CTestFactory(Function open) : m_open(std::move(open)) {}
     P<IInStream> tryGetInStream(const P<IURI>& uri) override {
-        if (!uri->getAsString()->equals(m_uri)) return nullptr;
-        return make<CStringInStream>(newString(m_name));
+        return uri->getScheme()->equals("res") ? m_open(P<IStreamFactory>::share(this)) : nullptr;
     }
 
 private:
-    const char* m_uri;
-    const char* m_name;
+    Function m_open;
 };
+
+// Returns its own name as content.
+P<IStreamFactory> makeFactory(const char* name) {
+    return make<CTestFactory>([name](const auto&) { return make<CStringInStream>(newString(name)); });
+}
 
 TEST(StreamManager, AsksInTheOrderOfRegistration) {
     const P<CStreamManager> manager = make<CStreamManager>();
-    const P<IStreamFactory> first = make<CNamedFactory>("res:x", "first");
+    const P<IStreamFactory> first = makeFactory("first");
     const P<IURI> uri = make<CURI>("res:x");
     manager->addFactory(first);
-    for (int i = 0; i < 20; ++i) manager->addFactory(make<CNamedFactory>("res:x", "later"));
+    for (int i = 0; i < 20; ++i) manager->addFactory(makeFactory("later"));
     EXPECT_EQ(readAll(*manager->getInStream(uri)), "first");
     manager->removeFactory(first);
     EXPECT_EQ(readAll(*manager->getInStream(uri)), "later");
     EXPECT_FALSE(manager->tryGetSeekableInStream(uri)); // supported, but not as a seekable stream
 }
 
-// Opens nothing itself, but runs a function when it is asked.
-class CCallingFactory : public CStreamFactory {
-public:
-    explicit CCallingFactory(std::function<void(P<IStreamFactory>)> function)
-        : m_function(std::move(function)) {}
-    P<IInStream> tryGetInStream(const P<IURI>&) override {
-        m_function(P<IStreamFactory>::share(this));
-        return nullptr;
-    }
-
-private:
-    std::function<void(P<IStreamFactory>)> m_function;
-};
-
-TEST(StreamManager, LetsAFactoryChangeTheListWhileItIsAsked) {
+TEST(StreamManager, LetsOnlyTheFactoryThatItAsksChangeTheList) {
     const P<CStreamManager> manager = make<CStreamManager>();
-    manager->addFactory(make<CCallingFactory>([&](const P<IStreamFactory>& self) {
+    tests::CRivals rivals;
+    manager->addFactory(make<CTestFactory>([&](const P<IStreamFactory>& self) {
+        rivals.expectBlocked({[&, self] { manager->removeFactory(self); }});
         manager->removeFactory(self);
-        for (int i = 0; i < 20; ++i) manager->addFactory(make<CNamedFactory>("res:x", "brought"));
+        for (int i = 0; i < 20; ++i) manager->addFactory(makeFactory("brought"));
+        return nullptr;
     }));
     EXPECT_EQ(readAll(*manager->getInStream(make<CURI>("res:x"))), "brought");
 }
 
-TEST(StreamManager, LocksOutOtherThreadsWhileItAsks) {
-    const P<CStreamManager> manager = make<CStreamManager>();
-    std::thread other;
-    std::atomic<bool> changed{false};
-    manager->addFactory(make<CCallingFactory>([&](const P<IStreamFactory>& self) {
-        other = std::thread([&, self] {
-            manager->removeFactory(self);
-            changed = true;
-        });
-        std::this_thread::sleep_for(std::chrono::milliseconds(30));
-        EXPECT_FALSE(changed);
-    }));
-    EXPECT_FALSE(manager->tryGetInStream(make<CURI>("res:x")));
-    other.join();
+TEST(StreamManager, OpensFilesAsEveryKind) {
+    const tests::CTempFolder folder;
+    const P<IURI> uri = toURI(folder.write("file", "abc"));
+    const P<IStreamManager> manager = getStreamManager();
+    const std::function<P<IStreamBase>(const P<IURI>&)> kinds[] = {
+        [&](auto& u) { return manager->getResetableInStream(u); },
+        [&](auto& u) { return manager->getResetableOutStream(u, EOpenMode::open); },
+        [&](auto& u) { return manager->getResetableIOStream(u, EOpenMode::open); },
+        [&](auto& u) { return manager->getSeekableOutStream(u, EOpenMode::open); }};
+    for (const auto& open : kinds) {
+        EXPECT_TRUE(open(uri)->getURI()->equals(uri));
+        EXPECT_THROW(open(make<CURI>("unknown:x")), CURITypeNotSupportedError);
+    }
 }
 
 TEST(StreamManager, TellsMissingFilesFromUnknownKinds) {

@@ -7,11 +7,7 @@
 using namespace peru;
 
 TEST(LocalizedFormat, FillsTranslationsInTheirOrderAndNeverFails) {
-    struct SCase {
-        const char* translation;
-        const char* expected;
-    };
-    for (const SCase& c : std::initializer_list<SCase>{
+    for (const auto& [translation, expected] : std::initializer_list<std::pair<const char*, const char*>>{
              {"", "7 of 0.50 in a"},
              {"%d/%.1f/%s", "7/0.5/a"},
              {"%3$s: %1$03d%% %2$g", "a: 007% 0.5"},
@@ -28,9 +24,9 @@ TEST(LocalizedFormat, FillsTranslationsInTheirOrderAndNeverFails) {
              {"%99999999999$d", "7 of 0.50 in a"},
              {"%", "7 of 0.50 in a"},
          }) {
-        getStringLocalizer()->setText("test.format", newString(c.translation));
+        getStringLocalizer()->setText("test.format", newString(translation));
         const P<IString> text = format({"test.format", "%d of %.2f in %s"}, 7, 0.5, newString("a"));
-        EXPECT_EQ(tests::text(text), c.expected) << c.translation;
+        EXPECT_EQ(tests::text(text), expected) << translation;
     }
     getStringLocalizer()->clear();
     EXPECT_EQ(tests::text(format({"test.format", "plain"})), "plain");

@@ -26,28 +26,21 @@ std::vector<std::string> list(const P<IEnum>& parts) {
 } // namespace
 
 TEST(StringTokenizer, Tokens_MayBeEmptyOrSkipped) {
-    struct {
-        const char* text;
-        std::vector<std::string> all, filled;
-    } cases[] = {
-        {"", {}, {}},
-        {"a", {"a"}, {"a"}},
-        {"a b,c", {"a", "b", "c"}, {"a", "b", "c"}},
-        {" a,,b ", {"", "a", "", "b", ""}, {"a", "b"}},
-        {",", {"", ""}, {}},
-    };
+    using Tokens = std::vector<std::string>;
+    const std::tuple<const char*, Tokens, Tokens> cases[] = {{"", {}, {}},
+                                                             {"a", {"a"}, {"a"}},
+                                                             {"a b,c", {"a", "b", "c"}, {"a", "b", "c"}},
+                                                             {" a,,b ", {"", "a", "", "b", ""}, {"a", "b"}},
+                                                             {",", {"", ""}, {}}};
     EXPECT_EQ(list(make<CStringTokenizerEnum>(nullptr, ",")).size(), 0u);
-    for (auto& c : cases) {
-        EXPECT_EQ(list(make<CStringTokenizerEnum>(newString(c.text), ", ")), c.all) << c.text;
-        EXPECT_EQ(list(make<CStringTokenizerEnum>(newString(c.text), u", ", true)), c.filled) << c.text;
+    for (const auto& [text, all, filled] : cases) {
+        EXPECT_EQ(list(make<CStringTokenizerEnum>(newString(text), ", ")), all) << text;
+        EXPECT_EQ(list(make<CStringTokenizerEnum>(newString(text), u", ", true)), filled) << text;
     }
 }
 
 TEST(StringTokenizer, Lines_EndInThreeWays) {
-    struct {
-        const char16_t* text;
-        std::vector<std::string> lines;
-    } cases[] = {
+    const std::pair<const char16_t*, std::vector<std::string>> cases[] = {
         {u"", {}},
         {u"a", {"a"}},
         {u"a\n", {"a"}},
@@ -55,13 +48,12 @@ TEST(StringTokenizer, Lines_EndInThreeWays) {
         {u"\n", {""}},
         {u"\r\r\n\n", {"", "", ""}},
         {u"a\n\rb", {"a", "", "b"}},
-        {u"\u00E9\n\u20AC", {"\xC3\xA9", "\xE2\x82\xAC"}},
-    };
+        {u"\u00E9\n\u20AC", {"\xC3\xA9", "\xE2\x82\xAC"}}};
     // Lines of bytes that strings cannot decode are lines.
     EXPECT_EQ(list(make<CStringLineTokenizerEnum>(make<CUTF8String>("\xFF\r\xFE\n\xFD"))),
               (std::vector<std::string>{"\xFF", "\xFE", "\xFD"}));
-    for (auto& c : cases) {
-        EXPECT_EQ(list(make<CStringLineTokenizerEnum>(newString(c.text))), c.lines);
-        EXPECT_EQ(list(make<CStringLineTokenizerEnum>(newString(c.text)->toUTF8String())), c.lines);
+    for (const auto& [text, lines] : cases) {
+        EXPECT_EQ(list(make<CStringLineTokenizerEnum>(newString(text))), lines);
+        EXPECT_EQ(list(make<CStringLineTokenizerEnum>(newString(text)->toUTF8String())), lines);
     }
 }

@@ -57,12 +57,9 @@ TEST(Pathes, ComeBackByteForByteThroughTheTextOfTheURI) {
 }
 
 TEST(Pathes, RefuseWhatIsNotOnThisMachine) {
-    EXPECT_EQ(toPath("http://host/a.mp3"), "");
-    EXPECT_EQ(toPath("file://server/share/a.mp3"), "");
-    EXPECT_EQ(toPath("//server/share"), "");
-    EXPECT_EQ(toPath("winresicon:shell32.dll,-1"), "");
-    EXPECT_EQ(toPath("file:///a%00b"), "");
-    EXPECT_EQ(toPath(""), "");
+    for (const char* elsewhere : {"http://host/a.mp3", "file://server/share/a.mp3", "//server/share",
+                                  "winresicon:shell32.dll,-1", "file:///a%00b", ""})
+        EXPECT_EQ(toPath(elsewhere), "") << elsewhere;
     EXPECT_EQ(tests::toPath(nullptr), "");
     EXPECT_EQ(toPath("file://localhost/a"), "/a");
     EXPECT_EQ(toPath("FILE:///a"), "/a");
@@ -79,19 +76,18 @@ TEST(Pathes, AreTerminatedAndShownAsValidText) {
 }
 
 TEST(Pathes, JoinAndSplitAtTheLastSeparator) {
-    struct SCase {
-        const char *folder, *name, *joined;
-    };
-    for (const SCase& c : {SCase{"/a", "b", "/a/b"}, SCase{"/a/", "b", "/a/b"}, SCase{"", "b", "b"},
-                           SCase{"/", "b", "/b"}, SCase{"/a", "/b", "/a/b"}, SCase{"/a/", "", "/a/"}}) {
-        EXPECT_EQ(text(getPathes()->join(c.folder, c.name)), c.joined);
+    using SCase = std::array<const char*, 3>;
+    for (const auto& [folder, name, joined] :
+         {SCase{"/a", "b", "/a/b"}, SCase{"/a/", "b", "/a/b"}, SCase{"", "b", "b"}, SCase{"/", "b", "/b"},
+          SCase{"/a", "/b", "/a/b"}, SCase{"/a/", "", "/a/"}}) {
+        EXPECT_EQ(text(getPathes()->join(folder, name)), joined);
     }
-    for (const SCase& c : {SCase{"/a/", "b", "/a/b"}, SCase{"", "b", "b"}, SCase{"/a/b/", "", "/a/b/"},
-                           SCase{"/", "b", "/b"}, SCase{"", "", ""}}) {
-        P<IString> folder, name;
-        getPathes()->split(c.joined, folder, name);
-        EXPECT_EQ(text(folder), c.folder);
-        EXPECT_EQ(text(name), c.name);
+    for (const auto& [folder, name, joined] :
+         {SCase{"/a/", "b", "/a/b"}, SCase{"", "b", "b"}, SCase{"/a/b/", "", "/a/b/"}, SCase{"/", "b", "/b"},
+          SCase{"", "", ""}}) {
+        P<IString> front, back;
+        getPathes()->split(joined, front, back);
+        EXPECT_EQ(text(front) + "|" + text(back), std::string(folder) + "|" + name);
     }
 }
 

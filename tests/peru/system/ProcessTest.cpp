@@ -2,6 +2,7 @@
 #include "peru/system/IDynamicLibrary.h"
 #include "peru/system/ISystem.h"
 #include "peru/system/ITimeManager.h"
+#include "peru/threads/ISignal.h"
 #include "peru/uri/URI.h"
 #include "support/Files.h"
 #include "support/TempFolder.h"
@@ -9,8 +10,8 @@
 #include <csignal>
 #include <fcntl.h>
 #include <functional>
+#include <sys/resource.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
 
@@ -55,6 +56,7 @@ TEST(Process, Child_InheritsTheStandardFilesOnly) {
     int open = ::open("/dev/null", O_RDONLY);
     ASSERT_GE(fcntl(open, F_DUPFD, 100), 100);
     EXPECT_EQ(runShell("ls /proc/$$/fd > \"$1\"", {(folder / "out").string()}), 0);
+    EXPECT_NE(tests::readFile(folder / "out").find("\n2\n"), std::string::npos);
     EXPECT_EQ(tests::readFile(folder / "out").find("100"), std::string::npos);
     close(100);
     close(open);
@@ -73,7 +75,8 @@ TEST(Process, Child_StartsWithDefaultSignals) {
 }
 
 TEST(Process, Wait_TimesOutAndTerminateEndsIt) {
-    P<IProcess> process = startShell("exec sleep 1000");
+    P<IProcess> process = getProcessManager()->start(toURI("/bin/sleep"), {"1000"_s}, 15);
+    EXPECT_GE(getpriority(PRIO_PROCESS, static_cast<id_t>(process->getId())), 15);
     int exitCode = -2;
     EXPECT_FALSE(process->wait(0, exitCode));
     EXPECT_FALSE(process->wait(20, exitCode));
@@ -84,6 +87,23 @@ TEST(Process, Wait_TimesOutAndTerminateEndsIt) {
     EXPECT_TRUE(process->wait(0, exitCode)) << "a second wait answers the same";
     EXPECT_EQ(exitCode, 128 + SIGTERM);
     process->terminate(); // the process no longer exists
+}
+
+TEST(Process, EndAction_RunsAtTheEndOrAtOnceAfterIt) {
+    class CEndAction : public CObject, public IAction {
+    public:
+        void run() override { m_hasRun->set(); }
+        const P<ISignal> m_hasRun = getSignalFactory()->createSignal();
+    };
+    const auto replaced = make<CEndAction>(), inTime = make<CEndAction>(), late = make<CEndAction>();
+    P<IProcess> process = startShell("exec sleep 1000");
+    process->setEndAction(replaced);
+    process->setEndAction(inTime);
+    process->kill();
+    EXPECT_TRUE(inTime->m_hasRun->wait(kLong));
+    process->setEndAction(late);
+    EXPECT_TRUE(late->m_hasRun->wait(kLong));
+    EXPECT_FALSE(replaced->m_hasRun->wait(0));
 }
 
 TEST(Process, EndedChildOfADroppedHandle_IsCollected) {
@@ -142,10 +162,7 @@ TEST(DynamicLibrary, FailureTellsFileAndReason) {
     tests::CTempFolder folder;
     std::filesystem::path text = folder.write("text \xc3\xa4.so", "not a library");
     ASSERT_EQ(mkfifo((folder / "pipe").c_str(), 0600), 0);
-    struct SCase {
-        std::function<void()> load;
-        std::string name, reason;
-    } cases[] = {
+    const std::tuple<std::function<void()>, std::string, std::string> cases[] = {
         {[&] { getDynamicLibraryLoader()->load(toURI(text)); }, text.string(), "file too short"},
         {[&] { getDynamicLibraryLoader()->load(toURI(folder / "no.so")); }, (folder / "no.so").string(),
          "No such file"},
@@ -156,10 +173,10 @@ TEST(DynamicLibrary, FailureTellsFileAndReason) {
         // A relative file is looked up in the current folder, never in the loader's search path.
         {[] { getDynamicLibraryLoader()->load(toURI("libm.so.6")); }, "./libm.so.6", "No such file"},
     };
-    for (const SCase& one : cases) {
-        const std::string description = errorOf<CError>(one.load);
-        EXPECT_NE(description.find(one.name), std::string::npos) << description;
-        EXPECT_NE(description.find(one.reason), std::string::npos) << description;
+    for (const auto& [load, name, reason] : cases) {
+        const std::string description = errorOf<CError>(load);
+        EXPECT_NE(description.find(name), std::string::npos) << description;
+        EXPECT_NE(description.find(reason), std::string::npos) << description;
     }
 }
 

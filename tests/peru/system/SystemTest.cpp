@@ -1,17 +1,22 @@
 #include "peru/system/ISystem.h"
 
+#include "peru/files/SystemCalls.h"
 #include "support/Environment.h"
 #include "support/Files.h"
 #include "support/TempFolder.h"
 
+#include "peru/system/ITimeManager.h"
 #include "peru/uri/URI.h"
 
+#include <chrono>
 #include <csignal>
 #include <dlfcn.h>
 #include <fcntl.h>
+#include <pwd.h>
 #include <set>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 using namespace peru;
 using tests::CEnvironment;
@@ -25,22 +30,23 @@ namespace fs = std::filesystem;
 
 TEST(System, FindsTheUsersFoldersByTheirRules) {
     CEnvironment home("HOME", "/home/user");
-    struct SCase {
-        const char* variable;
-        P<IURI> (ISystem::*get)();
-        const char* fallback;
-    };
-    for (const SCase& c : {SCase{"XDG_DATA_HOME", &ISystem::getDataFolder, "/home/user/.local/share/"},
-                           SCase{"XDG_CONFIG_HOME", &ISystem::getConfigurationFolder, "/home/user/.config/"},
-                           SCase{"TMPDIR", &ISystem::getTemporaryFolder, "/tmp/"}}) {
-        auto get = [&] { return toPath((getSystem().get()->*c.get)()); };
-        CEnvironment set(c.variable, "/some/where");
+    using SCase = std::tuple<const char*, P<IURI> (ISystem::*)(), const char*>;
+    for (const auto& [variable, getter, fallback] :
+         {SCase{"XDG_DATA_HOME", &ISystem::getDataFolder, "/home/user/.local/share/"},
+          SCase{"XDG_CONFIG_HOME", &ISystem::getConfigurationFolder, "/home/user/.config/"},
+          SCase{"TMPDIR", &ISystem::getTemporaryFolder, "/tmp/"}}) {
+        auto get = [method = getter] { return toPath((getSystem().get()->*method)()); };
+        CEnvironment set(variable, "/some/where");
         EXPECT_EQ(get(), "/some/where/");
         for (const char* value : {static_cast<const char*>(nullptr), "", "not/absolute"}) {
-            CEnvironment unusable(c.variable, value);
-            EXPECT_EQ(get(), c.fallback);
+            CEnvironment unusable(variable, value);
+            EXPECT_EQ(get(), fallback);
         }
     }
+    const CEnvironment data("XDG_DATA_HOME", nullptr), homeless("HOME", "relative");
+    const passwd* user = ::getpwuid(::getuid());
+    EXPECT_EQ(toPath(getSystem()->getDataFolder()),
+              (fs::path(user ? user->pw_dir : "/") / ".local/share/").string());
 }
 
 TEST(System, SearchesTheListThenTheLibraryThenTheInstallation) {
@@ -114,10 +120,37 @@ TEST(System, NeverReplacesAndLeavesNoHalfCopy) {
     EXPECT_NE(tests::readFile(folder / "c").find("VmRSS"), std::string::npos);
 }
 
+TEST(System, CopiesAndMovesWhateverTheSystemCallsDo) {
+    const CTempFolder folder;
+    const std::string bytes = tests::readFile("/proc/self/exe").substr(0, 1'000'001);
+    const P<IURI> source = toURI(folder.write("a", bytes)), copy = toURI(folder / "b");
+    tests::failEach(
+        {{"", 0, true},
+         {"read", EIO, false},
+         {"write", ENOSPC, false},
+         {"fchmod", EPERM, true},
+         {"fchmod", ENOTSUP, true},
+         {"fchmod", EIO, false},
+         {"futimens", EIO, false}},
+        [&] { getSystem()->copyFile(source, copy); },
+        [&](bool done) {
+            EXPECT_TRUE(!done || tests::readFile(folder / "b") == bytes);
+            EXPECT_EQ(fs::remove(folder / "b"), done);
+        });
+    // A file system that cannot rename without replacing.
+    folder.write("b", "old");
+    for (const int error : {EINVAL, ENOSYS}) {
+        const tests::CSystemCalls calls([&](auto& call, int) { return call == "renameat2" ? error : 0; });
+        EXPECT_THROW(getSystem()->moveFile(source, copy), CFileError);
+        EXPECT_EQ(tests::readFile(folder / "b"), "old");
+        getSystem()->moveFile(copy, toURI(folder / "c"));
+        getSystem()->moveFile(toURI(folder / "c"), copy);
+    }
+}
+
 TEST(System, KeepsTheOldFileWhereTheNewOneDoesNotFit) {
     CTempFolder folder;
     const fs::path old = folder.write("old", "precious");
-    fs::create_directory(folder / "folder");
     const std::string large(1 << 20, 'x');
     const auto size = static_cast<int64_t>(large.size());
     struct rlimit limit;
@@ -130,15 +163,28 @@ TEST(System, KeepsTheOldFileWhereTheNewOneDoesNotFit) {
     std::signal(SIGXFSZ, before);
     EXPECT_NE(error.find("old' could not be written: File too large"), std::string::npos) << error;
     EXPECT_EQ(tests::readFile(old), "precious");
-    EXPECT_THROW(getSystem()->replaceFile(toURI(folder / "folder"), "x", 1), CFileError);
     EXPECT_THROW(getSystem()->replaceFile(toURI(folder / "nowhere" / "x"), "x", 1), CFileError);
-    EXPECT_THROW(getSystem()->replaceFile(make<CURI>("http://x/y"), "x", 1), CException);
-    EXPECT_EQ(countEntries(folder.path()), 2u);
+    EXPECT_EQ(countEntries(folder.path()), 1u);
 }
 
 TEST(System, TellsTheVersionOfALibrary) {
     std::string version = text(getSystem()->getLibraryVersion("libgio-2.0.so.0"));
     EXPECT_TRUE(version.starts_with("0.")) << version;
     EXPECT_EQ(text(getSystem()->getLibraryVersion("libc.so.6")), "6");
-    EXPECT_EQ(text(getSystem()->getLibraryVersion("libnone.so.1")), "");
+    // A copy has the version in its inner name only.
+    const CTempFolder folder;
+    Dl_info math;
+    ASSERT_NE(dladdr(dlsym(RTLD_DEFAULT, "cos"), &math), 0);
+    fs::copy_file(fs::canonical(math.dli_fname), folder / "copy.so");
+    EXPECT_EQ(text(getSystem()->getLibraryVersion(CString::fromUTF8((folder / "copy.so").string()))), "6");
+    for (const char* none : {"", "libnone.so.1", "linux-vdso.so.1"})
+        EXPECT_EQ(text(getSystem()->getLibraryVersion(none)), "");
+}
+
+TEST(System, TimeAgreesWithTheStandardLibrary) {
+    const auto now = [] {
+        return std::chrono::system_clock::now().time_since_epoch() / std::chrono::milliseconds(1);
+    };
+    const int64_t before = now(), time = getTimeManager()->getTime();
+    EXPECT_TRUE(before <= time && time <= now()) << time;
 }

@@ -251,6 +251,18 @@ TEST(Thread, FailedStart_ThrowsAndLeaksNothing) {
     }
     EXPECT_EQ(living, 0);
 }
+
+TEST(Thread, DroppedHandles_LeaveNoStacks) {
+    const auto countPages = [] { return std::stoll(tests::readFile("/proc/self/statm")); };
+    const long long before = countPages();
+    constexpr int kThreads = 1000;
+    for (int i = 0; i < kThreads; ++i) {
+        P<ISignal> done = getSignalFactory()->createSignal();
+        runThread([done] { done->set(); });
+        done->wait();
+    }
+    EXPECT_LT(countPages() - before, kThreads * 256) << "half of the smallest default size";
+}
 #endif
 
 TEST(ThreadLocalStorage, EachThread_HasAValueThatDiesWithIt) {
@@ -270,6 +282,14 @@ TEST(ThreadLocalStorage, EachThread_HasAValueThatDiesWithIt) {
     EXPECT_EQ(living, 1);
     slot->set(nullptr);
     EXPECT_EQ(living, 0);
+}
+
+TEST(ThreadLocalStorage, SimpleSlot_HoldsAPointerForEachThread) {
+    const P<ISimpleThreadLocalStorage> slot = getSimpleThreadLocalStorageFactory()->createStorage();
+    int here = 0;
+    slot->set(&here);
+    runThread([&] { EXPECT_EQ(slot->get(), nullptr); })->wait();
+    EXPECT_EQ(slot->get(), &here);
 }
 
 TEST(ThreadLocalStorage, DyingSlot_ReleasesTheValuesOfAllThreads) {

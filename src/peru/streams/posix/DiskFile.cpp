@@ -82,7 +82,7 @@ CDiskFile::CDiskFile(const P<IURI>& uri, CFileHandle handle, bool regular)
 CDiskFile::~CDiskFile() {
     try {
         if (m_handle.isOpen()) close();
-    } catch (const CException&) {
+    } catch (...) {
     }
 }
 

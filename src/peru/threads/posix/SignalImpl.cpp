@@ -23,15 +23,11 @@ private:
 };
 
 timespec getDeadline(uint32_t milliseconds) {
-    timespec deadline;
-    clock_gettime(CLOCK_MONOTONIC, &deadline);
-    deadline.tv_sec += milliseconds / 1000;
-    deadline.tv_nsec += milliseconds % 1000 * 1000000L;
-    if (deadline.tv_nsec >= 1000000000L) {
-        ++deadline.tv_sec;
-        deadline.tv_nsec -= 1000000000L;
-    }
-    return deadline;
+    constexpr int64_t kSecond = 1'000'000'000;
+    timespec now;
+    clock_gettime(CLOCK_MONOTONIC, &now);
+    const int64_t end = now.tv_sec * kSecond + now.tv_nsec + milliseconds * (kSecond / 1000);
+    return {static_cast<time_t>(end / kSecond), static_cast<long>(end % kSecond)};
 }
 
 } // namespace
