@@ -112,7 +112,7 @@ void writeReport(CSafeWriter& out, size_t signalIndex, const siginfo_t& signal, 
     out.number(threadCount);
     out.text("\nSignal: ");
     out.text(kSignalNames[signalIndex]);
-    out.text(", code ");
+    out.text(signal.si_code < 0 ? ", code -" : ", code "); // below 0 if a process has sent it
     out.number(static_cast<uint64_t>(signal.si_code < 0 ? -signal.si_code : signal.si_code));
     out.text(", address 0x");
     out.number(reinterpret_cast<uintptr_t>(signal.si_addr), 16);

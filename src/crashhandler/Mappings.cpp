@@ -26,6 +26,7 @@ SMapping parseMapping(const char* line) {
     mapping.start = parseHex(line);
     ++line; // "-"
     mapping.end = parseHex(line);
+    mapping.isReadable = line[1] == 'r';
     line += 6; // " r-xp "
     mapping.offset = parseHex(line);
     if (const char* path = std::strchr(line, '/')) std::strncpy(mapping.path, path, sizeof mapping.path - 1);

@@ -13,6 +13,7 @@ struct SMapping {
     uintptr_t start = 0;
     uintptr_t end = 0;
     uint64_t offset = 0;
+    bool isReadable = false;
     char path[512] = {}; // empty for anonymous memory
 };
 

@@ -203,16 +203,28 @@ SContext convertContext(const ucontext_t& from) {
     return to;
 }
 
-SMemory writeStack(CSafeWriter& out, uintptr_t stackPointer, uintptr_t stackLimit) {
-    constexpr uintptr_t kRedZone = 128;
-    SMapping stack;
-    // After an overflow the stack pointer is in the guard area below the stack.
-    constexpr uintptr_t kGuard = 1024 * 1024;
+// The first readable mapping that ends above the address and starts less than 1 MiB above it.
+SMapping findMapping(uintptr_t address) {
+    constexpr uintptr_t kMostGuard = 1024 * 1024;
+    SMapping found;
     forEachMapping([&](const SMapping& mapping) {
-        if (stack.end == 0 && mapping.start < stackPointer + kGuard && stackPointer < mapping.end)
-            stack = mapping;
+        if (found.end == 0 && mapping.isReadable && mapping.start < address + kMostGuard &&
+            address < mapping.end)
+            found = mapping;
     });
+    return found;
+}
+
+// After an overflow the stack pointer is below the stack: in the guard area, which for all threads but the
+// first is a mapping of its own, or in the alternate stack, which often lies directly below that area.
+SMemory writeStack(CSafeWriter& out, uintptr_t stackPointer, const stack_t& alternate, uintptr_t stackLimit) {
+    constexpr uintptr_t kRedZone = 128;
+    SMapping stack = findMapping(stackPointer);
     if (stack.end == 0) return {};
+    const uintptr_t alternateStart = reinterpret_cast<uintptr_t>(alternate.ss_sp);
+    const uintptr_t alternateEnd = alternateStart + alternate.ss_size;
+    if (stackPointer >= alternateStart && stackPointer < alternateEnd)
+        stack.end = std::max(stack.end, findMapping(alternateEnd).end);
     if (stackPointer < stackLimit && stackLimit < stack.end) stack.end = stackLimit;
     const uintptr_t start = std::max(stack.start, stackPointer - kRedZone);
     const size_t size = std::min<size_t>(stack.end - start, kMaxStack);
@@ -268,7 +280,7 @@ void writeMiniDump(CSafeWriter& out, const siginfo_t& signal, const SThreadState
         const SContext context = convertContext(threads[i].context);
         record.context = {sizeof context, out.getPosition()};
         out.write(&context, sizeof context);
-        record.stack = writeStack(out, context.rsp, stackLimit);
+        record.stack = writeStack(out, context.rsp, threads[i].context.uc_stack, stackLimit);
     }
     streams[0] = {kThreadList, writeList(out, g_threadRecords, threadCount)};
 

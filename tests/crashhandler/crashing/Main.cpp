@@ -7,8 +7,10 @@
 #include <csetjmp>
 #include <csignal>
 #include <cstdint>
+#include <cstdio>
 #include <cstdlib>
 #include <dlfcn.h>
+#include <exception>
 #include <stdexcept>
 #include <string>
 #include <thread>
@@ -20,7 +22,8 @@ namespace {
 volatile uintptr_t g_address = 16; // not mapped, and opaque to the compiler
 
 void crash() {
-    *reinterpret_cast<volatile int*>(g_address) = 1;
+    volatile char text[] = "on the crashing stack";
+    *reinterpret_cast<volatile int*>(g_address) = text[0];
 }
 
 int recurse(int depth) {
@@ -65,6 +68,10 @@ int main(int argc, char** argv) {
     const std::string report = folder + "/report.txt", dump = folder + "/dump";
     const auto wide = [](const std::string& text) { return std::u16string(text.begin(), text.end()); };
     if (kind == "recover") std::signal(SIGSEGV, [](int) { siglongjmp(g_start, 1); });
+    std::set_terminate([] {
+        std::fputs("terminated", stderr);
+        std::abort();
+    });
     void* library = ::dlopen(LIBRARY, RTLD_NOW | RTLD_LOCAL);
     if (!library) return 3;
     const auto install = reinterpret_cast<decltype(&TONEWRIGHT_Init_Crashhandler)>(
@@ -90,5 +97,6 @@ int main(int argc, char** argv) {
     if (kind == "throw") throw std::runtime_error("nobody catches this");
     if (kind == "overflow") return recurse(1);
     if (kind == "abort") std::abort();
+    if (kind.starts_with("kill")) ::kill(::getpid(), std::stoi(kind.substr(4)));
     return 0;
 }
