@@ -8,8 +8,13 @@
 #include "sonora2/context/LastFailure.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/context/SonoraError.h"
+#include "sonora2/media/IClippingPrevention.h"
 #include "sonora2/media/IDiscardable.h"
+#include "sonora2/media/IFloatSamples.h"
+#include "sonora2/media/IMediaDescription.h"
+#include "sonora2/media/ISalvage.h"
 #include "sonora2/plugins/PluginHandler.h"
+#include "support/Children.h"
 #include "support/Environment.h"
 #include "support/FakeMedia.h"
 #include "support/Files.h"
@@ -17,29 +22,11 @@
 #include "support/TempFolder.h"
 
 #include <chrono>
-#include <fstream>
 #include <functional>
 #include <sstream>
-#include <sys/wait.h>
 #include <thread>
 
 namespace tests {
-
-// The children of a process, by the parents of all processes.
-inline std::vector<pid_t> listChildren(pid_t parent) {
-    std::vector<pid_t> children;
-    for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
-        const std::string text = readFile(entry.path() / "stat");
-        const size_t end = text.rfind(") ");
-        if (end == std::string::npos) continue;
-        std::istringstream fields(text.substr(end + 2));
-        char state = 0;
-        pid_t id = 0;
-        fields >> state >> id;
-        if (id == parent) children.push_back(std::atoi(text.c_str()));
-    }
-    return children;
-}
 
 // Waits for what other processes and threads do, but not forever.
 inline bool waitUntil(const std::function<bool()>& condition) {
@@ -48,6 +35,47 @@ inline bool waitUntil(const std::function<bool()>& condition) {
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
     return condition();
+}
+
+template <class... Values> std::string joined(const Values&... values) {
+    std::ostringstream text;
+    ((text << values << ' '), ...);
+    return text.str();
+}
+
+// What a video with sound answers when it is asked, and then what its optional interfaces answer.
+inline std::string describe(const P<sonora2::common::ISource>& source) {
+    using namespace sonora2::common;
+    const peru::P<IVideoSource> video(source);
+    const peru::P<IAudioSource> audio(source);
+    const auto infos = audio->getAudioStreamInfos();
+    std::string answers =
+        joined(source->isOpened(), source->isEOF(), source->getDuration(), source->getStartTime(),
+               text(source->getURI()->getAsString()), text(source->getPluginName()), video->getWidth(),
+               video->getHeight(), video->peekNextPictureTimestamp(), video->getPixelAspectNum(),
+               video->getPixelAspectDen(), video->getFrameDuration(), video->getFrameRateNum(),
+               video->getFrameRateDen(), audio->getSampleRate(), audio->getChannelCount(),
+               audio->getBytesPerSample(), infos ? infos->getStreamInfo(0)->getStreamIndex() : -1);
+    if (const auto floats = peru::interfaceCast<IFloatSamples>(source))
+        answers += joined(floats->canUseFloat(4), floats->canUseFloat(8));
+    if (const auto media = peru::interfaceCast<IMediaDescription>(source))
+        answers +=
+            joined(text(media->getCodecName()), media->getBitRate(), media->getOwnSampleRate(),
+                   media->getOwnChannelCount(), media->getOwnBytesPerSample(), text(media->takeWarnings()));
+    if (const auto salvage = peru::interfaceCast<ISalvage>(source)) answers += joined(salvage->getSalvage());
+    if (const auto clipping = peru::interfaceCast<IClippingPrevention>(source))
+        answers += joined(clipping->getClippingPrevention());
+    return answers;
+}
+inline std::string describe(const P<sonora2::common::IFormat>& format) {
+    using namespace sonora2::common;
+    const peru::P<IVideoFormat> video(format);
+    const peru::P<IAudioFormat> audio(format);
+    const auto params = video->getVideoParameter();
+    return joined(format->isOpened(), text(format->getURI()->getAsString()), text(format->getPluginName()),
+                  format->getEstimatedSizeBytes(2.5), video->getWantedImageType(), params.nSize,
+                  params.nSampleRate, std::string(params.video, params.video + sizeof params.video),
+                  audio->getSampleRate(), audio->getChannelCount(), audio->getBytesPerSample());
 }
 
 class Boxed : public testing::Test {
@@ -61,6 +89,17 @@ protected:
     void setMemory(int mebibytes) {
         m_context->setParameter(sonora2::common::kBoxedParameterKey, sonora2::common::kBoxedMemoryParameter,
                                 peru::CString::fromUTF8(std::to_string(mebibytes)));
+    }
+
+    template <class Job> static std::string messageOf(Job job) {
+        sonora2::common::clearLastFailure();
+        try {
+            job();
+        } catch (const sonora2::common::CSonoraError& error) {
+            const std::string message = text(error.getDescription());
+            return message.empty() ? "an error without a text" : message;
+        }
+        return {};
     }
 
     // Run a whole job and return the message of its error; empty if there was none. Errors of other types
@@ -107,16 +146,8 @@ protected:
             source->open();
             source->getBufferStatus();
             source->setMaxSize(100, 100);
-            source->getWidth();
-            source->getHeight();
-            source->peekNextPictureTimestamp();
+            describe(P<sonora2::common::ISource>(source));
             source->getNextPicture();
-            source->getPixelAspectNum();
-            source->getPixelAspectDen();
-            source->getFrameDuration();
-            source->getFrameRateNum();
-            source->getFrameRateDen();
-            source->getAudioStreamInfos();
             source->setAudioStream(0);
             source->skipToTime(0.5);
             readAll(source);
@@ -132,9 +163,7 @@ protected:
             format->open();
             format->setAudioQuality(0.5);
             format->setAudioBitRate(128'000, 0, 0);
-            format->getEstimatedSizeBytes(1.0);
-            format->getVideoParameter();
-            format->getWantedImageType();
+            describe(P<sonora2::common::IFormat>(format));
             format->writeFrame(nullptr);
             format->writeAudioChunk(m_chunk);
             format->close();
@@ -150,7 +179,7 @@ protected:
         std::string samples;
         EXPECT_EQ(decode("healthy.faulty", &samples), "");
         EXPECT_TRUE(samples == makeExpected());
-        EXPECT_TRUE(waitUntil([] { return listChildren(::getpid()).empty(); }));
+        EXPECT_TRUE(waitUntil([] { return listChildren().empty(); }));
         EXPECT_EQ(countEntries(m_temporary.path()), 0u);
         EXPECT_TRUE(waitUntil([&] { return countSockets() == 0; }));
     }
@@ -202,16 +231,6 @@ private:
     static sonora2::common::CSonoraError failure() {
         return sonora2::common::CSonoraError(
             peru::CString::fromUTF8(sonora2::common::getLastFailure().message));
-    }
-    template <class Job> static std::string messageOf(Job job) {
-        sonora2::common::clearLastFailure();
-        try {
-            job();
-        } catch (const sonora2::common::CSonoraError& error) {
-            const std::string message = text(error.getDescription());
-            return message.empty() ? "an error without a text" : message;
-        }
-        return {};
     }
 };
 

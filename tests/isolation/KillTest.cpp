@@ -43,14 +43,14 @@ private:
     void work(unsigned seed, unsigned jobTime) {
         std::mt19937 random(seed);
         while (!m_stop) {
-            const std::vector<pid_t> children = listChildren(::getpid());
+            const std::vector<pid_t> children = listChildren();
             if (children.empty()) {
                 std::this_thread::sleep_for(std::chrono::microseconds(200));
                 continue;
             }
             std::this_thread::sleep_for(std::chrono::microseconds(random() % jobTime));
             for (const pid_t child : children) ::kill(child, SIGKILL);
-            while (!m_stop && listChildren(::getpid()) == children) std::this_thread::yield();
+            while (!m_stop && listChildren() == children) std::this_thread::yield();
         }
     }
 
@@ -147,7 +147,7 @@ TEST_F(Boxed, ManyJobsRunAtOnce) {
     expectHealthy();
 }
 
-// Memory and descriptors stay level.
+// Memory, descriptors and threads stay level.
 TEST_F(Boxed, ManyJobsRunInARow) {
     const auto countPages = [] {
         std::istringstream fields(readFile("/proc/self/statm"));
@@ -157,13 +157,15 @@ TEST_F(Boxed, ManyJobsRunInARow) {
     };
     const int jobs = getNumber("TONEWRIGHT_TEST_JOBS", 25);
     m_frames = 3'000;
-    size_t descriptors = 0;
+    const auto countThreads = [] { return countEntries("/proc/self/task"); };
+    size_t descriptors = 0, threads = 0;
     int64_t pages = 0;
     for (int i = -10; i < jobs; ++i) { // caches fill first
-        if (i == 0) descriptors = countDescriptors(), pages = countPages();
+        if (i == 0) descriptors = countDescriptors(), threads = countThreads(), pages = countPages();
         ASSERT_EQ(i % 2 ? decode("x.faulty") : encode(m_out / "x.faulty"), "") << i;
     }
     EXPECT_TRUE(waitUntil([&] { return countDescriptors() <= descriptors; }));
+    EXPECT_TRUE(waitUntil([&] { return countThreads() <= threads; }));
     EXPECT_LT(countPages() - pages, kMostGrowth) << "memory grows";
     expectHealthy();
 }

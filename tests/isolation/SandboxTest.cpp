@@ -35,22 +35,29 @@ using slave::SSandbox;
 
 constexpr int kEntryFailed = 254;
 
-// The result of `attempt`, 0 or an errno value, in a process that is confined before it makes the attempt;
-// negative if a signal has ended that process.
-int inside(const SSandbox& sandbox, const std::function<int()>& attempt) {
+// The result of `body` in another process, a number from 0 to 253; negative if a signal has ended that
+// process.
+int inChild(const std::function<int()>& body) {
     const pid_t child = ::fork();
     if (child == 0) {
         ::alarm(60);
         try {
-            enterSandbox(sandbox);
+            ::_exit(body());
         } catch (const std::exception&) {
             ::_exit(kEntryFailed);
         }
-        ::_exit(attempt());
     }
     int status = 0;
     ::waitpid(child, &status, 0);
     return WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
+}
+
+// The result of `attempt`, 0 or an errno value, in a process that is confined before it makes the attempt.
+int inside(const SSandbox& sandbox, const std::function<int()>& attempt) {
+    return inChild([&] {
+        enterSandbox(sandbox);
+        return attempt();
+    });
 }
 
 int errorIf(bool failed) {
@@ -205,9 +212,7 @@ TEST_F(Sandbox, GrantsADeviceAndNotItsFolder) {
 }
 
 TEST_F(Sandbox, ConfinesThreadsThatAreRunning) {
-    const pid_t child = ::fork();
-    if (child == 0) {
-        ::alarm(60);
+    const auto countRefusals = [&] {
         std::atomic<bool> confined{false};
         std::atomic<int> refusals{0};
         std::vector<std::thread> threads;
@@ -225,19 +230,14 @@ TEST_F(Sandbox, ConfinesThreadsThatAreRunning) {
         confined = true;
         starter.join();
         for (std::thread& thread : threads) thread.join();
-        ::_exit(refusals);
-    }
-    int status = 0;
-    ::waitpid(child, &status, 0);
-    EXPECT_TRUE(WIFEXITED(status));
-    EXPECT_EQ(WEXITSTATUS(status), 6);
+        return refusals.load();
+    };
+    EXPECT_EQ(inChild(countRefusals), 6);
 }
 
 // As a kernel without Landlock and filters would.
 TEST_F(Sandbox, ReportsWhatTheKernelLacks) {
-    const pid_t child = ::fork();
-    if (child == 0) {
-        ::alarm(60);
+    const auto countLacking = [&] {
         sock_filter code[] = {BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
                               BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_landlock_create_ruleset, 1, 0),
                               BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_seccomp, 0, 1),
@@ -245,20 +245,13 @@ TEST_F(Sandbox, ReportsWhatTheKernelLacks) {
                               BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW)};
         const sock_fprog program{std::size(code), code};
         ::prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0);
-        if (::prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) != 0) ::_exit(kEntryFailed);
-        try {
-            const std::vector<std::string> lacking = enterSandbox(reading());
-            rlimit limit{};
-            ::getrlimit(RLIMIT_CORE, &limit);
-            ::_exit(static_cast<int>(lacking.size()) + (limit.rlim_max == 0 ? 0 : 100));
-        } catch (const std::exception&) {
-            ::_exit(kEntryFailed);
-        }
-    }
-    int status = 0;
-    ::waitpid(child, &status, 0);
-    EXPECT_TRUE(WIFEXITED(status));
-    EXPECT_EQ(WEXITSTATUS(status), 2);
+        if (::prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) != 0) return kEntryFailed;
+        const std::vector<std::string> lacking = enterSandbox(reading());
+        rlimit limit{};
+        ::getrlimit(RLIMIT_CORE, &limit);
+        return static_cast<int>(lacking.size()) + (limit.rlim_max == 0 ? 0 : 100);
+    };
+    EXPECT_EQ(inChild(countLacking), 2);
 }
 
 TEST_F(Sandbox, LimitsMemoryDescriptorsAndCoreDumps) {

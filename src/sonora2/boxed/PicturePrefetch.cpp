@@ -76,8 +76,10 @@ void CPicturePrefetch::work() {
         m_moreWanted->wait(kIdleWait);
         if (m_stop->wait(0)) return;
         bool isFull;
+        uint64_t generation;
         {
             const peru::CMutexLock lock(m_mutex);
+            generation = m_generation;
             isFull = m_pictures.size() >= kMostPictures || m_isAtEnd || m_failure;
             // Otherwise a request that arrives just as the wait ends would be lost.
             if (isFull) m_moreWanted->reset();
@@ -85,7 +87,6 @@ void CPicturePrefetch::work() {
         if (isFull) continue;
         P<peru::CException> failure;
         try {
-            uint64_t generation = 0;
             P<ISonoraPicture> picture;
             const auto locked = [&] {
                 const peru::CMutexLock lock(m_mutex);
@@ -102,7 +103,7 @@ void CPicturePrefetch::work() {
         }
         if (!failure) continue;
         const peru::CMutexLock lock(m_mutex);
-        m_failure = failure;
+        if (generation == m_generation) m_failure = failure; // not one from before a change of the position
     }
 }
 

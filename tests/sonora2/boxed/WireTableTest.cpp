@@ -1,4 +1,5 @@
 // Requests and answers of all remote procedures, and the objects in them, byte for byte.
+#include "peru/remote/RemoteException.h"
 #include "peru/remote/RemoteStreamClient.h"
 #include "peru/strings/HexData.h"
 #include "sonora2/boxed/AudioRun.h"
@@ -36,10 +37,12 @@ struct SRow {
     std::string form;
 };
 
-template <class... Procs> std::vector<SRow> rows(std::initializer_list<const char*> forms) {
+// The forms are separated by semicolons.
+template <class... Procs> std::vector<SRow> rows(const char* forms) {
     const P<peru::CRemoteProc> procs[] = {make<Procs>()...};
     std::vector<SRow> all;
-    for (const char* form : forms) all.push_back({procs[all.size()], form});
+    std::istringstream list(forms);
+    for (std::string form; std::getline(list, form, ';');) all.push_back({procs[all.size()], form});
     EXPECT_EQ(sizeof...(Procs), all.size());
     return all;
 }
@@ -135,10 +138,10 @@ TEST(WireTable, OfThePlugin) {
     for (const SRow& row : rows<Plugin::getLogFunction, Plugin::getPluginNameFunction,
                                 Plugin::getValidTypesFunction, Plugin::getValidExtensionsFunction,
                                 Plugin::tryCreateSourceFunction, Plugin::tryCreateFormatFunction>(
-             {"function getLog =t", "function getPluginName =t", "function getValidTypes =i",
-              "function getValidExtensions nTypes:i =o",
-              "function tryCreateSource uri:u nTypes:i bDontCloseAfterTesting:b pParams:S =o",
-              "function tryCreateFormat uri:u nTypes:i bDontCloseAfterTesting:b pParams:F =o"}))
+             "function getLog =t;function getPluginName =t;function getValidTypes =i;"
+             "function getValidExtensions nTypes:i =o;"
+             "function tryCreateSource uri:u nTypes:i bDontCloseAfterTesting:b pParams:S =o;"
+             "function tryCreateFormat uri:u nTypes:i bDontCloseAfterTesting:b pParams:F =o"))
         expectForm(row);
 }
 
@@ -156,36 +159,18 @@ TEST(WireTable, OfSources) {
               Source::getNextAudioChunkFunction, Source::getSampleRateFunction,
               Source::getChannelCountFunction, Source::getBytesPerSampleFunction,
               Source::getNextAudioChunksFunction, getStateFunction>(
-             {"function getLog =t",
-              "function isOpened =b",
-              "void open",
-              "void close",
-              "void skipToTime fTimestamp:d",
-              "function getDuration =d",
-              "function getBufferStatus =i",
-              "function isEOF =b",
-              "void setStartTime fStartTime:d",
-              "function getStartTime =d",
-              "function getURI =u",
-              "function getPluginName =t",
-              "void setMaxSize nWidth:i nHeight:i",
-              "function getWidth =i",
-              "function getHeight =i",
-              "function peekNextPictureTimestamp =d",
-              "function getNextPicture =o",
-              "function getPixelAspectNum =i",
-              "function getPixelAspectDen =i",
-              "function getFrameDuration =d",
-              "function getFrameRateNum =i",
-              "function getFrameRateDen =i",
-              "function getAudioStreamInfos =o",
-              "void setAudioStream nAudioIndex:i",
-              "function getNextAudioChunk =o",
-              "function getSampleRate =i",
-              "function getChannelCount =i",
-              "function getBytesPerSample =i",
-              "function getNextAudioChunks nMaxBytes:i =o",
-              "function getState =o"}))
+             "function getLog =t;function isOpened =b;void open;void close;"
+             "void skipToTime fTimestamp:d;function getDuration =d;function getBufferStatus =i;"
+             "function isEOF =b;void setStartTime fStartTime:d;function getStartTime =d;"
+             "function getURI =u;function getPluginName =t;void setMaxSize nWidth:i nHeight:i;"
+             "function getWidth =i;function getHeight =i;function peekNextPictureTimestamp =d;"
+             "function getNextPicture =o;function getPixelAspectNum =i;"
+             "function getPixelAspectDen =i;function getFrameDuration =d;"
+             "function getFrameRateNum =i;function getFrameRateDen =i;"
+             "function getAudioStreamInfos =o;void setAudioStream nAudioIndex:i;"
+             "function getNextAudioChunk =o;function getSampleRate =i;function getChannelCount =i;"
+             "function getBytesPerSample =i;function getNextAudioChunks nMaxBytes:i =o;"
+             "function getState =o"))
         expectForm(row);
 }
 
@@ -197,12 +182,12 @@ TEST(WireTable, OfFormats) {
               Format::getSampleRateFunction, Format::getChannelCountFunction,
               Format::getBytesPerSampleFunction, Format::setAudioQualityProc, Format::setAudioBitRateProc,
               Format::writeAudioChunkProc>(
-             {"function getLog =t", "function isOpened =b", "void open", "void close", "function getURI =u",
-              "function getPluginName =t", "function getEstimatedSizeBytes fDuration:d =l",
-              "function getVideoParameter =F", "void writeFrame pPicture:o", "function getWantedImageType =i",
-              "function getSampleRate =i", "function getChannelCount =i", "function getBytesPerSample =i",
-              "void setAudioQuality fQuality:d", "void setAudioBitRate nNominal:i nMin:i nMax:i",
-              "void writeAudioChunk pAudioChunk:o"}))
+             "function getLog =t;function isOpened =b;void open;void close;function getURI =u;"
+             "function getPluginName =t;function getEstimatedSizeBytes fDuration:d =l;"
+             "function getVideoParameter =F;void writeFrame pPicture:o;"
+             "function getWantedImageType =i;function getSampleRate =i;function getChannelCount =i;"
+             "function getBytesPerSample =i;void setAudioQuality fQuality:d;"
+             "void setAudioBitRate nNominal:i nMin:i nMax:i;void writeAudioChunk pAudioChunk:o"))
         expectForm(row);
 }
 
@@ -212,12 +197,12 @@ TEST(WireTable, OfOptionalInterfaces) {
               Facets::getSalvageFunction, Facets::setClippingPreventionFunction,
               Facets::getClippingPreventionFunction, Facets::getMediaDescriptionFunction,
               Facets::setDeliveredFormatFunction, Facets::takeWarningsFunction, Facets::discardFunction>(
-             {"function canUseFloat nBytesPerSample:i =b", "function useFloat nBytesPerSample:i =b",
-              "function setSalvage bSalvage:b =b", "function getSalvage =b",
-              "function setClippingPrevention bPrevent:b =b", "function getClippingPrevention =b",
-              "function getMediaDescription =o",
-              "function setDeliveredFormat nSampleRate:i nChannelCount:i nBytesPerSample:i =b",
-              "function takeWarnings =t", "function discard =b"}))
+             "function canUseFloat nBytesPerSample:i =b;function useFloat nBytesPerSample:i =b;"
+             "function setSalvage bSalvage:b =b;function getSalvage =b;"
+             "function setClippingPrevention bPrevent:b =b;function getClippingPrevention =b;"
+             "function getMediaDescription =o;"
+             "function setDeliveredFormat nSampleRate:i nChannelCount:i nBytesPerSample:i =b;"
+             "function takeWarnings =t;function discard =b"))
         expectForm(row);
 }
 
@@ -225,19 +210,24 @@ TEST(WireTable, OfOptionalInterfaces) {
 TEST(WireTable, OfObjects) {
     const P<peru::IMemoryManager> memory = make<peru::CMemoryManager>();
     const auto expectObject = [](const P<peru::ISerializable>& object, const std::string& bytes) {
-        deserialise(object, bytes);
+        for (int i = 0; i < 2; ++i) deserialise(object, bytes); // replaces what is there
         EXPECT_EQ(bytes, serialise(object));
     };
     expectObject(make<CRemoteCreated>(), "");
     expectObject(make<CPluginExtensions>(), hex("02000000") + wire("wav") + wire("w64"));
-    expectObject(make<sonora2::audio::CAudioStreamInfos>(), hex("02000000 01000000") + wire("Main") +
-                                                                wire("de") + hex("07000000") + wire("") +
-                                                                wire(""));
+    const auto infos = make<sonora2::audio::CAudioStreamInfos>();
+    expectObject(infos, hex("02000000 01000000") + wire("Main") + wire("de") + hex("07000000") + wire("") +
+                            wire(""));
+    EXPECT_EQ(7, infos->getStreamInfo(1)->getStreamIndex());
     const auto run = make<sonora2::audio::CAudioRun>(memory);
-    expectObject(run, hex("02000000 01 000000000000F83F 03000000 616263 00 01 000000000000F83F") +
+    expectObject(run, hex("03000000 01 000000000000F83F 03000000 616263 01 000000000000E03F 00000000 00"
+                          "01 000000000000F83F") +
                           wire("broken") + wire("log"));
+    EXPECT_TRUE(run->isEOF && run->duration == 1.5 && run->chunks.at(0)->getTimestamp() == 1.5);
     EXPECT_EQ("abc", bytesOf(run->chunks.at(0)));
     EXPECT_EQ("broken", CString::toStdString(run->failure));
+    // More chunks than a run has, each of one byte.
+    EXPECT_THROW(deserialise(run, hex("41000000") + std::string(100, '\0')), peru::CRemoteException);
     const auto state = make<CRemoteMediaState>();
     expectObject(state, hex("01 00 43000000 000000000000F83F 000000000000E03F 80BB0000 02000000 03000000 "
                             "05000000") +

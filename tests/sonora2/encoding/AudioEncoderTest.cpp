@@ -119,6 +119,9 @@ TEST_F(AudioEncoder, RefusesAReaderThatContradictsItself) {
     source->eofAnswers = {false, true, false};
     EXPECT_EQ(tests::errorOf([&] { encoder->encode(); }),
               "CAudioEncoder: AudioChunk=NULL but SampleReader hat samples!");
+    source->eofAnswers = {false, true, true, true};
+    encoder->encode();
+    EXPECT_EQ(format->written, "");
 }
 
 TEST_F(AudioEncoder, HoldsNoReferenceAndLetsListenersLeaveDuringACall) {

@@ -4,7 +4,7 @@
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/plugins/BuildId.h"
 #include "sonora2/plugins/PluginHandler.h"
-#include "support/Files.h"
+#include "support/LogLines.h"
 #include "support/Process.h"
 #include "support/TempFolder.h"
 
@@ -14,7 +14,6 @@ namespace {
 
 using namespace sonora2::common;
 using namespace tests;
-using peru::CString;
 
 constexpr const char* kLibrary = TEST_PLUGINS "/testplugin_good.so";
 
@@ -50,14 +49,6 @@ TEST(PluginDescription, BuildIdIsTheLinkers) {
     EXPECT_EQ(getBuildId(folder.write("text", "no library")), "");
 }
 
-class CLinesLog : public peru::CObject, public ILogManager {
-public:
-    void log(int32_t, const P<peru::IString>& text) override { lines.push_back(CString::toStdString(text)); }
-    void logException(const peru::CException& e) override { log(0, e.getDescription()); }
-
-    std::vector<std::string> lines;
-};
-
 // A context with one plug-in, whose library has a path of its own.
 class DescribedPlugin : public testing::Test {
 protected:
@@ -79,7 +70,7 @@ protected:
     CTempFolder folder;
     const std::filesystem::path library = folder / "testplugin_good.so";
     P<ISonoraContext> context = peru::make<sonora2::audio::CSonoraContextAudio>();
-    P<CLinesLog> log = peru::make<CLinesLog>();
+    P<CLogLines> log = peru::make<CLogLines>();
 };
 
 TEST_F(DescribedPlugin, IsLoadedWithItsFirstMediumAndThenAnswersItself) {
@@ -87,6 +78,7 @@ TEST_F(DescribedPlugin, IsLoadedWithItsFirstMediumAndThenAnswersItself) {
     const auto handler = peru::make<CPluginHandler>(context);
     ASSERT_EQ(handler->getPluginCount(), 1);
     EXPECT_EQ(handler->getValidExtensions(kAudioSource)->getCount(), 2);
+    EXPECT_EQ(handler->getPlugin(0)->getValidTypes(), 18);
     EXPECT_FALSE(isLoaded());
     EXPECT_THAT(log->lines, testing::IsEmpty());
 
@@ -95,6 +87,7 @@ TEST_F(DescribedPlugin, IsLoadedWithItsFirstMediumAndThenAnswersItself) {
     EXPECT_THAT(log->lines,
                 testing::ElementsAre("the description of plugin testplugin_good does not match its library"));
     EXPECT_EQ(handler->getValidExtensions(kAudioSource)->getCount(), 1);
+    EXPECT_NE(handler->getPlugin(0)->getValidTypes(), 18);
 }
 
 TEST_F(DescribedPlugin, ForeignDescription_DoesNotCount) {

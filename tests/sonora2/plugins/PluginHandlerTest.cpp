@@ -1,16 +1,17 @@
 #include "sonora2/plugins/PluginHandler.h"
 
+#include "sonora2/context/LastFailure.h"
 #include "sonora2/context/SonoraContextAudio.h"
 #include "sonora2/context/SonoraError.h"
 #include "support/Environment.h"
 #include "support/FakeMedia.h"
 #include "support/Files.h"
+#include "support/LogLines.h"
 #include "support/TempFolder.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <mutex>
 #include <string>
 #include <thread>
 #include <vector>
@@ -27,20 +28,6 @@ using peru::P;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-class CMemoryLog : public peru::CObject, public ILogManager {
-public:
-    void log(int32_t, const P<IString>& text) override {
-        std::scoped_lock lock(m_mutex);
-        texts.push_back(CString::toStdString(text));
-    }
-    void logException(const peru::CException& e) override { log(0, e.getDescription()); }
-
-    std::vector<std::string> texts;
-
-private:
-    std::mutex m_mutex;
-};
-
 P<IURI> uri(const std::string& text) {
     return make<peru::CURI>(CString::fromUTF8(text));
 }
@@ -55,7 +42,7 @@ protected:
 
     P<CPluginHandler> makeHandler(const P<IPluginPreference>& preference = nullptr) {
         P<CPluginHandler> handler = make<CPluginHandler>(context, false, "", preference);
-        log->texts.clear();
+        log->lines.clear();
         return handler;
     }
     static P<CFakePlugin> addPlugin(CPluginHandler& handler, const char* name,
@@ -71,7 +58,7 @@ protected:
         return handler.createAudioSource(uri("file:///x/" + name), 44100, 2, 2, keepOpened);
     }
 
-    P<CMemoryLog> log = make<CMemoryLog>();
+    P<CLogLines> log = make<CLogLines>();
     P<ISonoraContext> context = make<sonora2::audio::CSonoraContextAudio>();
 };
 
@@ -88,6 +75,7 @@ TEST_F(PluginHandler, FailingCandidates_AreLoggedAndTheNextOneGetsItsTurn) {
     };
     addFailing("throwing", [] { throw CSonoraError("broken header"); });
     addFailing("odd", [] { throw 42; });
+    addFailing("foreign", [] { throw std::runtime_error("of another library"); });
     addPlugin(*handler, "closed", {"tst"})->makeSource = [](auto&&...) {
         SFakeSource script;
         script.staysClosed = true;
@@ -103,58 +91,85 @@ TEST_F(PluginHandler, FailingCandidates_AreLoggedAndTheNextOneGetsItsTurn) {
     EXPECT_EQ(good->mask, 2);
     EXPECT_EQ(late->sourceCalls, 0);
     EXPECT_THAT(
-        log->texts,
+        log->lines,
         ElementsAre("tried to open file:///x/a%20b.Tst with plugin throwing.\nOpening failed: Error - "
                     "broken header",
                     "tried to open file:///x/a%20b.Tst with plugin odd.\nOpening failed: unknown "
+                    "exception",
+                    "tried to open file:///x/a%20b.Tst with plugin foreign.\nOpening failed: unknown "
                     "exception"));
     source.reset();
     EXPECT_EQ(CFakeSource::s_alive, 0) << "failed candidates are released";
 }
 
 TEST_F(PluginHandler, LookupKey_IsTheExtensionWithoutSuffixAndPoint) {
-    struct SCase {
-        const char* suffix;
-        const char* name;
-        bool found;
-    };
     P<CPluginHandler> handler = makeHandler();
     addPlugin(*handler, "p", {"tst"});
-    for (const SCase& c : std::initializer_list<SCase>{{"", "a.TST", true},
-                                                       {"", "a.b.tst", true},
-                                                       {"", "a", false},
-                                                       {"", "a.", false},
-                                                       {"", ".tst", false},
-                                                       {"", "tst", false},
-                                                       {"", "a.tstx", false},
-                                                       {".part", "a.tst.PART", true},
-                                                       {".part", "a.tst", true},
-                                                       {".part", "a.part", false},
-                                                       {"_x", "a._xtst", false},
-                                                       {" (1)", "a.tst%20(1)", true},
-                                                       {"a.tst", "a.tst", false}}) {
-        handler->setURISuffix(c.suffix);
-        EXPECT_EQ(static_cast<bool>(open(*handler, c.name)), c.found) << c.name << " with " << c.suffix;
+    const std::tuple<const char*, const char*, bool> cases[] = {
+        {"", "a.TST", true},        {"", "a.b.tst", true},         {"", "a", false},
+        {"", "a.", false},          {"", ".tst", false},           {"", "tst", false},
+        {"", "a.tstx", false},      {".part", "a.tst.PART", true}, {".part", "a.tst", true},
+        {".part", "a.part", false}, {"_x", "a._xtst", false},      {" (1)", "a.tst%20(1)", true},
+        {"a.tst", "a.tst", false},
+    };
+    for (const auto& [suffix, name, found] : cases) {
+        handler->setURISuffix(suffix);
+        EXPECT_EQ(static_cast<bool>(open(*handler, name)), found) << name << " with " << suffix;
     }
 }
 
 TEST_F(PluginHandler, AcceptanceTest_LeavesTheSourceAsWanted) {
-    struct SCase {
-        bool verify, keepOpened, opened;
-        int opens;
-    };
-    for (const SCase& c : std::initializer_list<SCase>{{true, true, true, 1},
-                                                       {true, false, false, 1},
-                                                       {false, true, false, 0},
-                                                       {false, false, false, 0}}) {
+    const std::tuple<bool, bool, bool, int> cases[] = {
+        {true, true, true, 1}, {true, false, false, 1}, {false, true, false, 0}, {false, false, false, 0}};
+    for (const auto& [verify, keepOpened, opened, opens] : cases) {
         P<CPluginHandler> handler = makeHandler();
         addPlugin(*handler, "p", {"tst"});
-        handler->setVerifyByOpening(c.verify);
-        P<CFakeSource> source(open(*handler, "a.tst", c.keepOpened));
+        handler->setVerifyByOpening(verify);
+        P<CFakeSource> source(open(*handler, "a.tst", keepOpened));
         ASSERT_TRUE(source);
-        EXPECT_EQ(source->isOpened(), c.opened) << c.verify << c.keepOpened;
-        EXPECT_EQ(source->opens, c.opens) << c.verify << c.keepOpened;
+        EXPECT_EQ(source->isOpened(), opened) << verify << keepOpened;
+        EXPECT_EQ(source->opens, opens) << verify << keepOpened;
+        EXPECT_EQ(handler->getVerifyByOpening(), verify);
+        // By the plug-in itself.
+        addPlugin(*handler, "opening", {"opn"})->makeSource = [](auto&&...) {
+            const auto made = make<CFakeSource>(SFakeSource());
+            made->open();
+            return made;
+        };
+        EXPECT_EQ(open(*handler, "a.opn", keepOpened)->isOpened(), opened);
     }
+}
+
+// A plug-in that declines gives no reason, unlike the file's own format.
+TEST_F(PluginHandler, Refusal_IsExplainedByTheOwnFormat) {
+    SFakeSource own{.channels = 1};
+    P<CPluginHandler> handler = makeHandler();
+    P<CFakePlugin> plugin = addPlugin(*handler, "p", {"tst"});
+    plugin->makeSource = [&](const P<IURI>&, const ISonoraPlugin::SSourceParams& params) -> P<ISource> {
+        return params.nSampleRate > 0 ? nullptr : make<CFakeSource>(own);
+    };
+    plugin->makeFormat = [](auto&&...) { return nullptr; };
+    const auto explain = [&] {
+        clearLastFailure();
+        handler->setURISuffix(".part");
+        EXPECT_FALSE(open(*handler, "a%20b.tst.part"));
+        EXPECT_EQ(getLastFailure().uri, "file:///x/a%20b.tst.part");
+        EXPECT_EQ(CFakeSource::s_alive, 0);
+        return getLastFailure().message;
+    };
+    EXPECT_EQ(explain(), "a b.tst (1000 Hz, 1 channels, 2 bytes per sample) cannot be converted to 44100 Hz, "
+                         "2 channels, 2 bytes per sample");
+    own.channels = 5;
+    EXPECT_EQ(explain(), "a b.tst has 5 channels, which cannot be converted to 2");
+    own.onOpen = [] { throw CSonoraError("broken header"); };
+    EXPECT_EQ(explain(), "a b.tst: broken header");
+    own.onOpen = [] { throw 42; };
+    EXPECT_EQ(explain(), "a b.tst cannot be read as 44100 Hz, 2 channels, 2 bytes per sample");
+    EXPECT_FALSE(handler->createAudioFormat(uri("file:///a.tst"), 48000, 1, 3));
+    EXPECT_EQ(getLastFailure().message,
+              "No plug-in writes a.tst with 48000 Hz, 1 channels, 3 bytes per sample");
+    EXPECT_FALSE(handler->createVideoFormat(uri("file:///a.tst"), nullptr));
+    EXPECT_EQ(plugin->mask, 8);
 }
 
 TEST_F(PluginHandler, ParameterRecord_IsTakenByItsSizeAndMustBeComplete) {
@@ -240,102 +255,11 @@ TEST_F(PluginHandler, Formats_AreAcceptedUnopened) {
     EXPECT_EQ(plugin->mask, 16);
     EXPECT_EQ(format->params.nSize, 116);
     EXPECT_EQ(format->params.nBytesPerSample, 3);
-    EXPECT_THAT(log->texts, ElementsAre("tried to create file:///a.tst with plugin broken.\nOpening failed: "
+    EXPECT_THAT(log->lines, ElementsAre("tried to create file:///a.tst with plugin broken.\nOpening failed: "
                                         "Error - no encoder"));
     EXPECT_TRUE(handler->createFormat(uri("file:///a.tst"), nullptr));
     EXPECT_EQ(plugin->mask, 24);
     EXPECT_TRUE(handler->createObject(uri("file:///a.tst"), nullptr));
-}
-
-// A picture of a recognisable size that converts to the given RGB picture.
-class CPicture : public peru::CObject, public ISonoraPicture {
-public:
-    explicit CPicture(P<ISonoraPicture> rgb = nullptr) : m_rgb(std::move(rgb)) {}
-    double getTimestamp() const override { return 0.0; }
-    int getWidth() const override { return 320; }
-    int getHeight() const override { return 200; }
-    bool isFlipped() const override { return false; }
-    P<peru::IMemoryBlock> getRGBBlock(int, int, int, int) override { return nullptr; }
-    void copyRGBRect(uint8_t*, int, int, int, int, int) override {}
-    P<ISonoraPicture> getRGBPicture() override { return m_rgb; }
-    int getPictureType() const override { return kYV12; }
-    P<peru::IMemoryBlock> getImagePlane(int, int, int, int, int) override { return nullptr; }
-    void fillPlaneBlack(int, int, int, int, int) override {}
-    void drawInto(const P<ISonoraPicture>&, int, int, int, int, int, int) override {}
-    P<IString> getPixelShaderName() const override { return CString::empty(); }
-    P<ISonoraPicture> createThumbnail() override { return nullptr; }
-    void writeTo(const P<peru::IDataOutStream>&) const override {}
-    void readFrom(const P<peru::IDataInStream>&) override {}
-
-private:
-    P<ISonoraPicture> m_rgb;
-};
-
-class CVideo : public TSourceBase<IVideoSource> {
-public:
-    double duration = 10.0;
-    std::vector<double> skips;
-    P<ISonoraPicture> picture;
-    std::function<void()> onPicture = [] {}; // may throw
-
-    void open() override {
-        ++opens;
-        m_opened = true;
-    }
-    void close() override { m_opened = false; }
-    void skipToTime(double time) override { skips.push_back(time); }
-    double getDuration() override { return m_opened ? duration : 0.0; }
-    bool isEOF() override { return false; }
-    void setMaxSize(int, int) override {}
-    int getWidth() override { return 0; }
-    int getHeight() override { return 0; }
-    double peekNextPictureTimestamp() override { return 0.0; }
-    P<ISonoraPicture> getNextPicture() override {
-        onPicture();
-        return m_opened ? picture : nullptr;
-    }
-    int getPixelAspectNum() override { return 1; }
-    int getPixelAspectDen() override { return 1; }
-    double getFrameDuration() override { return 0.04; }
-    int getFrameRateNum() override { return 25; }
-    int getFrameRateDen() override { return 1; }
-};
-
-TEST_F(PluginHandler, PreviewImage_IsTakenAtTheTimeAndNeverBehindTheEnd) {
-    struct SCase {
-        double time, duration;
-        std::vector<double> skips;
-    };
-    P<CPluginHandler> handler = makeHandler();
-    P<CFakePlugin> plugin = addPlugin(*handler, "video", {"vid"});
-    const P<ISonoraPicture> rgb = make<CPicture>();
-    for (const SCase& c : std::initializer_list<SCase>{{3.0, 10.0, {3.0}},
-                                                       {10.0, 10.0, {10.0}},
-                                                       {10.5, 10.0, {9.0}},
-                                                       {0.0, 10.0, {}},
-                                                       {-2.0, 10.0, {}},
-                                                       {5.0, 0.5, {}}}) {
-        P<CVideo> video = make<CVideo>();
-        video->duration = c.duration;
-        video->picture = make<CPicture>(rgb);
-        plugin->makeSource = [&](auto&&...) { return video; };
-        int width = -1, height = -1;
-        EXPECT_TRUE(handler->createPreviewImage(uri("file:///a.vid"), c.time, width, height) == rgb);
-        EXPECT_EQ(plugin->mask, 1);
-        EXPECT_EQ(video->skips, c.skips) << c.time << " of " << c.duration;
-        EXPECT_EQ(width, 320);
-        EXPECT_EQ(height, 200);
-        EXPECT_EQ(video->opens, 2) << "once for the test, once for the picture";
-        EXPECT_FALSE(video->isOpened());
-    }
-    P<CVideo> video = make<CVideo>();
-    plugin->makeSource = [&](auto&&...) { return video; };
-    int width = -1, height = -1;
-    EXPECT_FALSE(handler->createPreviewImage(uri("file:///a.vid"), 1.0, width, height)) << "without pictures";
-    EXPECT_EQ(width + height, 0);
-    video->onPicture = [] { throw CSonoraError("torn frame"); };
-    EXPECT_THROW(handler->createPreviewImage(uri("file:///a.vid"), 1.0, width, height), CSonoraError);
-    EXPECT_FALSE(video->isOpened());
 }
 
 TEST_F(PluginHandler, CreateCalls_AreSerialised) {
@@ -377,14 +301,14 @@ TEST_F(PluginHandler, Libraries_ThatFailCostALineEach) {
     EXPECT_EQ(CString::toStdString(handler->getPlugin(0)->getPluginName()), "testplugin_good");
     const std::string head = "Error while loading DLL: Error - ";
     std::vector<std::string> lines;
-    for (const std::string& text : log->texts)
+    for (const std::string& text : log->lines)
         if (text.starts_with("Error while")) lines.push_back(text.substr(head.size()));
     EXPECT_THAT(lines, ElementsAre("could not load plugin: testplugin_nowhere.so",
                                    "could not load plugin: testplugin_text.so",
                                    "could not load link create function for: testplugin_noentry.so",
                                    "could not load link create plugin object for: testplugin_empty.so",
                                    "no licence"));
-    EXPECT_EQ(log->texts.size(), 6u) << "and the loader's own reason for the text file";
+    EXPECT_EQ(log->lines.size(), 6u) << "and the loader's own reason for the text file";
     EXPECT_TRUE(open(*handler, "a.tst"));
     EXPECT_FALSE(open(*handler, "refuse.tst"));
 }
@@ -401,25 +325,21 @@ TEST_F(PluginHandler, Libraries_AreFoundWhereTheEnvironmentSaysUnlessTheContextS
     EXPECT_EQ(make<CPluginHandler>(context)->getPluginCount(), 2);
     context->getBaseDirectories()->setPluginDirectory(toURI(own.path() / ""));
     EXPECT_EQ(make<CPluginHandler>(context)->getPluginCount(), 1);
+    context->clearPluginNames(); // the usual ones then
+    for (const char* name : {"sonora2_ffmpeg.so", "sonora2_dsgraph.so", "sonora2_decmpa.so"})
+        std::filesystem::create_symlink(good, own / name);
+    EXPECT_EQ(make<CPluginHandler>(context)->getPluginCount(), 3);
 }
 
-TEST(PluginExtensions, SerialForm_ComesBackAndRefusesWhatIsCutShort) {
+TEST(PluginExtensions, HaveNoDuplicatesAndAreRefusedWhenCutShort) {
     P<CPluginExtensions> list = make<CPluginExtensions>();
     EXPECT_TRUE(list->addExtension(CString::fromUTF8("flac")));
     EXPECT_TRUE(list->addExtension(CString::fromUTF8("wav")));
     EXPECT_FALSE(list->addExtension(CString::fromUTF8("flac")));
+    EXPECT_THROW(list->getExtension(2), peru::CInvalidArgError);
     const std::string form = serialise(list);
-    EXPECT_EQ(form.size(), 4u + 4 + 4 + 4 + 3);
-
-    P<CPluginExtensions> back = make<CPluginExtensions>();
-    back->addExtension(CString::fromUTF8("old"));
-    deserialise(back, form);
-    ASSERT_EQ(back->getCount(), 2);
-    EXPECT_EQ(CString::toStdString(back->getExtension(1)), "wav");
-    EXPECT_THROW(back->getExtension(2), peru::CInvalidArgError);
-
     for (size_t cut : {form.size() - 1, size_t{12}, size_t{2}})
-        EXPECT_THROW(deserialise(back, form.substr(0, cut)), peru::CException) << cut;
+        EXPECT_THROW(deserialise(list, form.substr(0, cut)), peru::CException) << cut;
 }
 
 } // namespace

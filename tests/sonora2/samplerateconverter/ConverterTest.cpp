@@ -89,30 +89,12 @@ TEST(SampleRateConverter, OutputDoesNotDependOnHowTheInputIsCut) {
         const std::string large = convertInCuts(shape, input, 2, 3000);
         const P<CSampleRateConverter> converter = makeConverter(shape);
         std::string whole = convertAll(*converter, input);
+        EXPECT_LE(converter->getOutputPosition(), uint32_t{CSampleRateConverter::kMaxOutputFrames});
         // A call returns a bounded number of frames: flush until the expected length is reached.
         for (int round = 0; whole.size() < small.size() && round < 200; ++round) whole += flush(*converter);
         EXPECT_EQ(small, large);
         EXPECT_EQ(small, whole.substr(0, small.size()));
     }
-}
-
-// One call returns at most 96000 frames. The rest of its input follows with the next calls.
-TEST(SampleRateConverter, LosesNothingOfAnInputThatIsTooLargeForOneCall) {
-    const SShape shape{44100, 2, 2, 48000, 2, 2};
-    const Samples input = makeNoise(44100 * 2 * 7);
-    const P<CSampleRateConverter> converter = makeConverter(shape);
-    std::string output = convertAll(*converter, input);
-    EXPECT_LE(output.size(), static_cast<size_t>(CSampleRateConverter::kMaxOutputFrames) * 4);
-    EXPECT_GT(output.size(), 90000u * 4);
-    const Samples more = makeNoise(441 * 2, 9);
-    output += convertAll(*converter, more);
-    for (int i = 0; i < 8; ++i) output += flush(*converter);
-
-    Samples joined = input;
-    joined.insert(joined.end(), more.begin(), more.end());
-    const std::string expected = convertInCuts(shape, joined, 3, 5000);
-    ASSERT_GE(output.size(), expected.size());
-    EXPECT_EQ(output.substr(0, expected.size()), expected);
 }
 
 TEST(SampleRateConverter, AFlushGivesExactlyOneSecondThatEndsInSilence) {
@@ -304,18 +286,14 @@ TEST(SampleRateConverter, MatchesThePeerWithTheSameFilter) {
     const tests::CTempFolder folder;
     const std::string filter = "filter_size=16:phase_shift=10:linear_interp=0:exact_rational=0:cutoff=1.0:"
                                "filter_type=kaiser:kaiser_beta=9:resampler=swr";
-    struct SCase {
+    const struct {
         int srcRate, dstRate, bytes;
         bool isSweep, isBest;
-    };
-    for (const SCase& c : std::initializer_list<SCase>{{44100, 48000, 2, false, false},
-                                                       {44100, 48000, 2, true, false},
-                                                       {48000, 44100, 2, true, false},
-                                                       {96000, 44100, 2, false, false},
-                                                       {96000, 44100, 2, true, false},
-                                                       {44100, 48000, 3, false, false},
-                                                       {96000, 44100, 4, false, false},
-                                                       {96000, 44100, 4, true, true}}) {
+    } cases[] = {{44100, 48000, 2, false, false}, {44100, 48000, 2, true, false},
+                 {48000, 44100, 2, true, false},  {96000, 44100, 2, false, false},
+                 {96000, 44100, 2, true, false},  {44100, 48000, 3, false, false},
+                 {96000, 44100, 4, false, false}, {96000, 44100, 4, true, true}};
+    for (const auto& c : cases) {
         SCOPED_TRACE(testing::Message() << c.srcRate << " -> " << c.dstRate << ", " << c.bytes << " bytes");
         const Samples input = c.isSweep ? makeSweep(c.srcRate, 2, 3.0) : makeNoise(c.srcRate * 2 * 3, 5);
         std::string bytes;

@@ -58,19 +58,14 @@ TEST_F(AudioTrack, EndedSource_GivesASecondOfSilenceAtEachCall) {
 
 TEST_F(AudioTrack, Skip_CountsFromTheTracksStartAndOnlyWithinIt) {
     track->open();
-    struct SCase {
+    const struct {
         double time;
         int64_t frame; // of the next sample; -1: the skip is ignored
-    };
+    } cases[] = {{10.5, 4000},  {9.99, -1}, {10.0, 0},         {11.0, -2},
+                 {10.25, 2000}, {11.1, -1}, {std::nan(""), -1}};
     int64_t next = 0;
-    for (const SCase& c : std::initializer_list<SCase>{{10.5, 4000},
-                                                       {9.99, -1},
-                                                       {10.0, 0},
-                                                       {11.0, -2},
-                                                       {10.25, 2000},
-                                                       {11.1, -1},
-                                                       {std::nan(""), -1}}) {
-        track->processCommand(peru::make<common::CSkipToTimeCommand>(c.time));
+    for (const auto& c : cases) {
+        track->processCommand(peru::make<common::CSkipToTimeCommand>(c.time)->cloneCommand());
         if (c.frame == -2) {
             EXPECT_TRUE(source->isEOF()) << "the end belongs to the track";
             continue;
@@ -84,10 +79,10 @@ TEST_F(AudioTrack, Skip_CountsFromTheTracksStartAndOnlyWithinIt) {
 
 TEST_F(AudioTrack, OpenCommand_OpensOnceAndClosesAgain) {
     for (const char* target : {"someone else", "", "me"})
-        track->processCommand(peru::make<common::COpenThreadIndependentCommand>(target));
+        track->processCommand(peru::make<common::COpenThreadIndependentCommand>(target)->cloneCommand());
     EXPECT_TRUE(track->isOpened());
     EXPECT_EQ(source->opens, 1);
-    track->processCommand(peru::make<common::COpenThreadIndependentCommand>("me", true));
+    track->processCommand(peru::make<common::COpenThreadIndependentCommand>("me", true)->cloneCommand());
     EXPECT_FALSE(track->isOpened());
 }
 
@@ -105,9 +100,13 @@ TEST_F(AudioTrack, Equalizer_ComesFromTheAudioTools) {
     track->open();
     for (const char* target : {"someone else", "me"})
         track->processCommand(
-            peru::make<common::CSetAudioEqualizerCommand>(target, target[0] == 'm' ? 7 : 8));
+            peru::make<common::CSetAudioEqualizerCommand>(target, target[0] == 'm' ? 7 : 8)->cloneCommand());
     EXPECT_EQ(firstSample(track->getNextAudioChunk()), ~noiseAt(1, 0, 0));
     EXPECT_EQ(CNegator::s_calls, "configure 8000 2 1\nselect 4\nselect 7\n");
+    track->close();
+    track->setEqualizerPreset(0);
+    track->open();
+    EXPECT_EQ(firstSample(track->getNextAudioChunk()), noiseAt(1, 0, 0));
 }
 
 TEST_F(AudioTrack, DebugText_TellsItsEffects) {
@@ -142,6 +141,9 @@ TEST(SilentAudioSource, Chunks_AreTheSameBlockUntilTheEnd) {
     EXPECT_FALSE(silence->getNextAudioChunk());
     silence->open();
     EXPECT_EQ(silence->getNextAudioChunk()->getTimestamp(), 0.0);
+    EXPECT_EQ(text(silence->getURI()->getAsString()) + text(silence->getPluginName()), "CSilentAudioSource");
+    EXPECT_EQ(silence->getAudioStreamInfos()->getStreamCount(), 1);
+    EXPECT_EQ(silence->getAudioStreamInfos()->getStreamInfo(0)->getStreamIndex(), 0);
 }
 
 } // namespace

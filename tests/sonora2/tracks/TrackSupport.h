@@ -35,7 +35,7 @@ struct SNoise {
     std::function<void()> onOpen = [] {}; // may throw
 };
 
-class CNoiseSource : public peru::CObject, public sonora2::common::IAudioSource {
+class CNoiseSource : public CSourceBase {
 public:
     explicit CNoiseSource(const SNoise& noise) : m_noise(noise) {}
     ~CNoiseSource() override {
@@ -43,9 +43,7 @@ public:
     }
 
     static inline std::atomic<int> s_open{0};
-    int opens = 0;
 
-    bool isOpened() override { return m_opened; }
     void open() override {
         m_noise.onOpen();
         ++opens;
@@ -62,12 +60,6 @@ public:
     double getDuration() override { return static_cast<double>(m_noise.frames) / m_noise.rate; }
     int getBufferStatus() override { return 100 - m_noise.seed; }
     bool isEOF() override { return m_position >= m_noise.frames; }
-    void setStartTime(double) override {}
-    double getStartTime() override { return 0.0; }
-    P<peru::IURI> getURI() override { return nullptr; }
-    P<peru::IString> getPluginName() override { return peru::CString::empty(); }
-    P<sonora2::audio::IAudioStreamInfos> getAudioStreamInfos() override { return nullptr; }
-    void setAudioStream(int) override {}
     P<sonora2::audio::IAudioChunk> getNextAudioChunk() override {
         if (!m_opened) throw peru::CError("read while closed");
         if (isEOF()) return nullptr;
@@ -87,7 +79,6 @@ public:
 
 private:
     SNoise m_noise;
-    bool m_opened = false;
     int64_t m_position = 0;
     size_t m_cut = 0;
 };

@@ -125,43 +125,23 @@ TEST_F(Tracklist, ListInAList_PlaysAndSkipsLikeItsTracks) {
     EXPECT_TRUE(pull(list, 1000) == whole);
     skip(list, 2.0);
     EXPECT_TRUE(pull(list, 1000) == Samples(whole.end() - (16000 - 8000) - kStep, whole.end()));
-    nested->processCommand(peru::make<common::CEnableTrackCommand>("", false));
+    nested->processCommand(peru::make<common::CEnableTrackCommand>("", false)->cloneCommand());
     EXPECT_FALSE(nested->isOpened());
     EXPECT_EQ(CNoiseSource::s_open, 0);
     skip(list, 2.0);
     EXPECT_EQ(pull(list), Samples(kRate / 100)) << "nothing plays";
 }
 
-class CPictureTrack : public peru::CObject, public common::ITrack {
-public:
-    P<peru::IURI> getURI() override { return nullptr; }
-    void setURI(const P<peru::IURI>&) override {}
-    bool isOpened() override { return false; }
-    void open() override {}
-    void close() override {}
-    int getSortIndex() override { return 0; }
-    double getStartTime() override { return 0.0; }
-    double getDuration() override { return 0.0; }
-    bool isEnabled() override { return true; }
-    P<peru::IString> getDebugText() override { return peru::CString::empty(); }
-    int getBufferStatus() override { return 0; }
-    void processCommand(const P<common::ITrackCommand>&) override {}
-};
-
 TEST_F(Tracklist, BadTracksAndFormats_AreRefused) {
     const P<CAudioTracklist> list = makeList(false, {});
-    EXPECT_EQ(errorOf([&] { list->addTrack(peru::make<CPictureTrack>(), 0.0, 1.0); }),
+    EXPECT_EQ(errorOf([&] { list->addTrack(nullptr, 0.0, 1.0); }),
               "only IAudioTrack items should be added to a CAudioTracklist!");
-    struct SCase {
+    const struct {
         int rate, channels, bytes, frames;
-    };
-    for (const SCase& c : std::initializer_list<SCase>{{0, 2, 2, 100},
-                                                       {8000, -1, 2, 100},
-                                                       {8000, 2, 0, 100},
-                                                       {8000, 2, 2, 0},
-                                                       {8000, 1 << 20, 1 << 12, 1},
-                                                       {1 << 30, 2, 2, 100},
-                                                       {8000, 2, 2, 1 << 30}})
+    } cases[] = {{0, 2, 2, 100},       {8000, -1, 2, 100},          {8000, 2, 0, 100},
+                 {8000, 2, 2, 0},      {8000, 1 << 20, 1 << 12, 1}, {1 << 30, 2, 2, 100},
+                 {8000, 2, 2, 1 << 30}};
+    for (const auto& c : cases)
         EXPECT_THROW(
             peru::make<CAudioTracklist>(false, context, c.rate, c.channels, c.bytes, c.frames, 0.0, 0),
             peru::CError)
@@ -185,6 +165,9 @@ TEST_F(Tracklist, DebugDocument_TellsTheStateAndEveryTrack) {
     const P<CAudioTracklist> list = makeList(false, {{{1}, 3, 0.5, 1.25}, {{2}, -1, 0.0, 1.0, false}});
     list->open();
     skip(list, 0.75);
+    EXPECT_EQ(list->getCurrentFrame(), 750u);
+    EXPECT_EQ(tests::text(list->getURI()->getAsString()) + tests::text(list->getDebugText()),
+              "CAudioTracklist");
     const std::string text = peru::CString::toStdString(list->getDebugDocument()->printToString());
     for (const char* part :
          {"<CTracklist currentFrame=\"750\" maxFrame=\"1250\" framerateNum=\"1\" framerateDen=\"1000\" "
