@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cstdio>
 #include <cstring>
-#include <sys/stat.h>
 #include <utility>
 
 namespace sonora2::plugins {
@@ -70,7 +69,7 @@ SDecodedMedia CMpegDecoder::open(const SDecoderOptions& options) {
         failToOpen();
     m_format = readFormat();
     mpg123_param(handle, MPG123_RESYNC_LIMIT, kNextFrameBytes, 0);
-    if (m_scan.identity != identify())
+    if (m_scan.identity != identify(m_input))
         scan();
     else if (mpg123_set_index(handle, m_scan.places.data(), m_scan.framesPerPlace, m_scan.places.size()) !=
              MPG123_OK)
@@ -102,12 +101,6 @@ std::string CMpegDecoder::getCodecName() {
     mpg123_frameinfo info{};
     if (mpg123_info(m_handle.get(), &info) != MPG123_OK) return {};
     return "MPEG audio layer " + std::string(static_cast<size_t>(std::clamp(info.layer, 1, 3)), 'I');
-}
-
-CMpegDecoder::SIdentity CMpegDecoder::identify() const {
-    struct stat status;
-    if (::fstat(::fileno(m_input.get()), &status) != 0) return {};
-    return {status.st_dev, status.st_ino, status.st_size, status.st_mtim.tv_sec, status.st_mtim.tv_nsec};
 }
 
 // Stated lengths may be wrong and many files have none, so the frames are counted.
@@ -142,7 +135,7 @@ void CMpegDecoder::scan() {
     size_t count = 0;
     if (mpg123_index(handle, &places, &scan.framesPerPlace, &count) != MPG123_OK) failToOpen();
     scan.places.assign(places, places + count);
-    scan.identity = identify();
+    scan.identity = identify(m_input);
     m_scan = std::move(scan);
 }
 
@@ -163,7 +156,7 @@ int CMpegDecoder::read(uint8_t* pcm, int frames) {
              toSeconds(m_position), describe(mpg123_errcode(m_handle.get())));
     checkContinuity();
     int count = static_cast<int>(done / static_cast<size_t>(m_format.frameBytes()));
-    if (count == 0 && m_position < m_scan.frames && m_scan.identity == identify()) {
+    if (count == 0 && m_position < m_scan.frames && m_scan.identity == identify(m_input)) {
         // Frames with an intact header may still be impossible to decode.
         if (!std::exchange(m_padding, true))
             m_options.warn({"sonora2.CMpegDecoder.undecodable",

@@ -25,27 +25,17 @@ private:
     struct SDelete {
         void operator()(mpg123_handle* handle) const { mpg123_delete(handle); }
     };
-    // Distinguishes a file from one that has replaced it under the same name.
-    struct SIdentity {
-        uint64_t device = 0;
-        uint64_t node = 0;
-        int64_t size = -1;
-        int64_t seconds = 0;
-        int64_t nanoseconds = 0;
-        bool operator==(const SIdentity&) const = default;
-    };
     // Results of scanning the whole file.
     struct SScan {
-        SIdentity identity; // of the scanned file
-        int64_t start = 0;  // decoded frame at which the sound begins
-        int64_t frames = 0; // of the sound
+        SFileIdentity identity; // of the scanned file
+        int64_t start = 0;      // decoded frame at which the sound begins
+        int64_t frames = 0;     // of the sound
         std::vector<off_t> places;
         off_t framesPerPlace = 0;
     };
 
     SPcmFormat readFormat();
     std::string getCodecName();
-    SIdentity identify() const;
     void scan();
     void checkContinuity();
     P<peru::IString> describe(int error) const;

@@ -51,9 +51,11 @@ CFlacDecoder::CFlacDecoder(const SMediaFile& file) : m_file(file) {}
 
 SDecodedMedia CFlacDecoder::open(const SDecoderOptions& options) {
     close();
-    if (options.salvage != m_options.salvage) m_scanned = -1;
-    m_options = options;
     m_input = openForReading(m_file);
+    const SFileIdentity identity = identify(m_input);
+    if (options.salvage != m_options.salvage || identity != m_identity) m_scanned = -1;
+    m_options = options;
+    m_identity = identity;
     m_start = findStream();
     m_decoder.reset(FLAC__stream_decoder_new());
     if (!m_decoder) throw std::bad_alloc();
@@ -181,6 +183,7 @@ void CFlacDecoder::seek(int64_t frame) {
 std::unique_ptr<IDecoder> CFlacDecoder::createTwin() {
     auto twin = std::make_unique<CFlacDecoder>(m_file);
     twin->m_scanned = m_scanned;
+    twin->m_identity = m_identity;
     return twin;
 }
 

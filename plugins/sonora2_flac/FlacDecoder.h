@@ -15,7 +15,8 @@ class CFlacDecoder : public IDecoder {
 public:
     explicit CFlacDecoder(const SMediaFile& file);
 
-    // If the header does not state the length, the file is scanned once in the decoder's lifetime.
+    // If the header does not state the length, the file is scanned by the first opening, and again when it
+    // has been replaced.
     SDecodedMedia open(const SDecoderOptions& options) override;
     void close() override;
     int read(uint8_t* pcm, int frames) override;
@@ -66,10 +67,11 @@ private:
     std::unique_ptr<FLAC__StreamDecoder, SDeleter> m_decoder;
     SPcmFormat m_format;
     int m_bits = 0;
-    int64_t m_total = 0;     // frames
-    int64_t m_scanned = -1;  // frames counted by scanning; -1 if not scanned
-    int64_t m_position = 0;  // first frame of the next read
-    bool m_counting = false; // frames are not delivered, only their numbers are used
+    int64_t m_total = 0;      // frames
+    int64_t m_scanned = -1;   // frames counted by scanning; -1 if not scanned
+    SFileIdentity m_identity; // of the file opened last, whose frames were counted
+    int64_t m_position = 0;   // first frame of the next read
+    bool m_counting = false;  // frames are not delivered, only their numbers are used
 
     // A decoded frame is written directly to the caller's memory; what does not fit goes to `m_rest`.
     uint8_t* m_target = nullptr;

@@ -14,25 +14,27 @@ namespace sonora2::plugins::wav {
 
 namespace {
 
-// Other formats that the library reads have plug-ins of their own, and its MPEG decoder writes to standard
-// error.
-bool isOwnContainer(std::FILE* file) {
+// The start of the container, behind a tag; -1 if it is of another kind. Other formats that the library reads
+// have plug-ins of their own, and its MPEG decoder writes to standard error.
+int64_t findContainer(std::FILE* file) {
+    int64_t at = 0;
     std::array<char, 12> start{};
     size_t got = std::fread(start.data(), 1, start.size(), file);
     if (got == start.size() && std::string_view(start.data(), 3) == "ID3") {
-        long tag = 0;
-        for (size_t i = 6; i < 10; ++i) tag = tag << 7 | (start[i] & 0x7F);
-        std::fseek(file, 10 + tag, SEEK_SET);
+        for (size_t i = 6; i < 10; ++i) at = at << 7 | (start[i] & 0x7F);
+        at += 10;
+        ::fseeko(file, at, SEEK_SET);
         got = std::fread(start.data(), 1, start.size(), file);
     }
-    std::rewind(file);
     const std::string_view text(start.data(), got);
     const std::string_view type = text.substr(std::min<size_t>(got, 8));
-    if (text.starts_with("FORM")) return type == "AIFF" || type == "AIFC";
     constexpr std::string_view kWave64("riff\x2E\x91\xCF\x11", 8);
-    return text.starts_with("RIFF") || text.starts_with("RIFX") || text.starts_with("RF64") ||
-           text.starts_with(kWave64) || text.starts_with(".snd") || text.starts_with("dns.") ||
-           text.starts_with("caff");
+    const bool isOwn = text.starts_with("FORM") ? type == "AIFF" || type == "AIFC"
+                                                : text.starts_with("RIFF") || text.starts_with("RIFX") ||
+                                                      text.starts_with("RF64") || text.starts_with(kWave64) ||
+                                                      text.starts_with(".snd") || text.starts_with("dns.") ||
+                                                      text.starts_with("caff");
+    return isOwn ? at : -1;
 }
 
 bool isMpeg(int sampleFormat) {
@@ -124,7 +126,8 @@ SDecodedMedia CSndfileDecoder::open(const SDecoderOptions& options) {
     close();
     m_options = options;
     m_input = openForReading(m_file);
-    if (!isOwnContainer(m_input.get()))
+    m_start = findContainer(m_input.get());
+    if (m_start < 0)
         fail({"sonora2.CSndfileDecoder.otherKind",
               "could not read %s: it is another kind of file than its name suggests"},
              m_file.getDisplayName());
@@ -288,10 +291,23 @@ template <class Sample> void CSndfileDecoder::scale(std::vector<Sample>& samples
 }
 
 void CSndfileDecoder::seek(int64_t frame) {
-    if (sf_seek(m_handle.get(), frame, SEEK_SET) != frame)
-        fail({"sonora2.CSndfileDecoder.seek", "could not find frame %d of %s: %s"}, frame,
-             m_file.getDisplayName(), peru::CString::fromUTF8(sf_strerror(m_handle.get())));
-    m_position = frame;
+    if (sf_seek(m_handle.get(), frame, SEEK_SET) == frame) {
+        m_position = frame;
+        return;
+    }
+    // Some compressed formats can only be decoded from their start.
+    SF_INFO info{};
+    openHandle(info);
+    constexpr int kFrames = 4096;
+    std::vector<short> dropped(static_cast<size_t>(m_format.channels) * kFrames);
+    for (m_position = 0; m_position < frame;) {
+        const sf_count_t got =
+            sf_readf_short(m_handle.get(), dropped.data(), std::min<int64_t>(frame - m_position, kFrames));
+        if (got <= 0)
+            fail({"sonora2.CSndfileDecoder.seek", "could not find frame %d of %s: %s"}, frame,
+                 m_file.getDisplayName(), peru::CString::fromUTF8(sf_strerror(m_handle.get())));
+        m_position += got;
+    }
 }
 
 // Floating-point samples are left to one decoder, which counts those that clip.
@@ -329,6 +345,7 @@ void CSndfileDecoder::openHandle(SF_INFO& info) {
         m_options.warn({"sonora2.CSndfileDecoder.notCompleted",
                         "%s was not completed by its writer and is read to its end"},
                        m_file.getDisplayName());
+    ::fseeko(m_input.get(), m_start, SEEK_SET);
     SF_VIRTUAL_IO io{getLength, seekInput, readInput, writeNothing, tellInput};
     m_handle.reset(sf_open_virtual(&io, SFM_READ, &info, this));
     if (m_handle) return;
@@ -342,16 +359,17 @@ void CSndfileDecoder::openHandle(SF_INFO& info) {
          peru::CString::fromUTF8(sf_strerror(nullptr)));
 }
 
+// What the library sees begins at the container: it would miscount the sound behind a tag.
 sf_count_t CSndfileDecoder::getLength(void* self) {
+    const CSndfileDecoder& decoder = *static_cast<CSndfileDecoder*>(self);
     struct stat status {};
-    return ::fstat(::fileno(static_cast<CSndfileDecoder*>(self)->m_input.get()), &status) == 0
-               ? status.st_size
-               : 0;
+    return ::fstat(::fileno(decoder.m_input.get()), &status) == 0 ? status.st_size - decoder.m_start : 0;
 }
 
 sf_count_t CSndfileDecoder::seekInput(sf_count_t offset, int whence, void* self) {
-    std::FILE* file = static_cast<CSndfileDecoder*>(self)->m_input.get();
-    return ::fseeko(file, offset, whence) == 0 ? ::ftello(file) : -1;
+    const CSndfileDecoder& decoder = *static_cast<CSndfileDecoder*>(self);
+    if (whence == SEEK_SET) offset += decoder.m_start;
+    return ::fseeko(decoder.m_input.get(), offset, whence) == 0 ? tellInput(self) : -1;
 }
 
 sf_count_t CSndfileDecoder::readInput(void* data, sf_count_t size, void* self) {
@@ -372,7 +390,8 @@ sf_count_t CSndfileDecoder::writeNothing(const void*, sf_count_t, void*) {
 }
 
 sf_count_t CSndfileDecoder::tellInput(void* self) {
-    return ::ftello(static_cast<CSndfileDecoder*>(self)->m_input.get());
+    const CSndfileDecoder& decoder = *static_cast<CSndfileDecoder*>(self);
+    return ::ftello(decoder.m_input.get()) - decoder.m_start;
 }
 
 } // namespace sonora2::plugins::wav

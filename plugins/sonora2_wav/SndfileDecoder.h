@@ -54,6 +54,7 @@ private:
     SMediaFile m_file;
     SDecoderOptions m_options;
     InputFile m_input;               // read by the handle
+    int64_t m_start = 0;             // of the container, behind a tag
     std::array<SPatch, 2> m_patches; // applied to what the handle reads
     SndfileHandle m_handle;
     SPcmFormat m_format;

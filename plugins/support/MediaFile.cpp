@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <fcntl.h>
 #include <filesystem>
+#include <sys/stat.h>
 #include <system_error>
 
 namespace sonora2::plugins {
@@ -52,6 +53,12 @@ InputFile openForReading(const SMediaFile& file) {
     InputFile input(std::fopen(file.path.c_str(), "rbe")); // closed in programs that are started meanwhile
     if (!input) failSystem(kOpenFailed, file, errno);
     return input;
+}
+
+SFileIdentity identify(const InputFile& file) {
+    struct stat status;
+    if (::fstat(::fileno(file.get()), &status) != 0) return {};
+    return {status.st_dev, status.st_ino, status.st_size, status.st_mtim.tv_sec, status.st_mtim.tv_nsec};
 }
 
 bool isPipe(const SMediaFile& file) {

@@ -46,6 +46,16 @@ struct SFileCloser {
 using InputFile = std::unique_ptr<std::FILE, SFileCloser>;
 // Opens a regular file for a codec library, which uses the stream or its descriptor. Throws CSonoraError.
 InputFile openForReading(const SMediaFile& file);
+// Distinguishes a file from one that has replaced it under the same name.
+struct SFileIdentity {
+    uint64_t device = 0;
+    uint64_t node = 0;
+    int64_t size = -1;
+    int64_t seconds = 0; // of the last change
+    int64_t nanoseconds = 0;
+    bool operator==(const SFileIdentity&) const = default;
+};
+SFileIdentity identify(const InputFile& file);
 bool isPipe(const SMediaFile& file);
 // Opens a named pipe whose other end is open already; otherwise it has no content.
 InputFile openPipe(const SMediaFile& file);

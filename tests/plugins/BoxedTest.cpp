@@ -3,14 +3,10 @@
 
 #include "sonora2/context/LastFailure.h"
 #include "sonora2/context/SonoraError.h"
-#include "sonora2/encoding/AudioEncoder.h"
 #include "sonora2/media/IDiscardable.h"
 #include "sonora2/media/IFormatSettings.h"
 #include "sonora2/media/ISalvage.h"
-
-#include <csignal>
-#include <fstream>
-#include <thread>
+#include "support/Children.h"
 
 namespace tests {
 
@@ -127,20 +123,8 @@ TEST_P(Boxed, OptionalInterfaces_AreThoseOfThePlainObject) {
 
 INSTANTIATE_TEST_SUITE_P(Formats, Boxed, testing::ValuesIn(kFormatCases), printName);
 
-class BoxedJobs : public CPluginTest {
-protected:
-    BoxedJobs() : boxed(peru::make<CPluginHandler>(context, true)) {}
-
-    void convert(const std::filesystem::path& from, const std::filesystem::path& to) {
-        const P<IAudioSource> source = boxed->createAudioSource(toURI(from), 44100, 2, 2, false);
-        const P<IAudioFormat> format = boxed->createAudioFormat(toURI(to), 44100, 2, 2);
-        peru::make<CAudioEncoder>(context, source, format)->encode();
-    }
-
-    P<CPluginHandler> boxed;
-};
-
-TEST_F(BoxedJobs, Settings_OutliveTheirProcess) {
+TEST_F(CPluginTest, BoxedSettings_OutliveTheirProcess) {
+    const auto boxed = peru::make<CPluginHandler>(context, true);
     writeFile(folder / "x.flac", makeMusic({}, 50'000));
     const P<IAudioSource> source = boxed->createAudioSource(toURI(folder / "x.flac"), 44100, 2, 2, true);
     peru::interfaceCast<IMediaDescription>(source)->setDeliveredFormat(22050, 1, 3);
@@ -148,39 +132,12 @@ TEST_F(BoxedJobs, Settings_OutliveTheirProcess) {
     source->setStartTime(0.25);
     const std::string expected = readAll(source);
     EXPECT_NEAR(static_cast<double>(expected.size()), (25'000 - 0.25 * 22'050) * 3, 2 * 3);
-    for (const auto& thread : std::filesystem::directory_iterator("/proc/self/task")) {
-        std::ifstream children(thread.path() / "children");
-        for (pid_t child; children >> child;) {
-            ::kill(child, SIGKILL);
-            for (int i = 0; i < 5000 && ::kill(child, 0) == 0; ++i) ::usleep(1000); // until it has ended
-        }
-    }
+    endChildren(SIGKILL);
     EXPECT_THROW(source->skipToTime(0.0), CSonoraError);
     source->close();
     source->open();
     EXPECT_TRUE(readAll(source) == expected);
     EXPECT_TRUE(peru::interfaceCast<ISalvage>(source)->getSalvage());
-}
-
-TEST_F(BoxedJobs, ManyAtOnce_AllSucceed) {
-    const std::string pcm = makeMusic({}, 50'000);
-    writeFile(folder / "x.wav", pcm);
-    std::vector<std::thread> jobs;
-    for (int i = 0; i < 16; ++i)
-        jobs.emplace_back([this, i] { convert(folder / "x.wav", folder / (std::to_string(i) + ".flac")); });
-    for (std::thread& job : jobs) job.join();
-    for (int i = 0; i < 16; ++i) EXPECT_TRUE(read(folder / (std::to_string(i) + ".flac")) == pcm) << i;
-}
-
-TEST_F(BoxedJobs, OneAfterTheOther_LeaveNothingBehind) {
-    writeFile(folder / "x.wav", makeMusic({}, 500));
-    const auto countDescriptors = [] { return countEntries("/proc/self/fd"); };
-    const auto countThreads = [] { return countEntries("/proc/self/task"); };
-    convert(folder / "x.wav", folder / "0.flac");
-    const size_t descriptors = countDescriptors(), threads = countThreads();
-    for (int i = 1; i < 10; ++i) convert(folder / "x.wav", folder / (std::to_string(i) + ".flac"));
-    EXPECT_EQ(descriptors, countDescriptors());
-    EXPECT_LE(countThreads(), threads + 2) << "those that wait for a process may still be ending";
 }
 
 } // namespace

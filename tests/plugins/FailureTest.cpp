@@ -7,6 +7,8 @@
 #include "sonora2/media/ISalvage.h"
 
 #include <chrono>
+#include <csignal>
+#include <sys/resource.h>
 #include <thread>
 
 namespace tests {
@@ -88,6 +90,42 @@ TEST_P(Failure, FullDisk_IsToldByName) {
         EXPECT_NE(std::string::npos, reason.find(named().string())) << reason;
         EXPECT_NE(std::string::npos, reason.find("No space left on device")) << reason;
         EXPECT_NO_THROW(format->close());
+    }
+}
+
+TEST_P(Failure, GrowingBeyondALimit_KeepsTheOldFile) {
+    folder.write(named().filename(), "dear to somebody");
+    const auto old = std::signal(SIGXFSZ, SIG_IGN);
+    rlimit own;
+    getrlimit(RLIMIT_FSIZE, &own);
+    const rlimit small{50'000, own.rlim_max};
+    P<IAudioFormat> format = makeFormat(named());
+    format->open();
+    setrlimit(RLIMIT_FSIZE, &small);
+    const auto write = [&, pcm = makeMusic({}, 200'000)] {
+        while (true) format->writeAudioChunk(makeChunk(pcm));
+    };
+    const std::string error = errorOf<CSonoraError>(write), again = errorOf<CSonoraError>(write);
+    setrlimit(RLIMIT_FSIZE, &own);
+    std::signal(SIGXFSZ, old);
+    EXPECT_EQ(0u, error.find("could not write " + named().string() + ": ")) << error;
+    EXPECT_NE(std::string::npos, error.find("File too large")) << error;
+    EXPECT_EQ(error, again);
+    EXPECT_NO_THROW(format->close());
+    EXPECT_EQ("dear to somebody", readFile(named()));
+}
+
+TEST_P(Failure, WhatIsNoReadableFile_IsRefusedWithTheReason) {
+    const auto path = named().string();
+    for (const auto& [command, reason] : {std::pair{"mkdir ", "Is a directory"},
+                                          {"mkfifo ", "is not a file"},
+                                          {"ln -s /proc/self/mem ", "could not "},
+                                          {"ln -s x ", "No such file or directory"}}) {
+        run("rm -rf " + path + " && " + command + path);
+        log->lines.clear();
+        EXPECT_FALSE(openSource(path));
+        EXPECT_NE(std::string::npos, log->lines.at(0).find(path)) << log->lines[0];
+        EXPECT_NE(std::string::npos, log->lines[0].find(reason)) << log->lines[0];
     }
 }
 
@@ -241,7 +279,7 @@ TEST_F(CPluginTest, FlacThatChangesItsRate_EndsThere) {
 }
 
 TEST_F(CPluginTest, CutOffWriting_LeavesAFileThatPlaysUpToItsLastHalfSecond) {
-    const std::string pcm = makeMusic({}, 3 * 44100);
+    const std::string pcm = makeMusic({}, 2 * 44100);
     std::vector<P<IAudioFormat>> formats;
     for (const SFormatCase& row : kFormatCases) {
         formats.push_back(makeFormat(folder / ("x." + std::string(row.extension))));
@@ -274,9 +312,7 @@ TEST_F(CPluginTest, RefusedShape_StatesWhyAndKeepsTheOldFile) {
         SShape shape;
         const char* reason;
     } refused[] = {
-        {"x.flac",
-         {44100, 9, 2},
-         "FLAC files hold 1 to 8 channels at up to 1048575 Hz, not 9 channels at 44100 Hz"},
+        {"x.flac", {44100, 9, 2}, "1 to 8 channels at up to 1048575 Hz, not 9 channels at 44100 Hz"},
         {"x.flac", {2000000, 2, 2}, "not 2 channels at 2000000 Hz"},
         {"x.mp3", {96000, 2, 2}, "44.1 or 48 kHz, not 2 channels at 96000 Hz"},
         {"x.mp3", {44100, 3, 2}, "MP3 files hold 1 or 2 channels"},

@@ -8,19 +8,17 @@
 #include "sonora2/media/IMediaDescription.h"
 #include "sonora2/plugins/PluginHandler.h"
 #include "support/Files.h"
+#include "support/LogLines.h"
 #include "support/TempFolder.h"
 
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
 #include <cstring>
-#include <mutex>
 #include <random>
 #include <set>
 #include <stdexcept>
 #include <string>
-#include <sys/inotify.h>
-#include <unistd.h>
 
 namespace tests {
 
@@ -36,37 +34,17 @@ struct SShape {
     int frameBytes() const { return channels * bytes; }
 };
 
-// Counts how often a file is opened.
-class COpenCounter {
-public:
-    explicit COpenCounter(const std::filesystem::path& path) : m_queue(inotify_init1(IN_NONBLOCK)) {
-        // Equal events in a row would be merged; a close in between keeps them apart.
-        inotify_add_watch(m_queue, path.c_str(), IN_OPEN | IN_CLOSE);
+// The greatest difference between two 16-bit signals over their common length.
+inline int getDistance16(const std::string& a, const std::string& b) {
+    int distance = 0;
+    for (size_t i = 0; i + 1 < std::min(a.size(), b.size()); i += 2) {
+        int16_t x, y;
+        std::memcpy(&x, &a[i], 2);
+        std::memcpy(&y, &b[i], 2);
+        distance = std::max(distance, std::abs(x - y));
     }
-    ~COpenCounter() { ::close(m_queue); }
-    int count() {                 // since the last call
-        inotify_event events[64]; // without names, as of a single file
-        const ssize_t got = std::max<ssize_t>(::read(m_queue, events, sizeof(events)), 0);
-        return static_cast<int>(std::count_if(events, events + got / sizeof(*events),
-                                              [](const auto& event) { return event.mask & IN_OPEN; }));
-    }
-
-private:
-    int m_queue;
-};
-
-class CLogLines : public peru::CObject, public sonora2::common::ILogManager {
-public:
-    void log(int32_t, const P<peru::IString>& line) override {
-        std::lock_guard lock(m_mutex);
-        lines.push_back(text(line));
-    }
-    void logException(const peru::CException& exception) override { log(0, exception.getDescription()); }
-    std::vector<std::string> lines;
-
-private:
-    std::mutex m_mutex;
-};
+    return distance;
+}
 
 class CPluginTest : public ::testing::Test {
 protected:

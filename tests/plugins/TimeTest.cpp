@@ -2,6 +2,8 @@
 #include "plugins/PluginFixture.h"
 
 #include "sonora2/context/SonoraError.h"
+#include "sonora2/media/ISalvage.h"
+#include "sonora2/media/ITwinSource.h"
 
 namespace tests {
 
@@ -66,35 +68,34 @@ TEST_P(Time, StartTime_MovesTheBeginning) {
     EXPECT_THROW(source->setStartTime(-1.0), sonora2::common::CSonoraError);
 }
 
-// A click keeps its time at any rate, and the length is that of the file.
-TEST_P(Time, Conversion_KeepsAClickInPlace) {
-    for (int rate : {48000, 22050, 44100, 96000, 32000}) {
-        SCOPED_TRACE(rate);
-        std::string pcm(kFrames * 4, '\0');
-        const int at = 60000;
-        for (int i = -2; i <= 2; ++i) { // wide enough for the lowest rate
-            const int16_t height = static_cast<int16_t>(24000 * (3 - std::abs(i)) / 3);
-            for (int channel = 0; channel < 2; ++channel)
-                std::memcpy(&pcm[((at + i) * 2 + channel) * 2], &height, 2);
-        }
-        P<IAudioFormat> format = makeFormat(named());
-        format->setAudioQuality(1.0);
-        writeAll(format, pcm);
-        const std::string converted = readAll(openSource(named(), {rate, 1, 2}));
-        ASSERT_EQ(std::llround(static_cast<double>(kFrames) * rate / 44100.0), converted.size() / 2);
-        double weight = 0.0;
-        double moment = 0.0;
-        for (size_t i = 0; i < converted.size() / 2; ++i) {
-            int16_t value;
-            std::memcpy(&value, &converted[i * 2], 2);
-            const double energy =
-                static_cast<double>(value) * value; // squaring makes a codec's noise negligible
-            weight += energy;
-            moment += energy * static_cast<double>(i);
-        }
-        // In frames of the delivered rate.
-        EXPECT_NEAR(at * (rate / 44100.0), moment / weight, 0.75);
+// Another thread may read a part of a file whose frames do not depend on where reading starts.
+TEST_P(Time, Twin_DeliversTheSameFrames) {
+    using sonora2::common::ITwinSource;
+    const auto path = writeMusic();
+    const std::string all = read(path);
+    P<IAudioSource> source = openSource(path);
+    const auto part = peru::interfaceCast<ITwinSource>(source);
+    EXPECT_EQ(kFrames, part->getFrameCount());
+    source->setStartTime(0.5); // does not count
+    for (const auto& [wanted, reached] : {std::pair{-5, 0}, {kFrames + 5, kFrames}, {70001, 70001}}) {
+        part->skipToFrame(wanted);
+        EXPECT_EQ(reached, part->getFrame());
     }
+    P<IAudioSource> twin = part->createTwin();
+    EXPECT_TRUE(readAll(source) == all.substr(70001 * 4));
+    const std::string direct = "wav rf64 w64 flac mp3"; // without swapped bytes or long memory
+    ASSERT_EQ(direct.find(GetParam().extension) != direct.npos, static_cast<bool>(twin));
+    if (!twin) return;
+    peru::interfaceCast<ITwinSource>(twin)->skipToFrame(50003);
+    EXPECT_TRUE(readAll(twin) == all.substr(50003 * 4));
+    peru::interfaceCast<sonora2::common::ISalvage>(source)->setSalvage(true);
+    EXPECT_FALSE(part->createTwin());
+    peru::interfaceCast<sonora2::common::ISalvage>(source)->setSalvage(false);
+    writeFile(named("other"), makeMusic({}, 5000));
+    std::filesystem::rename(named("other"), path);
+    EXPECT_FALSE(part->createTwin()) << "the file has been replaced";
+    source->close();
+    EXPECT_THROW(part->createTwin(), sonora2::common::CSonoraError);
 }
 
 TEST_P(Time, ShapesThatCannotBeHad_AreDeclined) {
@@ -107,15 +108,14 @@ TEST_P(Time, ShapesThatCannotBeHad_AreDeclined) {
     EXPECT_FALSE(openSource(named("missing")));
 }
 
-TEST_P(Time, AcceptedFile_IsOpenedOnce) {
-    const auto path = writeMusic();
-    COpenCounter counter(path);
-    P<IAudioSource> source = openSource(path);
-    EXPECT_TRUE(source->isOpened());
-    EXPECT_EQ(kFrames * 4u, readAll(source).size());
-    EXPECT_EQ(1, counter.count());
-    EXPECT_FALSE(handler->createAudioSource(toURI(path), 44100, 2, 2, false)->isOpened());
-    EXPECT_EQ(1, counter.count());
+TEST_F(CPluginTest, AcceptedFile_StaysOpenIfWanted) {
+    using namespace sonora2::common;
+    writeFile(folder / "x.wav", makeMusic({}, 100));
+    const ISonoraPlugin::SSourceParams params;
+    const auto plugin = handler->getPlugin(0);
+    for (const bool keep : {true, false})
+        EXPECT_EQ(keep,
+                  plugin->tryCreateSource(toURI(folder / "x.wav"), kAudioSource, keep, &params)->isOpened());
 }
 
 // The read-ahead thread can be stopped at any moment.

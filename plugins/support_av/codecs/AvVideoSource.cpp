@@ -56,18 +56,22 @@ void CAvVideoSource::open() {
     if (isOpened()) return;
     const CAvLog log(m_context->getLogManager());
     try {
-        m_demuxer = std::make_unique<CDemuxer>(m_file, AVMEDIA_TYPE_VIDEO);
-        openCodec();
-        readProperties();
-        readNext();
-        if (!m_hasNext)
-            failToOpen(m_file, peru::localize("sonora2.av.NoPicture", "no picture of it can be decoded"));
+        start();
         fitSize(m_frame->width, m_frame->height);
-        if (m_startTime > 0.0) goTo(m_startTime + m_origin, m_startTime + m_origin);
+        if (m_startTime > 0.0) find(m_origin + m_startTime);
     } catch (...) {
         close();
         throw;
     }
+}
+
+void CAvVideoSource::start() {
+    m_demuxer = std::make_unique<CDemuxer>(m_file, AVMEDIA_TYPE_VIDEO);
+    openCodec();
+    readProperties();
+    readNext();
+    if (!m_hasNext)
+        failToOpen(m_file, peru::localize("sonora2.av.NoPicture", "no picture of it can be decoded"));
 }
 
 void CAvVideoSource::openCodec() {
@@ -112,6 +116,7 @@ void CAvVideoSource::fitSize(int width, int height) {
 
 void CAvVideoSource::close() {
     m_hasNext = false;
+    m_failure = nullptr;
     m_scaler.reset();
     m_codec.reset();
     m_demuxer.reset();
@@ -146,22 +151,35 @@ double CAvVideoSource::peekNextPictureTimestamp() {
 
 P<common::ISonoraPicture> CAvVideoSource::getNextPicture() {
     requireOpened();
+    if (m_failure) std::rethrow_exception(std::exchange(m_failure, nullptr));
     if (!m_hasNext) return nullptr;
     const CAvLog log(m_context->getLogManager());
     P<common::ISonoraPicture> picture = makePicture();
-    readNext();
+    try {
+        readNext();
+    } catch (...) {
+        m_failure = std::current_exception(); // to be thrown after this picture
+    }
     return picture;
 }
 
 void CAvVideoSource::skipToTime(double fTimestamp) {
     requireOpened();
     const CAvLog log(m_context->getLogManager());
-    const double time = m_origin + m_startTime + std::max(fTimestamp, 0.0);
+    find(m_origin + m_startTime + std::max(fTimestamp, 0.0));
+}
+
+void CAvVideoSource::find(double time) {
     for (const double back : kStepsBack)
         if (goTo(time, time - back)) return;
     close();
-    open();
-    while (m_hasNext && m_nextTime < time - kSameTime) readNext();
+    try {
+        start();
+        advanceTo(time);
+    } catch (...) {
+        close();
+        throw;
+    }
 }
 
 // Starts to decode at a key picture near `from`; false if that is behind `time`.
@@ -171,8 +189,14 @@ bool CAvVideoSource::goTo(double time, double from) {
     avcodec_flush_buffers(m_codec.get());
     m_flushed = false;
     m_failures = 0;
+    m_failure = nullptr;
     readNext();
     if (!m_hasNext || m_nextTime > time + m_frameDuration) return false;
+    advanceTo(time);
+    return true;
+}
+
+void CAvVideoSource::advanceTo(double time) {
     const Frame last(av_frame_alloc());
     if (!last) throw std::bad_alloc();
     double lastTime = 0.0;
@@ -187,10 +211,10 @@ bool CAvVideoSource::goTo(double time, double from) {
         m_nextTime = lastTime;
         m_hasNext = true;
     }
-    return true;
 }
 
 void CAvVideoSource::readNext() {
+    m_hasNext = false; // also after a failure
     m_hasNext = decode();
     if (!m_hasNext) return;
     const int64_t timestamp = m_frame->best_effort_timestamp;

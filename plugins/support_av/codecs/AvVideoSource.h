@@ -7,6 +7,7 @@
 #include "sonora2/media/ISonoraPicture.h"
 #include "sonora2/media/IVideoSource.h"
 
+#include <exception>
 #include <vector>
 
 namespace sonora2::plugins::av {
@@ -26,7 +27,7 @@ public:
     void skipToTime(double fTimestamp) override;
     double getDuration() override;
     int getBufferStatus() override { return isEOF() ? 100 : 0; }
-    bool isEOF() override { return !m_hasNext; }
+    bool isEOF() override { return !m_hasNext && !m_failure; }
     void setStartTime(double fStartTime) override;
     double getStartTime() override { return m_startTime; }
     P<peru::IURI> getURI() override { return m_file.uri; }
@@ -46,13 +47,16 @@ public:
     int getFrameRateDen() override { return m_frameRate.den; }
 
 private:
+    void start(); // at the beginning of the file
     void openCodec();
     void readProperties();
     void fitSize(int width, int height);
     void readNext();
     bool decode();
     bool sendPacket();
+    void find(double time); // in the file
     bool goTo(double time, double from);
+    void advanceTo(double time); // to the last picture if there is none at or after the time
     void requireOpened() const;
     P<common::ISonoraPicture> makePicture(); // readNext() has to follow
     P<peru::IMemoryBlock> makeBlock(AVPixelFormat format, const std::vector<CFrameBlock::SPlane>& planes);
@@ -79,8 +83,9 @@ private:
     Frame m_frame; // the next one
     Scaler m_scaler;
     bool m_hasNext = false;
-    double m_nextTime = 0.0; // in the file
-    int m_failures = 0;      // packets in a row that could not be decoded
+    std::exception_ptr m_failure; // of reading the picture after the one delivered last
+    double m_nextTime = 0.0;      // in the file
+    int m_failures = 0;           // packets in a row that could not be decoded
     bool m_flushed = false;
 };
 
