@@ -90,6 +90,21 @@ TEST(Equalizer, WidthsSaturateInsteadOfWrapping) {
             << bits;
 }
 
+TEST(Equalizer, ChannelsAreIndependent) {
+    const SSound sound = makeNoise(44100, 3, 16, 3000);
+    for (const int preset : {1, 2, 12}) {
+        const SSound all = equalize(sound, preset);
+        for (size_t channel = 0; channel < 3; ++channel) {
+            SSound one{44100, 1, 16, {}}, expected = one;
+            for (size_t at = 2 * channel; at < sound.samples.size(); at += 6) {
+                one.samples += sound.samples.substr(at, 2);
+                expected.samples += all.samples.substr(at, 2);
+            }
+            EXPECT_TRUE(equalize(one, preset) == expected) << preset << " " << channel;
+        }
+    }
+}
+
 TEST(Equalizer, FormatsThatDoNotExistAreLeftAlone) {
     SSound low = makeNoise(8000, 1, 16, 4000);
     EXPECT_FALSE(equalize(low, 14) == low) << "the bands below half the rate have an effect";

@@ -141,6 +141,26 @@ TEST(Loudness, AlbumsFloatsAndSoundThatCannotBeMeasured) {
     TONEWRIGHT_Analysator* const album[] = {loud.get(), quiet.get()};
     const double together = getAnalysatorLoudness(album, 2), peak = truePeakOf(loud);
     EXPECT_NEAR(together, 10 * std::log10((1 + decibels(-12)) / 2) - 20, 0.1);
+    EXPECT_TRUE(std::isnan(getAnalysatorLoudness(nullptr, 1)) && std::isnan(getAnalysatorLoudness(album, 0)));
+    EXPECT_TRUE(std::isnan(getAnalysatorRange(nullptr, 1)) && std::isnan(getAnalysatorRange(album, 0)));
+    // The peaks of what follows, from bytes at any address.
+    for (const int bits : {8, 16, 24, 32}) {
+        const SSound high = make(48000, 2, bits, 0.2, [](double t, int) { return 0.5 * tone(1000, t); });
+        const SSound low = make(48000, 2, bits, 0.2, [](double t, int) { return 0.25 * tone(1000, t); });
+        const Analysator both = measure(high);
+        EXPECT_EQ(forgetAnalysatorPeaks(both.get()), 1);
+        const std::string shifted = "x" + low.samples;
+        both->operations->analyse(both.get(), shifted.data() + 1, static_cast<int64_t>(low.samples.size()));
+        for (const bool isFinished : {false, true}) {
+            double sample = 0, truth = 0;
+            if (isFinished) finishAnalysator(both.get());
+            EXPECT_EQ(getAnalysatorPeaks(both.get(), &sample, &truth), 1);
+            EXPECT_NEAR(sample, 0.25, 0.01) << bits;
+            EXPECT_NEAR(truth, 0.3, 0.1) << bits;
+        }
+        EXPECT_EQ(forgetAnalysatorPeaks(both.get()), 0);
+    }
+    EXPECT_EQ(forgetAnalysatorPeaks(nullptr) + forgetAnalysatorPeaks(measure(at(-20), 0).get()), 0);
     finishAnalysator(loud.get());
     loud->operations->analyse(loud.get(), at(0).samples.data(), 96000);
     EXPECT_EQ(getAnalysatorLoudness(album, 2), together);

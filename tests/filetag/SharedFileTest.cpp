@@ -1,6 +1,5 @@
 // Several tags are stored to one file at the same time.
 #include "Support.h"
-#include "filetag/FileTagFactory.h"
 #include "filetag/TagTransfer.h"
 
 #include <thread>
@@ -37,7 +36,7 @@ TEST_P(SharedFile, NoStoreIsLost) {
     threads.emplace_back([&] {
         for (const tests::SField& field : tests::kFields) {
             if (std::count(names.begin(), names.end(), std::string(field.name)) == 0) continue;
-            const P<filetag::IFileTag> tag = filetag::CFileTagFactory::get()->create(tests::toURI(file));
+            const P<filetag::IFileTag> tag = tests::open(file);
             ((*tag).*field.set)(field.name);
             std::this_thread::sleep_for(std::chrono::milliseconds(10)); // so that others store meanwhile
             tag->store();
@@ -45,8 +44,7 @@ TEST_P(SharedFile, NoStoreIsLost) {
     });
     for (std::thread& thread : threads) thread.join();
 
-    const tests::CTexts fields =
-        tests::readFields(*filetag::CFileTagFactory::get()->create(tests::toURI(file)));
+    const tests::CTexts fields = tests::readFields(*tests::open(file));
     for (const char* name : names) EXPECT_EQ(fields.at(name), name);
     std::map<std::string, std::string> found;
     for (const filetag::STagField& field : filetag::readAllTags(tests::toURI(file)).fields)

@@ -2,7 +2,6 @@
 // format.
 #include "FaultyCalls.h"
 #include "Support.h"
-#include "filetag/FileTagFactory.h"
 
 #include <gmock/gmock.h>
 
@@ -35,7 +34,7 @@ protected:
     // Changes the title and adds a text that makes the tag larger. The returned operation stores the tag and
     // reports "stored" or the error text.
     std::function<std::string()> prepare() const {
-        const P<filetag::IFileTag> tag = make<filetag::CFileTagFactory>()->create(tests::toURI(getFile()));
+        const P<filetag::IFileTag> tag = tests::open(getFile());
         tag->setTitle("Another title");
         tag->setComment(CString::fromUTF8(std::string(9000, 'c')));
         return [tag] { return report([&tag] { tag->store(); }); };
@@ -124,7 +123,7 @@ TEST_P(StoreFaults, HalfAWriteInPlaceIsUndone) {
     if (GetParam() == std::string("wav")) return; // always replaced
     m_folder.write(getFile().filename(), m_new);
     const auto change = [this] {
-        const P<filetag::IFileTag> tag = make<filetag::CFileTagFactory>()->create(tests::toURI(getFile()));
+        const P<filetag::IFileTag> tag = tests::open(getFile());
         tag->setTitle("Changed title");
         return tag;
     };
@@ -180,9 +179,7 @@ TEST_P(StoreFaults, ErrorsOfThePlaceNameTheFile) {
     setModes(0777, 0000);
     expectError([this]() -> std::function<std::string()> {
         if (::getuid() == 0 && ::setuid(65534) != 0) ::_exit(1);
-        return [this] {
-            return report([this] { make<filetag::CFileTagFactory>()->create(tests::toURI(getFile())); });
-        };
+        return [this] { return report([this] { tests::open(getFile()); }); };
     });
 }
 

@@ -1,6 +1,7 @@
 // Sound files of every format, and access to other programs that read and write their tags.
 #pragma once
 
+#include "filetag/FileTagFactory.h"
 #include "filetag/ICoverArtFileTag.h"
 #include "peru/Errors.h"
 #include "support/Files.h"
@@ -47,6 +48,10 @@ inline P<peru::IString> fromStandard(const std::string& utf8) {
 inline std::string toStandard(const P<peru::IString>& text) {
     return std::wstring_convert<std::codecvt_utf8_utf16<char16_t>, char16_t>().to_bytes(
         peru::CString::toStdU16String(text));
+}
+
+inline P<filetag::IFileTag> open(const std::filesystem::path& file) {
+    return filetag::CFileTagFactory::get()->create(toURI(file));
 }
 
 inline CTexts readFields(const filetag::IFileTag& tag) {

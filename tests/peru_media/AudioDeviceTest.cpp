@@ -24,6 +24,7 @@ using tests::countEntries;
 using tests::CSoundServer;
 using tests::errorOf;
 using tests::text;
+using tests::withoutSilence;
 
 namespace {
 
@@ -37,15 +38,6 @@ template <class Condition> bool waitFor(Condition condition, int seconds = 60) {
     const auto end = Clock::now() + std::chrono::seconds(seconds);
     while (!condition() && Clock::now() < end) std::this_thread::sleep_for(std::chrono::milliseconds(1));
     return condition();
-}
-
-// Without silent frames: a busy machine may leave gaps.
-std::string withoutSilence(const std::string& samples, size_t from = 0) {
-    static const std::string kSilence(kFrameBytes, '\0');
-    std::string sound;
-    for (size_t at = from; at + kFrameBytes <= samples.size(); at += kFrameBytes)
-        if (samples.compare(at, kFrameBytes, kSilence) != 0) sound.append(samples, at, kFrameBytes);
-    return sound;
 }
 
 class AudioDevice : public testing::Test {

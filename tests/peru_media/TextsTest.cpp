@@ -1,11 +1,8 @@
 #include "peru/media/AudioFormat.h"
 #include "peru/media/DeviceNames.h"
 #include "peru/media/Errors.h"
-#include "support/Process.h"
 
 #include <gtest/gtest.h>
-
-#include <filesystem>
 
 using namespace peru;
 using namespace peru::media;
@@ -24,14 +21,6 @@ TEST(DeviceNames, TellHostApiAndDefault) {
                     ->equals(CString::fromUTF8("ID: 3 - 100 % K\xC3\xB6nig (UNKNOWN)")));
     EXPECT_TRUE(
         getDeviceListName(0, "default", "WASAPI", true)->equals("ID: 0 - default (WASAPI) [DEFAULT]"));
-}
-
-// Programs without sound must not load it.
-TEST(SoundEngine, IsNotLoadedAtStartUp) {
-    const std::string program = std::filesystem::read_symlink("/proc/self/exe");
-    const std::string libraries = tests::run({program}, {}, {{"LD_TRACE_LOADED_OBJECTS", "1"}}).out;
-    EXPECT_NE(libraries.find("libperu_media"), std::string::npos) << libraries;
-    EXPECT_EQ(libraries.find("libportaudio"), std::string::npos);
 }
 
 TEST(MediaErrors, CarryTheEnginesText) {

@@ -1,6 +1,7 @@
 #include "LanguageSupport.h"
 #include "peru/Errors.h"
 #include "support/Environment.h"
+#include "zvr_lang_manager/InstalledLanguages.h"
 
 #include <gmock/gmock.h>
 
@@ -68,10 +69,14 @@ TEST_F(LanguageManager, LoadsOnlyTheBlocksForItsLanguageAndPack) {
     const std::string german = chunk("lang", stringBytes(u"deu-DE"));
     folder.write(
         "peru-de-DE.zvrLang",
-        languageFile(u"de-DE", textBlock({{u"a", u"1"}, {u"b", u"1"}, {u"c", u"1"}}) +
-                                   textBlock({{u"a", u"2"}}, austrian) +
-                                   textBlock({{u"b", u"2"}}, german + chunk("RSID", stringBytes(u"Peru"))) +
-                                   textBlock({{u"c", u"2"}}, chunk("RSID", stringBytes(u"common")))));
+        languageFile(u"de-DE",
+                     textBlock({{u"a", u"1"}, {u"b", u"1"}, {u"c", u"1"}}) +
+                         textBlock({{u"a", u"2"}}, austrian) +
+                         textBlock({{u"b", u"2"}}, german + chunk("RSID", stringBytes(u"Peru"))) +
+                         textBlock({{u"c", u"2"}}, chunk("RSID", stringBytes(u"common"))) +
+                         chunk("vers", intBytes(7)) + chunk("cmnt", stringBytes(u"none")) +
+                         chunk("xdid", intBytes(2) + stringBytes(u"ZVR_LANG_AUTHOR") + stringBytes(u"me") +
+                                           stringBytes(u"other") + stringBytes(u"x"))));
     addPack("peru");
     setLanguage("de-DE");
     EXPECT_EQ(get("a") + get("b") + get("c"), "121");
@@ -79,6 +84,8 @@ TEST_F(LanguageManager, LoadsOnlyTheBlocksForItsLanguageAndPack) {
     const auto& file = manager->getPacks()[0]->getFiles()[0];
     EXPECT_EQ(text(file->getEnglishName()) + text(file->getNativeName()), "LN");
     EXPECT_EQ(text(file->getApplicationId()) + text(file->getApplicationName()), "idname");
+    EXPECT_EQ(text(file->getComment()) + text(file->getAuthor()) + std::to_string(file->getVersion()),
+              "noneme7");
 }
 
 TEST_F(LanguageManager, CallsAllListenersInOrderAfterTheChange) {
@@ -138,6 +145,19 @@ TEST_F(LanguageManager, FindsTheLanguageOfTheLocale) {
                                                id.valid ? std::string("System Language ID: ") + c.id
                                                         : std::string("could not detect systemm language")));
     }
+}
+
+TEST_F(LanguageManager, AppliesALocaleThatHasTexts) {
+    folder.write("peru-cy-GB.zvrLang", languageFile(u"cy-GB", textBlock({{u"a", u"un"}})));
+    const CEnvironment path("TONEWRIGHT_LANG_PATH", folder.path().string());
+    for (const char* english : {"", "C", "POSIX", "C.UTF-8", "en_GB", "en-US", "eng.UTF-8", "en@x"}) {
+        EXPECT_TRUE(zvr_lang::applyLocale("cy_GB.UTF-8"));
+        EXPECT_EQ(get("a"), "un");
+        EXPECT_TRUE(zvr_lang::applyLocale(english));
+        EXPECT_EQ(get("a"), "default") << english;
+    }
+    for (const char* unknown : {"eo", "xx_GB", "haw_US"})
+        EXPECT_FALSE(zvr_lang::applyLocale(unknown)) << unknown;
 }
 
 TEST_F(LanguageManager, LeavesOutDamagedFiles) {

@@ -2,15 +2,13 @@
 #pragma once
 
 #include "../chf/MemoryStream.h"
-#include "peru/log/LogBase.h"
 #include "peru/strings/IStringLocalizer.h"
-#include "support/Files.h"
+#include "support/PeruLogLines.h"
 #include "support/TempFolder.h"
 #include "zvr_lang_manager/LanguageManager.h"
 
 #include <gtest/gtest.h>
 
-#include <mutex>
 #include <string>
 #include <vector>
 
@@ -49,24 +47,6 @@ inline std::string languageFile(const std::u16string& language, const std::strin
 
 class CLanguageTest : public testing::Test {
 protected:
-    class CLines : public peru::CLogBase {
-    public:
-        void enterArea(const peru::P<peru::IString>&) override {}
-        void leaveArea(const peru::P<peru::IString>&) override {}
-        void write(const peru::SLogMessage& message) override {
-            std::scoped_lock lock(m_mutex);
-            m_lines.push_back(text(message.text));
-        }
-        std::vector<std::string> take() {
-            std::scoped_lock lock(m_mutex);
-            return std::exchange(m_lines, {});
-        }
-
-    private:
-        std::mutex m_mutex;
-        std::vector<std::string> m_lines;
-    };
-
     void SetUp() override { peru::getLogManager()->addLog(lines, peru::CString::empty()); }
     void TearDown() override {
         peru::getLogManager()->removeLog(lines, peru::CString::empty());
@@ -85,7 +65,7 @@ protected:
     static std::string get(const char* key) { return text(peru::localize(key, "default")); }
 
     CTempFolder folder;
-    peru::P<CLines> lines = peru::make<CLines>();
+    peru::P<CPeruLogLines> lines = peru::make<CPeruLogLines>();
     peru::P<zvr_lang::CLanguageManager> manager = peru::make<zvr_lang::CLanguageManager>();
 };
 

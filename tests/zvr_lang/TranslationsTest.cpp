@@ -2,31 +2,19 @@
 #include "LanguageSupport.h"
 #include "support/Process.h"
 
-#include <cstring>
+#include <nlohmann/json.hpp>
+
 #include <map>
 
 namespace {
 
 using namespace tests;
 
-// The texts of a compiled gettext catalogue by context, which is the key.
-std::map<std::string, std::string> readCatalogue(const std::string& bytes) {
-    const auto number = [&](size_t position) {
-        uint32_t value = 0;
-        std::memcpy(&value, bytes.data() + position, sizeof value);
-        return value;
-    };
-    std::map<std::string, std::string> texts;
-    for (uint32_t i = 0; i < number(8); ++i) {
-        const auto string = [&](uint32_t table) {
-            return bytes.substr(number(table + i * 8 + 4), number(table + i * 8));
-        };
-        const std::string id = string(number(12));
-        if (const size_t context = id.find('\4'); context != std::string::npos)
-            texts[id.substr(0, context)] = string(number(16));
-    }
-    return texts;
-}
+// Prints the texts of a compiled catalogue by context, which is the key.
+constexpr const char* kRead =
+    "import gettext, json, sys\n"
+    "texts = gettext.GNUTranslations(open(sys.argv[1], 'rb'))._catalog.items()\n"
+    "print(json.dumps({id.split('\\4')[0]: text for id, text in texts if '\\4' in id}))";
 
 } // namespace
 
@@ -42,7 +30,8 @@ TEST_F(Translations, AreReadFromTheLanguageFilesAsGettextReadsThem) {
         if (each.path().extension() != ".po") continue;
         const std::string catalogue = folder / "texts.mo";
         if (run({"msgfmt", each.path(), "-o", catalogue}).exitCode == 127) GTEST_SKIP() << "no msgfmt";
-        const auto texts = readCatalogue(readFile(catalogue));
+        const SProcessResult read = run({"python3", "-c", kRead, catalogue});
+        const auto texts = nlohmann::json::parse(read.out).get<std::map<std::string, std::string>>();
         ASSERT_FALSE(texts.empty()) << each.path();
         ++languages;
         for (const auto& pack : manager->getPacks())

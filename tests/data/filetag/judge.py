@@ -47,6 +47,8 @@ def get_fields(name):
     file, kind = open_file(name)
     result = {}
     for field, key in zip(FIELDS, NAMES[kind]):
+        if kind == "xiph" and field == "comment" and key not in file.tags:
+            key = "description"  # the other name for it
         texts = as_texts(file.tags[key]) if key in file.tags else []
         result[field] = texts[0] if len(texts) == 1 else texts or ""
     return result
@@ -127,6 +129,7 @@ def set_pictures(name):
         file.tags.add(id3.TDRC(encoding=3, text=["1999"]))
     elif kind == "asf":
         file.tags["WM/Year"], file.tags["WM/Track"] = [asf.ASFWordAttribute(1999)], [asf.ASFDWordAttribute(7)]
+        file.tags["WM/Genre"] = [asf.ASFQWordAttribute(1 << 40)]
     else:
         file.tags["year"], file.tags["tracknum"] = ["1999"], ["7"]
     file.save()

@@ -51,13 +51,21 @@ def make_tags():
         yield "plain", tag(v, many(v))
         yield "no byte order mark", tag(v, frame(v, "TPE2", utf16("K\u00fcnstler")) + frame(
             v, "TXXX", utf16("k\u00e9y\0v\u00e4lue")) + many(v))
+        for name, head, text, rest in (("APIC", b"PNG\3" if v == 2 else b"image/png\0\3", "d\u00e9\0", PICTURE), (
+                "GEOB", b"app/x\0", "f\u00e9\0d\u00e9\0", b"data"), ("USLT", b"eng", "d\u00e9\0la", b""), (
+                "WXXX", b"", "d\u00e9\0", b"http://x")):
+            yield "no mark in " + name, tag(v, frame(v, name, b"\1" + head + utf16(text)[1:] + rest))
         yield "empty frame", tag(v, frame(v, "TPE2", b"") + many(v))
         yield "broken frame", tag(v, frame(v, "POPM", b"me") + many(v))
         yield "beyond the end", tag(v, many(v) + frame(v, "TPUB", b"\0publisher", size=5000))
         if v < 4:
+            yield "year", tag(v, frame(v, "TYER", b"\0" + b"1999") + many(v))
             yield "unsynchronised", tag(v, many(v), 0x80)
-            yield "date", tag(v, frame(v, "TYER", b"\0" + b"1999") + frame(v, "TDAT", b"\0" + b"0104") + frame(
-                v, "TIME", b"\0" + b"1305") + many(v))
+            for day, time in (b"0104", b"1305"), (b"3112", b"0000"), (b"0101", b"2359"):
+                yield "date", tag(v, frame(v, "TYER", b"\0" + b"1999") + frame(v, "TDAT", b"\0" + day) + frame(
+                    v, "TIME", b"\0" + time) + many(v))
+            for genre in b"17", b"(17)", b"(17)(4)Disco", b"((note", b"(CR)":
+                yield "genre", tag(v, frame(v, "TCON", b"\0" + genre))
     others = b"".join(frame(3, name, body) for name, body in {
         "TORY": b"\0" + b"1980", "IPLS": b"\0role\0Name\0", "RVAD": b"\3\x10\1\2\3\4"}.items())
     yield "only in v2.3", tag(3, others + many(3))
@@ -65,6 +73,12 @@ def make_tags():
     yield "extended header with checksum", tag(3, many(3), 0x40, struct.pack(">IHII", 10, 0x8000, 0, 0x12345678))
     yield "extended header", tag(4, many(4), 0x40, small(6) + b"\1\0")
     yield "compressed", tag(3, frame(3, "TPE2", struct.pack(">I", 8) + zlib.compress(b"\0squeeze"), b"\0\x80") + many(3))
+    yield "compressed", tag(4, frame(4, "TPE2", small(8) + zlib.compress(b"\0squeeze"), b"\0\x09") + many(4))
+    yield "unsynchronised frame", tag(4, frame(4, "TPE2", b"\0\xff\0\xf0\xff\0", b"\0\x02") + many(4))
+    yield "grouped", tag(3, frame(3, "TPE2", b"\7\0group", b"\0\x20") + many(3))
+    yield "grouped", tag(4, frame(4, "TPE2", b"\7" + small(6) + b"\0group", b"\0\x41") + many(4))
+    yield "linked picture", tag(2, frame(2, "APIC", b"\0-->\3desc\0http://x") + many(2))
+    yield "other picture", tag(2, frame(2, "APIC", b"\0JPG\4jpeg\0" + PICTURE) + many(2))
     yield "to be discarded", tag(3, frame(3, "TPE2", b"\0alter", b"\x80\0") + many(3))
     yield "plain size", tag(4, frame(3, "TPE2", b"\0" + b"x" * 300) + frame(3, "TPE3", b"\0" + b"x" * 400))
 
@@ -73,7 +87,8 @@ def read_frames(name):
     tags = id3.ID3(name)
     result = {}
     for key, value in tags.items():
-        text = [str(part).rsplit(":00", 1)[0] for part in value.text if part] if hasattr(value, "text") else None
+        end = 16 if key == "TDRC" else None  # without seconds
+        text = [str(part)[:end] for part in value.text if part] if hasattr(value, "text") else None
         result[key] = text or repr(value).replace("Encoding.UTF16", "").replace("Encoding.LATIN1", "")
     return result
 
