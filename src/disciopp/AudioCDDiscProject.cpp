@@ -50,7 +50,7 @@ void CAudioCDDiscProject::insertTrack(const DISCIO_PCMAudioStreamFuncs& funcs, v
         DISCIO_CreatePCMAudioStreamFromFuncs(getDiscio(), &funcs, user));
     if (!stream) {
         const CDISCIOPPException failure;
-        funcs.end(user);
+        if (funcs.end) funcs.end(user);
         throw failure;
     }
     if (DISCIO_DiscAudioInsertSegmentPCMAudioStream(getHandle(), stream.get(), place) != 1)

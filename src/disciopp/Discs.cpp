@@ -34,6 +34,7 @@ P<peru::IString> CDiscBase::getDisplayName() {
 }
 
 P<peru::IString> CDataDisc::getTitle() {
+    std::scoped_lock lock(m_mutex);
     const char16_t* found = DISCIO_DiscDataGetTitleW(m_handle.get());
     if (!found) throw CDISCIOPPException();
     const P<peru::IString> title = peru::newString(found);
@@ -60,6 +61,7 @@ int32_t CAudioCDDisc::getSegmentCount() {
 }
 
 P<peru::IString> CAudioCDDisc::getText(int32_t segment, int32_t text) {
+    std::scoped_lock lock(m_mutex);
     const char16_t* found = segment < 0
                                 ? DISCIO_DiscAudioGetMetaDataStringW(m_handle.get(), text)
                                 : DISCIO_DiscAudioGetSegmentMetaDataStringW(m_handle.get(), segment, text);

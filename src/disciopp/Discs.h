@@ -3,6 +3,8 @@
 
 #include "disciopp/IDrive.h"
 
+#include <mutex>
+
 namespace disciopp {
 
 class CDiscBase : public CBase, public virtual IDisc {
@@ -24,6 +26,7 @@ protected:
 
     const Handle<DISCIO_Disc> m_handle;
     const P<peru::IURI> m_root;
+    std::mutex m_mutex; // held while a text of the handle is copied, which the next call replaces
 };
 
 class CDataDisc : public CDiscBase {

@@ -17,7 +17,9 @@ P<peru::IString> CFileObject::getName() {
 
 P<peru::CFileTimes> CFileObject::getTimes() {
     constexpr int64_t kUnknown = peru::CFileTimes::kUnknown;
-    const int64_t written = m_entry.modified < 0 ? kUnknown : m_entry.modified * 1'000'000'000;
+    constexpr int64_t kNanoseconds = 1'000'000'000;
+    const bool isKnown = m_entry.modified >= 0 && m_entry.modified <= INT64_MAX / kNanoseconds;
+    const int64_t written = isKnown ? m_entry.modified * kNanoseconds : kUnknown;
     return peru::make<peru::CFileTimes>(kUnknown, kUnknown, written);
 }
 

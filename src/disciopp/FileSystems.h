@@ -22,7 +22,6 @@ protected:
 
 class CDataDiscFileSystem : public CFileSystemBase {
 public:
-    // `disc` has to outlive the objects, which its owner ensures with `owner`.
     CDataDiscFileSystem(const P<peru::IURI>& root, const P<IDisc>& disc)
         : CFileSystemBase(root), m_disc(disc) {}
     P<peru::IFileObject> getRoot() override;

@@ -59,7 +59,8 @@ bool CFreeDBInfoRetriever::runState(bool wait) {
 }
 
 void CFreeDBInfoRetriever::startQuery() {
-    m_query = peru::make<CFreeDBQueryCommand>(m_settings, *m_discs[m_attempts++]);
+    m_query = peru::make<CFreeDBQueryCommand>(m_settings, *m_discs[m_attempts]); // throws for bad settings
+    ++m_attempts;
     setCommand(m_query);
     m_state = EFreeDBState::query;
 }

@@ -63,6 +63,7 @@ TEST_F(SDiscs, AudioTracksAreFiles) {
     const P<peru::IFileObject> track = drive->getFileSystem()->getFileObject(uri);
     ASSERT_TRUE(track);
     EXPECT_EQ(track->getSize(), 2 * 2352);
+    EXPECT_EQ(text(track->getKind()), "application/x-cda");
     EXPECT_TRUE(track->getURI()->equals(uri));
     EXPECT_FALSE(drive->getFileSystem()->getFileObject(drive->getPath()->appendPath("Track1.cda")));
     EXPECT_THROW(track->enumerate(), peru::CFileError);
@@ -79,8 +80,9 @@ TEST_F(SDiscs, AudioTracksAreFiles) {
     for (const char* bad : {"discioppvirtualdisc:///Track01.cda", "discioppvirtualdiscaudiocd:///Track01.cda",
                             "file:///dev/null/Track01.cda", "file:///x/Track1.cda"})
         EXPECT_THROW(openTrack(peru::make<peru::CURI>(bad)), peru::CFileNotFoundError) << bad;
-    EXPECT_THROW(openTrack(peru::make<peru::CURI>("discioppdiscimage:///none.cue/Track01.cda")),
-                 CDISCIOPPException);
+    // The second one names no image, and is not the drive of this test either.
+    for (const char* bad : {"discioppdiscimage:///none.cue/Track01.cda", "discioppdiscimage:///Track01.cda"})
+        EXPECT_THROW(openTrack(peru::make<peru::CURI>(bad)), CDISCIOPPException) << bad;
     EXPECT_THROW(openTrack(peru::make<peru::CURI>("http://x/Track01.cda")), CUnknownURIScheme);
     EXPECT_EQ(errorOf([&] { openTrack(drive->getPath()->appendPath("Track13.cda")); }),
               "The specified object does not exist. (track 13)");
@@ -89,7 +91,9 @@ TEST_F(SDiscs, AudioTracksAreFiles) {
 TEST_F(SDiscs, FilesOfADataDiscAreFoundByTheirPath) {
     const CTempFolder content;
     std::filesystem::create_directories(content / "Some folder/inner");
-    content.write("Some folder/inner/file one", "12345");
+    std::filesystem::last_write_time(
+        content.write("Some folder/inner/file one", "12345"),
+        std::chrono::file_clock::from_sys(std::chrono::sys_seconds(std::chrono::seconds(1'000'000'000))));
     const std::string large = makeSectors(40, 1);
     content.write("Some folder/inner/large", large);
     ASSERT_EQ(run({"genisoimage", "-quiet", "-J", "-V", "", "-o", (folder / "d.iso").string(),
@@ -108,6 +112,12 @@ TEST_F(SDiscs, FilesOfADataDiscAreFoundByTheirPath) {
     ASSERT_TRUE(file);
     EXPECT_EQ(file->getSize(), 5);
     EXPECT_TRUE(file->getAttributes().readOnly);
+    EXPECT_FALSE(file->getAttributes().hidden);
+    EXPECT_EQ(file->getTimes()->getLastWriteTime(), 1'000'000'000'000'000'000);
+    EXPECT_EQ(text(file->getKind()) + text(files->getRoot()->getKind()),
+              "application/octet-streaminode/directory");
+    EXPECT_TRUE(files->getFileObject(drive->getPath()->appendPath("Some folder//inner/")));
+    EXPECT_FALSE(files->getFileObject(drive->getPath()->appendPath("Some")));
     const P<peru::IURI> image = peru::make<peru::CURI>(
         ("discioppdiscimage://" + (folder / "d.iso").string() + "/Some%20folder/inner/large").c_str());
     for (const P<peru::IURI>& each : {image, drive->getPath()->appendPath("Some folder/inner/large")}) {
@@ -120,9 +130,30 @@ TEST_F(SDiscs, FilesOfADataDiscAreFoundByTheirPath) {
             stream->read(part.data(), 1000);
             EXPECT_EQ(large.compare(static_cast<size_t>(at), 1000, part), 0) << at;
         }
-        EXPECT_THROW(stream->skip(1 << 30), peru::CEndOfStreamError);
+        EXPECT_TRUE(stream->getURI()->equals(each));
+        stream->reset();
+        const P<peru::IStreamMarker> start = stream->createMarker();
+        std::string all(large.size() + 1, '\0');
+        EXPECT_EQ(stream->readSome(all.data(), 100), 100);
+        EXPECT_EQ(stream->readSome(all.data() + 100, 40000), 32668) << "what is buffered";
+        EXPECT_EQ(stream->readSome(all.data() + 32768, 32768), 32768);
+        EXPECT_FALSE(stream->isAtEnd());
+        EXPECT_EQ(stream->readSome(all.data() + 65536, 40000), stream->getSize() - 65536);
+        EXPECT_TRUE(stream->isAtEnd());
+        EXPECT_EQ(stream->readSome(all.data(), 1), 0);
+        EXPECT_EQ(all, large + '\0');
+        start->restore();
+        stream->skip(94079);
+        EXPECT_EQ(stream->getPosition(), 94079);
+        EXPECT_THROW(stream->skip(2), peru::CEndOfStreamError);
+        stream->skip(1);
         stream->close();
-        EXPECT_THROW(stream->isAtEnd(), peru::CStreamClosedError);
+        const std::function<void()> uses[] = {
+            [&] { stream->isAtEnd(); },     [&] { stream->readSome(part.data(), 1); },
+            [&] { stream->skip(0); },       [&] { stream->seek(0); },
+            [&] { stream->getPosition(); }, [&] { stream->getSize(); },
+            [&] { stream->createMarker(); }};
+        for (const auto& use : uses) EXPECT_THROW(use(), peru::CStreamClosedError);
     }
     EXPECT_FALSE(tryOpenFile(uri->appendPath("below a file")));
     EXPECT_FALSE(tryOpenFile(drive->getPath()->appendPath("Some folder")));
@@ -139,6 +170,10 @@ TEST_F(SDiscs, WithoutAMediumEverythingIsEmpty) {
     EXPECT_FALSE(drive->testDisc());
     EXPECT_TRUE(list(drive->getFileSystem()->getRoot()).empty());
     EXPECT_THROW(drive->openTray(), CDISCIOPPException);
+    EXPECT_THROW(drive->closeTray(), CDISCIOPPException);
+    EXPECT_TRUE(drive->getReadSpeeds().empty());
+    for (const int32_t index : {-1, getDriveManager()->getDriveCount()})
+        EXPECT_THROW(getDriveManager()->getDriveAt(index), peru::CInvalidArgError);
     EXPECT_EQ(text(getMediumTypeText(2)), "CD-R");
     EXPECT_EQ(text(getMediumTypeText(0)), "None");
     EXPECT_EQ(text(getMediumTypeText(-1)), "Unknown");

@@ -1,4 +1,4 @@
-#include "discio2/DiscSupport.h"
+#include "discio2/ProjectSupport.h"
 #include "disciopp/AudioCDDiscProject.h"
 #include "disciopp/DataDiscProject.h"
 #include "disciopp/Errors.h"
@@ -35,6 +35,9 @@ TEST_F(Projects, DataProjectIsADiscAndAFileSystem) {
     project->addFile(source, root->appendPath("Outer/Inner/a.txt"), true);
     project->createFolders(root->appendPath("Outer/Empty/"));
     EXPECT_EQ(list(project->getRoot()), "Outer(Empty() Inner(a.txt ) ) ");
+    project->createFolders(peru::make<peru::CURI>("/Outer//Empty/Deep"));
+    project->addFile(source, root->appendPath("b"), true);
+    EXPECT_EQ(list(project->getRoot()), "Outer(Empty(Deep() ) Inner(a.txt ) ) b ");
     const P<peru::IFileObject> file = project->getFileObject(root->appendPath("Outer/Inner/a.txt"));
     ASSERT_TRUE(file);
     EXPECT_EQ(file->getSize(), 5);
@@ -46,44 +49,30 @@ TEST_F(Projects, DataProjectIsADiscAndAFileSystem) {
 }
 
 TEST_F(Projects, TracksAreOpenedByURIWhileTheProjectLives) {
-    static int s_ends = 0;
-    s_ends = 0;
-    DISCIO_PCMAudioStreamFuncs funcs{[](void*) { return 1.0; },
-                                     nullptr,
-                                     [](void*) { return 1; },
-                                     [](void*) {},
-                                     [](void*) { return 2; },
-                                     [](void*) { return 44100; },
-                                     [](void*) { return int64_t{588}; },
-                                     [](void*) { return 1; },
-                                     [](void*) {},
-                                     [](void*) { return 0; },
-                                     [](void*, void* pcm, int32_t frames, int32_t* delivered) {
-                                         std::fill_n(static_cast<int16_t*>(pcm), 2 * frames, int16_t{7});
-                                         *delivered = frames;
-                                         return 1;
-                                     },
-                                     [](void*) { return int64_t{-1}; },
-                                     [](void*, int64_t) { return 0; },
-                                     [](void*) { return int64_t{0}; },
-                                     [](void*) { ++s_ends; }};
+    SSource source(makeSectors(1, 1));
     auto project = peru::make<CAudioCDDiscProject>();
     EXPECT_EQ(project->getSegmentCount(), 0);
-    project->insertTrack(funcs, nullptr, -1);
-    EXPECT_THROW(project->insertTrack(funcs, nullptr, 5), CDISCIOPPException);
-    EXPECT_EQ(s_ends, 1);
+    project->insertTrack(SSource::getFuncs(), &source, -1);
+    EXPECT_THROW(project->insertTrack(SSource::getFuncs(), &source, 5), CDISCIOPPException);
+    EXPECT_EQ(source.ended, 1);
+    DISCIO_PCMAudioStreamFuncs incomplete = SSource::getFuncs();
+    incomplete.read = nullptr;
+    EXPECT_THROW(project->insertTrack(incomplete, &source, -1), CDISCIOPPException);
+    EXPECT_EQ(source.ended, 2);
     EXPECT_EQ(project->getSegmentCount(), 1);
+    const auto empty = peru::make<CAudioCDDiscProject>();
     const P<peru::IURI> track = project->getRootURI()->appendPath("Track01.cda");
     {
         const P<ITrackStream> stream = openTrack(track);
-        int16_t frame[2] = {};
+        std::string frame(4, '\0');
         int32_t delivered = 0;
         ASSERT_EQ(stream->get().funcs->open(stream->get().user), 1);
-        EXPECT_EQ(stream->get().funcs->read(stream->get().user, frame, 1, &delivered), 1);
-        EXPECT_EQ(frame[1], 7);
+        EXPECT_EQ(stream->get().funcs->read(stream->get().user, frame.data(), 1, &delivered), 1);
+        EXPECT_EQ(frame, source.pcm.substr(0, 4));
     }
     EXPECT_THROW(openTrack(project->getRootURI()->appendPath("Track02.cda")), CDISCIOPPException);
+    EXPECT_THROW(openTrack(empty->getRootURI()->appendPath("Track01.cda")), CDISCIOPPException);
     project.reset();
-    EXPECT_EQ(s_ends, 2);
+    EXPECT_EQ(source.ended, 3);
     EXPECT_THROW(openTrack(track), peru::CFileNotFoundError);
 }
