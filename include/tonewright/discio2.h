@@ -299,8 +299,9 @@ DISCIO_API int32_t DISCIO_DiscDataRemoveW(DISCIO_Disc* disc, const char16_t* pat
 
 /* How a project is written; combined with "|". */
 enum {
-    DISCIO_WRITE_DUMMY = 1,  /* with the laser off; drives only */
-    DISCIO_WRITE_BLANK = 2,  /* a rewritable medium that is not empty is blanked first; drives only */
+    DISCIO_WRITE_DUMMY = 1, /* with the laser off; drives only */
+    DISCIO_WRITE_BLANK =
+        2, /* a rewritable medium that is not empty is blanked, or overwritten; drives only */
     DISCIO_WRITE_VERIFY = 4, /* reads a medium back and compares it; images are always compared */
     DISCIO_WRITE_CD_TEXT = 8 /* writes the texts of an audio CD */
 };
@@ -334,11 +335,14 @@ DISCIO_API int32_t DISCIO_ProjectWriteImageW(DISCIO_Project* project, const char
 /* Writes a project to the medium in an optical drive, in one session that is closed. Returns when the drive
  * has finished. Tracks of audio CDs have at least 4 seconds. Fails with DISCIO_ERROR_DISC_NOT_EMPTY,
  * DISCIO_ERROR_DISC_NOT_WRITABLE or DISCIO_ERROR_NOT_ENOUGH_SPACE before anything is written; a later failure
- * spoils a medium that can be written once. `options` may be null. */
+ * spoils a medium that can be written once. The message of a failure, or of DISCIO_ERROR_ABORTED, then ends
+ * in "the medium is partly written". A medium that is overwritten in place (DVD+RW, DVD-RAM, BD-RE) and has
+ * contents needs DISCIO_WRITE_BLANK. `options` may be null. */
 DISCIO_API int32_t DISCIO_ProjectWriteDisc(DISCIO_Project* project, DISCIO_Drive* drive,
                                            const DISCIO_WriteOptions* options);
 /* Blanks a CD-RW or another rewritable medium; with `whole` not 0 all of it, which takes long, otherwise its
- * table of contents. Cannot be cancelled: the result of onProgress is ignored. `options` may be null. */
+ * table of contents. Cannot be cancelled: the result of onProgress is ignored. DISCIO_ERROR_NOT_SUPPORTED for
+ * media that are overwritten in place, except DVD-RW. `options` may be null. */
 DISCIO_API int32_t DISCIO_DriveBlankDisc(DISCIO_Drive* drive, int32_t whole,
                                          const DISCIO_WriteOptions* options);
 

@@ -19,12 +19,6 @@ namespace {
 constexpr gulong kGetIdLun = 0x5382, kGetBusNumber = 0x5386; // of the kernel's scsi.h
 constexpr int kCapacity = 359844;                            // blocks of 80 minutes
 
-std::string toBig(unsigned value, int bytes) {
-    std::string text;
-    for (int i = bytes; i-- > 0;) text += static_cast<char>(value >> 8 * i);
-    return text;
-}
-
 int toInt(const unsigned char* bytes) {
     return bytes[0] << 24 | bytes[1] << 16 | bytes[2] << 8 | bytes[3];
 }
@@ -68,6 +62,9 @@ void finish() {
     disc.samples.clear();
     for (const auto& [block, bytes] : burner.blocks)
         if (block >= 0) disc.samples += bytes;
+    if (burner.offset > 0) // it is off by as much when it reads
+        disc.samples.insert(0, static_cast<size_t>(burner.offset) * 4, '\0')
+            .resize(static_cast<size_t>(disc.starts.back()) * 2352);
     // The packs repeat themselves in the lead-in. The first of a block has the sequence number 0.
     disc.textPacks = burner.leadIn;
     for (size_t i = 18; i + 18 <= burner.leadIn.size(); i += 18)
@@ -151,7 +148,7 @@ bool answer(const unsigned char* command, const std::string& data, std::string& 
         return !reply.empty();
     }
     case 0x46: { // GET CONFIGURATION
-        const unsigned profile = burner.isRewritable ? 0x0A : 0x09;
+        const unsigned profile = burner.profile ? burner.profile : burner.isRewritable ? 0x0A : 0x09;
         const std::string features = toBig(0, 2) + "\3\4" + toBig(profile, 2) + std::string("\1\0", 2) +
                                      toBig(0x2E, 2) + std::string("\1\4\x6F\0\0\0", 6);
         reply = toBig(static_cast<unsigned>(features.size()) + 4, 4) + std::string(2, '\0') +
@@ -162,6 +159,7 @@ bool answer(const unsigned char* command, const std::string& data, std::string& 
         reply = toBig(32, 2) + std::string(32, '\0');
         reply[2] = static_cast<char>((disc.isBlank ? 0 : 0x0E) | (burner.isRewritable ? 0x10 : 0));
         reply[3] = reply[4] = reply[5] = reply[6] = 1;
+        reply[7] = burner.profile ? 3 : 0;  // has been formatted
         reply.replace(17, 3, {99, 50, 0});  // the lead-in starts there; a short one saves time
         reply.replace(21, 3, {79, 59, 74}); // the lead-out at the latest
         return true;

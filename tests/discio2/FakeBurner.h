@@ -10,6 +10,8 @@ namespace tests {
 
 struct SFakeBurner {
     bool isRewritable = false;
+    unsigned profile = 0;      // of the medium; 0 for a CD
+    int offset = 0;            // frames that audio is placed behind its place
     int failsAt = INT32_MIN;   // the block whose writing fails
     int damagedAt = INT32_MIN; // the block that is not written as it was sent
     int writeMicroseconds = 0; // the time that a write takes

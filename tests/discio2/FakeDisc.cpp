@@ -61,10 +61,6 @@ bool readSectors(int block, int blocks, std::string& reply) {
         place = std::clamp<int64_t>(place, 0, static_cast<int64_t>(disc.samples.size()) - size);
     }
     reply = disc.samples.substr(static_cast<size_t>(place), static_cast<size_t>(size));
-    if (disc.shakyReads > 0 && blocks > 1) { // a drive that does not find its place
-        --disc.shakyReads;
-        std::rotate(reply.begin(), reply.begin() + 400, reply.end());
-    }
     return true;
 }
 
@@ -116,7 +112,11 @@ bool answer(const unsigned char* command, std::string& reply) {
     const size_t count = disc.starts.empty() ? 0 : disc.starts.size() - 1;
     switch (command[0]) {
     case 0x46: // GET CONFIGURATION: the profile of a pressed or a recordable CD
-        reply = toBig(4, 4) + std::string(2, '\0') + toBig(disc.isBlank ? 9 : 8, 2);
+        reply = toBig(4, 4) + std::string(2, '\0') +
+                toBig(static_cast<unsigned>(disc.profile   ? disc.profile
+                                            : disc.isBlank ? 9
+                                                           : 8),
+                      2);
         return true;
     case 0x51: // READ DISC INFORMATION
         reply = toBig(32, 2) + (disc.isBlank ? '\0' : '\2') + std::string(29, '\0');

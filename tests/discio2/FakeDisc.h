@@ -13,6 +13,10 @@ struct SFakeDisc {
     bool isPresent = true;
     bool isBlank = false;
     bool hasChanged = false;     // since the drive was last asked
+    int profile = 0;             // of the medium; 0 for a CD
+    int notReady = 0;            // how often the drive reports that it is not ready
+    int trayError = 0;           // of moving the tray
+    std::string trayMoves;       // "o" and "c"
     std::vector<int> starts;     // blocks of the tracks, then of the lead-out
     std::vector<int> pregaps;    // of the tracks, in blocks; 0 for those that are not listed
     std::set<size_t> dataTracks; // indices
@@ -23,7 +27,6 @@ struct SFakeDisc {
 
     int badBlock = -1;           // cannot be read
     std::map<int, int> failures; // by block: how often it cannot be read
-    int shakyReads = 0;          // that many reads deliver samples of the wrong place
     int jitter = 0;              // one read in three is off by up to that many frames
     int readMicroseconds = 0;    // the time that a read takes
     int readsUntilOpened = -1;   // the tray is opened after them

@@ -48,8 +48,12 @@ int handle(gulong request, UMockdevIoctlData* arg, int& result) {
     const auto count = static_cast<int>(disc.starts.size()) - 1;
     switch (request) {
     case CDROM_DRIVE_STATUS:
-        result = disc.isPresent ? CDS_DISC_OK : CDS_NO_DISC;
+        result = disc.notReady-- > 0 ? CDS_DRIVE_NOT_READY : disc.isPresent ? CDS_DISC_OK : CDS_NO_DISC;
         return 0;
+    case CDROMEJECT:
+    case CDROMCLOSETRAY:
+        disc.trayMoves += request == CDROMEJECT ? 'o' : 'c';
+        return disc.trayError;
     case CDROM_MEDIA_CHANGED:
         result = disc.hasChanged;
         return 0;

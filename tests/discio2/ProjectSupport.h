@@ -13,7 +13,10 @@ struct SSource {
     std::string pcm;
     size_t frames = 0;    // announced
     int64_t failsAt = -1; // frame
-    int32_t channels = 2;
+    int32_t channels = 2, rate = 44100;
+    int32_t canOpen = 1, canRewind = 1, canSeek = 0, seeks = 1; // what the functions return
+    int32_t surplus = 0;                                        // of frames that are said to be delivered
+    int rewinds = 0;
     size_t position = 0;
     int opened = 0;
     int ended = 0;
@@ -26,19 +29,20 @@ struct SSource {
             [](void* user) { return static_cast<double>(get(user).frames) / 44100; },
             nullptr,
             [](void* user) {
-                ++get(user).opened;
-                return int32_t{1};
+                get(user).opened += get(user).canOpen;
+                return get(user).canOpen;
             },
             [](void* user) { --get(user).opened; },
             [](void* user) { return get(user).channels; },
-            [](void*) { return int32_t{44100}; },
+            [](void* user) { return get(user).rate; },
             [](void* user) { return static_cast<int64_t>(get(user).frames); },
             [](void* user) {
                 get(user).position = 0;
-                return int32_t{1};
+                ++get(user).rewinds;
+                return get(user).canRewind;
             },
             [](void*) {},
-            [](void*) { return int32_t{0}; },
+            [](void* user) { return get(user).canSeek; },
             [](void* user, void* pcm, int32_t frames, int32_t* delivered) {
                 SSource& own = get(user);
                 if (own.failsAt >= 0 &&
@@ -48,11 +52,14 @@ struct SSource {
                     std::min({static_cast<size_t>(frames) * 4, own.pcm.size() - own.position, size_t{1000}});
                 std::memcpy(pcm, own.pcm.data() + own.position, bytes);
                 own.position += bytes;
-                *delivered = static_cast<int32_t>(bytes / 4);
+                *delivered = static_cast<int32_t>(bytes / 4) + own.surplus;
                 return int32_t{1};
             },
             [](void*) { return int64_t{-1}; },
-            [](void*, int64_t) { return int32_t{0}; },
+            [](void* user, int64_t frame) {
+                get(user).position = std::min(static_cast<size_t>(frame) * 4, get(user).pcm.size());
+                return get(user).seeks;
+            },
             [](void* user) { return static_cast<int64_t>(get(user).position / 4); },
             [](void* user) { ++get(user).ended; },
         };
@@ -79,9 +86,5 @@ struct SProject {
     Discio<DISCIO_Project> project;
     Discio<DISCIO_Disc> disc;
 };
-
-inline std::string lastError() {
-    return narrow(DISCIO_GetErrorMessageW(nullptr, DISCIO_GetLastError(nullptr)));
-}
 
 } // namespace tests

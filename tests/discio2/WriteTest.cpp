@@ -1,12 +1,17 @@
 #include "discio2/ProjectSupport.h"
 
+#include <cerrno>
+#include <cmath>
 #include <csignal>
 #include <set>
 #include <sys/resource.h>
+#include <sys/syscall.h>
 
 using namespace tests;
 
 namespace {
+
+bool s_canExchange = true;
 
 std::set<std::string> listFolder(const CTempFolder& folder) {
     std::set<std::string> names;
@@ -15,12 +20,16 @@ std::set<std::string> listFolder(const CTempFolder& folder) {
     return names;
 }
 
-std::string getText(DISCIO_Disc* disc, int segment, int32_t text) {
-    return segment < 0 ? narrow(DISCIO_DiscAudioGetMetaDataStringW(disc, text))
-                       : narrow(DISCIO_DiscAudioGetSegmentMetaDataStringW(disc, segment, text));
-}
-
 } // namespace
+
+// Instead of the system's: not every file system can exchange two files.
+extern "C" __attribute__((visibility("default"))) int
+renameat2(int fromFolder, const char* from, int toFolder, const char* to, unsigned flags) noexcept {
+    if (s_canExchange)
+        return static_cast<int>(::syscall(SYS_renameat2, fromFolder, from, toFolder, to, flags));
+    errno = EINVAL;
+    return -1;
+}
 
 TEST(Write, OtherProgramsReadTheCueSheet) {
     const CTempFolder folder;
@@ -43,7 +52,7 @@ TEST(Write, OtherProgramsReadTheCueSheet) {
     EXPECT_TRUE(image.readSegment(0) == a.pcm);
     for (const int32_t text : {DISCIO_TEXT_TITLE, DISCIO_TEXT_PERFORMER, DISCIO_TEXT_CODE})
         for (const int segment : {-1, 0, 1})
-            EXPECT_EQ(getText(image.disc.get(), segment, text), getText(disc, segment, text)) << segment;
+            EXPECT_EQ(getText(image.disc, segment, text), getText(own.disc, segment, text)) << segment;
     const SProcessResult peer = run({"cdrdao", "show-toc", "--force", "disc.cue"}, folder.path());
     ASSERT_EQ(peer.exitCode, 0) << peer.err;
     for (const char* line : {"START  00:00:00(     0)", "END    00:04:10(   310)", "PREGAP 00:02:00(   150)",
@@ -58,9 +67,7 @@ TEST(Write, OtherProgramsReadTheCueSheet) {
     DISCIO_DiscAudioSetSegmentMetaDataStringW(disc, 0, DISCIO_TEXT_TITLE, u"\u0416");
     ASSERT_EQ(own.write(folder / "other.cue"), 1) << lastError();
     EXPECT_FALSE(std::filesystem::exists(folder / "other.cdt"));
-    EXPECT_EQ(std::u16string(DISCIO_DiscAudioGetSegmentMetaDataStringW(
-                  SOpenDisc(folder / "other.cue").disc.get(), 0, DISCIO_TEXT_TITLE)),
-              u"\u0416");
+    EXPECT_EQ(getText(SOpenDisc(folder / "other.cue").disc, 0), u"\u0416");
 }
 
 // Whatever ends a write, the files that were there are unchanged and there are no others.
@@ -86,6 +93,16 @@ TEST(Write, AFailureLeavesNothing) {
                       readFile(folder / "data.iso"),
                   "old sheetold samplesold data");
     };
+    const DISCIO_WriteOptions bad[] = {{sizeof bad[0] - 1, 0, 0, nullptr, nullptr},
+                                       {sizeof bad[0], 16, 0, nullptr, nullptr},
+                                       {sizeof bad[0], 0, -1, nullptr, nullptr},
+                                       {sizeof bad[0], 0, NAN, nullptr, nullptr}};
+    for (const DISCIO_WriteOptions& options : bad)
+        expect(audio, "disc.cue", DISCIO_ERROR_INVALID_PARAM, "", &options);
+    for (const uint32_t flag : {DISCIO_WRITE_DUMMY, DISCIO_WRITE_BLANK}) {
+        const DISCIO_WriteOptions options{sizeof options, flag, 0, nullptr, nullptr};
+        expect(audio, "disc.cue", DISCIO_ERROR_NOT_SUPPORTED, "neither a dummy nor blanked", &options);
+    }
     expect(empty, "disc.cue", DISCIO_ERROR_DISC_EMPTY, "no tracks");
     expect(audio, "disc.iso", DISCIO_ERROR_UNSUPPORTED_FORMAT, ".cue");
     expect(audio, "none/disc.cue", DISCIO_ERROR_CANNOT_WRITE, "none/disc.cue: No such file");
@@ -106,9 +123,16 @@ TEST(Write, AFailureLeavesNothing) {
                 EXPECT_GE(fraction, 0);
                 EXPECT_LE(fraction, 1);
                 const auto& wanted = *static_cast<SCancel*>(user);
-                EXPECT_EQ(DISCIO_DiscDataRemoveW(wanted.own->disc.get(), u"file") +
-                              DISCIO_DiscAudioRemoveSegment(wanted.own->disc.get(), 0),
-                          0);
+                DISCIO_Disc* const disc = wanted.own->disc.get();
+                EXPECT_EQ(
+                    DISCIO_DiscDataRemoveW(disc, u"file") + DISCIO_DiscDataSetTitleW(disc, u"x") +
+                        DISCIO_DiscDataCreateFolderW(disc, u"x") + DISCIO_DiscAudioRemoveSegment(disc, 0) +
+                        DISCIO_DiscAudioSetSegmentPregap(disc, 0, 150) +
+                        DISCIO_DiscAudioSetMetaDataStringW(disc, 0, u"x") +
+                        DISCIO_DiscAudioSetSegmentMetaDataStringW(disc, 0, 0, u"x") +
+                        DISCIO_DiscDataAddFileW(disc, u"x", u"/etc/passwd") + wanted.own->write("/none/x"),
+                    0);
+                EXPECT_EQ(DISCIO_GetLastError(nullptr), DISCIO_ERROR_DISC_CONTENTS_IN_USE);
                 return int32_t{now != wanted.phase};
             };
             expect(*own, own == &audio ? "disc.cue" : "data.iso", DISCIO_ERROR_ABORTED, "cancelled",
@@ -130,6 +154,33 @@ TEST(Write, AFailureLeavesNothing) {
     std::signal(SIGXFSZ, handler);
     folder.write("source", "changed");
     expect(data, "data.iso", DISCIO_ERROR_READ_INPUT, "source has changed");
+}
+
+// A folder takes the place of the sheet after the samples have got theirs.
+TEST(Write, AFileThatFindsNoPlaceTakesTheOthersBack) {
+    for (const bool canExchange : {true, false}) {
+        s_canExchange = canExchange;
+        const CTempFolder folder;
+        folder.write("disc.bin", "old samples");
+        SSource source(makeSectors(3, 1));
+        const SProject own(true);
+        ASSERT_EQ(own.insert(source), 1);
+        std::filesystem::path sheet = folder / "disc.cue";
+        DISCIO_WriteOptions options{sizeof options, 0, 0, nullptr, &sheet};
+        options.onProgress = [](void* user, int32_t phase, double) {
+            if (phase == DISCIO_PHASE_VERIFY)
+                std::filesystem::create_directory(*static_cast<std::filesystem::path*>(user));
+            return int32_t{1};
+        };
+        EXPECT_EQ(own.write(sheet, &options), 0);
+        EXPECT_NE(lastError().find("disc.cue: Is a directory"), std::string::npos) << lastError();
+        EXPECT_EQ(readFile(folder / "disc.bin"), "old samples") << canExchange;
+        std::filesystem::remove(sheet);
+        EXPECT_EQ(own.write(sheet), 1) << lastError();
+        EXPECT_TRUE(readFile(folder / "disc.bin") == source.pcm);
+        EXPECT_EQ(listFolder(folder), (std::set<std::string>{"disc.bin", "disc.cue"}));
+    }
+    s_canExchange = true;
 }
 
 // Other programs list the file system and check its contents.

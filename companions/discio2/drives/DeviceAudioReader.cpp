@@ -25,7 +25,8 @@ constexpr size_t kWindow = 3;
 constexpr int32_t kTail = 4;
 constexpr int kSilence = 2;        // sectors without a change, after which the place is in doubt again
 constexpr int32_t kLookAhead = 75; // sectors in which a sound is looked for
-constexpr int32_t kOverlap = 75;   // sectors behind a track that are read to confirm its end
+// Sectors behind a track that are read to find its sound, and to confirm its end.
+constexpr int32_t kOverlap = kLookAhead + static_cast<int32_t>(kWindow);
 
 // Whether another medium has the same tracks in the same places.
 bool areSame(const STableOfContents& one, const STableOfContents& other) {
@@ -237,11 +238,16 @@ private:
         return -1;
     }
     // The drive reports a change only once. Asks it only after a failure whether there is a disc at all.
-    bool checkLost(bool afterFailure) {
+    // Called by C code.
+    bool checkLost(bool afterFailure) noexcept {
         if (cdio_get_media_changed(m_device.get()) == 1) m_isLost = true;
         if (afterFailure && !m_isLost) {
-            const int status = getDeviceStatus(m_path);
-            m_isLost = status == CDS_NO_DISC || status == CDS_TRAY_OPEN;
+            try {
+                const int status = getDeviceStatus(m_path);
+                m_isLost = status == CDS_NO_DISC || status == CDS_TRAY_OPEN;
+            } catch (const std::exception&) {
+                m_isLost = true; // the drive itself has gone
+            }
         }
         return m_isLost;
     }

@@ -51,10 +51,9 @@ SMediumState readState(CdIo_t* device) {
         state.isErasable = bytes[2] & 0x10;
         state.isWritable = status != 2 || state.isErasable;
         const int minutes = bytes[21], seconds = bytes[22], frames = bytes[23];
-        if (state.isEmpty && minutes < 0xFF)
-            state.capacityBytes =
-                (int64_t{minutes * 60 + seconds} * kSectorsPerSecond + frames - kLeadInSectors) *
-                kDataSectorBytes;
+        const int64_t blocks = int64_t{minutes * 60 + seconds} * kSectorsPerSecond + frames - kLeadInSectors;
+        if (state.isEmpty && minutes < 0xFF && blocks > 0) // neither is set for other media than CDs
+            state.capacityBytes = blocks * kDataSectorBytes;
         state.freeFraction = state.isEmpty ? 1.0 : 0.0;
     }
     return state;

@@ -52,8 +52,11 @@ public:
                 m_reader->read(m_track.start + sector, count, to);
                 count *= kFramesPerSector;
             } else {
-                if (m_buffered != sector) m_reader->read(m_track.start + sector, 1, m_sector.data());
-                m_buffered = sector;
+                if (m_buffered != sector) {
+                    m_buffered = kNoSector; // a read that fails may have changed it
+                    m_reader->read(m_track.start + sector, 1, m_sector.data());
+                    m_buffered = sector;
+                }
                 count = std::min(wanted - done, kFramesPerSector - inside);
                 std::memcpy(to, m_sector.data() + kChannels * inside,
                             static_cast<size_t>(count) * kChannels * sizeof(int16_t));

@@ -15,7 +15,7 @@ IDataVolume& SDisc::getVolume() {
         if (!track) throw CDiscError(DISCIO_ERROR_NO_DATA, "");
         const std::string path = medium->getDataPath();
         // The addresses in a file of its own may count from the start of the disc, too.
-        if (track->start > 0) {
+        if (track->start > 0 || path.empty()) {
             try {
                 volume = openSessionVolume(medium->createDataReader(), track->start);
             } catch (const CDiscError&) {
@@ -71,7 +71,7 @@ std::string fromText(const char16_t* text) {
 const char16_t* DISCIO_DiscDataGetTitleW(DISCIO_Disc* disc) {
     return barrier<const char16_t*>(nullptr, [&] {
         DISCIO_Disc& own = require(disc);
-        return own.texts.hold(&own.disc, own.disc->getVolume().getTitle());
+        return own.texts.hold(&own.kind, own.disc->getVolume().getTitle());
     });
 }
 

@@ -55,8 +55,9 @@ DISCIO_Library* DISCIO_CreateEx(uint32_t apiVersion, const DISCIO_Options* optio
     return barrier<DISCIO_Library*>(nullptr, [&] {
         if (apiVersion != DISCIO_API_VERSION)
             throw CDiscError(DISCIO_ERROR_UNSUPPORTED_API_VERSION, std::to_string(apiVersion));
-        if (options && options->size < sizeof(DISCIO_Options))
-            throw CDiscError(DISCIO_ERROR_INVALID_PARAM, "");
+        const bool isEmpty = options && options->image && !*options->image;
+        if (options && (options->size < sizeof(DISCIO_Options) || isEmpty))
+            throw CDiscError(DISCIO_ERROR_INVALID_PARAM, isEmpty ? "the path of the image is empty" : "");
         std::string image = options && options->image ? toUTF8(options->image) : std::string();
         DISCIO_Library* library = makeHandle<DISCIO_Library>(EKind::library);
         library->image = std::move(image);

@@ -67,8 +67,6 @@ struct SImageLayout {
 // By the file's extension: .cue, .iso, .nrg and .toc. Throws CDiscError.
 SImageLayout readImage(const std::string& path);
 bool isImageName(const std::string& name);
-// Files besides the image itself that it needs. Throws CDiscError if it cannot be read.
-std::vector<std::string> findImageFiles(const std::string& path);
 
 // The readers of the formats. All throw CDiscError.
 SImageLayout readCueImage(const std::string& path);

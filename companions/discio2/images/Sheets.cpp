@@ -107,12 +107,6 @@ SImageLayout readImage(const std::string& path) {
                      path + " is not a disc image: .cue, .iso, .nrg and .toc are known");
 }
 
-std::vector<std::string> findImageFiles(const std::string& path) {
-    std::vector<std::string> files;
-    for (const auto& file : readImage(path).files) files.push_back(file->getPath());
-    return files;
-}
-
 int getSectorBytes(ESectorForm form) {
     switch (form) {
     case ESectorForm::data:

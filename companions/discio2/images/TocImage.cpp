@@ -11,6 +11,7 @@ namespace {
 
 constexpr size_t kMaxSheetBytes = 1 << 20;
 constexpr int64_t kSampleBytes = 4; // a frame of both channels
+constexpr int64_t kMaxOffset = int64_t{1} << 50;
 
 struct SToken {
     std::string text;
@@ -208,7 +209,7 @@ private:
         const std::string text = take().text.substr(1);
         int64_t offset = 0;
         const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), offset);
-        if (error != std::errc() || end != text.data() + text.size() || offset < 0)
+        if (error != std::errc() || end != text.data() + text.size() || offset < 0 || offset > kMaxOffset)
             refuse("an offset is invalid");
         return offset;
     }

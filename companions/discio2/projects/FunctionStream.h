@@ -12,7 +12,6 @@ public:
     ~CFunctionStream() override;
 
     const DISCIO_PCMAudioStreamFuncs& getFuncs() const { return m_funcs; }
-    void* getUser() const { return m_user; }
 
     void open() override;
     void close() noexcept override { m_funcs.close(m_user); }

@@ -77,10 +77,15 @@ void compareTrack(const IMedium& expected, const IMedium& written, size_t index,
     constexpr int64_t kStep = int64_t{kBlocksAtOnce} * kFramesPerSector;
     for (int64_t first = 0; first < frames; first += kStep) {
         const int64_t end = std::min(first + kStep, frames);
-        own.provide(std::max<int64_t>(first - kMaxShift, 0), end + kMaxShift);
-        other.provide(first, end);
-        if (!shift) shift = findShift(own, other, first, end);
-        if (!areEqual(own, other, first, end, shift.value_or(0)) || std::abs(shift.value_or(0)) > kMaxShift)
+        // Until the shift is known, what it may have moved over the end is left to the next portion.
+        constexpr int64_t kMargin = kMaxShift + kProbe;
+        const int64_t ahead = shift ? end : std::min(end + kMargin, frames);
+        own.provide(std::max<int64_t>(first - kMaxShift, 0), ahead + kMaxShift);
+        other.provide(first, ahead);
+        if (!shift) shift = findShift(own, other, first, ahead);
+        const int64_t compared = shift ? end : std::min(end, ahead - kMargin);
+        if (!areEqual(own, other, first, compared, shift.value_or(0)) ||
+            std::abs(shift.value_or(0)) > kMaxShift)
             throw CDiscError(DISCIO_ERROR_DEVICE, name + ": track " + std::to_string(track.number) +
                                                       " differs from what was written");
         progress.report(DISCIO_PHASE_VERIFY, track.start + end / kFramesPerSector,

@@ -1,7 +1,9 @@
 #include "writing/Burner.h"
 
+#include <algorithm>
 #include <chrono>
 #include <thread>
+#include <vector>
 
 namespace discio {
 
@@ -12,7 +14,14 @@ constexpr auto kReadyLimit = std::chrono::seconds(60);
 constexpr double kCdSpeed = 176.4; // kB in a second
 constexpr double kDvdSpeed = 1385;
 constexpr double kBdSpeed = 4495.625;
+constexpr double kMaxSpeed = 1e6;        // of what drives accept, in kB in a second
 constexpr int kCdR = 0x09, kCdRw = 0x0A; // profiles
+constexpr int kDvdRam = 0x12, kDvdRwOverwritten = 0x13, kDvdPlusRw = 0x1A, kBdRe = 0x43;
+
+// The library takes these media for blank, whatever they contain.
+bool isOverwritten(int profile) {
+    return profile == kDvdRam || profile == kDvdRwOverwritten || profile == kDvdPlusRw || profile == kBdRe;
+}
 
 std::mutex& getMutex() {
     static std::mutex s_mutex; // the library has one list of drives
@@ -63,6 +72,23 @@ burn::burn_disc_status CBurner::getMediumStatus() const {
     }
 }
 
+int CBurner::getProfile() const {
+    int profile = 0;
+    char name[80] = "";
+    m_library.burn_disc_get_profile(m_drive, &profile, name);
+    return profile;
+}
+
+// Every file system has something in the first 64 kB. What cannot be read has not been written yet.
+bool CBurner::hasContent() const {
+    std::vector<char> bytes(size_t{64} << 10);
+    constexpr int kNoMessage = 2, kNoSingleBlocks = 4;
+    off_t count = 0;
+    m_library.burn_read_data(m_drive, 0, bytes.data(), static_cast<off_t>(bytes.size()), &count,
+                             kNoMessage | kNoSingleBlocks);
+    return std::any_of(bytes.begin(), bytes.end(), [](char byte) { return byte != 0; });
+}
+
 void CBurner::wait(
     const std::function<void(burn::burn_drive_status, const burn::burn_progress&)>& report) const {
     burn::burn_progress progress{};
@@ -91,6 +117,9 @@ void CBurner::erase(bool whole, const CProgress& progress) {
 void CBurner::blank(bool whole, const CProgress& progress) {
     const burn::burn_disc_status status = getMediumStatus();
     if (status == burn::BURN_DISC_EMPTY) fail(DISCIO_ERROR_NO_DISC, "there is no disc in the drive");
+    const int profile = getProfile();
+    if (isOverwritten(profile) && profile != kDvdRwOverwritten)
+        fail(DISCIO_ERROR_NOT_SUPPORTED, "a disc of this type is overwritten without being blanked");
     if (!m_library.burn_disc_erasable(m_drive))
         fail(DISCIO_ERROR_DISC_NOT_ERASABLE, "the disc is not rewritable");
     if (status == burn::BURN_DISC_BLANK && !whole) return;
@@ -100,9 +129,7 @@ void CBurner::blank(bool whole, const CProgress& progress) {
 void CBurner::prepare(bool isAudio, bool mayBlank, const CProgress& progress) {
     burn::burn_disc_status status = getMediumStatus();
     if (status == burn::BURN_DISC_EMPTY) fail(DISCIO_ERROR_NO_DISC, "there is no disc in the drive");
-    int profile = 0;
-    char name[80] = "";
-    m_library.burn_disc_get_profile(m_drive, &profile, name);
+    const int profile = getProfile();
     if (isAudio && profile != kCdR && profile != kCdRw && status == burn::BURN_DISC_BLANK)
         fail(DISCIO_ERROR_UNSUPPORTED_DISC_TYPE, "an audio CD needs a CD-R or a CD-RW");
     const bool isErasable = m_library.burn_disc_erasable(m_drive);
@@ -110,8 +137,9 @@ void CBurner::prepare(bool isAudio, bool mayBlank, const CProgress& progress) {
         erase(false, progress);
         status = getMediumStatus();
     }
-    if (status == burn::BURN_DISC_BLANK) return;
-    if (isErasable || status == burn::BURN_DISC_APPENDABLE)
+    const bool isUsed = isOverwritten(profile) && !mayBlank && hasContent();
+    if (status == burn::BURN_DISC_BLANK && !isUsed) return;
+    if (isUsed || isErasable || status == burn::BURN_DISC_APPENDABLE)
         fail(DISCIO_ERROR_DISC_NOT_EMPTY, "the disc is not empty");
     fail(DISCIO_ERROR_DISC_NOT_WRITABLE, "the disc cannot be written to");
 }
@@ -155,11 +183,9 @@ void CBurner::write(const CBurnSession& session, bool isAudio, const SBurnSettin
     std::vector<char> reasons(BURN_REASONS_LEN);
     if (m_library.burn_precheck_write(options.get(), session.getDisc(), reasons.data(), 1) != 1)
         fail(DISCIO_ERROR_DISC_NOT_WRITABLE, reasons.data());
-    int profile = 0;
-    char name[80] = "";
-    m_library.burn_disc_get_profile(m_drive, &profile, name);
+    const int profile = getProfile();
     const double unit = profile < 0x10 ? kCdSpeed : profile < 0x40 ? kDvdSpeed : kBdSpeed;
-    m_library.burn_drive_set_speed(m_drive, 0, static_cast<int>(settings.speed * unit));
+    m_library.burn_drive_set_speed(m_drive, 0, static_cast<int>(std::min(settings.speed * unit, kMaxSpeed)));
     progress.report(DISCIO_PHASE_WRITE, 0.0); // the last chance to spare the medium
     m_library.burn_disc_write(options.get(), session.getDisc());
     bool isCancelled = false, isStopped = false;
@@ -175,10 +201,19 @@ void CBurner::write(const CBurnSession& session, bool isAudio, const SBurnSettin
             m_library.burn_drive_cancel(m_drive);
         }
     });
+    try {
+        checkResult(session, isCancelled);
+    } catch (const CDiscError& error) {
+        if (settings.isDummy) throw;
+        throw CDiscError(error.getCode(), error.what() + std::string("; the medium is partly written"));
+    }
+    progress.announce(DISCIO_PHASE_FINISH, 1.0);
+}
+
+void CBurner::checkResult(const CBurnSession& session, bool isCancelled) const {
     session.getFailure().check();
     if (isCancelled) throw CDiscError(DISCIO_ERROR_ABORTED, "cancelled");
     if (!m_library.burn_drive_wrote_well(m_drive)) fail(DISCIO_ERROR_DEVICE, "writing has failed");
-    progress.announce(DISCIO_PHASE_FINISH, 1.0);
 }
 
 } // namespace discio

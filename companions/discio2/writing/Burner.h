@@ -71,9 +71,11 @@ public:
     CBurner(const CBurner&) = delete;
     CBurner& operator=(const CBurner&) = delete;
 
-    // Leaves a blank medium in the drive, which it blanks if `mayBlank` is set and the medium permits it.
+    // Leaves a blank medium in the drive, which it blanks if `mayBlank` is set and the medium permits it, or
+    // one that may be overwritten.
     void prepare(bool isAudio, bool mayBlank, const CProgress& progress);
     void blank(bool whole, const CProgress& progress);
+    // Failures after the start of the write say that the medium is partly written.
     void write(const CBurnSession& session, bool isAudio, const SBurnSettings& settings,
                const CProgress& progress);
 
@@ -81,9 +83,12 @@ private:
     void grab();
     void release() noexcept;
     burn::burn_disc_status getMediumStatus() const;
+    int getProfile() const;
+    bool hasContent() const;
     void erase(bool whole, const CProgress& progress);
     // Calls `report` with the drive's state until it is idle.
     void wait(const std::function<void(burn::burn_drive_status, const burn::burn_progress&)>& report) const;
+    void checkResult(const CBurnSession& session, bool isCancelled) const;
     [[noreturn]] void fail(int32_t code, const std::string& reason) const;
 
     const SBurnLibrary& m_library;

@@ -59,16 +59,23 @@ void CStagedFiles::move(const std::string& name) const {
         if (S_ISDIR(status.st_mode)) fail(to, EISDIR);
         if (S_ISREG(status.st_mode)) ::chmod(from.c_str(), status.st_mode & 07777);
         if (::renameat2(AT_FDCWD, from.c_str(), AT_FDCWD, to.c_str(), RENAME_EXCHANGE) == 0) return;
-        // Not every file system can exchange.
+        // Not every file system can exchange, or has hard links.
         if (errno != EINVAL && errno != ENOSYS) fail(to, errno);
+        if (::link(to.c_str(), getOldPath(name).c_str()) != 0 &&
+            ::rename(to.c_str(), getOldPath(name).c_str()) != 0)
+            fail(to, errno);
     }
-    if (::rename(from.c_str(), to.c_str()) != 0) fail(to, errno);
+    if (::rename(from.c_str(), to.c_str()) == 0) return;
+    const int error = errno;
+    std::rename(getOldPath(name).c_str(), to.c_str());
+    fail(to, error);
 }
 
 void CStagedFiles::moveBack(const std::string& name) const noexcept {
     const std::string staged = getPath(name), placed = m_parent + "/" + name;
-    if (::renameat2(AT_FDCWD, staged.c_str(), AT_FDCWD, placed.c_str(), RENAME_EXCHANGE) != 0)
-        std::rename(placed.c_str(), staged.c_str());
+    if (::renameat2(AT_FDCWD, staged.c_str(), AT_FDCWD, placed.c_str(), RENAME_EXCHANGE) == 0) return;
+    std::rename(placed.c_str(), staged.c_str());
+    std::rename(getOldPath(name).c_str(), placed.c_str());
 }
 
 void CStagedFiles::commit(const std::vector<std::string>& names) {

@@ -27,6 +27,8 @@ public:
     void commit(const std::vector<std::string>& names);
 
 private:
+    // Where a replaced file is kept that could not be exchanged.
+    std::string getOldPath(const std::string& name) const { return getPath(name) + ".old"; }
     void move(const std::string& name) const;
     void moveBack(const std::string& name) const noexcept;
 
