@@ -65,13 +65,13 @@ int main(int argc, char** argv) {
         return 2;
     }
 
+    const auto id = static_cast<pid_t>(parent);
+    const int process = static_cast<int>(syscall(SYS_pidfd_open, id, 0));
+    if (process < 0 && errno == ESRCH) return 0;
     GMainLoop* loop = g_main_loop_new(nullptr, FALSE);
-    SWatch watch{static_cast<pid_t>(parent), loop};
-    const int process = static_cast<int>(syscall(SYS_pidfd_open, watch.parent, 0));
+    SWatch watch{id, loop};
     if (process >= 0)
         g_unix_fd_add(process, G_IO_IN, onParentEnded, loop);
-    else if (errno == ESRCH)
-        return 0;
     else
         g_timeout_add_seconds(1, lookForParent, &watch);
 
