@@ -39,12 +39,17 @@ public:
         : m_store(store), m_use(use) {}
 
     void visit(const Node& node) {
+        std::vector<Node> attachments;
         for (auto children = node->getChildNodes(); children.hasMore();) {
             const Node child = children.getNext();
             if (getName(child).starts_with("attachment-"))
-                take(node, child);
+                attachments.push_back(child);
             else
                 visit(child);
+        }
+        for (const Node& attachment : attachments) {
+            take(node, attachment);
+            node->removeChildNode(attachment); // stores find the first one of a name
         }
     }
 

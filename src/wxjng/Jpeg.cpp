@@ -44,7 +44,10 @@ public:
 
     // False after an error of the library. No local variable may need a destructor.
     bool encode(const SSamples& picture, int quality) {
-        if (setjmp(m_errors.jump)) return false;
+        if (setjmp(m_errors.jump)) {
+            m_bytes = nullptr; // the library may have released the buffer for a larger one
+            return false;
+        }
         jpeg_mem_dest(&m_info, &m_bytes, &m_size);
         m_info.image_width = static_cast<JDIMENSION>(picture.width);
         m_info.image_height = static_cast<JDIMENSION>(picture.height);

@@ -9,6 +9,7 @@
 #include "graphics/elements/GraphicShape.h"
 #include "graphics/elements/GraphicTable.h"
 #include "graphics/elements/GraphicText.h"
+#include "graphics/storage/DocumentArchive.h"
 
 #include <random>
 
@@ -129,6 +130,12 @@ inline P<graphics::CGraphicDocument> makeDocument(std::mt19937& random, int dept
         document->GetXDatas()->Set("note", peru::make<CStringXData>(makeText(random)));
     }
     return document;
+}
+
+// An archive of nothing but these entries.
+inline std::string makeArchive(const std::vector<graphics::SArchiveEntry>& entries) {
+    return graphics::WriteArchive(
+        {"unused.xml", "unused"}, [](const auto&, auto&) {}, false, entries);
 }
 
 } // namespace tests

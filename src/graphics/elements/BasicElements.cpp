@@ -108,6 +108,11 @@ void CGraphicLabel::SetFont(const SFont& font) {
     DropHitMask();
 }
 
+void CGraphicLabel::SetColour(const SColour& colour) {
+    m_colour = colour;
+    DropHitMask();
+}
+
 void CGraphicPaper::PaintContent(CPaintContext& context) const {
     if (context.GetOutputKind() != EOutputKind::screen) return;
     const SRect rect = GetLocalRect();

@@ -134,7 +134,7 @@ public:
     const SFont& GetFont() const { return m_font; }
     void SetFont(const SFont& font);
     const SColour& GetColour() const { return m_colour; }
-    void SetColour(const SColour& colour) { m_colour = colour; }
+    void SetColour(const SColour& colour);
 
 protected:
     void PaintContent(CPaintContext& context) const override;

@@ -1,6 +1,7 @@
 #include "graphics/elements/GraphicImage.h"
 
 #include "graphics/elements/CloneAs.h"
+#include "graphics/painting/OffScreen.h"
 #include "graphics/painting/PaintContext.h"
 
 #include <cmath>
@@ -64,6 +65,10 @@ namespace {
 
 constexpr double kMillimetresPerPixel = 25.4 / 96; // of a bitmap at its own size
 
+bool hasMargins(const SScaleMargins& margins) {
+    return margins.left > 0 || margins.top > 0 || margins.right > 0 || margins.bottom > 0;
+}
+
 // The borders of three strips of one axis, in pixels of the bitmap and in millimetres of the target.
 struct SStrips {
     double source[4];
@@ -72,8 +77,7 @@ struct SStrips {
 
 // The outer strips have the size of the margins times their factors; the inner one gets the rest. Margins
 // that do not fit are reduced in proportion.
-SStrips divide(int pixels, double begin, double length, double low, double high, double lowFactor,
-               double highFactor) {
+SStrips divide(int pixels, double length, double low, double high, double lowFactor, double highFactor) {
     const auto fit = [](double& first, double& second, double room) {
         first = std::max(0.0, first);
         second = std::max(0.0, second);
@@ -90,25 +94,51 @@ SStrips divide(int pixels, double begin, double length, double low, double high,
     highPixels = std::min(std::round(highPixels), pixels - lowPixels);
     fit(lowTarget, highTarget, length);
     return {{0, lowPixels, pixels - highPixels, static_cast<double>(pixels)},
-            {begin, begin + lowTarget, begin + length - highTarget, begin + length}};
+            {0, lowTarget, length - highTarget, length}};
+}
+
+// The bitmap with its strips stretched to a box, with this many pixels per millimetre. The strips meet at
+// whole pixels: if each of them were painted on the device, the background would shine through between them.
+P<CBitmap> stretch(const CBitmap& bitmap, const SScaleMargins& margins, const SRect& box, SSize scale) {
+    const double width = std::max(1.0, std::ceil(box.width * scale.width));
+    const double height = std::max(1.0, std::ceil(box.height * scale.height));
+    const SStrips x = divide(bitmap.GetWidth(), box.width, margins.left, margins.right, margins.leftFactor,
+                             margins.rightFactor);
+    const SStrips y = divide(bitmap.GetHeight(), box.height, margins.top, margins.bottom, margins.topFactor,
+                             margins.bottomFactor);
+    COffScreen picture(static_cast<int64_t>(width), static_cast<int64_t>(height));
+    const auto toX = [&](int strip) { return std::round(x.target[strip] / box.width * width); };
+    const auto toY = [&](int strip) { return std::round(y.target[strip] / box.height * height); };
+    for (int row = 0; row < 3; ++row)
+        for (int col = 0; col < 3; ++col)
+            picture.GetGraphics().DrawBitmap(
+                bitmap, SRect::fromEdges(x.source[col], y.source[row], x.source[col + 1], y.source[row + 1]),
+                SRect::fromEdges(toX(col), toY(row), toX(col + 1), toY(row + 1)));
+    return picture.GetBitmap();
 }
 
 } // namespace
 
 P<CBitmap> CGraphicImage::getPaintedBitmap(const CPaintContext& context) const {
     const P<CBitmap>& bitmap = m_bitmap.Get();
-    // Margins are parts of the bitmap's own pixels, and a page of paper has no pixels.
-    constexpr double kOnePixelPerUnit = 1;
-    const SScaleMargins& margins = m_scaleMargins;
-    if (m_isNoScale || margins.left > 0 || margins.top > 0 || margins.right > 0 || margins.bottom > 0 ||
-        context.GetGraphics().GetResolution() != kOnePixelPerUnit)
-        return bitmap;
     const CMatrix& matrix = context.GetMatrix();
     const SRect box = GetLocalRect();
-    const double width = std::ceil(box.width * std::hypot(matrix.xx, matrix.yx));
-    const double height = std::ceil(box.height * std::hypot(matrix.xy, matrix.yy));
+    const SSize scale{std::hypot(matrix.xx, matrix.yx), std::hypot(matrix.xy, matrix.yy)};
+    const double resolution = context.GetGraphics().GetResolution();
+    if (m_isNoScale || !(box.width > 0 && box.height > 0)) return bitmap;
+    if (hasMargins(m_scaleMargins)) {
+        // Enlarged far beyond what a device shows, the picture remains at a size that can be painted.
+        constexpr double kMaximalSide = 4000;
+        return stretch(*bitmap, m_scaleMargins, box,
+                       {std::min(scale.width * resolution, kMaximalSide / box.width),
+                        std::min(scale.height * resolution, kMaximalSide / box.height)});
+    }
+    // A page of paper has no pixels.
+    constexpr double kOnePixelPerUnit = 1;
+    const double width = std::ceil(box.width * scale.width), height = std::ceil(box.height * scale.height);
     // Scaling a smaller bitmap each time it is painted costs little more than painting it.
-    if (!(width >= 1 && height >= 1 && 2 * width <= bitmap->GetWidth() && 2 * height <= bitmap->GetHeight()))
+    if (resolution != kOnePixelPerUnit ||
+        !(width >= 1 && height >= 1 && 2 * width <= bitmap->GetWidth() && 2 * height <= bitmap->GetHeight()))
         return bitmap;
     return m_bitmap.Get({static_cast<int>(width), static_cast<int>(height)});
 }
@@ -119,24 +149,11 @@ void CGraphicImage::PaintContent(CPaintContext& context) const {
     const SRect box = GetLocalRect();
     const double width = bitmap->GetWidth(), height = bitmap->GetHeight();
     IGraphicsContext& graphics = context.GetGraphics();
-    if (m_isNoScale) {
-        graphics.PushClip(box);
-        graphics.DrawBitmap(
-            *bitmap, {0, 0, width, height},
-            SRect::fromCenter({}, {width * kMillimetresPerPixel, height * kMillimetresPerPixel}));
-        graphics.PopClip();
-        return;
-    }
-    const SScaleMargins& margins = m_scaleMargins;
-    const SStrips x = divide(bitmap->GetWidth(), box.left, box.width, margins.left, margins.right,
-                             margins.leftFactor, margins.rightFactor);
-    const SStrips y = divide(bitmap->GetHeight(), box.top, box.height, margins.top, margins.bottom,
-                             margins.topFactor, margins.bottomFactor);
-    for (int row = 0; row < 3; ++row)
-        for (int col = 0; col < 3; ++col)
-            graphics.DrawBitmap(
-                *bitmap, SRect::fromEdges(x.source[col], y.source[row], x.source[col + 1], y.source[row + 1]),
-                SRect::fromEdges(x.target[col], y.target[row], x.target[col + 1], y.target[row + 1]));
+    if (!m_isNoScale) return graphics.DrawBitmap(*bitmap, {0, 0, width, height}, box);
+    graphics.PushClip(box);
+    graphics.DrawBitmap(*bitmap, {0, 0, width, height},
+                        SRect::fromCenter({}, {width * kMillimetresPerPixel, height * kMillimetresPerPixel}));
+    graphics.PopClip();
 }
 
 } // namespace graphics

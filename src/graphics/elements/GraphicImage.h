@@ -38,7 +38,8 @@ protected:
     void PaintContent(CPaintContext& context) const override;
 
 private:
-    // The bitmap in the size of the device's pixels if it is much larger and fills the box.
+    // With its strips stretched if there are margins; in the size of the device's pixels if it is much larger
+    // and fills the box.
     P<CBitmap> getPaintedBitmap(const CPaintContext& context) const;
 
     TResourceBuffer<CBitmap> m_bitmap;

@@ -8,7 +8,8 @@ namespace graphics {
 using Surface = std::unique_ptr<cairo_surface_t, decltype(&cairo_surface_destroy)>;
 
 void paintBitmap(cairo_t* cairo, const CBitmap& bitmap, const SRect& source, const SRect& target) {
-    if (source.width <= 0 || source.height <= 0 || target.width <= 0 || target.height <= 0) return;
+    // Also false for NaN, which would put the cairo context into an error state for good.
+    if (!(source.width > 0 && source.height > 0 && target.width > 0 && target.height > 0)) return;
     // A surface over the part only: interpolation must not mix in pixels beside it. cairo only reads them.
     const int left = std::clamp(static_cast<int>(std::lround(source.left)), 0, bitmap.GetWidth() - 1);
     const int top = std::clamp(static_cast<int>(std::lround(source.top)), 0, bitmap.GetHeight() - 1);

@@ -7,26 +7,33 @@
 namespace graphics {
 
 COffScreen::COffScreen(int64_t width, int64_t height)
-    : m_width(static_cast<int>(width)), m_height(static_cast<int>(height)), m_surface(nullptr) {
+    : m_width(static_cast<int>(width)), m_height(static_cast<int>(height)) {
     // The sides first, so that their product cannot overflow; cairo's own limit is 32767.
     if (width < 1 || height < 1 || width > 32767 || height > 32767 || width * height > kMaximalPixels)
         throw peru::CError(peru::localize(
             "graphics.COffScreen.TooLarge", "A picture of %WIDTH% x %HEIGHT% pixels is not possible.",
             {{"%WIDTH%", peru::format("%d", width)}, {"%HEIGHT%", peru::format("%d", height)}}));
     m_surface = cairo_image_surface_create(CAIRO_FORMAT_ARGB32, m_width, m_height);
-    cairo_t* const cairo = cairo_create(m_surface);
-    const cairo_status_t status = cairo_status(cairo);
-    if (status == CAIRO_STATUS_SUCCESS) m_graphics = peru::make<TEffectGraphicsContext<CCairoContext>>(cairo);
-    cairo_destroy(cairo);
-    if (status != CAIRO_STATUS_SUCCESS) {
-        cairo_surface_destroy(m_surface);
-        throw peru::CError(cairo_status_to_string(status));
+    m_cairo = cairo_create(m_surface);
+    const cairo_status_t status = cairo_status(m_cairo);
+    if (status == CAIRO_STATUS_SUCCESS) {
+        m_graphics = peru::make<TEffectGraphicsContext<CCairoContext>>(m_cairo);
+        return;
     }
+    cairo_destroy(m_cairo);
+    cairo_surface_destroy(m_surface);
+    throw peru::CError(cairo_status_to_string(status));
 }
 
 COffScreen::~COffScreen() {
     m_graphics.reset();
+    cairo_destroy(m_cairo);
     cairo_surface_destroy(m_surface);
+}
+
+void COffScreen::checkPainting() const {
+    const cairo_status_t status = cairo_status(m_cairo);
+    if (status != CAIRO_STATUS_SUCCESS) throw peru::CError(cairo_status_to_string(status));
 }
 
 uint32_t* COffScreen::GetRow(int y) {
@@ -38,6 +45,7 @@ uint32_t* COffScreen::GetRow(int y) {
 }
 
 P<CBitmap> COffScreen::GetBitmap() {
+    checkPainting();
     std::vector<uint32_t> pixels;
     pixels.reserve(static_cast<size_t>(m_width) * static_cast<size_t>(m_height));
     for (int y = 0; y < m_height; ++y) pixels.insert(pixels.end(), GetRow(y), GetRow(y) + m_width);
@@ -45,6 +53,7 @@ P<CBitmap> COffScreen::GetBitmap() {
 }
 
 std::string COffScreen::GetPng() {
+    checkPainting();
     std::string png;
     const auto append = [](void* target, const unsigned char* data, unsigned length) {
         static_cast<std::string*>(target)->append(reinterpret_cast<const char*>(data), length);

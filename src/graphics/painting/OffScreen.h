@@ -18,15 +18,17 @@ public:
     int GetHeight() const { return m_height; }
     // The pixels of a row, premultiplied ARGB. Valid until the next painting.
     uint32_t* GetRow(int y);
-    // A copy of the pixels.
+    // A copy of the pixels, or a PNG file. Both throw CError, also if an earlier painting failed.
     P<CBitmap> GetBitmap();
-    // As a PNG file. Throws CError.
     std::string GetPng();
 
 private:
+    void checkPainting() const;
+
     int m_width;
     int m_height;
-    cairo_surface_t* m_surface;
+    cairo_surface_t* m_surface = nullptr;
+    cairo_t* m_cairo = nullptr;
     P<IGraphicsContext> m_graphics;
 };
 

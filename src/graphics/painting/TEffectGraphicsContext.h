@@ -38,7 +38,7 @@ public:
     }
     void DrawBitmap(const CBitmap& bitmap, const SRect& source, const SRect& target) override {
         if (m_effect == EEffect::none) return Context::DrawBitmap(bitmap, source, target);
-        // Large bitmaps come in several parts.
+        // Elements may share a bitmap.
         if (m_original.get() != &bitmap || m_changedEffect != m_effect) {
             m_changed = applyEffect(bitmap, m_effect);
             m_original = peru::P<CBitmap>::share(const_cast<CBitmap*>(&bitmap));

@@ -100,8 +100,11 @@ void CGraphicLine::Save(const Node& node, IResourceOutputStore& store) const {
 
 void CGraphicLine::Load(const Node& node, IResourceInputStore& store) {
     CGraphicElement::Load(node, store);
-    read(node, "start", m_start);
-    read(node, "end", m_end);
+    const bool hasStart = read(node, "start", m_start), hasEnd = read(node, "end", m_end);
+    // The points define the box. One that is stored is taken as it is, so that saving it again changes
+    // nothing.
+    if ((hasStart || hasEnd) && (!node->getChildNode("center") || !node->getChildNode("size")))
+        SetLine(m_start, m_end);
     read(node, "pen", m_pen);
 }
 

@@ -33,19 +33,6 @@ constexpr SPart<SScaleMargins> kMargins[] = {
     {"bottom-factor", &SScaleMargins::bottomFactor},
 };
 
-// Without the control characters and malformed bytes that XML cannot hold; a text that was pasted with one
-// would otherwise make its document impossible to save.
-std::string removeInvalid(std::string_view text) {
-    std::string valid;
-    valid.reserve(text.size());
-    while (!text.empty()) {
-        const size_t size = peru::measureXmlCharacter(text.substr(0, 4));
-        valid.append(text.substr(0, size));
-        text.remove_prefix(std::max<size_t>(1, size));
-    }
-    return valid;
-}
-
 template <class T, size_t N>
 void writeParts(const Node& node, const char* key, const T& value, const SPart<T> (&parts)[N]) {
     const Node child = addChild(node, key);
@@ -61,6 +48,17 @@ bool readParts(const Node& node, const char* key, T& value, const SPart<T> (&par
 }
 
 } // namespace
+
+std::string removeInvalid(std::string_view text) {
+    std::string valid;
+    valid.reserve(text.size());
+    while (!text.empty()) {
+        const size_t size = peru::measureXmlCharacter(text.substr(0, 4));
+        valid.append(text.substr(0, size));
+        text.remove_prefix(std::max<size_t>(1, size));
+    }
+    return valid;
+}
 
 void throwInvalid(const Node& node, const char* attribute, const std::string& value) {
     throw peru::CParseError(peru::localize(

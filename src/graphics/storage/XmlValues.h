@@ -15,7 +15,11 @@ namespace graphics {
 using peru::P;
 using Node = P<peru::IXmlNode>;
 
-// An empty value writes nothing. Characters that XML cannot hold are dropped.
+// The text without the control characters and malformed bytes that XML cannot hold. A text that was pasted
+// with one would otherwise make its document impossible to save.
+std::string removeInvalid(std::string_view text);
+
+// An empty value writes nothing. Values pass through removeInvalid().
 void writeAttribute(const Node& node, const char* name, const std::string& value);
 void writeNumber(const Node& node, const char* name, double value);
 void writeInteger(const Node& node, const char* name, int64_t value);

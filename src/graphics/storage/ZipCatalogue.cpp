@@ -22,8 +22,8 @@ namespace {
 } // namespace
 
 CZipCatalogue::CZipCatalogue(std::string archive)
-    : m_archive(std::move(archive)),
-      m_maximalTotal(GetInflatedLimit(static_cast<int64_t>(m_archive.size()))) {}
+    : m_archive(std::move(archive)), m_maximalTotal(GetInflatedLimit(static_cast<int64_t>(m_archive.size()))),
+      m_maximalStored(m_maximalTotal + static_cast<int64_t>(m_archive.size())) {}
 
 int64_t CZipCatalogue::GetInflatedLimit(int64_t archiveSize) {
     return std::clamp(archiveSize * kMaximalExpansion, kMinimalTotal, kMaximalTotal);
@@ -77,7 +77,9 @@ std::string CZipCatalogue::ReadEntry(const std::string& name, int64_t maximalSiz
         fail("graphics.CZipCatalogue.Damaged", "The entry \"%NAME%\" of the archive is damaged.", name);
     };
     if (const auto stored = findStored(*m_entries.at(name))) {
-        if (static_cast<int64_t>(stored->size()) > maximalSize) tooLarge();
+        const auto size = static_cast<int64_t>(stored->size());
+        m_stored += size;
+        if (size > maximalSize || m_stored > m_maximalStored) tooLarge();
         return std::string(*stored);
     }
     if (!m_zip->OpenEntry(*m_entries.at(name))) damaged();

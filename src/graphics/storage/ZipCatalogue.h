@@ -70,6 +70,8 @@ private:
     CLoadReports m_reports;
     int64_t m_total = 0; // bytes inflated
     const int64_t m_maximalTotal;
+    int64_t m_stored = 0; // bytes copied from entries without compression, which may share their bytes
+    const int64_t m_maximalStored;
     bool m_isRead = false;
 };
 

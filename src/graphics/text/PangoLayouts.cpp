@@ -17,8 +17,10 @@ using FontDescription = std::unique_ptr<PangoFontDescription, decltype(&pango_fo
 FontDescription makeDescription(const SFont& font, double scale) {
     FontDescription description(pango_font_description_new(), pango_font_description_free);
     pango_font_description_set_family(description.get(), font.name.c_str());
-    pango_font_description_set_absolute_size(
-        description.get(), font.pointSize * scale * kMillimetresPerPoint * kUnitsPerMillimetre * PANGO_SCALE);
+    // Files of labels may have any size. FreeType has no fonts above 65535 units.
+    const int pointSize = std::clamp(font.pointSize, 1, 1800);
+    pango_font_description_set_absolute_size(description.get(), pointSize * scale * kMillimetresPerPoint *
+                                                                    kUnitsPerMillimetre * PANGO_SCALE);
     pango_font_description_set_style(description.get(), font.style == 93   ? PANGO_STYLE_ITALIC
                                                         : font.style == 94 ? PANGO_STYLE_OBLIQUE
                                                                            : PANGO_STYLE_NORMAL);

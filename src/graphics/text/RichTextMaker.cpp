@@ -1,6 +1,7 @@
 // Rich text from plain text.
 #include "graphics/text/RichTextParser.h"
 
+#include "graphics/storage/XmlValues.h"
 #include "graphics/text/RichTextXml.h"
 #include "peru/Errors.h"
 #include "peru/log/LogManager.h"
@@ -46,8 +47,8 @@ void setLines(wxXmlNode& layout, const wxXmlNode& paragraph, const wxXmlNode& ru
         wxXmlNode& words = *addElement(line, "text");
         copyAttributes(run, words);
         gchar* const valid = g_utf8_make_valid(text.data() + begin, static_cast<gssize>(end - begin));
-        words.AddChild(
-            new wxXmlNode(wxXML_TEXT_NODE, wxString(), wxString::FromUTF8("\"" + std::string(valid) + "\"")));
+        words.AddChild(new wxXmlNode(wxXML_TEXT_NODE, wxString(),
+                                     wxString::FromUTF8("\"" + removeInvalid(valid) + "\"")));
         g_free(valid);
         begin = end + 1;
     }

@@ -7,7 +7,7 @@ namespace graphics {
 
 namespace {
 
-constexpr double kMaximalWidth = 1e5;     // millimetres
+constexpr double kMaximalWidth = 20000;   // millimetres; Pango's numbers end at 20971
 constexpr double kMinimalLineWidth = 0.1; // of text between indents that leave no room
 constexpr double kDefaultTab = 10;        // distance of the tab stops
 constexpr double kTabBehindLast = 5;      // behind the last one that a paragraph states

@@ -82,12 +82,13 @@ std::vector<SGlyph> splitGlyphs(const std::vector<SParagraph>& paragraphs, EEffe
         glyphs.push_back({std::move(layout), width});
     };
     for (const SParagraph& paragraph : paragraphs) {
-        if (glyphs.size() > kMaximalCircleText) break;
         // Paragraphs follow each other on the circle.
         if (!glyphs.empty() && !paragraph.runs.empty()) add(" ", paragraph.runs[0]);
         for (const STextRun& run : paragraph.runs)
-            for (const std::string& text : splitCharacters(run.text.substr(0, kMaximalCircleText)))
+            for (const std::string& text : splitCharacters(run.text.substr(0, kMaximalCircleText))) {
+                if (glyphs.size() >= kMaximalCircleText) return glyphs;
                 add(text == "\n" || text == "\t" ? " " : text, run);
+            }
     }
     return glyphs;
 }

@@ -1,6 +1,7 @@
 #include "graphics/animation/IAnimation.h"
 
 #include "graphics/ImageTool.h"
+#include "graphics/images/WxImages.h"
 #include "peru/Errors.h"
 #include "peru/gui/ImageConversion.h"
 #include "wxjng/Mng.h"
@@ -72,6 +73,13 @@ TEST(Animation, ComposesGifLikeThePeer) {
         EXPECT_EQ(animation->GetFrame(1), second);
         EXPECT_EQ(animation->GetFrame(1), second);
         EXPECT_THROW(animation->GetFrame(4), peru::CInvalidArgError);
+        // The toolkit finds the handler by the content.
+        graphics::registerImageHandlers();
+        const wxString path = wxString::FromUTF8((folder.path() / "a.gif").string());
+        EXPECT_EQ(wxImage::GetImageCount(path), 4);
+        wxImage image;
+        ASSERT_TRUE(image.LoadFile(path, wxBITMAP_TYPE_ANY, 1));
+        EXPECT_EQ(peru::gui::fromWxImage(image), second);
     }
 }
 

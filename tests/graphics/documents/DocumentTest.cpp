@@ -4,6 +4,7 @@
 #include "graphics/elements/GraphicShape.h"
 #include "graphics/elements/GraphicTable.h"
 #include "peru/Errors.h"
+#include "support/Files.h"
 
 #include <gtest/gtest.h>
 
@@ -107,12 +108,8 @@ TEST(GraphicElementType, HasTagsAndNames) {
     }
     EXPECT_EQ(CreateElement(GraphicElementType::rectangle)->GetDisplayName(), "Unknown");
     EXPECT_EQ(CreateElement(GraphicElementType::text)->GetDisplayName(), "Text");
-    try {
-        GraphicTypeFromXml("oval");
-        FAIL();
-    } catch (const peru::CError& error) {
-        EXPECT_STREQ(error.what(), "GraphicTypeFromXml. Unknwown type:oval");
-    }
+    EXPECT_EQ(tests::errorOf<peru::CError>([] { GraphicTypeFromXml("oval"); }),
+              "GraphicTypeFromXml. Unknwown type:oval");
     EXPECT_THROW(GraphicTypeToXml(static_cast<GraphicElementType>(19)), peru::CError);
     EXPECT_THROW(ShapeTypeFromXml("oval"), peru::CError);
     EXPECT_EQ(ShapeTypeFromXml("free-form"), EShapeType::freeForm);

@@ -25,21 +25,19 @@ struct SPlain {
         return {x + dx * std::cos(angle) - dy * std::sin(angle),
                 y + dx * std::sin(angle) + dy * std::cos(angle)};
     }
-    // Positive inside, in millimetres from the nearest edge.
-    double depth(SPoint point) const {
+    // How far a point lies beyond the sides on each axis; negative inside.
+    SPoint beyond(SPoint point) const {
         const double angle = -degrees * std::numbers::pi / 180;
         const double dx = point.x - x, dy = point.y - y;
-        const double localX = dx * std::cos(angle) - dy * std::sin(angle);
-        const double localY = dx * std::sin(angle) + dy * std::cos(angle);
-        return std::min(width / 2 - std::abs(localX), height / 2 - std::abs(localY));
+        return {std::abs(dx * std::cos(angle) - dy * std::sin(angle)) - width / 2,
+                std::abs(dx * std::sin(angle) + dy * std::cos(angle)) - height / 2};
     }
+    // Positive inside, in millimetres from the nearest edge.
+    double depth(SPoint point) const { return -std::max(beyond(point).x, beyond(point).y); }
     double radius() const { return std::min(width, height) / 2; }
     // From a point to the rectangle; 0 inside.
     double distance(SPoint point) const {
-        const double angle = -degrees * std::numbers::pi / 180;
-        const double dx = point.x - x, dy = point.y - y;
-        return std::hypot(std::max(0.0, std::abs(dx * std::cos(angle) - dy * std::sin(angle)) - width / 2),
-                          std::max(0.0, std::abs(dx * std::sin(angle) + dy * std::cos(angle)) - height / 2));
+        return std::hypot(std::max(0.0, beyond(point).x), std::max(0.0, beyond(point).y));
     }
     // The widest gap between the projections of two rectangles on this one's axes.
     double gap(const SPlain& other) const {
@@ -152,35 +150,37 @@ TEST(GraphicLine, FollowsItsBox) {
     EXPECT_EQ(line->GetEnd(), (SPoint{140, 125}));
 }
 
-// The shapes on both sides of a touch, for each pair of types.
+// The shapes on both sides of a touch.
 TEST(GraphicElement, IntersectsByOutline) {
-    const auto makeAt = [](GraphicElementType type, double x, double degrees) {
+    const auto makeAt = [](GraphicElementType type, double x, double degrees,
+                           EShapeType kind = EShapeType::rectangle) {
         auto element = CreateElement(type);
         element->SetSize(20, 20);
         element->SetCenter(x, 0);
         element->SetRotation(degrees);
+        if (const auto shape = peru::tryCast<CGraphicShape>(element)) {
+            shape->SetShapeType(kind);
+            shape->SetCornerRadius(10);
+        }
         return element;
     };
     using enum GraphicElementType;
     struct SCase {
         GraphicElementType first, second;
-        double degrees; // of the second
-        double reach;   // the distance of the centers at which they touch; 0 if the pair never intersects
+        double reach; // the distance of the centers at which they touch; 0 if the pair never intersects
+        EShapeType kind = EShapeType::rectangle;
     };
-    for (const SCase& c : {SCase{circle, circle, 0, 20},
-                           {circle, rectangle, 0, 20},
-                           {circle, shape, 45, 10 + 10 * std::numbers::sqrt2},
-                           {rectangle, rectangle, 0, 20},
-                           {shape, shape, 45, 10 + 10 * std::numbers::sqrt2},
-                           {rectangle, shape, 0, 0},
-                           {text, text, 0, 0},
-                           {circle, image, 0, 0}}) {
+    for (const SCase& c : {SCase{circle, shape, 10 + 10 * std::numbers::sqrt2},
+                           {circle, shape, 20, EShapeType::ellipse},
+                           {circle, shape, 20, EShapeType::roundedRectangle},
+                           {rectangle, shape, 0},
+                           {text, text, 0},
+                           {circle, image, 0}}) {
         const auto first = makeAt(c.first, 0, 0);
-        const auto near = makeAt(c.second, c.reach - 0.01, c.degrees);
-        const auto far = makeAt(c.second, c.reach + 0.01, c.degrees);
+        const auto near = makeAt(c.second, c.reach - 0.01, 45, c.kind);
         EXPECT_EQ(first->Intersects(*near), c.reach > 0) << GraphicTypeToXml(c.second);
         EXPECT_EQ(near->Intersects(*first), c.reach > 0) << GraphicTypeToXml(c.second);
-        EXPECT_FALSE(far->Intersects(*first)) << GraphicTypeToXml(c.second);
+        EXPECT_FALSE(makeAt(c.second, c.reach + 0.01, 45, c.kind)->Intersects(*first));
     }
     const auto inner = makeAt(rectangle, 0, 10);
     inner->SetSize(2, 2);

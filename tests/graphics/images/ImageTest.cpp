@@ -9,6 +9,19 @@
 
 using namespace graphics;
 
+namespace {
+
+// May only throw CError.
+void decode(EBitmapFormat format, const std::string& bytes) {
+    try { // the header may be whole: then the pixels are missing
+        const auto bitmap = peru::make<CBitmap>(format, bytes);
+        if (bitmap->GetWidth() < 1000 && bitmap->GetHeight() < 1000) bitmap->GetPixels();
+    } catch (const peru::CError&) {
+    }
+}
+
+} // namespace
+
 TEST(Bitmap, SurvivesEachFormat) {
     std::mt19937 random(4);
     for (const auto& [format, tolerance] : {std::pair(EBitmapFormat::png, 1),
@@ -47,25 +60,9 @@ TEST(Bitmap, RejectsDamagedFiles) {
     const auto cut = peru::make<CBitmap>(EBitmapFormat::png, whole.substr(0, whole.size() / 2));
     EXPECT_EQ(cut->Encode(EBitmapFormat::png).size(), whole.size() / 2);
     EXPECT_THROW(cut->Encode(EBitmapFormat::jpg), peru::CError); // not a transparent picture
-    for (const auto format : {EBitmapFormat::png, EBitmapFormat::jng, EBitmapFormat::jpg, EBitmapFormat::bmp,
-                              EBitmapFormat::ico}) {
-        const std::string bytes = tests::makeBitmap(random, true)->Encode(format);
-        for (size_t length = 0; length < bytes.size(); length += 1 + bytes.size() / 60) {
-            try { // the header may be whole: then the pixels are missing
-                peru::make<CBitmap>(format, bytes.substr(0, length))->GetPixels();
-            } catch (const peru::CError&) {
-            }
-        }
-        for (int i = 0; i < 60; ++i) {
-            std::string flipped = bytes;
-            flipped[random() % bytes.size()] ^= static_cast<char>(1 << random() % 8);
-            try {
-                const auto bitmap = peru::make<CBitmap>(format, flipped);
-                if (bitmap->GetWidth() < 1000 && bitmap->GetHeight() < 1000) bitmap->GetPixels();
-            } catch (const peru::CError&) {
-            }
-        }
-    }
+    for (const auto format : {EBitmapFormat::jng, EBitmapFormat::jpg})
+        tests::damage(tests::makeBitmap(random, true)->Encode(format),
+                      [&](const std::string& damaged) { decode(format, damaged); });
     // A header that announces 65535 x 65535 pixels, and a JNG whose picture has another size than its header.
     std::string png = peru::make<CBitmap>(1, 1, std::vector<uint32_t>{0})->Encode(EBitmapFormat::png);
     png.replace(16, 8, std::string("\0\0\xff\xff\0\0\xff\xff", 8));
@@ -90,13 +87,7 @@ TEST(Bitmap, ReadsWhatThePeerWrites) {
         const auto bitmap = peru::make<CBitmap>(format, bytes);
         EXPECT_EQ(bitmap->GetPixels(), tests::readByImageTool(folder.path(), name)) << name;
         EXPECT_FALSE(bitmap->HasAlpha()) << name;
-        tests::damage(bytes, [&, kind = format](const std::string& damaged) {
-            try {
-                const auto other = peru::make<CBitmap>(kind, damaged);
-                if (other->GetWidth() < 1000 && other->GetHeight() < 1000) other->GetPixels();
-            } catch (const peru::CError&) {
-            }
-        });
+        tests::damage(bytes, [&, kind = format](const std::string& damaged) { decode(kind, damaged); });
         // The limit holds before anything is decoded.
         peru::gui::setMaximalPixels(199);
         EXPECT_THROW(peru::make<CBitmap>(format, bytes), peru::CError) << name;

@@ -86,15 +86,19 @@ std::vector<SSubject> makeSubjects() {
     const auto rounded = makeShape(EShapeType::roundedRectangle, brush);
     rounded->SetGradient({{255, 255, 255, 255}, {200, 0, 0, 255}});
     add("rounded rectangle", rounded);
-    const auto star = makeShape(EShapeType::freeForm, brush);
-    star->SetFreeForm(getFreeFormManager()->GetForms()[0]);
-    add("star", star, 20);
+    for (const auto& form : getFreeFormManager()->GetForms()) {
+        const auto shape = makeShape(EShapeType::freeForm, brush);
+        shape->SetFreeForm(form);
+        add(form->GetId(), shape, 20);
+    }
+    const P<CGraphicElement> mirrored = subjects[4].element; // the star
     add("line", makeLine<CGraphicLine>(kStyleDotDash));
-    add("arrow", makeLine<CGraphicArrow>(kStyleSolid));
-    add("dimension", makeLine<CGraphicDimension>(kStyleSolid));
+    add("line of dots", makeLine<CGraphicLine>(kStyleDot));
+    add("arrow", makeLine<CGraphicArrow>(kStyleLongDash));
+    add("dimension", makeLine<CGraphicDimension>(kStyleShortDash));
     add("image", makeImage());
     const auto frame = makeImage();
-    frame->SetScaleMargins({1.5, 1.5, 1.5, 1.5, 2, 1, 1, 1});
+    frame->SetScaleMargins({1.5, 1, 2, 1.5, 2, 2.5, 0.5, 1.5});
     add("image with margins", frame);
     const auto small = makeImage();
     small->SetNoScale(true);
@@ -112,7 +116,7 @@ std::vector<SSubject> makeSubjects() {
     add("table", table);
     const auto mirror = peru::make<CGraphicMirror>();
     mirror->SetDocument(peru::make<CGraphicDocument>());
-    mirror->GetDocument()->Add(star->Clone());
+    mirror->GetDocument()->Add(mirrored->Clone());
     add("mirror", mirror, 20);
     const auto label = peru::make<CGraphicLabel>();
     label->SetText("Label");

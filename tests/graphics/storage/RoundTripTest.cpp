@@ -16,32 +16,6 @@ using tests::P;
 
 namespace {
 
-// Writes pixels instead of files, so that documents with equal records have equal pictures.
-class CRecorder : public CBase64Resources {
-public:
-    explicit CRecorder(bool hasPixels) : m_hasPixels(hasPixels) {}
-    void SaveBitmap(const P<peru::IXmlNode>& node, const std::string& key, const P<CBitmap>& bitmap,
-                    const std::string&) override {
-        if (!bitmap) return;
-        const auto child = node->addChildNode(key.c_str());
-        child->setProperty("width", std::to_string(bitmap->GetWidth()).c_str());
-        child->setProperty("height", std::to_string(bitmap->GetHeight()).c_str());
-        if (m_hasPixels)
-            for (const uint32_t pixel : bitmap->GetPixels())
-                child->addChildNode("pixel")->setText(std::to_string(pixel).c_str());
-    }
-
-private:
-    const bool m_hasPixels;
-};
-
-std::string record(const P<CGraphicDocument>& document, bool hasPixels) {
-    const auto xml = peru::make<peru::CXmlDocument>();
-    const auto recorder = peru::make<CRecorder>(hasPixels);
-    document->Save(xml->addChildNode("graphic-document"), *recorder);
-    return peru::CString::toStdString(xml->printToString());
-}
-
 SaveContent saveOne(const P<CGraphicDocument>& document) {
     return [&document](const P<peru::IXmlNode>& root, IResourceOutputStore& store) {
         document->Save(root->addChildNode("graphic-document"), store);
@@ -77,20 +51,17 @@ TEST_P(ManyDocuments, RestoreEveryField) {
         other->AddTag(makeName(random));
         document->Add(image);
         document->Add(other);
-        const std::string exact = record(document, true), lossy = record(document, false);
         P<CGraphicDocument> copy;
         const std::string archive = WriteArchive(kProjectForm, saveOne(document), true);
         ReadArchive(kProjectForm, archive, loadOne(copy));
-        ASSERT_EQ(record(copy, true), exact) << i;
         ASSERT_EQ(WriteArchive(kProjectForm, saveOne(copy), true), archive) << i;
         const auto& elements = copy->GetElements();
         ASSERT_EQ(P<CGraphicImage>(elements[elements.size() - 2])->GetBitmap(),
                   P<CGraphicImage>(elements.back())->GetBitmap());
         const std::string xml = WriteXml("project", saveOne(document));
         ReadXml("project", xml, loadOne(copy));
-        ASSERT_EQ(record(copy, false), lossy) << i;
         ASSERT_EQ(WriteXml("project", saveOne(copy)), xml) << i;
-        ASSERT_EQ(record(CDataObjectGraphicDocument(document).GetDocument(), false), lossy) << i;
+        ASSERT_EQ(WriteXml("project", saveOne(CDataObjectGraphicDocument(document).GetDocument())), xml) << i;
     }
 }
 
