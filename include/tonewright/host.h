@@ -92,14 +92,15 @@ typedef struct TONEWRIGHT_LogMessage {
     const char* message;
 } TONEWRIGHT_LogMessage;
 
-/* Called on the thread that logs, which may be any thread, and concurrently. Messages caused by the callback
- * itself, on its own thread, are not delivered to it. */
+/* Called on the thread that logs, which may be any thread, by one thread at a time and with locks of the
+ * library held: see TONEWRIGHT_AddProxyLogManager. Messages caused by the callback itself, on its own thread,
+ * are not delivered to it. */
 typedef void (*TONEWRIGHT_LogCallback)(const TONEWRIGHT_LogMessage* message, void* user);
 
 /* A log for TONEWRIGHT_AddProxyLogManager that passes messages of `minimumLevel` and above to the callback.
  * Does not require the started library: a log added before TONEWRIGHT_InitStartup receives the messages of
- * the start. After TONEWRIGHT_RemoveProxyLogManager has returned, no further call begins, but one may still
- * be running on another thread. Null for a null callback. */
+ * the start. Once TONEWRIGHT_RemoveProxyLogManager has returned, the callback is not called any more. Null
+ * for a null callback. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateLog(int32_t minimumLevel,
                                                            TONEWRIGHT_LogCallback callback, void* user);
 
@@ -287,8 +288,8 @@ TONEWRIGHT_API int32_t TONEWRIGHT_Host_GetTagPicture(TONEWRIGHT_Handle tags, int
 /* A set of changes, at first empty, that can be applied to any number of files. */
 TONEWRIGHT_API TONEWRIGHT_Handle TONEWRIGHT_Host_CreateTagChange(void);
 /* Replaces the values of a field by this one; calls with the same name add further values. A null or empty
- * value removes the field. Names consist of printable ASCII characters except '=', in either case; 0 for
- * others. */
+ * value removes the field, and drops the values of earlier calls. Names consist of printable ASCII characters
+ * except '=' and '~', in either case; 0 for others. */
 TONEWRIGHT_API int32_t TONEWRIGHT_Host_ChangeTagField(TONEWRIGHT_Handle change, const char* name,
                                                       const char* value);
 /* Removes the pictures of a type, or all for -1, before others are added. */

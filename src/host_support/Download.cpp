@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <cstdio>
 #include <memory>
+#include <utility>
 #include <vector>
 
 using namespace tonewright::host_support;
@@ -26,6 +27,7 @@ public:
     ~CDownload() override = default;
 
     const P<CHTTPOperation> operation;
+    bool hasRun = false; // its body has been read: another run would overwrite the file with nothing
 };
 
 void run(CHTTPOperation& operation, const std::string& path, TONEWRIGHT_DownloadProgress progress,
@@ -64,6 +66,7 @@ int32_t TONEWRIGHT_Host_RunDownload(TONEWRIGHT_Handle download, const char* path
     return guard(0, [&] {
         const P<CDownload> object = require<CDownload>(download, "a download");
         if (!path || !*path) throw peru::CError("A download needs a path");
+        if (std::exchange(object->hasRun, true)) throw peru::CError("A download runs only once");
         run(*object->operation, path, progress, user);
         return 1;
     });

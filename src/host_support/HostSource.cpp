@@ -56,7 +56,9 @@ double CHostSource::getDuration() {
 
 void CHostSource::setStartTime(double fStartTime) {
     m_start = toFrame(fStartTime);
-    if (m_isOpened) moveTo(m_start);
+    if (!m_isOpened) return;
+    moveTo(m_start);
+    m_hasEnded = false;
 }
 
 double CHostSource::getStartTime() {

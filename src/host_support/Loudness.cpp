@@ -7,6 +7,7 @@
 #include "peru/threads/OrderedParts.h"
 #include "sonora2/media/CloseGuard.h"
 
+#include <algorithm>
 #include <cmath>
 #include <deque>
 #include <new>
@@ -102,7 +103,8 @@ P<CMeasurement> measure(const P<IAudioSource>& source, TONEWRIGHT_LoudnessProgre
             first.pop_front();
         }
         if (!chunk) break;
-        const double fraction = duration > 0.0 ? chunk->getTimestamp() / duration : 0.0;
+        // The duration may be an estimate.
+        const double fraction = duration > 0.0 ? std::clamp(chunk->getTimestamp() / duration, 0.0, 1.0) : 0.0;
         const int32_t answer = callback ? callback(fraction, user) : TONEWRIGHT_CONTINUE;
         if (answer == TONEWRIGHT_DISCARD) return nullptr;
         if (answer == TONEWRIGHT_STOP) break;

@@ -2,6 +2,7 @@
 #include "host_support/Guard.h"
 #include "host_support/WriterQuestions.h"
 #include "peru/strings/LocalizedFormat.h"
+#include "sonora2/boxed/PluginModuleBoxed.h"
 #include "sonora2/context/SonoraError.h"
 #include "sonora2/media/CloseGuard.h"
 #include "sonora2/media/IClippingPrevention.h"
@@ -10,7 +11,6 @@
 #include "sonora2/media/ISalvage.h"
 #include "sonora2/plugins/MediaEnvironment.h"
 #include "sonora2/plugins/PluginExtensions.h"
-#include "sonora2/plugins/PluginModule.h"
 
 using namespace tonewright::host_support;
 using namespace sonora2::common;
@@ -182,7 +182,7 @@ int32_t TONEWRIGHT_Host_GetPlugin(const char16_t* extension, int32_t type, TONEW
         TONEWRIGHT_PluginInfo values = {};
         const bool isFound = askPlugins(uri, handler, type, [&](ISonoraPlugin& plugin) {
             copyText(values.plugin, CString::toStdString(plugin.getPluginName()));
-            values.isBoxed = dynamic_cast<CPluginModule*>(&plugin) == nullptr;
+            values.isBoxed = dynamic_cast<CPluginModuleBoxed*>(&plugin) != nullptr;
             return true;
         });
         if (!isFound && isWriting) failWithoutWriter(uri, *handler);

@@ -46,6 +46,15 @@ SPictureFormat readPng(std::string_view data) {
     return {"image/png", readBig(data, 18), readBig(data, 22), depth};
 }
 
+SPictureFormat readBmp(std::string_view data) {
+    constexpr int32_t kOldHeader = 12; // with sizes of 16 bits
+    if (readLittle(data, 14) == kOldHeader)
+        return {"image/bmp", readLittle(data, 18), readLittle(data, 20), readLittle(data, 24)};
+    const int32_t height = readLittle(data, 22);
+    const bool isTopDown = readLittle(data, 24) == 0xFFFF; // then the height is negative
+    return {"image/bmp", readLittle(data, 18), isTopDown ? 0x10000 - height : height, readLittle(data, 28)};
+}
+
 SPictureFormat readWebP(std::string_view data) {
     SPictureFormat format{"image/webp"};
     const std::string_view kind = data.substr(12, 4);
@@ -68,8 +77,7 @@ SPictureFormat detectPictureFormat(std::string_view data) {
     if (data.starts_with("\xff\xd8\xff")) return readJpeg(data);
     if (data.starts_with("\x89PNG\r\n\x1a\n")) return readPng(data);
     if (data.starts_with("GIF8")) return {"image/gif", readLittle(data, 6), readLittle(data, 8), 24};
-    if (data.starts_with("BM"))
-        return {"image/bmp", readLittle(data, 18), readLittle(data, 22), readLittle(data, 28)};
+    if (data.starts_with("BM")) return readBmp(data);
     if (data.starts_with("RIFF") && data.substr(0, 12).ends_with("WEBP")) return readWebP(data);
     return {};
 }

@@ -18,73 +18,62 @@ namespace {
 constexpr struct {
     const char* key; // as in tag transfer
     P<IString> (IFileTag::*get)() const;
-    void (IFileTag::*set)(const peru::CStringArg& text);
-} kFields[] = {{"TITLE", &IFileTag::getTitle, &IFileTag::setTitle},
-               {"ARTIST", &IFileTag::getArtist, &IFileTag::setArtist},
-               {"ALBUM", &IFileTag::getAlbum, &IFileTag::setAlbum},
-               {"ALBUMARTIST", &IFileTag::getAlbumArtist, &IFileTag::setAlbumArtist},
-               {"TRACKNUMBER", &IFileTag::getTrackNumber, &IFileTag::setTrackNumber},
-               {"DATE", &IFileTag::getYear, &IFileTag::setYear},
-               {"GENRE", &IFileTag::getGenre, &IFileTag::setGenre},
-               {"COMMENT", &IFileTag::getComment, &IFileTag::setComment}};
+} kFields[] = {{"TITLE", &IFileTag::getTitle},
+               {"ARTIST", &IFileTag::getArtist},
+               {"ALBUM", &IFileTag::getAlbum},
+               {"ALBUMARTIST", &IFileTag::getAlbumArtist},
+               {"TRACKNUMBER", &IFileTag::getTrackNumber},
+               {"DATE", &IFileTag::getYear},
+               {"GENRE", &IFileTag::getGenre},
+               {"COMMENT", &IFileTag::getComment}};
 
-struct SSource {
-    filetag::STags all;
-    // Of a WAVE file, where the tag class of the exports finds fields that TagLib does not; parallel to
-    // kFields.
-    std::vector<P<IString>> texts;
+bool hasField(const std::vector<filetag::STagField>& fields, const char* key) {
+    return std::any_of(fields.begin(), fields.end(),
+                       [&](const filetag::STagField& field) { return field.key->equalsIgnoreCase(key); });
+}
 
-    bool isEmpty() const {
-        return all.fields.empty() && all.pictures.empty() &&
-               std::all_of(texts.begin(), texts.end(), [](const auto& text) { return text->isEmpty(); });
+// Adds the fields of a WAVE file that the tag class of the exports finds and TagLib does not, which would
+// otherwise be lost with a copy or a change.
+void addMissedFields(const P<peru::IURI>& file, std::vector<filetag::STagField>& fields) {
+    if (!sonora2::common::getLookupKey(file, nullptr)->equals("wav")) return;
+    const filetag::STags known = filetag::getLibrary()->readAllTags(file);
+    const P<IFileTag> tag = filetag::getLibrary()->createTag(file);
+    for (const auto& field : kFields) {
+        if (!tag || hasField(known.fields, field.key) || hasField(fields, field.key)) continue;
+        const P<IString> text = ((*tag).*field.get)();
+        if (!text->isEmpty()) fields.push_back({CString::fromUTF8(field.key), {text}});
     }
-};
+}
 
 // The result is empty for file types without tags.
-SSource readSource(const P<peru::IURI>& file) {
-    SSource source;
+filetag::STags readSource(const P<peru::IURI>& file) {
+    filetag::STags source;
     try {
-        source.all = filetag::getLibrary()->readAllTags(file);
-        if (sonora2::common::getLookupKey(file, nullptr)->equals("wav"))
-            if (const P<IFileTag> own = filetag::getLibrary()->createTag(file))
-                for (const auto& field : kFields) source.texts.push_back(((*own).*field.get)());
+        source = filetag::getLibrary()->readAllTags(file);
+        addMissedFields(file, source.fields);
     } catch (const peru::CFileFormatNotSupportedError&) {
         // Keep what has been read so far.
     }
     return source;
 }
 
-// Stores the fields of a WAVE file that TagLib has missed. Returns their keys.
-std::vector<std::string> complement(const SSource& source, const P<peru::IURI>& file) {
-    std::vector<std::string> stored;
-    const P<IFileTag> target = source.texts.empty() ? nullptr : filetag::getLibrary()->createTag(file);
-    if (!target) return stored;
-    for (size_t i = 0; i < source.texts.size(); ++i) {
-        const auto& field = kFields[i];
-        if (source.texts[i]->isEmpty() || !((*target).*field.get)()->isEmpty()) continue;
-        ((*target).*field.set)(source.texts[i]);
-        if (!((*target).*field.get)()->isEmpty()) stored.push_back(field.key);
-    }
-    if (!stored.empty()) target->store();
-    return stored;
+bool isEmpty(const filetag::STags& tags) {
+    return tags.fields.empty() && tags.pictures.empty() && tags.others.empty();
 }
 
 // Returns the names of the fields and pictures that the target cannot hold.
-std::string writeTarget(const SSource& source, const P<peru::IURI>& to) {
+std::string writeTarget(const filetag::STags& source, const P<peru::IURI>& to) {
     std::vector<std::string> lost;
     try {
-        const filetag::STransferReport report = filetag::getLibrary()->addTags(to, source.all);
-        const std::vector<std::string> stored = complement(source, to);
-        for (const P<IString>& field : report.lostFields) {
-            const std::string name = CString::toStdString(field);
-            if (std::find(stored.begin(), stored.end(), name) == stored.end()) lost.push_back(name);
-        }
+        filetag::STags all = source;
+        addMissedFields(to, all.fields);
+        const filetag::STransferReport report = filetag::getLibrary()->addTags(to, all);
+        for (const P<IString>& field : report.lostFields) lost.push_back(CString::toStdString(field));
         for (const filetag::STagPicture& picture : report.lostPictures)
             lost.push_back("picture (" + CString::toStdString(picture.mimeType) + ")");
     } catch (const peru::CFileFormatNotSupportedError&) {
-        for (const filetag::STagField& field : source.all.fields)
-            lost.push_back(CString::toStdString(field.key));
-        if (!source.all.pictures.empty()) lost.push_back("pictures");
+        for (const filetag::STagField& field : source.fields) lost.push_back(CString::toStdString(field.key));
+        if (!source.pictures.empty()) lost.push_back("pictures");
     }
     std::string names;
     for (const std::string& name : lost) names += (names.empty() ? "" : ", ") + name;
@@ -119,21 +108,14 @@ public:
     std::vector<SEntry> entries;
     std::vector<SPicture> pictures;
 
-    explicit CTagCopy(const SSource& source) {
-        for (const filetag::STagField& field : source.all.fields)
+    explicit CTagCopy(const filetag::STags& source) {
+        for (const filetag::STagField& field : source.fields)
             for (const P<IString>& value : field.values)
                 entries.push_back({toText(field.key), toText(value), true});
-        for (size_t i = 0; i < source.texts.size(); ++i) {
-            const bool isThere = std::any_of(entries.begin(), entries.end(), [&](const SEntry& entry) {
-                return entry.name == kFields[i].key;
-            });
-            if (!isThere && !source.texts[i]->isEmpty())
-                entries.push_back({kFields[i].key, toText(source.texts[i]), true});
-        }
         std::stable_sort(entries.begin(), entries.end(),
                          [](const SEntry& a, const SEntry& b) { return a.name < b.name; });
-        for (const P<IString>& name : source.all.others) entries.push_back({toText(name), "", false});
-        for (const filetag::STagPicture& picture : source.all.pictures) add(picture);
+        for (const P<IString>& name : source.others) entries.push_back({toText(name), "", false});
+        for (const filetag::STagPicture& picture : source.pictures) add(picture);
     }
     ~CTagCopy() override = default;
 
@@ -165,23 +147,6 @@ bool isFieldName(std::string_view name) {
            std::all_of(name.begin(), name.end(), [](char c) { return c >= ' ' && c <= '}' && c != '='; });
 }
 
-bool hasField(const std::vector<filetag::STagField>& fields, const char* key) {
-    return std::any_of(fields.begin(), fields.end(),
-                       [&](const filetag::STagField& field) { return field.key->equalsIgnoreCase(key); });
-}
-
-// TagLib would drop the fields of a WAVE file that it does not find.
-void keepMissedTexts(const P<peru::IURI>& file, filetag::STagChange& change) {
-    if (!sonora2::common::getLookupKey(file, nullptr)->equals("wav")) return;
-    const SSource source = readSource(file);
-    for (size_t i = 0; i < source.texts.size(); ++i) {
-        const char* const key = kFields[i].key;
-        if (source.texts[i]->isEmpty() || hasField(source.all.fields, key) || hasField(change.fields, key))
-            continue;
-        change.fields.push_back({CString::fromUTF8(key), {source.texts[i]}});
-    }
-}
-
 template <class Item> const Item& getItem(const std::vector<Item>& items, int32_t index) {
     if (index < 0 || static_cast<size_t>(index) >= items.size())
         throw peru::CError(peru::localize("tonewright.Tags.index", "The index is out of range"));
@@ -196,9 +161,9 @@ int32_t TONEWRIGHT_Host_CopyTags(const char16_t* source, const char16_t* target,
     return guard(failure, [&] {
         const P<peru::IURI> from = tonewright::exports::toURI(source),
                             to = tonewright::exports::toURI(target);
-        const SSource tag = readSource(from);
+        const filetag::STags tag = readSource(from);
         failure = -1;
-        if (tag.isEmpty()) return 1;
+        if (isEmpty(tag)) return 1;
         const std::string names = writeTarget(tag, to);
         if (lost && !names.empty()) *lost = ::strdup(names.c_str());
         return 1;
@@ -217,8 +182,8 @@ int32_t TONEWRIGHT_Host_GetTagSupport(const char16_t* uri) {
 TONEWRIGHT_Handle TONEWRIGHT_Host_ReadTags(const char16_t* uri) {
     return guard<TONEWRIGHT_Handle>(nullptr, [&] {
         const P<peru::IURI> file = tonewright::exports::toURI(uri);
-        SSource source = readSource(file);
-        if (source.isEmpty()) filetag::getLibrary()->readAllTags(file); // throws if the format is unknown
+        const filetag::STags source = readSource(file);
+        if (isEmpty(source)) filetag::getLibrary()->readAllTags(file); // throws if the format is unknown
         return wrap(peru::make<CTagCopy>(source));
     });
 }
@@ -269,7 +234,10 @@ int32_t TONEWRIGHT_Host_ChangeTagField(TONEWRIGHT_Handle change, const char* nam
             return other.key->equalsIgnoreCase(key);
         });
         if (field == fields.end()) field = fields.insert(fields.end(), {key, {}});
-        if (value && *value) field->values.push_back(CString::fromUTF8(value));
+        if (value && *value)
+            field->values.push_back(CString::fromUTF8(value));
+        else
+            field->values.clear();
         return 1;
     });
 }
@@ -316,7 +284,7 @@ int32_t TONEWRIGHT_Host_ApplyTagChange(TONEWRIGHT_Handle change, const char16_t*
     return guard(-1, [&] {
         const P<peru::IURI> file = tonewright::exports::toURI(uri);
         filetag::STagChange all = require<CTagChange>(change, "a change of a tag")->change;
-        keepMissedTexts(file, all);
+        addMissedFields(file, all.fields);
         return filetag::getLibrary()->changeTags(file, all) ? 1 : 0;
     });
 }

@@ -1,10 +1,7 @@
 // Look-ups of discs and downloads through the C interface.
+#include "HostSupport.h"
 #include "freedb/CddbServer.h"
 #include "peru/net/ScriptedServer.h"
-#include "support/Environment.h"
-#include "support/TempFolder.h"
-
-#include <tonewright/host.h>
 
 #include <thread>
 
@@ -14,32 +11,12 @@ namespace {
 
 const std::vector<int32_t> kSeveral = {183, 18000, 36049, 54999};
 
-struct CHandle {
-    explicit CHandle(TONEWRIGHT_Handle handle) : handle(handle) {}
-    ~CHandle() { TONEWRIGHT_Host_DestroyHandle(handle); }
-    CHandle(const CHandle&) = delete;
-    CHandle& operator=(const CHandle&) = delete;
-    operator TONEWRIGHT_Handle() const { return handle; }
-    TONEWRIGHT_Handle handle;
-};
-
-class HostNetwork : public testing::Test {
+class HostNetwork : public CHostTest {
 protected:
-    void SetUp() override { ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK); }
-    void TearDown() override { TONEWRIGHT_DeInitAll(); }
-
     static int32_t query(TONEWRIGHT_Handle cddb) {
         return TONEWRIGHT_Host_QueryCDDB(cddb, kSeveral.data(), 4, 70000);
     }
-    static std::string lastFailure() {
-        TONEWRIGHT_Failure failure = {};
-        failure.size = sizeof failure;
-        TONEWRIGHT_Host_GetLastFailure(&failure);
-        return failure.message;
-    }
 
-    CTempFolder folder;
-    CEnvironment quiet{"TONEWRIGHT_DEBUG_OUTPUT", "0"};
     CEnvironment direct{"http_proxy", ""};
     CEnvironment cache{"XDG_CACHE_HOME", folder.path().string()};
 };
@@ -55,22 +32,22 @@ TEST_F(HostNetwork, Cddb) {
     EXPECT_EQ(id, 0x2103a304u);
 
     const CCddbServer server;
-    TONEWRIGHT_CDDBSettings settings = {};
-    settings.size = sizeof settings;
+    auto settings = makeRecord<TONEWRIGHT_CDDBSettings>();
     EXPECT_EQ(TONEWRIGHT_Host_CreateCDDB(&settings), nullptr);
     settings.host = "127.0.0.1";
     settings.port = server.getPort();
     settings.clientName = "test";
     EXPECT_EQ(TONEWRIGHT_Host_CreateCDDB(&settings), nullptr);
-    EXPECT_EQ(lastFailure(), "A look-up needs the name and the version of the application");
+    EXPECT_STREQ(lastFailure().message, "A look-up needs the name and the version of the application");
     settings.clientVersion = "1";
+    settings.proxy = "127.0.0.1:1";
+    settings.noProxy = "127.0.0.1";
     settings.size = offsetof(TONEWRIGHT_CDDBSettings, cacheFolder); // of an older host
     settings.cacheFolder = "/unused";
     const CHandle cddb(TONEWRIGHT_Host_CreateCDDB(&settings));
     EXPECT_EQ(query(cddb), TONEWRIGHT_CDDB_EXACT);
     ASSERT_EQ(TONEWRIGHT_Host_GetCDDBCandidateCount(cddb), 2);
-    TONEWRIGHT_CDDBCandidate candidate = {};
-    candidate.size = sizeof candidate;
+    auto candidate = makeRecord<TONEWRIGHT_CDDBCandidate>();
     EXPECT_EQ(TONEWRIGHT_Host_GetCDDBCandidate(cddb, 2, &candidate), 0);
     EXPECT_EQ(TONEWRIGHT_Host_GetCDDBCandidate(cddb, 1, &candidate), 1);
     EXPECT_STREQ(candidate.category, "misc");
@@ -78,15 +55,13 @@ TEST_F(HostNetwork, Cddb) {
     EXPECT_STREQ(candidate.title, "A / Other");
     EXPECT_EQ(TONEWRIGHT_Host_ReadCDDB(cddb, -1), nullptr);
     EXPECT_EQ(TONEWRIGHT_Host_ReadCDDB(cddb, 0), nullptr);
-    EXPECT_EQ(lastFailure(), "The server returned an error message (code 401).");
+    EXPECT_STREQ(lastFailure().message, "The server returned an error message (code 401).");
     const CHandle record(TONEWRIGHT_Host_ReadCDDB(cddb, 1));
-    TONEWRIGHT_CDDBRecord disc = {};
-    disc.size = sizeof disc;
+    auto disc = makeRecord<TONEWRIGHT_CDDBRecord>();
     EXPECT_EQ(TONEWRIGHT_Host_GetCDDBRecord(record, &disc), 1);
     EXPECT_STREQ(disc.title, "Other");
     EXPECT_EQ(disc.trackCount, 4);
-    TONEWRIGHT_CDDBTrack track = {};
-    track.size = sizeof track;
+    auto track = makeRecord<TONEWRIGHT_CDDBTrack>();
     EXPECT_EQ(TONEWRIGHT_Host_GetCDDBTrack(record, 4, &track), 0);
     EXPECT_EQ(TONEWRIGHT_Host_GetCDDBTrack(record, 2, &track), 1);
     EXPECT_STREQ(track.artist, "Z");
@@ -125,14 +100,15 @@ TEST_F(HostNetwork, Downloads) {
         return TONEWRIGHT_CONTINUE;
     };
     const CHandle whole(open("/whole"));
-    EXPECT_EQ(TONEWRIGHT_Host_RunDownload(whole, file.c_str(), report, seen), 1) << lastFailure();
+    EXPECT_EQ(TONEWRIGHT_Host_RunDownload(whole, file.c_str(), report, seen), 1) << lastFailure().message;
     EXPECT_EQ(seen[0], 5);
     EXPECT_EQ(seen[1], 5);
+    EXPECT_EQ(TONEWRIGHT_Host_RunDownload(whole, file.c_str(), nullptr, nullptr), 0) << "a second time";
     EXPECT_EQ(readFile(file), "hello");
     EXPECT_EQ(TONEWRIGHT_Host_RunDownload(CHandle(open("/short")), file.c_str(), nullptr, nullptr), 0);
-    EXPECT_NE(lastFailure().find("Unexpected end of data stream"), std::string::npos);
+    EXPECT_NE(std::string(lastFailure().message).find("Unexpected end of data stream"), std::string::npos);
     EXPECT_EQ(TONEWRIGHT_Host_RunDownload(CHandle(open("/whole")), "/dev/full", nullptr, nullptr), 0);
-    EXPECT_EQ(lastFailure(), "/dev/full cannot be written: No space left on device");
+    EXPECT_STREQ(lastFailure().message, "/dev/full cannot be written: No space left on device");
     const auto stop = [](int64_t, int64_t, void*) -> int32_t { return TONEWRIGHT_STOP; };
     EXPECT_EQ(TONEWRIGHT_Host_RunDownload(CHandle(open("/whole")), file.c_str(), stop, nullptr), 0);
     const CHandle silent(open("/silent"));

@@ -32,18 +32,11 @@ protected:
 };
 
 TEST_F(CoverEditor, IsLoadedByTheFirstEditorOnly) {
-    const CTempFolder folder;
-    const std::u16string uri = std::filesystem::path("file://" + (folder / "x.flac").string()).u16string();
-    {
-        const CHandle source =
-            wrap(peru::make<CFakeSource>(SFakeSource{.rate = 44100, .frames = 44100, .chunkFrames = 4410}));
-        const CHandle format(TONEWRIGHT_CreateAudioFormatFromURI(uri.c_str(), 44100, 2, 2, 0.0, 0, 0, 0));
-        const CHandle encoder(TONEWRIGHT_CreateAudioEncoder(source.get(), format.get()));
-        ASSERT_EQ(TONEWRIGHT_AudioEncoder_Encode(encoder.get()), TONEWRIGHT_OK);
-    }
     TONEWRIGHT_ReleaseCoverEditorHandle(0);
     EXPECT_FALSE(TONEWRIGHT_EMBEDDEDCOVEREDITOR_GotoNextPage());
-    TONEWRIGHT_EMBEDDEDCOVEREDITOR_Idle();
+    log->take();
+    for (int i = 0; i < 3; ++i) TONEWRIGHT_EMBEDDEDCOVEREDITOR_Idle();
+    EXPECT_LE(log->take().size(), 1u) << "a host's idle time must not fill the log";
     EXPECT_EQ(findMapped(), "");
 
     const CTempFolder broken, other;

@@ -6,11 +6,6 @@ namespace {
 
 using namespace tests;
 
-std::u16string uriOf(const std::filesystem::path& path) {
-    const std::string text = "file://" + path.string(); // without characters to escape
-    return {text.begin(), text.end()};
-}
-
 std::u16string take(TONEWRIGHT_Handle handle) {
     CHandle text(handle);
     if (!text) return u"<null>";

@@ -7,7 +7,6 @@
 #include <set>
 
 extern "C" int tests_readFirstExtension(char16_t* text, size_t capacity);
-extern "C" int tests_convert(const char16_t* from, const char16_t* to);
 
 namespace {
 
@@ -43,13 +42,6 @@ TEST_F(CHost, TextHandle_IsReadThroughTheHeader) {
     EXPECT_EQ(TONEWRIGHT_GetTextLength(handle.get()), 34u);
     EXPECT_EQ(std::u16string(TONEWRIGHT_GetText(handle.get())),
               u"a text of more than a few units \U0001F3B5");
-}
-
-TEST_F(CHost, Conversion_RunsFromCToEnd) {
-    EXPECT_EQ(tests_convert(u"file:///in.tst", u"file:///out.tst"), 0);
-    EXPECT_EQ(tests_convert(u"file:///in.nothing", u"file:///out.tst"), 1);
-    EXPECT_EQ(tests_convert(u"file:///refuse.tst", u"file:///out.tst"), 1);
-    EXPECT_EQ(tests_convert(u"file:///in.tst", u"file:///out.nothing"), 2);
 }
 
 TEST(Interface, Features_AreNineBytes) {

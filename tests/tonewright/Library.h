@@ -29,6 +29,10 @@ inline CHandle wrap(P<peru::IBase> object) {
     return CHandle(reinterpret_cast<TONEWRIGHT_Handle>(wrapper));
 }
 
+inline std::u16string uriOf(const std::filesystem::path& path) {
+    return std::filesystem::path("file://" + path.string()).u16string(); // without characters to escape
+}
+
 // The interface that a C++ library beside the front finds behind a handle.
 template <class T> P<T> behind(const CHandle& handle) {
     const auto* wrapper =

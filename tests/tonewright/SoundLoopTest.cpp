@@ -7,15 +7,6 @@ namespace {
 
 using namespace tests;
 
-// Removes silent frames before, after, and where a busy machine misses a buffer: the material itself is never
-// silent.
-std::string withoutSilence(const std::string& sound) {
-    std::string left;
-    for (size_t at = 0; at + 4 <= sound.size(); at += 4)
-        if (sound.compare(at, 4, std::string(4, '\0')) != 0) left.append(sound, at, 4);
-    return left;
-}
-
 // The server's input records its output.
 TEST(SoundLoop, Player_IsHeardWholeByARecording) {
     CSoundServer server;

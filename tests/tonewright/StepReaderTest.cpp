@@ -34,7 +34,7 @@ class StepReader : public testing::TestWithParam<const char*> {
 protected:
     void SetUp() override {
         ASSERT_EQ(TONEWRIGHT_InitStartup(), TONEWRIGHT_OK);
-        m_uri = fs::path("file://" + m_path.string()).u16string();
+        m_uri = uriOf(m_path);
         const CHandle format(TONEWRIGHT_CreateAudioFormatFromURI(m_uri.c_str(), 44100, 2, 2, 0.0, 0, 0, 0));
         SFakeSource script{.rate = 44100, .frames = kFrames, .chunkFrames = 44100};
         const CHandle source = wrap(peru::make<CFakeSource>(script));

@@ -32,7 +32,8 @@ constexpr auto kLeftoverAge = std::chrono::minutes(1);
 // any number.
 void sweep(const fs::path& folder, std::string suffix) {
     const size_t digits = suffix.find_last_not_of("0123456789") + 1;
-    if (digits == suffix.size()) return; // the suffix has no process number
+    // Without a process number, or with nothing else, the suffix does not identify such files.
+    if (digits == suffix.size() || digits == 0) return;
     suffix.resize(digits);
     std::error_code error;
     for (fs::directory_iterator entries(folder, error), end; !error && entries != end;
