@@ -28,10 +28,10 @@ std::set<int> parseTracks(const std::string& text) {
         std::istringstream in(part);
         int first = -1, last = 0;
         char dash = 0, rest = 0;
-        in >> first;
+        if (!(in >> first)) first = -1;
         last = first;
         if (in >> dash) in >> last;
-        if (in.fail() && !(in.eof() && dash == 0)) first = -1;
+        if (in.fail() && dash != 0) first = -1;
         if (first < 0 || last < first || last > 99 || (dash != 0 && dash != '-') || in >> rest)
             throw CLI::ValidationError("TRACKS",
                                        tr("host.Rip.badTracks",

@@ -118,11 +118,13 @@ void addJobs(CLI::App& command, int& jobs, const std::string& help) {
 void addBoxed(CLI::App& app, std::string& plugins) {
     app.add_flag(
            "--boxed{all}", plugins,
-           "Run plug-ins in processes of their own, so that one that crashes on a damaged file does not "
-           "end the job: all, none, or names separated by commas, such as --boxed=flac,vorbis")
+           tr("host.help.boxed",
+              "Run plug-ins in processes of their own, so that one that crashes on a damaged file does not "
+              "end the job: all, none, or names separated by commas, such as --boxed=flac,vorbis"))
         ->check([](const std::string& list) {
-            return list.find_first_of(" ;/") == std::string::npos ? std::string()
-                                                                  : "names are separated by commas";
+            return list.find_first_of(" ;/") == std::string::npos
+                       ? std::string()
+                       : tr("host.arguments.boxed", "names are separated by commas");
         });
 }
 

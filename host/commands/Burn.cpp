@@ -242,8 +242,11 @@ bool CBurner::write(CDiscProject& project) {
     };
     if (!m_drive) return project.writeImage(m_target, settings, advance);
     try {
-        return project.writeDisc(m_drive.get(), settings, advance);
-    } catch (const std::exception&) {
+        if (project.writeDisc(m_drive.get(), settings, advance)) return true;
+        if (project.isPartlyWritten() && !m_options.dummy)
+            m_progress.warn(m_job, tr("host.Burn.partlyWritten", "The disc is partly written"));
+        return false;
+    } catch (const std::exception&) { // its text says whether the disc is partly written
         if (m_options.blank || getDiscFunctions().GetLastError(nullptr) != DISCIO_ERROR_DISC_NOT_EMPTY) throw;
         throw std::runtime_error(
             tr("host.Burn.notEmpty", "The disc is not empty (--blank erases a rewritable disc)"));

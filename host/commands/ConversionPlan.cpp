@@ -50,13 +50,16 @@ fs::path chooseOutput(CLibrary& library, const SConvertOptions& options, const S
     if (!options.output.empty()) return options.output;
     if (options.names) {
         const std::string dot = options.extension.starts_with('.') ? "" : ".";
-        if (isWebAddress(input.file)) throw std::runtime_error("--name cannot name the copy of an address");
+        if (isWebAddress(input.file))
+            throw std::runtime_error(
+                tr("host.Convert.nameOfAddress", "--name cannot name the copy of an address"));
         const fs::path& folder = options.directory.empty() ? input.file.parent_path() : options.directory;
         return folder / options.names->expand(readFields(library, input.file), dot + options.extension);
     }
     const bool isWeb = isWebAddress(input.file);
     fs::path name = isWeb ? getWebName(input.file) : input.file.filename();
-    if (isWeb && name.empty()) throw std::runtime_error("The address has no file name; --output is needed");
+    if (isWeb && name.empty())
+        throw std::runtime_error(tr("host.Get.noName", "The address has no file name; --output is needed"));
     name.replace_extension(options.extension);
     const fs::path beside =
         isWeb ? fs::path() : input.file.parent_path(); // a copy goes to the current folder
@@ -124,6 +127,10 @@ std::string findProblem(const SConversion& conversion, const SConvertOptions& op
     if (fs::is_directory(output, none))
         return tr("host.isDirectory", "%FILE% cannot be written: Is a directory",
                   {{"%FILE%", output.string()}});
+    if (fs::exists(output, none) && !fs::is_regular_file(output, none))
+        return tr(
+            "host.unwritableReason", "%FILE% cannot be written: %REASON%",
+            {{"%FILE%", output.string()}, {"%REASON%", tr("host.notRegular", "Is not a regular file")}});
     if (options.existing == EExisting::refuse && fs::exists(output, none))
         return tr("host.existsForce", "%FILE% exists (--force replaces it)", {{"%FILE%", output.string()}});
     clearFailure();

@@ -24,7 +24,6 @@
 #include <optional>
 #include <stdexcept>
 #include <sys/stat.h>
-#include <system_error>
 #include <utility>
 
 namespace host {
@@ -233,13 +232,8 @@ bool CConverter::convert(size_t index, CProgress::Job job) {
         spool.emplace();
         target = spool->getPath() / "output";
         target.replace_extension(m_options.extension);
-    } else if (createsFolders(m_options) && target.has_parent_path()) {
-        std::error_code error;
-        fs::create_directories(target.parent_path(), error);
-        if (error)
-            throw std::runtime_error(
-                tr("host.folderNotCreated", "The folder %FOLDER% cannot be created: %REASON%",
-                   {{"%FOLDER%", target.parent_path().string()}, {"%REASON%", error.message()}}));
+    } else if (createsFolders(m_options)) {
+        createFolders(target.parent_path());
     }
     COutput place(target, m_temporaryEnding, m_options.existing == EExisting::replace);
     const fs::path& temporary = place.getTemporary();

@@ -66,11 +66,13 @@ std::string describe(int32_t event) {
     }
 }
 
-std::string describeState(const SDrive& drive) {
+// JSON is not translated.
+std::string describeState(const SDrive& drive, bool json) {
     const SDiscFunctions& functions = getDiscFunctions();
     if (functions.DriveCheckDisc(drive.handle.get(), 1000, 0) != 1) return "";
     const DiscHandle<DISCIO_Disc> disc(functions.DriveOpenDisc(drive.handle.get()));
-    return disc ? describeMedium(functions.DiscGetMediumType(disc.get())) : "unreadable";
+    if (disc) return describeMedium(functions.DiscGetMediumType(disc.get()));
+    return json ? "unreadable" : tr("host.Drives.unreadable", "unreadable");
 }
 
 } // namespace
@@ -84,7 +86,7 @@ int listDrives(bool json) {
                     tr("host.Drives.disc", "disc").c_str(), tr("host.Drives.revision", "revision").c_str(),
                     tr("host.Drives.name", "name").c_str());
     for (const SDrive& drive : drives) {
-        const std::string medium = describeState(drive);
+        const std::string medium = describeState(drive, json);
         if (json)
             std::printf("%s\n", toLine({{"drive", drive.path},
                                         {"name", drive.name},

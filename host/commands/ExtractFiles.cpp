@@ -89,7 +89,7 @@ void CExtractor::extractNamed(const std::string& name) {
 }
 
 void CExtractor::extractAll(const Cursor& cursor, const fs::path& folder) {
-    fs::create_directories(folder);
+    createFolders(folder);
     while (!isCancelled() && getDiscFunctions().DataCursorNext(cursor.get()) == 1)
         extractEntry(cursor, folder);
 }
@@ -116,7 +116,7 @@ void CExtractor::extractEntry(const Cursor& cursor, const fs::path& folder) {
 
 void CExtractor::copyFile(const Cursor& cursor, const fs::path& target, CProgress::Job job) {
     const SDiscFunctions& functions = getDiscFunctions();
-    if (target.has_parent_path()) fs::create_directories(target.parent_path());
+    createFolders(target.parent_path());
     COutput place(target, m_temporaryEnding, m_options.force);
     const int64_t size = functions.DataCursorGetSize(cursor.get());
     {

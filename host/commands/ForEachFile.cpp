@@ -20,7 +20,7 @@ int forEachFile(const std::vector<fs::path>& files, bool json, EReader reader,
                 const std::function<void(const fs::path&)>& job) {
     bool failed = false;
     for (const fs::path& file : files) {
-        if (isCancelled()) return kExitCancelled;
+        if (isCancelled()) break;
         try {
             job(file);
         } catch (const std::exception& error) {
@@ -32,7 +32,7 @@ int forEachFile(const std::vector<fs::path>& files, bool json, EReader reader,
         }
         if (!flushOutput() && reader == EReader::needed) break;
     }
-    return failed ? kExitFailure : kExitSuccess;
+    return isCancelled() ? kExitCancelled : failed ? kExitFailure : kExitSuccess;
 }
 
 } // namespace host

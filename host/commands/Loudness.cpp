@@ -214,7 +214,7 @@ int showLoudness(CLibrary& library, const SLoudnessOptions& options) {
     if (isCancelled()) return kExitCancelled;
     if (options.album) meter.measureAlbum();
     if (options.tag) meter.writeTags();
-    return meter.hasFailed() ? kExitFailure : kExitSuccess;
+    return isCancelled() ? kExitCancelled : meter.hasFailed() ? kExitFailure : kExitSuccess;
 }
 
 } // namespace host

@@ -1,6 +1,7 @@
 #include "commands/Rip.h"
 #include "base/Cancel.h"
 #include "base/ExitCodes.h"
+#include "base/Parallel.h"
 #include "base/Text.h"
 #include "base/Translation.h"
 #include "library/Failure.h"
@@ -18,8 +19,6 @@
 #include <fstream>
 #include <mutex>
 #include <stdexcept>
-#include <system_error>
-#include <thread>
 
 namespace host {
 
@@ -74,6 +73,7 @@ public:
 private:
     void findParts();
     fs::path getTarget(const SDiscTrack& track) const;
+    fs::path getCueTarget() const;
     CNamePattern::Fields getFields(const SDiscTrack& track) const;
     std::unique_ptr<CTrackReader> openPart(const SPart& part);
     bool ripPart(SPart& part);
@@ -126,7 +126,14 @@ void CRipper::findParts() {
     if (!wanted.empty()) throwMissing(*wanted.begin());
     if (m_parts.empty())
         throw std::runtime_error(tr("host.Rip.noTracks", "%DISC% has no audio tracks", {{"%DISC%", place}}));
-    for (SPart& part : m_parts) part.file = getTarget(part.track);
+    std::set<fs::path> taken;
+    for (SPart& part : m_parts) {
+        part.file = getTarget(part.track);
+        if (!taken.insert(part.file.lexically_normal()).second)
+            throw std::runtime_error(tr("host.Convert.sameOutput",
+                                        "Another input is already converted to %FILE%",
+                                        {{"%FILE%", part.file.string()}}));
+    }
 }
 
 CNamePattern::Fields CRipper::getFields(const SDiscTrack& track) const {
@@ -144,7 +151,14 @@ CNamePattern::Fields CRipper::getFields(const SDiscTrack& track) const {
 }
 
 fs::path CRipper::getTarget(const SDiscTrack& track) const {
-    return m_options.directory / m_options.names->expand(getFields(track), "." + m_options.extension);
+    std::string name = m_options.names->expand(getFields(track), "." + m_options.extension);
+    if (m_options.writeCue) std::replace(name.begin(), name.end(), '"', '\''); // see quote()
+    return m_options.directory / name;
+}
+
+fs::path CRipper::getCueTarget() const {
+    return m_options.directory /
+           CNamePattern("%name%").expand({{"name", m_album.empty() ? "disc" : m_album}}, ".cue");
 }
 
 // The fields that the disc itself has; the missing title is not made up.
@@ -204,7 +218,7 @@ std::unique_ptr<CTrackReader> CRipper::openPart(const SPart& part) {
 bool CRipper::copyPart(SPart& part, CProgress::Job job) {
     const auto started = std::chrono::steady_clock::now();
     const fs::path& target = part.file;
-    if (target.has_parent_path()) fs::create_directories(target.parent_path());
+    createFolders(target.parent_path());
     COutput place(target, m_temporaryEnding, m_options.force);
     const std::unique_ptr<CTrackReader> reader = openPart(part);
     CHandle source = reader->createSource();
@@ -257,8 +271,7 @@ void CRipper::writeCue() const {
     add("PERFORMER", m_albumArtist);
     if (const std::string code = m_disc.getText(DISCIO_TEXT_CODE); !code.empty())
         sheet += "CATALOG " + code + "\n";
-    const fs::path target = m_options.directory / CNamePattern("%name%").expand(
-                                                      {{"name", m_album.empty() ? "disc" : m_album}}, ".cue");
+    const fs::path target = getCueTarget();
     const auto addTrack = [&](const SDiscTrack& track) {
         sheet += "  TRACK " + std::string(track.number < 10 ? "0" : "") + std::to_string(track.number) +
                  " AUDIO\n";
@@ -293,23 +306,15 @@ void CRipper::writeCue() const {
 }
 
 int CRipper::run() {
-    std::atomic<size_t> next{0};
+    // Better known before the tracks are read than behind them.
+    if (std::error_code none; m_options.writeCue && !m_options.force && fs::exists(getCueTarget(), none))
+        throw std::runtime_error(tr("host.existsForce", "%FILE% exists (--force replaces it)",
+                                    {{"%FILE%", getCueTarget().string()}}));
     std::atomic<bool> failed{false};
-    const auto work = [&] {
-        for (size_t i; !isCancelled() && (i = next++) < m_parts.size();)
-            if (!ripPart(m_parts[i])) failed = true;
-    };
     // The head of a drive should not have to move between tracks.
-    const size_t threads =
-        m_disc.isDevice() ? 1 : std::min<size_t>(static_cast<size_t>(m_options.jobs), m_parts.size());
-    std::vector<std::thread> others;
-    try {
-        for (size_t i = 1; i < threads; ++i) others.emplace_back(work);
-    } catch (const std::system_error&) {
-        // No more threads available: the existing ones do all the work.
-    }
-    work();
-    for (std::thread& thread : others) thread.join();
+    runParallel(m_parts.size(), m_disc.isDevice() ? 1 : m_options.jobs, [&](size_t index) {
+        if (!ripPart(m_parts[index])) failed = true;
+    });
     for (const SPart& part : m_parts)
         if (!part.report.empty()) std::printf("%s\n", part.report.c_str());
     flushEvents();

@@ -77,9 +77,9 @@ int showDisc(const std::filesystem::path& place, bool json) {
                                     {"catalogue", catalogue}})
                                 .c_str());
     } else {
-        std::printf("%s: %s%s, %s\n", toPrintable(disc.getPlace()).c_str(),
+        std::printf("%s: %s%s%s\n", toPrintable(disc.getPlace()).c_str(),
                     isEmpty ? (tr("host.Disc.blank", "blank") + " ").c_str() : "", medium.c_str(),
-                    formatSize(static_cast<uint64_t>(capacity)).c_str());
+                    capacity > 0 ? (", " + formatSize(static_cast<uint64_t>(capacity))).c_str() : "");
         for (const auto& [name, text] : {std::pair(tr("host.Disc.title", "Title"), title),
                                          {tr("host.Disc.performer", "Performer"), performer},
                                          {tr("host.Disc.catalogue", "Catalogue"), catalogue}})

@@ -2,6 +2,7 @@
 
 #include "InstallFolders.h"
 #include "base/Text.h"
+#include "base/Translation.h"
 
 #include <dlfcn.h>
 #include <filesystem>
@@ -20,11 +21,15 @@ std::string findLibrary() {
 
 SDiscFunctions load() {
     void* const module = ::dlopen(findLibrary().c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (!module) throw std::runtime_error(std::string("The disc library cannot be loaded: ") + ::dlerror());
+    if (!module)
+        throw std::runtime_error(tr("host.DiscLibrary.missing", "The disc library cannot be loaded: %REASON%",
+                                    {{"%REASON%", ::dlerror()}}));
     SDiscFunctions functions;
 #define HOST_RESOLVE(name)                                                                                   \
     functions.name = reinterpret_cast<decltype(functions.name)>(::dlsym(module, "DISCIO_" #name));           \
-    if (!functions.name) throw std::runtime_error("The disc library has no function DISCIO_" #name);
+    if (!functions.name)                                                                                     \
+        throw std::runtime_error(tr("host.DiscLibrary.function", "The disc library has no function %NAME%",  \
+                                    {{"%NAME%", "DISCIO_" #name}}));
     HOST_DISC_FUNCTIONS(HOST_RESOLVE)
 #undef HOST_RESOLVE
     return functions;

@@ -16,25 +16,19 @@ namespace host {
     X(getValidCodecExtensions)                                                                               \
     X(getExtensionCount)                                                                                     \
     X(getExtension)                                                                                          \
-    X(CreateAudioSourceFromURI)                                                                              \
     X(CreateAudioSourceFromEditorXml)                                                                        \
     X(AudioSource_GetDuration)                                                                               \
     X(AudioSource_FetchStreamSamples)                                                                        \
     X(CreateAudioSoureFromAudioInDevice)                                                                     \
     X(AudioSource_Open)                                                                                      \
     X(AudioSource_Close)                                                                                     \
-    X(AudioSource_SetRecordingCallback)                                                                      \
-    X(AudioSource_SetRecordingVolumeCallback)                                                                \
     X(CreateAudioFormatFromURI)                                                                              \
     X(CreateAudioEncoder)                                                                                    \
     X(AudioEncoder_Encode)                                                                                   \
-    X(AudioEncoder_SetCallback)                                                                              \
-    X(CreatePlayerFromURI)                                                                                   \
     X(CreatePlayerFromAudioSource)                                                                           \
     X(Player_Play)                                                                                           \
     X(Player_Pause)                                                                                          \
     X(Player_Stop)                                                                                           \
-    X(Player_SetCallback)                                                                                    \
     X(CreateFileTag)                                                                                         \
     X(StoreFileTag)                                                                                          \
     X(FileTag_GetTitle)                                                                                      \

@@ -46,6 +46,7 @@ struct CDiscProject::SRunning {
     const Progress& progress;
     double fraction = 0;
     bool stopped = false;
+    bool isWriting = false;
 
     // The phases take about these parts of the time.
     static int32_t advance(void* user, int32_t phase, double fraction) {
@@ -55,6 +56,10 @@ struct CDiscProject::SRunning {
         const double whole = kStarts[at] + (kStarts[at + 1] - kStarts[at]) * std::clamp(fraction, 0.0, 1.0);
         running.fraction = std::max(running.fraction, whole);
         running.stopped = running.stopped || !running.progress(running.fraction);
+        // The first report of the phase comes before the drive writes, so stopping there spares the medium.
+        if (!running.stopped)
+            running.isWriting =
+                phase == DISCIO_PHASE_WRITE || (phase == DISCIO_PHASE_FINISH && fraction < 1.0);
         return running.stopped ? 0 : 1;
     }
 };
@@ -121,7 +126,9 @@ bool CDiscProject::write(const SWriteSettings& settings, const Progress& progres
     const DISCIO_WriteOptions options{sizeof options, settings.flags, settings.speed, &SRunning::advance,
                                       &running};
     clearFailure();
-    if (write(functions, options) == 1) return true;
+    const bool isDone = write(functions, options) == 1;
+    m_isPartlyWritten = !isDone && running.isWriting;
+    if (isDone) return true;
     if (running.stopped) return false;
     const std::runtime_error failure = makeDiscError();
     // The reason why a source could not be read is known to the library that reads it.

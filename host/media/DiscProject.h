@@ -45,6 +45,8 @@ public:
     bool writeImage(const std::filesystem::path& image, const SWriteSettings& settings,
                     const Progress& progress);
     bool writeDisc(DISCIO_Drive* drive, const SWriteSettings& settings, const Progress& progress);
+    // Whether the last write ended while the drive or the image was being written.
+    bool isPartlyWritten() const { return m_isPartlyWritten; }
 
 private:
     struct SRunning;
@@ -54,6 +56,7 @@ private:
     CHandle m_handle;
     DISCIO_Project* m_project = nullptr; // belongs to the handle
     DiscHandle<DISCIO_Disc> m_disc;
+    bool m_isPartlyWritten = false;
 };
 
 } // namespace host

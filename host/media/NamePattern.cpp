@@ -142,13 +142,6 @@ CNamePattern::CNamePattern(const std::string& text) : m_parts(1) {
                 tr("host.Pattern.relative", "must be a relative path without empty parts, '.' and '..'"));
 }
 
-bool CNamePattern::uses(std::string_view field) const {
-    for (const Part& part : m_parts)
-        for (const SPiece& piece : part)
-            if (piece.isField && piece.text == field) return true;
-    return false;
-}
-
 fs::path CNamePattern::expand(const Fields& fields, const std::string& extension) const {
     fs::path path;
     for (const Part& part : m_parts) {

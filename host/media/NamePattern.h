@@ -23,8 +23,6 @@ public:
     // "%artist%, %album%, ...", for messages and help.
     static std::string describeFields();
 
-    bool uses(std::string_view field) const;
-
     // A relative path that ends in the extension (".flac"). No field can add a folder or leave the current
     // one: slashes in texts become hyphens and control characters become spaces. Parts of the path have no
     // dots at the start, no dots or spaces at the end, and at most 255 bytes with the extension, cut between

@@ -20,6 +20,15 @@ bool isLeftover(const std::string& reason) {
 
 } // namespace
 
+void createFolders(const std::filesystem::path& folder) {
+    std::error_code error;
+    if (!folder.empty()) std::filesystem::create_directories(folder, error);
+    if (error)
+        throw std::runtime_error(tr("host.folderNotCreated",
+                                    "The folder %FOLDER% cannot be created: %REASON%",
+                                    {{"%FOLDER%", folder.string()}, {"%REASON%", error.message()}}));
+}
+
 COutput::COutput(const std::filesystem::path& target, const std::string& suffix, bool replace,
                  EGrowth growth) {
     std::error_code none;

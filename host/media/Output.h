@@ -13,6 +13,10 @@ enum class EGrowth {
     live,   // the temporary file grows, and remains if the process is killed
 };
 
+// Creates a folder and those above it that are missing; the empty path stands for the current folder. Throws
+// std::runtime_error with the reason.
+void createFolders(const std::filesystem::path& folder);
+
 class COutput {
 public:
     // Throws std::runtime_error if the target exists and `replace` is false, if it cannot be replaced, and if

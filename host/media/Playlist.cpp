@@ -365,7 +365,12 @@ void CLister::addCue(const fs::path& sheet) {
                               {{"%NUMBER%", std::to_string(track.number)}});
             continue;
         }
-        item.file = resolve(sheet, track.file);
+        try {
+            item.file = resolve(sheet, track.file);
+        } catch (const std::runtime_error& failure) {
+            item.failure = failure.what();
+            continue;
+        }
         item.begin = track.begin;
         const bool isFollowed =
             i + 1 < tracks.size() && tracks[i + 1].begin >= 0 && tracks[i + 1].file == track.file;

@@ -48,6 +48,13 @@ std::string_view getPlaceholder(std::string_view pattern) {
     return pattern.substr(0, pattern.find('%', 1) + 1);
 }
 
+// The parser prints limits that may be fractions with six decimals.
+std::string_view trimLimit(std::string_view name, std::string_view text) {
+    if ((name != "%LOWEST%" && name != "%HIGHEST%") || text.find('.') == std::string_view::npos) return text;
+    text.remove_suffix(text.size() - text.find_last_not_of('0') - 1);
+    return text.substr(0, text.find_last_not_of('.') + 1);
+}
+
 // The values of the pattern's placeholders in the message; empty if it does not match.
 std::optional<std::vector<STextValue>> match(std::string_view pattern, std::string_view message,
                                              std::vector<std::string>& names) {
@@ -66,7 +73,8 @@ std::optional<std::vector<STextValue>> match(std::string_view pattern, std::stri
         const std::string_view next = pattern.substr(0, pattern.find('%'));
         const size_t end = next.empty() ? message.size() : message.find(next);
         if (end == std::string_view::npos || end == 0) return std::nullopt;
-        values.push_back({names.emplace_back(name).c_str(), std::string(message.substr(0, end))});
+        values.push_back(
+            {names.emplace_back(name).c_str(), std::string(trimLimit(name, message.substr(0, end)))});
         message.remove_prefix(end);
     }
     if (!message.empty()) return std::nullopt;

@@ -1,10 +1,6 @@
 #include "host/Program.h"
 
 #include <sys/stat.h>
-#include <sys/statvfs.h>
-#include <sys/wait.h>
-
-#include <thread>
 
 using namespace tests;
 
@@ -14,8 +10,7 @@ class BadInput : public CProgramTest {
 protected:
     void expectMessage(const std::string& message, const std::vector<std::string>& parts) {
         EXPECT_EQ(std::count(message.begin(), message.end(), '\n'), 1) << message;
-        for (const std::string& part : parts)
-            EXPECT_NE(message.find(part), std::string::npos) << message << "lacks " << part;
+        for (const std::string& part : parts) EXPECT_TRUE(has(message, part));
     }
 };
 
@@ -28,6 +23,7 @@ TEST_F(BadInput, IsToldByNameAndReason) {
     folder.write("text.flac", "This is no sound file, only a text that somebody gave a wrong name.\n");
     folder.write("header.wav", makeWavHeader({}, 0).substr(0, 20));
     folder.write("sound.xyz", toWav(makeTone(8000, 1, 16, 0.1)));
+    folder.write("no extension", "no sound");
     std::filesystem::create_directory(folder / "folder.wav");
     ASSERT_EQ(::mkfifo((folder / "pipe.wav").c_str(), 0600), 0);
     const auto before = list();
@@ -43,6 +39,7 @@ TEST_F(BadInput, IsToldByNameAndReason) {
         {"text.flac", ""},
         {"header.wav", ""},
         {"sound.xyz", "No plug-in reads"},
+        {"no extension", "No plug-in reads files without an extension"},
     };
     for (const auto& bad : kCases) {
         SCOPED_TRACE(bad.input);
@@ -57,47 +54,17 @@ TEST_F(BadInput, IsToldByNameAndReason) {
             EXPECT_GT(message.size(), start.size() + 5) << message;
             // The name is not repeated.
             EXPECT_EQ(message.find(std::string(bad.input) + ":", start.size()), std::string::npos) << message;
-            EXPECT_EQ(message.find(folder.path().string()), std::string::npos) << message;
+            EXPECT_FALSE(has(message, folder.path().string()));
         }
     }
     EXPECT_EQ(list(), before);
-}
-
-TEST_F(BadInput, MayBeNoise) {
-    std::mt19937 random(7);
-    std::vector<std::string> command{"convert", "--json", "--directory", "out", "--to", "au"};
-    std::filesystem::create_directory(folder / "out");
-    std::string noise(65536, '\0');
-    std::istringstream extensions(succeed({"formats"}));
-    size_t count = 0;
-    for (std::string extension; std::getline(extensions, extension); ++count) {
-        for (char& byte : noise) byte = static_cast<char>(random());
-        folder.write(extension + "." + extension, noise);
-        command.push_back(extension + "." + extension);
-    }
-    EXPECT_GE(count, 10u);
-    const SProcessResult result = tonewright(command);
-    EXPECT_EQ(result.exitCode, 1) << result.err;
-    size_t errors = 0;
-    for (const nlohmann::json& event : parseLines(result.out)) {
-        errors += event["event"] == "error";
-        // MPEG audio has only a few header bits, which also occur in noise.
-        if (event["event"] == "done") {
-            EXPECT_EQ(event["input"].get<std::string>().substr(0, 2), "mp");
-        }
-    }
-    EXPECT_GE(errors, count - 3);
-}
-
-TEST_F(BadInput, DoesNotStopTheOthers) {
-    for (const char* good : {"a.wav", "b.wav", "c.wav"}) write(good, makeTone(8000, 1, 16, 0.1));
-    folder.write("bad.wav", "RIFF");
-    const SProcessResult result =
-        tonewright({"convert", "a.wav", "bad.wav", "b.wav", "missing.wav", "c.wav", "--to", "flac"});
-    EXPECT_EQ(result.exitCode, 1);
-    EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 2) << result.err;
-    EXPECT_EQ(list(),
-              (std::set<std::string>{"a.wav", "b.wav", "c.wav", "bad.wav", "a.flac", "b.flac", "c.flac"}));
+    ::chmod((folder / "sound.xyz").c_str(), 0);
+    for (const char* command :
+         {"info", "waveform -o out.png", "burn --image x.iso", "tag cover import out.flac -i"})
+        EXPECT_TRUE(has(
+            run(withoutPrivileges(with(with({kProgram}, words(command)), {"sound.xyz"})), folder.path()).err,
+            "sound.xyz: Permission denied\n"))
+            << command;
 }
 
 TEST_F(BadOutput, IsToldByNameAndReason) {
@@ -122,8 +89,21 @@ TEST_F(BadOutput, IsToldByNameAndReason) {
     };
     for (const auto& bad : kCases) {
         SCOPED_TRACE(bad.output);
-        expectMessage(fail({"convert", "in.wav", "-f", "-o", bad.output}), bad.parts);
+        const std::string message = fail({"convert", "in.wav", "-f", "-o", bad.output});
+        expectMessage(message, bad.parts);
+        if (bad.output == std::string("/proc/out.flac")) continue; // known only when it is opened
+        expectMessage(fail({"convert", "in.wav", "-n", "-f", "-o", bad.output}), bad.parts);
     }
+    expectMessage(fail({"convert", "in.wav", "-n", "--to", "au", "--directory", "file/out"}),
+                  {"file is not a folder"});
+    EXPECT_EQ(tonewright({"convert", "in.wav", "-n", "-o", "-", "--to", "au"}).err, "in.wav -> -\n");
+    std::filesystem::create_directory(folder / "locked");
+    ::chmod((folder / "locked").c_str(), 0555);
+    EXPECT_TRUE(has(run(withoutPrivileges({kProgram, "convert", "in.wav", "-n", "-o", "locked/a.flac"}),
+                        folder.path(), programEnvironment())
+                        .err,
+                    "locked cannot be written to\n"));
+    std::filesystem::remove(folder / "locked");
     for (const auto& [output, part] : std::initializer_list<std::pair<const char*, const char*>>{
              {"missing/out.png", "does not exist"}, {"folder.flac", "Is a directory"}, {"in.wav", "same"}})
         expectMessage(fail({"waveform", "in.wav", "-f", "-o", output}), {part});
@@ -145,21 +125,6 @@ TEST_F(BadOutput, LosesNothing) {
     EXPECT_EQ(readFile(folder / "out.flac") + readFile(folder / "out.png"), "preciousprecious");
 }
 
-TEST_F(BadOutput, IsReplacedThroughLinksAndKeepsItsMode) {
-    write("in.wav", makeTone(44100, 1, 16, 0.1));
-    std::filesystem::create_directory(folder / "elsewhere");
-    folder.write("elsewhere/out.flac", "old");
-    ASSERT_EQ(::chmod((folder / "elsewhere/out.flac").c_str(), 0640), 0);
-    std::filesystem::create_symlink("elsewhere/out.flac", folder / "link.flac");
-    succeed({"convert", "in.wav", "-f", "-o", "link.flac"});
-    EXPECT_TRUE(std::filesystem::is_symlink(folder / "link.flac"));
-    peer({"flac", "-t", "-s", "elsewhere/out.flac"});
-    struct stat status;
-    ASSERT_EQ(::stat((folder / "elsewhere/out.flac").c_str(), &status), 0);
-    EXPECT_EQ(status.st_mode & 07777, 0640u);
-    EXPECT_EQ(list(), (std::set<std::string>{"in.wav", "link.flac", "elsewhere/", "elsewhere/out.flac"}));
-}
-
 // A file size limit represents all failures in the middle of writing.
 TEST_F(BadOutput, MayFailInTheMiddle) {
     write("in.wav", makeNoise(44100, 2, 16, 200000));
@@ -174,7 +139,7 @@ TEST_F(BadOutput, MayFailInTheMiddle) {
                     folder.path(), programEnvironment());
             EXPECT_EQ(result.exitCode, 1) << result.err;
             expectMessage(result.err, {"tonewright: in.wav: ", output, "File too large"});
-            EXPECT_EQ(result.err.find(".part"), std::string::npos) << result.err;
+            EXPECT_FALSE(has(result.err, ".part"));
             EXPECT_EQ(list(), before);
             if (existing) {
                 EXPECT_EQ(readFile(folder / output), "precious");
@@ -210,6 +175,32 @@ TEST_F(BadOutput, MayHaveNoFolderAnyMore) {
     EXPECT_EQ(result.err, "tonewright: The current folder does not exist\n");
 }
 
+TEST_F(BadInput, MayBeNoise) {
+    std::mt19937 random(7);
+    std::vector<std::string> command{"convert", "--json", "--directory", "out", "--to", "au"};
+    std::filesystem::create_directory(folder / "out");
+    std::string noise(65536, '\0');
+    std::istringstream extensions(succeed({"formats"}));
+    size_t count = 0;
+    for (std::string extension; std::getline(extensions, extension); ++count) {
+        for (char& byte : noise) byte = static_cast<char>(random());
+        folder.write(extension + "." + extension, noise);
+        command.push_back(extension + "." + extension);
+    }
+    EXPECT_GE(count, 10u);
+    const SProcessResult result = tonewright(command);
+    EXPECT_EQ(result.exitCode, 1) << result.err;
+    size_t errors = 0;
+    for (const nlohmann::json& event : parseLines(result.out)) {
+        errors += event["event"] == "error";
+        // MPEG audio has only a few header bits, which also occur in noise.
+        if (event["event"] == "done") {
+            EXPECT_EQ(event["input"].get<std::string>().substr(0, 2), "mp");
+        }
+    }
+    EXPECT_GE(errors, count - 3);
+}
+
 TEST_F(BadOutput, BelongsToTheFirstOfTwoInputs) {
     for (const char* name : {"a", "b", "out"}) std::filesystem::create_directory(folder / name);
     write("a/x.wav", makeTone(44100, 1, 16, 0.1));
@@ -219,32 +210,4 @@ TEST_F(BadOutput, BelongsToTheFirstOfTwoInputs) {
     EXPECT_EQ(std::count(message.begin(), message.end(), '\n'), 2) << message;
     EXPECT_NE(message.find("tonewright: b/x.wav: "), std::string::npos) << message;
     EXPECT_EQ(readWav("out/x.wav").rate, 44100);
-}
-
-// Stopped in the middle, so that the other program is certainly the first.
-TEST_F(BadOutput, IsNotReplacedIfItAppearsMeanwhile) {
-    constexpr uint32_t kBytes = 600 * 176400;
-    folder.write("in.wav", makeWavHeader({}, kBytes));
-    std::filesystem::resize_file(folder / "in.wav", 44 + uint64_t{kBytes});
-    bool isStopped = false;
-    for (int attempt = 0; attempt < 20 && !isStopped; ++attempt) {
-        CProcess process({kProgram, "convert", "in.wav", "-o", "out.flac", "--skip"}, folder.path(),
-                         programEnvironment());
-        while (process.isRunning() && list().size() < 2) std::this_thread::yield();
-        process.signal(SIGSTOP);
-        siginfo_t state = {};
-        ::waitid(P_PID, static_cast<id_t>(process.getId()), &state, WSTOPPED | WEXITED | WNOWAIT);
-        isStopped = state.si_code == CLD_STOPPED && !std::filesystem::exists(folder / "out.flac");
-        folder.write("out.flac", "precious");
-        process.signal(SIGCONT);
-        const SProcessResult result = process.wait();
-        if (isStopped) {
-            EXPECT_EQ(result.exitCode, 1);
-            expectMessage(result.err, {"out.flac was created in the meantime"});
-            EXPECT_EQ(readFile(folder / "out.flac"), "precious");
-        }
-        std::filesystem::remove(folder / "out.flac");
-        EXPECT_EQ(list(), std::set<std::string>{"in.wav"});
-    }
-    EXPECT_TRUE(isStopped) << "the conversion always ended before";
 }

@@ -1,12 +1,12 @@
 // What the options of cddb change in the request, in the answer and in what is stored.
-#include "host/Program.h"
+#include "host/Network.h"
 #include "peru/net/ScriptedServer.h"
 
 using namespace tests;
 
 namespace {
 
-class CddbOptions : public CProgramTest {
+class CddbOptions : public CNetworkTest {
 protected:
     // "PORT" in the arguments becomes the server's.
     SProcessResult ask(const std::vector<std::string>& options,
@@ -17,15 +17,11 @@ protected:
             peer.send("HTTP/1.1 200 OK\r\n\r\n200 misc 1 \x83\x65\r\n");
         });
         const std::string port = std::to_string(server.getPort());
-        std::vector<std::string> arguments{"timeout", "-s",     "KILL",  "60",       kProgram,
-                                           "cddb",    "--list", "--toc", "150 13650"};
-        arguments.insert(arguments.end(), options.begin(), options.end());
-        arguments.insert(arguments.end(), {"--server", address});
+        std::vector<std::string> arguments =
+            with(with({"cddb", "--list", "--toc", "150 13650"}, options), {"--server", address});
         for (std::string& each : arguments)
             if (const size_t at = each.find("PORT"); at != std::string::npos) each.replace(at, 4, port);
-        auto environment = programEnvironment();
-        environment.insert(environment.end(), {{"XDG_CACHE_HOME", folder / "cache"}, {"http_proxy", ""}});
-        return run(arguments, folder.path(), environment);
+        return tonewright(arguments);
     }
 
     std::string m_request; // of the last call; empty if there was none
@@ -35,12 +31,12 @@ protected:
 
 TEST_F(CddbOptions, ReachTheServerAndItsAnswer) {
     const SProcessResult plain = ask({"--no-cache"});
-    EXPECT_NE(plain.out.find("misc        00000001  \u0192e"), std::string::npos) << plain.out << plain.err;
+    EXPECT_TRUE(has(plain.out, "misc        00000001  \u0192e"));
     EXPECT_EQ(m_request.find("POST /path HTTP/1.1\r\n"), 0u) << m_request;
-    EXPECT_NE(m_request.find("&hello=anon+anon+tonewright+"), std::string::npos) << m_request;
+    EXPECT_TRUE(has(m_request, "&hello=anon+anon+tonewright+"));
     EXPECT_EQ(list().count("cache/tonewright/"), 0u) << "nothing is stored";
-    EXPECT_NE(ask({"--code-page", "SHIFT_JIS", "--user", "a@me@there"}).out.find("テ"), std::string::npos);
-    EXPECT_NE(m_request.find("&hello=a%40me+there+tonewright+"), std::string::npos) << m_request;
+    EXPECT_TRUE(has(ask({"--code-page", "SHIFT_JIS", "--user", "a@me@there"}).out, "テ"));
+    EXPECT_TRUE(has(m_request, "&hello=a%40me+there+tonewright+"));
     EXPECT_EQ(list().count("cache/tonewright/cddb/"), 1u);
     ask({"--proxy", "127.0.0.1:PORT"}, "cddb.example.org/path");
     EXPECT_EQ(m_request.find("POST http://cddb.example.org:80/path HTTP/1.1\r\n"), 0u) << m_request;
@@ -53,6 +49,14 @@ TEST_F(CddbOptions, AreRefusedIfTheyMakeNoSense) {
     };
     for (const std::vector<std::string>& each : cases) {
         EXPECT_EQ(ask(each).exitCode, 2) << testing::PrintToString(each);
+        EXPECT_EQ(m_request, "");
+    }
+    for (const char* address :
+         {"", ":PORT", "http://", "http:///path", "me@127.0.0.1:PORT", "127.0.0.1 :PORT", "127.0.0.1#:PORT",
+          "host:0", "host:65536", "host:80x", "[::1]:0", "[::1]?"}) {
+        const SProcessResult result = ask({}, address);
+        EXPECT_EQ(result.exitCode, 2) << address;
+        EXPECT_TRUE(has(result.err, "is not HOST[:PORT][/PATH]"));
         EXPECT_EQ(m_request, "");
     }
 }

@@ -28,12 +28,11 @@ protected:
 } // namespace
 
 TEST_F(ConvertMany, KeepsTheStructureOfFolders) {
-    EXPECT_NE(fail({"convert", "in", "--to", "flac"}).find("--recursive"), std::string::npos);
-    EXPECT_NE(fail({"convert", "-r", "in/empty", "--to", "flac"}).find("no files"), std::string::npos);
+    EXPECT_TRUE(has(fail({"convert", "in", "--to", "flac"}), "--recursive"));
+    EXPECT_TRUE(has(fail({"convert", "-r", "in/empty", "--to", "flac"}), "no files"));
     const auto before = list();
     const std::vector<std::string> command{"convert", "-r", "in", "-o", "out/", "--to", "flac"};
-    std::vector<std::string> dry = command;
-    dry.insert(dry.end(), {"--dry-run", "--json"});
+    const std::vector<std::string> dry = with(command, {"--dry-run", "--json"});
     std::set<std::string> planned;
     for (const nlohmann::json& event : parseLines(succeed(dry)))
         if (event["event"] == "planned" && event["replaces"] == false) planned.insert(event["output"]);
@@ -42,8 +41,7 @@ TEST_F(ConvertMany, KeepsTheStructureOfFolders) {
     EXPECT_EQ(listBelow("out/"),
               (std::set<std::string>{"out/a.flac", "out/sub/a.flac", "out/sub/deep/C.flac"}));
     EXPECT_EQ(listBelow("out/"), planned);
-    dry.push_back("-f");
-    for (const nlohmann::json& event : parseLines(succeed(dry)))
+    for (const nlohmann::json& event : parseLines(succeed(with(dry, {"-f"}))))
         EXPECT_EQ(event.value("replaces", false), event["event"] == "planned") << event;
     // Outputs among the inputs are not converted again.
     for (const char* extension : {"aiff", "flac"})
@@ -72,9 +70,7 @@ TEST_F(ConvertMany, NeverWritesOntoAnInputOrTwice) {
     const std::string precious = readFile(folder / "in/a.wav"), flac = readFile(folder / "in/a.flac");
     for (const auto& each : kCases)
         for (const bool dry : {true, false}) {
-            std::vector<std::string> command{"convert", "-f"};
-            command.insert(command.end(), each.inputs.begin(), each.inputs.end());
-            command.insert(command.end(), each.options.begin(), each.options.end());
+            std::vector<std::string> command = with(with({"convert", "-f"}, each.inputs), each.options);
             if (dry) command.push_back("-n");
             SCOPED_TRACE(testing::PrintToString(command));
             const SProcessResult result = tonewright(command);
@@ -82,8 +78,7 @@ TEST_F(ConvertMany, NeverWritesOntoAnInputOrTwice) {
             EXPECT_EQ(static_cast<size_t>(std::count(result.err.begin(), result.err.end(), '\n')),
                       each.messages.size())
                 << result.err;
-            for (const std::string& message : each.messages)
-                EXPECT_NE(result.err.find(message), std::string::npos) << result.err;
+            for (const std::string& message : each.messages) EXPECT_TRUE(has(result.err, message));
             EXPECT_EQ(readFile(folder / "in/a.wav"), precious);
             EXPECT_EQ(readFile(folder / "in/a.flac"), flac);
         }
@@ -93,22 +88,18 @@ TEST_F(ConvertMany, LeavesOrReplacesWhatExists) {
     fs::create_directory(folder / "out");
     folder.write("out/a.flac", "precious");
     const std::vector<std::string> command{"convert", "-r", "in", "-o", "out", "--to", "flac", "-j", "1"};
-    const auto with = [&](std::vector<std::string> options) {
-        options.insert(options.begin(), command.begin(), command.end());
-        return options;
-    };
-    EXPECT_NE(fail(with({"-n"})).find("out/a.flac exists (--force"), std::string::npos);
-    EXPECT_NE(succeed(with({"-n", "-f"})).find("in/a.wav -> out/a.flac (replaced)\n"), std::string::npos);
-    EXPECT_NE(succeed(with({"-n", "--skip"})).find("out/a.flac: skipped"), std::string::npos);
+    EXPECT_TRUE(has(fail(with(command, {"-n"})), "out/a.flac exists (--force"));
+    EXPECT_TRUE(has(succeed(with(command, {"-n", "-f"})), "in/a.wav -> out/a.flac (replaced)\n"));
+    EXPECT_TRUE(has(succeed(with(command, {"-n", "--skip"})), "out/a.flac: skipped"));
     EXPECT_EQ(listBelow("out/").size(), 1u);
-    const std::string told = succeed(with({"--skip"}));
+    const std::string told = succeed(with(command, {"--skip"}));
     EXPECT_EQ(told.find("out/a.flac: skipped, it exists\n"), 0u) << told;
     EXPECT_EQ(listBelow("out/").size(), 3u);
     EXPECT_EQ(readFile(folder / "out/a.flac"), "precious");
     // Files that have the format already count as converted.
     const std::string again = succeed({"convert", "-r", "out", "--to", "flac", "--skip"});
     EXPECT_EQ(std::count(again.begin(), again.end(), '\n'), 3) << again;
-    succeed(with({"--force"}));
+    succeed(with(command, {"--force"}));
     peer({"flac", "-t", "-s", "out/a.flac"});
 }
 

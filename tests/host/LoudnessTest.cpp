@@ -12,10 +12,9 @@ using testing::HasSubstr;
 class LoudnessCommand : public CProgramTest {
 protected:
     // The events "done", by the names of the inputs, and "album".
-    std::map<std::string, nlohmann::json> measure(std::vector<std::string> arguments) {
-        arguments.insert(arguments.begin(), {"loudness", "--json"});
+    std::map<std::string, nlohmann::json> measure(const std::vector<std::string>& arguments) {
         std::map<std::string, nlohmann::json> results;
-        for (const nlohmann::json& event : parseLines(succeed(arguments)))
+        for (const nlohmann::json& event : parseLines(succeed(with({"loudness", "--json"}, arguments))))
             if (event["event"] == "done")
                 results[event["input"]] = event;
             else if (event["event"] == "album")
@@ -32,35 +31,13 @@ struct SRecording {
 };
 const SRecording kRecordings[] = {
     {8000, 8, 1, "synth 1.5 pinknoise lowpass 1500"},
-    {8000, 16, 1, "synth 1.5 sine 300-1500 tremolo 4 90"},
-    {11025, 16, 1, "synth 1.5 brownnoise lowpass 2000"},
-    {11025, 16, 2, "synth 1.5 sawtooth 220 lowpass 1000 lowpass 1000"},
-    {16000, 16, 1, "synth 1.5 square 100 lowpass 1500 lowpass 1500 tremolo 3 80"},
-    {16000, 24, 2, "synth 1.5 sine 700 sine 900"},
-    {22050, 16, 1, "synth 1.5 triangle 440"},
-    {22050, 8, 2, "synth 1.5 sine 200 sine 1000 vol 0.5"},
-    {24000, 16, 2, "synth 1.5 pluck 220 pluck 330 lowpass 4000"},
     {32000, 16, 2, "synth 1.5 whitenoise lowpass 4000 lowpass 4000"},
-    {32000, 32, 1, "synth 1.5 sine 50"},
-    {44100, 16, 1, "synth 1.5 pinknoise lowpass 8000 vol 0.05"},
     {44100, 16, 2, "synth 1.5 pinknoise lowpass 8000 lowpass 8000"},
-    {44100, 16, 2, "synth 0.5 sine 997"},
     {44100, 16, 2, "synth 1.5 sine 997 vol 0.001"},
-    {44100, 16, 2, "synth 1 sine 600 pad 0 0.7"},
     {44100, 16, 2, "synth 0.8 pinknoise lowpass 6000 pad 0.6 0.6"},
-    {44100, 16, 1, "synth 1.5 sine 440 overdrive 20 lowpass 5000 vol 0.7"},
-    {44100, 24, 2, "synth 1.5 sine 60-6000"},
     {44100, 24, 4, "synth 1.5 sine 500 sine 600 sine 700 sine 800 vol 0.4"},
-    {48000, 16, 2, "synth 1.5 sine 12000 vol 0.9"},
-    {48000, 24, 2, "synth 1.5 sine 1000 vol -60dB"},
-    {48000, 24, 5, "synth 1.5 pinknoise lowpass 7000 vol 0.5"},
     {48000, 16, 6, "synth 1.5 brownnoise vol 0.4"},
-    {48000, 32, 2, "synth 1.5 exp 300 lowpass 3000"},
-    {88200, 24, 2, "synth 1.5 pinknoise lowpass 9000 tremolo 5 100"},
-    {96000, 24, 1, "synth 1.5 sine 15000"},
-    {96000, 24, 2, "synth 1.5 brownnoise"},
     {192000, 24, 2, "synth 1 pinknoise lowpass 12000"},
-    {192000, 16, 1, "synth 1 sine 997 vol 0.6"},
 };
 
 double numberAfter(const std::string& text, size_t from, const std::string& key) {
@@ -76,15 +53,9 @@ TEST_F(LoudnessCommand, AgreesWithAnotherProgram) {
     for (const SRecording& each : kRecordings) {
         const std::string number = std::to_string(files.size());
         files.push_back(number + ".wav");
-        std::vector<std::string> command{"sox",       "-R",
-                                         "-D",        "-n",
-                                         "-r",        std::to_string(each.rate),
-                                         "-b",        std::to_string(each.bits),
-                                         "-c",        std::to_string(each.channels),
-                                         files.back()};
-        std::istringstream effects(each.effects + " gain -1 fade 0.05 -0 0.05");
-        for (std::string word; effects >> word;) command.push_back(word);
-        peer(command);
+        peer(words("sox -R -D -n -r " + std::to_string(each.rate) + " -b " + std::to_string(each.bits) +
+                   " -c " + std::to_string(each.channels) + " " + files.back() + " " + each.effects +
+                   " gain -1 fade 0.05 -0 0.05"));
         judge.insert(judge.end(), {"-i", files.back()});
         graph += "[" + number + "]ebur128=peak=true[o" + number + "];";
     }
@@ -114,8 +85,10 @@ TEST_F(LoudnessCommand, PrintsGainsOfFilesAndOfAllTogether) {
     peer({"sox", "-D", "10.wav", "9.wav", "vol", "-40dB"});
     write("silent.wav", {48000, 2, 16, std::string(192000, '\0')});
     folder.write("list.m3u", "9.wav\nsilent.wav\n10.wav\n");
-    folder.write("album.cue", "FILE 10.wav WAVE\nTRACK 01 AUDIO\nINDEX 01 00:00:00\nTRACK 02 AUDIO\nINDEX 01 "
-                              "00:01:00\n");
+    folder.write(
+        "album.cue",
+        "INDEX 1 x\nFILE 10.wav WAVE\nTRACK 01 AUDIO\nREM 1 x\nINDEX 01 00:00:00\nTRACK 02 AUDIO\nINDEX 01 "
+        "00:01:00\n");
     const std::string table = "   LUFS     LU   dBTP    gain  limited  file\n"
                               "  -49.0    0.0  -46.0   +31.0        -  9.wav\n"
                               "      -      -      -       -        -  silent.wav\n"
@@ -123,10 +96,28 @@ TEST_F(LoudnessCommand, PrintsGainsOfFilesAndOfAllTogether) {
     EXPECT_EQ(succeed({"loudness", "list.m3u", "--no-album"}), table);
     EXPECT_THAT(succeed({"loudness", "album.cue", "10.wav", "--target=-3"}),
                 HasSubstr("   -9.0    0.0   -6.0    +6.0     +5.0  album.cue, track 2\n"));
+    folder.write("mix.xml",
+                 "<P><Tracks><Track><SourceEndTime>4</SourceEndTime><Uri>10.wav</Uri></Track></Tracks></P>");
+    EXPECT_THAT(succeed({"loudness", "mix.xml"}),
+                HasSubstr("   -6.0    0.0   -6.0   -12.0        -  mix.xml\n"));
     const auto all = measure({".", "-j", "3"});
     EXPECT_NEAR(all.at("album")["integrated"], -9.03, 0.1) << "the quiet file is below the gate";
     EXPECT_EQ(all.at("album")["files"], 3);
     EXPECT_TRUE(all.at("./silent.wav")["gain"].is_null());
+}
+
+TEST_F(LoudnessCommand, FilesOfFoldersAreOrderedByTheirNumbers) {
+    const std::vector<std::string> names{"0",  "00", "01", "1",     "1x", "2",  "9",    "10", "10a", "21",
+                                         "22", "A",  "a",  "a.wav", "a1", "a2", "a02b", "B",  "b"};
+    std::filesystem::create_directories(folder / "in/below.wav");
+    for (const std::string& name : names) folder.write("in/" + name + ".wav", "");
+    folder.write("in/below.wav/0.WAV", "");
+    std::string expected, order;
+    for (const std::string& name : names) expected += "in/" + name + ".wav ";
+    for (const nlohmann::json& event :
+         parseLines(tonewright({"loudness", "in", "-r", "-j", "1", "--json"}).out))
+        if (event["event"] == "start") order += event["input"].get<std::string>() + " ";
+    EXPECT_EQ(order, expected + "in/below.wav/0.WAV ");
 }
 
 TEST_F(LoudnessCommand, StoresGainsForPlayers) {
@@ -144,6 +135,9 @@ TEST_F(LoudnessCommand, StoresGainsForPlayers) {
     const std::string before = readFile(folder / "a.flac");
     EXPECT_THAT(fail({"loudness", "--tag", "a.flac", "missing.flac"}), HasSubstr("missing.flac: "));
     EXPECT_EQ(readFile(folder / "a.flac"), before) << "the same gain, and no album";
+    folder.write("one.cue", "FILE a.wav WAVE\nTRACK 01 AUDIO\nINDEX 01 00:00:00\n");
+    EXPECT_EQ(fail({"loudness", "--tag", "one.cue"}),
+              "tonewright: one.cue: Has no tag that could be changed\n");
 }
 
 TEST_F(LoudnessCommand, GoesOnAfterFilesThatFail) {
@@ -157,4 +151,5 @@ TEST_F(LoudnessCommand, GoesOnAfterFilesThatFail) {
         EXPECT_THAT(result.err, HasSubstr(std::string("tonewright: ") + name));
     for (const char* target : {"3", "-71", "nan", "loud"})
         EXPECT_EQ(tonewright({"loudness", "good.wav", std::string("--target=") + target}).exitCode, 2);
+    EXPECT_EQ(tonewright({"loudness", "-", "-"}).exitCode, 2);
 }

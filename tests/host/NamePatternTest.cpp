@@ -85,6 +85,7 @@ TEST(NamePattern, MatchesNames) {
 }
 
 TEST(NamePattern, AnyTextGivesASafePathBelowTheFolder) {
+    const std::string zero(1, '\0'), many(90, 'n');
     const std::vector<std::string> pieces{".",
                                           "..",
                                           "/",
@@ -92,13 +93,13 @@ TEST(NamePattern, AnyTextGivesASafePathBelowTheFolder) {
                                           "\n",
                                           "\x7f",
                                           "%",
-                                          std::string(1, '\0'),
+                                          zero,
                                           "a",
                                           "\\",
                                           "\xc3\xbc",
                                           "\xe9\x9f\xb3",
                                           "\xf0\x9f\x8e\xb5",
-                                          std::string(90, 'n')};
+                                          many};
     const CNamePattern pattern("%artist%/%album%. /.%comment%/%track% %title%");
     std::mt19937 random(7);
     for (int run = 0; run < 2000; ++run) {

@@ -2,9 +2,7 @@
 #pragma once
 
 #include "host/Program.h"
-
-#include <chrono>
-#include <thread>
+#include "support/Environment.h"
 
 namespace tests {
 
@@ -17,17 +15,32 @@ protected:
     // Whatever happens, no temporary file remains.
     void TearDown() override { EXPECT_TRUE(std::filesystem::is_empty(folder / "tmp")); }
 
-    std::vector<std::pair<std::string, std::string>> environment() {
-        auto all = programEnvironment();
-        all.emplace_back("XDG_CACHE_HOME", folder / "cache");
-        all.emplace_back("TMPDIR", folder / "tmp");
-        all.emplace_back("http_proxy", "");
-        return all;
+private:
+    CEnvironment m_cache{"XDG_CACHE_HOME", folder / "cache"};
+    CEnvironment m_temporary{"TMPDIR", folder / "tmp"};
+    CEnvironment m_direct{"http_proxy", ""};
+};
+
+// A server that accepts one connection and reads a request, answers it with `answer`, and then sends nothing
+// more, or another byte every so many seconds.
+class CSilentServer {
+public:
+    explicit CSilentServer(const std::string& answer = {}, double interval = 0)
+        : m_process({"python3", "-u", "-c",
+                     "import socket, sys, time\ns = socket.create_server(('127.0.0.1', 0))\n"
+                     "print(s.getsockname()[1])\nc, _ = s.accept()\nc.recv(9999)\n"
+                     "c.sendall(sys.argv[1].encode())\nprint('sent')\nwait = float(sys.argv[2])\n"
+                     "while wait: time.sleep(wait); c.sendall(b'x')\nc.recv(9999)\nc.recv(1)",
+                     answer, std::to_string(interval)}) {
+        EXPECT_TRUE(waitForLines(m_process, 1));
     }
-    SProcessResult call(std::vector<std::string> arguments) {
-        arguments.insert(arguments.begin(), {"timeout", "-s", "KILL", "60", kProgram});
-        return run(arguments, folder.path(), environment());
+    std::string getAddress() const {
+        return "127.0.0.1:" + std::to_string(std::atoi(m_process.readOut().c_str()));
     }
+    void waitForRequest() const { EXPECT_TRUE(waitForLines(m_process, 2)); }
+
+private:
+    CProcess m_process;
 };
 
 // A web server for the folder "served".
@@ -40,10 +53,7 @@ public:
                "s = h.ThreadingHTTPServer(('127.0.0.1', 0), functools.partial(h.SimpleHTTPRequestHandler, "
                "directory=sys.argv[1]))\nprint(s.server_port)\ns.serve_forever()",
                folder}) {
-        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
-        while (m_process.readOut().find('\n') == std::string::npos && m_process.isRunning() &&
-               std::chrono::steady_clock::now() < end)
-            std::this_thread::sleep_for(std::chrono::milliseconds(10));
+        EXPECT_TRUE(waitForLines(m_process, 1));
     }
     std::string getBase() const {
         return "http://127.0.0.1:" + std::to_string(std::atoi(m_process.readOut().c_str())) + "/";

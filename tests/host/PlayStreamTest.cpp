@@ -8,36 +8,26 @@ using namespace tests;
 namespace {
 
 // Sends the file "sound" without its length: whole, cut off, or with its last second over and over.
-constexpr const char* kServer = "import http.server as h, sys\n"
-                                "sound = open('sound', 'rb').read()\n"
-                                "class Handler(h.BaseHTTPRequestHandler):\n"
-                                "    protocol_version = 'HTTP/1.1'\n"
-                                "    def send_chunk(self, data):\n"
-                                "        self.wfile.write(b'%x\\r\\n%s\\r\\n' % (len(data), data))\n"
-                                "    def do_GET(self):\n"
-                                "        if self.path == '/none':\n"
-                                "            return self.send_error(404)\n"
-                                "        self.close_connection = True\n"
-                                "        self.send_response(200)\n"
-                                "        self.send_header('Transfer-Encoding', 'chunked')\n"
-                                "        self.end_headers()\n"
-                                "        try:\n"
-                                "            if self.path == '/silent':\n"
-                                "                self.send_chunk(b'RIFF')\n"
-                                "                print('silent')\n"
-                                "                return self.rfile.read()\n"
-                                "            self.send_chunk(sound)\n"
-                                "            while self.path == '/endless':\n"
-                                "                self.send_chunk(sound[-44100 * 4:])\n"
-                                "            if self.path == '/whole':\n"
-                                "                self.send_chunk(b'')\n"
-                                "        except OSError:\n"
-                                "            pass\n"
-                                "    def log_message(self, *arguments):\n"
-                                "        pass\n"
-                                "server = h.ThreadingHTTPServer(('127.0.0.1', 0), Handler)\n"
-                                "print(server.server_port)\n"
-                                "server.serve_forever()\n";
+constexpr const char* kServer = R"(import http.server as h
+sound = open('sound', 'rb').read()
+class Handler(h.BaseHTTPRequestHandler):
+    protocol_version = 'HTTP/1.1'
+    def send_chunk(self, data): self.wfile.write(b'%x\r\n%s\r\n' % (len(data), data))
+    def do_GET(self):
+        if self.path == '/none': return self.send_error(404)
+        self.close_connection = True
+        self.send_response(200); self.send_header('Transfer-Encoding', 'chunked'); self.end_headers()
+        try:
+            if self.path == '/silent': self.send_chunk(b'RIFF'); print('silent'); return self.rfile.read()
+            self.send_chunk(sound)
+            while self.path == '/endless': self.send_chunk(sound[-44100 * 4:])
+            if self.path == '/whole': self.send_chunk(b'')
+        except OSError: pass
+    def log_message(self, *arguments): pass
+server = h.ThreadingHTTPServer(('127.0.0.1', 0), Handler)
+print(server.server_port)
+server.serve_forever()
+)";
 
 class PlayStream : public CSoundTest {
 protected:
@@ -48,25 +38,17 @@ protected:
         wav.replace(wav.find("data") + 4, 4, "\xFF\xFF\xFF\xFF");
         folder.write("sound", wav);
         m_server.emplace(std::vector<std::string>{"python3", "-u", "-c", kServer}, folder.path());
-        waitForLines(1);
+        EXPECT_TRUE(waitForLines(*m_server, 1));
         base = "http://127.0.0.1:" + std::to_string(std::atoi(m_server->readOut().c_str()));
-    }
-    // That many lines of the server: its port, then one for each request that it leaves waiting.
-    void waitForLines(ptrdiff_t lines) {
-        const auto end = Clock::now() + std::chrono::seconds(30);
-        while (std::ranges::count(m_server->readOut(), '\n') < lines && Clock::now() < end)
-            std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
     // Nothing was copied, and the pipes are gone.
     void TearDown() override {
-        for (const std::string& name : list()) EXPECT_EQ(name.find("stream."), std::string::npos) << name;
+        for (const std::string& name : list()) EXPECT_FALSE(has(name, "stream."));
     }
 
     CEnvironment temporary{"TMPDIR", folder / "tmp"};
     CEnvironment direct{"http_proxy", ""};
     std::string base;
-
-private:
     std::optional<CProcess> m_server;
 };
 
@@ -105,7 +87,7 @@ TEST_F(PlayStream, EndlessOnesPlayUntilTheUserStops) {
 // While the decoder waits for the first sound.
 TEST_F(PlayStream, CtrlCEndsTheWaitForOne) {
     const auto terminal = start({"play", base + "/silent"});
-    waitForLines(3); // the first request finds out whether there is an end
+    EXPECT_TRUE(waitForLines(*m_server, 3)); // its port, the question for the length, and the stream
     terminal->getProcess().signal(SIGINT);
     EXPECT_EQ(terminal->getProcess().wait().exitCode, 130);
 }

@@ -10,9 +10,8 @@ protected:
     Playlist() : CSoundTest(EMicrophone::none) {}
 
     // The inputs in the order in which they were played; those that failed are followed by the reason.
-    std::string play(std::vector<std::string> arguments) {
-        arguments.insert(arguments.begin(), {"play", "--json", "--volume", "0"});
-        const SProcessResult result = tonewright(arguments);
+    std::string play(const std::vector<std::string>& arguments) {
+        const SProcessResult result = tonewright(with({"play", "--json", "--volume", "0"}, arguments));
         std::string played;
         for (const nlohmann::json& event : parseLines(result.out)) {
             if (event["event"] == "start")
@@ -52,6 +51,9 @@ TEST_F(Playlist, InputsAreListedInOrder) {
                  "TRACK 3 AUDIO\nTRACK 4 AUDIO\nINDEX 01 9:0:0\nFILE disc/a.wav WAVE\nTRACK 5 AUDIO\n"
                  "INDEX 01 0:0:1\nTRACK 6 MODE1/2352\nINDEX 01 0:0:2\n");
     folder.write("bad.cue", "FILE 9.wav WAVE\nTRACK 1 AUDIO\nINDEX 01 0:0:75\n");
+    folder.write("web.cue",
+                 "FILE \"https://host/a\" WAVE\nTRACK 1 AUDIO\nINDEX 01 0:0:5\n"
+                 "TRACK 3 AUDIO\nINDEX 01 0:0:1\nFILE 9.wav WAVE\nTRACK 2 AUDIO\nINDEX 01 0:0:0\n");
     const struct {
         std::vector<std::string> arguments;
         std::string played;
@@ -72,6 +74,10 @@ TEST_F(Playlist, InputsAreListedInOrder) {
          "odd.cue#1(Track 1 ends before it begins) odd.cue#2 odd.cue#3(Track 3 has no beginning) "
          "odd.cue#4(Track 4 begins after the end of 9.wav) odd.cue#5"},
         {{"bad.cue"}, "bad.cue(The time 0:0:75 is invalid)"},
+        {{"web.cue"},
+         "web.cue#1(Only files and http addresses can be played) web.cue#3(Only files and http addresses can "
+         "be "
+         "played) web.cue#2"},
     };
     for (const auto& [arguments, played] : kCases) EXPECT_EQ(play(arguments), played);
 
@@ -106,9 +112,6 @@ TEST_F(Playlist, OptionsAreChecked) {
                                                     {"--start", "x"},
                                                     {"--start", "-1"},
                                                     {"--volume", "131"},
-                                                    {"--start", "1.5:00"}}) {
-        std::vector<std::string> arguments{"play", "a.wav"};
-        arguments.insert(arguments.end(), options.begin(), options.end());
-        EXPECT_EQ(tonewright(arguments).exitCode, 2) << options[1];
-    }
+                                                    {"--start", "1.5:00"}})
+        EXPECT_EQ(tonewright(with({"play", "a.wav"}, options)).exitCode, 2) << options[1];
 }

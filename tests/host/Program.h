@@ -9,8 +9,13 @@
 
 #include <nlohmann/json.hpp>
 
+#include <chrono>
+#include <iterator>
 #include <set>
+#include <sstream>
 #include <string>
+#include <thread>
+#include <unistd.h>
 #include <vector>
 
 namespace tests {
@@ -27,6 +32,51 @@ inline std::vector<std::pair<std::string, std::string>> programEnvironment() {
                                            "exitcode=" + std::to_string(kSanitizerExit));
     }
     return environment;
+}
+
+// The arguments of a command without blanks in them.
+inline std::vector<std::string> words(const std::string& command) {
+    std::istringstream in(command);
+    return {std::istream_iterator<std::string>(in), {}};
+}
+// The same of several commands, each behind a semicolon.
+inline std::vector<std::vector<std::string>> commands(const std::string& text) {
+    std::vector<std::vector<std::string>> all;
+    std::istringstream in(text);
+    for (std::string each; std::getline(in, each, ';');) all.push_back(words(each));
+    return all;
+}
+// A command with further arguments.
+inline std::vector<std::string> with(std::vector<std::string> command, const std::vector<std::string>& more) {
+    command.insert(command.end(), more.begin(), more.end());
+    return command;
+}
+
+// Whether the text has that part; both are printed otherwise.
+inline testing::AssertionResult has(const std::string& text, const std::string& part) {
+    return (text.find(part) == std::string::npos ? testing::AssertionFailure() : testing::AssertionSuccess())
+           << "\"" << part << "\" in: " << text;
+}
+
+// A command that obeys the modes of files, as no command of root's does.
+inline std::vector<std::string> withoutPrivileges(std::vector<std::string> command) {
+    if (::geteuid() == 0)
+        command.insert(command.begin(), {"setpriv", "--bounding-set", "-dac_override,-dac_read_search"});
+    return command;
+}
+
+// False if the condition is not met within a minute.
+template <class Condition> bool waitUntil(Condition condition) {
+    const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+    while (!condition()) {
+        if (std::chrono::steady_clock::now() > end) return false;
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    }
+    return true;
+}
+// The same for that many lines of output.
+inline bool waitForLines(const CProcess& process, std::ptrdiff_t lines) {
+    return waitUntil([&] { return std::ranges::count(process.readOut(), '\n') >= lines; });
 }
 
 class CProgramTest : public testing::Test {
@@ -59,6 +109,17 @@ protected:
         const SProcessResult result = run(command, folder.path());
         EXPECT_EQ(result.exitCode, 0) << command[0] << ": " << result.out << result.err;
         return result.out;
+    }
+
+    // The samples of a file, decoded by another program.
+    std::string decode(const std::string& name) {
+        return peer({"sox", name, "-t", "raw", "-e", "signed", "-b", "16", "-L", "-"});
+    }
+    // "mp3,44100,2", as another program sees it.
+    std::string probe(const std::string& name) {
+        const std::string line = peer({"ffprobe", "-v", "error", "-show_entries",
+                                       "stream=codec_name,sample_rate,channels", "-of", "csv=p=0", name});
+        return line.substr(0, line.find('\n'));
     }
 
     void write(const std::string& name, const SSound& sound) { folder.write(name, toWav(sound)); }

@@ -52,7 +52,7 @@ TEST_F(Record, ShowsItsLevelOnATerminal) {
     EXPECT_TRUE(terminal.isInUsualMode());
     const std::string screen = terminal.getScreen();
     EXPECT_EQ(screen.find('\n'), screen.size() - 1) << screen;
-    EXPECT_NE(screen.find("out.flac: FLAC, 0:"), std::string::npos) << screen;
+    EXPECT_TRUE(has(screen, "out.flac: FLAC, 0:"));
     peer({"flac", "-st", "out.flac"});
 }
 
@@ -70,14 +70,10 @@ TEST_F(Record, TakesTheWantedFormat) {
     };
     for (const auto& [name, options, format] : kCases) {
         SCOPED_TRACE(name);
-        std::vector<std::string> command{"record", "-o", name, "--seconds", "0.3", "-q"};
-        command.insert(command.end(), options.begin(), options.end());
-        EXPECT_EQ(succeed(command), "");
-        const std::string told =
-            peer({"ffprobe", "-v", "error", "-show_entries",
-                  "stream=codec_name,sample_rate,channels:format=duration", "-of", "csv=p=0", name});
-        EXPECT_EQ(told.substr(0, told.find('\n')), format);
-        const double duration = std::stod(told.substr(told.find('\n')));
+        EXPECT_EQ(succeed(with({"record", "-o", name, "--seconds", "0.3", "-q"}, options)), "");
+        EXPECT_EQ(probe(name), format);
+        const double duration = std::stod(
+            peer({"ffprobe", "-v", "error", "-show_entries", "format=duration", "-of", "csv=p=0", name}));
         EXPECT_GT(duration, 0.27);
         EXPECT_LT(duration, 3);
     }
@@ -98,7 +94,7 @@ TEST_F(Record, LeavesAFileThatPlaysWhenItIsKilled) {
         const std::string bytes = readFile(folder / (name + ".part"));
         const SProcessResult refused = tonewright({"record", "-o", name, "--seconds", "0.2"});
         EXPECT_EQ(refused.exitCode, 1);
-        EXPECT_NE(refused.err.find(name + ".part was left"), std::string::npos) << refused.err;
+        EXPECT_TRUE(has(refused.err, name + ".part was left"));
         EXPECT_TRUE(readFile(folder / (name + ".part")) == bytes);
         succeed({"record", "-o", name, "--seconds", "0.2", "--force", "-q"});
         EXPECT_EQ(list().count(name + ".part"), 0u);
@@ -116,7 +112,7 @@ TEST_F(Record, KeepsWhatItHasWhenTheSoundServerEnds) {
     EXPECT_EQ(result.exitCode, 1);
     const nlohmann::json last = parseLines(result.out).back();
     EXPECT_EQ(last["event"], "error");
-    EXPECT_NE(last["message"].get<std::string>().find("device stopped"), std::string::npos) << last;
+    EXPECT_TRUE(has(last["message"].get<std::string>(), "device stopped")) << last;
     EXPECT_EQ(list(), std::set<std::string>{"out.wav"});
     EXPECT_GT(readWav("out.wav").seconds(), position - 0.5);
 }
@@ -138,7 +134,7 @@ TEST_F(Record, RefusesWhatItCannotWrite) {
     for (const auto& [command, reason] : kCases) {
         const SProcessResult result = tonewright(command);
         EXPECT_EQ(result.exitCode, 1) << result.err;
-        EXPECT_NE(result.err.find(reason), std::string::npos) << result.err;
+        EXPECT_TRUE(has(result.err, reason));
     }
     EXPECT_EQ(readFile(folder / "old.wav"), "precious");
     EXPECT_EQ(list(), (std::set<std::string>{"file", "old.wav"}));

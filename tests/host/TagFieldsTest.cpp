@@ -39,11 +39,10 @@ TEST_F(TagFields, AreWrittenUnderAnyNameInEveryFormat) {
         SCOPED_TRACE(extension);
         const std::string name = "a." + extension;
         makeSound(name);
-        const std::vector<std::string> command{"tag",       "set",     name,           "--title",
-                                               "T\xc3\xbc", "--track", "3/12",         "--album",
-                                               "A",         "--year",  "1999",         "--comment",
-                                               "c",         "--field", "COMPOSER=One", "--field=composer=Two",
-                                               "--field",   "MOOD=a=b"};
+        const std::vector<std::string> command =
+            words("tag set " + name +
+                  " --title T\xc3\xbc --track 3/12 --album A --year 1999 --comment c "
+                  "--field COMPOSER=One --field=composer=Two --field MOOD=a=b");
         EXPECT_EQ(succeed(command), name + ": changed\n");
         EXPECT_EQ(succeed(command), name + ": unchanged\n");
         const nlohmann::json shown = show(name);
@@ -120,7 +119,9 @@ TEST_F(TagFields, AreCopiedFromFileToFile) {
         EXPECT_EQ(showAll(name)["pictures"].size(), 1u);
     }
     EXPECT_EQ(show("b.mp3")["genre"], "Jazz");
-    fail({"tag", "copy", "missing.flac", "b.mp3"});
+    EXPECT_EQ(succeed({"tag", "copy", "--json", "a.flac", "b.mp3"}), "{\"file\":\"b.mp3\",\"lost\":\"\"}\n");
+    EXPECT_THAT(fail({"tag", "copy", "missing.flac", "b.mp3"}),
+                testing::HasSubstr("The tag of missing.flac cannot be read: This file was not found"));
 }
 
 TEST_F(TagFields, CoversComeAndGoInEveryFormat) {
@@ -131,7 +132,8 @@ TEST_F(TagFields, CoversComeAndGoInEveryFormat) {
         SCOPED_TRACE(extension);
         const std::string name = "a." + extension;
         makeSound(name);
-        fail({"tag", "cover", "export", name, "-o", "x.png"});
+        EXPECT_THAT(fail({"tag", "cover", "export", name, "-o", "x.png"}),
+                    testing::HasSubstr("Has no picture\n"));
         for (const char* picture : {"back.jpg", "front.png"}) // replaces the other
             EXPECT_EQ(succeed({"tag", "cover", "import", name, "-i", picture}), name + ": changed\n");
         const nlohmann::json shown = showAll(name)["pictures"];
@@ -149,6 +151,22 @@ TEST_F(TagFields, CoversComeAndGoInEveryFormat) {
         }
         // The pictures of MP4 have no types: the last one comes first.
         if (extension == "m4a") continue;
+        if (extension == "flac") {
+            const std::string size = std::to_string(readFile(folder / "front.png").size()),
+                              front = "front, image/png, 64x48, " + size + " B\n";
+            const std::vector<std::string> command{"tag", "cover", "export", name, "-f", "-o", "x"};
+            EXPECT_THAT(succeed({"tag", "cover", "show", name}),
+                        testing::MatchesRegex("a.flac\n  back, image/jpeg, 48x64, [0-9]+ B\n  " + front));
+            EXPECT_TRUE(has(succeed({"tag", "cover", "show", name, "--json"}), shown[0].dump()));
+            EXPECT_EQ(succeed(command), "x: " + front);
+            EXPECT_EQ(parseLines(succeed(with(command, {"--json"}))).at(0),
+                      (nlohmann::json{{"file", name}, {"output", "x"}, {"picture", shown[0]}}));
+            EXPECT_THAT(fail(with(command, {"--type", "media"})),
+                        testing::HasSubstr("Has no picture of type media\n"));
+            succeed({"tag", "cover", "remove", name, "--type", "front"});
+            EXPECT_THAT(succeed(command), testing::StartsWith("x: back, ")) << "the first one";
+            succeed({"tag", "cover", "import", name, "-i", "front.png"});
+        }
         for (const auto& [type, picture] :
              std::map<std::string, std::string>{{"front", "front.png"}, {"back", "back.jpg"}}) {
             succeed({"tag", "cover", "export", name, "-f", "-o", "x", "--type", type});
@@ -171,6 +189,9 @@ TEST_F(TagFields, ComeFromNames) {
                       pattern = "%artist%/%album%/%track% - %title%", before = readFile(folder / file);
     EXPECT_THAT(succeed({"tag", "from-name", "-n", "-p", pattern, file}),
                 testing::HasSubstr("  title         Some - thing\n"));
+    EXPECT_EQ(succeed({"tag", "from-name", "-n", "--json", "-p", pattern, file}),
+              "{\"album\":\"Album\",\"artist\":\"Artist\",\"file\":\"" + file +
+                  "\",\"title\":\"Some - thing\",\"track\":\"3\"}\n");
     EXPECT_TRUE(readFile(folder / file) == before);
     const SProcessResult result = tonewright({"tag", "from-name", "-p", pattern, "other.opus", file});
     EXPECT_EQ(result.out, file + ": changed\n");
@@ -213,6 +234,15 @@ TEST_F(TagFields, NameFilesWithoutReplacingAny) {
     EXPECT_EQ(succeed({"tag", "rename", "-p", "%title%", "4.mp3"}), "4.mp3: unchanged\n");
     EXPECT_EQ(parseLines(succeed({"tag", "rename", "--json", "-p", "%title%", "-d", "AC-DC", "4.mp3"})).at(0),
               (nlohmann::json{{"file", "4.mp3"}, {"target", "AC-DC/4.mp3"}, {"renamed", true}}));
+    // Folders made in vain are removed: for a name, then for a path that is too long.
+    std::string folders;
+    for (int i = 0; i < 16; ++i) folders += std::string(240, 'n') + "/";
+    const auto names = list();
+    for (const std::string& pattern :
+         {folders + std::string(237, 'm') + "/%title%", folders + folders + "%title%"}) {
+        fail({"tag", "rename", "-p", pattern, "2.mp3"});
+        EXPECT_EQ(list(), names);
+    }
     folder.write("blocked", "a file");
     EXPECT_THAT(fail({"tag", "rename", "-p", "blocked/%title%", "2.mp3"}), testing::HasSubstr("blocked"));
 }
