@@ -161,7 +161,7 @@ TEST_F(FileReplacement, ReportsFailedCallsAndKeepsTheOldFile) {
         replacement->copyFromOld(0, 8);
         replacement->commit();
     };
-    tests::failEach({{"__pread_chk", EIO, false},
+    tests::failEach({{"pread", EIO, false},
                      {"pwrite", ENOSPC, false},
                      {"fsync", EIO, false},
                      {"rename", EIO, false},

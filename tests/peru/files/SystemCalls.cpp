@@ -29,9 +29,11 @@ int ask(const char* call, int file) {
 
 // The program's own definitions take precedence over the C library's.
 #define WATCH(result, name, parameters, arguments, file, size)                                               \
+    WATCH_AS(#name, result, name, parameters, arguments, file, size)
+#define WATCH_AS(call, result, name, parameters, arguments, file, size)                                      \
     extern "C" __attribute__((visibility("default"))) result name parameters {                               \
         static const auto next = reinterpret_cast<result(*) parameters>(::dlsym(RTLD_NEXT, #name));          \
-        const int error = ask(#name, file);                                                                  \
+        const int error = ask(call, file);                                                                   \
         if (error > 0) errno = error;                                                                        \
         if (error == tests::CSystemCalls::kHalf) size = (size + 1) / 2;                                      \
         return error > 0 ? -1 : next arguments;                                                              \
@@ -51,9 +53,10 @@ WATCH(ssize_t, read, (int file, void* buffer, size_t size), (file, buffer, size)
 WATCH(ssize_t, write, (int file, const void* buffer, size_t size), (file, buffer, size), file, size)
 WATCH(ssize_t, pwrite, (int file, const void* buffer, size_t size, off_t at), (file, buffer, size, at), file,
       size)
-// The fortified form of pread.
-WATCH(ssize_t, __pread_chk, (int file, void* buffer, size_t size, off_t at, size_t room),
-      (file, buffer, size, at, room), file, size)
+WATCH(ssize_t, pread, (int file, void* buffer, size_t size, off_t at), (file, buffer, size, at), file, size)
+// Fortified, unless the compiler can prove that the size fits.
+WATCH_AS("pread", ssize_t, __pread_chk, (int file, void* buffer, size_t size, off_t at, size_t room),
+         (file, buffer, size, at, room), file, size)
 WATCH(ssize_t, send, (int file, const void* buffer, size_t size, int flags), (file, buffer, size, flags),
       file, size)
 WATCH(int, ftruncate, (int file, off_t size) noexcept, (file, size), file, t_ignored)
@@ -91,8 +94,7 @@ CSystemCalls::~CSystemCalls() {
 
 int interrupt(const std::string& call, int) {
     static unsigned s_count = 0;
-    const bool transfers =
-        call == "read" || call.ends_with("write") || call == "__pread_chk" || call == "send";
+    const bool transfers = call.ends_with("read") || call.ends_with("write") || call == "send";
     if (!transfers && call != "ftruncate" && call != "fdatasync") return 0;
     if (s_count++ % 2 == 0) return EINTR;
     return s_count % 4 == 0 && transfers ? CSystemCalls::kHalf : 0;
