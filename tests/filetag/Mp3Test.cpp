@@ -152,6 +152,8 @@ TEST(Mp3Tag, JoinsOnlyDatesThatAreValid) {
         EXPECT_EQ(tests::text(tag->getYear()), date) << c;
         tag->setTitle("New");
         tag->store();
+        filetag::setTagField(toURI(file), "MOOD", {newString("calm")});
+        EXPECT_EQ(tests::text(open(file)->getYear()), date) << c;
         const std::string after = tests::readFile(file).substr(0, 200);
         EXPECT_EQ(after.find("TDAT") == std::string::npos, date.size() > 4) << c;
         EXPECT_EQ(after.find("TIME") == std::string::npos, date.size() > 10) << c;

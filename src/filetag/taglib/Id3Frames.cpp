@@ -312,6 +312,11 @@ void convert(SId3Tag& tag) {
         if (frame.id == "TCON") convertGenre(frame);
 }
 
+// TagLib would add what convertDate() has left to the dates, and drop it when another field is set.
+bool isLeftOfDate(const SId3Frame& frame) {
+    return frame.id == "TDAT" || frame.id == "TIME";
+}
+
 bool isSame(const SId3Frame& one, const SId3Frame& other) {
     if (one.id != other.id) return false;
     if (one.body == other.body) return true;
@@ -376,7 +381,7 @@ void keepForeignFrames(TagLib::ID3v2::Tag& tag, const SId3Tag& source) {
         if (found != parsed.end()) {
             next = std::next(found);
             const ByteVector rendered = (*found)->render();
-            if (isSame(frame, {frame.id, rendered.mid(kFrameHeader)})) continue;
+            if (isSame(frame, {frame.id, rendered.mid(kFrameHeader)}) && !isLeftOfDate(frame)) continue;
             tag.removeFrame(*found);
         }
         tag.addFrame(new TagLib::ID3v2::UnknownFrame(frame.render()));
