@@ -273,11 +273,13 @@ void CBurner::finish(const CDiscProject& project) {
     }
     details["files"] = m_files;
     details["bytes"] = m_bytes;
-    m_progress.finish(
-        m_job,
-        tr("host.Burn.dataDone", "%TARGET%: data disc, %FILES% files, %SIZE%",
-           {{"%TARGET%", target}, {"%FILES%", std::to_string(m_files)}, {"%SIZE%", formatSize(m_bytes)}}),
-        details);
+    const std::initializer_list<STextValue> values{
+        {"%TARGET%", target}, {"%FILES%", std::to_string(m_files)}, {"%SIZE%", formatSize(m_bytes)}};
+    m_progress.finish(m_job,
+                      m_files == 1
+                          ? tr("host.Burn.oneFileDone", "%TARGET%: data disc, 1 file, %SIZE%", values)
+                          : tr("host.Burn.dataDone", "%TARGET%: data disc, %FILES% files, %SIZE%", values),
+                      details);
 }
 
 int CBurner::run() {

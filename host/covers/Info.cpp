@@ -132,7 +132,8 @@ void printText(const ced::CProject& project, const json& info, const std::filesy
     print(tr("host.Covers.Attachments", "attachments"), listAttachments(info["attachments"]));
 }
 
-void showFile(const std::filesystem::path& file, bool isJson) {
+// `isFirst` is true until the text of a file has been printed.
+void showFile(const std::filesystem::path& file, bool isJson, bool& isFirst) {
     std::string bytes = readFile(file);
     const P<ced::CProject> project = ced::CProject::FromBytes(bytes);
     json info = describe(*project);
@@ -143,10 +144,12 @@ void showFile(const std::filesystem::path& file, bool isJson) {
             {{"name", each.name}, {"kind", each.kind}, {"bytes", each.bytes ? each.bytes->getSize() : 0}});
     });
     info["file"] = file.native();
-    if (isJson)
+    if (isJson) {
         std::printf("%s\n", toLine(info).c_str());
-    else
-        printText(*project, info, file);
+        return;
+    }
+    if (!std::exchange(isFirst, false)) std::printf("\n");
+    printText(*project, info, file);
 }
 
 } // namespace
@@ -155,9 +158,8 @@ int showInfo(const SInfoOptions& options) {
     int result = kExitSuccess;
     bool isFirst = true;
     for (const std::filesystem::path& file : options.files) {
-        if (!std::exchange(isFirst, false) && !options.isJson) std::printf("\n");
         const int code = runForFile(
-            file, [&] { showFile(file, options.isJson); }, options.isJson);
+            file, [&] { showFile(file, options.isJson, isFirst); }, options.isJson);
         if (code == kExitCancelled) return code;
         if (code != kExitSuccess) result = code;
         if (!flushOutput()) break;
