@@ -191,8 +191,10 @@ STags readAllTags(const P<IURI>& file) {
         for (const String& value : values) field.values.push_back(fromTagText(value));
     }
     for (const SPicture& picture : source.readPictures()) tags.pictures.push_back(toPublic(picture));
+    const String unknown = "UNKNOWN/"; // how TagLib names a frame that it does not parse
     for (const String& name : fields.unsupportedData())
-        if (!contains(kPictures, name)) tags.others.push_back(fromTagText(name));
+        if (!contains(kPictures, name))
+            tags.others.push_back(fromTagText(name.startsWith(unknown) ? name.substr(unknown.size()) : name));
     return tags;
 }
 

@@ -154,9 +154,9 @@ TEST(Mp3Tag, JoinsOnlyDatesThatAreValid) {
         tag->store();
         filetag::setTagField(toURI(file), "MOOD", {newString("calm")});
         EXPECT_EQ(tests::text(open(file)->getYear()), date) << c;
-        const std::string after = tests::readFile(file).substr(0, 200);
-        EXPECT_EQ(after.find("TDAT") == std::string::npos, date.size() > 4) << c;
-        EXPECT_EQ(after.find("TIME") == std::string::npos, date.size() > 10) << c;
+        std::string left;
+        for (const auto& name : filetag::readAllTags(toURI(file)).others) left += tests::text(name);
+        EXPECT_EQ(left, date.size() > 10 ? "" : date.size() > 4 ? "TIME" : "TDATTIME") << c;
     }
 }
 
