@@ -61,6 +61,17 @@ TEST_F(Devices, AreWatched) {
     EXPECT_EQ(result.err, "");
 }
 
+TEST_F(Devices, OtherThanTheDefaultPlayToo) {
+    std::ofstream(std::getenv("ALSA_CONFIG_PATH"), std::ios::app)
+        << "pcm.other { type pulse server \"" << std::getenv("PULSE_SERVER") << "\" device \"fx_mic\" }\n";
+    write("in.wav", makeLoudNoise(0.2));
+    const auto heard = server.listen();
+    EXPECT_EQ(succeed({"play", "in.wav", "--device", "other"}), "in.wav: 0:00.2 played\n");
+    EXPECT_EQ(trim(heard->readOut()), "");
+    succeed({"play", "in.wav"});
+    EXPECT_TRUE(waitUntil([&] { return !trim(heard->readOut()).empty(); }));
+}
+
 TEST_F(Devices, AreMissedInOneLine) {
     server.kill();
     write("in.wav", makeTone(44100, 2, 16, 0.1));

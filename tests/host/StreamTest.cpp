@@ -118,6 +118,7 @@ TEST_F(Stream, IsRefusedWhereItMakesNoSense) {
         {"\"$0\" convert - -o out.wav < /dev/null", 1, "The file is empty"},
         {"echo text without sound | \"$0\" convert - -o out.wav", 1, "-: The format is unknown"},
         {"\"$0\" convert - -o - --to xyz < in.wav", 1, "No plug-in writes .xyz files"},
+        {"\"$0\" convert in.wav -o - --to ogg --bitrate 900k", 1, "Could not write -: 900000 bit/s"},
         {"TMPDIR=/missing \"$0\" convert - -o out.wav < in.wav", 1, "/missing: No such file"},
     };
     for (const auto& each : kCases) {

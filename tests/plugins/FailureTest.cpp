@@ -115,6 +115,18 @@ TEST_P(Failure, GrowingBeyondALimit_KeepsTheOldFile) {
     EXPECT_EQ("dear to somebody", readFile(named()));
 }
 
+TEST_P(Failure, TargetThatBecomesAFolder_IsAnErrorAtTheEnd) {
+    folder.write(named().filename(), "old");
+    P<IAudioFormat> format = makeFormat(named());
+    format->open();
+    format->writeAudioChunk(makeChunk(makeMusic({}, 5000)));
+    std::filesystem::remove(named());
+    std::filesystem::create_directory(named());
+    const std::string error = errorOf<CSonoraError>([&] { format->close(); });
+    EXPECT_EQ(0u, error.find("could not write " + named().string() + ": ")) << error;
+    EXPECT_EQ(1u, countEntries(folder.path()));
+}
+
 TEST_P(Failure, WhatIsNoReadableFile_IsRefusedWithTheReason) {
     const auto path = named().string();
     for (const auto& [command, reason] : {std::pair{"mkdir ", "Is a directory"},

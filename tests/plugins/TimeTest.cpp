@@ -116,6 +116,8 @@ TEST_F(CPluginTest, AcceptedFile_StaysOpenIfWanted) {
     for (const bool keep : {true, false})
         EXPECT_EQ(keep,
                   plugin->tryCreateSource(toURI(folder / "x.wav"), kAudioSource, keep, &params)->isOpened());
+    EXPECT_FALSE(plugin->tryCreateSource(toURI(folder / "x.wav"), kVideoSource, true, nullptr));
+    EXPECT_FALSE(plugin->tryCreateSource(nullptr, kAudioSource, true, nullptr));
 }
 
 // The read-ahead thread can be stopped at any moment.

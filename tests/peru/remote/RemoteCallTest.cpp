@@ -372,13 +372,27 @@ protected:
     P<CRemoteStreamClient> m_remote;
 };
 
-TEST_F(RemotePeer, MessagesLeaveInOneWrite) {
+TEST_F(RemotePeer, MessagesLeaveInOneWriteAndArriveInPieces) {
     std::thread caller([&] { EXPECT_EQ(m_remote->callReturningInt(make<CAddFunction>(5, -2)), 3); });
     EXPECT_EQ(m_peer->receive(), addRequest());
     m_peer->send(addAnswer());
     caller.join();
     m_remote->startWorkInThread(10);
     for (const char byte : addRequest()) m_peer->send(std::string(1, byte)); // arrives in pieces
+    EXPECT_EQ(m_peer->receive(), addAnswer());
+    // Stopped while a procedure runs, it can serve again.
+    std::atomic<bool> isRunning{false};
+    m_remote->addProc(make<CCallProc>("slow", [&isRunning] {
+        isRunning = true;
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    }));
+    m_peer->send(wire("void") + wire("slow") + wire("execute"));
+    while (!isRunning) std::this_thread::yield();
+    m_remote->stopWorkInThread();
+    m_remote->startWorkInThread(10);
+    m_peer->send(addRequest().substr(0, 20));
+    std::this_thread::sleep_for(std::chrono::milliseconds(50)); // so that the other end waits
+    m_peer->send(addRequest().substr(20));
     EXPECT_EQ(m_peer->receive(), addAnswer());
 }
 
