@@ -346,17 +346,17 @@ void CSndfileDecoder::openHandle(SF_INFO& info) {
                         "%s was not completed by its writer and is read to its end"},
                        m_file.getDisplayName());
     ::fseeko(m_input.get(), m_start, SEEK_SET);
-    SF_VIRTUAL_IO io{getLength, seekInput, readInput, writeNothing, tellInput};
-    m_handle.reset(sf_open_virtual(&io, SFM_READ, &info, this));
+    SOpenedSndfile opened =
+        openSndfile({getLength, seekInput, readInput, writeNothing, tellInput}, SFM_READ, info, this);
+    m_handle = std::move(opened.handle);
     if (m_handle) return;
-    const std::string codec =
-        readUnsupportedCodec(m_input.get(), sf_error(nullptr) == SF_ERR_UNSUPPORTED_ENCODING);
+    const std::string codec = readUnsupportedCodec(m_input.get(), opened.isUnsupportedCodec);
     if (!codec.empty())
         fail({"sonora2.CSndfileDecoder.codec",
               "could not read %s: the codec %s is not supported in this type of file"},
              m_file.getDisplayName(), peru::CString::fromUTF8(codec));
     fail({"sonora2.plugins.read", "could not read %s: %s"}, m_file.getDisplayName(),
-         peru::CString::fromUTF8(sf_strerror(nullptr)));
+         peru::CString::fromUTF8(opened.reason));
 }
 
 // What the library sees begins at the container: it would miscount the sound behind a tag.

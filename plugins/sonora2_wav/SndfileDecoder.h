@@ -2,18 +2,12 @@
 #pragma once
 
 #include "sonora2_wav/MissingSize.h"
+#include "sonora2_wav/SndfileHandle.h"
 #include "support/Decoder.h"
-
-#include <sndfile.h>
 
 #include <vector>
 
 namespace sonora2::plugins::wav {
-
-struct SSndfileCloser {
-    void operator()(SNDFILE* file) const { sf_close(file); }
-};
-using SndfileHandle = std::unique_ptr<SNDFILE, SSndfileCloser>;
 
 // Linear PCM is delivered bit for bit, floating point on request, otherwise as 32 bits, compressed samples as
 // the 16 bits that they were made from. A stated length that the file cannot hold is reduced to what is

@@ -103,13 +103,14 @@ void CSndfileEncoder::open(COutputFile& file, const SEncoderSettings& settings) 
     m_file = &file;
     m_format = settings.format;
     m_bytes = 0;
-    SF_VIRTUAL_IO io{getLength, seekTo, readNothing, writeBytes, getPosition};
     SF_INFO info = describe(m_format);
-    m_handle.reset(sf_open_virtual(&io, SFM_WRITE, &info, &file));
+    SOpenedSndfile opened =
+        openSndfile({getLength, seekTo, readNothing, writeBytes, getPosition}, SFM_WRITE, info, &file);
+    m_handle = std::move(opened.handle);
     file.throwFailure();
     if (!m_handle)
         fail({"sonora2.plugins.write", "could not write %s: %s"}, file.getFile().getDisplayName(),
-             peru::CString::fromUTF8(sf_strerror(nullptr)));
+             peru::CString::fromUTF8(opened.reason));
     sf_command(m_handle.get(), SFC_SET_ADD_PEAK_CHUNK, nullptr, SF_FALSE);
     m_swapped = sf_command(m_handle.get(), SFC_RAW_DATA_NEEDS_ENDSWAP, nullptr, 0) == SF_TRUE;
 }
