@@ -97,6 +97,9 @@ int main(int argc, char** argv) {
     if (kind == "throw") throw std::runtime_error("nobody catches this");
     if (kind == "overflow") return recurse(1);
     if (kind == "abort") std::abort();
-    if (kind.starts_with("kill")) ::kill(::getpid(), std::stoi(kind.substr(4)));
+    if (kind.starts_with("kill")) {
+        ::kill(::getpid(), std::stoi(kind.substr(4)));
+        for (;;) ::pause(); // another thread may have got the signal
+    }
     return 0;
 }
